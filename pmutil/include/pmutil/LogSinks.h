@@ -1,0 +1,62 @@
+// Where log lines go: the concrete loggers.
+#pragma once
+
+#include <cstdio>
+#include <string>
+
+#include "pmutil/PMLogging.h"
+
+namespace pmutil {
+
+// Swallows everything; stands in when no other logger lives. Its name is "PMNullLogger".
+class PMNullLogger : public PMLogger {
+public:
+    PMNullLogger();
+    ~PMNullLogger() override;
+    bool IsEnabled(int level) override;
+    void Log(const char* file, int line, const char* format, std::va_list arguments) override;
+    void Write(const char* data, std::size_t size) override;
+};
+
+// Writes to a C stream, flushed after each line. Named "stdout", "stderr" or "FILE*". The stream is
+// not owned; a null one swallows everything.
+class PMStdioLogger : public PMLogger {
+public:
+    explicit PMStdioLogger(std::FILE* stream);
+    ~PMStdioLogger() override;
+    void Flush() override;
+    void Write(const char* data, std::size_t size) override;
+
+private:
+    std::FILE* fFile;
+};
+
+// Writes to standard output in the form of a comment of the report: each line begins with "# ".
+class AssayLogger : public PMStdioLogger {
+public:
+    AssayLogger();
+    ~AssayLogger() override;
+    std::string GetPrefix(const char* file, int line) override;
+};
+
+// Writes to a file in the user's desktop folder, "pmlog.txt" for a null name; the bare name in the
+// current directory if there is no such folder. The file is open only for the length of a line, so
+// that what was logged is on disk if the process dies at the next statement. It begins anew with
+// the first logger of the process that uses it; a logger that wrote nothing leaves no empty file.
+// A file that can't be opened costs the line, and is told once on standard error.
+class PMFileLogger : public PMLogger {
+public:
+    explicit PMFileLogger(const char* name);
+    ~PMFileLogger() override;
+    void Flush() override;
+    void Write(const char* data, std::size_t size) override;
+
+    const std::wstring& GetPath() const { return fPath; }
+
+private:
+    std::FILE* fFile = nullptr;
+    std::wstring fPath;
+    bool fOpenFailureTold = false;
+};
+
+} // namespace pmutil

@@ -1,0 +1,124 @@
+// Logging. The most recently constructed live logger is the current one, and every log statement
+// of the process writes to it. Whether a statement logs at all is decided by a named debug value.
+//
+// Any thread may log. The log mutex makes each line whole.
+#pragma once
+
+#include <cstdarg>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <ostream>
+#include <string>
+
+#include <boost/shared_ptr.hpp>
+#include <boost/thread/recursive_mutex.hpp>
+
+#include "pmutil/DebugValues.h"
+#include "pmutil/Format.h"
+#include "pmutil/Stackable.h"
+
+namespace pmutil {
+
+// Formats and assembles lines; a sink derives from it and supplies Write. Loggers are made and
+// destroyed on any thread, but not while another thread constructs or destroys one.
+class PMLogger : public Stackable<PMLogger> {
+public:
+    // Becomes the current logger. If logging has started, the logger that was current until now
+    // gets the line "Activating new logger NAME".
+    explicit PMLogger(const std::string& name);
+    ~PMLogger() override;
+
+    virtual bool IsEnabled(int level);
+
+    // The text behind the last "\" or "/" that has something behind it; empty for null.
+    virtual std::string GetBaseName(const char* path);
+
+    // Assembles and writes one line: prefix, formatted message, a line end unless the text has one
+    // already, then Flush. Holds the log mutex.
+    virtual void Log(const char* file, int line, const char* format, std::va_list arguments);
+
+    // "NNNNN.YYYY.MM.DD_HH:MM:SS.mmm(+S.mmm)[tid=T] ": line number, universal time, seconds since
+    // this logger's previous line, thread name or id.
+    virtual std::string GetPrefix(const char* file, int line);
+
+    virtual std::string GetSuffix();
+    virtual void Flush();
+    virtual std::string GetLineEnd();
+
+    // The sink's output operation. Called with the log mutex held.
+    virtual void Write(const char* data, std::size_t size) = 0;
+
+    // The timed entry points that callers use; each forwards to the operation of its purpose.
+    bool IsEnabledWrapper();
+    void LogPrintf(const char* file, int line, const char* format, ...) PMUTIL_PRINTF(4, 5);
+    void WriteLineEnd();
+    void WriteText(const char* data, std::size_t size);
+
+    const std::string& GetName() const { return fName; }
+
+private:
+    double fLastTime = 0;
+    std::uint32_t fLineNumber = 0;
+    std::string fName;
+};
+
+// The current logger together with a share of the stack it stands on; empty before InitLogging.
+// Doesn't keep the logger alive: hold it for one statement only.
+using LoggerHolder = StackableHolder<PMLogger>;
+
+// Starts logging, once per process: before it statements write nothing and debug values are not
+// resolved. A second call does nothing.
+void InitLogging();
+
+// The logger on top of the stack, a PMNullLogger made on demand if the stack is empty; an empty
+// holder before InitLogging.
+LoggerHolder GetCurrentLogger();
+
+// Serialises log lines and the registry of debug values. Recursive, so a sink may log.
+boost::recursive_mutex& GetLogMutex();
+
+// Total seconds that the process spent in logging, nested calls counted once.
+double GetLogTime();
+
+// Logs "BEGIN NAME" now and "END NAME, duration=SECONDS" at the end of the scope, if the current
+// logger is enabled then. `file` must outlive the scope.
+class PMLogScope {
+public:
+    PMLogScope(const std::string& name, const char* file, int line);
+    ~PMLogScope();
+    PMLogScope(const PMLogScope&) = delete;
+    PMLogScope& operator=(const PMLogScope&) = delete;
+
+private:
+    double fStartTime;
+    const char* fFile;
+    int fLine;
+    std::string fName;
+};
+
+// The depth of indented log output. Nothing indents by itself.
+struct LogIndent {
+    void Increment();
+    void Decrement();
+};
+// Writes one blank fewer than the depth.
+std::ostream& operator<<(std::ostream& out, const LogIndent& indent);
+extern LogIndent gLogIndent;
+
+namespace detail {
+// Writes one line to the current logger if it is enabled, the message being assembled by `message`
+// under the log mutex; swallows every exception.
+void LogStatement(const char* file, int line, const std::function<void(std::ostream&)>& message);
+} // namespace detail
+
+// A log statement: PM_LOG(gLog, "wmiNumDevices=" << count). While the debug value is 0 it costs a
+// load and a test; nothing of the message is evaluated.
+#define PM_LOG(debugValue, message)                                                                \
+    do {                                                                                           \
+        if (::pmutil::GetDebugValue(debugValue) != 0)                                              \
+            ::pmutil::detail::LogStatement(__FILE__, __LINE__,                                     \
+                                           [&](std::ostream& pmLogOut) { pmLogOut << message; });  \
+    } while (false)
+
+} // namespace pmutil

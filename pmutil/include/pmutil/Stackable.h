@@ -1,0 +1,100 @@
+// A process-wide stack of the live objects of a class, oldest first.
+#pragma once
+
+#include <algorithm>
+#include <vector>
+
+#include <boost/make_shared.hpp>
+#include <boost/shared_ptr.hpp>
+#include <boost/thread/lock_guard.hpp>
+#include <boost/thread/recursive_mutex.hpp>
+
+namespace pmutil {
+
+class StackableBase {
+public:
+    virtual ~StackableBase() = default;
+};
+
+template <typename T>
+class Stackable;
+
+// A pointer to an object on the stack, with a share of the stack itself, so that the stack
+// outlives the last statement that uses it during process exit. May be empty.
+template <typename T>
+class StackableHolder {
+public:
+    StackableHolder() = default;
+    StackableHolder(boost::shared_ptr<std::vector<T*>> stack, T* object)
+        : fStack(std::move(stack)), fObject(object)
+    {}
+
+    explicit operator bool() const { return fObject != nullptr; }
+    T* operator->() const { return fObject; }
+    T* get() const { return fObject; }
+
+private:
+    boost::shared_ptr<std::vector<T*>> fStack;
+    T* fObject = nullptr;
+};
+
+// While an object of class T lives, it stands on the stack of live T.
+template <typename T>
+class Stackable : public StackableBase {
+public:
+    using Stack = boost::shared_ptr<std::vector<T*>>;
+
+    Stackable(const Stackable&) = delete;
+    Stackable& operator=(const Stackable&) = delete;
+
+    // The youngest live object; an empty holder if there is none.
+    static StackableHolder<T> Top()
+    {
+        boost::lock_guard<boost::recursive_mutex> lock(Mutex());
+        Stack stack = Instances();
+        T* const top = stack->empty() ? nullptr : stack->back();
+        return StackableHolder<T>(std::move(stack), top);
+    }
+
+    // The object that became current just before `object`; null if there is none.
+    static T* Below(const T* object)
+    {
+        boost::lock_guard<boost::recursive_mutex> lock(Mutex());
+        const std::vector<T*>& stack = *Instances();
+        const auto found = std::find(stack.begin(), stack.end(), object);
+        return found == stack.begin() || found == stack.end() ? nullptr : *(found - 1);
+    }
+
+    // Guards the stack. Taken inside the log mutex and never the other way round.
+    static boost::recursive_mutex& Mutex()
+    {
+        static boost::recursive_mutex& mutex = *new boost::recursive_mutex; // outlives all users
+        return mutex;
+    }
+
+protected:
+    Stackable()
+    {
+        boost::lock_guard<boost::recursive_mutex> lock(Mutex());
+        fStack = Instances();
+        fStack->push_back(static_cast<T*>(this));
+    }
+
+    ~Stackable() override
+    {
+        boost::lock_guard<boost::recursive_mutex> lock(Mutex());
+        fStack->erase(std::remove(fStack->begin(), fStack->end(), static_cast<T*>(this)),
+                      fStack->end());
+    }
+
+private:
+    static Stack Instances()
+    {
+        static const Stack stack = boost::make_shared<std::vector<T*>>();
+        return stack;
+    }
+
+    Stack fStack;
+};
+
+} // namespace pmutil

@@ -1,0 +1,1 @@
+// Gives the library a source until its first module lands.
