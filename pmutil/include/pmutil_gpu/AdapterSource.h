@@ -2,8 +2,10 @@
 // keeps them, and raw adapters with their outputs as a display interface lists them. The shapes are
 // those of Windows' WMI and DXGI; other platforms fill the same shapes from what they have.
 //
-// Every operation may fail by a result code below 0 and never throws one of its own. Nothing here
-// decides anything: that is WMIData's and DXGIData's work. Main thread only.
+// Every operation may fail by a result code below 0; an exception that comes out of one ends the
+// enumeration like a failure does. A pointer that an operation fills stays null when it fails.
+// Nothing here decides anything: that is WMIData's and DXGIData's work. Each object that is handed
+// out is released by its destructor, before the object that gave it. Main thread only.
 #pragma once
 
 #include <array>
@@ -36,6 +38,7 @@ struct PropertyValue {
 class AdapterRow {
 public:
     virtual ~AdapterRow() = default;
+    // The property of that name, in the type it has. A null name, and one that the row lacks, fail.
     virtual ResultCode Get(const char16_t* name, PropertyValue& value) = 0;
 };
 
@@ -47,11 +50,13 @@ public:
     virtual ResultCode Next(std::unique_ptr<AdapterRow>& row) = 0;
 };
 
-// The management service, in the steps that reaching it takes. The destructor releases the
-// connection and the locator, but undoes Initialize in no case: that is Uninitialize's work.
+// The management service, in the steps that reaching it takes, to be called in this order. The
+// destructor releases the connection and the locator where Release hasn't, but undoes Initialize in
+// no case: that is Uninitialize's work.
 class ManagementService {
 public:
     virtual ~ManagementService() = default;
+    // Starts COM, or what stands for it, for this thread.
     virtual ResultCode Initialize() = 0;
     virtual ResultCode CreateLocator() = 0;
     virtual ResultCode ConnectServer() = 0;
@@ -116,7 +121,9 @@ public:
 class AdapterSource {
 public:
     virtual ~AdapterSource() = default;
+    // May succeed and leave `factory` null.
     virtual ResultCode CreateFactory(std::unique_ptr<AdapterFactory>& factory) = 0;
+    // Never null. Does nothing but make the object: reaching the service is the object's work.
     virtual std::unique_ptr<ManagementService> CreateManagementService() = 0;
     // Total physical memory in bytes; false if the system doesn't say.
     virtual bool GetPhysicalMemory(std::uint64_t& bytes) = 0;
