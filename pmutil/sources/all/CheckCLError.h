@@ -1,0 +1,16 @@
+// The requirement check of the OpenCL measurements.
+#pragma once
+
+#include "pmutil/Requirement.h"
+#include "qgf/OCLFunctionTable.h"
+
+namespace pmutil {
+
+// Throws std::runtime_error "Failed requirement: ciErrNum == CL_SUCCESS" for every other status.
+inline void CheckCLError(cl_int ciErrNum)
+{
+    if (ciErrNum != CL_SUCCESS)
+        RequirementFailed(kNoFile, 0, "Failed requirement: ciErrNum == CL_SUCCESS", true);
+}
+
+} // namespace pmutil

@@ -1,0 +1,60 @@
+// Reading the texts and lists that an OpenCL driver answers in two calls: how much, then what.
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+#include "qgf/qgf_ocl/Status.h"
+
+namespace QGF {
+namespace OCL {
+
+// What a driver may claim before it isn't believed any more.
+inline constexpr std::size_t kMaxTextBytes = 1024UL * 1024;
+inline constexpr cl_uint kMaxListEntries = 4096;
+
+// The text that `query(size, value, actualSize)` gives, as long as the driver says it is, zero
+// bytes included, less a terminating one. Throws LogicalException with the call's name if the
+// driver refuses or claims more than kMaxTextBytes.
+template <typename Query>
+std::string ReadText(const char* call, const Query& query)
+{
+    std::size_t size = 0;
+    CheckStatus(call, query(std::size_t{0}, nullptr, &size));
+    if (size > kMaxTextBytes)
+        RefuseAnswer(call, "the driver claims a text of " + std::to_string(size) + " bytes");
+    std::string text(size, '\0');
+    if (size == 0)
+        return text;
+    CheckStatus(call, query(size, text.data(), nullptr));
+    if (text.back() == '\0')
+        text.pop_back();
+    return text;
+}
+
+// The handles that `query(count, handles, actualCount)` gives; none if it answers `emptyStatus`.
+// Throws LogicalException with the call's name if the driver refuses otherwise or claims more than
+// kMaxListEntries.
+template <typename Handle, typename Query>
+std::vector<Handle> ReadList(const char* call, cl_int emptyStatus, const Query& query)
+{
+    cl_uint count = 0;
+    const cl_int status = query(cl_uint{0}, nullptr, &count);
+    if (status == emptyStatus)
+        return {};
+    CheckStatus(call, status);
+    if (count > kMaxListEntries)
+        RefuseAnswer(call, "the driver claims a list of " + std::to_string(count) + " entries");
+    std::vector<Handle> handles(count, nullptr);
+    if (count == 0)
+        return handles;
+    cl_uint given = count;
+    CheckStatus(call, query(count, handles.data(), &given));
+    if (given < count)
+        handles.resize(given);
+    return handles;
+}
+
+} // namespace OCL
+} // namespace QGF

@@ -1,0 +1,65 @@
+#include "qgf/OCL.h"
+#include "qgf/qgf_ocl/Answers.h"
+
+namespace QGF {
+namespace OCL {
+
+namespace {
+
+std::string GetInfoText(cl_device_id device, cl_device_info property, const char* call)
+{
+    const FunctionTable& table = ExtensionManager::instance().table();
+    return ReadText(call, [&](std::size_t size, void* value, std::size_t* actualSize) {
+        return table.clGetDeviceInfo(device, property, size, value, actualSize);
+    });
+}
+
+// Reads a value whose size is known beforehand.
+void GetInfoValue(cl_device_id device, cl_device_info property, const char* call, std::size_t size,
+                  void* value, std::size_t* actualSize)
+{
+    std::size_t answered = size;
+    CheckStatus(call, ExtensionManager::instance().table().clGetDeviceInfo(device, property, size,
+                                                                           value, &answered));
+    if (actualSize != nullptr)
+        *actualSize = answered;
+    if (answered != size)
+        RefuseAnswer(call, "the driver answers " + std::to_string(answered) + " bytes where " +
+                               std::to_string(size) + " are due");
+}
+
+} // namespace
+
+Platform Device::platform() const
+{
+    constexpr char kCall[] = "clGetDeviceInfo(CL_DEVICE_PLATFORM)";
+    cl_platform_id platform = nullptr;
+    GetInfoValue(fHandle, CL_DEVICE_PLATFORM, kCall, sizeof platform, &platform, nullptr);
+    // Null would mean "whichever" to most of OpenCL.
+    if (platform == nullptr)
+        RefuseAnswer(kCall, "the driver gives no platform");
+    return Platform(platform);
+}
+
+std::string Device::name() const
+{
+    return GetInfoText(fHandle, CL_DEVICE_NAME, "clGetDeviceInfo(CL_DEVICE_NAME)");
+}
+
+std::string Device::vendor() const
+{
+    return GetInfoText(fHandle, CL_DEVICE_VENDOR, "clGetDeviceInfo(CL_DEVICE_VENDOR)");
+}
+
+void Device::getInfoImpl(DeviceProperty property, std::size_t size, void* value,
+                         std::size_t* actualSize) const
+{
+    const char* const call =
+        property == DeviceProperty::VendorID        ? "clGetDeviceInfo(CL_DEVICE_VENDOR_ID)"
+        : property == DeviceProperty::GlobalMemSize ? "clGetDeviceInfo(CL_DEVICE_GLOBAL_MEM_SIZE)"
+                                                    : "clGetDeviceInfo";
+    GetInfoValue(fHandle, static_cast<cl_device_info>(property), call, size, value, actualSize);
+}
+
+} // namespace OCL
+} // namespace QGF

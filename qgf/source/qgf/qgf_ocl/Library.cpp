@@ -1,0 +1,79 @@
+#include <optional>
+#include <utility>
+
+#include "qgf/OCL.h"
+#include "qgf/qgf_ocl/LibraryNames.h"
+
+namespace QGF {
+namespace OCL {
+
+namespace {
+
+struct LoadedLibrary {
+    std::unique_ptr<Core::DynamicLibrary> library;
+    FunctionTable table;
+};
+
+Core::Proc GetProcOf(void* library, const char* name)
+{
+    return static_cast<const Core::DynamicLibrary*>(library)->getProc(name);
+}
+
+LoadedLibrary Load(const char* const* names)
+{
+    LoadedLibrary loaded{Core::OpenLibrary(names), {}};
+    if (!FillFunctionTable(loaded.table, GetProcOf, loaded.library.get()))
+        throw LogicalException("The OpenCL library lacks entry points of OpenCL 1.0");
+    return loaded;
+}
+
+// Never closed: a driver may have threads of its own that outlive every object of ours.
+const LoadedLibrary& LoadForGood()
+{
+    static const LoadedLibrary* const loaded = new LoadedLibrary(Load(kLibraryNames));
+    return *loaded;
+}
+
+// What stands in for the library's own table.
+std::optional<FunctionTable>& Replacement()
+{
+    static std::optional<FunctionTable> replacement;
+    return replacement;
+}
+
+} // namespace
+
+bool Library::IsOpenCLAvailable(const std::string& path)
+{
+    try {
+        if (path.empty()) {
+            LoadForGood();
+        } else {
+            const char* const names[] = {path.c_str(), nullptr};
+            Load(names);
+        }
+        return true;
+    } catch (const LogicalException&) {
+        return false;
+    }
+}
+
+void Library::Initialize()
+{
+    ExtensionManager::instance();
+}
+
+ExtensionManager& ExtensionManager::instance()
+{
+    static ExtensionManager manager;
+    manager.fTable = Replacement() ? *Replacement() : LoadForGood().table;
+    return manager;
+}
+
+void ExtensionManager::ReplaceTable(const FunctionTable* table)
+{
+    Replacement() = table != nullptr ? std::optional<FunctionTable>(*table) : std::nullopt;
+}
+
+} // namespace OCL
+} // namespace QGF
