@@ -30,9 +30,18 @@ struct DebugValue {
 using DebugInteger = std::atomic<std::int32_t>;
 
 namespace detail {
-// Slot 0 is never assigned, so 100 names fit.
+// Slot 0 is never assigned, so 100 names fit. It isn't 0, so that a record that isn't resolved yet
+// reads as one that may be set.
 inline constexpr std::int32_t kDebugValueSlots = 101;
 extern DebugInteger gDebugValues[kDebugValueSlots];
+
+// False if the value behind the record is known to be 0. What a log statement costs while it is
+// off.
+inline bool MayBeSet(const DebugValue& record)
+{
+    const std::int32_t index = record.index.load(std::memory_order_acquire);
+    return gDebugValues[index].load(std::memory_order_relaxed) != 0;
+}
 
 // The slow road of GetDebugValue: finds or makes the name's slot under the log mutex.
 DebugInteger& ResolveDebugValue(DebugValue& record);
@@ -48,7 +57,7 @@ void PrepareDebugValues();
 // integer, and nothing is cached. The reference stays valid until the process ends.
 inline DebugInteger& GetDebugValue(DebugValue& record)
 {
-    const std::int32_t index = record.index.load(std::memory_order_relaxed);
+    const std::int32_t index = record.index.load(std::memory_order_acquire);
     return index != 0 ? detail::gDebugValues[index] : detail::ResolveDebugValue(record);
 }
 

@@ -19,7 +19,8 @@ public:
 };
 
 // Writes to a C stream, flushed after each line. Named "stdout", "stderr" or "FILE*". The stream is
-// not owned; a null one swallows everything.
+// not owned; a null one swallows everything. A line that the stream refuses is lost, and doesn't
+// turn up in front of what is written to the stream later.
 class PMStdioLogger : public PMLogger {
 public:
     explicit PMStdioLogger(std::FILE* stream);
@@ -43,10 +44,15 @@ public:
 // current directory if there is no such folder. The file is open only for the length of a line, so
 // that what was logged is on disk if the process dies at the next statement. It begins anew with
 // the first logger of the process that uses it; a logger that wrote nothing leaves no empty file.
-// A file that can't be opened costs the line, and is told once on standard error.
+// A file that can't be opened costs the line, and is told once per logger on standard error. A
+// path that can't be told in narrow characters costs it too: Write throws a boost::system error
+// with the text "boost::filesystem::path codecvt to string".
 class PMFileLogger : public PMLogger {
 public:
     explicit PMFileLogger(const char* name);
+
+    // The same in another folder; an empty one stands for the current directory.
+    PMFileLogger(const std::wstring& folder, const char* name);
     ~PMFileLogger() override;
     void Flush() override;
     void Write(const char* data, std::size_t size) override;
@@ -54,8 +60,11 @@ public:
     const std::wstring& GetPath() const { return fPath; }
 
 private:
+    bool Open();
+
     std::FILE* fFile = nullptr;
     std::wstring fPath;
+    bool fLineLost = false;
     bool fOpenFailureTold = false;
 };
 

@@ -4,14 +4,13 @@
 // Any thread may log. The log mutex makes each line whole.
 #pragma once
 
+#include <atomic>
 #include <cstdarg>
+#include <cstddef>
 #include <cstdint>
-#include <functional>
-#include <memory>
 #include <ostream>
 #include <string>
 
-#include <boost/shared_ptr.hpp>
 #include <boost/thread/recursive_mutex.hpp>
 
 #include "pmutil/DebugValues.h"
@@ -20,8 +19,9 @@
 
 namespace pmutil {
 
-// Formats and assembles lines; a sink derives from it and supplies Write. Loggers are made and
-// destroyed on any thread, but not while another thread constructs or destroys one.
+// Formats and assembles lines; a sink derives from it and supplies Write. A logger is made and
+// destroyed on any thread, but only while no other thread logs, makes or destroys one: it is the
+// current logger before its sink is complete.
 class PMLogger : public Stackable<PMLogger> {
 public:
     // Becomes the current logger. If logging has started, the logger that was current until now
@@ -29,6 +29,7 @@ public:
     explicit PMLogger(const std::string& name);
     ~PMLogger() override;
 
+    // True here, whatever the level; all callers pass 0.
     virtual bool IsEnabled(int level);
 
     // The text behind the last "\" or "/" that has something behind it; empty for null.
@@ -39,20 +40,27 @@ public:
     virtual void Log(const char* file, int line, const char* format, std::va_list arguments);
 
     // "NNNNN.YYYY.MM.DD_HH:MM:SS.mmm(+S.mmm)[tid=T] ": line number, universal time, seconds since
-    // this logger's previous line, thread name or id.
+    // this logger's previous line (0 for its first), thread name or id. Counts the line. The place
+    // isn't shown here; overrides may.
     virtual std::string GetPrefix(const char* file, int line);
 
+    // Empty, and not used by Log.
     virtual std::string GetSuffix();
+
+    // Called at the end of each line, with the log mutex held. Does nothing here.
     virtual void Flush();
+
+    // "\n" here.
     virtual std::string GetLineEnd();
 
     // The sink's output operation. Called with the log mutex held.
     virtual void Write(const char* data, std::size_t size) = 0;
 
-    // The timed entry points that callers use; each forwards to the operation of its purpose.
+    // The timed entry points that callers use; each only forwards to the operation of its purpose:
+    // IsEnabled at level 0, Log, GetLineEnd (whose text it gives, without writing it) and Write.
     bool IsEnabledWrapper();
     void LogPrintf(const char* file, int line, const char* format, ...) PMUTIL_PRINTF(4, 5);
-    void WriteLineEnd();
+    std::string WriteLineEnd();
     void WriteText(const char* data, std::size_t size);
 
     const std::string& GetName() const { return fName; }
@@ -97,28 +105,48 @@ private:
     std::string fName;
 };
 
-// The depth of indented log output. Nothing indents by itself.
-struct LogIndent {
-    void Increment();
-    void Decrement();
+// The depth of indented log output. Nothing indents by itself. Any thread.
+class LogIndent {
+public:
+    void Increment() { ++fDepth; }
+    void Decrement() { --fDepth; }
+
+private:
+    friend std::ostream& operator<<(std::ostream& out, const LogIndent& indent);
+
+    std::atomic<std::int32_t> fDepth{0};
 };
 // Writes one blank fewer than the depth.
 std::ostream& operator<<(std::ostream& out, const LogIndent& indent);
 extern LogIndent gLogIndent;
 
 namespace detail {
-// Writes one line to the current logger if it is enabled, the message being assembled by `message`
-// under the log mutex; swallows every exception.
-void LogStatement(const char* file, int line, const std::function<void(std::ostream&)>& message);
+// Inserts a statement's message, whatever its type, into a stream.
+using MessageInserter = void (*)(std::ostream& out, const void* message);
+
+// The slow road of a log statement: if the debug value is set and the current logger is enabled,
+// assembles the message under the log mutex and writes it as one line. Swallows every exception.
+void WriteStatement(DebugValue& record, const char* file, int line, MessageInserter insert,
+                    const void* message) noexcept;
+
+template <typename Message>
+void LogStatement(DebugValue& record, const char* file, int line, const Message& message) noexcept
+{
+    WriteStatement(
+        record, file, line,
+        [](std::ostream& out, const void* erased) { (*static_cast<const Message*>(erased))(out); },
+        &message);
+}
 } // namespace detail
 
-// A log statement: PM_LOG(gLog, "wmiNumDevices=" << count). While the debug value is 0 it costs a
-// load and a test; nothing of the message is evaluated.
-#define PM_LOG(debugValue, message)                                                                \
+// A log statement: PM_LOG(gLog, "wmiNumDevices=" << count). While the debug value is 0, nothing of
+// the message is evaluated. A message that throws costs the line, nothing else.
+#define PM_LOG(debugValue, ...)                                                                    \
     do {                                                                                           \
-        if (::pmutil::GetDebugValue(debugValue) != 0)                                              \
-            ::pmutil::detail::LogStatement(__FILE__, __LINE__,                                     \
-                                           [&](std::ostream& pmLogOut) { pmLogOut << message; });  \
+        if (::pmutil::detail::MayBeSet(debugValue))                                                \
+            ::pmutil::detail::LogStatement(                                                        \
+                debugValue, __FILE__, __LINE__,                                                    \
+                [&](std::ostream& pmLogOut) { pmLogOut << __VA_ARGS__; });                         \
     } while (false)
 
 } // namespace pmutil

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <algorithm>
+#include <utility>
 #include <vector>
 
 #include <boost/make_shared.hpp>
@@ -90,8 +91,8 @@ protected:
 private:
     static Stack Instances()
     {
-        static const Stack stack = boost::make_shared<std::vector<T*>>();
-        return stack;
+        static const Stack& stack = *new Stack(boost::make_shared<std::vector<T*>>());
+        return stack; // outlives all users
     }
 
     Stack fStack;

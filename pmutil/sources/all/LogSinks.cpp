@@ -1,0 +1,144 @@
+#include "pmutil/LogSinks.h"
+
+#include <set>
+
+#include <boost/filesystem/operations.hpp>
+#include <boost/thread/lock_guard.hpp>
+
+#include "all/LogTimer.h"
+#include "all/PathCodecvt.h"
+#include "pmutil/System.h"
+
+namespace pmutil {
+
+namespace {
+
+constexpr char kDefaultLogFile[] = "pmlog.txt";
+
+const char* NameOfStream(std::FILE* stream)
+{
+    if (stream != nullptr && stream == stdout)
+        return "stdout";
+    if (stream != nullptr && stream == stderr)
+        return "stderr";
+    return "FILE*";
+}
+
+boost::filesystem::path NativePath(const std::wstring& path)
+{
+    return boost::filesystem::path(path, GetPathCodecvt());
+}
+
+// True for the first logger of the process on that path. Under the log mutex.
+bool ClaimPath(const std::wstring& path)
+{
+    static std::set<std::wstring>& paths = *new std::set<std::wstring>; // outlives all users
+    return paths.insert(path).second;
+}
+
+} // namespace
+
+PMNullLogger::PMNullLogger() : PMLogger("PMNullLogger") {}
+
+PMNullLogger::~PMNullLogger() = default;
+
+bool PMNullLogger::IsEnabled(int /*level*/)
+{
+    return false;
+}
+
+void PMNullLogger::Log(const char* /*file*/, int /*line*/, const char* /*format*/,
+                       std::va_list /*arguments*/)
+{}
+
+void PMNullLogger::Write(const char* /*data*/, std::size_t /*size*/) {}
+
+PMStdioLogger::PMStdioLogger(std::FILE* stream) : PMLogger(NameOfStream(stream)), fFile(stream) {}
+
+PMStdioLogger::~PMStdioLogger() = default;
+
+void PMStdioLogger::Flush()
+{
+    const LogTimer timer;
+    // On a stream shared with the report a lost line must not make later ones fail.
+    if (fFile != nullptr && std::fflush(fFile) != 0)
+        DiscardUnwritten(fFile);
+}
+
+void PMStdioLogger::Write(const char* data, std::size_t size)
+{
+    const LogTimer timer;
+    if (fFile != nullptr)
+        std::fwrite(data, 1, size, fFile);
+}
+
+AssayLogger::AssayLogger() : PMStdioLogger(stdout) {}
+
+AssayLogger::~AssayLogger() = default;
+
+std::string AssayLogger::GetPrefix(const char* file, int line)
+{
+    return "# " + PMStdioLogger::GetPrefix(file, line);
+}
+
+PMFileLogger::PMFileLogger(const char* name) : PMFileLogger(GetDesktopFolder(), name) {}
+
+PMFileLogger::PMFileLogger(const std::wstring& folder, const char* name)
+    : PMLogger(name != nullptr ? name : kDefaultLogFile)
+{
+    const boost::filesystem::path file(GetName(), GetPathCodecvt());
+    fPath = (NativePath(folder) / file).wstring(GetPathCodecvt());
+    const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
+    boost::system::error_code ignored;
+    if (ClaimPath(fPath))
+        boost::filesystem::remove(NativePath(fPath), ignored);
+}
+
+PMFileLogger::~PMFileLogger()
+{
+    if (fFile != nullptr)
+        std::fclose(fFile);
+    try {
+        boost::system::error_code failed;
+        const boost::filesystem::path path = NativePath(fPath);
+        if (boost::filesystem::is_regular_file(path, failed) &&
+            boost::filesystem::is_empty(path, failed) && !failed)
+            boost::filesystem::remove(path, failed);
+    } catch (...) {
+        // What can't be named can't have been made.
+    }
+}
+
+bool PMFileLogger::Open()
+{
+    fFile = OpenSharedAppend(NativePath(fPath).string(GetPathCodecvt()));
+    if (fFile == nullptr && !fOpenFailureTold) {
+        fOpenFailureTold = true;
+        std::fprintf(stderr, "PMFileLogger: the log file %s can't be opened\n",
+                     NativePath(fPath).string(GetPathCodecvt()).c_str());
+    }
+    return fFile != nullptr;
+}
+
+void PMFileLogger::Flush()
+{
+    const LogTimer timer;
+    fLineLost = false;
+    if (fFile == nullptr)
+        return;
+    std::fclose(fFile);
+    fFile = nullptr;
+}
+
+void PMFileLogger::Write(const char* data, std::size_t size)
+{
+    const LogTimer timer;
+    // A line whose first piece is lost is lost whole.
+    if (fLineLost || (fFile == nullptr && !Open())) {
+        fLineLost = true;
+        return;
+    }
+    std::fwrite(data, 1, size, fFile);
+}
+
+} // namespace pmutil

@@ -1,0 +1,38 @@
+#include "all/LogTimer.h"
+
+#include <atomic>
+#include <cstdint>
+
+#include "pmutil/PMLogging.h"
+#include "pmutil/System.h"
+
+namespace pmutil {
+
+namespace {
+std::atomic<std::int32_t> gLogDepth{0};
+std::atomic<double> gLogTime{0};
+} // namespace
+
+// Nested calls don't read the clock: what they would measure is dropped anyway.
+LogTimer::LogTimer() : fOutermost(gLogDepth.fetch_add(1, std::memory_order_relaxed) == 0)
+{
+    if (fOutermost)
+        fStartTime = GetClockSeconds();
+}
+
+LogTimer::~LogTimer()
+{
+    gLogDepth.fetch_sub(1, std::memory_order_relaxed);
+    // A second thread may be outermost at the same time and one of the two sums get lost; that
+    // imprecision is cheaper than a lock.
+    if (fOutermost)
+        gLogTime.store(gLogTime.load(std::memory_order_relaxed) + (GetClockSeconds() - fStartTime),
+                       std::memory_order_relaxed);
+}
+
+double GetLogTime()
+{
+    return gLogTime.load(std::memory_order_relaxed);
+}
+
+} // namespace pmutil

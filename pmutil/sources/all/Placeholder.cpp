@@ -1,1 +1,0 @@
-// Gives the library a source until its first module lands.

@@ -1,0 +1,139 @@
+#include "pmutil/System.h"
+
+#include <pthread.h>
+#include <pwd.h>
+#include <stdio_ext.h>
+#include <sys/resource.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+#include <ctime>
+#include <fstream>
+#include <stdexcept>
+#include <vector>
+
+#include <boost/filesystem/detail/utf8_codecvt_facet.hpp>
+#include <boost/filesystem/operations.hpp>
+
+#include "all/PathCodecvt.h"
+#include "linux/UserDirs.h"
+
+namespace pmutil {
+
+namespace {
+
+thread_local std::uint64_t gThreadNumber = 0;
+
+void ForgetThreadNumber()
+{
+    gThreadNumber = 0;
+}
+
+// Empty if the password database doesn't know the user.
+std::string GetHomeFolder()
+{
+    std::vector<char> buffer(1024);
+    passwd entry{};
+    passwd* found = nullptr;
+    int status = 0;
+    while ((status = getpwuid_r(getuid(), &entry, buffer.data(), buffer.size(), &found)) == ERANGE)
+        buffer.resize(2 * buffer.size());
+    return status == 0 && found != nullptr && found->pw_dir != nullptr ? found->pw_dir : "";
+}
+
+std::string GetNarrowDesktopFolder()
+{
+    const std::string home = GetHomeFolder();
+    if (home.empty())
+        return {};
+    std::ifstream file(home + "/.config/user-dirs.dirs", std::ios::binary);
+    const std::string named = FindDesktopDir(file, home);
+    return named.empty() ? home + "/Desktop" : named;
+}
+
+} // namespace
+
+double GetClockSeconds()
+{
+    timespec now{};
+    clock_gettime(CLOCK_REALTIME, &now);
+    return static_cast<double>(now.tv_sec) + static_cast<double>(now.tv_nsec) * 1e-9;
+}
+
+std::uint64_t GetCurrentThreadNumber()
+{
+    // A system call per log line would cost more than the rest of the prefix. A forked child's
+    // thread has another number than its parent's.
+    static const int registered = pthread_atfork(nullptr, nullptr, ForgetThreadNumber);
+    if (gThreadNumber != 0 && registered == 0)
+        return gThreadNumber;
+    gThreadNumber = static_cast<std::uint64_t>(syscall(SYS_gettid));
+    return gThreadNumber;
+}
+
+void ShowThreadName(const std::string& name)
+{
+    constexpr std::size_t kMaxBytes = 15;
+    // The first thread's name is the process's, by which people look for it.
+    if (GetCurrentThreadNumber() != static_cast<std::uint64_t>(getpid()))
+        pthread_setname_np(pthread_self(), name.substr(0, kMaxBytes).c_str());
+}
+
+std::uint64_t GetPhysicalMemoryBytes()
+{
+    const long pages = sysconf(_SC_PHYS_PAGES);
+    const long pageSize = sysconf(_SC_PAGESIZE);
+    if (pages <= 0 || pageSize <= 0)
+        throw std::runtime_error("GlobalMemoryStatusEx failed");
+    return static_cast<std::uint64_t>(pages) * static_cast<std::uint64_t>(pageSize);
+}
+
+std::wstring GetDesktopFolder()
+{
+    try {
+        return boost::filesystem::path(GetNarrowDesktopFolder()).wstring(GetPathCodecvt());
+    } catch (const boost::system::system_error&) {
+        return {}; // a name that isn't UTF-8
+    }
+}
+
+std::wstring GetCurrentDirectoryPath()
+{
+    try {
+        return boost::filesystem::current_path().wstring(GetPathCodecvt());
+    } catch (const boost::system::system_error&) {
+        throw std::runtime_error("GetCurrentDirectoryW failed");
+    }
+}
+
+std::FILE* OpenSharedAppend(const std::string& path)
+{
+    return std::fopen(path.c_str(), "ae");
+}
+
+void DiscardUnwritten(std::FILE* stream)
+{
+    __fpurge(stream);
+    std::clearerr(stream);
+}
+
+void PrepareConsoleProcess()
+{
+    rlimit limit{};
+    if (getrlimit(RLIMIT_CORE, &limit) == 0) {
+        limit.rlim_cur = 0;
+        setrlimit(RLIMIT_CORE, &limit);
+    }
+    std::signal(SIGPIPE, SIG_IGN);
+}
+
+const boost::filesystem::path::codecvt_type& GetPathCodecvt()
+{
+    static const boost::filesystem::path::codecvt_type& facet =
+        *new boost::filesystem::detail::utf8_codecvt_facet(1); // outlives all users
+    return facet;
+}
+
+} // namespace pmutil
