@@ -1,0 +1,48 @@
+# What the scripts share; sourced, never run.
+set -euo pipefail
+cd "$(dirname "${BASH_SOURCE[0]}")/.."
+mkdir -p build
+
+# say TEXT: one line of progress on standard error.
+say() { printf '%s\n' "$*" >&2; }
+
+die() {
+    say "$*"
+    exit 1
+}
+
+# as_root COMMAND...: runs it as root, through sudo where that is needed.
+as_root() {
+    if [ "$(id -u)" = 0 ]; then
+        "$@"
+    elif command -v sudo >/dev/null; then
+        sudo "$@"
+    else
+        die "Installing packages needs root or sudo: $*"
+    fi
+}
+
+# quietly LOG COMMAND...: runs it with its output in build/logs/LOG, which is shown if it fails.
+quietly() {
+    local log=build/logs/$1
+    shift
+    mkdir -p build/logs
+    if ! "$@" >"$log" 2>&1; then
+        tail -n 200 "$log" >&2
+        die "Failed: $* (whole log: $log)"
+    fi
+}
+
+# timed WHAT COMMAND...: says what is being done and how long it took.
+timed() {
+    local what=$1 start=$SECONDS
+    shift
+    say "$what ..."
+    "$@"
+    say "$what: done in $((SECONDS - start)) s"
+}
+
+jobs=$(nproc)
+if command -v ccache >/dev/null; then
+    export CMAKE_CXX_COMPILER_LAUNCHER=ccache CMAKE_C_COMPILER_LAUNCHER=ccache
+fi
