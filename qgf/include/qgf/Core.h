@@ -68,5 +68,12 @@ public:
     static void Initialize();
 };
 
+// Asks the platform's dynamic loader for a sign of life. Throws LogicalException if it gives none.
+using LoaderCheck = void (*)();
+
+// Puts `check` in the place of the platform's own and forgets an earlier start; null brings the
+// platform's own back. For tests.
+void ReplaceLoaderCheck(LoaderCheck check);
+
 } // namespace Core
 } // namespace QGF

@@ -61,16 +61,22 @@ public:
     // How many display devices there are; 0 if the binding can't be loaded.
     static int NumDisplayDevice();
 
-    // Fills the key of device `index` and tells whether there is such a device.
+    // Fills the key of device `index` and tells whether there is such a device. False also for a
+    // device without a name: the system counts it, but no context can be made on it.
     static bool DisplayDevice(int index, DisplayDeviceKey& key);
 
-    // Makes this context current on the calling thread.
+    // Makes this context current on the calling thread. After an exception the context that was
+    // current before still is.
     void makeCurrent();
 
     // The context that the library made current on the calling thread; null if there is none.
     static Context* Current();
 
-    const OpenGLInterceptor& interceptor() const { return *fInterceptor; }
+    // The entry points, looked up when the context becomes current for the first time. Throws
+    // before that.
+    const OpenGLInterceptor& interceptor() const;
+
+    // Read at the first question, which must come while this context is current.
     ExtensionManager& extensionManager();
 
 protected:
@@ -78,11 +84,13 @@ protected:
 
 private:
     friend class ScopedContextWrapper;
-    static void SetCurrent(Context* context);
+    static void ReleaseCurrent() noexcept;
 
     std::unique_ptr<PlatformContext> fContext;
     std::unique_ptr<OpenGLInterceptor> fInterceptor;
     std::unique_ptr<ExtensionManager> fExtensionManager;
+    // Owns nothing; others hold weak pointers to it to see whether this context still lives.
+    std::shared_ptr<Context> fSelf;
 };
 
 // A context with no window: a compatibility context, so that the fixed-function names exist.
@@ -94,7 +102,8 @@ public:
 };
 
 // Remembers which context is current on this thread, and with `restore` set makes that one current
-// again, or none, at the end of the scope. The end of the scope never throws.
+// again, or none, at the end of the scope. None also if that context is gone or can't be made
+// current again: the end of the scope never throws.
 class ScopedContextWrapper {
 public:
     explicit ScopedContextWrapper(bool restore);
@@ -104,7 +113,7 @@ public:
 
 private:
     bool fRestore;
-    Context* fPrevious;
+    std::weak_ptr<Context> fPrevious;
 };
 
 // A shader program. Needs a current context from construction to destruction.
@@ -115,8 +124,8 @@ public:
     Program(const Program&) = delete;
     Program& operator=(const Program&) = delete;
 
-    // Compiles one shader from `count` strings, zero-terminated where `lengths` is null. Throws
-    // with the driver's log.
+    // Compiles one shader from `count` strings, zero-terminated where `lengths` is null, and adds
+    // it to the program. Throws with the driver's log.
     void loadVertexShader(int count, const char* const* strings, const std::int32_t* lengths);
     void loadFragmentShader(int count, const char* const* strings, const std::int32_t* lengths);
 
@@ -129,8 +138,8 @@ private:
                     const std::int32_t* lengths);
 
     std::uint32_t fProgram = 0;
-    std::uint32_t fVertexShader = 0;
-    std::uint32_t fFragmentShader = 0;
+    bool fHasVertexShader = false;
+    bool fHasFragmentShader = false;
 };
 
 // The texture formats that the library knows, by its own numbers.
@@ -139,10 +148,12 @@ enum class InternalFormat : std::int32_t { RGBA8 = 34 };
 // The type of the data handed over; Default is the format's natural one.
 enum class Type : std::int32_t { Default = -1 };
 
-// A two-dimensional texture. Needs a current context from construction to destruction.
+// A two-dimensional texture. Needs a current context from construction to destruction. An OpenGL
+// error raised on the way stays in OpenGL's queue for the caller's own question.
 class Texture2D {
 public:
     // `data` may be null: the content is undefined then. `mipmaps` asks for a full set of levels.
+    // Leaves no texture bound.
     Texture2D(InternalFormat format, std::int32_t width, std::int32_t height, bool mipmaps,
               const void* data, Type type);
     ~Texture2D();
@@ -152,6 +163,8 @@ public:
     std::uint32_t id() const { return fTexture; }
 
 private:
+    Texture2D();
+
     std::uint32_t fTexture = 0;
 };
 
@@ -167,7 +180,7 @@ public:
     void unbind();
 
     // Attaches a level of the texture as the colour attachment of that index. The framebuffer must
-    // be bound.
+    // be bound. Throws if the driver then doesn't call the framebuffer complete.
     void attach(const Texture2D& texture, std::uint32_t attachment, std::uint32_t level);
 
 private:
