@@ -1,0 +1,21 @@
+// The application of this program.
+#pragma once
+
+#include "GPUAssayApp.h"
+
+namespace assay {
+
+class PixmereAssay : public GPUAssayApp {
+public:
+    ~PixmereAssay() override;
+
+    // The one application of the process; it lives until the process ends. Run it once.
+    static PixmereAssay& Instance();
+
+    GPUAssayTester* CreateTester() override;
+
+private:
+    PixmereAssay();
+};
+
+} // namespace assay

@@ -1,0 +1,39 @@
+// The report's line forms. Values take a stream's default formatting: plain decimals, bools as 0 or
+// 1, six significant digits; text is written raw between double quotes.
+#pragma once
+
+#include <sstream>
+#include <string>
+
+namespace assay {
+
+// key=value
+template <typename Value>
+std::string ValueLine(const std::string& key, Value value)
+{
+    std::ostringstream line;
+    line << key << "=" << value;
+    return line.str();
+}
+
+// key="text"
+inline std::string TextLine(const std::string& key, const std::string& text)
+{
+    std::ostringstream line;
+    line << key << "=\"" << text << '"';
+    return line.str();
+}
+
+// tag.key
+inline std::string TaggedKey(const std::string& tag, const char* key)
+{
+    return tag + "." + key;
+}
+
+// tag.query[name]
+inline std::string IndexedKey(const std::string& tag, const char* query, const char* name)
+{
+    return tag + "." + query + "[" + name + "]";
+}
+
+} // namespace assay
