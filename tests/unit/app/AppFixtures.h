@@ -1,0 +1,276 @@
+// What the tests of the application share: an application that keeps its lines, a device that
+// answers from a table, and testers that enumerate such devices.
+#pragma once
+
+#include <functional>
+#include <iostream>
+#include <map>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include <boost/make_shared.hpp>
+
+#include "GPUAssayApp.h"
+#include "GPUAssayTester.h"
+#include "PixmereTester.h"
+
+namespace assay {
+
+using Lines = std::vector<std::string>;
+
+inline Lines operator+(Lines left, const Lines& right)
+{
+    left.insert(left.end(), right.begin(), right.end());
+    return left;
+}
+
+// Puts a buffer in the place of a standard stream's for the length of a scope.
+class RedirectStream {
+public:
+    RedirectStream(std::ostream& stream, std::streambuf* buffer)
+        : fStream(stream), fPrevious(stream.rdbuf(buffer))
+    {}
+    ~RedirectStream() { fStream.rdbuf(fPrevious); }
+    RedirectStream(const RedirectStream&) = delete;
+    RedirectStream& operator=(const RedirectStream&) = delete;
+
+private:
+    std::ostream& fStream;
+    std::streambuf* fPrevious;
+};
+
+// Collects what goes to standard error, the application's own lines and the tester's direct ones.
+class CapturedStderr {
+public:
+    Lines Take()
+    {
+        Lines lines;
+        std::istringstream text(fText.str());
+        for (std::string line; std::getline(text, line);)
+            lines.push_back(line);
+        fText.str("");
+        return lines;
+    }
+
+private:
+    std::ostringstream fText;
+    RedirectStream fRedirect{std::cerr, fText.rdbuf()};
+};
+
+// An application that keeps the lines of its report. Its tester comes from `makeTester`.
+class TestApp : public GPUAssayApp {
+public:
+    std::int32_t RunWith(const Lines& options)
+    {
+        Arguments arguments(options.begin(), options.end());
+        arguments.push_front("assay");
+        return Run(arguments);
+    }
+
+    GPUAssayTester* CreateTester() override { return makeTester ? makeTester(this) : nullptr; }
+    void DoStdout(const std::string& text) override { out.push_back(text); }
+
+    std::function<GPUAssayTester*(GPUAssayApp*)> makeTester;
+    Lines out;
+};
+
+// A device that answers with the name of the question, or with numbers of its own, and throws where
+// `failures` says so. It also serves as factory of the records in `gl` and `cl`.
+class FakeGPUImpl : public pmutil::GPUImpl {
+public:
+    // What a question throws, by the name of the operation.
+    std::map<std::string, std::function<void()>> failures;
+    // Operations in the order in which they were asked.
+    Lines asked;
+
+    std::string suffix; // behind each text
+    bool cudaSupported = true;
+    bool truth = true;
+    std::string cudaVersion = "4.2";
+    double bandwidth = 1234567890.0;
+    double compute = 32;
+    const char* shadingLanguage = "4.60";
+    std::int32_t integer = 16;
+
+    GLGPUs gl;
+    CLGPUs cl;
+
+private:
+    void Ask(const std::string& name)
+    {
+        asked.push_back(name);
+        const auto failure = failures.find(name);
+        if (failure != failures.end())
+            failure->second();
+    }
+    std::string Text(const char* name)
+    {
+        Ask(name);
+        return name + suffix;
+    }
+    std::uint32_t Number(const char* name, std::uint32_t value)
+    {
+        Ask(name);
+        return value;
+    }
+    bool Truth(const char* name)
+    {
+        Ask(name);
+        return truth;
+    }
+
+    GLGPUs DoGetGPUs() override
+    {
+        Ask("GPUs");
+        return gl;
+    }
+    CLGPUs DoGetCLGPUs() override
+    {
+        Ask("CLGPUs");
+        return cl;
+    }
+    std::string DoGetGLVersion() override { return Text("GLVersion"); }
+    std::uint32_t DoGetGLMemoryMB() override { return Number("GLMemoryMB", 4294967295U); }
+    std::string DoGetGLName() override { return Text("GLName"); }
+    std::string DoGetGLVendor() override { return Text("GLVendor"); }
+    std::uint32_t DoGetGLVendorID() override { return Number("GLVendorID", 0x10DE); }
+    std::string DoGetGLDriverVersion() override { return Text("GLDriverVersion"); }
+    std::uint32_t DoGetGLRectTextureSize() override { return Number("GLRectTextureSize", 16384); }
+    std::string DoGetGLRenderer() override { return Text("GLRenderer"); }
+    std::uint32_t DoGetGLRendererID() override { return Number("GLRendererID", 7); }
+    bool DoHasGLNPOTSupport() override { return Truth("HasGLNPOTSupport"); }
+    std::string DoGetGLDriver() override { return Text("GLDriver"); }
+    std::string DoGetGLDriverDate() override { return Text("GLDriverDate"); }
+    std::string DoGetGLDriverExtra() override { return Text("GLDriverExtra"); }
+    bool DoCompileProgramGLSL() override { return Truth("CanCompileProgramGLSL"); }
+    bool DoGLFramebufferOK() override { return Truth("GLFrameBufferOK"); }
+    const char* DoGLGetString(std::uint32_t name) override
+    {
+        Ask("GLGetString " + std::to_string(name));
+        return shadingLanguage;
+    }
+    void DoGLGetIntegerv(std::uint32_t name, std::int32_t* result) override
+    {
+        Ask("GLGetIntegerv " + std::to_string(name));
+        if (result != nullptr)
+            *result = integer;
+    }
+    void DoGLGetProgramivARB(std::uint32_t target, std::uint32_t code,
+                             std::int32_t* result) override
+    {
+        Ask("GLGetProgramivARB " + std::to_string(target) + " " + std::to_string(code));
+        if (result != nullptr)
+            *result = integer;
+    }
+    bool DoGLIsExtensionSupported(QGF::OGL::OpenGLExtension extension) override
+    {
+        Ask("GLIsExtensionSupported " + std::to_string(static_cast<std::int32_t>(extension)));
+        return truth;
+    }
+    bool DoIsIntegratedGLGPU() override { return Truth("IsIntegratedGLGPU"); }
+    std::string DoGetCLPlatformVersion() override { return Text("CLPlatformVersion"); }
+    std::uint32_t DoGetCLMemoryMB() override { return Number("CLMemoryMB", 2048); }
+    std::string DoGetCLName() override { return Text("CLName"); }
+    std::string DoGetCLVendor() override { return Text("CLVendor"); }
+    std::uint32_t DoGetCLVendorID() override { return Number("CLVendorID", 0x1002); }
+    std::string DoGetCLDriverVersion() override { return Text("CLDriverVersion"); }
+    bool DoGetCUDASupported() override
+    {
+        Ask("CUDASupported");
+        return cudaSupported;
+    }
+    std::string DoGetCUDAVersion() override
+    {
+        Ask("CUDAVersion");
+        return cudaVersion;
+    }
+    double DoGetCLBandwidth() override
+    {
+        Ask("CLBandwidth");
+        return bandwidth;
+    }
+    double DoGetCLCompute() override
+    {
+        Ask("CLCompute");
+        return compute;
+    }
+    std::uint64_t DoGetCLReserved() override { return 0; }
+    std::string DoGetCLDeviceVersion() override { return Text("CLDeviceVersion"); }
+    bool DoIsIntegratedCLGPU() override { return Truth("IsIntegratedCLGPU"); }
+};
+
+using FakeGPU = boost::shared_ptr<FakeGPUImpl>;
+
+// The devices of a machine, for a tester without a driver.
+struct FakeMachine {
+    std::vector<FakeGPU> gl;
+    std::vector<FakeGPU> cl;
+    bool oclAvailable = false;
+
+    FakeMachine() = default;
+    FakeMachine(std::size_t glCount, std::size_t clCount, bool available = true)
+        : oclAvailable(available)
+    {
+        for (std::size_t i = 0; i < glCount; ++i)
+            gl.push_back(boost::make_shared<FakeGPUImpl>());
+        for (std::size_t i = 0; i < clCount; ++i)
+            cl.push_back(boost::make_shared<FakeGPUImpl>());
+    }
+};
+
+// A tester of type Base on a fake machine: the library checks pass, and the enumerations find the
+// machine's devices.
+template <typename Base>
+class FakeTester : public Base {
+public:
+    FakeTester(GPUAssayApp* app, const FakeMachine& machine) : Base(app), fMachine(machine) {}
+
+    void DoRunQGFCoreInitialize() override { this->Report("QGFCoreInitialized=1"); }
+    void DoRunQGFOGLInitialize() override { this->Report("QGFOGLInitialized=1"); }
+    void DoRunOGLContextCreate() override { this->Report("OGLContextCreated=1"); }
+    void DoRunQGFOCLInitialize() override { this->fOCLAvailable = fMachine.oclAvailable; }
+    void DoRunGLEnumerate() override
+    {
+        FakeGPUImpl factory;
+        for (const FakeGPU& gpu : fMachine.gl)
+            factory.gl.push_back(boost::make_shared<pmutil::GLGPU>(gpu));
+        this->EnumerateGL(factory);
+    }
+    void DoRunCLEnumerate() override
+    {
+        FakeGPUImpl factory;
+        for (const FakeGPU& gpu : fMachine.cl)
+            factory.cl.push_back(boost::make_shared<pmutil::CLGPU>(gpu));
+        this->EnumerateCL(factory);
+    }
+    std::string GetTimestamp() override { return "2031-02-03_04:05:06"; }
+
+    // For tests of one operation.
+    using Base::EnumerateCL;
+    using Base::EnumerateGL;
+
+private:
+    FakeMachine fMachine;
+};
+
+inline boost::shared_ptr<pmutil::GLGPU> MakeGL(const FakeGPU& gpu)
+{
+    return boost::make_shared<pmutil::GLGPU>(gpu);
+}
+inline boost::shared_ptr<pmutil::CLGPU> MakeCL(const FakeGPU& gpu)
+{
+    return boost::make_shared<pmutil::CLGPU>(gpu);
+}
+
+// The application with a tester of type Tester on a fake machine.
+template <typename Tester>
+class MachineApp : public TestApp {
+public:
+    explicit MachineApp(const FakeMachine& machine)
+    {
+        makeTester = [machine](GPUAssayApp* app) { return new FakeTester<Tester>(app, machine); };
+    }
+};
+
+} // namespace assay

@@ -1,0 +1,191 @@
+#include "Output.h"
+
+#include <stdexcept>
+
+#include <gmock/gmock.h>
+
+#include "app/AppFixtures.h"
+
+namespace assay {
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+// Refuses its first `refusals` characters or flushes, then keeps what it gets.
+class UnreliableBuffer : public std::stringbuf {
+public:
+    explicit UnreliableBuffer(int refusals) : fRefusals(refusals) {}
+
+protected:
+    std::streamsize xsputn(const char* text, std::streamsize size) override
+    {
+        return Refuse() ? 0 : std::stringbuf::xsputn(text, size);
+    }
+    int_type overflow(int_type character) override
+    {
+        return Refuse() ? traits_type::eof() : std::stringbuf::overflow(character);
+    }
+
+private:
+    bool Refuse() { return fRefusals > 0 && fRefusals-- > 0; }
+    int fRefusals;
+};
+
+// Takes everything and can't write any of it out.
+class UnflushableBuffer : public std::stringbuf {
+protected:
+    int sync() override { return -1; }
+};
+
+class ThrowingBuffer : public std::streambuf {
+protected:
+    int_type overflow(int_type) override { throw std::runtime_error("broken"); }
+};
+
+// An application on the real standard output stream.
+class PlainApp : public GPUAssayApp {};
+
+TEST(Output, TextOrNullNamesANullPointer)
+{
+    EXPECT_STREQ(TextOrNull("x"), "x");
+    EXPECT_STREQ(TextOrNull(nullptr), "<NULL>");
+}
+
+TEST(Output, StdoutWritesTheTextAndALineEnd)
+{
+    PlainApp app;
+    std::stringbuf buffer;
+    {
+        const RedirectStream redirect(std::cout, &buffer);
+        app.Stdout("key=\"a\"b\"");
+        app.Stdout("");
+        app.Comment("text");
+    }
+    EXPECT_EQ(buffer.str(), "key=\"a\"b\"\n\n# text\n");
+}
+
+TEST(Output, ALineMayHoldAnyByte)
+{
+    PlainApp app;
+    std::stringbuf buffer;
+    const std::string text("a\0b\n\xFF", 5);
+    {
+        const RedirectStream redirect(std::cout, &buffer);
+        app.Stdout(text);
+    }
+    EXPECT_EQ(buffer.str(), text + "\n");
+}
+
+TEST(Output, ALostLineIsToldAndTheNextOneTriedAfresh)
+{
+    PlainApp app;
+    CapturedStderr err;
+    UnreliableBuffer buffer(1);
+    {
+        const RedirectStream redirect(std::cout, &buffer);
+        app.Stdout("lost");
+        app.Stdout("kept");
+    }
+    EXPECT_EQ(buffer.str(), "kept\n");
+    EXPECT_THAT(err.Take(), ElementsAre("DoStdout failed"));
+}
+
+TEST(Output, AFailingFlushLosesTheLineToo)
+{
+    PlainApp app;
+    CapturedStderr err;
+    UnflushableBuffer buffer;
+    {
+        const RedirectStream redirect(std::cout, &buffer);
+        app.Stdout("one");
+        app.Stdout("two");
+    }
+    EXPECT_THAT(err.Take(), ElementsAre("DoStdout failed", "DoStdout failed"));
+}
+
+TEST(Output, AThrowingStreamLosesTheLineToo)
+{
+    PlainApp app;
+    CapturedStderr err;
+    ThrowingBuffer buffer;
+    {
+        const RedirectStream redirect(std::cout, &buffer);
+        app.Stdout("one");
+    }
+    EXPECT_THAT(err.Take(), ElementsAre("DoStdout failed"));
+}
+
+TEST(Output, StderrWritesTheTextAndALineEnd)
+{
+    PlainApp app;
+    CapturedStderr err;
+    app.Stderr("one");
+    app.Stderr("two");
+    EXPECT_THAT(err.Take(), ElementsAre("one", "two"));
+}
+
+TEST(Output, StderrTriesOnceMoreAndNeverThrows)
+{
+    PlainApp app;
+    UnreliableBuffer once(1);
+    {
+        const RedirectStream redirect(std::cerr, &once);
+        app.Stderr("text");
+    }
+    EXPECT_EQ(once.str(), "text\n");
+
+    ThrowingBuffer never;
+    {
+        const RedirectStream redirect(std::cerr, &never);
+        EXPECT_NO_THROW(app.Stderr("text"));
+    }
+    CapturedStderr err;
+    app.Stderr("later");
+    EXPECT_THAT(err.Take(), ElementsAre("later"));
+}
+
+// Overrides of the three operations.
+class OddApp : public GPUAssayApp {
+public:
+    void DoComment(const std::string& text) override { Stdout("; " + text); }
+    void DoStdout(const std::string& text) override
+    {
+        if (text == "bad")
+            throw 1; // NOLINT(hicpp-exception-baseclass): anything may be thrown here
+        out.push_back(text);
+    }
+    void DoStderr(const std::string& text) override
+    {
+        if (throwFromStderr)
+            throw 2; // NOLINT(hicpp-exception-baseclass): anything may be thrown here
+        err.push_back(text);
+    }
+
+    bool throwFromStderr = false;
+    Lines out;
+    Lines err;
+};
+
+TEST(Output, OverridesAreHonoured)
+{
+    OddApp app;
+    app.Comment("c");
+    app.Stdout("bad");
+    app.Stderr("e");
+    EXPECT_THAT(app.out, ElementsAre("; c"));
+    EXPECT_THAT(app.err, ElementsAre("DoStdout failed", "e"));
+}
+
+TEST(Output, ThrowingStderrOverrideFallsBackOnTheStream)
+{
+    OddApp app;
+    app.throwFromStderr = true;
+    CapturedStderr err;
+    app.Stderr("text");
+    EXPECT_THAT(err.Take(), ElementsAre("text"));
+    EXPECT_THAT(app.err, IsEmpty());
+}
+
+} // namespace
+} // namespace assay
