@@ -1,0 +1,20 @@
+// The logger of the debugger's output stream. Exists on Windows only.
+#pragma once
+
+#include <string>
+
+#include "pmutil/PMLogging.h"
+
+namespace pmutil {
+
+// Hands each piece of a line to the debugger as a text of its own: prefix, message and line end,
+// which is a carriage return and a newline. Its name is "DebugStr".
+class PMDebugStrLogger : public PMLogger {
+public:
+    PMDebugStrLogger();
+    ~PMDebugStrLogger() override;
+    std::string GetLineEnd() override;
+    void Write(const char* data, std::size_t size) override;
+};
+
+} // namespace pmutil

@@ -1,0 +1,126 @@
+#include "pmutil/System.h"
+
+#include <windows.h>
+
+#include <knownfolders.h>
+#include <shlobj.h>
+
+#include <csignal>
+#include <share.h>
+#include <stdexcept>
+#include <vector>
+
+#include "all/PathCodecvt.h"
+
+namespace pmutil {
+
+namespace {
+
+// The debugger's thread-naming exception and its record, as debuggers know them.
+constexpr DWORD kThreadNameException = 0x406D1388;
+constexpr DWORD kThreadNameType = 0x1000;
+
+#pragma pack(push, 8)
+struct ThreadNameRecord {
+    DWORD type;
+    LPCSTR name;
+    DWORD threadID; // -1: the calling thread
+    DWORD flags;
+};
+#pragma pack(pop)
+
+// Swallows that exception where no debugger took it, so that it can't end the thread.
+LONG CALLBACK SwallowThreadNameException(EXCEPTION_POINTERS* pointers)
+{
+    return pointers->ExceptionRecord->ExceptionCode == kThreadNameException
+               ? EXCEPTION_CONTINUE_EXECUTION
+               : EXCEPTION_CONTINUE_SEARCH;
+}
+
+} // namespace
+
+double GetClockSeconds()
+{
+    constexpr double kSecondsPerTick = 1e-7;
+    constexpr std::int64_t kTicksFrom1601To1970 = 116444736000000000;
+    FILETIME now{};
+    GetSystemTimeAsFileTime(&now);
+    ULARGE_INTEGER ticks{};
+    ticks.LowPart = now.dwLowDateTime;
+    ticks.HighPart = now.dwHighDateTime;
+    return static_cast<double>(static_cast<std::int64_t>(ticks.QuadPart) - kTicksFrom1601To1970) *
+           kSecondsPerTick;
+}
+
+std::uint64_t GetCurrentThreadNumber()
+{
+    return GetCurrentThreadId();
+}
+
+void ShowThreadName(const std::string& name)
+{
+    const ThreadNameRecord record{kThreadNameType, name.c_str(), static_cast<DWORD>(-1), 0};
+    void* const handler = AddVectoredExceptionHandler(1, SwallowThreadNameException);
+    if (handler == nullptr)
+        return;
+    RaiseException(kThreadNameException, 0, sizeof record / sizeof(ULONG_PTR),
+                   reinterpret_cast<const ULONG_PTR*>(&record));
+    RemoveVectoredExceptionHandler(handler);
+}
+
+std::uint64_t GetPhysicalMemoryBytes()
+{
+    MEMORYSTATUSEX status{};
+    static_assert(sizeof status == 64, "the length that the call expects");
+    status.dwLength = sizeof status;
+    if (GlobalMemoryStatusEx(&status) == 0)
+        throw std::runtime_error("GlobalMemoryStatusEx failed");
+    return status.ullTotalPhys;
+}
+
+std::wstring GetDesktopFolder()
+{
+    PWSTR folder = nullptr;
+    std::wstring result;
+    if (SUCCEEDED(SHGetKnownFolderPath(FOLDERID_Desktop, 0, nullptr, &folder)) && folder != nullptr)
+        result = folder;
+    CoTaskMemFree(folder);
+    return result;
+}
+
+std::wstring GetCurrentDirectoryPath()
+{
+    std::vector<wchar_t> buffer(MAX_PATH);
+    for (;;) {
+        const DWORD length = GetCurrentDirectoryW(static_cast<DWORD>(buffer.size()), buffer.data());
+        if (length == 0)
+            throw std::runtime_error("GetCurrentDirectoryW failed");
+        if (length < buffer.size())
+            return std::wstring(buffer.data(), length);
+        buffer.resize(length); // what it asks for includes the terminating zero
+    }
+}
+
+std::FILE* OpenSharedAppend(const std::string& path)
+{
+    return _fsopen(path.c_str(), "a", _SH_DENYNO);
+}
+
+void DiscardUnwritten(std::FILE* stream)
+{
+    // The runtime empties its buffer when a write fails; only the error state stays.
+    std::clearerr(stream);
+}
+
+void PrepareConsoleProcess()
+{
+    const UINT before = SetErrorMode(SEM_NOGPFAULTERRORBOX);
+    SetErrorMode(before | SEM_NOGPFAULTERRORBOX);
+}
+
+const boost::filesystem::path::codecvt_type& GetPathCodecvt()
+{
+    return boost::filesystem::path::codecvt(); // the code page of the narrow file calls
+}
+
+} // namespace pmutil

@@ -1,0 +1,114 @@
+#include "qgf/qgf_ogl/win/WGLPlatform.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <string>
+
+#include "qgf/qgf_core/win/SystemError.h"
+#include "qgf/qgf_ogl/win/HiddenWindow.h"
+
+namespace QGF {
+namespace OGL {
+
+namespace {
+
+class WGLOffscreen : public PlatformContext {
+public:
+    WGLOffscreen(const WGLTable& wgl, const Core::DynamicLibrary& library,
+                 const DisplayDeviceKey& key)
+        : fWGL(wgl),
+          fLibrary(library),
+          fWindow(key.deviceName()),
+          fContext(wgl.wglCreateContext(fWindow.dc()))
+    {
+        const DWORD error = GetLastError();
+        if (fContext == nullptr)
+            throw LogicalException("wglCreateContext failed for display device " +
+                                   key.deviceName() + ": " + Core::SystemErrorText(error));
+    }
+
+    ~WGLOffscreen() override { fWGL.wglDeleteContext(fContext); }
+
+    WGLOffscreen(const WGLOffscreen&) = delete;
+    WGLOffscreen& operator=(const WGLOffscreen&) = delete;
+
+    void makeCurrent() override
+    {
+        if (fWGL.wglMakeCurrent(fWindow.dc(), fContext) == 0)
+            throw LogicalException("wglMakeCurrent failed: " +
+                                   Core::SystemErrorText(GetLastError()));
+    }
+
+    void release() noexcept override { fWGL.wglMakeCurrent(nullptr, nullptr); }
+
+    Core::Proc getProc(const char* name) override
+    {
+        // The driver's own answer where there is one; some drivers answer with small numbers in
+        // place of null. What came with OpenGL 1.1 stands in the library itself.
+        constexpr std::intptr_t kSmallest = 3;
+        const auto proc = reinterpret_cast<Core::Proc>(fWGL.wglGetProcAddress(name));
+        const auto value = reinterpret_cast<std::intptr_t>(proc);
+        return value > kSmallest || value < -1 ? proc : fLibrary.getProc(name);
+    }
+
+private:
+    const WGLTable& fWGL;
+    const Core::DynamicLibrary& fLibrary;
+    HiddenWindow fWindow;
+    HGLRC fContext;
+};
+
+template <typename Function>
+void FillEntry(Function& entry, const Core::DynamicLibrary& library, const char* name)
+{
+    entry = reinterpret_cast<Function>(library.getProc(name));
+    if (entry == nullptr)
+        throw LogicalException(std::string("opengl32.dll has no ") + name);
+}
+
+} // namespace
+
+WGLPlatform::WGLPlatform(std::unique_ptr<Core::DynamicLibrary> library)
+    : fLibrary(std::move(library))
+{
+    FillEntry(fWGL.wglCreateContext, *fLibrary, "wglCreateContext");
+    FillEntry(fWGL.wglDeleteContext, *fLibrary, "wglDeleteContext");
+    FillEntry(fWGL.wglMakeCurrent, *fLibrary, "wglMakeCurrent");
+    FillEntry(fWGL.wglGetProcAddress, *fLibrary, "wglGetProcAddress");
+}
+
+std::vector<DisplayDeviceKey> WGLPlatform::displayDevices()
+{
+    std::vector<DisplayDeviceKey> keys;
+    std::size_t numPrimary = 0;
+    DISPLAY_DEVICEW device{};
+    device.cb = sizeof device;
+    for (DWORD index = 0; EnumDisplayDevicesW(nullptr, index, &device, 0) != 0; ++index) {
+        // A context needs a window, and a window a desktop; a mirroring driver is no device.
+        if ((device.StateFlags & DISPLAY_DEVICE_ATTACHED_TO_DESKTOP) == 0 ||
+            (device.StateFlags & DISPLAY_DEVICE_MIRRORING_DRIVER) != 0)
+            continue;
+        const DisplayDeviceKey key(Core::ToUTF8(device.DeviceName),
+                                   Core::ToUTF8(device.DeviceString),
+                                   Core::ToUTF8(device.DeviceID));
+        if ((device.StateFlags & DISPLAY_DEVICE_PRIMARY_DEVICE) != 0)
+            keys.insert(keys.begin() + static_cast<std::ptrdiff_t>(numPrimary++), key);
+        else
+            keys.push_back(key);
+    }
+    return keys;
+}
+
+std::unique_ptr<PlatformContext> WGLPlatform::createOffscreen(const DisplayDeviceKey& key)
+{
+    return std::make_unique<WGLOffscreen>(fWGL, *fLibrary, key);
+}
+
+std::unique_ptr<Platform> MakeNativePlatform()
+{
+    static const char* const names[] = {"opengl32.dll", nullptr};
+    return std::make_unique<WGLPlatform>(Core::OpenLibrary(names));
+}
+
+} // namespace OGL
+} // namespace QGF
