@@ -1,14 +1,9 @@
-# Boost for Windows: the packaged headers, reached through a folder that holds only a link to them,
-# and the compiled libraries built here from the distribution's own source of the same version
+# Boost for Windows: the packaged headers (WindowsHeaders), and the compiled libraries built here from the distribution's own source of the same version
 # (ASSAY_BOOST_SOURCE, filled by scripts/fetch-boost-source).
 set(ASSAY_BOOST_SOURCE ${CMAKE_SOURCE_DIR}/build/deps/boost CACHE PATH "Unpacked Boost source")
 if(NOT EXISTS ${ASSAY_BOOST_SOURCE}/libs/thread/src)
   message(FATAL_ERROR "No Boost source in ${ASSAY_BOOST_SOURCE}: run scripts/build windows, which fetches it")
 endif()
-
-set(include ${CMAKE_BINARY_DIR}/boost/include)
-file(MAKE_DIRECTORY ${include})
-file(CREATE_LINK /usr/include/boost ${include}/boost SYMBOLIC)
 
 set(libs ${ASSAY_BOOST_SOURCE}/libs)
 file(GLOB sources
@@ -16,7 +11,7 @@ file(GLOB sources
   ${libs}/chrono/src/*.cpp
   ${libs}/filesystem/src/*.cpp)
 add_library(boost_windows STATIC ${sources})
-target_include_directories(boost_windows SYSTEM PUBLIC ${include})
+target_link_libraries(boost_windows PUBLIC windows_headers)
 target_compile_definitions(boost_windows
   PUBLIC BOOST_ALL_NO_LIB BOOST_THREAD_USE_LIB BOOST_USE_WINDOWS_H BOOST_SYSTEM_NO_DEPRECATED
     BOOST_CHRONO_STATIC_LINK BOOST_FILESYSTEM_STATIC_LINK

@@ -2,6 +2,7 @@
 set(THREADS_PREFER_PTHREAD_FLAG ON)
 find_package(Threads REQUIRED)
 if(WIN32)
+  include(WindowsHeaders)
   include(BoostWindows)
 else()
   set(Boost_USE_STATIC_LIBS ON)
