@@ -35,6 +35,15 @@ std::string WithoutVersionPrefix(const std::string& text)
                : text;
 }
 
+// The adapter lists aren't consulted for OpenCL: nothing is known here, in contrast to an adapter
+// that was looked for and not found.
+void ClearAdapterData(WMIData& data)
+{
+    for (std::string* text : {&data.fName, &data.fCaption, &data.fInstalledDisplayDrivers,
+                              &data.fVideoModeDescription, &data.fDriverVersion, &data.fDriverDate})
+        text->clear();
+}
+
 // The platform's version, and the CUDA version that some platforms append to it.
 void SplitVersion(const QGF::OCL::Device& device, std::string& platformVersion,
                   std::string& cudaVersion)
@@ -59,6 +68,7 @@ GPUImpl::CLGPUs GPUImplHardware::DoGetCLGPUs()
     for (const QGF::OCL::Platform& platform : QGF::OCL::platforms()) {
         for (const QGF::OCL::Device& found : platform.devices(CL_DEVICE_TYPE_GPU)) {
             const boost::shared_ptr<GPUImplWin> impl = boost::make_shared<GPUImplWin>();
+            ClearAdapterData(impl->fWMI);
             impl->device = found;
             gpus.push_back(boost::make_shared<CLGPU>(boost::shared_ptr<GPUImpl>(impl)));
         }

@@ -1,0 +1,378 @@
+#include "qgf/OCL.h"
+
+#include <set>
+
+#include <gmock/gmock.h>
+
+#include "support/FakeOpenCL.h"
+
+namespace {
+
+using assay_test::CLAnswer;
+using assay_test::CLFakeDevice;
+using assay_test::CLFakePlatform;
+using assay_test::CLText;
+using assay_test::CLValue;
+using assay_test::FakeOpenCL;
+using QGF::OCL::Device;
+using QGF::OCL::DeviceProperty;
+using QGF::OCL::Platform;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+constexpr std::size_t kTerabyte = std::size_t{1} << 40U;
+
+// The text of the LogicalException that `action` throws; empty if it throws none.
+template <typename Action>
+std::string RefusalOf(const Action& action)
+{
+    try {
+        action();
+    } catch (const QGF::LogicalException& e) {
+        return e.what();
+    }
+    return {};
+}
+
+class OCLTest : public testing::Test {
+protected:
+    OCLTest()
+    {
+        cl.platforms = {{11,
+                         {{CL_PLATFORM_VERSION, CLText("OpenCL 1.2 First")}},
+                         {{101,
+                           CL_DEVICE_TYPE_GPU,
+                           {{CL_DEVICE_NAME, CLText("First device")},
+                            {CL_DEVICE_VENDOR, CLText("First vendor")},
+                            {CL_DEVICE_PLATFORM, CLValue(std::uintptr_t{11})},
+                            {CL_DEVICE_VENDOR_ID, CLValue(cl_uint{0x10DE})},
+                            {CL_DEVICE_GLOBAL_MEM_SIZE, CLValue(cl_ulong{3} << 30U)}}},
+                          {102, CL_DEVICE_TYPE_CPU, {}},
+                          {103, CL_DEVICE_TYPE_GPU, {}}},
+                         CL_SUCCESS,
+                         {}},
+                        {12, {}, {{104, CL_DEVICE_TYPE_CPU, {}}}, CL_SUCCESS, {}}};
+    }
+
+    std::map<cl_device_info, CLAnswer>& answers() { return cl.platforms[0].devices[0].answers; }
+
+    FakeOpenCL cl;
+    Device device{FakeOpenCL::DeviceID(101)};
+    Platform platform{reinterpret_cast<cl_platform_id>(std::uintptr_t{11})};
+};
+
+TEST_F(OCLTest, ListsPlatformsInTheLoadersOrder)
+{
+    const std::vector<Platform> found = QGF::OCL::platforms();
+    ASSERT_EQ(found.size(), 2U);
+    EXPECT_EQ(found[0].id(), platform.id());
+    EXPECT_EQ(found[1].handle(), reinterpret_cast<cl_platform_id>(std::uintptr_t{12}));
+    EXPECT_THAT(cl.calls, ElementsAre("clGetPlatformIDs(0)", "clGetPlatformIDs(2)"));
+}
+
+TEST_F(OCLTest, NoPlatformIsAnEmptyList)
+{
+    cl.platformsStatus = -1001;
+    EXPECT_THAT(QGF::OCL::platforms(), IsEmpty());
+    EXPECT_THAT(cl.calls, ElementsAre("clGetPlatformIDs(0)"));
+}
+
+TEST_F(OCLTest, ACountOfZeroPlatformsIsAnEmptyList)
+{
+    cl.platforms.clear();
+    EXPECT_THAT(QGF::OCL::platforms(), IsEmpty());
+}
+
+TEST_F(OCLTest, AnotherFailureOfTheLoaderIsAFailure)
+{
+    cl.platformsStatus = CL_OUT_OF_HOST_MEMORY;
+    EXPECT_EQ(RefusalOf([] { QGF::OCL::platforms(); }),
+              "clGetPlatformIDs failed: CL_OUT_OF_HOST_MEMORY (-6)");
+}
+
+TEST_F(OCLTest, AFailureOfTheSecondPlatformCallIsAFailure)
+{
+    cl.failing[1] = -1001;
+    EXPECT_EQ(RefusalOf([] { QGF::OCL::platforms(); }),
+              "clGetPlatformIDs failed: CL_PLATFORM_NOT_FOUND_KHR (-1001)");
+}
+
+TEST_F(OCLTest, PlatformsBeyondReasonAreRefused)
+{
+    cl.claimedPlatforms = 4097;
+    EXPECT_EQ(RefusalOf([] { QGF::OCL::platforms(); }),
+              "clGetPlatformIDs: the driver claims a list of 4097 entries");
+    EXPECT_THAT(cl.calls, ElementsAre("clGetPlatformIDs(0)"));
+}
+
+TEST_F(OCLTest, PlatformsThatAreClaimedButNotGivenAreLeftOut)
+{
+    cl.claimedPlatforms = 4096;
+    EXPECT_EQ(QGF::OCL::platforms().size(), 2U);
+}
+
+TEST_F(OCLTest, ListsDevicesOfOneTypeInThePlatformsOrder)
+{
+    const std::vector<Device> found = platform.devices(CL_DEVICE_TYPE_GPU);
+    ASSERT_EQ(found.size(), 2U);
+    EXPECT_EQ(found[0].id(), FakeOpenCL::DeviceID(101));
+    EXPECT_EQ(found[1].id(), FakeOpenCL::DeviceID(103));
+    EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceIDs(platform 11, 4, 0)",
+                                      "clGetDeviceIDs(platform 11, 4, 2)"));
+}
+
+TEST_F(OCLTest, DeviceNotFoundIsAnEmptyList)
+{
+    EXPECT_THAT(QGF::OCL::platforms()[1].devices(CL_DEVICE_TYPE_GPU), IsEmpty());
+}
+
+TEST_F(OCLTest, AnotherFailureOfAPlatformIsAFailure)
+{
+    cl.platforms[0].devicesStatus = CL_INVALID_PLATFORM;
+    EXPECT_EQ(RefusalOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
+              "clGetDeviceIDs failed: CL_INVALID_PLATFORM (-32)");
+}
+
+TEST_F(OCLTest, AStatusWithoutANameIsToldByItsNumber)
+{
+    cl.platforms[0].devicesStatus = -9999;
+    EXPECT_EQ(RefusalOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
+              "clGetDeviceIDs failed: unknown status (-9999)");
+}
+
+TEST_F(OCLTest, DevicesBeyondReasonAreRefused)
+{
+    cl.platforms[0].claimedDevices = 0xFFFFFFFFU;
+    EXPECT_EQ(RefusalOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
+              "clGetDeviceIDs: the driver claims a list of 4294967295 entries");
+}
+
+TEST_F(OCLTest, DevicesThatAreClaimedButNotGivenAreLeftOut)
+{
+    cl.platforms[0].claimedDevices = 9;
+    EXPECT_EQ(platform.devices(CL_DEVICE_TYPE_GPU).size(), 2U);
+}
+
+TEST_F(OCLTest, ANullDeviceIdFailsItsOwnQueriesOnly)
+{
+    cl.platforms[0].devices[0].id = 0;
+    const std::vector<Device> found = platform.devices(CL_DEVICE_TYPE_GPU);
+    ASSERT_EQ(found.size(), 2U);
+    EXPECT_EQ(RefusalOf([&] { (void)found[0].name(); }),
+              "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_INVALID_DEVICE (-33)");
+}
+
+TEST_F(OCLTest, PlatformVersionIsTheDriversText)
+{
+    EXPECT_EQ(platform.version(), "OpenCL 1.2 First");
+}
+
+TEST_F(OCLTest, PlatformVersionThatFailsIsAFailure)
+{
+    EXPECT_EQ(RefusalOf([] { (void)QGF::OCL::platforms()[1].version(); }),
+              "clGetPlatformInfo(CL_PLATFORM_VERSION) failed: CL_INVALID_VALUE (-30)");
+}
+
+TEST_F(OCLTest, DeviceTextsAreTheDriversTexts)
+{
+    EXPECT_EQ(device.name(), "First device");
+    EXPECT_EQ(device.vendor(), "First vendor");
+    EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceInfo(device 101, 4139, 0)",
+                                      "clGetDeviceInfo(device 101, 4139, 13)",
+                                      "clGetDeviceInfo(device 101, 4140, 0)",
+                                      "clGetDeviceInfo(device 101, 4140, 13)"));
+}
+
+TEST_F(OCLTest, ATextKeepsZeroBytesInside)
+{
+    answers()[CL_DEVICE_NAME] = CLText(std::string("a\0b", 3));
+    EXPECT_EQ(device.name(), std::string("a\0b", 3));
+}
+
+TEST_F(OCLTest, AnUnterminatedTextEndsWhereTheDriverSays)
+{
+    answers()[CL_DEVICE_NAME] = CLAnswer{"abc", {}, CL_SUCCESS, CL_SUCCESS};
+    EXPECT_EQ(device.name(), "abc");
+}
+
+TEST_F(OCLTest, ATextOfNoBytesIsEmptyWithoutASecondCall)
+{
+    answers()[CL_DEVICE_NAME] = CLAnswer{"", {}, CL_SUCCESS, CL_SUCCESS};
+    EXPECT_EQ(device.name(), "");
+    EXPECT_EQ(cl.calls.size(), 1U);
+}
+
+TEST_F(OCLTest, ATextOfOneMebibyteIsRead)
+{
+    answers()[CL_DEVICE_NAME] = CLText(std::string(1024 * 1024 - 1, 'x'));
+    EXPECT_EQ(device.name().size(), 1024U * 1024 - 1);
+}
+
+TEST_F(OCLTest, ATextBeyondReasonIsRefusedBeforeItIsAllocated)
+{
+    answers()[CL_DEVICE_VENDOR] = CLAnswer{"x", kTerabyte, CL_SUCCESS, CL_SUCCESS};
+    EXPECT_EQ(RefusalOf([&] { (void)device.vendor(); }),
+              "clGetDeviceInfo(CL_DEVICE_VENDOR): the driver claims a text of 1099511627776 bytes");
+    EXPECT_EQ(cl.calls.size(), 1U);
+}
+
+TEST_F(OCLTest, ATextThatFailsOnEitherCallIsAFailure)
+{
+    answers()[CL_DEVICE_NAME].sizeStatus = CL_OUT_OF_RESOURCES;
+    EXPECT_EQ(RefusalOf([&] { (void)device.name(); }),
+              "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_OUT_OF_RESOURCES (-5)");
+    answers()[CL_DEVICE_NAME].sizeStatus = CL_SUCCESS;
+    answers()[CL_DEVICE_NAME].valueStatus = CL_OUT_OF_RESOURCES;
+    EXPECT_EQ(RefusalOf([&] { (void)device.name(); }),
+              "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_OUT_OF_RESOURCES (-5)");
+}
+
+TEST_F(OCLTest, ADeviceKnowsItsPlatform)
+{
+    EXPECT_EQ(device.platform().id(), platform.id());
+    EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceInfo(device 101, 4145, 8)"));
+}
+
+TEST_F(OCLTest, ANullPlatformOfADeviceIsRefused)
+{
+    answers()[CL_DEVICE_PLATFORM] = CLValue(std::uintptr_t{0});
+    EXPECT_EQ(RefusalOf([&] { (void)device.platform(); }),
+              "clGetDeviceInfo(CL_DEVICE_PLATFORM): the driver gives no platform");
+}
+
+TEST_F(OCLTest, PropertyTypesHaveTheNamesOfTheirCTypes)
+{
+    EXPECT_STREQ(QGF::OCL::Enum::GetPropertyTypeName(DeviceProperty::VendorID), "cl_uint");
+    EXPECT_STREQ(QGF::OCL::Enum::GetPropertyTypeName(DeviceProperty::GlobalMemSize), "cl_ulong");
+    EXPECT_STREQ(QGF::OCL::Enum::GetPropertyTypeName(static_cast<DeviceProperty>(0x1000)), "");
+}
+
+TEST_F(OCLTest, TypedReadGivesTheValue)
+{
+    EXPECT_EQ(device.getInfo<cl_uint>(DeviceProperty::VendorID), 0x10DEU);
+    EXPECT_EQ(device.getInfo<cl_ulong>(DeviceProperty::GlobalMemSize), 3221225472U);
+    EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceInfo(device 101, 4097, 4)",
+                                      "clGetDeviceInfo(device 101, 4127, 8)"));
+}
+
+TEST_F(OCLTest, TypedReadOfAnotherTypeIsAMistakeOfTheCaller)
+{
+    try {
+        (void)device.getInfo<cl_ulong>(DeviceProperty::VendorID);
+        FAIL() << "nothing was thrown";
+    } catch (const QGF::InternalException& e) {
+        EXPECT_STREQ(e.file(), "qgf/source/qgf/qgf_ocl/Device");
+        EXPECT_EQ(e.line(), 122);
+        EXPECT_STREQ(e.text(), "property_typename == type_name");
+    }
+    EXPECT_THAT(cl.calls, IsEmpty());
+}
+
+TEST_F(OCLTest, AValueOfAnotherSizeIsRefused)
+{
+    answers()[CL_DEVICE_VENDOR_ID] = CLValue(cl_ulong{1});
+    EXPECT_EQ(RefusalOf([&] { (void)device.getInfo<cl_uint>(DeviceProperty::VendorID); }),
+              "clGetDeviceInfo(CL_DEVICE_VENDOR_ID): the driver answers 8 bytes where 4 are due");
+}
+
+TEST_F(OCLTest, GetInfoImplTellsTheSizeItGot)
+{
+    cl_uint vendor = 0;
+    std::size_t actual = 0;
+    device.getInfoImpl(DeviceProperty::VendorID, sizeof vendor, &vendor, &actual);
+    EXPECT_EQ(actual, 4U);
+    EXPECT_EQ(vendor, 0x10DEU);
+}
+
+TEST_F(OCLTest, AFailingValueIsAFailure)
+{
+    answers()[CL_DEVICE_GLOBAL_MEM_SIZE].valueStatus = CL_INVALID_DEVICE;
+    EXPECT_EQ(RefusalOf([&] { (void)device.getInfo<cl_ulong>(DeviceProperty::GlobalMemSize); }),
+              "clGetDeviceInfo(CL_DEVICE_GLOBAL_MEM_SIZE) failed: CL_INVALID_DEVICE (-33)");
+}
+
+TEST_F(OCLTest, ContextAndQueueReleaseThemselvesInReverseOrder)
+{
+    {
+        const QGF::OCL::ContextProperties properties(platform);
+        const QGF::OCL::Context context(properties, device, {});
+        const QGF::OCL::CommandQueue queue(context, device, false, true);
+    }
+    EXPECT_THAT(cl.calls,
+                ElementsAre("clCreateContext(4228=11, device 101, null, null)",
+                            "clCreateCommandQueue(context 1, device 101, 2)",
+                            "clReleaseCommandQueue(queue 1)", "clReleaseContext(context 1)"));
+}
+
+TEST_F(OCLTest, AContextThatCantBeMadeIsAFailureAndReleasesNothing)
+{
+    cl.failing[0] = CL_DEVICE_NOT_AVAILABLE;
+    const QGF::OCL::ContextProperties properties(platform);
+    EXPECT_EQ(RefusalOf([&] { const QGF::OCL::Context context(properties, device, {}); }),
+              "clCreateContext failed: CL_DEVICE_NOT_AVAILABLE (-2)");
+    EXPECT_EQ(cl.calls.size(), 1U);
+}
+
+TEST_F(OCLTest, AQueueThatCantBeMadeIsAFailureAndReleasesTheContext)
+{
+    cl.failing[1] = CL_INVALID_QUEUE_PROPERTIES;
+    EXPECT_EQ(RefusalOf([&] {
+                  const QGF::OCL::ContextProperties properties(platform);
+                  const QGF::OCL::Context context(properties, device, {});
+                  const QGF::OCL::CommandQueue queue(context, device, true, false);
+              }),
+              "clCreateCommandQueue failed: CL_INVALID_QUEUE_PROPERTIES (-35)");
+    EXPECT_THAT(cl.calls, ElementsAre("clCreateContext(4228=11, device 101, null, null)",
+                                      "clCreateCommandQueue(context 1, device 101, 1)",
+                                      "clReleaseContext(context 1)"));
+}
+
+// A library that has every entry point but one.
+struct ShortLibrary {
+    std::string missing;
+    std::set<std::string> asked;
+};
+
+void Nothing() {}
+
+QGF::Core::Proc GetShortProc(void* context, const char* name)
+{
+    ShortLibrary& library = *static_cast<ShortLibrary*>(context);
+    library.asked.insert(name);
+    return library.missing == name ? nullptr : Nothing;
+}
+
+TEST(OCLFunctionTableTest, IsCompleteWithEveryEntryPointOfTheFirstHeader)
+{
+    ShortLibrary library;
+    QGF::OCL::FunctionTable table{};
+    EXPECT_TRUE(QGF::OCL::FillFunctionTable(table, GetShortProc, &library));
+    EXPECT_EQ(library.asked.size(), sizeof table / sizeof(QGF::Core::Proc));
+}
+
+TEST(OCLFunctionTableTest, IsIncompleteWithoutAnyOneOfThem)
+{
+    ShortLibrary all;
+    QGF::OCL::FunctionTable table{};
+    QGF::OCL::FillFunctionTable(table, GetShortProc, &all);
+    for (const std::string& name : all.asked) {
+        ShortLibrary library{name, {}};
+        EXPECT_FALSE(QGF::OCL::FillFunctionTable(table, GetShortProc, &library)) << name;
+    }
+}
+
+TEST(OCLFunctionTableTest, FillsTheOthersWhenOneIsMissing)
+{
+    ShortLibrary library{"clGetPlatformIDs", {}};
+    QGF::OCL::FunctionTable table{};
+    QGF::OCL::FillFunctionTable(table, GetShortProc, &library);
+    EXPECT_EQ(table.clGetPlatformIDs, nullptr);
+    EXPECT_NE(table.clGetExtensionFunctionAddress, nullptr);
+}
+
+TEST(OCLLibraryTest, AFileThatIsNoLibraryIsNotAvailable)
+{
+    EXPECT_FALSE(QGF::OCL::Library::IsOpenCLAvailable("no-such-library-anywhere"));
+}
+
+} // namespace
