@@ -8,10 +8,6 @@
 
 #include "qgf/AdapterName.h"
 
-#ifndef EGL_DRM_RENDER_NODE_FILE_EXT
-#define EGL_DRM_RENDER_NODE_FILE_EXT 0x3377
-#endif
-
 namespace QGF {
 namespace OGL {
 
@@ -170,7 +166,7 @@ void EGLPlatform::AddOnlyDevice(EGLenum platform)
     fDevices.push_back({{"egl:0", "egl:0", ""}, {{platform, nullptr}}});
 }
 
-void EGLPlatform::FindEGLDevices()
+std::vector<EGLPlatform::EGLDevice> EGLPlatform::ListEGLDevices() const
 {
     EGLint count = 0;
     if (fEGL.eglQueryDevicesEXT(0, nullptr, &count) == EGL_FALSE)
@@ -178,53 +174,90 @@ void EGLPlatform::FindEGLDevices()
     if (count < 0 || count > kMaxDevices)
         throw LogicalException("eglQueryDevicesEXT claims " + std::to_string(count) + " devices");
     if (count == 0)
-        return;
-    std::vector<EGLDeviceEXT> devices(static_cast<std::size_t>(count), EGL_NO_DEVICE_EXT);
+        return {};
+    std::vector<EGLDeviceEXT> handles(static_cast<std::size_t>(count), EGL_NO_DEVICE_EXT);
     EGLint filled = 0;
-    if (fEGL.eglQueryDevicesEXT(count, devices.data(), &filled) == EGL_FALSE)
+    if (fEGL.eglQueryDevicesEXT(count, handles.data(), &filled) == EGL_FALSE)
         ThrowFailed(fEGL, "eglQueryDevicesEXT", "");
-    devices.resize(static_cast<std::size_t>(std::clamp(filled, 0, count)));
 
-    std::vector<bool> software;
-    software.reserve(devices.size());
-    for (EGLDeviceEXT device : devices)
-        software.push_back(
-            device != EGL_NO_DEVICE_EXT &&
-            HasWord(QueryDeviceString(device, EGL_EXTENSIONS), "EGL_MESA_device_software"));
-    for (const bool pass : {false, true}) {
-        for (std::size_t i = 0; i < devices.size(); ++i) {
-            if (devices[i] != EGL_NO_DEVICE_EXT && software[i] == pass)
-                AddEGLDevice(devices[i], static_cast<int>(i), pass);
-        }
+    std::vector<EGLDevice> devices;
+    for (int i = 0; i < std::min(filled, count); ++i) {
+        const EGLDeviceEXT handle = handles[static_cast<std::size_t>(i)];
+        if (handle != EGL_NO_DEVICE_EXT)
+            devices.push_back(DescribeEGLDevice(handle, i));
     }
+    return devices;
 }
 
-void EGLPlatform::AddEGLDevice(EGLDeviceEXT device, int position, bool software)
+EGLPlatform::EGLDevice EGLPlatform::DescribeEGLDevice(EGLDeviceEXT handle, int position) const
 {
-    std::string node;
-    std::string address;
+    const std::string extensions = QueryDeviceString(handle, EGL_EXTENSIONS);
+    EGLDevice device{handle,
+                     position,
+                     HasWord(extensions, "EGL_MESA_device_software"),
+                     HasWord(extensions, "EGL_NV_device_cuda"),
+                     "",
+                     "",
+                     ""};
     // A software renderer may borrow the node of an adapter, but it isn't that adapter.
-    if (!software) {
-        const std::string extensions = QueryDeviceString(device, EGL_EXTENSIONS);
-        if (HasWord(extensions, "EGL_EXT_device_drm"))
-            node = QueryDeviceString(device, EGL_DRM_DEVICE_FILE_EXT);
-        if (node.empty() && HasWord(extensions, "EGL_EXT_device_drm_render_node"))
-            node = QueryDeviceString(device, EGL_DRM_RENDER_NODE_FILE_EXT);
-        address = node.empty() ? fLookup.addressWithoutNode() : fLookup.addressOfNode(node);
-    }
-    const std::string name = node.empty() ? "egl:" + std::to_string(position) : node;
+    if (device.software)
+        return device;
+    if (HasWord(extensions, "EGL_EXT_device_drm"))
+        device.node = QueryDeviceString(handle, EGL_DRM_DEVICE_FILE_EXT);
+    if (device.node.empty() && HasWord(extensions, "EGL_EXT_device_drm_render_node"))
+        device.node = QueryDeviceString(handle, EGL_DRM_RENDER_NODE_FILE_EXT);
+    if (!device.node.empty())
+        device.address = fLookup.addressOfNode(device.node);
+    if (device.address.empty() && device.nvidia && HasWord(extensions, "EGL_EXT_device_query_name"))
+        device.renderer = QueryDeviceString(handle, EGL_RENDERER_EXT);
+    return device;
+}
 
+void EGLPlatform::FindNvidiaAddresses(std::vector<EGLDevice>& devices) const
+{
+    std::vector<EGLDevice*> unknown;
+    std::vector<std::string> names;
+    std::vector<std::string> taken;
+    for (EGLDevice& device : devices) {
+        if (!device.address.empty())
+            taken.push_back(device.address);
+        if (device.address.empty() && device.nvidia && device.node.empty()) {
+            unknown.push_back(&device);
+            names.push_back(device.renderer);
+        }
+    }
+    if (unknown.empty())
+        return;
+    const std::vector<std::string> addresses = fLookup.addressesOfNvidia(names, taken);
+    for (std::size_t i = 0; i < std::min(unknown.size(), addresses.size()); ++i)
+        unknown[i]->address = addresses[i];
+}
+
+void EGLPlatform::FindEGLDevices()
+{
+    std::vector<EGLDevice> devices = ListEGLDevices();
+    FindNvidiaAddresses(devices);
+    std::stable_partition(devices.begin(), devices.end(),
+                          [](const EGLDevice& device) { return !device.software; });
+    for (const EGLDevice& device : devices)
+        AddEGLDevice(device);
+}
+
+void EGLPlatform::AddEGLDevice(const EGLDevice& device)
+{
+    const std::string name =
+        device.node.empty() ? "egl:" + std::to_string(device.position) : device.node;
     const auto known = std::find_if(fDevices.begin(), fDevices.end(), [&](const Device& other) {
         return other.key.deviceName() == name ||
-               (!address.empty() && other.key.displayID() == address);
+               (!device.address.empty() && other.key.displayID() == device.address);
     });
-    const Route route = {EGL_PLATFORM_DEVICE_EXT, device};
+    const Route route = {EGL_PLATFORM_DEVICE_EXT, device.handle};
     if (known != fDevices.end()) {
         known->routes.push_back(route);
         return;
     }
-    const std::string text = address.empty() ? "" : fLookup.nameOfAddress(address);
-    fDevices.push_back({{name, text.empty() ? name : text, address}, {route}});
+    const std::string text = device.address.empty() ? "" : fLookup.nameOfAddress(device.address);
+    fDevices.push_back({{name, text.empty() ? name : text, device.address}, {route}});
 }
 
 const EGLPlatform::Display& EGLPlatform::OpenDisplay(const Route& route, const std::string& name)
@@ -350,7 +383,8 @@ std::string NoAddressOfNode(const std::string&)
     return {};
 }
 
-std::string NoAddress()
+std::vector<std::string> NoAddresses(const std::vector<std::string>&,
+                                     const std::vector<std::string>&)
 {
     return {};
 }
@@ -370,7 +404,7 @@ std::unique_ptr<Platform> MakeNativePlatform()
         },
         library);
     return std::make_unique<EGLPlatform>(
-        egl, EGLPlatform::AdapterLookup{NoAddressOfNode, NoAddress, AdapterName});
+        egl, EGLPlatform::AdapterLookup{NoAddressOfNode, NoAddresses, AdapterName});
 }
 
 } // namespace OGL

@@ -20,8 +20,12 @@ public:
     struct AdapterLookup {
         // The PCI address of the adapter behind a DRM node such as "/dev/dri/card0"; "" if unknown.
         std::string (*addressOfNode)(const std::string& node);
-        // The PCI address of a hardware device that has no DRM node; "" if unknown.
-        std::string (*addressWithoutNode)();
+        // The PCI addresses of NVIDIA devices that no DRM node leads to, in their order; "" where
+        // unknown.
+        // `names` are the names that the devices give themselves, "" for none, `taken` the
+        // addresses that other devices have.
+        std::vector<std::string> (*addressesOfNvidia)(const std::vector<std::string>& names,
+                                                      const std::vector<std::string>& taken);
         // The adapter's name by its address; "" if unknown.
         std::string (*nameOfAddress)(const std::string& address);
     };
@@ -52,9 +56,23 @@ private:
         std::vector<Route> routes;
     };
 
+    // What EGL says about a device of its list.
+    struct EGLDevice {
+        EGLDeviceEXT handle;
+        int position;
+        bool software;
+        bool nvidia;
+        std::string node;     // "" if it has none
+        std::string renderer; // "" if it doesn't say
+        std::string address;  // "" if unknown
+    };
+
     void FindDevices();
     void FindEGLDevices();
-    void AddEGLDevice(EGLDeviceEXT device, int position, bool software);
+    void AddEGLDevice(const EGLDevice& device);
+    std::vector<EGLDevice> ListEGLDevices() const;
+    EGLDevice DescribeEGLDevice(EGLDeviceEXT device, int position) const;
+    void FindNvidiaAddresses(std::vector<EGLDevice>& devices) const;
     void AddOnlyDevice(EGLenum platform);
     std::string QueryDeviceString(EGLDeviceEXT device, EGLint name) const;
     const Display& OpenDisplay(const Route& route, const std::string& name);

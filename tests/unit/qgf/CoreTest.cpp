@@ -1,0 +1,97 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "qgf/Core.h"
+
+namespace {
+
+using testing::HasSubstr;
+
+TEST(Exceptions, MessageAndWhatAreOneText)
+{
+    const QGF::LogicalException exception("no such thing");
+    EXPECT_STREQ(exception.what(), "no such thing");
+    EXPECT_STREQ(exception.message(), "no such thing");
+}
+
+TEST(Exceptions, LogicalAndInternalShareTheRoot)
+{
+    EXPECT_THROW(throw QGF::LogicalException(""), QGF::ExceptionBase);
+    EXPECT_THROW(throw QGF::InternalException("f", 1, "t"), QGF::ExceptionBase);
+    EXPECT_THROW(throw QGF::LogicalException(""), std::exception);
+}
+
+TEST(Exceptions, InternalExceptionNamesThePlace)
+{
+    const QGF::InternalException exception("some/file", 122, "a == b");
+    EXPECT_STREQ(exception.what(), "some/file(122): a == b");
+    EXPECT_STREQ(exception.message(), "some/file(122): a == b");
+    EXPECT_STREQ(exception.file(), "some/file");
+    EXPECT_EQ(exception.line(), 122);
+    EXPECT_STREQ(exception.text(), "a == b");
+}
+
+int gChecks = 0;
+bool gCheckFails = false;
+
+void CountingCheck()
+{
+    ++gChecks;
+    if (gCheckFails)
+        throw QGF::LogicalException("no loader");
+}
+
+class CoreLibrary : public testing::Test {
+protected:
+    CoreLibrary()
+    {
+        gChecks = 0;
+        gCheckFails = false;
+        QGF::Core::ReplaceLoaderCheck(CountingCheck);
+    }
+    ~CoreLibrary() override { QGF::Core::ReplaceLoaderCheck(nullptr); }
+};
+
+TEST_F(CoreLibrary, RepeatedStartAsksOnce)
+{
+    QGF::Core::Library::Initialize();
+    QGF::Core::Library::Initialize();
+    EXPECT_EQ(gChecks, 1);
+}
+
+TEST_F(CoreLibrary, FailedStartIsTriedAgain)
+{
+    gCheckFails = true;
+    EXPECT_THROW(QGF::Core::Library::Initialize(), QGF::LogicalException);
+    EXPECT_THROW(QGF::Core::Library::Initialize(), QGF::LogicalException);
+    gCheckFails = false;
+    EXPECT_NO_THROW(QGF::Core::Library::Initialize());
+    EXPECT_EQ(gChecks, 3);
+}
+
+TEST_F(CoreLibrary, NativeLoaderAnswers)
+{
+    QGF::Core::ReplaceLoaderCheck(nullptr);
+    EXPECT_NO_THROW(QGF::Core::Library::Initialize());
+    EXPECT_EQ(gChecks, 0);
+}
+
+TEST(OpenLibrary, FailureNamesEveryLibrary)
+{
+    const char* const names[] = {"no-such-library-a", "no-such-library-b", nullptr};
+    try {
+        QGF::Core::OpenLibrary(names);
+        FAIL() << "opened";
+    } catch (const QGF::LogicalException& exception) {
+        EXPECT_THAT(exception.what(), HasSubstr("no-such-library-a can't be opened ("));
+        EXPECT_THAT(exception.what(), HasSubstr("; no-such-library-b can't be opened ("));
+    }
+}
+
+TEST(OpenLibrary, EmptyListIsRefused)
+{
+    const char* const names[] = {nullptr};
+    EXPECT_THROW(QGF::Core::OpenLibrary(names), QGF::LogicalException);
+}
+
+} // namespace

@@ -1,0 +1,287 @@
+#include <cstring>
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "qgf/OGL.h"
+#include "support/FakeOpenGL.h"
+
+namespace {
+
+using namespace QGF::OGL;
+using assay_test::FakeOpenGL;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::SizeIs;
+
+const char* const kSource[] = {"one", "", "two "};
+
+// The text of the LogicalException that `action` throws.
+std::string FailureOf(const std::function<void()>& action)
+{
+    try {
+        action();
+    } catch (const QGF::LogicalException& exception) {
+        return exception.message();
+    }
+    return "no failure";
+}
+
+class OpenGLObjects : public testing::Test {
+protected:
+    OpenGLObjects() : context(Context::PrimaryDisplayDevice())
+    {
+        context.makeCurrent();
+        gl.calls.clear();
+    }
+
+    assay_test::FakeDevice& device() { return gl.devices[0]; }
+
+    static std::string compileFailure()
+    {
+        return FailureOf([] {
+            Program program;
+            program.loadFragmentShader(3, kSource, nullptr);
+        });
+    }
+
+    FakeOpenGL gl;
+    ContextOffscreen context;
+};
+
+TEST_F(OpenGLObjects, ProgramCompilesAttachesAndLinks)
+{
+    {
+        Program program;
+        program.loadVertexShader(3, kSource, nullptr);
+        EXPECT_THAT(device().shaderSource, ElementsAre("one", "", "two "));
+        program.loadFragmentShader(3, kSource, nullptr);
+        program.link(true);
+    }
+    EXPECT_THAT(gl.calls,
+                ElementsAre("glCreateProgram()", "glCreateShader(0x8B31)", "glShaderSource(2,3)",
+                            "glCompileShader(2)", "glGetShaderiv(2,0x8B81)", "glAttachShader(1,2)",
+                            "glDeleteShader(2)", "glCreateShader(0x8B30)", "glShaderSource(3,3)",
+                            "glCompileShader(3)", "glGetShaderiv(3,0x8B81)", "glAttachShader(1,3)",
+                            "glDeleteShader(3)", "glLinkProgram(1)", "glGetProgramiv(1,0x8B82)",
+                            "glDeleteProgram(1)"));
+    EXPECT_EQ(device().objects, 0);
+}
+
+TEST_F(OpenGLObjects, GivenLengthsAreUsed)
+{
+    const std::int32_t lengths[] = {2, 0, -1};
+    Program program;
+    program.loadVertexShader(3, kSource, lengths);
+    EXPECT_THAT(device().shaderSource, ElementsAre("on", "", "two "));
+}
+
+TEST_F(OpenGLObjects, VertexShaderFailureGivesTheLog)
+{
+    device().vertexCompiles = false;
+    device().log = "0:1: error\n0:2: error\n";
+    EXPECT_EQ(FailureOf([] { Program().loadVertexShader(3, kSource, nullptr); }),
+              "The vertex shader doesn't compile: 0:1: error\n0:2: error");
+    EXPECT_EQ(device().objects, 0);
+}
+
+TEST_F(OpenGLObjects, FragmentShaderFailureGivesTheLog)
+{
+    device().fragmentCompiles = false;
+    EXPECT_EQ(compileFailure(), "The fragment shader doesn't compile: fake log");
+    EXPECT_EQ(device().objects, 0);
+    EXPECT_THAT(gl.callsOf("glAttachShader"), SizeIs(0));
+}
+
+TEST_F(OpenGLObjects, LinkFailureGivesTheLog)
+{
+    device().links = false;
+    EXPECT_EQ(FailureOf([] {
+                  Program program;
+                  program.loadVertexShader(3, kSource, nullptr);
+                  program.loadFragmentShader(3, kSource, nullptr);
+                  program.link(true);
+              }),
+              "The program doesn't link: fake log");
+    EXPECT_EQ(device().objects, 0);
+}
+
+TEST_F(OpenGLObjects, IncompleteProgramIsRefusedBeforeTheDriverIsAsked)
+{
+    EXPECT_EQ(FailureOf([] { Program().link(true); }), "The program has no vertex shader to link");
+    EXPECT_EQ(FailureOf([] {
+                  Program program;
+                  program.loadVertexShader(3, kSource, nullptr);
+                  program.link(true);
+              }),
+              "The program has no fragment shader to link");
+    EXPECT_THAT(gl.callsOf("glLinkProgram"), SizeIs(0));
+    EXPECT_EQ(FailureOf([] { Program().link(false); }), "no failure");
+    EXPECT_THAT(gl.callsOf("glLinkProgram"), SizeIs(1));
+}
+
+TEST_F(OpenGLObjects, EmptyOrSenselessLogIsSaidToBeNone)
+{
+    device().fragmentCompiles = false;
+    const std::string none = "The fragment shader doesn't compile: the driver gives no log";
+    for (const std::int32_t length : {0, 1, -1, -2147483647}) {
+        device().logLength = length;
+        EXPECT_EQ(compileFailure(), none) << length;
+    }
+    EXPECT_THAT(gl.callsOf("glGetShaderInfoLog"), SizeIs(0));
+    device().logLength.reset();
+    device().log = " \r\n";
+    EXPECT_EQ(compileFailure(), none);
+    device().log = "";
+    device().logLength = 100;
+    EXPECT_EQ(compileFailure(), none);
+}
+
+TEST_F(OpenGLObjects, HugeLogIsBounded)
+{
+    device().fragmentCompiles = false;
+    device().logLength = 2147483647;
+    EXPECT_EQ(compileFailure(), "The fragment shader doesn't compile: fake log");
+    EXPECT_THAT(gl.callsOf("glGetShaderInfoLog("), ElementsAre(HasSubstr(",65536)")));
+
+    device().log = std::string(1000000, 'x');
+    device().logLength.reset();
+    EXPECT_LT(compileFailure().size(), 66000U);
+    EXPECT_GT(compileFailure().size(), 65000U);
+}
+
+TEST_F(OpenGLObjects, ObjectsThatAreNotMadeAreFailures)
+{
+    Program program;
+    Texture2D texture(InternalFormat::RGBA8, 1, 1, false, nullptr, Type::Default);
+    device().makesObjects = false;
+    EXPECT_EQ(FailureOf([] { Program(); }), "glCreateProgram made no program");
+    EXPECT_EQ(FailureOf([&] { program.loadVertexShader(3, kSource, nullptr); }),
+              "glCreateShader made no vertex shader");
+    EXPECT_EQ(
+        FailureOf([] { Texture2D(InternalFormat::RGBA8, 1, 1, false, nullptr, Type::Default); }),
+        "glGenTextures made no texture");
+    EXPECT_EQ(FailureOf([] { Framebuffer(); }), "glGenFramebuffers made no framebuffer");
+}
+
+TEST_F(OpenGLObjects, TextureIsMadeOfOneLevel)
+{
+    {
+        const Texture2D texture(InternalFormat::RGBA8, 32, 16, false, nullptr, Type::Default);
+        EXPECT_EQ(texture.id(), 1U);
+    }
+    EXPECT_THAT(gl.calls, ElementsAre("glGenTextures(1)", "glBindTexture(0xDE1,1)",
+                                      "glTexParameteri(0xDE1,0x2801,0x2601)",
+                                      "glTexImage2D(0xDE1,0,0x8058,32,16,0,0x1908,0x1401)",
+                                      "glBindTexture(0xDE1,0)", "glDeleteTextures(1,1)"));
+}
+
+TEST_F(OpenGLObjects, MipmapsAreGeneratedOnDemand)
+{
+    const Texture2D texture(InternalFormat::RGBA8, 32, 32, true, nullptr, Type::Default);
+    EXPECT_THAT(gl.callsOf("glGenerateMipmap"), ElementsAre("glGenerateMipmap(0xDE1)"));
+    EXPECT_THAT(gl.callsOf("glTexParameteri"), ElementsAre("glTexParameteri(0xDE1,0x2801,0x2703)"));
+}
+
+TEST_F(OpenGLObjects, UnknownTextureRequestsAreRefused)
+{
+    EXPECT_EQ(FailureOf([] {
+                  Texture2D(static_cast<InternalFormat>(35), 1, 1, false, nullptr, Type::Default);
+              }),
+              "Texture format 35 is not known");
+    EXPECT_EQ(FailureOf([] {
+                  Texture2D(InternalFormat::RGBA8, 1, 1, false, nullptr, static_cast<Type>(0));
+              }),
+              "Texture data type 0 is not known");
+    EXPECT_EQ(
+        FailureOf([] { Texture2D(InternalFormat::RGBA8, 0, 4, false, nullptr, Type::Default); }),
+        "A texture can't be 0 x 4 texels large");
+    EXPECT_EQ(
+        FailureOf([] { Texture2D(InternalFormat::RGBA8, 4, -1, false, nullptr, Type::Default); }),
+        "A texture can't be 4 x -1 texels large");
+    EXPECT_EQ(device().objects, 0);
+}
+
+TEST_F(OpenGLObjects, FailedTextureIsDeleted)
+{
+    device().onCall["glTexImage2D"] = [] { throw QGF::LogicalException("stop"); };
+    EXPECT_EQ(
+        FailureOf([] { Texture2D(InternalFormat::RGBA8, 4, 4, false, nullptr, Type::Default); }),
+        "stop");
+    EXPECT_EQ(device().objects, 0);
+}
+
+TEST_F(OpenGLObjects, FramebufferBindsAttachesAndUnbinds)
+{
+    {
+        const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);
+        gl.calls.clear();
+        Framebuffer framebuffer;
+        framebuffer.bind();
+        framebuffer.attach(texture, 0, 0);
+        framebuffer.attach(texture, 2, 1);
+        framebuffer.unbind();
+    }
+    EXPECT_THAT(gl.calls,
+                ElementsAre("glGenFramebuffers(1)", "glBindFramebuffer(0x8D40,2)",
+                            "glFramebufferTexture2D(0x8D40,0x8CE0,0xDE1,1,0)",
+                            "glCheckFramebufferStatus(0x8D40)",
+                            "glFramebufferTexture2D(0x8D40,0x8CE2,0xDE1,1,1)",
+                            "glCheckFramebufferStatus(0x8D40)", "glBindFramebuffer(0x8D40,0)",
+                            "glDeleteFramebuffers(1,2)", "glDeleteTextures(1,1)"));
+    EXPECT_EQ(device().objects, 0);
+}
+
+TEST_F(OpenGLObjects, IncompleteFramebufferIsNamed)
+{
+    const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);
+    Framebuffer framebuffer;
+    framebuffer.bind();
+    device().framebufferStatus = 0x8CDD;
+    EXPECT_EQ(FailureOf([&] { framebuffer.attach(texture, 0, 0); }),
+              "The framebuffer is not complete: GL_FRAMEBUFFER_UNSUPPORTED");
+    device().framebufferStatus = 0;
+    EXPECT_EQ(FailureOf([&] { framebuffer.attach(texture, 0, 0); }),
+              "The framebuffer is not complete: 0x0000");
+}
+
+TEST_F(OpenGLObjects, SenselessAttachmentsAreRefused)
+{
+    const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);
+    Framebuffer framebuffer;
+    gl.calls.clear();
+    EXPECT_EQ(FailureOf([&] { framebuffer.attach(texture, 32, 0); }),
+              "There is no colour attachment 32");
+    EXPECT_EQ(FailureOf([&] { framebuffer.attach(texture, 0, 0x80000000U); }),
+              "There is no texture level 2147483648");
+    EXPECT_THAT(gl.calls, SizeIs(0));
+}
+
+TEST_F(OpenGLObjects, DestructorsNeverThrow)
+{
+    device().onCall["glDeleteProgram"] = [] { throw 1; };
+    device().onCall["glDeleteShader"] = [] { throw 1; };
+    device().onCall["glDeleteTextures"] = [] { throw 1; };
+    device().onCall["glDeleteFramebuffers"] = [] { throw 1; };
+    EXPECT_NO_THROW({
+        Program program;
+        program.loadVertexShader(3, kSource, nullptr);
+        const Texture2D texture(InternalFormat::RGBA8, 1, 1, false, nullptr, Type::Default);
+        const Framebuffer framebuffer;
+    });
+}
+
+TEST(OpenGLObjectsWithoutContext, CannotBeMade)
+{
+    EXPECT_EQ(FailureOf([] { Program(); }), "No OpenGL context is current on this thread");
+    EXPECT_EQ(FailureOf([] { Framebuffer(); }), "No OpenGL context is current on this thread");
+    EXPECT_EQ(
+        FailureOf([] { Texture2D(InternalFormat::RGBA8, 1, 1, false, nullptr, Type::Default); }),
+        "No OpenGL context is current on this thread");
+}
+
+} // namespace
