@@ -29,6 +29,28 @@ boost::filesystem::path NativePath(const std::wstring& path)
     return boost::filesystem::path(path, GetPathCodecvt());
 }
 
+std::wstring JoinPath(const std::wstring& folder, const std::string& name)
+{
+    constexpr auto kSeparator = static_cast<wchar_t>(boost::filesystem::path::preferred_separator);
+    const std::wstring file =
+        boost::filesystem::path(name, GetPathCodecvt()).wstring(GetPathCodecvt());
+    return folder.empty() ? file : folder + kSeparator + file;
+}
+
+// Removes the file at that path, if it is one and the condition holds for it.
+template <typename Condition>
+void RemoveIf(const std::wstring& file, const Condition& condition) noexcept
+{
+    try {
+        const boost::filesystem::path path = NativePath(file);
+        boost::system::error_code failed;
+        if (boost::filesystem::is_regular_file(path, failed) && condition(path))
+            boost::filesystem::remove(path, failed);
+    } catch (...) {
+        // A path that can't be told in narrow characters is Write's to report.
+    }
+}
+
 // True for the first logger of the process on that path. Under the log mutex.
 bool ClaimPath(const std::wstring& path)
 {
@@ -84,29 +106,21 @@ std::string AssayLogger::GetPrefix(const char* file, int line)
 PMFileLogger::PMFileLogger(const char* name) : PMFileLogger(GetDesktopFolder(), name) {}
 
 PMFileLogger::PMFileLogger(const std::wstring& folder, const char* name)
-    : PMLogger(name != nullptr ? name : kDefaultLogFile)
+    : PMLogger(name != nullptr ? name : kDefaultLogFile), fPath(JoinPath(folder, GetName()))
 {
-    const boost::filesystem::path file(GetName(), GetPathCodecvt());
-    fPath = (NativePath(folder) / file).wstring(GetPathCodecvt());
     const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
-    boost::system::error_code ignored;
     if (ClaimPath(fPath))
-        boost::filesystem::remove(NativePath(fPath), ignored);
+        RemoveIf(fPath, [](const boost::filesystem::path&) { return true; });
 }
 
 PMFileLogger::~PMFileLogger()
 {
     if (fFile != nullptr)
         std::fclose(fFile);
-    try {
+    RemoveIf(fPath, [](const boost::filesystem::path& path) {
         boost::system::error_code failed;
-        const boost::filesystem::path path = NativePath(fPath);
-        if (boost::filesystem::is_regular_file(path, failed) &&
-            boost::filesystem::is_empty(path, failed) && !failed)
-            boost::filesystem::remove(path, failed);
-    } catch (...) {
-        // What can't be named can't have been made.
-    }
+        return boost::filesystem::is_empty(path, failed) && !failed;
+    });
 }
 
 bool PMFileLogger::Open()

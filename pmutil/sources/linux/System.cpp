@@ -7,6 +7,7 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <csignal>
 #include <ctime>
@@ -30,6 +31,29 @@ void ForgetThreadNumber()
 {
     gThreadNumber = 0;
 }
+
+// Boost's facet writes code units that aren't characters as if they were.
+class PathFacet : public boost::filesystem::detail::utf8_codecvt_facet {
+public:
+    PathFacet() : utf8_codecvt_facet(1) {} // the reference that keeps locales from deleting it
+
+protected:
+    result do_out(std::mbstate_t& state, const wchar_t* from, const wchar_t* fromEnd,
+                  const wchar_t*& fromNext, char* to, char* toEnd, char*& toNext) const override
+    {
+        if (std::all_of(from, fromEnd, IsCharacter))
+            return utf8_codecvt_facet::do_out(state, from, fromEnd, fromNext, to, toEnd, toNext);
+        fromNext = from;
+        toNext = to;
+        return error;
+    }
+
+private:
+    static bool IsCharacter(wchar_t code)
+    {
+        return (code >= 0 && code < 0xD800) || (code >= 0xE000 && code <= 0x10FFFF);
+    }
+};
 
 // Empty if the password database doesn't know the user.
 std::string GetHomeFolder()
@@ -132,7 +156,7 @@ void PrepareConsoleProcess()
 const boost::filesystem::path::codecvt_type& GetPathCodecvt()
 {
     static const boost::filesystem::path::codecvt_type& facet =
-        *new boost::filesystem::detail::utf8_codecvt_facet(1); // outlives all users
+        *new PathFacet; // outlives all users
     return facet;
 }
 

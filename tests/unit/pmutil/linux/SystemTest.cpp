@@ -1,0 +1,261 @@
+#include "pmutil/System.h"
+
+#include <fcntl.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <ctime>
+#include <stdexcept>
+
+#include <boost/thread/thread.hpp>
+#include <gmock/gmock.h>
+
+#include "pmutil/LogSinks.h"
+#include "pmutil/TempFolder.h"
+#include "pmutil/Threads.h"
+
+namespace pmutil {
+namespace {
+
+using testing::EndsWith;
+using testing::StartsWith;
+
+DebugValue gOn{"SystemTest.on", 1};
+
+// A stream whose reader comes and goes.
+class FifoTest : public testing::Test {
+protected:
+    void SetUp() override
+    {
+        fOldHandler = std::signal(SIGPIPE, SIG_IGN);
+        ASSERT_EQ(mkfifo(fPath.c_str(), 0600), 0);
+        OpenReader();
+        fWriter = std::fopen(fPath.c_str(), "w");
+        ASSERT_NE(fWriter, nullptr);
+    }
+    void TearDown() override
+    {
+        if (fWriter != nullptr)
+            std::fclose(fWriter);
+        CloseReader();
+        std::signal(SIGPIPE, fOldHandler);
+    }
+
+    void OpenReader()
+    {
+        fReader = open(fPath.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+        ASSERT_GE(fReader, 0);
+    }
+    void CloseReader()
+    {
+        if (fReader >= 0)
+            close(fReader);
+        fReader = -1;
+    }
+    std::string Read() const
+    {
+        char bytes[4096];
+        const ssize_t size = read(fReader, bytes, sizeof(bytes));
+        return size > 0 ? std::string(bytes, static_cast<std::size_t>(size)) : std::string();
+    }
+
+    TempFolder fFolder;
+    std::string fPath = fFolder.File("fifo");
+    std::FILE* fWriter = nullptr;
+    int fReader = -1;
+    void (*fOldHandler)(int) = SIG_DFL;
+};
+
+TEST_F(FifoTest, DiscardedLineNeverTurnsUpAndALaterOneDoes)
+{
+    ASSERT_GE(std::fputs("one\n", fWriter), 0);
+    ASSERT_EQ(std::fflush(fWriter), 0);
+    EXPECT_EQ(Read(), "one\n");
+    CloseReader();
+    ASSERT_GE(std::fputs("lost\n", fWriter), 0);
+    ASSERT_NE(std::fflush(fWriter), 0);
+    ASSERT_NE(std::ferror(fWriter), 0);
+    DiscardUnwritten(fWriter);
+    EXPECT_EQ(std::ferror(fWriter), 0);
+    OpenReader();
+    ASSERT_GE(std::fputs("later\n", fWriter), 0);
+    ASSERT_EQ(std::fflush(fWriter), 0);
+    EXPECT_EQ(Read(), "later\n");
+    ASSERT_EQ(std::fclose(fWriter), 0);
+    fWriter = nullptr;
+    EXPECT_EQ(Read(), "");
+}
+
+TEST_F(FifoTest, LogLineThatIsLostNeverTurnsUpAndALaterOneDoes)
+{
+    InitLogging();
+    PMStdioLogger logger(fWriter);
+    CloseReader();
+    PM_LOG(gOn, "lost");
+    OpenReader();
+    ASSERT_GE(std::fputs("report\n", fWriter), 0);
+    PM_LOG(gOn, "later");
+    const std::string text = Read();
+    EXPECT_THAT(text, StartsWith("report\n00001."));
+    EXPECT_THAT(text, EndsWith("] later\n"));
+}
+
+TEST(PrepareConsoleProcessDeathTest, LeavesNoCoreDumpAndSurvivesAClosedPipe)
+{
+    testing::GTEST_FLAG(death_test_style) = "threadsafe";
+    EXPECT_EXIT(
+        {
+            PrepareConsoleProcess();
+            rlimit limit{};
+            const bool noCore = getrlimit(RLIMIT_CORE, &limit) == 0 && limit.rlim_cur == 0;
+            int ends[2];
+            const bool piped = pipe(ends) == 0 && close(ends[0]) == 0;
+            const bool refused = write(ends[1], "x", 1) == -1 && errno == EPIPE;
+            std::_Exit(noCore && piped && refused ? 0 : 1);
+        },
+        testing::ExitedWithCode(0), "^$");
+}
+
+TEST(SystemTest, ClockIsUniversalTimeSince1970)
+{
+    timespec before{};
+    clock_gettime(CLOCK_REALTIME, &before);
+    const double now = GetClockSeconds();
+    timespec after{};
+    clock_gettime(CLOCK_REALTIME, &after);
+    EXPECT_GE(now, static_cast<double>(before.tv_sec));
+    EXPECT_LE(now, static_cast<double>(after.tv_sec) + 1);
+    EXPECT_GE(GetClockSeconds(), now);
+}
+
+TEST(SystemTest, ThreadIDTextIsTheKernelsIDInHexadecimal)
+{
+    const auto check = [] {
+        char text[32];
+        std::snprintf(text, sizeof(text), "%lx", syscall(SYS_gettid));
+        EXPECT_EQ(GetCurrentThreadIDString(), text);
+        EXPECT_EQ(GetCurrentThreadIDString(), text);
+    };
+    check();
+    boost::thread thread(check);
+    thread.join();
+}
+
+TEST(SystemTest, ForkedChildKnowsItsOwnThreadID)
+{
+    ASSERT_EQ(GetCurrentThreadNumber(), static_cast<std::uint64_t>(getpid()));
+    const pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0)
+        _exit(GetCurrentThreadNumber() == static_cast<std::uint64_t>(getpid()) ? 0 : 1);
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
+}
+
+TEST(SystemTest, ThreadNameIsShownToTheSystemsTools)
+{
+    boost::thread thread([] {
+        SetCurrentThreadName("a-name-longer-than-the-kernel-keeps");
+        char name[64] = {};
+        ASSERT_EQ(pthread_getname_np(pthread_self(), name, sizeof(name)), 0);
+        EXPECT_STREQ(name, "a-name-longer-t");
+    });
+    thread.join();
+}
+
+TEST(SystemTest, NamingTheFirstThreadDoesNotRenameTheProcess)
+{
+    const std::string before = ReadWhole("/proc/self/comm");
+    ShowThreadName("other");
+    EXPECT_EQ(ReadWhole("/proc/self/comm"), before);
+}
+
+TEST(SystemTest, PhysicalMemoryAgreesWithTheKernel)
+{
+    unsigned long long kilobytes = 0;
+    ASSERT_EQ(std::sscanf(ReadWhole("/proc/meminfo").c_str(), "MemTotal: %llu", &kilobytes), 1);
+    EXPECT_EQ(GetPhysicalMemoryBytes() / 1024, kilobytes);
+}
+
+class CurrentDirectoryTest : public testing::Test {
+protected:
+    void SetUp() override { fOld = open(".", O_RDONLY | O_DIRECTORY | O_CLOEXEC); }
+    void TearDown() override
+    {
+        EXPECT_EQ(fchdir(fOld), 0);
+        close(fOld);
+    }
+    int fOld = -1;
+};
+
+TEST_F(CurrentDirectoryTest, IsTheProcesssOwn)
+{
+    const TempFolder folder;
+    const auto inner = folder.Path() / "\xC3\xA9t\xC3\xA9";
+    boost::filesystem::create_directory(inner);
+    ASSERT_EQ(chdir(inner.c_str()), 0);
+    EXPECT_THAT(GetCurrentDirectoryPath(), EndsWith(L"/\u00e9t\u00e9"));
+}
+
+TEST_F(CurrentDirectoryTest, ThatIsGoneThrows)
+{
+    const auto gone = std::make_unique<TempFolder>();
+    ASSERT_EQ(chdir(gone->Path().c_str()), 0);
+    ASSERT_EQ(rmdir(gone->Path().c_str()), 0);
+    try {
+        GetCurrentDirectoryPath();
+        FAIL() << "nothing thrown";
+    } catch (const std::runtime_error& error) {
+        EXPECT_STREQ(error.what(), "GetCurrentDirectoryW failed");
+    }
+}
+
+TEST(SystemTest, DesktopFolderAsksNoEnvironment)
+{
+    const std::wstring before = GetDesktopFolder();
+    const char* const home = std::getenv("HOME"); // NOLINT(concurrency-mt-unsafe)
+    const std::string oldHome = home != nullptr ? home : "";
+    setenv("HOME", "/nowhere", 1);            // NOLINT(concurrency-mt-unsafe)
+    setenv("XDG_CONFIG_HOME", "/nowhere", 1); // NOLINT(concurrency-mt-unsafe)
+    EXPECT_EQ(GetDesktopFolder(), before);
+    unsetenv("XDG_CONFIG_HOME"); // NOLINT(concurrency-mt-unsafe)
+    if (home != nullptr)
+        setenv("HOME", oldHome.c_str(), 1); // NOLINT(concurrency-mt-unsafe)
+    else
+        unsetenv("HOME"); // NOLINT(concurrency-mt-unsafe)
+}
+
+TEST(SystemTest, SharedAppendAppendsAndGivesNullForWhatCannotBeOpened)
+{
+    const TempFolder folder;
+    const std::string path = folder.File("log");
+    for (const char* text : {"one\n", "two\n"}) {
+        std::FILE* const file = OpenSharedAppend(path);
+        ASSERT_NE(file, nullptr);
+        std::fputs(text, file);
+        std::fclose(file);
+    }
+    EXPECT_EQ(ReadWhole(path), "one\ntwo\n");
+    EXPECT_EQ(OpenSharedAppend(folder.File("missing/log")), nullptr);
+}
+
+TEST(PMFileLoggerOnLinuxTest, PathThatHasNoNarrowFormRaisesInWrite)
+{
+    const std::wstring folder(1, static_cast<wchar_t>(0xD800));
+    PMFileLogger logger(folder, "log.txt");
+    try {
+        logger.WriteText("x", 1);
+        FAIL() << "nothing thrown";
+    } catch (const boost::system::system_error& error) {
+        EXPECT_THAT(error.what(), StartsWith("boost::filesystem::path codecvt to string"));
+    }
+}
+
+} // namespace
+} // namespace pmutil
