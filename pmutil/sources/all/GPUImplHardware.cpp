@@ -47,12 +47,6 @@ void RequireNoGLError(std::uint32_t status)
         RequirementFailed(kNoFile, 0, "Failed requirement: glStatus == GL_NO_ERROR", true);
 }
 
-void RequireExtensionManager(const ScopedGLCurrentExtensions& current)
-{
-    if (current.Extensions() == nullptr)
-        RequirementFailed(kNoFile, 0, "QGF::OGL::ExtensionManager::Instance() returned NULL", true);
-}
-
 } // namespace
 
 GPUImplHardware::GPUImplHardware() : device(nullptr) {}
@@ -62,9 +56,9 @@ GPUImplHardware::~GPUImplHardware() = default;
 std::string GPUImplHardware::DoGetGLVersion()
 {
     const ScopedGLCurrentExtensions current(*context);
-    RequireExtensionManager(current);
+    const QGF::OGL::ExtensionManager& extensions = RequireExtensions(current.Extensions());
     for (const VersionText& version : kVersions) {
-        if (current.Extensions()->isSupported(version.version))
+        if (extensions.isSupported(version.version))
             return version.text;
     }
     throw std::runtime_error("Cannot determine OGL version");
@@ -209,8 +203,7 @@ void GPUImplHardware::DoGLGetProgramivARB(std::uint32_t target, std::uint32_t co
 bool GPUImplHardware::DoGLIsExtensionSupported(OpenGLExtension extension)
 {
     const ScopedGLCurrentExtensions current(*context);
-    RequireExtensionManager(current);
-    return current.Extensions()->isSupported(extension);
+    return RequireExtensions(current.Extensions()).isSupported(extension);
 }
 
 bool GPUImplHardware::DoIsIntegratedGLGPU()

@@ -2,6 +2,8 @@
 
 #include <boost/make_shared.hpp>
 
+#include "pmutil/Requirement.h"
+
 namespace pmutil {
 
 ScopedGLCurrent::ScopedGLCurrent(QGF::OGL::ContextOffscreen& context)
@@ -13,5 +15,12 @@ ScopedGLCurrent::ScopedGLCurrent(QGF::OGL::ContextOffscreen& context)
 ScopedGLCurrentExtensions::ScopedGLCurrentExtensions(QGF::OGL::ContextOffscreen& context)
     : ScopedGLCurrent(context), fExtensions(QGF::OGL::ExtensionManager::Instance())
 {}
+
+QGF::OGL::ExtensionManager& RequireExtensions(QGF::OGL::ExtensionManager* extensions)
+{
+    if (extensions == nullptr)
+        RequirementFailed(kNoFile, 0, "QGF::OGL::ExtensionManager::Instance() returned NULL", true);
+    return *extensions;
+}
 
 } // namespace pmutil

@@ -30,4 +30,8 @@ private:
     QGF::OGL::ExtensionManager* fExtensions; // not owned
 };
 
+// The manager itself. Throws std::runtime_error "QGF::OGL::ExtensionManager::Instance() returned
+// NULL" for null, after the failure handler was told.
+QGF::OGL::ExtensionManager& RequireExtensions(QGF::OGL::ExtensionManager* extensions);
+
 } // namespace pmutil

@@ -1,0 +1,573 @@
+#include "pmutil_gpu/GPUImplHardware.h"
+
+#include <exception>
+#include <functional>
+#include <numeric>
+#include <stdexcept>
+
+#include <boost/make_shared.hpp>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "ScopedGLCurrent.h"
+#include "TestShaders.h"
+#include "pmutil_gpu/GPUImplWin.h"
+#include "support/CapturedLog.h"
+#include "support/FakeOpenGL.h"
+
+namespace {
+
+using namespace assay_test;
+using pmutil::GPUImplWin;
+using testing::AllOf;
+using testing::Contains;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::StartsWith;
+
+constexpr std::uint32_t kUnknownName = 0x87FC;
+
+// What the question throws: the text of a standard exception.
+std::string Thrown(const std::function<void()>& question)
+{
+    try {
+        question();
+    } catch (const std::exception& error) {
+        return error.what();
+    }
+    return "nothing was thrown";
+}
+
+class GPUImplHardwareTest : public testing::Test {
+protected:
+    GPUImplHardwareTest()
+    {
+        fImpl.context = boost::make_shared<QGF::OGL::ContextOffscreen>(fGL.devices[0].key);
+        fGL.calls.clear();
+    }
+
+    FakeDevice& Device() { return fGL.devices[0]; }
+
+    // What the question writes to standard error.
+    static std::string Told(const std::function<void()>& question)
+    {
+        testing::internal::CaptureStderr();
+        try {
+            question();
+        } catch (const std::exception&) { // the text is asked for elsewhere
+        }
+        return testing::internal::GetCapturedStderr();
+    }
+
+    CapturedLog fLog{pmutil::gGPUAssay};
+    FakeOpenGL fGL{2};
+    GPUImplWin fImpl;
+};
+
+TEST_F(GPUImplHardwareTest, AQueryIsFollowedByOneErrorCheckInsideTheDevicesContext)
+{
+    EXPECT_EQ(fImpl.GetGLVendor(), "Fake Vendor");
+    EXPECT_THAT(fGL.calls, ElementsAre("makeCurrent fake0", "glGetString(0x1F00)", "glGetError()",
+                                       "release fake0"));
+    EXPECT_EQ(QGF::OGL::Context::Current(), nullptr);
+    EXPECT_THAT(fLog.Lines(), IsEmpty());
+}
+
+TEST_F(GPUImplHardwareTest, TheContextThatWasCurrentIsRestored)
+{
+    QGF::OGL::ContextOffscreen other(fGL.devices[1].key);
+    other.makeCurrent();
+    fGL.calls.clear();
+    EXPECT_EQ(fImpl.GetGLRenderer(), "Fake Renderer 0");
+    EXPECT_EQ(QGF::OGL::Context::Current(), &other);
+    EXPECT_THAT(fGL.calls, ElementsAre("makeCurrent fake0", "glGetString(0x1F01)", "glGetError()",
+                                       "makeCurrent fake1"));
+}
+
+TEST_F(GPUImplHardwareTest, TheContextThatWasCurrentIsRestoredAfterAFailureToo)
+{
+    QGF::OGL::ContextOffscreen other(fGL.devices[1].key);
+    other.makeCurrent();
+    EXPECT_THROW(fImpl.GLGetString(kUnknownName), std::runtime_error);
+    EXPECT_EQ(QGF::OGL::Context::Current(), &other);
+    Device().onMakeCurrent = [] { throw QGF::LogicalException("lost"); };
+    EXPECT_THROW(fImpl.GLGetString(kGLVendor), QGF::LogicalException);
+    EXPECT_EQ(QGF::OGL::Context::Current(), &other);
+}
+
+TEST_F(GPUImplHardwareTest, EachQuestionIsAskedAfresh)
+{
+    EXPECT_EQ(fImpl.GetGLVendor(), "Fake Vendor");
+    Device().strings[kGLVendor] = "Another";
+    EXPECT_EQ(fImpl.GetGLVendor(), "Another");
+}
+
+TEST_F(GPUImplHardwareTest, NameAndRendererAreTheRendererText)
+{
+    EXPECT_EQ(fImpl.GetGLRenderer(), "Fake Renderer 0");
+    EXPECT_EQ(fImpl.GetGLName(), ""); // the adapter's description, and there is no adapter
+    EXPECT_STREQ(fImpl.GLGetString(kGLVersion), "4.1 Fake");
+}
+
+TEST_F(GPUImplHardwareTest, ANullTextPassesThroughAndMakesNoString)
+{
+    Device().strings[kGLVendor] = std::nullopt;
+    Device().strings[kGLRenderer] = std::nullopt;
+    EXPECT_EQ(fImpl.GLGetString(kGLVendor), nullptr);
+    EXPECT_THROW(fImpl.GetGLVendor(), std::logic_error);
+    EXPECT_THROW(fImpl.GetGLRenderer(), std::logic_error);
+    EXPECT_EQ(QGF::OGL::Context::Current(), nullptr);
+}
+
+TEST_F(GPUImplHardwareTest, AStringNameThatOpenGLRejectsIsLoggedInDecimalAndThrows)
+{
+    EXPECT_EQ(Thrown([this] { fImpl.GLGetString(kUnknownName); }),
+              "Failed requirement: glStatus == GL_NO_ERROR");
+    EXPECT_THAT(fLog.Lines(),
+                ElementsAre("GPUImplHardware::DoGLGetString(34812): glGetError() returns 1280"));
+}
+
+TEST_F(GPUImplHardwareTest, AnIntegerNameThatOpenGLRejectsIsLoggedInDecimalAndThrows)
+{
+    std::int32_t result = 7;
+    EXPECT_EQ(Thrown([&] { fImpl.GLGetIntegerv(kUnknownName, &result); }),
+              "Failed requirement: glStatus == GL_NO_ERROR");
+    EXPECT_EQ(result, 7);
+    EXPECT_THAT(fLog.Lines(),
+                ElementsAre("GPUImplHardware::DoGLGetIntegerv(34812): glGetError() returns 1280"));
+}
+
+TEST_F(GPUImplHardwareTest, AProgramCodeThatOpenGLRejectsIsLoggedInDecimalAndThrows)
+{
+    std::int32_t result = 7;
+    EXPECT_EQ(Thrown([&] { fImpl.GLGetProgramivARB(0x8804, 0x880B, &result); }),
+              "Failed requirement: glStatus == GL_NO_ERROR");
+    EXPECT_THAT(fLog.Lines(), ElementsAre("GPUImplHardware::DoGLGetProgramivARB(target=34820, "
+                                          "code=34827): glGetError() returns 1280"));
+}
+
+TEST_F(GPUImplHardwareTest, NamesAreLoggedSignedAndTheStatusUnsigned)
+{
+    Device().strings[0xFFFFFFFF] = "x";
+    Device().errors = {0xFFFFFFFF};
+    EXPECT_THROW(fImpl.GLGetString(0xFFFFFFFF), std::runtime_error);
+    Device().errors = {0xFFFFFFFE};
+    Device().integers[0x80000000] = {1};
+    std::int32_t result = 0;
+    EXPECT_THROW(fImpl.GLGetIntegerv(0x80000000, &result), std::runtime_error);
+    Device().errors = {0x80000000};
+    EXPECT_THROW(fImpl.GLGetProgramivARB(0xFFFFFFFD, 0xFFFFFFFC, &result), std::runtime_error);
+    EXPECT_THAT(
+        fLog.Lines(),
+        ElementsAre("GPUImplHardware::DoGLGetString(-1): glGetError() returns 4294967295",
+                    "GPUImplHardware::DoGLGetIntegerv(-2147483648): glGetError() returns "
+                    "4294967294",
+                    "GPUImplHardware::DoGLGetProgramivARB(target=-3, code=-4): glGetError() "
+                    "returns 2147483648"));
+}
+
+TEST_F(GPUImplHardwareTest, TheFailureIsToldWithoutAPlace)
+{
+    EXPECT_EQ(Told([this] { fImpl.GLGetString(kUnknownName); }),
+              "Failed requirement: glStatus == GL_NO_ERROR\n");
+}
+
+TEST_F(GPUImplHardwareTest, LoggingSwitchedOffChangesNothingButTheLine)
+{
+    fLog.SetOn(false);
+    std::int32_t result = 0;
+    EXPECT_THROW(fImpl.GLGetString(kUnknownName), std::runtime_error);
+    EXPECT_THROW(fImpl.GLGetIntegerv(kUnknownName, &result), std::runtime_error);
+    EXPECT_THROW(fImpl.GLGetProgramivARB(1, 2, &result), std::runtime_error);
+    EXPECT_EQ(fLog.Text(), "");
+}
+
+TEST_F(GPUImplHardwareTest, OneErrorIsTakenFromTheQueueAtATime)
+{
+    Device().errors = {0x501, 0x502};
+    EXPECT_THROW(fImpl.GetGLVendor(), std::runtime_error);
+    EXPECT_THAT(Device().errors, ElementsAre(0x502U));
+}
+
+TEST_F(GPUImplHardwareTest, IntegersAndProgramLimitsAreRead)
+{
+    Device().integers[0x0D33] = {-5};
+    Device().programIntegers[{0x8804, 0x880B}] = 4096;
+    std::int32_t result = 0;
+    fImpl.GLGetIntegerv(0x0D33, &result);
+    EXPECT_EQ(result, -5);
+    fImpl.GLGetProgramivARB(0x8804, 0x880B, &result);
+    EXPECT_EQ(result, 4096);
+    EXPECT_THAT(fGL.callsOf("gl"), ElementsAre("glGetIntegerv(0xD33)", "glGetError()",
+                                               "glGetProgramivARB(0x8804,0x880B)", "glGetError()"));
+}
+
+TEST_F(GPUImplHardwareTest, TheRectangleTextureSizeIsUnsigned)
+{
+    EXPECT_EQ(fImpl.GetGLRectTextureSize(), 16384U);
+    Device().integers[kGLMaxRectangleTextureSize] = {-1};
+    EXPECT_EQ(fImpl.GetGLRectTextureSize(), 4294967295U);
+}
+
+TEST_F(GPUImplHardwareTest, ARectangleTextureSizeThatOpenGLRejectsIsAFailureAndNotZero)
+{
+    Device().integers.clear();
+    EXPECT_EQ(Thrown([this] { fImpl.GetGLRectTextureSize(); }),
+              "Failed requirement: glStatus == GL_NO_ERROR");
+    EXPECT_THAT(fLog.Lines(),
+                ElementsAre("GPUImplHardware::DoGLGetIntegerv(34040): glGetError() returns 1280"));
+}
+
+TEST_F(GPUImplHardwareTest, TheInterceptorIsToldTheModule)
+{
+    const auto module = HasSubstr("(called from pmutil/sources/all/GPUImplHardware:");
+    std::int32_t result = 0;
+    Device().missing = {"glGetString", "glGetIntegerv", "glGetProgramivARB", "glGetError",
+                        "glClearColor"};
+    // The table is filled when a context is current for the first time.
+    fImpl.context = boost::make_shared<QGF::OGL::ContextOffscreen>(Device().key);
+    EXPECT_THAT(Thrown([&] { fImpl.GLGetString(kGLVendor); }),
+                AllOf(StartsWith("glGetString is not offered"), module));
+    EXPECT_THAT(Thrown([&] { fImpl.GLGetIntegerv(1, &result); }),
+                AllOf(StartsWith("glGetIntegerv is not offered"), module));
+    EXPECT_THAT(Thrown([&] { fImpl.GLGetProgramivARB(1, 2, &result); }),
+                AllOf(StartsWith("glGetProgramivARB is not offered"), module));
+    EXPECT_FALSE(fImpl.GLFramebufferOK());
+    EXPECT_THAT(
+        fLog.Lines(),
+        ElementsAre(AllOf(StartsWith("DoGLFramebufferOK: glClearColor is not offered"), module)));
+    Device().missing = {"glGetError"};
+    fImpl.context = boost::make_shared<QGF::OGL::ContextOffscreen>(Device().key);
+    EXPECT_THAT(Thrown([&] { fImpl.GLGetString(kGLVendor); }),
+                AllOf(StartsWith("glGetError is not offered"), module));
+}
+
+TEST_F(GPUImplHardwareTest, ExtensionsAreAskedOfTheDevicesOwnContext)
+{
+    Device().strings[kGLVersion] = "1.2";
+    Device().extensions = {"GL_ARB_vertex_program"};
+    EXPECT_TRUE(fImpl.GLIsExtensionSupported(QGF::OGL::GL_ARB_VERTEX_PROGRAM));
+    EXPECT_FALSE(fImpl.GLIsExtensionSupported(QGF::OGL::GL_ARB_FRAGMENT_PROGRAM));
+    EXPECT_EQ(QGF::OGL::Context::Current(), nullptr);
+    EXPECT_EQ(fGL.calls.front(), "makeCurrent fake0");
+    EXPECT_EQ(fGL.calls.back(), "release fake0");
+}
+
+TEST_F(GPUImplHardwareTest, NonPowerOfTwoSupportIsItsExtension)
+{
+    Device().strings[kGLVersion] = "1.5";
+    EXPECT_FALSE(fImpl.HasGLNPOTSupport());
+    Device().extensions = {"GL_ARB_texture_non_power_of_two"};
+    fImpl.context = boost::make_shared<QGF::OGL::ContextOffscreen>(Device().key);
+    EXPECT_TRUE(fImpl.HasGLNPOTSupport());
+}
+
+TEST_F(GPUImplHardwareTest, AMissingExtensionManagerIsAFailure)
+{
+    const std::string told = Told([] {
+        EXPECT_EQ(Thrown([] { pmutil::RequireExtensions(nullptr); }),
+                  "QGF::OGL::ExtensionManager::Instance() returned NULL");
+    });
+    EXPECT_EQ(told, "QGF::OGL::ExtensionManager::Instance() returned NULL\n");
+}
+
+struct VersionCase {
+    const char* driver;
+    const char* reported;
+};
+
+void PrintTo(const VersionCase& version, std::ostream* out)
+{
+    *out << version.driver;
+}
+
+class GLVersionTest : public GPUImplHardwareTest,
+                      public testing::WithParamInterface<VersionCase> {};
+
+TEST_P(GLVersionTest, TheNewestSupportedVersionIsReported)
+{
+    Device().strings[kGLVersion] = GetParam().driver;
+    EXPECT_EQ(fImpl.GetGLVersion(), GetParam().reported);
+}
+
+INSTANTIATE_TEST_SUITE_P(Ladder, GLVersionTest,
+                         testing::Values(VersionCase{"1.2", "1.2"}, VersionCase{"1.3", "1.3"},
+                                         VersionCase{"1.4", "1.4"}, VersionCase{"1.5.8", "1.5"},
+                                         VersionCase{"2.0", "2.0"},
+                                         VersionCase{"2.1 Driver 9", "2.1"},
+                                         VersionCase{"3.0", "3.0"}, VersionCase{"3.1", "3.1"},
+                                         VersionCase{"3.2", "3.2"}, VersionCase{"3.3", "3.3"},
+                                         VersionCase{"4.0", "4.0"}, VersionCase{"4.1", "4.1"},
+                                         VersionCase{"4.6 (Compatibility Profile)", "4.1"}));
+
+TEST_F(GPUImplHardwareTest, TheImagingSubsetAloneIsNoVersion)
+{
+    Device().strings[kGLVersion] = "1.1";
+    Device().extensions = {"GL_ARB_imaging"};
+    EXPECT_TRUE(fImpl.GLIsExtensionSupported(QGF::OGL::GL_IMAGING_1_2));
+    EXPECT_EQ(Thrown([this] { fImpl.GetGLVersion(); }), "Cannot determine OGL version");
+    EXPECT_EQ(QGF::OGL::Context::Current(), nullptr);
+}
+
+TEST_F(GPUImplHardwareTest, TheLibrarysOwnExceptionsPassThrough)
+{
+    Device().onMakeCurrent = [] { throw QGF::LogicalException("lost"); };
+    EXPECT_THROW(fImpl.GetGLVersion(), QGF::LogicalException);
+    EXPECT_THROW(fImpl.GetGLVendor(), QGF::LogicalException);
+    EXPECT_THROW(fImpl.HasGLNPOTSupport(), QGF::LogicalException);
+}
+
+// The trials.
+
+std::size_t TextSize(const char* const* texts, int count)
+{
+    return std::accumulate(texts, texts + count, std::size_t{0},
+                           [](std::size_t size, const char* text) {
+                               return size + std::char_traits<char>::length(text);
+                           });
+}
+
+// FNV-1a over the entries, each with its terminating zero.
+std::uint64_t TextHash(const char* const* texts, int count)
+{
+    std::uint64_t hash = 0xcbf29ce484222325;
+    for (int i = 0; i < count; ++i) {
+        const std::string text = texts[i];
+        for (std::size_t k = 0; k <= text.size(); ++k) // the zero included
+            hash = (hash ^ static_cast<unsigned char>(text.c_str()[k])) * 0x100000001b3;
+    }
+    return hash;
+}
+
+TEST(TestShadersTest, TheEntriesAreKeptToTheLetter)
+{
+    EXPECT_EQ(std::size(pmutil::kTestVertexShader), 13U);
+    EXPECT_EQ(std::size(pmutil::kTestFragmentShader), 76U);
+    EXPECT_EQ(TextSize(pmutil::kTestVertexShader, pmutil::kTestVertexShaderCount), 288U);
+    EXPECT_EQ(TextSize(pmutil::kTestFragmentShader, pmutil::kTestFragmentShaderCount), 2642U);
+    EXPECT_EQ(TextHash(pmutil::kTestVertexShader, pmutil::kTestVertexShaderCount),
+              0xa9a3be823819509a);
+    EXPECT_EQ(TextHash(pmutil::kTestFragmentShader, pmutil::kTestFragmentShaderCount),
+              0x64464cb2400ba59);
+    EXPECT_STREQ(pmutil::kTestFragmentShader[4], "uniform float sample_scale; ");
+    EXPECT_STREQ(pmutil::kTestFragmentShader[43],
+                 "sum_wt += weight[6];tex_coord = gl_TexCoord[0].st + sample_scale * offset_y[7] "
+                 "* duvdy;");
+}
+
+TEST_F(GPUImplHardwareTest, BothShadersAreCompiledAndLinkedAndNothingIsDrawn)
+{
+    std::vector<std::vector<std::string>> sources;
+    Device().onCall["glCompileShader"] = [&] { sources.push_back(Device().shaderSource); };
+    EXPECT_TRUE(fImpl.CompileProgramGLSL());
+    ASSERT_EQ(sources.size(), 2U);
+    EXPECT_THAT(sources[0], testing::ElementsAreArray(pmutil::kTestVertexShader));
+    EXPECT_THAT(sources[1], testing::ElementsAreArray(pmutil::kTestFragmentShader));
+    EXPECT_THAT(fGL.calls, Contains("glLinkProgram(1)").Times(1));
+    EXPECT_THAT(fGL.callsOf("glUniform"), IsEmpty());
+    EXPECT_THAT(fGL.callsOf("glGetError"), IsEmpty());
+    EXPECT_EQ(fGL.calls.front(), "makeCurrent fake0");
+    EXPECT_EQ(fGL.calls.back(), "release fake0");
+    EXPECT_EQ(Device().objects, 0);
+    EXPECT_THAT(fLog.Lines(), IsEmpty());
+}
+
+TEST_F(GPUImplHardwareTest, ARejectedFragmentShaderAnswersFalseWithTheTextInTheLog)
+{
+    Device().fragmentCompiles = false;
+    Device().log = "0:7: syntax error";
+    EXPECT_EQ(Told([this] { EXPECT_FALSE(fImpl.CompileProgramGLSL()); }), "");
+    EXPECT_THAT(fLog.Lines(), ElementsAre(AllOf(StartsWith("DoCompileProgramGLSL: "),
+                                                HasSubstr("0:7: syntax error"))));
+    EXPECT_EQ(QGF::OGL::Context::Current(), nullptr);
+    EXPECT_EQ(Device().objects, 0);
+    EXPECT_EQ(fImpl.GetGLVendor(), "Fake Vendor"); // the device goes on answering
+}
+
+TEST_F(GPUImplHardwareTest, ARejectedVertexShaderAnswersFalse)
+{
+    Device().vertexCompiles = false;
+    EXPECT_FALSE(fImpl.CompileProgramGLSL());
+    EXPECT_EQ(fGL.callsOf("glCompileShader").size(), 1U);
+}
+
+TEST_F(GPUImplHardwareTest, AFailedLinkAnswersFalse)
+{
+    Device().links = false;
+    Device().log = "too many instructions";
+    EXPECT_FALSE(fImpl.CompileProgramGLSL());
+    EXPECT_THAT(fLog.Lines(), ElementsAre(AllOf(StartsWith("DoCompileProgramGLSL: "),
+                                                HasSubstr("too many instructions"))));
+}
+
+TEST_F(GPUImplHardwareTest, TrialsSayNothingWithLoggingOff)
+{
+    fLog.SetOn(false);
+    Device().links = false;
+    Device().framebufferStatus = 0;
+    const std::string told = Told([this] {
+        testing::internal::CaptureStdout();
+        EXPECT_FALSE(fImpl.CompileProgramGLSL());
+        EXPECT_FALSE(fImpl.GLFramebufferOK());
+        EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+    });
+    EXPECT_EQ(told, "");
+    EXPECT_EQ(fLog.Text(), "");
+}
+
+TEST_F(GPUImplHardwareTest, AContextThatIsLostFailsBothTrials)
+{
+    Device().onMakeCurrent = [] { throw QGF::LogicalException("lost"); };
+    EXPECT_FALSE(fImpl.CompileProgramGLSL());
+    EXPECT_FALSE(fImpl.GLFramebufferOK());
+    EXPECT_THAT(fLog.Lines(), ElementsAre("DoCompileProgramGLSL: lost", "DoGLFramebufferOK: lost"));
+}
+
+TEST_F(GPUImplHardwareTest, AnExceptionThatIsNoStandardOnePassesThroughTheTrials)
+{
+    Device().onCall["glCreateProgram"] = [] { throw 1; };
+    Device().onCall["glClear"] = [] { throw 2; };
+    EXPECT_THROW(fImpl.CompileProgramGLSL(), int);
+    EXPECT_THROW(fImpl.GLFramebufferOK(), int);
+    EXPECT_EQ(QGF::OGL::Context::Current(), nullptr);
+    EXPECT_EQ(Device().objects, 0);
+}
+
+TEST_F(GPUImplHardwareTest, TheFramebufferIsClearedUnboundAndCheckedOnce)
+{
+    EXPECT_TRUE(fImpl.GLFramebufferOK());
+    EXPECT_THAT(fGL.calls, Contains(StartsWith("glTexImage2D(0xDE1,0,0x8058,32,32,0,")));
+    EXPECT_EQ(fGL.callsOf("glGetError").size(), 1U);
+    EXPECT_THAT(fGL.callsOf("glReadPixels"), IsEmpty());
+    EXPECT_EQ(Device().objects, 0);
+    EXPECT_THAT(fLog.Lines(), IsEmpty());
+    const auto begin =
+        std::find_if(fGL.calls.begin(), fGL.calls.end(), [](const std::string& call) {
+            return call.rfind("glBindFramebuffer", 0) == 0;
+        });
+    EXPECT_THAT(std::vector<std::string>(begin, fGL.calls.end()),
+                ElementsAre("glBindFramebuffer(0x8D40,2)",
+                            "glFramebufferTexture2D(0x8D40,0x8CE0,0xDE1,1,0)",
+                            "glCheckFramebufferStatus(0x8D40)", "glClearColor(255,255,255,255)",
+                            "glClear(0x4000)", "glBindFramebuffer(0x8D40,0)", "glGetError()",
+                            "glDeleteFramebuffers(1,2)", "glDeleteTextures(1,1)", "release fake0"));
+}
+
+TEST_F(GPUImplHardwareTest, AnErrorOfTheClearShowsUpAsTheFirstInTheQueue)
+{
+    Device().onCall["glClear"] = [this] { Device().errors = {0x506, 0x501}; };
+    EXPECT_EQ(Told([this] { EXPECT_FALSE(fImpl.GLFramebufferOK()); }), "");
+    EXPECT_THAT(fLog.Lines(), ElementsAre("DoGLFramebufferOK: glGetError() returns 1286"));
+    EXPECT_THAT(Device().errors, ElementsAre(0x501U));
+    EXPECT_EQ(Device().objects, 0);
+}
+
+TEST_F(GPUImplHardwareTest, AnErrorOfTheClearColorShowsUpAfterTheUnbind)
+{
+    Device().onCall["glClearColor"] = [this] { Device().errors = {0x502}; };
+    EXPECT_FALSE(fImpl.GLFramebufferOK());
+    EXPECT_THAT(fLog.Lines(), ElementsAre("DoGLFramebufferOK: glGetError() returns 1282"));
+}
+
+TEST_F(GPUImplHardwareTest, TheTrialsStatusIsLoggedSigned)
+{
+    Device().onCall["glClear"] = [this] { Device().errors = {0xFFFFFFFF}; };
+    EXPECT_FALSE(fImpl.GLFramebufferOK());
+    EXPECT_THAT(fLog.Lines(), ElementsAre("DoGLFramebufferOK: glGetError() returns -1"));
+}
+
+TEST_F(GPUImplHardwareTest, AnIncompleteFramebufferAnswersFalse)
+{
+    Device().framebufferStatus = 0x8CDD;
+    EXPECT_FALSE(fImpl.GLFramebufferOK());
+    EXPECT_THAT(fLog.Lines(), ElementsAre(StartsWith("DoGLFramebufferOK: ")));
+    EXPECT_EQ(Device().objects, 0);
+}
+
+TEST_F(GPUImplHardwareTest, AFailingTextureAnswersFalse)
+{
+    Device().makesObjects = false;
+    EXPECT_FALSE(fImpl.GLFramebufferOK());
+    EXPECT_FALSE(fImpl.CompileProgramGLSL());
+    EXPECT_THAT(fLog.Lines(), ElementsAre(StartsWith("DoGLFramebufferOK: "),
+                                          StartsWith("DoCompileProgramGLSL: ")));
+}
+
+// Answers that the base alone gives.
+
+class BareHardware : public pmutil::GPUImplHardware {
+private:
+    GLGPUs DoGetGPUs() override { return {}; }
+    std::uint32_t DoGetGLMemoryMB() override { return 0; }
+    std::uint32_t DoGetGLVendorID() override { return 0; }
+    std::string DoGetGLDriverVersion() override { return {}; }
+    std::uint32_t DoGetGLRendererID() override { return 0; }
+};
+
+TEST_F(GPUImplHardwareTest, TheBaseKnowsNoDriverAndNoIntegratedDevice)
+{
+    BareHardware bare;
+    EXPECT_EQ(bare.GetGLDriver(), "");
+    EXPECT_EQ(bare.GetGLDriverDate(), "");
+    EXPECT_EQ(bare.GetGLDriverExtra(), "");
+    EXPECT_FALSE(bare.IsIntegratedGLGPU());
+    EXPECT_EQ(bare.context, nullptr);
+    EXPECT_EQ(bare.device.id(), nullptr);
+}
+
+TEST_F(GPUImplHardwareTest, TheBasesNameIsTheRendererText)
+{
+    BareHardware bare;
+    bare.context = fImpl.context;
+    EXPECT_EQ(bare.GetGLName(), "Fake Renderer 0");
+    EXPECT_EQ(bare.GetGLRenderer(), "Fake Renderer 0");
+}
+
+// A question without a context.
+
+struct GLQuestion {
+    const char* name;
+    void (*ask)(pmutil::GPUImpl&);
+};
+
+void PrintTo(const GLQuestion& question, std::ostream* out)
+{
+    *out << question.name;
+}
+
+class GPUImplHardwareDeathTest : public testing::TestWithParam<GLQuestion> {};
+
+TEST_P(GPUImplHardwareDeathTest, ANullContextTripsTheAssertion)
+{
+    GPUImplWin impl;
+    EXPECT_DEATH(GetParam().ask(impl), "px != 0");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Questions, GPUImplHardwareDeathTest,
+    testing::Values(
+        GLQuestion{"GLVersion", [](pmutil::GPUImpl& impl) { impl.GetGLVersion(); }},
+        GLQuestion{"GLVendor", [](pmutil::GPUImpl& impl) { impl.GetGLVendor(); }},
+        GLQuestion{"GLRenderer", [](pmutil::GPUImpl& impl) { impl.GetGLRenderer(); }},
+        GLQuestion{"GLRectTextureSize", [](pmutil::GPUImpl& impl) { impl.GetGLRectTextureSize(); }},
+        GLQuestion{"GLNPOTSupport", [](pmutil::GPUImpl& impl) { impl.HasGLNPOTSupport(); }},
+        GLQuestion{"CompileProgramGLSL", [](pmutil::GPUImpl& impl) { impl.CompileProgramGLSL(); }},
+        GLQuestion{"GLFramebufferOK", [](pmutil::GPUImpl& impl) { impl.GLFramebufferOK(); }},
+        GLQuestion{"GLGetString", [](pmutil::GPUImpl& impl) { impl.GLGetString(kGLVendor); }},
+        GLQuestion{"GLGetIntegerv",
+                   [](pmutil::GPUImpl& impl) {
+                       std::int32_t result = 0;
+                       impl.GLGetIntegerv(1, &result);
+                   }},
+        GLQuestion{"GLGetProgramivARB",
+                   [](pmutil::GPUImpl& impl) {
+                       std::int32_t result = 0;
+                       impl.GLGetProgramivARB(1, 2, &result);
+                   }},
+        GLQuestion{
+            "Extension",
+            [](pmutil::GPUImpl& impl) { impl.GLIsExtensionSupported(QGF::OGL::GL_VERSION_1_2); }}),
+    [](const testing::TestParamInfo<GLQuestion>& question) { return question.param.name; });
+
+} // namespace
