@@ -286,7 +286,7 @@ TEST(CLKeys, EachFailingOneCostsItsDeviceTheRest)
 
 class OneDevice : public testing::Test {
 protected:
-    ~OneDevice() override { pmutil::GetDebugValue(pmutil::gGPUAssay) = 0; }
+    void TearDown() override { pmutil::GetDebugValue(pmutil::gGPUAssay) = 0; }
 
     FakeGPU impl = boost::make_shared<FakeGPUImpl>();
     boost::shared_ptr<pmutil::GLGPU> gl = MakeGL(impl);

@@ -17,19 +17,16 @@ namespace assay {
 namespace {
 
 using testing::ElementsAre;
-using testing::HasSubstr;
 using testing::IsEmpty;
-using testing::StartsWith;
 
-const Lines kUsage = {"usage: ",
-                      "    -help {show this message}",
+const Lines kUsage = {"usage: ", "    -help {show this message}",
                       "    -crashAfter=N {GPUAssayTester should crash after N steps}",
                       "    -throwAfter=N {GPUAssayTester should throw after N steps}",
                       "    -app=SomeApp {specify name of host app}",
                       "    -stdout=line_of_stdout {puts the line to stdout as-is}",
                       "    -stderr=line_of_stderr {puts the line to stderr as-is}",
-                      "    -exit=N {app should exit with N}",
-                      "    -verbose=N {verbosity level}",
+                      "    -exit=N {app should exit with N}", "    -verbose=N {verbosity level}",
+                      // NOLINTNEXTLINE(bugprone-suspicious-missing-comma): one line of the text
                       "    -timeout=N {Mac only, SIGALRM kills assay after N seconds, if not "
                       "finished}",
                       "    -comment=line_of_comment {outputs '# line_of_comment'}",
@@ -56,10 +53,10 @@ private:
 
 class AppRun : public testing::Test {
 protected:
-    ~AppRun() override { pmutil::GetDebugValue(pmutil::gGPUAssay) = 0; }
+    void TearDown() override { pmutil::GetDebugValue(pmutil::gGPUAssay) = 0; }
 
     // Lets the sequence call `call`.
-    void InSequence(std::function<void(GPUAssayTester&)> call)
+    void InSequence(const std::function<void(GPUAssayTester&)>& call)
     {
         app.makeTester = [call](GPUAssayApp* owner) { return new OneCallTester(owner, call); };
     }

@@ -17,7 +17,6 @@ namespace assay {
 namespace {
 
 using testing::ElementsAre;
-using testing::HasSubstr;
 using testing::IsEmpty;
 
 // What a step throws; empty for nothing.

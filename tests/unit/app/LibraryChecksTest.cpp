@@ -20,7 +20,7 @@ using testing::IsEmpty;
 
 class LibraryChecks : public testing::Test {
 protected:
-    ~LibraryChecks() override { QGF::Core::ReplaceLoaderCheck(nullptr); }
+    void TearDown() override { QGF::Core::ReplaceLoaderCheck(nullptr); }
 
     // The report line and the log lines of one check, which takes one step.
     void ExpectCheck(void (GPUAssayTester::*check)(), const std::string& line, const Lines& logged)

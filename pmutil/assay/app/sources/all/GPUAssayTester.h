@@ -88,9 +88,9 @@ public:
     virtual void DoRunCLBandwidth(std::string tag, CLGPU& gpu);
     virtual void DoRunCLDeviceVersion(std::string tag, CLGPU& gpu);
 
-    // Queries by number: a line with the number behind each name, then the answer. One step, but none
-    // for the string: the steps of a run are counted on that footing. `count` is how many integers
-    // the query answers. A string that OpenGL doesn't give (null) throws std::logic_error.
+    // Queries by number: a line with the number behind each name, then the answer. One step, but
+    // none for the string: the steps of a run are counted on that footing. `count` is how many
+    // integers the query answers. A string that OpenGL doesn't give (null) throws std::logic_error.
     virtual void DoRunGLGetString(std::string tag, GLGPU& gpu, const char* name, std::int32_t code);
     virtual void DoRunGLGetIntegerv(std::string tag, GLGPU& gpu, const char* name,
                                     std::int32_t code, std::uint64_t count);

@@ -1,5 +1,6 @@
 // The OpenCL half of the sequence.
 #include <optional>
+#include <utility>
 
 #include <boost/make_shared.hpp>
 
@@ -79,42 +80,42 @@ void GPUAssayTester::DoRunCLTests()
 
 void GPUAssayTester::DoRunCLPlatformVersion(std::string tag, CLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "CLPlatformVersion"), gpu.GetVersion()));
+    Report(TextLine(TaggedKey(std::move(tag), "CLPlatformVersion"), gpu.GetVersion()));
 }
 
 void GPUAssayTester::DoRunCLName(std::string tag, CLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "CLName"), gpu.GetName()));
+    Report(TextLine(TaggedKey(std::move(tag), "CLName"), gpu.GetName()));
 }
 
 void GPUAssayTester::DoRunIsIntegratedCLGPU(std::string tag, CLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "IsIntegratedCLGPU"), gpu.IsIntegrated()));
+    Report(ValueLine(TaggedKey(std::move(tag), "IsIntegratedCLGPU"), gpu.IsIntegrated()));
 }
 
 void GPUAssayTester::DoRunCLMemoryMB(std::string tag, CLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "CLMemoryMB"), gpu.GetMemoryMB()));
+    Report(ValueLine(TaggedKey(std::move(tag), "CLMemoryMB"), gpu.GetMemoryMB()));
 }
 
 void GPUAssayTester::DoRunCLVendor(std::string tag, CLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "CLVendor"), gpu.GetVendor()));
+    Report(TextLine(TaggedKey(std::move(tag), "CLVendor"), gpu.GetVendor()));
 }
 
 void GPUAssayTester::DoRunCLVendorID(std::string tag, CLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "CLVendorID"), gpu.GetVendorID()));
+    Report(ValueLine(TaggedKey(std::move(tag), "CLVendorID"), gpu.GetVendorID()));
 }
 
 void GPUAssayTester::DoRunCLDriverVersion(std::string tag, CLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "CLDriverVersion"), gpu.GetDriverVersion()));
+    Report(TextLine(TaggedKey(std::move(tag), "CLDriverVersion"), gpu.GetDriverVersion()));
 }
 
 void GPUAssayTester::DoRunCUDASupported(std::string tag, CLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "CUDASupported"), gpu.impl->GetCUDASupported()));
+    Report(ValueLine(TaggedKey(std::move(tag), "CUDASupported"), gpu.impl->GetCUDASupported()));
 }
 
 void GPUAssayTester::DoRunCUDAVersion(std::string tag, CLGPU& gpu)
@@ -122,7 +123,7 @@ void GPUAssayTester::DoRunCUDAVersion(std::string tag, CLGPU& gpu)
     if (gpu.impl->GetCUDASupported()) {
         const std::string version = gpu.impl->GetCUDAVersion();
         if (!version.empty())
-            Print(TextLine(TaggedKey(tag, "CUDAVersion"), version));
+            Print(TextLine(TaggedKey(std::move(tag), "CUDAVersion"), version));
     }
     GPUAssayTester::Step();
 }
@@ -135,12 +136,12 @@ void GPUAssayTester::DoRunCLBandwidth(std::string tag, CLGPU& gpu)
     const std::int32_t delay = pmutil::GetDebugValue(gGPUAssayOCLDelay);
     if (delay > 0)
         SpinSeconds(delay);
-    Report(ValueLine(TaggedKey(tag, "CLBandwidth"), gpu.impl->GetCLBandwidth()));
+    Report(ValueLine(TaggedKey(std::move(tag), "CLBandwidth"), gpu.impl->GetCLBandwidth()));
 }
 
 void GPUAssayTester::DoRunCLDeviceVersion(std::string tag, CLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "CLDeviceVersion"), gpu.impl->GetCLDeviceVersion()));
+    Report(TextLine(TaggedKey(std::move(tag), "CLDeviceVersion"), gpu.impl->GetCLDeviceVersion()));
 }
 
 } // namespace assay

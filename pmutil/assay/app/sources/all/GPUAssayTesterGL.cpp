@@ -1,4 +1,6 @@
 // The OpenGL half of the sequence.
+#include <utility>
+
 #include <boost/make_shared.hpp>
 
 #include "GPUAssayApp.h"
@@ -89,77 +91,79 @@ void GPUAssayTester::DoRunGLTests()
 
 void GPUAssayTester::DoRunGLVersion(std::string tag, GLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "GLVersion"), gpu.GetVersion()));
+    Report(TextLine(TaggedKey(std::move(tag), "GLVersion"), gpu.GetVersion()));
 }
 
 void GPUAssayTester::DoRunGLName(std::string tag, GLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "GLName"), gpu.GetName()));
+    Report(TextLine(TaggedKey(std::move(tag), "GLName"), gpu.GetName()));
 }
 
 void GPUAssayTester::DoRunIsIntegratedGLGPU(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "IsIntegratedGLGPU"), gpu.IsIntegrated()));
+    Report(ValueLine(TaggedKey(std::move(tag), "IsIntegratedGLGPU"), gpu.IsIntegrated()));
 }
 
 void GPUAssayTester::DoRunGLMemoryMB(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "GLMemoryMB"), gpu.GetMemoryMB()));
+    Report(ValueLine(TaggedKey(std::move(tag), "GLMemoryMB"), gpu.GetMemoryMB()));
 }
 
 void GPUAssayTester::DoRunGLVendor(std::string tag, GLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "GLVendor"), gpu.GetVendor()));
+    Report(TextLine(TaggedKey(std::move(tag), "GLVendor"), gpu.GetVendor()));
 }
 
 void GPUAssayTester::DoRunGLVendorID(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "GLVendorID"), gpu.GetVendorID()));
+    Report(ValueLine(TaggedKey(std::move(tag), "GLVendorID"), gpu.GetVendorID()));
 }
 
 void GPUAssayTester::DoRunGLDriverVersion(std::string tag, GLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "GLDriverVersion"), gpu.GetDriverVersion()));
+    Report(TextLine(TaggedKey(std::move(tag), "GLDriverVersion"), gpu.GetDriverVersion()));
 }
 
 void GPUAssayTester::DoRunGLRectTextureSize(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "GLRectTextureSize"), gpu.impl->GetGLRectTextureSize()));
+    Report(ValueLine(TaggedKey(std::move(tag), "GLRectTextureSize"),
+                     gpu.impl->GetGLRectTextureSize()));
 }
 
 void GPUAssayTester::DoRunGLRenderer(std::string tag, GLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "GLRenderer"), gpu.impl->GetGLRenderer()));
+    Report(TextLine(TaggedKey(std::move(tag), "GLRenderer"), gpu.impl->GetGLRenderer()));
 }
 
 void GPUAssayTester::DoRunGLRendererID(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "GLRendererID"), gpu.impl->GetGLRendererID()));
+    Report(ValueLine(TaggedKey(std::move(tag), "GLRendererID"), gpu.impl->GetGLRendererID()));
 }
 
 void GPUAssayTester::DoRunHasGLNPOTSupport(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "HasGLNPOTSupport"), gpu.impl->HasGLNPOTSupport()));
+    Report(ValueLine(TaggedKey(std::move(tag), "HasGLNPOTSupport"), gpu.impl->HasGLNPOTSupport()));
 }
 
 void GPUAssayTester::DoRunGLDriver(std::string tag, GLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "GLDriver"), gpu.impl->GetGLDriver()));
+    Report(TextLine(TaggedKey(std::move(tag), "GLDriver"), gpu.impl->GetGLDriver()));
 }
 
 void GPUAssayTester::DoRunGLDriverDate(std::string tag, GLGPU& gpu)
 {
-    Report(TextLine(TaggedKey(tag, "GLDriverDate"), gpu.impl->GetGLDriverDate()));
+    Report(TextLine(TaggedKey(std::move(tag), "GLDriverDate"), gpu.impl->GetGLDriverDate()));
 }
 
 void GPUAssayTester::DoRunCanCompileProgramGLSL(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "CanCompileProgramGLSL"), gpu.impl->CompileProgramGLSL()));
+    Report(ValueLine(TaggedKey(std::move(tag), "CanCompileProgramGLSL"),
+                     gpu.impl->CompileProgramGLSL()));
 }
 
 void GPUAssayTester::DoRunGLFrameBufferOK(std::string tag, GLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "GLFrameBufferOK"), gpu.impl->GLFramebufferOK()));
+    Report(ValueLine(TaggedKey(std::move(tag), "GLFrameBufferOK"), gpu.impl->GLFramebufferOK()));
 }
 
 } // namespace assay

@@ -1,5 +1,6 @@
 // Queries by number, each with the numbers behind its names.
 #include <stdexcept>
+#include <utility>
 #include <vector>
 
 #include "GPUAssayTester.h"
@@ -38,7 +39,7 @@ void GPUAssayTester::DoRunGLGetString(std::string tag, GLGPU& gpu, const char* n
     const char* const text = gpu.impl->GLGetString(static_cast<std::uint32_t>(code));
     if (text == nullptr)
         throw std::logic_error(std::string("glGetString gives no text for ") + name);
-    Print(TextLine(IndexedKey(tag, "glGetString", name), text));
+    Print(TextLine(IndexedKey(std::move(tag), "glGetString", name), text));
 }
 
 void GPUAssayTester::DoRunGLGetIntegerv(std::string tag, GLGPU& gpu, const char* name,
@@ -47,7 +48,7 @@ void GPUAssayTester::DoRunGLGetIntegerv(std::string tag, GLGPU& gpu, const char*
     std::vector<std::int32_t> values(count);
     gpu.impl->GLGetIntegerv(static_cast<std::uint32_t>(code), values.data());
     Print(CodeLine(name, code));
-    Report(ValueLine(IndexedKey(tag, "glGetIntegerv", name), ListText(values)));
+    Report(ValueLine(IndexedKey(std::move(tag), "glGetIntegerv", name), ListText(values)));
 }
 
 void GPUAssayTester::DoRunGLGetProgramivARB(std::string tag, GLGPU& gpu, const char* name,
@@ -58,7 +59,8 @@ void GPUAssayTester::DoRunGLGetProgramivARB(std::string tag, GLGPU& gpu, const c
     Print(CodeLine(name, code));
     gpu.impl->GLGetProgramivARB(kFragmentProgram, static_cast<std::uint32_t>(code), values.data());
     const std::string key =
-        IndexedKey(tag, "glGetProgramivARB", "GL_FRAGMENT_PROGRAM_ARB") + "[" + name + "]";
+        IndexedKey(std::move(tag), "glGetProgramivARB", "GL_FRAGMENT_PROGRAM_ARB") + "[" + name +
+        "]";
     Report(ValueLine(key, ListText(values)));
 }
 
@@ -67,7 +69,7 @@ void GPUAssayTester::DoRunExtension(std::string tag, GLGPU& gpu, const char* nam
     Print(CodeLine(name, id));
     const bool supported =
         gpu.impl->GLIsExtensionSupported(static_cast<QGF::OGL::OpenGLExtension>(id));
-    Report(ValueLine(IndexedKey(tag, "extension", name), supported));
+    Report(ValueLine(IndexedKey(std::move(tag), "extension", name), supported));
 }
 
 } // namespace assay

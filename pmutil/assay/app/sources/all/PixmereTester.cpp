@@ -1,5 +1,7 @@
 #include "PixmereTester.h"
 
+#include <utility>
+
 #include "GPUTest.h"
 #include "ReportLine.h"
 
@@ -92,7 +94,7 @@ void PixmereTester::DoRunCLTests()
 
 void PixmereTester::DoRunCLCompute(std::string tag, CLGPU& gpu)
 {
-    Report(ValueLine(TaggedKey(tag, "CLCompute"), gpu.impl->GetCLCompute()));
+    Report(ValueLine(TaggedKey(std::move(tag), "CLCompute"), gpu.impl->GetCLCompute()));
 }
 
 } // namespace assay

@@ -25,15 +25,15 @@ inline std::string TextLine(const std::string& key, const std::string& text)
 }
 
 // tag.key
-inline std::string TaggedKey(const std::string& tag, const char* key)
+inline std::string TaggedKey(std::string tag, const char* key)
 {
-    return tag + "." + key;
+    return tag.append(".").append(key);
 }
 
 // tag.query[name]
-inline std::string IndexedKey(const std::string& tag, const char* query, const char* name)
+inline std::string IndexedKey(std::string tag, const char* query, const char* name)
 {
-    return tag + "." + query + "[" + name + "]";
+    return tag.append(".").append(query).append("[").append(name).append("]");
 }
 
 } // namespace assay
