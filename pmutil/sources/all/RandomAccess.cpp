@@ -1,0 +1,40 @@
+#include "pmutil/RandomAccess.h"
+
+namespace pmutil {
+
+RandomAccess::RandomAccess(RandomAccess* target, bool own)
+{
+    if (target != nullptr)
+        SetRandomAccess(target, own);
+}
+
+RandomAccess::~RandomAccess() = default;
+
+void RandomAccess::SetRandomAccess(RandomAccess* target, bool own)
+{
+    SetReader(target, own);
+    SetWriter(target, false);
+    SetSeeker(target, false);
+}
+
+void RandomAccess::SetEOF()
+{
+    RequireOpen();
+    DoSetEOF();
+}
+
+void RandomAccess::DoSetEOF()
+{
+    BinioSetEOF();
+}
+
+void RandomAccess::BinioSetEOF()
+{
+    // Null for a target that has no end to set; RequireTarget refuses it.
+    auto* const target = dynamic_cast<RandomAccess*>(GetTarget());
+    RequireTarget(target);
+    if (target != nullptr)
+        target->SetEOF();
+}
+
+} // namespace pmutil

@@ -1,0 +1,193 @@
+#include "pmutil/PosixHandle.h"
+
+#include <cerrno>
+#include <csignal>
+#include <cstdlib>
+#include <ctime>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <system_error>
+#include <unistd.h>
+
+#include "all/HandleChannelImpl.h"
+
+namespace pmutil {
+
+namespace {
+
+// What the kernel moves in one call; it refuses sizes beyond the signed range outright.
+constexpr std::uint64_t kMostPerCall = 0x7FFFF000;
+
+// Read and write for all: the process's file mode creation mask takes away from it.
+constexpr ::mode_t kFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IWGRP | S_IROTH | S_IWOTH;
+
+[[noreturn]] void ThrowCallFailed(const char* call, int error)
+{
+    throw std::runtime_error(std::string(call) +
+                             " failed: " + std::system_category().message(error));
+}
+
+template <typename Call>
+auto RetryInterrupted(Call call)
+{
+    auto result = call();
+    while (result == -1 && errno == EINTR)
+        result = call();
+    return result;
+}
+
+int GetOpenFlags(int access, int creation)
+{
+    static constexpr int kAccess[] = {O_RDONLY, O_WRONLY, O_RDWR};
+    static constexpr int kCreation[] = {0, O_TRUNC, O_CREAT, O_CREAT | O_TRUNC};
+    return kAccess[access - kOpenRead] | kCreation[creation - kOpenExisting] | O_CLOEXEC;
+}
+
+int GetWhence(SeekOrigin origin)
+{
+    switch (origin) {
+    case SeekOrigin::kBegin:
+        return SEEK_SET;
+    case SeekOrigin::kCurrent:
+        return SEEK_CUR;
+    case SeekOrigin::kEnd:
+        break;
+    }
+    return SEEK_END;
+}
+
+// Keeps SIGPIPE from the calling thread, and swallows the one that a write raises meanwhile. The
+// process's disposition of the signal, which belongs to the host, stays as it is.
+class PipeSignalBlock {
+public:
+    PipeSignalBlock()
+    {
+        sigemptyset(&fPipeSignal);
+        sigaddset(&fPipeSignal, SIGPIPE);
+        pthread_sigmask(SIG_BLOCK, &fPipeSignal, &fOldMask);
+        if (sigismember(&fOldMask, SIGPIPE) == 1) {
+            sigset_t pending;
+            sigemptyset(&pending);
+            sigpending(&pending);
+            fWasPending = sigismember(&pending, SIGPIPE) == 1;
+        }
+    }
+
+    ~PipeSignalBlock() { pthread_sigmask(SIG_SETMASK, &fOldMask, nullptr); }
+    PipeSignalBlock(const PipeSignalBlock&) = delete;
+    PipeSignalBlock& operator=(const PipeSignalBlock&) = delete;
+
+    void Swallow()
+    {
+        if (fWasPending)
+            return;
+        const timespec noWait{};
+        RetryInterrupted([&] { return sigtimedwait(&fPipeSignal, nullptr, &noWait); });
+    }
+
+private:
+    sigset_t fPipeSignal{};
+    sigset_t fOldMask{};
+    bool fWasPending = false;
+};
+
+} // namespace
+
+void PosixCalls::Close(Handle handle)
+{
+    // Not repeated when interrupted: the descriptor is gone by then.
+    ::close(handle);
+}
+
+void PosixCalls::Delete(const Path& path)
+{
+    ::unlink(path.c_str());
+}
+
+PosixCalls::Handle PosixCalls::Open(const Path& path, int access, int creation)
+{
+    static constexpr char kCall[] = "open";
+    // A path with a zero byte would open another file, and a truncation without the right to write
+    // is carried out all the same.
+    if (path.find('\0') != Path::npos || (access == kOpenRead && creation == kTruncateExisting))
+        ThrowCallFailed(kCall, EINVAL);
+    const Handle handle = RetryInterrupted(
+        [&] { return ::open(path.c_str(), GetOpenFlags(access, creation), kFileMode); });
+    if (handle == GetInvalid())
+        ThrowCallFailed(kCall, errno);
+    struct ::stat status = {};
+    if (::fstat(handle, &status) == 0 && S_ISDIR(status.st_mode)) {
+        Close(handle);
+        ThrowCallFailed(kCall, EISDIR);
+    }
+    return handle;
+}
+
+std::uint64_t PosixCalls::Read(Handle handle, void* bytes, std::uint64_t nbytes)
+{
+    const std::size_t wanted = std::min(nbytes, kMostPerCall);
+    const ::ssize_t count = RetryInterrupted([&] { return ::read(handle, bytes, wanted); });
+    if (count < 0)
+        ThrowCallFailed("read", errno);
+    return static_cast<std::uint64_t>(count);
+}
+
+std::uint64_t PosixCalls::Write(Handle handle, const void* bytes, std::uint64_t nbytes)
+{
+    const std::size_t wanted = std::min(nbytes, kMostPerCall);
+    PipeSignalBlock block;
+    const ::ssize_t count = RetryInterrupted([&] { return ::write(handle, bytes, wanted); });
+    if (count < 0) {
+        const int error = errno;
+        if (error == EPIPE)
+            block.Swallow();
+        ThrowCallFailed("write", error);
+    }
+    return static_cast<std::uint64_t>(count);
+}
+
+void PosixCalls::Seek(Handle handle, std::int64_t offset, SeekOrigin origin)
+{
+    SeekAndTell(handle, offset, origin);
+}
+
+std::uint64_t PosixCalls::SeekAndTell(Handle handle, std::int64_t offset, SeekOrigin origin)
+{
+    const ::off_t position = ::lseek(handle, offset, GetWhence(origin));
+    if (position < 0)
+        ThrowCallFailed("lseek", errno);
+    return static_cast<std::uint64_t>(position);
+}
+
+void PosixCalls::SetEndOfFile(Handle handle)
+{
+    const auto position = static_cast<::off_t>(SeekAndTell(handle, 0, SeekOrigin::kCurrent));
+    if (RetryInterrupted([&] { return ::ftruncate(handle, position); }) != 0)
+        ThrowCallFailed("ftruncate", errno);
+}
+
+PosixCalls::Path PosixCalls::GetTemporaryDirectory()
+{
+    const char* const directory = ::secure_getenv("TMPDIR"); // NOLINT(concurrency-mt-unsafe): the
+                                                             // environment is only read
+    return directory != nullptr && *directory != '\0' ? directory : "/tmp";
+}
+
+PosixCalls::Path PosixCalls::MakeTemporaryFileName(const Path& prefix)
+{
+    Path path = GetTemporaryDirectory() + "/" + prefix + "XXXXXX";
+    const Handle handle = ::mkostemp(path.data(), O_CLOEXEC);
+    if (handle == GetInvalid())
+        ThrowCallFailed("mkostemp", errno);
+    Close(handle);
+    return path;
+}
+
+PosixCalls::Handle PosixCalls::GetStandard(int number)
+{
+    return number;
+}
+
+template class HandleChannel<PosixCalls>;
+
+} // namespace pmutil

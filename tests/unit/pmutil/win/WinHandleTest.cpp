@@ -1,0 +1,66 @@
+#include "pmutil/WinHandle.h"
+
+#include <windows.h>
+#include <winioctl.h>
+
+#include "../HandleChannelTests.h"
+#include "pmutil/Fmt.h"
+
+using namespace pmutil;
+
+namespace {
+
+struct Win {
+    using Channel = WinHandle;
+    using Calls = WinCalls;
+
+    static constexpr char kOpenFailed[] = "CreateFileW failed";
+    static constexpr char kReadFailed[] = "ReadFile failed";
+    static constexpr char kWriteFailed[] = "WriteFile failed";
+    static constexpr char kBrokenPipe[] = "WriteFile failed";
+    static constexpr char kSeekFailed[] = "SetFilePointerEx failed";
+    static constexpr char kSetEndFailed[] = "SetEndOfFile failed";
+
+    static void MakePipe(HANDLE& readEnd, HANDLE& writeEnd)
+    {
+        ASSERT_NE(::CreatePipe(&readEnd, &writeEnd, nullptr, 0), 0);
+    }
+
+    static bool Exists(const std::wstring& path)
+    {
+        return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
+    }
+
+    static bool MakeSparse(WinHandle& file)
+    {
+        DWORD count = 0;
+        ::DeviceIoControl(file.GetHandle(), FSCTL_SET_SPARSE, nullptr, 0, nullptr, 0, &count,
+                          nullptr);
+        // Wine's files are the host's, and sparse without being told.
+        return true;
+    }
+
+    static std::string ClosingText(HANDLE handle)
+    {
+        std::string text;
+        Fmt::ToText(text, static_cast<const void*>(handle));
+        return "WinHandle::Reset closing " + text + "\n";
+    }
+};
+
+INSTANTIATE_TYPED_TEST_SUITE_P(Win, HandleChannelTest, Win);
+
+TEST(WinHandle, TemporaryDirectoryIsTheUsersFolder)
+{
+    wchar_t buffer[MAX_PATH] = {};
+    ASSERT_NE(::GetTempPathW(MAX_PATH, buffer), 0U);
+    EXPECT_EQ(WinHandle::GetTemporaryDirectory(), buffer);
+}
+
+TEST(WinHandle, StandardChannelsStandOverTheProcessesHandles)
+{
+    EXPECT_EQ(dynamic_cast<WinHandle&>(WinHandle::GetStandardOutput()).GetHandle(),
+              ::GetStdHandle(STD_OUTPUT_HANDLE));
+}
+
+} // namespace
