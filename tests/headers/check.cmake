@@ -1,0 +1,18 @@
+# Fails if a header under ROOT includes anything but the tree's own headers, Boost, Khronos' and the
+# standard library's.
+file(GLOB headers ${ROOT}/*.h)
+if(NOT headers)
+  message(FATAL_ERROR "no headers in ${ROOT}")
+endif()
+foreach(header ${headers})
+  file(STRINGS ${header} includes REGEX "^ *# *include <")
+  foreach(include ${includes})
+    if(NOT include MATCHES "<(boost/.*|CL/.*|GL/.*|EGL/.*|KHR/.*|[a-z_]+)>")
+      message(SEND_ERROR "${header}: ${include}")
+    endif()
+  endforeach()
+  file(STRINGS ${header} conditions REGEX "^ *# *(if|ifdef|elif).*(WIN32|linux|unix|APPLE)")
+  if(conditions)
+    message(SEND_ERROR "${header}: ${conditions}")
+  endif()
+endforeach()
