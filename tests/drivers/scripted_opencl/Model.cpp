@@ -89,6 +89,7 @@ const std::map<std::string, std::int64_t> kNames = {
     SCRIPTED_NAME(CL_DEVICE_PROFILE),
     SCRIPTED_NAME(CL_DEVICE_VERSION),
     SCRIPTED_NAME(CL_DEVICE_EXTENSIONS),
+    SCRIPTED_NAME(CL_DEVICE_HOST_UNIFIED_MEMORY),
     SCRIPTED_NAME(CL_DEVICE_PLATFORM),
     SCRIPTED_NAME(CL_DEVICE_OPENCL_C_VERSION),
     SCRIPTED_NAME(CL_MEM_READ_WRITE),
@@ -217,7 +218,7 @@ void ReadModel(Model& model, const std::string& path)
     for (Line& line : ReadScript(path)) {
         const std::string directive = line.Take("a directive").text;
         if (directive == "record") {
-            model.monitor.RecordTo(line.TakeText("a file's name").value_or(""));
+            model.monitor.RecordTo(line.Take("a file").text);
         } else if (directive == "at") {
             model.monitor.AddRule(line, NumberOf);
         } else if (directive == "claim-platforms") {
