@@ -1,8 +1,12 @@
+#include "qgf/qgf_core/SystemRoot.h"
+
 #include "qgf/AdapterName.h"
 
 namespace QGF {
 
 namespace {
+
+unsigned gCount = 0;
 
 std::string& Root()
 {
@@ -15,11 +19,17 @@ std::string& Root()
 void SetSystemRoot(const std::string& root)
 {
     Root() = root;
+    ++gCount;
 }
 
 const std::string& SystemRoot()
 {
     return Root();
+}
+
+unsigned SystemRootCount()
+{
+    return gCount;
 }
 
 } // namespace QGF

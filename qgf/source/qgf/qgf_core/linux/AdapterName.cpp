@@ -1,10 +1,250 @@
+// Which files are read, and why none of them wakes a card. "class", "vendor" and "device" of a PCI
+// device print fields of the kernel's struct pci_dev (drivers/pci/pci-sysfs.c, pci_config_attr;
+// Documentation/ABI/testing/sysfs-bus-pci), unlike "config" and the link speeds, which resume the
+// device to read it. amdgpu's "product_name" prints what the driver read when it started
+// (drivers/gpu/drm/amd/amdgpu/amdgpu_fru_eeprom.c). NvidiaProc.cpp tells of the one file that does
+// wake its card.
 #include "qgf/AdapterName.h"
 
-namespace QGF {
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <memory>
+#include <set>
 
-std::string AdapterName(const std::string&)
+#include "qgf/qgf_core/SystemRoot.h"
+#include "qgf/qgf_core/linux/NvidiaProc.h"
+#include "qgf/qgf_core/linux/PciAddress.h"
+#include "qgf/qgf_core/linux/PciIds.h"
+
+namespace QGF {
+namespace {
+
+const char kPciDevices[] = "/sys/bus/pci/devices";
+const char kDrmClass[] = "/sys/class/drm";
+constexpr unsigned kDisplayClass = 0x03;
+constexpr std::uint16_t kNvidia = 0x10DE;
+
+// An adapter description holds 127 characters; the longest " (PCI address)" takes 19 of them.
+constexpr std::size_t kNameLimit = 127 - 19;
+
+struct Adapters {
+    unsigned rootCount = 0;
+    std::vector<std::string> addresses;
+    std::map<std::string, std::string> names;
+};
+
+std::string AttributeOf(const std::string& address, const char* attribute)
 {
-    return {};
+    return ReadSystemLine(std::string(kPciDevices) + "/" + address + "/" + attribute);
+}
+
+// A number as the kernel prints ids, "0x10de"; 0 for anything else.
+unsigned long IdOf(const std::string& address, const char* attribute)
+{
+    const std::string text = AttributeOf(address, attribute);
+    char* end = nullptr;
+    const unsigned long id = std::strtoul(text.c_str(), &end, 16);
+    return !text.empty() && *end == '\0' && id <= 0xFFFFFF ? id : 0;
+}
+
+std::uint16_t ShortIdOf(const std::string& address, const char* attribute)
+{
+    const unsigned long id = IdOf(address, attribute);
+    return static_cast<std::uint16_t>(id <= 0xFFFF ? id : 0);
+}
+
+bool IsDrmNode(const std::string& name)
+{
+    for (const char* prefix : {"card", "renderD"}) {
+        const std::size_t length = std::char_traits<char>::length(prefix);
+        if (name.compare(0, length, prefix) == 0 && name.size() > length &&
+            name.find_first_not_of("0123456789", length) == std::string::npos) {
+            return true;
+        }
+    }
+    return false;
+}
+
+std::vector<std::string> FindAdapters()
+{
+    std::set<std::string> withNode;
+    for (const auto& node : DrmNodes()) {
+        withNode.insert(node.second);
+    }
+    std::vector<std::string> adapters;
+    for (const std::string& address : ListSystemFolder(kPciDevices)) {
+        if (IsPciAddress(address) &&
+            (IdOf(address, "class") >> 16 == kDisplayClass || withNode.count(address) != 0)) {
+            adapters.push_back(address);
+        }
+    }
+    return adapters;
+}
+
+std::string HexName(std::uint16_t vendor, std::uint16_t device)
+{
+    char text[16];
+    std::snprintf(text, sizeof text, "%04x:%04x", unsigned{vendor}, unsigned{device});
+    return text;
+}
+
+// Cuts a name down to what every adapter list gives back unchanged.
+std::string Plain(const std::string& name)
+{
+    std::string plain;
+    for (const char c : name) {
+        if (static_cast<unsigned char>(c) >= 0x80 && static_cast<unsigned char>(c) < 0xC0) {
+            continue; // the rest of a character that already has its '?'
+        }
+        const char* const kept = c == '"' ? "'" : c == '\\' ? "/" : nullptr;
+        if (kept) {
+            plain += kept;
+        } else {
+            plain += c >= ' ' && c <= '~' ? c : '?';
+        }
+    }
+    plain.resize(std::min(plain.size(), kNameLimit));
+    return plain;
+}
+
+std::string NameOf(const std::string& address, PciIds& ids)
+{
+    const std::uint16_t vendor = ShortIdOf(address, "vendor");
+    const std::uint16_t device = ShortIdOf(address, "device");
+    std::string name;
+    if (vendor == kNvidia) {
+        name = NvidiaModel(address);
+    }
+    if (name.empty()) {
+        name = AttributeOf(address, "product_name");
+    }
+    if (name.empty()) {
+        name = ids.name(vendor, device);
+    }
+    return name.empty() ? HexName(vendor, device) : Plain(name);
+}
+
+Adapters ReadAdapters()
+{
+    Adapters adapters;
+    adapters.rootCount = SystemRootCount();
+    adapters.addresses = FindAdapters();
+    PciIds ids;
+    std::map<std::string, int> uses;
+    for (const std::string& address : adapters.addresses) {
+        const std::string name = NameOf(address, ids);
+        adapters.names[address] = name;
+        ++uses[name];
+    }
+    for (auto& entry : adapters.names) {
+        if (uses[entry.second] > 1) {
+            entry.second += " (" + entry.first + ")";
+        }
+    }
+    return adapters;
+}
+
+const Adapters& GetAdapters()
+{
+    static std::unique_ptr<Adapters> gKnown;
+    if (!gKnown || gKnown->rootCount != SystemRootCount()) {
+        gKnown = std::make_unique<Adapters>(ReadAdapters());
+    }
+    return *gKnown;
+}
+
+void Take(std::vector<std::string>& cards, std::vector<std::string>::iterator card,
+          std::string& address)
+{
+    address = *card;
+    cards.erase(card);
+}
+
+} // namespace
+
+const std::vector<std::string>& DisplayAdapters()
+{
+    return GetAdapters().addresses;
+}
+
+std::string AdapterName(const std::string& pciAddress)
+{
+    const Adapters& adapters = GetAdapters();
+    const auto entry = adapters.names.find(pciAddress);
+    return entry == adapters.names.end() ? std::string() : entry->second;
+}
+
+std::map<std::string, std::string> DrmNodes()
+{
+    std::map<std::string, std::string> nodes;
+    for (const std::string& name : ListSystemFolder(kDrmClass)) {
+        if (!IsDrmNode(name)) {
+            continue;
+        }
+        const std::string address =
+            LastPciAddress(ReadSystemLink(std::string(kDrmClass) + "/" + name));
+        if (!address.empty()) {
+            nodes[name] = address;
+        }
+    }
+    return nodes;
+}
+
+std::string AdapterOfDrmNode(const std::string& file)
+{
+    const std::string name = LastOfPath(file);
+    if (!IsDrmNode(name)) {
+        return std::string();
+    }
+    return LastPciAddress(ReadSystemLink(std::string(kDrmClass) + "/" + name));
+}
+
+std::vector<std::string> NvidiaAdapters(const std::vector<std::string>& names,
+                                        const std::vector<std::string>& taken)
+{
+    std::vector<std::string> addresses(names.size());
+    const auto isTaken = [&](const std::string& address) {
+        return std::find(taken.begin(), taken.end(), address) != taken.end();
+    };
+    std::vector<std::string> cards = NvidiaCards();
+    const bool listed = !cards.empty();
+    if (!listed) {
+        for (const std::string& address : DisplayAdapters()) {
+            if (ShortIdOf(address, "vendor") == kNvidia) {
+                cards.push_back(address);
+            }
+        }
+    }
+    cards.erase(std::remove_if(cards.begin(), cards.end(), isTaken), cards.end());
+    if (!listed) {
+        if (names.size() == 1 && cards.size() == 1) {
+            addresses[0] = cards[0];
+        }
+        return addresses;
+    }
+
+    std::map<std::string, std::string> models;
+    for (const std::string& card : cards) {
+        models[card] = NvidiaModel(card);
+    }
+    std::vector<std::string*> open;
+    for (std::size_t i = 0; i != names.size(); ++i) {
+        const auto card = std::find_if(cards.begin(), cards.end(), [&](const std::string& address) {
+            return !names[i].empty() && models[address] == names[i];
+        });
+        if (card == cards.end()) {
+            open.push_back(&addresses[i]);
+        } else {
+            Take(cards, card, addresses[i]);
+        }
+    }
+    if (open.size() == cards.size()) {
+        for (std::string* address : open) {
+            Take(cards, cards.begin(), *address);
+        }
+    }
+    return addresses;
 }
 
 } // namespace QGF

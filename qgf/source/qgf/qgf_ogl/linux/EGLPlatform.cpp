@@ -376,21 +376,6 @@ std::unique_ptr<PlatformContext> EGLPlatform::createOffscreen(const DisplayDevic
     throw LogicalException(reasons);
 }
 
-namespace {
-
-std::string NoAddressOfNode(const std::string&)
-{
-    return {};
-}
-
-std::vector<std::string> NoAddresses(const std::vector<std::string>&,
-                                     const std::vector<std::string>&)
-{
-    return {};
-}
-
-} // namespace
-
 std::unique_ptr<Platform> MakeNativePlatform()
 {
     // Never closed: drivers keep threads and exit handlers of their own.
@@ -404,7 +389,7 @@ std::unique_ptr<Platform> MakeNativePlatform()
         },
         library);
     return std::make_unique<EGLPlatform>(
-        egl, EGLPlatform::AdapterLookup{NoAddressOfNode, NoAddresses, AdapterName});
+        egl, EGLPlatform::AdapterLookup{AdapterOfDrmNode, NvidiaAdapters, AdapterName});
 }
 
 } // namespace OGL

@@ -1,0 +1,123 @@
+#include "qgf/SystemFiles.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <memory>
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace QGF {
+namespace {
+
+constexpr std::size_t kFolderLimit = 4096;
+
+class Descriptor {
+public:
+    explicit Descriptor(int fd) : fFd(fd) {}
+    ~Descriptor()
+    {
+        if (fFd >= 0) {
+            close(fFd);
+        }
+    }
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+    int get() const { return fFd; }
+
+private:
+    int fFd;
+};
+
+bool ReadAll(int fd, std::string& text, std::size_t limit)
+{
+    char block[4096];
+    while (text.size() < limit) {
+        const ssize_t count = read(fd, block, std::min(sizeof block, limit - text.size()));
+        if (count < 0) {
+            if (errno == EINTR) {
+                continue;
+            }
+            return false;
+        }
+        if (count == 0) {
+            break;
+        }
+        text.append(block, static_cast<std::size_t>(count));
+    }
+    return true;
+}
+
+} // namespace
+
+bool ReadSystemFile(const std::string& path, std::string& text, std::size_t limit)
+{
+    text.clear();
+    const std::string full = SystemRoot() + path;
+    // Opening is already too much for a pipe, which waits for its other end, and for a device node,
+    // which may act on it; so the kind is asked first, and again of what was opened.
+    struct stat status {};
+    if (stat(full.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
+        return false;
+    }
+    const Descriptor file(open(full.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC | O_NOCTTY));
+    if (file.get() < 0 || fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode)) {
+        return false;
+    }
+    if (!ReadAll(file.get(), text, limit)) {
+        text.clear();
+        return false;
+    }
+    return true;
+}
+
+std::string ReadSystemLine(const std::string& path)
+{
+    std::string text;
+    ReadSystemFile(path, text);
+    text.resize(std::min(text.find('\n'), text.size()));
+    const char* const blanks = " \t\r";
+    const std::size_t first = text.find_first_not_of(blanks);
+    if (first == std::string::npos) {
+        return std::string();
+    }
+    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
+std::vector<std::string> ListSystemFolder(const std::string& path)
+{
+    std::vector<std::string> names;
+    const std::unique_ptr<DIR, int (*)(DIR*)> folder(opendir((SystemRoot() + path).c_str()),
+                                                     closedir);
+    if (!folder) {
+        return names;
+    }
+    while (names.size() < kFolderLimit) {
+        // NOLINTNEXTLINE(concurrency-mt-unsafe): the stream is this call's own.
+        const dirent* const entry = readdir(folder.get());
+        if (!entry) {
+            break;
+        }
+        if (entry->d_name[0] != '.') {
+            names.emplace_back(entry->d_name);
+        }
+    }
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+std::string ReadSystemLink(const std::string& path)
+{
+    char target[4096];
+    const ssize_t length = readlink((SystemRoot() + path).c_str(), target, sizeof target);
+    return length > 0 ? std::string(target, static_cast<std::size_t>(length)) : std::string();
+}
+
+std::string LastOfPath(const std::string& path)
+{
+    return path.substr(path.rfind('/') + 1);
+}
+
+} // namespace QGF
