@@ -1,0 +1,48 @@
+// The machine's display adapters as the Linux kernel describes them.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace pmutil {
+
+// A connector of a card.
+struct DrmConnector {
+    std::string name; // such as "HDMI-A-1"
+    // Whether a display is attached, as the kernel last saw it; nothing if it doesn't tell.
+    std::optional<bool> connected;
+    // The display's preferred mode in pixels; 0 if none is known.
+    std::uint32_t width = 0;
+    std::uint32_t height = 0;
+};
+
+// A PCI display adapter. What couldn't be read is 0, empty or absent.
+struct DrmAdapter {
+    std::string address; // "0000:01:00.0"
+    std::string name;    // QGF::AdapterName's
+    std::uint32_t vendor = 0;
+    std::uint32_t device = 0;
+    std::uint32_t subsystem = 0; // the subsystem's device in the upper 16 bits, its vendor below
+    std::uint32_t revision = 0;
+    std::optional<std::uint64_t> dedicatedBytes; // the card's own memory
+    std::optional<std::uint64_t> sharedBytes;    // the system memory that it may map
+    std::string driver;                          // the kernel module; empty if none is bound
+    std::string driverVersion;                   // empty only without a driver
+    std::string driverDate;                      // in WMI's form; empty if it isn't known
+    std::vector<DrmConnector> connectors;
+    // Something of the card that renders without a display: a render node, or, as the NVIDIA
+    // driver does without its DRM part, the driver's own entry.
+    bool renders = false;
+    std::string renderName; // that node or entry
+};
+
+// All adapters in ascending order of their addresses, under QGF::SystemRoot. Reads only, wakes no
+// card, throws nothing but std::bad_alloc.
+std::vector<DrmAdapter> ReadDrmAdapters();
+
+// The size in a mode's name, such as "1920x1080" or "1920x1080i".
+bool ParseModeSize(const std::string& mode, std::uint32_t& width, std::uint32_t& height);
+
+} // namespace pmutil
