@@ -1,0 +1,189 @@
+#include "linux/DrmAdapters.h"
+
+#include <gtest/gtest.h>
+
+#include "support/AdapterTree.h"
+
+namespace pmutil {
+namespace {
+
+DrmAdapter OnlyAdapter()
+{
+    const std::vector<DrmAdapter> adapters = ReadDrmAdapters();
+    return adapters.size() == 1 ? adapters[0] : DrmAdapter();
+}
+
+TEST(DrmAdaptersTest, AModesSizeIsInItsName)
+{
+    std::uint32_t width = 0;
+    std::uint32_t height = 0;
+    EXPECT_TRUE(ParseModeSize("1920x1080", width, height));
+    EXPECT_EQ(width, 1920U);
+    EXPECT_EQ(height, 1080U);
+    EXPECT_TRUE(ParseModeSize("720x576i", width, height));
+    EXPECT_EQ(width, 720U);
+    EXPECT_EQ(height, 576U);
+}
+
+TEST(DrmAdaptersTest, OtherTextsAreNoModes)
+{
+    for (const char* mode : {"", "x", "1920", "1920x", "x1080", "0x1080", "1920x0", "-1x1", "1x-1",
+                             "65537x1", "1x65537", "99999999999x1", "1920x1080p", "1920 x 1080"}) {
+        std::uint32_t width = 7;
+        std::uint32_t height = 7;
+        EXPECT_FALSE(ParseModeSize(mode, width, height)) << mode;
+        EXPECT_EQ(width, 7U);
+        EXPECT_EQ(height, 7U);
+    }
+}
+
+TEST(DrmAdaptersTest, ADiscreteCardWithEverything)
+{
+    const AdapterTree tree("amd-discrete");
+    const DrmAdapter adapter = OnlyAdapter();
+    EXPECT_EQ(adapter.address, "0000:03:00.0");
+    EXPECT_EQ(adapter.vendor, 0x1002U);
+    EXPECT_EQ(adapter.device, 0x744CU);
+    EXPECT_EQ(adapter.subsystem, 0x471E1DA2U);
+    EXPECT_EQ(adapter.revision, 0xC8U);
+    EXPECT_EQ(adapter.dedicatedBytes, 25753026560U);
+    EXPECT_EQ(adapter.sharedBytes, 16767705088U);
+    EXPECT_EQ(adapter.driver, "amdgpu");
+    EXPECT_EQ(adapter.driverVersion, "6.8.0-45-generic");
+    EXPECT_EQ(adapter.driverDate, "");
+    EXPECT_TRUE(adapter.renders);
+    EXPECT_EQ(adapter.renderName, "renderD128");
+    ASSERT_EQ(adapter.connectors.size(), 3U);
+    EXPECT_EQ(adapter.connectors[0].name, "DP-1");
+    EXPECT_EQ(adapter.connectors[0].connected, true);
+    EXPECT_EQ(adapter.connectors[0].width, 2560U);
+    EXPECT_EQ(adapter.connectors[0].height, 1440U);
+    EXPECT_EQ(adapter.connectors[1].name, "DP-2");
+    EXPECT_EQ(adapter.connectors[1].connected, false);
+    EXPECT_EQ(adapter.connectors[1].width, 0U);
+    EXPECT_EQ(adapter.connectors[2].name, "HDMI-A-1");
+    EXPECT_EQ(adapter.connectors[2].width, 1920U);
+}
+
+TEST(DrmAdaptersTest, AModulesOwnVersionComesBeforeTheKernels)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.write("/sys/module/amdgpu/version", "6.7.0\n");
+    EXPECT_EQ(OnlyAdapter().driverVersion, "6.7.0");
+}
+
+TEST(DrmAdaptersTest, ADriverBuiltIntoTheKernelHasItsOwnName)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.remove("/sys/bus/pci/drivers/amdgpu/module");
+    EXPECT_EQ(OnlyAdapter().driver, "amdgpu");
+    EXPECT_EQ(OnlyAdapter().driverVersion, "6.8.0-45-generic");
+}
+
+TEST(DrmAdaptersTest, ACardWithoutADriverHasNoDriverStrings)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.remove(
+        "/sys/devices/pci0000:00/0000:00:01.0/0000:01:00.0/0000:02:00.0/0000:03:00.0/driver");
+    EXPECT_EQ(OnlyAdapter().driver, "");
+    EXPECT_EQ(OnlyAdapter().driverVersion, "");
+}
+
+TEST(DrmAdaptersTest, TheNvidiaDriverTellsItsVersionAndDate)
+{
+    const AdapterTree tree("nvidia-no-drm");
+    EXPECT_EQ(OnlyAdapter().driverVersion, "550.54.15");
+    EXPECT_EQ(OnlyAdapter().driverDate, "20240305221533.000000+000");
+    tree.write("/sys/module/nvidia/version", "550.54.16\n");
+    EXPECT_EQ(OnlyAdapter().driverVersion, "550.54.16");
+}
+
+TEST(DrmAdaptersTest, TheNvidiaDriversEntryStandsInForARenderNode)
+{
+    const AdapterTree tree("nvidia-no-drm");
+    EXPECT_TRUE(OnlyAdapter().renders);
+    EXPECT_TRUE(OnlyAdapter().connectors.empty());
+    tree.remove("/proc/driver/nvidia/gpus");
+    EXPECT_FALSE(OnlyAdapter().renders);
+}
+
+TEST(DrmAdaptersTest, AVirtualCardsDriverIsTheNodesNotTheTransports)
+{
+    const AdapterTree tree("virtio-gpu");
+    EXPECT_EQ(OnlyAdapter().driver, "virtio_gpu");
+}
+
+TEST(DrmAdaptersTest, LocalMemoryOfI915)
+{
+    const AdapterTree tree("intel-discrete-i915");
+    EXPECT_EQ(OnlyAdapter().dedicatedBytes, 17062428672U);
+}
+
+TEST(DrmAdaptersTest, LocalMemoryOfXeIsTheSumOfItsTiles)
+{
+    const AdapterTree tree("intel-discrete-xe");
+    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{12} << 30);
+}
+
+TEST(DrmAdaptersTest, TilesThat64BitsDontHoldAreLeftOut)
+{
+    const AdapterTree tree("intel-discrete-xe");
+    tree.write("/sys/devices/pci0000:00/0000:00:01.0/0000:01:00.0/0000:02:01.0/0000:03:00.0/tile1/"
+               "physical_vram_size_bytes",
+               "18446744073709551615\n");
+    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{6} << 30);
+}
+
+TEST(DrmAdaptersTest, NoFileOfASizeIsNoSize)
+{
+    const AdapterTree tree("nouveau");
+    EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
+    EXPECT_FALSE(OnlyAdapter().sharedBytes);
+}
+
+TEST(DrmAdaptersTest, BrokenFilesCostTheirFieldsOnly)
+{
+    const AdapterTree tree("unreadable");
+    const std::vector<DrmAdapter> adapters = ReadDrmAdapters();
+    ASSERT_EQ(adapters.size(), 2U);
+    EXPECT_EQ(adapters[0].vendor, 0x1002U);
+    EXPECT_EQ(adapters[0].device, 0U);
+    EXPECT_FALSE(adapters[0].dedicatedBytes);
+    EXPECT_FALSE(adapters[0].sharedBytes);
+    ASSERT_EQ(adapters[0].connectors.size(), 1U);
+    EXPECT_EQ(adapters[0].connectors[0].connected, true);
+    EXPECT_EQ(adapters[0].connectors[0].width, 0U);
+    EXPECT_EQ(adapters[1].vendor, 0U);
+    EXPECT_EQ(adapters[1].subsystem, 0U);
+    EXPECT_EQ(adapters[1].driver, "gone");
+}
+
+TEST(DrmAdaptersTest, AConnectorThatVanishedIsGoneAndOneThatDoesntTellIsKept)
+{
+    const AdapterTree tree("unreadable");
+    const std::vector<DrmConnector> connectors = ReadDrmAdapters().at(1).connectors;
+    ASSERT_EQ(connectors.size(), 2U);
+    EXPECT_EQ(connectors[0].name, "DP-2");
+    EXPECT_FALSE(connectors[0].connected);
+    EXPECT_EQ(connectors[1].name, "HDMI-A-1");
+    EXPECT_EQ(connectors[1].connected, true);
+    EXPECT_EQ(connectors[1].width, 1280U);
+}
+
+TEST(DrmAdaptersTest, OtherStatesThanConnectedAreUnknown)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.write("/sys/devices/pci0000:00/0000:00:01.0/0000:01:00.0/0000:02:00.0/0000:03:00.0/drm/"
+               "card0/card0-DP-2/status",
+               "unknown\n");
+    EXPECT_FALSE(OnlyAdapter().connectors.at(1).connected);
+}
+
+TEST(DrmAdaptersTest, AnEmptyMachineHasNoAdapters)
+{
+    const AdapterTree tree("empty");
+    EXPECT_TRUE(ReadDrmAdapters().empty());
+}
+
+} // namespace
+} // namespace pmutil

@@ -1,0 +1,220 @@
+#include "qgf/AdapterName.h"
+
+#include <filesystem>
+#include <set>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "support/AdapterTree.h"
+
+namespace QGF {
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::EndsWith;
+using ::testing::IsEmpty;
+
+using Texts = std::vector<std::string>;
+
+const char kRadeon[] =
+    "/sys/devices/pci0000:00/0000:00:01.0/0000:01:00.0/0000:02:00.0/0000:03:00.0";
+const char kRadeonName[] =
+    "Advanced Micro Devices, Inc. [AMD/ATI] Navi 31 [Radeon RX 7900 XT/7900 XTX]";
+
+TEST(AdapterNameTest, AdaptersAreDisplayDevicesInOrder)
+{
+    const AdapterTree tree("server-bmc");
+    EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:02:00.0", "0000:41:00.0", "0000:81:00.0"));
+}
+
+TEST(AdapterNameTest, OtherFunctionsOfACardAreNoAdapters)
+{
+    const AdapterTree tree("amd-discrete");
+    EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:03:00.0"));
+}
+
+TEST(AdapterNameTest, ADeviceOfAnotherClassWithADrmNodeIsAnAdapter)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.write(std::string(kRadeon) + "/class", "0x120000\n");
+    EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:03:00.0"));
+}
+
+TEST(AdapterNameTest, TheNvidiaDriversModelComesFirst)
+{
+    const AdapterTree tree("nvidia-drm");
+    EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA GeForce RTX 3090");
+}
+
+TEST(AdapterNameTest, ThenAmdgpusProductName)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.write(std::string(kRadeon) + "/product_name", "AMD Radeon PRO W7900\n");
+    EXPECT_EQ(AdapterName("0000:03:00.0"), "AMD Radeon PRO W7900");
+}
+
+TEST(AdapterNameTest, ThenTheDatabase)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.write(std::string(kRadeon) + "/product_name", "\n");
+    EXPECT_EQ(AdapterName("0000:03:00.0"), kRadeonName);
+}
+
+TEST(AdapterNameTest, ThenTheIdsInHexadecimal)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.remove("/usr");
+    EXPECT_EQ(AdapterName("0000:03:00.0"), "1002:744c");
+}
+
+TEST(AdapterNameTest, ADeviceThatTheDatabaseLacksIsItsIds)
+{
+    const AdapterTree tree("unnamed");
+    EXPECT_EQ(AdapterName("0000:2d:00.0"), "1002:fffe");
+}
+
+TEST(AdapterNameTest, NoAdapterHasNoName)
+{
+    const AdapterTree tree("amd-discrete");
+    EXPECT_EQ(AdapterName("0000:03:00.1"), "");
+    EXPECT_EQ(AdapterName(""), "");
+}
+
+TEST(AdapterNameTest, EqualNamesGetTheirAddresses)
+{
+    const AdapterTree tree("server-bmc");
+    EXPECT_EQ(AdapterName("0000:41:00.0"), "AMD Instinct MI210 (0000:41:00.0)");
+    EXPECT_EQ(AdapterName("0000:81:00.0"), "AMD Instinct MI210 (0000:81:00.0)");
+    EXPECT_EQ(AdapterName("0000:02:00.0"), "ASPEED Technology, Inc. ASPEED Graphics Family");
+}
+
+TEST(AdapterNameTest, EightIdenticalCardsHaveEightNames)
+{
+    const AdapterTree tree("nvidia-eight");
+    std::set<std::string> names;
+    for (const std::string& address : DisplayAdapters()) {
+        names.insert(AdapterName(address));
+        EXPECT_THAT(AdapterName(address), EndsWith(" (" + address + ")"));
+    }
+    EXPECT_EQ(names.size(), 8U);
+}
+
+TEST(AdapterNameTest, WhatTheAdapterListsEscapeIsReplaced)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.write(std::string(kRadeon) + "/product_name", "A\"\\\xC2\xAE\xE2\x84\xA2\xFF\x01 z\n");
+    EXPECT_EQ(AdapterName("0000:03:00.0"), "A'/???? z");
+}
+
+TEST(AdapterNameTest, ALongNameFitsADescriptionWithItsAddress)
+{
+    const AdapterTree tree("server-bmc");
+    for (const char* device : {"40/0000:40:01.1/0000:41:00.0", "80/0000:80:01.1/0000:81:00.0"}) {
+        tree.write(std::string("/sys/devices/pci0000:") + device + "/product_name",
+                   std::string(1000, 'n'));
+    }
+    EXPECT_EQ(AdapterName("0000:41:00.0"), std::string(108, 'n') + " (0000:41:00.0)");
+    EXPECT_LE(AdapterName("0000:41:00.0").size(), 127U);
+}
+
+TEST(AdapterNameTest, AnAdapterKeepsItsNameThroughTheRun)
+{
+    const AdapterTree tree("nvidia-drm");
+    EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA GeForce RTX 3090");
+    std::filesystem::remove_all(tree.root() + "/proc");
+    EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA GeForce RTX 3090");
+    tree.refresh();
+    EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA Corporation GA102 [GeForce RTX 3090]");
+}
+
+TEST(AdapterNameTest, ANodesAdapterIsTheOneItBelongsTo)
+{
+    const AdapterTree tree("server-bmc");
+    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "0000:02:00.0");
+    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card2"), "0000:81:00.0");
+    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/renderD128"), "0000:41:00.0");
+}
+
+TEST(AdapterNameTest, AVirtualCardsNodeBelongsToThePciFunctionAboveIt)
+{
+    const AdapterTree tree("virtio-gpu");
+    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "0000:00:02.0");
+}
+
+TEST(AdapterNameTest, WhatIsNoNodeHasNoAdapter)
+{
+    const AdapterTree tree("amd-discrete");
+    for (const char* file : {"", "/dev/dri/", "/dev/dri/card9", "/dev/dri/card", "/dev/dri/version",
+                             "/dev/dri/card0-DP-1", "/dev/dri/../../etc/passwd", "/dev/nvidia0"}) {
+        EXPECT_EQ(AdapterOfDrmNode(file), "") << file;
+    }
+}
+
+TEST(AdapterNameTest, NodesOutsidePciAreNoAdapters)
+{
+    const AdapterTree tree("empty");
+    std::filesystem::create_directories(tree.root() + "/sys/class/drm");
+    std::filesystem::create_symlink("../../devices/platform/vkms/drm/card0",
+                                    tree.root() + "/sys/class/drm/card0");
+    EXPECT_THAT(DrmNodes(), IsEmpty());
+    EXPECT_THAT(DisplayAdapters(), IsEmpty());
+    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "");
+}
+
+TEST(AdapterNameTest, AnNvidiaDeviceWithoutANodeIsTheDriversCard)
+{
+    const AdapterTree tree("nvidia-no-drm");
+    EXPECT_THAT(NvidiaAdapters({""}, {}), ElementsAre("0000:65:00.0"));
+    EXPECT_THAT(NvidiaAdapters({"NVIDIA A100 80GB PCIe"}, {}), ElementsAre("0000:65:00.0"));
+}
+
+TEST(AdapterNameTest, WithoutTheDriversListTheOnlyCardOfTheVendorIsTheDevice)
+{
+    const AdapterTree tree("nvidia-no-drm");
+    tree.remove("/proc/driver");
+    EXPECT_THAT(NvidiaAdapters({""}, {}), ElementsAre("0000:65:00.0"));
+    EXPECT_THAT(NvidiaAdapters({"", ""}, {}), ElementsAre("", ""));
+}
+
+TEST(AdapterNameTest, WithoutTheDriversListOneOfManyCardsCantBeTold)
+{
+    const AdapterTree tree("nvidia-eight");
+    tree.remove("/proc/driver");
+    EXPECT_THAT(NvidiaAdapters({""}, {}), ElementsAre(""));
+}
+
+TEST(AdapterNameTest, OtherVendorsCardsAreNoNvidiaDevices)
+{
+    const AdapterTree tree("amd-discrete");
+    EXPECT_THAT(NvidiaAdapters({""}, {}), ElementsAre(""));
+    EXPECT_THAT(NvidiaAdapters({}, {}), IsEmpty());
+}
+
+TEST(AdapterNameTest, AsManyDevicesAsCardsGoToThemInOrder)
+{
+    const AdapterTree tree("nvidia-eight");
+    EXPECT_EQ(NvidiaAdapters(Texts(8), {}), DisplayAdapters());
+    EXPECT_EQ(NvidiaAdapters(Texts(7), {}), Texts(7));
+}
+
+TEST(AdapterNameTest, CardsThatOtherDevicesHaveAreNotGivenAgain)
+{
+    const AdapterTree tree("nvidia-eight");
+    const std::vector<std::string> all = DisplayAdapters();
+    EXPECT_EQ(NvidiaAdapters(Texts(7), {all[0]}), Texts(all.begin() + 1, all.end()));
+    EXPECT_EQ(NvidiaAdapters(Texts(1), all), Texts(1));
+}
+
+TEST(AdapterNameTest, DevicesGoToTheCardsOfTheirNames)
+{
+    const AdapterTree tree("nvidia-eight");
+    tree.write("/proc/driver/nvidia/gpus/0000:43:00.0/information", "Model: NVIDIA A100\n");
+    EXPECT_THAT(
+        NvidiaAdapters(
+            {"NVIDIA H100 80GB HBM3", "NVIDIA A100", "NVIDIA H100 80GB HBM3", "NVIDIA H200"}, {}),
+        ElementsAre("0000:1b:00.0", "0000:43:00.0", "0000:52:00.0", ""));
+}
+
+} // namespace
+} // namespace QGF

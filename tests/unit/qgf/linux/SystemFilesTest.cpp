@@ -1,0 +1,125 @@
+#include "qgf/SystemFiles.h"
+
+#include <filesystem>
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include "support/AdapterTree.h"
+
+namespace QGF {
+namespace {
+
+using ::testing::Test;
+
+class SystemFilesTest : public Test {
+protected:
+    AdapterTree fTree{"empty"};
+    std::string fText = "old";
+};
+
+TEST_F(SystemFilesTest, ReadsAFileUnderTheRoot)
+{
+    fTree.write("/sys/a", "one\ntwo\n");
+    EXPECT_TRUE(ReadSystemFile("/sys/a", fText));
+    EXPECT_EQ(fText, "one\ntwo\n");
+}
+
+TEST_F(SystemFilesTest, AMissingFileIsAbsent)
+{
+    EXPECT_FALSE(ReadSystemFile("/sys/none", fText));
+    EXPECT_EQ(fText, "");
+}
+
+TEST_F(SystemFilesTest, AnOversizedFileIsReadUpToTheLimit)
+{
+    fTree.write("/sys/a", std::string(100000, 'x'));
+    EXPECT_TRUE(ReadSystemFile("/sys/a", fText));
+    EXPECT_EQ(fText, std::string(kSystemFileLimit, 'x'));
+    EXPECT_TRUE(ReadSystemFile("/sys/a", fText, 10));
+    EXPECT_EQ(fText, std::string(10, 'x'));
+}
+
+TEST_F(SystemFilesTest, ABinaryFileComesUnchanged)
+{
+    const std::string bytes("\0\xff\n\x01", 4);
+    fTree.write("/sys/a", bytes);
+    EXPECT_TRUE(ReadSystemFile("/sys/a", fText));
+    EXPECT_EQ(fText, bytes);
+}
+
+TEST_F(SystemFilesTest, AFolderIsNoFile)
+{
+    std::filesystem::create_directories(fTree.root() + "/sys/a");
+    EXPECT_FALSE(ReadSystemFile("/sys/a", fText));
+}
+
+TEST_F(SystemFilesTest, ADanglingLinkIsNoFile)
+{
+    fTree.write("/sys/b", "");
+    std::filesystem::create_symlink("gone", fTree.root() + "/sys/a");
+    EXPECT_FALSE(ReadSystemFile("/sys/a", fText));
+}
+
+TEST_F(SystemFilesTest, ALinkToAFileIsFollowed)
+{
+    fTree.write("/sys/b", "text");
+    std::filesystem::create_symlink("b", fTree.root() + "/sys/a");
+    EXPECT_TRUE(ReadSystemFile("/sys/a", fText));
+    EXPECT_EQ(fText, "text");
+}
+
+// Would hang if it opened the pipe.
+TEST_F(SystemFilesTest, APipeIsNoFileAndBlocksNothing)
+{
+    ASSERT_EQ(mkfifo((fTree.root() + "/pipe").c_str(), 0600), 0);
+    EXPECT_FALSE(ReadSystemFile("/pipe", fText));
+}
+
+// Would never end if it read the device.
+TEST_F(SystemFilesTest, ADeviceIsNoFile)
+{
+    std::filesystem::create_symlink("/dev/zero", fTree.root() + "/zero");
+    EXPECT_FALSE(ReadSystemFile("/zero", fText, static_cast<std::size_t>(-1)));
+}
+
+TEST_F(SystemFilesTest, TheLineIsTheFirstWithoutBlanks)
+{
+    fTree.write("/a", " \tNVIDIA H100  \r\nnext\n");
+    EXPECT_EQ(ReadSystemLine("/a"), "NVIDIA H100");
+    fTree.write("/a", "no end");
+    EXPECT_EQ(ReadSystemLine("/a"), "no end");
+    fTree.write("/a", "\nnext\n");
+    EXPECT_EQ(ReadSystemLine("/a"), "");
+    fTree.write("/a", "  \n");
+    EXPECT_EQ(ReadSystemLine("/a"), "");
+    EXPECT_EQ(ReadSystemLine("/none"), "");
+}
+
+TEST_F(SystemFilesTest, AFolderListsItsNamesSorted)
+{
+    fTree.write("/d/b", "");
+    fTree.write("/d/a", "");
+    std::filesystem::create_symlink("gone", fTree.root() + "/d/c");
+    EXPECT_EQ(ListSystemFolder("/d"), (std::vector<std::string>{"a", "b", "c"}));
+}
+
+TEST_F(SystemFilesTest, WhatIsNoFolderListsNothing)
+{
+    fTree.write("/a", "");
+    EXPECT_TRUE(ListSystemFolder("/a").empty());
+    EXPECT_TRUE(ListSystemFolder("/none").empty());
+}
+
+TEST_F(SystemFilesTest, ALinksTextIsReadThoughItsTargetIsGone)
+{
+    std::filesystem::create_symlink("../gone/nvidia", fTree.root() + "/driver");
+    EXPECT_EQ(ReadSystemLink("/driver"), "../gone/nvidia");
+    EXPECT_EQ(LastOfPath(ReadSystemLink("/driver")), "nvidia");
+    EXPECT_EQ(ReadSystemLink("/none"), "");
+    EXPECT_EQ(LastOfPath("nvidia"), "nvidia");
+    EXPECT_EQ(LastOfPath(""), "");
+}
+
+} // namespace
+} // namespace QGF
