@@ -136,7 +136,7 @@ public:
 TEST(ContextOffscreen, PlatformThatMakesNothingIsAFailure)
 {
     ReplacePlatform(std::make_unique<NullPlatform>());
-    EXPECT_THROW(ContextOffscreen(Context::PrimaryDisplayDevice()), QGF::LogicalException);
+    EXPECT_THROW(ContextOffscreen{Context::PrimaryDisplayDevice()}, QGF::LogicalException);
     ReplacePlatform(nullptr);
 }
 

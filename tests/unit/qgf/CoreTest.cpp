@@ -42,7 +42,7 @@ void CountingCheck()
 }
 
 class CoreLibrary : public testing::Test {
-protected:
+public:
     CoreLibrary()
     {
         gChecks = 0;
@@ -50,6 +50,8 @@ protected:
         QGF::Core::ReplaceLoaderCheck(CountingCheck);
     }
     ~CoreLibrary() override { QGF::Core::ReplaceLoaderCheck(nullptr); }
+    CoreLibrary(const CoreLibrary&) = delete;
+    CoreLibrary& operator=(const CoreLibrary&) = delete;
 };
 
 TEST_F(CoreLibrary, RepeatedStartAsksOnce)

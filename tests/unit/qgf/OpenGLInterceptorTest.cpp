@@ -13,7 +13,6 @@
 namespace {
 
 using namespace QGF::OGL;
-using testing::ElementsAre;
 
 struct CallCase {
     const char* name;

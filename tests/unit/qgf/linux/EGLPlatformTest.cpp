@@ -19,7 +19,6 @@ namespace {
 using namespace QGF::OGL;
 using testing::Contains;
 using testing::ElementsAre;
-using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
 using testing::StartsWith;
@@ -251,6 +250,7 @@ std::vector<std::string> AddressesOfNvidia(const std::vector<std::string>& names
                                            const std::vector<std::string>& taken)
 {
     std::vector<std::string> addresses;
+    addresses.reserve(names.size());
     for (const std::string& name : names)
         addresses.push_back(name == "Card 2" && taken.empty() ? "0000:02:00.0" : "");
     return addresses;
@@ -264,10 +264,13 @@ std::string NameOfAddress(const std::string& address)
 }
 
 class EGLPlatformTest : public testing::Test {
-protected:
+public:
     EGLPlatformTest() { gScript = &script; }
     ~EGLPlatformTest() override { gScript = nullptr; }
+    EGLPlatformTest(const EGLPlatformTest&) = delete;
+    EGLPlatformTest& operator=(const EGLPlatformTest&) = delete;
 
+protected:
     EGLPlatform& platform()
     {
         if (!fPlatform) {

@@ -114,7 +114,7 @@ TEST_F(NativeOpenGL, ContextsOfOneDeviceEndIndependently)
 
 TEST_F(NativeOpenGL, UnknownDeviceIsRefused)
 {
-    EXPECT_THROW(ContextOffscreen(DisplayDeviceKey("no such device", "", "")),
+    EXPECT_THROW(ContextOffscreen{DisplayDeviceKey("no such device", "", "")},
                  QGF::LogicalException);
 }
 
