@@ -6,7 +6,10 @@
 
 namespace pmutil {
 
-#if defined(__GNUC__)
+#if defined(__clang__)
+#define PMUTIL_PRINTF(formatIndex, firstArgument)                                                  \
+    __attribute__((format(printf, formatIndex, firstArgument)))
+#elif defined(__GNUC__)
 #define PMUTIL_PRINTF(formatIndex, firstArgument)                                                  \
     __attribute__((format(gnu_printf, formatIndex, firstArgument)))
 #else

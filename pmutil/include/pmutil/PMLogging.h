@@ -37,7 +37,8 @@ public:
 
     // Assembles and writes one line: prefix, formatted message, a line end unless the text has one
     // already, then Flush. Holds the log mutex.
-    virtual void Log(const char* file, int line, const char* format, std::va_list arguments);
+    virtual void Log(const char* file, int line, const char* format, std::va_list arguments)
+        PMUTIL_PRINTF(4, 0);
 
     // "NNNNN.YYYY.MM.DD_HH:MM:SS.mmm(+S.mmm)[tid=T] ": line number, universal time, seconds since
     // this logger's previous line (0 for its first), thread name or id. Counts the line. The place

@@ -1,5 +1,6 @@
 #include "pmutil/Escape.h"
 
+#include <algorithm>
 #include <cctype>
 #include <type_traits>
 
@@ -38,13 +39,27 @@ int DigitValue(unsigned code)
     return -1;
 }
 
+// True for most of any text, and told without asking the locale: it is a blank or graphic in all of
+// them.
+bool IsPlain(unsigned code, unsigned quote)
+{
+    return code >= 0x20 && code <= 0x7e && code != '\\' && code != quote;
+}
+
 template <typename Char>
 std::string EscapeAll(std::basic_string_view<Char> text, char quote)
 {
+    const unsigned quoteCode = CodeOf(quote);
     std::string out;
     out.reserve(text.size());
-    for (const Char character : text)
-        EscapeCharacter(out, CodeOf(character), CodeOf(quote), sizeof(Char));
+    for (auto at = text.begin(); at != text.end();) {
+        const auto plainEnd = std::find_if_not(
+            at, text.end(), [&](Char character) { return IsPlain(CodeOf(character), quoteCode); });
+        out.append(at, plainEnd);
+        at = plainEnd;
+        if (at != text.end())
+            EscapeCharacter(out, CodeOf(*at++), quoteCode, sizeof(Char));
+    }
     return out;
 }
 
@@ -80,6 +95,10 @@ std::basic_string<Char> UnescapeAll(std::basic_string_view<Char> text)
 void EscapeCharacter(std::string& out, unsigned code, unsigned quote, int size)
 {
     BOOST_ASSERT(size == 1 || size == 2);
+    if (IsPlain(code, quote)) {
+        out += static_cast<char>(code);
+        return;
+    }
     for (const ShortForm& form : kShortForms) {
         if (code == form.code) {
             out += '\\';

@@ -1,19 +1,20 @@
 #include "pmutil/Format.h"
 
 #include <cstdio>
-#include <vector>
+#include <cstring>
+#include <iterator>
 
 namespace pmutil {
 
 namespace {
 
 // The C library's length for the text, which is in `buffer` only if it fits; negative on failure.
-PMUTIL_PRINTF(2, 0)
-int TryFormat(std::vector<char>& buffer, const char* format, std::va_list arguments)
+PMUTIL_PRINTF(3, 0)
+int TryFormat(char* buffer, std::size_t size, const char* format, std::va_list arguments)
 {
     std::va_list again;
     va_copy(again, arguments);
-    const int length = std::vsnprintf(buffer.data(), buffer.size(), format, again);
+    const int length = std::vsnprintf(buffer, size, format, again);
     va_end(again);
     return length;
 }
@@ -22,21 +23,30 @@ int TryFormat(std::vector<char>& buffer, const char* format, std::va_list argume
 
 std::string FormatStringV(const char* format, std::va_list arguments)
 {
-    constexpr std::size_t kFirstSize = 256;
-    constexpr int kMaxGrowths = 2;
-    std::vector<char> buffer(kFirstSize);
-    for (int growths = 0;; ++growths) {
-        const int length = TryFormat(buffer, format, arguments);
-        if (length < 0)
-            return {};
-        const auto size = static_cast<std::size_t>(length);
-        if (size < buffer.size())
-            return std::string(buffer.data(), size);
-        // Only a value that changes between the attempts gets here more than once.
-        if (growths == kMaxGrowths)
-            return {};
-        buffer.resize(size + 1);
+    // What every log statement asks for; the C library takes its time over it.
+    if (std::strcmp(format, "%s") == 0) {
+        std::va_list again;
+        va_copy(again, arguments);
+        const char* const text = va_arg(again, const char*);
+        va_end(again);
+        if (text != nullptr)
+            return text;
     }
+    constexpr int kMaxGrowths = 2;
+    char first[256];
+    int length = TryFormat(first, std::size(first), format, arguments);
+    if (length >= 0 && static_cast<std::size_t>(length) < std::size(first))
+        return std::string(first, static_cast<std::size_t>(length));
+    for (int growths = 0; length >= 0 && growths < kMaxGrowths; ++growths) {
+        std::string text(static_cast<std::size_t>(length), '\0');
+        length = TryFormat(text.data(), text.size() + 1, format, arguments);
+        // Only a value that changes between the attempts takes more than one growth.
+        if (length >= 0 && static_cast<std::size_t>(length) <= text.size()) {
+            text.resize(static_cast<std::size_t>(length));
+            return text;
+        }
+    }
+    return {};
 }
 
 std::string FormatString(const char* format, ...)

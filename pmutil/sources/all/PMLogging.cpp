@@ -1,12 +1,12 @@
 #include "pmutil/PMLogging.h"
 
 #include <algorithm>
-#include <sstream>
 
 #include <boost/thread/lock_guard.hpp>
 
 #include "all/LogPrefix.h"
 #include "all/LogTimer.h"
+#include "all/MessageStream.h"
 #include "pmutil/LogSinks.h"
 #include "pmutil/System.h"
 #include "pmutil/Threads.h"
@@ -20,14 +20,17 @@ using LogLock = boost::lock_guard<boost::recursive_mutex>;
 std::atomic<bool> gLoggingStarted{false};
 
 // Logs one line to whatever logger is current now, and lets no exception out.
-template <typename MakeText>
-void LogToCurrent(const char* file, int line, const MakeText& makeText) noexcept
+template <typename InsertMessage>
+void LogToCurrent(const char* file, int line, const InsertMessage& insertMessage) noexcept
 {
     try {
         const LoggerHolder logger = GetCurrentLogger();
         const LogLock lock(GetLogMutex());
-        if (logger && logger->IsEnabledWrapper())
-            logger->LogPrintf(file, line, "%s", makeText().c_str());
+        if (!logger || !logger->IsEnabledWrapper())
+            return;
+        MessageStream message;
+        insertMessage(message.Out());
+        logger->LogPrintf(file, line, "%s", message.Text());
     } catch (...) {
         // Logging never changes what the program does.
     }
@@ -172,18 +175,15 @@ void PMLogger::WriteText(const char* data, std::size_t size)
 PMLogScope::PMLogScope(const std::string& name, const char* file, int line)
     : fStartTime(GetClockSeconds()), fFile(file), fLine(line), fName(name)
 {
-    LogToCurrent(fFile, fLine, [this] { return "BEGIN " + fName; });
+    LogToCurrent(fFile, fLine, [this](std::ostream& out) { out << "BEGIN " << fName; });
     fStartTime = GetClockSeconds(); // the duration leaves out the line just written
 }
 
 PMLogScope::~PMLogScope()
 {
     const double duration = GetClockSeconds() - fStartTime;
-    LogToCurrent(fFile, fLine, [&] {
-        std::ostringstream text;
-        text << "END " << fName << ", duration=" << duration;
-        return text.str();
-    });
+    LogToCurrent(fFile, fLine,
+                 [&](std::ostream& out) { out << "END " << fName << ", duration=" << duration; });
 }
 
 void detail::WriteStatement(DebugValue& record, const char* file, int line, MessageInserter insert,
@@ -195,11 +195,7 @@ void detail::WriteStatement(DebugValue& record, const char* file, int line, Mess
     } catch (...) {
         return; // a name that can't be resolved is a statement that doesn't log
     }
-    LogToCurrent(file, line, [&] {
-        std::ostringstream text;
-        insert(text, message);
-        return text.str();
-    });
+    LogToCurrent(file, line, [&](std::ostream& out) { insert(out, message); });
 }
 
 } // namespace pmutil

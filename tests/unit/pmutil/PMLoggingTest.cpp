@@ -1,6 +1,7 @@
 #include "pmutil/PMLogging.h"
 
 #include <cstdlib>
+#include <iomanip>
 #include <memory>
 #include <regex>
 #include <sstream>
@@ -289,6 +290,38 @@ TEST_F(PMLoggingTest, MessageThatThrowsCostsItsLineOnly)
     PM_LOG(gOn, "next");
     ASSERT_THAT(logger.lines, SizeIs(1));
     EXPECT_EQ(MessageOf(logger.lines[0]), "next\n");
+}
+
+TEST_F(PMLoggingTest, EachMessageStartsWithDefaultFormatting)
+{
+    RecordingLogger logger;
+    PM_LOG(gOn, std::hex << std::showbase << std::setprecision(2) << std::setfill('*') << 255 << " "
+                         << 1.2345 << std::setw(9));
+    PM_LOG(gOn, 255 << " " << 1.2345 << std::setw(3) << 7);
+    PM_LOG(gOn, "cut" << static_cast<std::streambuf*>(nullptr) << " short");
+    PM_LOG(gOn, "whole"
+                    << " again");
+    ASSERT_THAT(logger.lines, SizeIs(4));
+    EXPECT_EQ(MessageOf(logger.lines[0]), "0xff 1.2\n");
+    EXPECT_EQ(MessageOf(logger.lines[1]), "255 1.2345  7\n");
+    EXPECT_EQ(MessageOf(logger.lines[2]), "cut\n");
+    EXPECT_EQ(MessageOf(logger.lines[3]), "whole again\n");
+}
+
+int LogAndGive(int value)
+{
+    PM_LOG(gOn, "inner " << std::hex << value);
+    return value;
+}
+
+TEST_F(PMLoggingTest, MessageMayLogWhileItIsAssembled)
+{
+    RecordingLogger logger;
+    PM_LOG(gOn, "outer " << LogAndGive(31) << " " << LogAndGive(32));
+    ASSERT_THAT(logger.lines, SizeIs(3));
+    EXPECT_EQ(MessageOf(logger.lines[0]), "inner 1f\n");
+    EXPECT_EQ(MessageOf(logger.lines[1]), "inner 20\n");
+    EXPECT_EQ(MessageOf(logger.lines[2]), "outer 31 32\n");
 }
 
 TEST_F(PMLoggingTest, SinkThatThrowsDoesNotReachTheProgram)
