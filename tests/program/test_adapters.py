@@ -1,0 +1,111 @@
+"""The adapters of whole machines: the report carries each one's own name, ids, driver and memory."""
+
+import shutil
+
+import pytest
+
+import trees
+
+# What these queries answer would be added to the memory that the system's files tell.
+NO_MEMORY_QUERY = ("integer 0x9047 unknown\ninteger 0x87FC unknown\n")
+
+# How NVIDIA's EGL presents a card whose driver has no DRM part.
+NVIDIA_WITHOUT_NODE = 'device\ndevice-string EGL_EXTENSIONS "EGL_NV_device_cuda"\n'
+
+
+def device_on(card):
+    return f'device\ndrm "/dev/dri/{card}"\n'
+
+
+def described(run, index, keys):
+    return {key: run.facts[f"glgpu[{index}].{key}"] for key in keys}
+
+
+def assert_devices(run, devices):
+    assert run.facts["NumGLGPUs"] == str(len(devices))
+    for index, device in enumerate(devices):
+        assert described(run, index, device) == device
+    assert run.status == 0
+
+
+@pytest.mark.parametrize("name", trees.NAMES)
+def test_machine(host, tmp_path, name):
+    """EGL lists the cards in the opposite order: the join goes by name, not by place."""
+    root = trees.unpack(name, tmp_path / "root")
+    devices = [device_on(card) for card in reversed(trees.cards(root))]
+    if name == "nvidia-no-drm":
+        devices = [NVIDIA_WITHOUT_NODE]
+    if not devices:
+        assert name == "empty"
+    run = host.run(script="".join(device + NO_MEMORY_QUERY for device in devices) or "# none\n",
+                   root=root)
+    assert_devices(run, trees.expected(name))
+
+
+def test_two_devices_of_a_machine_with_more(host, tmp_path):
+    """The third adapter has no context and is left out."""
+    root = trees.unpack("server-bmc", tmp_path / "root")
+    run = host.run(script="".join(device_on(card) + NO_MEMORY_QUERY for card in ("card2", "card0")),
+                   root=root)
+    bmc, _, second = trees.expected("server-bmc")
+    assert_devices(run, [bmc, second])
+
+
+@pytest.mark.parametrize("nodes", [True, False], ids=["with nodes", "without nodes"])
+def test_eight_identical_cards_are_eight_devices(host, tmp_path, nodes):
+    """Each has the memory that its own context tells."""
+    root = trees.unpack("nvidia-eight", tmp_path / "root")
+    devices = [device_on(card) for card in trees.cards(root)]
+    if not nodes:
+        shutil.rmtree(root / "sys/class/drm")
+        devices = [NVIDIA_WITHOUT_NODE] * 8
+    script = "".join(f"{device}integer 0x9047 {(index + 1) << 20}\n"
+                     for index, device in enumerate(devices))
+    run = host.run(script=script, root=root)
+    eight = trees.expected("nvidia-eight")
+    for index, device in enumerate(eight):
+        device["GLMemoryMB"] = str((index + 1) * 1024)
+    assert len({device["GLName"] for device in eight}) == 8
+    assert_devices(run, eight)
+
+
+def test_software_renderer_on_a_machine_without_a_gpu(host, tmp_path):
+    """The last resort: a device without name or ids, and the log tells it."""
+    root = trees.unpack("empty", tmp_path / "root")
+    run = host.run("-verbose=1", script="device\nsoftware\n", root=root)
+    assert_devices(run, [{
+        "GLName": '""', "GLVendorID": "0", "GLRendererID": "0", "GLDriver": '"?"',
+        "GLDriverVersion": '"?"', "GLDriverDate": '"?"', "GLMemoryMB": "0",
+        "IsIntegratedGLGPU": "0"}])
+    assert any(line.endswith(
+        "successful context creation but no matching WMI or DXGI devices found")
+        for line in run.comments)
+
+
+def test_last_resort_is_silent_without_the_option(host, tmp_path):
+    root = trees.unpack("empty", tmp_path / "root")
+    run = host.run(script="device\nsoftware\n", root=root)
+    assert run.facts["NumGLGPUs"] == "1"
+    assert run.comments == []
+
+
+def test_software_renderer_that_borrows_a_cards_node_is_not_the_card(host, tmp_path):
+    root = trees.unpack("amd-discrete", tmp_path / "root")
+    run = host.run(script=device_on("card0") + "software\n", root=root)
+    assert run.facts["NumGLGPUs"] == "1"
+    assert run.facts["glgpu[0].GLName"] == '""'
+
+
+def test_the_log_tells_the_adapters(host, tmp_path):
+    """Raw adapters keep their numbers, and the one without a display has no count."""
+    root = trees.unpack("hybrid-laptop", tmp_path / "root")
+    run = host.run("-verbose=1", script=device_on("card1"), root=root)
+    log = run.comments
+    assert any("adapter[0]{ VendorID=32902 DeviceId=42912 " in line for line in log)
+    assert any(line.endswith("adapter[0] displays: 1") for line in log)
+    assert any("adapter[1]{ VendorID=4318 DeviceId=9632 " in line for line in log)
+    assert not any("adapter[1] displays: " in line for line in log)
+    assert any("output[0]{ DesktopCoordinates={ left=0 top=0 right=2880 bottom=1800}"
+               in line for line in log)
+    assert any(line.endswith("wmiNumDevices=2") for line in log)
+    assert any(line.endswith("dxgiNumDevices=1") for line in log)
