@@ -166,7 +166,7 @@ GPUImpl::GLGPUs GPUImplWin::DoGetGPUs()
             const auto impl = boost::make_shared<GPUImplWin>();
             impl->context = contexts.begin()->second.first;
             result.push_back(boost::make_shared<GLGPU>(impl));
-        } catch (...) { // NOLINT(bugprone-empty-catch): an empty list is the answer then
+        } catch (...) { // an empty list is the answer then
         }
     }
     return result;

@@ -1,5 +1,6 @@
 #include "pmutil_gpu/GPUImplHardware.h"
 
+#include <algorithm>
 #include <exception>
 #include <functional>
 #include <numeric>

@@ -231,11 +231,11 @@ private:
         pmutil::ResultCode CreateLocator() override { return Record("CreateLocator"); }
         pmutil::ResultCode ConnectServer() override { return Record("ConnectServer"); }
         pmutil::ResultCode SetProxyBlanket() override { return Record("SetProxyBlanket"); }
-        pmutil::ResultCode QueryAdapters(std::unique_ptr<pmutil::AdapterRows>& rows) override
+        pmutil::ResultCode QueryAdapters(std::unique_ptr<pmutil::AdapterRows>& enumerator) override
         {
             const pmutil::ResultCode result = Record("QueryAdapters");
             if (!pmutil::Failed(result) && fTracked.Script().givesRows)
-                rows = std::make_unique<Rows>(fTracked.Script());
+                enumerator = std::make_unique<Rows>(fTracked.Script());
             return result;
         }
         void Release() override { Record("Release"); }
