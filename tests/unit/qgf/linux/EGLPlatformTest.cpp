@@ -41,9 +41,10 @@ struct Script {
     EGLint major = 1;
     EGLint minor = 5;
     std::optional<EGLint> claimedDevices;
-    int configs = 1;               // that eglChooseConfig finds
-    bool preferred = true;         // whether it finds one with 8 bits a colour
-    std::set<std::string> failing; // calls that fail, by name or by name and first argument
+    int configs = 1;                // that eglChooseConfig finds
+    bool preferred = true;          // whether it finds one with 8 bits a colour
+    std::set<std::string> throwing; // calls that throw through the C interface
+    std::set<std::string> failing;  // calls that fail, by name or by name and first argument
     EGLint error = EGL_BAD_ALLOC;
     std::set<std::string> absent;
     std::vector<std::string> calls;
@@ -67,6 +68,8 @@ bool Enter(const std::string& name, const std::string& arguments = "")
 {
     const std::string call = arguments.empty() ? name : name + " " + arguments;
     gScript->calls.push_back(call);
+    if (gScript->throwing.count(name) != 0)
+        throw 1;
     return gScript->failing.count(name) == 0 && gScript->failing.count(call) == 0;
 }
 
@@ -672,6 +675,16 @@ TEST_F(EGLPlatformTest, FailedMakeCurrentIsNamed)
                   std::string(call) + " failed for display device egl:0: EGL_BAD_ALLOC (0x3003)");
     }
     context->release();
+}
+
+TEST_F(EGLPlatformTest, DriverThatThrowsOnTheWayOutIsSurvived)
+{
+    script.displayExtensions = "";
+    auto context = create();
+    script.throwing = {"eglMakeCurrent", "eglDestroySurface", "eglDestroyContext"};
+    context->release();
+    context.reset();
+    EXPECT_EQ(script.calls.back(), "eglDestroyContext");
 }
 
 TEST_F(EGLPlatformTest, EntryPointsComeFromEGL)

@@ -77,6 +77,17 @@ bool HasWord(std::string_view list, std::string_view word)
     return false;
 }
 
+// For calls on the way out. A driver written in C++ may throw through its C interface; that must
+// not end the process here.
+template <typename Call>
+void Quietly(Call call) noexcept
+{
+    try {
+        call();
+    } catch (...) {
+    }
+}
+
 class EGLOffscreen : public PlatformContext {
 public:
     EGLOffscreen(const EGLTable& egl, EGLDisplay display, EGLContext context, std::string device)
@@ -85,9 +96,11 @@ public:
 
     ~EGLOffscreen() override
     {
-        if (fSurface != EGL_NO_SURFACE)
-            fEGL.eglDestroySurface(fDisplay, fSurface);
-        fEGL.eglDestroyContext(fDisplay, fContext);
+        Quietly([this] {
+            if (fSurface != EGL_NO_SURFACE)
+                fEGL.eglDestroySurface(fDisplay, fSurface);
+        });
+        Quietly([this] { fEGL.eglDestroyContext(fDisplay, fContext); });
     }
 
     EGLOffscreen(const EGLOffscreen&) = delete;
@@ -112,7 +125,9 @@ public:
 
     void release() noexcept override
     {
-        fEGL.eglMakeCurrent(fDisplay, EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT);
+        Quietly([this] {
+            fEGL.eglMakeCurrent(fDisplay, EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT);
+        });
     }
 
     Core::Proc getProc(const char* name) override { return fEGL.eglGetProcAddress(name); }
