@@ -59,7 +59,7 @@ double MeasureCLCompute(const QGF::OCL::Context& context, const QGF::OCL::Comman
                              data.size() * sizeof(float), data.data(), &ciErrNum);
     CheckCLError(ciErrNum);
     constexpr cl_uint kLength = kFloats;
-    CheckCLError(table.clSetKernelArg(kernel, 0, sizeof buffer, &buffer));
+    CheckCLError(table.clSetKernelArg(kernel, 0, sizeof(cl_mem), &buffer));
     CheckCLError(table.clSetKernelArg(kernel, 1, sizeof kLength, &kLength));
     cl_event event = nullptr;
     CheckCLError(table.clEnqueueNDRangeKernel(queue.handle(), kernel, 1, nullptr, &kFloats,

@@ -14,7 +14,7 @@
 namespace QGF {
 namespace OGL {
 
-class Platform;
+class Platform; // NOLINT(bugprone-forward-declaration-namespace): QGF::OCL has one of that name
 class PlatformContext;
 
 class Library {

@@ -9,8 +9,6 @@
 namespace {
 
 using assay_test::CLAnswer;
-using assay_test::CLFakeDevice;
-using assay_test::CLFakePlatform;
 using assay_test::CLText;
 using assay_test::CLValue;
 using assay_test::FakeOpenCL;
@@ -58,7 +56,7 @@ protected:
 
     FakeOpenCL cl;
     Device device{FakeOpenCL::DeviceID(101)};
-    Platform platform{reinterpret_cast<cl_platform_id>(std::uintptr_t{11})};
+    Platform platform{FakeOpenCL::PlatformID(11)};
 };
 
 TEST_F(OCLTest, ListsPlatformsInTheLoadersOrder)
@@ -66,7 +64,7 @@ TEST_F(OCLTest, ListsPlatformsInTheLoadersOrder)
     const std::vector<Platform> found = QGF::OCL::platforms();
     ASSERT_EQ(found.size(), 2U);
     EXPECT_EQ(found[0].id(), platform.id());
-    EXPECT_EQ(found[1].handle(), reinterpret_cast<cl_platform_id>(std::uintptr_t{12}));
+    EXPECT_EQ(found[1].handle(), FakeOpenCL::PlatformID(12));
     EXPECT_THAT(cl.calls, ElementsAre("clGetPlatformIDs(0)", "clGetPlatformIDs(2)"));
 }
 

@@ -116,7 +116,8 @@ public:
     // The bytes of each kernel argument by index.
     std::map<cl_uint, std::string> kernelArguments;
 
-    static cl_device_id DeviceID(std::uintptr_t id) { return reinterpret_cast<cl_device_id>(id); }
+    static cl_device_id DeviceID(std::uintptr_t id) { return ToHandle<cl_device_id>(id); }
+    static cl_platform_id PlatformID(std::uintptr_t id) { return ToHandle<cl_platform_id>(id); }
 
 private:
     static FakeOpenCL*& Current()
@@ -126,6 +127,11 @@ private:
     }
 
     // Handles are small numbers, so that the record can show them.
+    template <typename Handle>
+    static Handle ToHandle(std::uintptr_t number)
+    {
+        return reinterpret_cast<Handle>(number); // NOLINT(performance-no-int-to-ptr): as told above
+    }
     template <typename Handle>
     static std::uintptr_t Number(Handle handle)
     {
@@ -156,7 +162,7 @@ private:
     template <typename Handle>
     Handle Make(const char* kind)
     {
-        return reinterpret_cast<Handle>(static_cast<std::uintptr_t>(++created[kind]));
+        return ToHandle<Handle>(static_cast<std::uintptr_t>(++created[kind]));
     }
 
     cl_int Release(const char* kind, cl_int status)
@@ -202,7 +208,7 @@ private:
                           : static_cast<cl_uint>(cl.platforms.size());
         if (ids != nullptr)
             for (cl_uint i = 0; i < count && i < cl.platforms.size(); ++i)
-                ids[i] = reinterpret_cast<cl_platform_id>(cl.platforms[i].id);
+                ids[i] = PlatformID(cl.platforms[i].id);
         return CL_SUCCESS;
     }
 

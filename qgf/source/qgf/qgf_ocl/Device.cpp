@@ -34,7 +34,7 @@ Platform Device::platform() const
 {
     constexpr char kCall[] = "clGetDeviceInfo(CL_DEVICE_PLATFORM)";
     cl_platform_id platform = nullptr;
-    GetInfoValue(fHandle, CL_DEVICE_PLATFORM, kCall, sizeof platform, &platform, nullptr);
+    GetInfoValue(fHandle, CL_DEVICE_PLATFORM, kCall, sizeof(cl_platform_id), &platform, nullptr);
     // Null would mean "whichever" to most of OpenCL.
     if (platform == nullptr)
         RefuseAnswer(kCall, "the driver gives no platform");
