@@ -1,9 +1,10 @@
-// Which files are read, and why none of them wakes a card or waits for one:
+// Which files are read, and why none of them wakes a card:
 // - "vendor", "device", "subsystem_vendor", "subsystem_device" and "revision" of a PCI device print
 //   the kernel's struct pci_dev (drivers/pci/pci-sysfs.c; Documentation/ABI/testing/sysfs-bus-pci).
 //   "config", "vpd", "rom" and the link speeds would resume the device and are left alone.
 // - "status" and "modes" of a connector print what the last detection found; only writing to
-//   "status" detects anew (drivers/gpu/drm/drm_sysfs.c).
+//   "status" detects anew (drivers/gpu/drm/drm_sysfs.c). "modes" takes the lock of its list, which
+//   a detection under way may hold for a moment, so it is read where a display is attached only.
 // - amdgpu's "mem_info_vram_total" and "mem_info_gtt_total" print sizes kept since the driver
 //   started (drivers/gpu/drm/amd/amdgpu/amdgpu_vram_mgr.c, amdgpu_gtt_mgr.c;
 //   Documentation/gpu/amdgpu/driver-misc.rst), unlike its clocks and sensors.
@@ -108,7 +109,7 @@ void ReadMemory(const std::string& folder, const Nodes& nodes, DrmAdapter& adapt
 // The module behind a device's driver, or the driver itself where it is built into the kernel.
 std::string ModuleOf(const std::string& device)
 {
-    const std::string module = QGF::LastOfPath(QGF::ReadSystemLink(device + "driver/module"));
+    std::string module = QGF::LastOfPath(QGF::ReadSystemLink(device + "driver/module"));
     if (!module.empty()) {
         return module;
     }

@@ -107,6 +107,13 @@ TEST(AdapterNameTest, WhatTheAdapterListsEscapeIsReplaced)
     EXPECT_EQ(AdapterName("0000:03:00.0"), "A'/???? z");
 }
 
+TEST(AdapterNameTest, ANameOfWhichNothingIsLeftIsNone)
+{
+    const AdapterTree tree("amd-discrete");
+    tree.write(std::string(kRadeon) + "/product_name", "\x80\xBF\n");
+    EXPECT_EQ(AdapterName("0000:03:00.0"), kRadeonName);
+}
+
 TEST(AdapterNameTest, ALongNameFitsADescriptionWithItsAddress)
 {
     const AdapterTree tree("server-bmc");

@@ -114,15 +114,15 @@ std::string NameOf(const std::string& address, PciIds& ids)
     const std::uint16_t device = ShortIdOf(address, "device");
     std::string name;
     if (vendor == kNvidia) {
-        name = NvidiaModel(address);
+        name = Plain(NvidiaModel(address));
     }
     if (name.empty()) {
-        name = AttributeOf(address, "product_name");
+        name = Plain(AttributeOf(address, "product_name"));
     }
     if (name.empty()) {
-        name = ids.name(vendor, device);
+        name = Plain(ids.name(vendor, device));
     }
-    return name.empty() ? HexName(vendor, device) : Plain(name);
+    return name.empty() ? HexName(vendor, device) : name;
 }
 
 Adapters ReadAdapters()

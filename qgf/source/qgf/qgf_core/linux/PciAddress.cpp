@@ -36,7 +36,7 @@ std::string LastPciAddress(const std::string& path)
     for (;;) {
         const std::size_t slash = end == 0 ? std::string::npos : path.rfind('/', end - 1);
         const std::size_t begin = slash == std::string::npos ? 0 : slash + 1;
-        const std::string part = path.substr(begin, end - begin);
+        std::string part = path.substr(begin, end - begin);
         if (IsPciAddress(part)) {
             return part;
         }

@@ -59,7 +59,7 @@ std::string AskLibrary(std::uint16_t vendor, std::uint16_t device)
 std::string PciIds::name(std::uint16_t vendor, std::uint16_t device)
 {
     if (SystemRoot().empty()) {
-        const std::string name = AskLibrary(vendor, device);
+        std::string name = AskLibrary(vendor, device);
         if (!name.empty()) {
             return name;
         }
