@@ -48,6 +48,13 @@ public:
     Stackable(const Stackable&) = delete;
     Stackable& operator=(const Stackable&) = delete;
 
+    ~Stackable() override
+    {
+        boost::lock_guard<boost::recursive_mutex> lock(Mutex());
+        fStack->erase(std::remove(fStack->begin(), fStack->end(), static_cast<T*>(this)),
+                      fStack->end());
+    }
+
     // The youngest live object; an empty holder if there is none.
     static StackableHolder<T> Top()
     {
@@ -79,13 +86,6 @@ protected:
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
         fStack = Instances();
         fStack->push_back(static_cast<T*>(this));
-    }
-
-    ~Stackable() override
-    {
-        boost::lock_guard<boost::recursive_mutex> lock(Mutex());
-        fStack->erase(std::remove(fStack->begin(), fStack->end(), static_cast<T*>(this)),
-                      fStack->end());
     }
 
 private:

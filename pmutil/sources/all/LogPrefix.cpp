@@ -53,7 +53,7 @@ std::string MakeLogPrefix(std::uint32_t lineNumber, double seconds, double delta
                           const std::string& thread)
 {
     using Calendar = boost::gregorian::gregorian_calendar;
-    constexpr std::int64_t kMillisecondsPerDay = 24 * 60 * 60 * 1000;
+    constexpr std::int64_t kMillisecondsPerDay = std::int64_t{24} * 60 * 60 * 1000;
     static const auto epochDay = Calendar::day_number({1970, 1, 1});
     const auto milliseconds = static_cast<std::int64_t>(seconds * 1000);
     const auto days = static_cast<Calendar::date_int_type>(milliseconds / kMillisecondsPerDay);
