@@ -26,7 +26,7 @@ template <typename T>
 class StackableHolder {
 public:
     StackableHolder() = default;
-    StackableHolder(boost::shared_ptr<std::vector<T*>> stack, T* object)
+    StackableHolder(boost::shared_ptr<std::vector<Stackable<T>*>> stack, T* object)
         : fStack(std::move(stack)), fObject(object)
     {}
 
@@ -35,7 +35,7 @@ public:
     T* get() const { return fObject; }
 
 private:
-    boost::shared_ptr<std::vector<T*>> fStack;
+    boost::shared_ptr<std::vector<Stackable<T>*>> fStack;
     T* fObject = nullptr;
 };
 
@@ -43,7 +43,7 @@ private:
 template <typename T>
 class Stackable : public StackableBase {
 public:
-    using Stack = boost::shared_ptr<std::vector<T*>>;
+    using Stack = boost::shared_ptr<std::vector<Stackable<T>*>>;
 
     Stackable(const Stackable&) = delete;
     Stackable& operator=(const Stackable&) = delete;
@@ -51,8 +51,7 @@ public:
     ~Stackable() override
     {
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
-        fStack->erase(std::remove(fStack->begin(), fStack->end(), static_cast<T*>(this)),
-                      fStack->end());
+        fStack->erase(std::remove(fStack->begin(), fStack->end(), this), fStack->end());
     }
 
     // The youngest live object; an empty holder if there is none.
@@ -60,7 +59,7 @@ public:
     {
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
         Stack stack = Instances();
-        T* const top = stack->empty() ? nullptr : stack->back();
+        T* const top = stack->empty() ? nullptr : static_cast<T*>(stack->back());
         return StackableHolder<T>(std::move(stack), top);
     }
 
@@ -68,9 +67,10 @@ public:
     static T* Below(const T* object)
     {
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
-        const std::vector<T*>& stack = *Instances();
+        const std::vector<Stackable<T>*>& stack = *Instances();
         const auto found = std::find(stack.begin(), stack.end(), object);
-        return found == stack.begin() || found == stack.end() ? nullptr : *(found - 1);
+        return found == stack.begin() || found == stack.end() ? nullptr
+                                                              : static_cast<T*>(*(found - 1));
     }
 
     // Guards the stack. Taken inside the log mutex and never the other way round.
@@ -85,13 +85,14 @@ protected:
     {
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
         fStack = Instances();
-        fStack->push_back(static_cast<T*>(this));
+        // Not yet a T: it is turned into one only when it is asked for.
+        fStack->push_back(this);
     }
 
 private:
     static Stack Instances()
     {
-        static const Stack& stack = *new Stack(boost::make_shared<std::vector<T*>>());
+        static const Stack& stack = *new Stack(boost::make_shared<std::vector<Stackable<T>*>>());
         return stack; // outlives all users
     }
 
