@@ -37,7 +37,8 @@ std::FILE* OpenSharedAppend(const std::string& path);
 void DiscardUnwritten(std::FILE* stream);
 
 // Keeps a crash of this process from raising a dialog or leaving a core dump, and a write to a pipe
-// whose reader has gone from ending it. Call it first in main.
+// whose reader has gone from ending it. A standard stream that is closed stays one that fails: no
+// file opened later takes its place. Call it first in main.
 void PrepareConsoleProcess();
 
 } // namespace pmutil

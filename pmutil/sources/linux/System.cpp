@@ -1,5 +1,6 @@
 #include "pmutil/System.h"
 
+#include <fcntl.h>
 #include <pthread.h>
 #include <pwd.h>
 #include <stdio_ext.h>
@@ -77,6 +78,16 @@ std::string GetNarrowDesktopFolder()
     return named.empty() ? home + "/Desktop" : named;
 }
 
+// A file that a driver opens would get the number of a closed standard stream, and with it the
+// report. What takes the place fails every read and write, as the closed stream did.
+void OccupyClosedStreams()
+{
+    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) {
+        if (fcntl(stream, F_GETFD) < 0 && errno == EBADF)
+            open("/dev/null", stream == STDIN_FILENO ? O_WRONLY : O_RDONLY);
+    }
+}
+
 } // namespace
 
 double GetClockSeconds()
@@ -151,6 +162,7 @@ void PrepareConsoleProcess()
         setrlimit(RLIMIT_CORE, &limit);
     }
     std::signal(SIGPIPE, SIG_IGN);
+    OccupyClosedStreams();
 }
 
 const boost::filesystem::path::codecvt_type& GetPathCodecvt()
