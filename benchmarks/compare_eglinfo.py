@@ -1,0 +1,149 @@
+#!/usr/bin/env python3
+"""Times the whole program against `eglinfo -B` on the same driver, and tells where its own time goes.
+
+usage: compare_eglinfo.py [--build FOLDER] [--runs N] [--json FILE]
+
+Both are started alternately and to their end, with standard output and error to /dev/null; figures
+are medians in milliseconds, of wall time and of processor time (which a busy machine disturbs
+less). OpenCL is hidden from the program, since eglinfo doesn't ask for it. The
+program does more than eglinfo: it compiles shaders and renders. eglinfo tries every platform that
+EGL knows.
+
+The program's own time is what it takes beyond /bin/true on the scripted driver of the tests, which
+answers at once. The stages come from programmed failures: a run that fails at a step is a
+run up to there.
+"""
+
+import argparse
+import json
+import os
+import shutil
+import statistics
+import sys
+import tempfile
+import time
+from pathlib import Path
+
+TREE = Path(__file__).resolve().parents[1]
+
+GOAL_OWN_MS = 2.0
+
+# A run that fails at this step, and what it has done by then with one GPU: the work of a step comes
+# before the step.
+STAGES = [
+    (0, "process start, libraries, options"),
+    (5, "the three checks: loads EGL, makes and drops a context"),
+    (6, "enumeration: adapters, a context on each device"),
+    (19, "thirteen questions"),
+    (20, "shaders: compile, link"),
+    (21, "framebuffer: texture, clear"),
+    (41, "the battery: twenty-one questions"),
+    (-1, "the rest, and the exit"),
+]
+
+
+def time_once(command, environment):
+    """Wall and processor time of one run."""
+    null = os.open(os.devnull, os.O_RDWR)
+    try:
+        start = time.perf_counter()
+        child = os.posix_spawn(command[0], command, environment, file_actions=[
+            (os.POSIX_SPAWN_DUP2, null, 0), (os.POSIX_SPAWN_DUP2, null, 1),
+            (os.POSIX_SPAWN_DUP2, null, 2)])
+        _, status, usage = os.wait4(child, 0)
+        taken = time.perf_counter() - start
+    finally:
+        os.close(null)
+    if os.WIFSIGNALED(status):
+        sys.exit(f"{' '.join(command)} was ended by signal {os.WTERMSIG(status)}")
+    return 1000 * taken, 1000 * (usage.ru_utime + usage.ru_stime)
+
+
+def medians(jobs, runs):
+    """The medians of each (command, environment), all of them run alternately."""
+    taken = [[] for _ in jobs]
+    for _ in range(2):  # not counted: files come into memory
+        for command, environment in jobs:
+            time_once(command, environment)
+    for _ in range(runs):
+        for index, (command, environment) in enumerate(jobs):
+            taken[index].append(time_once(command, environment))
+    return [tuple(statistics.median(column) for column in zip(*each)) for each in taken]
+
+
+def stage_jobs(program, environment):
+    return [([program, f"-crashAfter={step}"], environment) for step, _ in STAGES]
+
+
+def show(times, text):
+    print("".join(f"{time:9.2f}" for time in times) + "  " + text)
+
+
+def print_stages(title, cumulative):
+    print(title)
+    before = (0.0, 0.0)
+    for (_, name), now in zip(STAGES, cumulative):
+        show((now[0] - before[0], now[1] - before[1]), name)
+        before = now
+    show(cumulative[-1], "in all")
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__.split("\n", maxsplit=1)[0])
+    parser.add_argument("--build", type=Path, default=TREE / "build" / "linux")
+    parser.add_argument("--runs", type=int, default=20)
+    parser.add_argument("--json", type=Path)
+    options = parser.parse_args()
+
+    program = str(options.build.resolve() / "bin" / "assay")
+    eglinfo = shutil.which("eglinfo")
+    true = shutil.which("true")
+    results = {"runs": options.runs}
+
+    with tempfile.TemporaryDirectory() as folder:
+        hidden = Path(folder) / "no-opencl"
+        hidden.mkdir()
+        for name in ("libOpenCL.so.1", "libOpenCL.so"):
+            (hidden / name).touch()
+        script = Path(folder) / "script"
+        script.write_text("device\nsoftware\n")
+        real = dict(os.environ, LD_LIBRARY_PATH=str(hidden))
+        scripted = dict(
+            real, LD_LIBRARY_PATH=f"{options.build.resolve() / 'drivers' / 'egl'}:{hidden}",
+            ASSAY_SCRIPTED_EGL=str(script))
+
+        jobs = [([program], real), ([true], real)]
+        if eglinfo is not None:
+            jobs.append(([eglinfo, "-B"], dict(os.environ)))
+        whole, nothing, *peer = medians(jobs, options.runs)
+        print(f"medians of {options.runs} runs, in milliseconds\n\n     wall  processor")
+        show(whole, "assay on this machine's driver")
+        results.update(assay_ms=whole, true_ms=nothing)
+        if peer:
+            ratios = (whole[0] / peer[0][0], whole[1] / peer[0][1])
+            show(peer[0], "eglinfo -B on the same driver")
+            show(ratios, "assay / eglinfo (goal: no more than 1)")
+            results.update(eglinfo_ms=peer[0], ratios=ratios)
+        else:
+            print("eglinfo isn't installed (package mesa-utils-bin)")
+        show(nothing, "/bin/true\n")
+
+        stages = medians(stage_jobs(program, real), options.runs)
+        print_stages("On this machine's driver, stage by stage:", stages)
+        results["stages_ms"] = stages
+
+        *stages, nothing = medians(stage_jobs(program, scripted) + [([true], scripted)],
+                                   options.runs)
+        own = (stages[-1][0] - nothing[0], stages[-1][1] - nothing[1])
+        print()
+        print_stages("On a driver that answers at once:", stages)
+        show(nothing, "/bin/true")
+        show(own, f"assay's own time (goal: under {GOAL_OWN_MS:g})")
+        results.update(scripted_stages_ms=stages, own_ms=own)
+
+    if options.json is not None:
+        options.json.write_text(json.dumps(results, indent=2) + "\n")
+
+
+if __name__ == "__main__":
+    main()
