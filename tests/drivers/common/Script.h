@@ -35,7 +35,8 @@ public:
     // Takes a number: decimal, hexadecimal with 0x, or a name that `names` knows.
     using Names = std::function<std::optional<std::int64_t>(const std::string&)>;
     std::int64_t TakeNumber(const char* what, const Names& names = {});
-    // Takes a text: "...", or `repeat N "..."`, or several of them joined by +. `null` gives nothing.
+    // Takes a text: "...", or `repeat N "..."`, or several of them joined by +. `null` gives
+    // nothing.
     std::optional<std::string> TakeText(const char* what);
     // Ends the process with `problem`.
     [[noreturn]] void Fail(const std::string& problem) const;

@@ -1,0 +1,16 @@
+// The program, with the folder that stands for the root of the file system taken from
+// ASSAY_TEST_ROOT: the only difference from the real one, which takes nothing but its arguments.
+#include <cstdlib>
+
+#include "PixmereAssay.h"
+#include "pmutil/System.h"
+#include "qgf/AdapterName.h"
+
+int main(int argc, char** argv)
+{
+    pmutil::PrepareConsoleProcess();
+    if (const char* root = std::getenv("ASSAY_TEST_ROOT"))
+        QGF::SetSystemRoot(root);
+    assay::PixmereAssay::Arguments arguments(argv, argv + argc);
+    return assay::PixmereAssay::Instance().Run(arguments);
+}

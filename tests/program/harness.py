@@ -1,0 +1,186 @@
+"""Runs the built program as a host sees it: arguments in; standard output, standard error and exit
+status out. Nothing here knows how the program is made.
+
+The build folder is the one that ASSAY_BUILD_DIR names, else build/linux.
+"""
+
+import os
+import re
+import signal
+import subprocess
+from dataclasses import dataclass, field
+from pathlib import Path
+
+TREE = Path(__file__).resolve().parents[2]
+BUILD = Path(os.environ.get("ASSAY_BUILD_DIR", TREE / "build" / "linux")).resolve()
+PROGRAM = BUILD / "bin" / "assay"
+# The same program with the folder that stands for the root of the file system in
+# ASSAY_TEST_ROOT: the only way to show it adapters that this machine hasn't got.
+PROGRAM_AT_ROOT = BUILD / "bin" / "assay-at-root"
+SCRIPTED_EGL = BUILD / "drivers" / "egl"
+
+SECONDS = 60
+
+# A sanitizer must leave a crash a crash: its signal is what a host sees.
+SANITIZERS = {
+    "ASAN_OPTIONS": "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0",
+    "TSAN_OPTIONS": "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0:"
+                    "report_signal_unsafe=0",
+    "UBSAN_OPTIONS": "print_stacktrace=1",
+}
+
+STAMP = re.compile(r'^(assayStart|assayEnd)="\d{4}-\d\d-\d\d_\d\d:\d\d:\d\d"$', re.MULTILINE)
+
+
+def text_of(data):
+    """Bytes as text that keeps every byte."""
+    return data.decode("utf-8", "surrogateescape")
+
+
+@dataclass
+class Run:
+    """How a run ended and what it printed."""
+
+    status: int  # negative: ended by that signal
+    out: bytes
+    err: bytes
+
+    @property
+    def report(self):
+        """The report as text, with fixed texts in the place of well-formed time stamps."""
+        return STAMP.sub(r'\1="STAMP"', text_of(self.out))
+
+    @property
+    def lines(self):
+        return split_lines(self.report)
+
+    @property
+    def errors(self):
+        return split_lines(text_of(self.err))
+
+    @property
+    def comments(self):
+        """The lines that a reader of the report skips."""
+        return [line for line in self.lines if line.startswith("#")]
+
+    @property
+    def facts(self):
+        """The report without its comments, as a dictionary; quotes stay with their texts."""
+        return dict(line.split("=", 1) for line in self.lines if not line.startswith("#"))
+
+
+def split_lines(text):
+    """The lines of a text in which every line has its end."""
+    assert text == "" or text.endswith("\n"), f"no line end at the end of {text[-200:]!r}"
+    return text.split("\n")[:-1]
+
+
+@dataclass
+class Call:
+    """A line of a driver's record."""
+
+    number: int
+    device: int  # -1 for none
+    name: str
+    arguments: str
+
+
+def read_record(path):
+    calls = []
+    for line in Path(path).read_text(encoding="ascii").splitlines():
+        number, device, name, *arguments = line.split(" ", 3)
+        calls.append(Call(int(number), -1 if device == "-" else int(device), name,
+                          arguments[0] if arguments else ""))
+    return calls
+
+
+@dataclass
+class Host:
+    """Where runs keep their files, and what they find on the machine."""
+
+    folder: Path
+    variables: dict = field(default_factory=dict)
+
+    def record(self):
+        return read_record(self.folder / "record")
+
+    def record_so_far(self):
+        """The record of a run that may still be at work, or not yet at it."""
+        try:
+            return self.record()
+        except FileNotFoundError:
+            return []
+
+    def fresh_record(self):
+        """A script line that records to an empty file."""
+        (self.folder / "record").unlink(missing_ok=True)
+        return f"record {self.folder / 'record'}\n"
+
+    def broken_libraries(self, name, *files):
+        """A folder in which those libraries are found and can't be loaded."""
+        folder = self.folder / name
+        folder.mkdir(exist_ok=True)
+        for file in files:
+            (folder / file).touch()
+        return folder
+
+    def environment(self, script=None, egl="scripted", opencl="absent", root=None):
+        """What the child finds.
+
+        script: the text of an EGL script, or the path of a file that holds one.
+        egl: "scripted", "absent", or "real" for the machine's own.
+        opencl: "absent" (no loader), "empty" (a loader without platforms), or "real".
+        root: the folder that stands for the root of the file system.
+        """
+        result = {"PATH": os.environ.get("PATH", "/usr/bin:/bin")}
+        if egl == "real" or opencl == "real":
+            result = dict(os.environ)
+        for name, value in SANITIZERS.items():
+            result[name] = ":".join(filter(None, [os.environ.get(name), value]))
+        search = []
+        if egl == "scripted":
+            assert (SCRIPTED_EGL / "libEGL.so.1").exists()
+            search.append(SCRIPTED_EGL)
+        elif egl == "absent":
+            search.append(self.broken_libraries("no-egl", "libEGL.so.1", "libEGL.so"))
+        if opencl == "absent":
+            search.append(
+                self.broken_libraries("no-opencl", "libOpenCL.so.1", "libOpenCL.so"))
+        elif opencl == "empty":
+            result["OCL_ICD_VENDORS"] = str(self.folder / "no-vendors")
+        if search:
+            result["LD_LIBRARY_PATH"] = ":".join(str(folder) for folder in search)
+        if isinstance(script, str):
+            file = self.folder / "script"
+            file.write_bytes(script.encode("utf-8", "surrogateescape"))
+            script = file
+        if script is not None:
+            result["ASSAY_SCRIPTED_EGL"] = str(script)
+        if root is not None:
+            result["ASSAY_TEST_ROOT"] = str(root)
+        result.update(self.variables)
+        return result
+
+    def run(self, *arguments, seconds=SECONDS, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+            stderr=subprocess.PIPE, before=None, clear=False, **machine):
+        """Runs the program to its end. `before` is called in the child; `clear` leaves it no
+        variable but those that make up the machine."""
+        program = PROGRAM if machine.get("root") is None else PROGRAM_AT_ROOT
+        environment = self.environment(**machine)
+        if clear:
+            environment.pop("PATH")
+        done = subprocess.run([program, *arguments], stdin=stdin, stdout=stdout, stderr=stderr,
+                              env=environment, timeout=seconds, preexec_fn=before, check=False)
+        return Run(done.returncode, done.stdout or b"", done.stderr or b"")
+
+    def start(self, *arguments, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+              stderr=subprocess.PIPE, **machine):
+        """Starts the program and leaves it to the caller."""
+        program = PROGRAM if machine.get("root") is None else PROGRAM_AT_ROOT
+        return subprocess.Popen([program, *arguments], stdin=stdin, stdout=stdout, stderr=stderr,
+                                env=self.environment(**machine))
+
+
+def ended_by(run, *signals):
+    """Tells whether one of these signals ended the run."""
+    return run.status in [-int(signal.Signals[each]) for each in signals]
