@@ -3,7 +3,7 @@
 import pytest
 
 # Before their first import, or their assertions don't tell what differs.
-pytest.register_assert_rewrite("harness", "model")
+pytest.register_assert_rewrite("harness", "model", "clmodel")
 
 import harness  # noqa: E402
 

@@ -6,6 +6,8 @@ adapter files), and the same values are what the report must show.
 
 from dataclasses import dataclass, field
 
+from clmodel import CL_KEYS, cl_test
+
 # What the two sides agree on: EGL's names of the values, and where a report line shows each.
 BATTERY_INTEGERS = [
     ("GL_MAX_TEXTURE_UNITS", 34018),
@@ -80,7 +82,7 @@ class Gpu:
         """The values of the fifteen keys, as the report shows them, while all goes well."""
         adapter = self.adapter
         return dict(zip(KEYS, [
-            quoted(min(self.version[:3], NEWEST_VERSION)),
+            quoted(self.version[:3]),
             "0" if adapter is None else str(int(adapter.integrated)),
             "0" if adapter is None else str(adapter.memory_mb),
             quoted("" if adapter is None else adapter.name),
@@ -122,9 +124,6 @@ class Gpu:
 def script_of(gpus):
     return "".join(gpu.script() for gpu in gpus)
 
-
-# No newer one is told from it.
-NEWEST_VERSION = "4.1"
 
 # How a per-GPU test tells that OpenGL raised an error.
 GL_ERROR = "\n".join(["Failed requirement: glStatus == GL_NO_ERROR",
@@ -214,13 +213,14 @@ def per_gpu_tests(gpu_values):
 
 
 def predict(gpus, crash_after=-1, throw_after=-1, exit_status=0, opencl=None, core=1, ogl=1,
-            context=None, failing=()):
+            context=None, failing=(), cl_failing=()):
     """The report of a run.
 
     gpus: what the enumeration finds, in its order.
-    opencl: None without a loader, else the number of OpenCL GPUs, which must be 0.
+    opencl: None without a loader, 0 for no OpenCL GPU, else the values of each one's keys.
     context: whether a first context can be made; by default, whether there is a GPU.
     failing: {(index of the GPU, key): lines on standard error} for what the driver makes fail.
+    cl_failing: the same for the OpenCL GPUs.
     """
     failing = dict(failing)
     steps = Steps(crash_after, throw_after)
@@ -268,8 +268,13 @@ def predict(gpus, crash_after=-1, throw_after=-1, exit_status=0, opencl=None, co
         for test in per_gpu_tests(values_of):
             run_test(entries, test)
         if opencl is not None:
-            assert opencl == 0
-            line_and_step("NumCLGPUs=0")
+            found = [dict(values) for values in opencl or []]
+            for (index, key), text in dict(cl_failing).items():
+                found[index][key] = Failing(text)
+            line_and_step(f"NumCLGPUs={len(found)}")
+            entries = [(f"clgpu[{index}]", values) for index, values in enumerate(found)]
+            for key in CL_KEYS:
+                run_test(entries, cl_test(key))
         line_and_step('assayEnd="STAMP"')
         steps.take()
 
