@@ -478,12 +478,6 @@ def use_vendor(host, name, **variables):
     host.variables.update(OCL_ICD_VENDORS=str(file), **variables)
 
 
-@pytest.fixture
-def leaky(monkeypatch):
-    """What the measurements leave with a driver on purpose is memory that a real one loses."""
-    monkeypatch.setenv("ASAN_OPTIONS", "detect_leaks=0")
-
-
 def use_mesa_as_gpu(host):
     use_vendor(host, "rusticl.icd", RUSTICL_ENABLE="llvmpipe", RUSTICL_DEVICE_TYPE="gpu")
 
@@ -538,7 +532,6 @@ def assert_agrees_with_clinfo(run, devices):
         assert facts[f"{tag}.CLDriverVersion"] == f'"{device["CL_DRIVER_VERSION"]}"'
 
 
-@pytest.mark.usefixtures("leaky")
 def test_mesa_as_gpu(host):
     """The whole report over a real driver, and clinfo's word for each fact. Mesa's software device
     has no sound counters: that the two measured values are there is all that can be asked."""
@@ -556,7 +549,6 @@ def test_mesa_as_gpu(host):
     assert_agrees_with_clinfo(run, devices)
 
 
-@pytest.mark.usefixtures("leaky")
 def test_drivers_of_this_machine(host):
     """Whatever GPUs the installed drivers show, clinfo shows the same."""
     devices = clinfo_devices(host, egl="real", opencl="real")
