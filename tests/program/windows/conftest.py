@@ -1,0 +1,52 @@
+"""The Windows program under Wine, as a host sees it.
+
+The tests share what the Linux ones know of reports. Whatever Wine offers is the machine: WMI and
+DXGI, WGL on Mesa, OpenCL.dll over the Linux drivers.
+"""
+
+import os
+import subprocess
+import sys
+from pathlib import Path
+
+import pytest
+
+TREE = Path(__file__).resolve().parents[3]
+sys.path.insert(0, str(TREE / "tests" / "program"))
+pytest.register_assert_rewrite("harness", "model")
+
+import harness  # noqa: E402
+
+BUILD = Path(os.environ.get("ASSAY_BUILD_DIR", TREE / "build" / "windows")).resolve()
+PROGRAM = BUILD / "bin" / "assay.exe"
+SECONDS = 120
+
+# Mesa's OpenCL driver on the processor, presented as a GPU.
+OPENCL_GPU = {"RUSTICL_ENABLE": "llvmpipe", "RUSTICL_DEVICE_TYPE": "gpu"}
+NO_OPENCL_PLATFORM = {"OCL_ICD_VENDORS": "/nonexistent"}
+
+
+def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, **variables):
+    """Runs the program to its end; text mode's line ends come back as plain newlines."""
+    done = subprocess.run([TREE / "scripts" / "run-under-wine", program, *arguments],
+                          stdin=subprocess.DEVNULL, stdout=stdout, stderr=subprocess.PIPE,
+                          env={**os.environ, **variables}, timeout=SECONDS, check=False)
+    lost = [line for line in done.stderr.split(b"\n") if not is_noise(line)]
+    return harness.Run(done.returncode, (done.stdout or b"").replace(b"\r\n", b"\n"),
+                       b"\n".join(lost).replace(b"\r\n", b"\n"))
+
+
+def is_noise(line):
+    """What the virtual display and Wine itself say."""
+    return line.startswith((b"X connection", b"Authorization required", b"wine:", b"MESA"))
+
+
+@pytest.fixture(scope="session")
+def whole_run():
+    """One run with nothing asked for and no OpenCL platform."""
+    return run_under_wine(**NO_OPENCL_PLATFORM)
+
+
+def pytest_collection_modifyitems():
+    if not PROGRAM.exists():
+        raise pytest.UsageError(f"{PROGRAM} isn't there: build first, or set ASSAY_BUILD_DIR")

@@ -1,0 +1,183 @@
+"""The Windows program under Wine: its report, its command line, and a failure at every step."""
+
+import re
+import subprocess
+import time
+from concurrent.futures import ThreadPoolExecutor
+
+import pytest
+
+from conftest import (BUILD, NO_OPENCL_PLATFORM, OPENCL_GPU, PROGRAM, run_under_wine)
+from model import BATTERY_EXTENSIONS, BATTERY_INTEGERS, Gpu, KEYS, check, predict
+from test_command_line import USAGE
+
+WORKERS = 2
+
+
+def gpu_of(run):
+    """The device that a report tells of, for the prediction of other runs on it."""
+    facts = run.facts
+
+    def text(key):
+        return facts[f"glgpu[0].{key}"].strip('"')
+
+    def number(query):
+        return int(facts[f"glgpu[0].{query}"].strip("[]"))
+
+    return Gpu(
+        vendor=text("GLVendor"), renderer=text("GLRenderer"), version=text("GLVersion"),
+        language=text("glGetString[GL_SHADING_LANGUAGE_VERSION]"),
+        rectangle=int(facts["glgpu[0].GLRectTextureSize"]),
+        instructions=number("glGetProgramivARB[GL_FRAGMENT_PROGRAM_ARB]"
+                            "[GL_MAX_PROGRAM_INSTRUCTIONS_ARB]"),
+        integers=[number(f"glGetIntegerv[{name}]") for name, _ in BATTERY_INTEGERS],
+        extensions=["GL_ARB_texture_non_power_of_two"] + [
+            extension for name, _, extension, _ in BATTERY_EXTENSIONS
+            if facts[f"glgpu[0].extension[QGF::OGL::{name}]"] == "1"])
+
+
+def test_report(whole_run):
+    """Wine's display device has a name of its own, so no adapter matches it and the last resort
+    gives one device without name, ids or driver."""
+    assert whole_run.status == 0
+    assert whole_run.errors == []
+    facts = whole_run.facts
+    assert facts["QGFCoreInitialized"] == facts["QGFOGLInitialized"] == "1"
+    assert facts["OGLContextCreated"] == facts["NumGLGPUs"] == "1"
+    assert facts["glgpu[0].CanCompileProgramGLSL"] == facts["glgpu[0].GLFrameBufferOK"] == "1"
+    assert [key for key in facts if re.match(r"glgpu\[0\]\.[^.\[]+$", key)] == [
+        f"glgpu[0].{key}" for key in KEYS]
+    check(whole_run, predict([gpu_of(whole_run)], opencl=0))
+
+
+def test_line_ends_are_those_of_text_mode():
+    done = subprocess.run([PROGRAM.parents[3] / "scripts" / "run-under-wine", PROGRAM,
+                           "-stdout=x", "-comment=y", "-bogus"],
+                          stdout=subprocess.PIPE, stderr=subprocess.PIPE, check=False)
+    assert done.stdout == b"x\r\n# y\r\n"
+    assert b"Usage exception: usage\r\nusage: \r\n" in done.stderr
+    assert done.returncode == 3
+
+
+def test_log_shows_the_real_adapters():
+    run = run_under_wine("-verbose=1", **NO_OPENCL_PLATFORM)
+    text = "\n".join(run.comments)
+    assert "wmiNumDevices=1" in text
+    assert re.search(r"adapter\[0\]\{ VendorID=\d+ DeviceId=\d+ .* Description=.+\}", text)
+    assert re.search(r"output\[0\]\{ DesktopCoordinates=\{ left=0 top=0 .* AttachedToDesktop=1 ",
+                     text)
+    assert "adapter[0] displays: 1" in text
+    assert "dxgiNumDevices=1" in text
+    assert "successful context creation but no matching WMI or DXGI devices found" in text
+    assert [line for line in run.lines if not line.startswith("# ")] == run_under_wine(
+        **NO_OPENCL_PLATFORM).lines
+
+
+@pytest.mark.parametrize("option, field", [("crashAfter", "crash_after"),
+                                           ("throwAfter", "throw_after")])
+def test_failure_at_every_step(whole_run, option, field):
+    gpu = gpu_of(whole_run)
+    steps = predict([gpu], opencl=0).steps
+    assert steps == 45
+
+    def run_to(step):
+        return run_under_wine(f"-{option}={step}", **NO_OPENCL_PLATFORM)
+
+    with ThreadPoolExecutor(WORKERS) as workers:
+        runs = list(workers.map(run_to, range(steps + 1)))
+    for step, run in enumerate(runs):
+        check(run, predict([gpu], opencl=0, **{field: step}))
+    assert [run.status for run in runs] == [2] * steps + [0]
+
+
+@pytest.mark.parametrize("arguments, status", [
+    (["-exit=7"], 7),
+    (["-exit=0x10"], 16),
+    (["-exit=4294967295"], 255),
+    (["-exit=7", "-throwAfter=10"], 2),
+])
+def test_exit_status(arguments, status):
+    """The status that a Linux parent of Wine sees is cut to 8 bits."""
+    assert run_under_wine(*arguments, **NO_OPENCL_PLATFORM).status == status
+
+
+@pytest.mark.parametrize("argument", ["foo", "-foo", "-crashAfter", "--help", "-help=1", "-help"])
+def test_usage(argument):
+    run = run_under_wine(argument)
+    assert (run.status, run.errors, run.out) == (3, USAGE, b"")
+
+
+def test_text_options_print_in_order():
+    run = run_under_wine("-stdout=a=b", "-comment=c", "-stderr=d", "-bogus")
+    assert run.lines == ["a=b", "# c"]
+    assert run.errors == ["d", *USAGE]
+
+
+def test_whole_report_with_opencl():
+    run = run_under_wine(**OPENCL_GPU)
+    facts = run.facts
+    if facts.get("NumCLGPUs") == "0":
+        pytest.skip("no OpenCL driver here presents a GPU")
+    assert run.status == 0
+    assert facts["NumCLGPUs"] == "1"
+    keys = [key.split(".", 1)[1] for key in facts if key.startswith("clgpu[0].")]
+    assert keys == ["CLPlatformVersion", "CLDeviceVersion", "IsIntegratedCLGPU", "CLMemoryMB",
+                    "CLName", "CLVendor", "CLVendorID", "CLDriverVersion", "CUDASupported",
+                    "CLBandwidth", "CLCompute"]
+    assert run.lines[-1] == 'assayEnd="STAMP"'
+
+
+def test_no_opencl_library():
+    """Wine finds no OpenCL.dll where it is overridden away: no OpenCL line at all."""
+    run = run_under_wine(WINEDLLOVERRIDES="mscoree,mshtml,opencl=")
+    assert run.status == 0
+    assert not [line for line in run.lines if "CL" in line.split("=")[0] and "CLGPU" in line]
+    assert run.lines[-1] == 'assayEnd="STAMP"'
+
+
+def test_no_opengl_library():
+    run = run_under_wine(WINEDLLOVERRIDES="mscoree,mshtml,opengl32=", **NO_OPENCL_PLATFORM)
+    assert run.status == 0
+    check(run, predict([], opencl=0, ogl=0, context=0))
+
+
+def test_no_wmi():
+    """Without the service's library the list is empty, the log says why, and the run goes on."""
+    run = run_under_wine("-verbose=1", WINEDLLOVERRIDES="mscoree,mshtml,wbemprox=",
+                         **NO_OPENCL_PLATFORM)
+    assert run.status == 0
+    text = "\n".join(run.comments)
+    assert "WMIData::GetAllDevices() exception: CoCreateInstance" in text
+    assert "wmiNumDevices=0" in text
+    assert "dxgiNumDevices=1" in text
+
+
+def test_reader_that_has_gone(whole_run):
+    """A pipe whose reader has gone costs the lines and not the run."""
+    command = (f"'{PROGRAM.parents[3]}/scripts/run-under-wine' '{PROGRAM}'; "
+               f"echo status $? >&2")
+    done = subprocess.run(["bash", "-c", f"({command}) | (exec 0<&-; sleep 1)"],
+                          stdout=subprocess.PIPE, stderr=subprocess.PIPE, check=False)
+    errors = done.stderr.decode().replace("\r\n", "\n").splitlines()
+    assert errors.count("DoStdout failed") == len(
+        [line for line in whole_run.lines if not line.startswith("#")])
+    assert "status 0" in errors
+
+
+def test_imports_system_libraries_only():
+    dump = subprocess.run(["x86_64-w64-mingw32-objdump", "-p", PROGRAM], stdout=subprocess.PIPE,
+                          check=True, text=True).stdout
+    names = {name.lower() for name in re.findall(r"DLL Name: (\S+)", dump)}
+    assert names
+    assert not names & {"opengl32.dll", "opencl.dll"}
+    assert not [name for name in names if name.startswith(("libgcc", "libstdc++", "libwinpthread"))]
+
+
+def test_runs_in_an_empty_prefix(tmp_path):
+    """Beside nothing but itself, for a user whom Wine has never seen."""
+    program = tmp_path / "assay.exe"
+    program.write_bytes(PROGRAM.read_bytes())
+    run = run_under_wine("-exit=5", program=program, WINEPREFIX=str(tmp_path / "prefix"),
+                         **NO_OPENCL_PLATFORM)
+    assert run.status == 5
+    assert run.lines[-1] == 'assayEnd="STAMP"'
