@@ -137,12 +137,12 @@ std::uint64_t PosixCalls::Write(Handle handle, const void* bytes, std::uint64_t 
     const std::size_t wanted = std::min(nbytes, kMostPerCall);
     PipeSignalBlock block;
     const ::ssize_t count = RetryInterrupted([&] { return ::write(handle, bytes, wanted); });
-    if (count < 0) {
-        const int error = errno;
-        if (error == EPIPE)
-            block.Swallow();
+    const int error = errno;
+    // A reader that goes in the middle of a write raises the signal too, and cuts the count short.
+    if (count < 0 ? error == EPIPE : static_cast<std::size_t>(count) < wanted)
+        block.Swallow();
+    if (count < 0)
         ThrowCallFailed("write", error);
-    }
     return static_cast<std::uint64_t>(count);
 }
 

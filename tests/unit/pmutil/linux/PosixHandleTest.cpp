@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <cstdlib>
 #include <dirent.h>
@@ -228,6 +229,29 @@ TEST_F(BrokenPipe, KeepsASignalThatWasPendingBefore)
     const timespec noWait{};
     EXPECT_EQ(::sigtimedwait(&pipe, nullptr, &noWait), SIGPIPE);
     ::pthread_sigmask(SIG_SETMASK, &before, nullptr);
+}
+
+TEST(PosixHandle, ReaderThatGoesInTheMiddleOfAWriteRaisesNoSignal)
+{
+    struct sigaction counting = {};
+    struct sigaction before = {};
+    counting.sa_handler = [](int) { ++gPipeSignals; };
+    ::sigaction(SIGPIPE, &counting, &before);
+    gPipeSignals = 0;
+    int readEnd = -1;
+    int writeEnd = -1;
+    Posix::MakePipe(readEnd, writeEnd);
+    PosixHandle writer(writeEnd, true);
+    std::thread leaver([readEnd] {
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        ::close(readEnd);
+    });
+    const std::string text(1 << 20, 'x');
+    EXPECT_LT(writer.WriteSome(text.data(), text.size()), text.size());
+    leaver.join();
+    EXPECT_TRUE(ThrowsRuntimeError("write failed: Broken pipe", [&] { writer.WriteSome("x", 1); }));
+    EXPECT_EQ(gPipeSignals, 0);
+    ::sigaction(SIGPIPE, &before, nullptr);
 }
 
 TEST(PosixHandle, TemporaryDirectoryFollowsTheEnvironment)
