@@ -22,6 +22,13 @@ RATIOS = [
     ("escape_benchmark", "Escape", "TableCopy", None),
     ("escape_benchmark", "EscapeCharacters", "TableCopy", None),
     ("escape_benchmark", "Unescape", "TableCopy", None),
+    ("fmt_benchmark", "FormatInt", "SnprintfInt", 1.0),
+    ("fmt_benchmark", "FormatInt", "FmtlibInt", None),
+    ("fmt_benchmark", "FormatText", "SnprintfText", 1.0),
+    ("fmt_benchmark", "FormatText", "FmtlibText", None),
+    ("channel_benchmark", "BufferRead", "MemcpyOut", 1.1),
+    ("channel_benchmark", "BufferWrite", "MemcpyIn", 1.1),
+    ("channel_benchmark", "PipeReadAll/real_time", "PipeBareReads/real_time", 1.05),
 ]
 
 # program, what is measured, what it is measured against, most nanoseconds it may take longer

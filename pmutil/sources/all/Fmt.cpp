@@ -1,6 +1,5 @@
 #include "pmutil/Fmt.h"
 
-#include <cctype>
 #include <charconv>
 #include <cstdio>
 #include <cstring>
@@ -64,6 +63,28 @@ void WriteQuotedChar(std::string& out, char value, char quote)
     out += quote;
     EscapeCharacter(out, static_cast<unsigned char>(value), static_cast<unsigned char>(quote), 1);
     out += quote;
+}
+
+// Stands for itself between double quotes in every locale: a graphic character of ASCII, or a
+// blank.
+constexpr bool IsPlain(char character)
+{
+    return character >= ' ' && character <= '~' && character != kStringQuote && character != '\\';
+}
+
+// Appends `text`, escaped for double quotes. Plain characters, which is nearly all of them, go in
+// runs.
+void AppendEscaped(std::string& out, const char* text)
+{
+    for (;;) {
+        const char* const run = text;
+        while (IsPlain(*text))
+            ++text;
+        out.append(run, static_cast<std::size_t>(text - run));
+        if (*text == '\0')
+            return;
+        EscapeCharacter(out, static_cast<unsigned char>(*text++), kStringQuote, 1);
+    }
 }
 
 // The letter that ends the first conversion of a format; 0 if it has none.
@@ -355,18 +376,15 @@ void Fmt::FormatCString(std::string& out, const char* value, const char* format)
         out = "<NULL>";
         return;
     }
-    const bool quoted = format == kQuoted;
-    std::string escaped;
-    std::string& target = quoted ? out : escaped;
-    target.clear();
-    if (quoted)
-        target += kStringQuote;
-    for (; *value != '\0'; ++value)
-        EscapeCharacter(target, static_cast<unsigned char>(*value), kStringQuote, 1);
-    if (quoted)
-        target += kStringQuote;
-    else
+    if (format == kQuoted) {
+        out = kStringQuote;
+        AppendEscaped(out, value);
+        out += kStringQuote;
+    } else {
+        std::string escaped;
+        AppendEscaped(escaped, value);
         Print(out, format, escaped.c_str());
+    }
 }
 
 void Fmt::FormatDouble(std::string& out, double value, const char* format)
