@@ -14,8 +14,8 @@ public:
     explicit ExceptionBase(std::string message) : fMessage(std::move(message)) {}
     const char* what() const noexcept override { return fMessage.c_str(); }
 
-    // What failed and why, in one line; shader logs keep their own lines. Never null here; virtual
-    // so that a derived exception may give none.
+    // What failed and why, in one line; " | " stands between the lines of a shader log. Never null;
+    // virtual so that a derived exception may give none.
     virtual const char* message() const noexcept { return fMessage.c_str(); }
 
 private:

@@ -147,15 +147,15 @@ TYPED_TEST_P(HandleChannelTest, AccessFlagsGiveTheRights)
     using Channel = typename TypeParam::Channel;
     const auto path = this->NewPath();
     this->WriteFile(path, "abc");
-    char byte = 0;
+    char data = 0;
     auto reader = Channel::OpenFile(path, pmutil::kOpenRead, pmutil::kOpenExisting, false);
-    EXPECT_EQ(reader->ReadSome(&byte, 1), 1U);
+    EXPECT_EQ(reader->ReadSome(&data, 1), 1U);
     EXPECT_TRUE(ThrowsRuntimeError(TypeParam::kWriteFailed, [&] { reader->WriteSome("x", 1); }));
     auto writer = Channel::OpenFile(path, pmutil::kOpenWrite, pmutil::kOpenExisting, false);
     EXPECT_EQ(writer->WriteSome("x", 1), 1U);
-    EXPECT_TRUE(ThrowsRuntimeError(TypeParam::kReadFailed, [&] { writer->ReadSome(&byte, 1); }));
+    EXPECT_TRUE(ThrowsRuntimeError(TypeParam::kReadFailed, [&] { writer->ReadSome(&data, 1); }));
     auto both = Channel::OpenFile(path, pmutil::kOpenReadWrite, pmutil::kOpenExisting, false);
-    EXPECT_EQ(both->ReadSome(&byte, 1), 1U);
+    EXPECT_EQ(both->ReadSome(&data, 1), 1U);
     EXPECT_EQ(both->WriteSome("x", 1), 1U);
 }
 
@@ -259,9 +259,9 @@ TYPED_TEST_P(HandleChannelTest, SeeksBeyondFourGigabytesInASparseFile)
     EXPECT_EQ(file->Tell(), 5 * kGiga + 3);
     file->SeekRelative(-static_cast<std::int64_t>(kGiga));
     EXPECT_EQ(file->Tell(), 4 * kGiga + 3);
-    char byte = 'x';
-    EXPECT_EQ(file->ReadSome(&byte, 1), 1U);
-    EXPECT_EQ(byte, '\0');
+    char data = 'x';
+    EXPECT_EQ(file->ReadSome(&data, 1), 1U);
+    EXPECT_EQ(data, '\0');
     file->Seek(5 * kGiga);
     EXPECT_EQ(this->ReadRest(*file), "end");
     file->Seek(4 * kGiga + 1);
@@ -281,9 +281,9 @@ TYPED_TEST_P(HandleChannelTest, PipeWhoseWriteEndIsClosedReadsAsEndOfData)
     writer.WriteAll("last words", 10);
     writer.Close();
     EXPECT_EQ(this->ReadRest(reader), "last words");
-    char byte = 0;
-    EXPECT_EQ(reader.ReadSome(&byte, 1), 0U);
-    EXPECT_FALSE(reader.ReadAll(&byte, 1));
+    char data = 0;
+    EXPECT_EQ(reader.ReadSome(&data, 1), 0U);
+    EXPECT_FALSE(reader.ReadAll(&data, 1));
 }
 
 TYPED_TEST_P(HandleChannelTest, WriteToAPipeWithoutReaderRaises)
@@ -309,8 +309,8 @@ TYPED_TEST_P(HandleChannelTest, CloseOfAnUnownedHandleClosesItOnce)
     Channel writer(writeEnd, false);
     writer.Close();
     EXPECT_FALSE(writer.IsOpen());
-    char byte = 0;
-    EXPECT_EQ(reader.ReadSome(&byte, 1), 0U) << "the write end is really closed";
+    char data = 0;
+    EXPECT_EQ(reader.ReadSome(&data, 1), 0U) << "the write end is really closed";
     writer.Close();
     EXPECT_TRUE(ThrowsRuntimeError("pmutil::Channel not open", [&] { writer.WriteSome("x", 1); }));
 }

@@ -85,7 +85,7 @@ TEST_F(OpenGLObjects, VertexShaderFailureGivesTheLog)
     device().vertexCompiles = false;
     device().log = "0:1: error\n0:2: error\n";
     EXPECT_EQ(FailureOf([] { Program().loadVertexShader(3, kSource, nullptr); }),
-              "The vertex shader doesn't compile: 0:1: error\n0:2: error");
+              "The vertex shader doesn't compile: 0:1: error | 0:2: error");
     EXPECT_EQ(device().objects, 0);
 }
 

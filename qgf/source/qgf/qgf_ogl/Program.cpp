@@ -14,6 +14,24 @@ constexpr char kSourceFile[] = "qgf/source/qgf/qgf_ogl/Program";
 // Beyond what a person reads, and short enough for a driver that gives a senseless length.
 constexpr std::int32_t kMaxLogLength = 64 * 1024;
 
+// A driver's log as part of a failure text: log lines and standard error take one line each.
+std::string InOneLine(const std::string& log)
+{
+    std::string line;
+    bool pending = false;
+    for (const char character : log) {
+        if (character == '\n' || character == '\r') {
+            pending = true;
+            continue;
+        }
+        if (pending)
+            line += " | ";
+        pending = false;
+        line += character;
+    }
+    return line;
+}
+
 // `getLog(size, &written, text)` is the driver's own function, which may write anything.
 template <typename GetLog>
 std::string DriverLog(std::int32_t length, GetLog getLog)
@@ -28,7 +46,7 @@ std::string DriverLog(std::int32_t length, GetLog getLog)
         const std::size_t end = log.find_last_not_of("\r\n\t ");
         log.resize(end == std::string::npos ? 0 : end + 1);
         if (!log.empty())
-            return log;
+            return InOneLine(log);
     }
     return "the driver gives no log";
 }
