@@ -98,9 +98,11 @@ TEST(DebugValuesDeathTest, TheHundredAndFirstNameGetsTheOverflowSlot)
         DebugInteger& overflow = GetDebugValue(early); // logging hasn't started
         InitLogging();
         std::vector<std::string> names;
+        names.reserve(102);
         for (int number = 0; number < 102; ++number)
             names.push_back("name" + std::to_string(number));
         std::vector<std::unique_ptr<DebugValue>> records;
+        records.reserve(names.size());
         for (const std::string& name : names)
             records.push_back(std::make_unique<DebugValue>(name.c_str(), 5));
         for (std::size_t number = 0; number < 100; ++number) {

@@ -3,7 +3,6 @@
 #include <cstdlib>
 #include <iomanip>
 #include <memory>
-#include <regex>
 #include <sstream>
 #include <stdexcept>
 
@@ -126,9 +125,13 @@ TEST_F(PMLoggingTest, LineHasPrefixMessageAndLineEnd)
     RecordingLogger logger;
     PM_LOG(gOn, "count=" << 3 << ", ok");
     ASSERT_THAT(logger.lines, SizeIs(1));
-    const std::regex form(R"(00000\.\d{4}\.\d\d\.\d\d_\d\d:\d\d:\d\d\.\d{3}\(\+00\.000\))"
-                          R"(\[tid=[^\]]+\] count=3, ok\n)");
-    EXPECT_TRUE(std::regex_match(logger.lines[0], form)) << logger.lines[0];
+    std::string form = logger.lines[0].substr(0, 43);
+    for (std::size_t at = 5; at < 29 && at < form.size(); ++at) {
+        if (form[at] >= '0' && form[at] <= '9')
+            form[at] = 'd';
+    }
+    EXPECT_EQ(form, "00000.dddd.dd.dd_dd:dd:dd.ddd(+00.000)[tid=");
+    EXPECT_EQ(MessageOf(logger.lines[0]), "count=3, ok\n");
     EXPECT_NE(logger.lines[0].find("(+00.000)[tid=" + GetCurrentThreadName() + "] "),
               std::string::npos);
 }
