@@ -135,10 +135,13 @@ def test_no_opencl_library():
     assert run.lines[-1] == 'assayEnd="STAMP"'
 
 
-def test_no_opengl_library():
-    run = run_under_wine(WINEDLLOVERRIDES="mscoree,mshtml,opengl32=", **NO_OPENCL_PLATFORM)
+def test_no_display():
+    """No window, hence no context, and no adapter drives a display: zeros, and no crash."""
+    run = run_under_wine(DISPLAY=":4711", **NO_OPENCL_PLATFORM)
     assert run.status == 0
-    check(run, predict([], opencl=0, ogl=0, context=0))
+    assert run.lines == predict([], opencl=0, context=0).lines
+    assert run.errors == ["CreateDXGIFactory", "CreateGXGIFactory failed",
+                          "ContextOffscreen exception caught and ignored."]
 
 
 def test_no_wmi():

@@ -33,9 +33,10 @@ private:
     boost::filesystem::path fPath;
 };
 
+// A text file's content, with plain newlines on every platform.
 inline std::string ReadWhole(const std::string& path)
 {
-    std::ifstream file(path, std::ios::binary);
+    std::ifstream file(path);
     std::ostringstream text;
     text << file.rdbuf();
     return text.str();
