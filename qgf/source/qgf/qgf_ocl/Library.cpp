@@ -10,7 +10,7 @@ namespace OCL {
 namespace {
 
 struct LoadedLibrary {
-    std::unique_ptr<Core::DynamicLibrary> library;
+    std::unique_ptr<Core::DynamicLibrary> loader;
     FunctionTable table;
 };
 
@@ -22,7 +22,7 @@ Core::Proc GetProcOf(void* library, const char* name)
 LoadedLibrary Load(const char* const* names)
 {
     LoadedLibrary loaded{Core::OpenLibrary(names), {}};
-    if (!FillFunctionTable(loaded.table, GetProcOf, loaded.library.get()))
+    if (!FillFunctionTable(loaded.table, GetProcOf, loaded.loader.get()))
         throw LogicalException("The OpenCL library lacks entry points of OpenCL 1.0");
     return loaded;
 }
