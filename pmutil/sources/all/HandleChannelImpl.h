@@ -6,13 +6,11 @@
 #include <stdexcept>
 #include <string>
 
+#include "all/BinioLog.h"
 #include "pmutil/Fmt.h"
 #include "pmutil/HandleChannel.h"
-#include "pmutil/PMLogging.h"
 
 namespace pmutil {
-
-inline DebugValue gBinioLog{"BINIO_LOG", 0};
 
 template <typename Platform>
 HandleChannel<Platform>::HandleChannel(Handle handle, bool owned, const Path* path)

@@ -1,0 +1,38 @@
+// Starts, awaits and kills children by posix_spawn and process descriptors.
+//
+// The child gets default signal dispositions, an empty signal mask, and no descriptor but its three
+// pipes. Its end by a signal counts as a crash, or as killed if Kill was called.
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+#include <boost/thread/mutex.hpp>
+
+#include "pmutil/Launcher.h"
+
+namespace pmutil {
+
+class LauncherPosix : public Launcher {
+public:
+    LauncherPosix();
+    ~LauncherPosix() override;
+
+    // `program` is used in UTF-8, without a search; arguments are passed byte by byte. A failed
+    // start throws with the call, the path and the system's text:
+    // "posix_spawn failed: /bin/thing: No such file or directory".
+    LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override;
+
+    // Throws std::runtime_error "waitid failed: No child processes" where the host has the system
+    // throw away how children end, as it does by ignoring SIGCHLD.
+    WaitResult Wait(int* exitCode) override;
+    void Kill() override;
+
+private:
+    class Child;
+
+    boost::shared_ptr<Child> GetChild() const;
+
+    mutable boost::mutex fMutex;
+    boost::shared_ptr<Child> fChild; // that of the latest launch
+};
+
+} // namespace pmutil

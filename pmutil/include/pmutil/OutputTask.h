@@ -1,0 +1,60 @@
+// The consumer of one output channel of a child. Clients override DoRun, which reads from
+// GetReader() until the end of the data.
+//
+// The launch looks for the task to be running before it goes on, and fails with "never started" if
+// DoRun has come and gone by then, which a child that ends at once may bring about. So a DoRun
+// waits, once it has read everything, for the application's OnRunning; but for less than the short
+// wait, since that never comes in a launch that fails, and a task that holds out longer is given
+// up.
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+
+#include "pmutil/ConsoleAppAccessor.h"
+#include "pmutil/Reader.h"
+
+namespace pmutil {
+
+class OutputTask : public ConsoleAppAccessor {
+public:
+    using Lock = boost::unique_lock<boost::mutex>;
+
+    OutputTask();
+    OutputTask(TaskID channel, boost::shared_ptr<consoleapp::ExecutionData> data,
+               boost::shared_ptr<Reader> reader);
+
+    // Throw std::runtime_error "OutputTask::AssignLocked: task is running" if `other` is.
+    OutputTask(const OutputTask& other);
+    OutputTask& operator=(const OutputTask& other);
+    ~OutputTask() override;
+
+    // Readies the task for a launch.
+    void Prepare(OutputChannel channel, boost::shared_ptr<consoleapp::ExecutionData> data,
+                 boost::shared_ptr<Reader> reader);
+
+    // DoBegin, DoRun and DoEnd in turn; closes the reader in any case.
+    void Run();
+
+    // Whether the task runs. Waits up to `maxWaitSeconds` for one that doesn't.
+    bool IsRunning(double maxWaitSeconds);
+    void SetIsRunning(bool value);
+
+protected:
+    virtual void DoBegin(Lock& lock);
+    virtual void DoRun();
+    virtual void DoEnd(Lock& lock);
+    virtual void CloseReader(Lock& lock);
+
+    // The parent's end of the pipe; empty before a launch and after it.
+    boost::shared_ptr<Reader> GetReader();
+
+    bool IsRunningLocked(Lock& lock, double maxWaitSeconds);
+
+private:
+    void AssignLocked(const OutputTask& other);
+
+    boost::shared_ptr<Reader> fReader;
+    bool fIsRunning = false;
+};
+
+} // namespace pmutil

@@ -1,0 +1,18 @@
+// The body of an output thread: runs the channel's OutputTask and stores what goes wrong.
+#pragma once
+
+#include "pmutil/ConsoleAppAccessor.h"
+
+namespace pmutil {
+
+class LaunchOutputThreadTask : public ConsoleAppAccessor {
+public:
+    LaunchOutputThreadTask(OutputChannel channel,
+                           boost::shared_ptr<consoleapp::ExecutionData> data);
+    LaunchOutputThreadTask(const LaunchOutputThreadTask& other) = default;
+    ~LaunchOutputThreadTask() override;
+
+    void operator()();
+};
+
+} // namespace pmutil

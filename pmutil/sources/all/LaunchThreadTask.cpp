@@ -1,0 +1,166 @@
+#include "all/LaunchThreadTask.h"
+
+#include <memory>
+#include <sstream>
+#include <stdexcept>
+#include <utility>
+
+#include "all/ConsoleAppLog.h"
+#include "all/LaunchOutputThreadTask.h"
+#include "pmutil/OutputTask.h"
+#include "pmutil/Threads.h"
+
+namespace pmutil {
+
+using consoleapp::Exception;
+using consoleapp::ExecutionData;
+
+namespace {
+
+constexpr OutputChannel kChannels[] = {OutputChannel::kStdout, OutputChannel::kStderr};
+
+State GetEndState(int result)
+{
+    switch (result) {
+    case kEndedNormally:
+        return State::kFinished;
+    case kEndedByCrash:
+        return State::kCrashed;
+    case kEndedByKill:
+        return State::kKilled;
+    default:
+        return State::kUndefined;
+    }
+}
+
+} // namespace
+
+LaunchThreadTask::LaunchThreadTask(boost::shared_ptr<ExecutionData> data,
+                                   boost::shared_ptr<Launcher> launcher, LaunchParams params)
+    : ConsoleAppAccessor(TaskID::kLauncher, std::move(data)),
+      fLauncher(std::move(launcher)),
+      fLaunchParams(std::move(params))
+{}
+
+LaunchThreadTask::~LaunchThreadTask() = default;
+
+void LaunchThreadTask::operator()()
+{
+    try {
+        SetCurrentThreadName(GetThreadLabel());
+        PM_LOG(gConsoleAppLog, "LaunchThreadTask::operator()()");
+        Threads threads;
+        bool mustKill = false;
+        try {
+            RunLaunch(mustKill, threads);
+        } catch (const Exception& exc) {
+            PM_LOG(gConsoleAppLog, "LaunchThreadTask inner exception=" << exc.what());
+            NotifyFailure(exc);
+        } catch (const std::exception& exc) {
+            PM_LOG(gConsoleAppLog, "LaunchThreadTask inner exception=" << exc.what());
+            NotifyFailure(Exception(fTaskID, exc.what()));
+        } catch (...) {
+            PM_LOG(gConsoleAppLog, "LaunchThreadTask inner exception=?");
+            NotifyFailure(Exception(fTaskID, "LaunchThreadTask failed"));
+        }
+        CleanupLaunchThreadTask(mustKill, threads);
+    } catch (const std::exception& exc) {
+        PM_LOG(gConsoleAppLog, "LaunchThreadTask outer exception=" << exc.what());
+    } catch (...) {
+        PM_LOG(gConsoleAppLog, "LaunchThreadTask outer exception=?");
+    }
+}
+
+// `mustKill` tells whether the child was started and not yet seen to end.
+void LaunchThreadTask::RunLaunch(bool& mustKill, Threads& threads)
+{
+    NotifyLaunching();
+    for (const OutputChannel channel : kChannels) {
+        std::ostringstream label;
+        label << channel;
+        threads[GetOutputIndex(channel)].SetName(label.str().c_str());
+    }
+    ThrowIfInjected(Fault::kLauncherLaunch, "LauncherLaunch");
+    LaunchResult result = fLauncher->Launch(fLaunchParams.fProgram, fLaunchParams.fArgs);
+    mustKill = true;
+    NotifyLaunched();
+
+    const boost::shared_ptr<ExecutionData> data = GetExecutionData();
+    for (const OutputChannel channel : kChannels) {
+        const int index = GetOutputIndex(channel);
+        StartOutputTask(channel, data, result.fAppOutput[index], threads[index]);
+    }
+    NotifyRunning(result);
+
+    // This thread keeps no end of a pipe: the child sees the end of its input when the client's
+    // writer goes, and a reader's owner decides alone when it is closed.
+    for (boost::shared_ptr<Reader>& reader : result.fAppOutput)
+        reader.reset();
+    result.fAppInput.reset();
+
+    ThrowIfInjected(Fault::kLauncherWait, "LauncherWait");
+    PM_LOG(gConsoleAppLog, "calling fLauncher->Wait");
+    int exitCode = 0;
+    const WaitResult waited = fLauncher->Wait(&exitCode);
+    mustKill = false;
+    PM_LOG(gConsoleAppLog, "fLauncher->Wait returns " << waited << " exitCode=" << exitCode);
+    NotifyFinished(exitCode, GetEndState(waited));
+}
+
+void LaunchThreadTask::StartOutputTask(OutputChannel channel,
+                                       const boost::shared_ptr<ExecutionData>& data,
+                                       const boost::shared_ptr<Reader>& reader,
+                                       ManagedThread& thread)
+{
+    PM_LOG(gConsoleAppLog,
+           "LaunchThreadTask fAppOutput[" << channel << "] use_count=" << reader.use_count());
+    const boost::shared_ptr<OutputTask> task = fLaunchParams.GetOutputTask(channel);
+    data->SetOutputTask(channel, task);
+    if (task == nullptr)
+        return;
+    task->Prepare(channel, data, reader);
+    {
+        const LaunchOutputThreadTask body(channel, data);
+        auto started = std::make_unique<boost::thread>(body);
+        thread.Assign(started.release());
+    }
+    PM_LOG(gConsoleAppLog, "LaunchThreadTask OutputThreadTask spawned, use_count["
+                               << channel << "]=" << reader.use_count());
+    if (task->IsRunning(ConsoleApp::GetShortWaitSeconds()))
+        return;
+    // A failure of the output thread says more.
+    ThrowIfFailurePending();
+    std::ostringstream text;
+    text << "LauncherTask: output task " << channel << " never started";
+    PM_LOG(gConsoleAppLog, text.str());
+    throw std::runtime_error(text.str());
+}
+
+void LaunchThreadTask::CleanupLaunchThreadTask(bool mustKill, Threads& threads)
+{
+    PM_LOG(gConsoleAppLog, "LaunchThreadTask::CleanupLaunchThreadTask mustKill=" << mustKill);
+    if (mustKill) {
+        // The child must go even if the application, and with it a fault, has gone before.
+        const boost::shared_ptr<ConsoleApp> app = GetExecutionData()->GetConsoleApp();
+        if (app != nullptr)
+            app->ThrowIfInjected(fTaskID, Fault::kLauncherKill, "LauncherKill");
+        PM_LOG(gConsoleAppLog, "CleanupLaunchThreadTask: calling fLauncher->Kill()");
+        fLauncher->Kill();
+    }
+    for (const OutputChannel channel : kChannels) {
+        ManagedThread& thread = threads[GetOutputIndex(channel)];
+        if (!thread.HoldsThread())
+            continue;
+        const double wait = ConsoleApp::GetShortWaitSeconds();
+        PM_LOG(gConsoleAppLog, "CleanupLaunchThreadTask: joining output task thread for "
+                                   << channel << " maxWait=" << wait);
+        if (thread.TimedJoin(wait))
+            continue;
+        PM_LOG(gConsoleAppLog,
+               "CleanupLaunchThreadTask: giving up waiting for output task " << channel);
+        thread.Abandon();
+        NotifyFailure(Exception(fTaskID, "output task thread abandoned"));
+    }
+}
+
+} // namespace pmutil

@@ -1,0 +1,138 @@
+#include "pmutil/OutputTask.h"
+
+#include <stdexcept>
+#include <utility>
+
+#include <boost/thread/lock_guard.hpp>
+
+#include "all/ConsoleAppLog.h"
+#include "all/WaitTime.h"
+
+namespace pmutil {
+
+using consoleapp::ExecutionData;
+
+OutputTask::OutputTask() : ConsoleAppAccessor(TaskID::kUndefined, nullptr) {}
+
+OutputTask::OutputTask(TaskID channel, boost::shared_ptr<ExecutionData> data,
+                       boost::shared_ptr<Reader> reader)
+    : ConsoleAppAccessor(channel, std::move(data)), fReader(std::move(reader))
+{}
+
+OutputTask::OutputTask(const OutputTask& other) : OutputTask()
+{
+    const boost::lock_guard<boost::mutex> lock(other.fMutex);
+    AssignLocked(other);
+}
+
+OutputTask& OutputTask::operator=(const OutputTask& other)
+{
+    if (this != &other) {
+        const OutputTask copy(other);
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        AssignLocked(copy);
+    }
+    return *this;
+}
+
+OutputTask::~OutputTask() = default;
+
+void OutputTask::AssignLocked(const OutputTask& other)
+{
+    if (other.fIsRunning)
+        throw std::runtime_error("OutputTask::AssignLocked: task is running");
+    fTaskID = other.fTaskID;
+    fExecutionData = other.fExecutionData;
+    fReader = other.fReader;
+    fIsRunning = other.fIsRunning;
+}
+
+void OutputTask::Prepare(OutputChannel channel, boost::shared_ptr<ExecutionData> data,
+                         boost::shared_ptr<Reader> reader)
+{
+    const TaskID id = pmutil::GetTaskID(channel);
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    fTaskID = id;
+    fExecutionData.swap(data);
+    fReader.swap(reader);
+}
+
+void OutputTask::Run()
+{
+    PM_LOG(gConsoleAppLog, "OutputTask::Run " << fTaskID);
+    try {
+        {
+            Lock lock(fMutex);
+            PM_LOG(gConsoleAppLog, "OutputTask::Run DoBegin");
+            DoBegin(lock);
+        }
+        SetIsRunning(true);
+        PM_LOG(gConsoleAppLog, "OutputTask::Run DoRun");
+        DoRun();
+        SetIsRunning(false);
+        PM_LOG(gConsoleAppLog, "OutputTask::Run DoEnd");
+        {
+            Lock lock(fMutex);
+            DoEnd(lock);
+        }
+        PM_LOG(gConsoleAppLog, "OutputTask::Run CloseReader");
+        Lock lock(fMutex);
+        CloseReader(lock);
+    } catch (...) {
+        SetIsRunning(false);
+        Lock lock(fMutex);
+        CloseReader(lock);
+        throw;
+    }
+}
+
+void OutputTask::DoBegin(Lock& /*lock*/) {}
+void OutputTask::DoRun() {}
+void OutputTask::DoEnd(Lock& /*lock*/) {}
+
+void OutputTask::CloseReader(Lock& /*lock*/)
+{
+    boost::shared_ptr<Reader> reader;
+    reader.swap(fReader);
+    if (reader != nullptr)
+        reader->Close();
+}
+
+boost::shared_ptr<Reader> OutputTask::GetReader()
+{
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    return fReader;
+}
+
+bool OutputTask::IsRunning(double maxWaitSeconds)
+{
+    Lock lock(fMutex);
+    return IsRunningLocked(lock, maxWaitSeconds);
+}
+
+bool OutputTask::IsRunningLocked(Lock& lock, double maxWaitSeconds)
+{
+    PM_LOG(gConsoleAppLog,
+           "OutputTask::IsRunning " << fTaskID << " maxWaitSeconds=" << maxWaitSeconds);
+    const double deadline = GetWaitClock() + maxWaitSeconds;
+    while (!fIsRunning) {
+        const double left = GetTimeLeft(deadline);
+        if (left <= 0.0)
+            break;
+        PM_LOG(gConsoleAppLog, "OutputTask::IsRunningLocked waitSeconds=" << left);
+        fCond.timed_wait(lock, ToWaitDuration(left));
+        PM_LOG(gConsoleAppLog, "timed_wait returns");
+    }
+    PM_LOG(gConsoleAppLog, "IsRunningLocked returns " << fIsRunning);
+    return fIsRunning;
+}
+
+void OutputTask::SetIsRunning(bool value)
+{
+    PM_LOG(gConsoleAppLog, "OutputTask::SetIsRunning(" << value << ")");
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    fIsRunning = value;
+    fCond.notify_all();
+}
+
+} // namespace pmutil

@@ -1,0 +1,154 @@
+#include "pmutil/LauncherWin.h"
+
+#include <windows.h>
+
+#include <stdexcept>
+#include <vector>
+
+#include <boost/make_shared.hpp>
+
+#include "all/BinioLog.h"
+#include "pmutil/WinHandle.h"
+
+namespace pmutil {
+
+namespace {
+
+// Codes from here on are no exit codes but say that, and how, a process was ended.
+constexpr DWORD kFirstCrashCode = 256;
+constexpr UINT kKilledCode = 257;
+
+[[noreturn]] void ThrowFailed(const char* call)
+{
+    throw std::runtime_error(std::string(call) + " failed");
+}
+
+// One end for the parent and one for the child, both inheritable at first.
+struct ChildPipe {
+    boost::shared_ptr<WinHandle> reader;
+    boost::shared_ptr<WinHandle> writer;
+
+    ChildPipe()
+        : reader(boost::make_shared<WinHandle>(WinCalls::GetInvalid(), false)),
+          writer(boost::make_shared<WinHandle>(WinCalls::GetInvalid(), false))
+    {
+        SECURITY_ATTRIBUTES attributes = {};
+        attributes.nLength = sizeof attributes;
+        attributes.bInheritHandle = TRUE;
+        HANDLE readEnd = nullptr;
+        HANDLE writeEnd = nullptr;
+        if (::CreatePipe(&readEnd, &writeEnd, &attributes, 0) == 0)
+            ThrowFailed("CreatePipe");
+        reader->Reset(readEnd, true);
+        writer->Reset(writeEnd, true);
+    }
+};
+
+void KeepFromChild(const WinHandle& end)
+{
+    if (::SetHandleInformation(end.GetHandle(), HANDLE_FLAG_INHERIT, 0) == 0)
+        ThrowFailed("SetHandleInformation");
+}
+
+} // namespace
+
+LauncherWin::LauncherWin() = default;
+
+// The handles of a process and its thread stay open until this process ends, so that a Kill at any
+// time finds them valid.
+LauncherWin::~LauncherWin() = default;
+
+std::wstring LauncherWin::MakeCommandLine(const std::wstring& program,
+                                          const std::deque<std::string>& args)
+{
+    std::wstring line = program;
+    for (const std::string& arg : args) {
+        const bool apostrophes =
+            arg.find('"') != std::string::npos && arg.find('\'') == std::string::npos;
+        const char quote = apostrophes ? '\'' : '"';
+        line += L' ';
+        line += static_cast<wchar_t>(quote);
+        for (const char byte : arg) {
+            if (byte == quote)
+                line += L'\\';
+            line += static_cast<wchar_t>(static_cast<signed char>(byte));
+        }
+        line += static_cast<wchar_t>(quote);
+    }
+    return line;
+}
+
+LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<std::string>& args)
+{
+    const std::wstring text = MakeCommandLine(program, args);
+    std::vector<wchar_t> commandLine(text.begin(), text.end());
+    commandLine.push_back(L'\0');
+
+    STARTUPINFOW startup = {};
+    startup.cb = sizeof startup;
+    startup.dwFlags = STARTF_USESHOWWINDOW;
+    startup.wShowWindow = SW_HIDE;
+    startup.hStdInput = ::GetStdHandle(STD_INPUT_HANDLE);
+    startup.hStdOutput = ::GetStdHandle(STD_OUTPUT_HANDLE);
+    startup.hStdError = ::GetStdHandle(STD_ERROR_HANDLE);
+    startup.dwFlags |= STARTF_USESTDHANDLES;
+
+    const ChildPipe input;
+    KeepFromChild(*input.writer);
+    startup.hStdInput = input.reader->GetHandle();
+    PM_LOG(gBinioLog, "childStdinRd=" << input.reader->GetHandle()
+                                      << " childStdinWr=" << input.writer->GetHandle());
+    const ChildPipe output;
+    KeepFromChild(*output.reader);
+    startup.hStdOutput = output.writer->GetHandle();
+    PM_LOG(gBinioLog, "childStdoutRd=" << output.reader->GetHandle()
+                                       << " childStdoutWr=" << output.writer->GetHandle());
+    const ChildPipe error;
+    KeepFromChild(*error.reader);
+    startup.hStdError = error.writer->GetHandle();
+    PM_LOG(gBinioLog, "childStderrRd=" << error.reader->GetHandle()
+                                       << " childStderrWr=" << error.writer->GetHandle());
+
+    fKilled = false;
+    fProcess = nullptr;
+    PROCESS_INFORMATION process = {};
+    if (::CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
+                         &startup, &process) == 0)
+        ThrowFailed("CreateProcessW");
+    fProcess = process.hProcess;
+
+    LaunchResult result;
+    result.fAppInput = input.writer;
+    result.fAppOutput[static_cast<int>(OutputChannel::kStdout)] = output.reader;
+    result.fAppOutput[static_cast<int>(OutputChannel::kStderr)] = error.reader;
+    return result;
+}
+
+WaitResult LauncherWin::Wait(int* exitCode)
+{
+    const HANDLE process = fProcess;
+    if (::WaitForSingleObject(process, INFINITE) == WAIT_FAILED)
+        ThrowFailed("WaitForSingleObject");
+    DWORD code = 0;
+    if (::GetExitCodeProcess(process, &code) == 0)
+        ThrowFailed("GetExitCodeProcess");
+    if (code < kFirstCrashCode) {
+        *exitCode = static_cast<int>(code);
+        return kEndedNormally;
+    }
+    return fKilled ? kEndedByKill : kEndedByCrash;
+}
+
+void LauncherWin::Kill()
+{
+    fKilled = true;
+    if (::TerminateProcess(fProcess, kKilledCode) == 0 && ::GetLastError() != ERROR_ACCESS_DENIED)
+        ThrowFailed("TerminateProcess");
+}
+
+boost::shared_ptr<Launcher> MakeLauncher()
+{
+    return boost::make_shared<LauncherWin>();
+}
+
+} // namespace pmutil

@@ -1,0 +1,95 @@
+// The child of the supervision tests: does what its arguments say, one after the other.
+//
+//   out TEXT, err TEXT     writes a line
+//   exit CODE              ends with the code
+//   sleep MILLISECONDS
+//   echo                   copies standard input to standard output until it ends
+//   flood BYTES            writes that much to standard output
+//   abort                  dies of it
+//   args ...               writes the rest of the arguments, each in hexadecimal, and ends
+//   close                  closes standard output and standard error
+//   spawn MILLISECONDS     starts a grandchild that sleeps, with this child's streams
+//   state                  writes the descriptors it has and its signal state (Linux only)
+#include <chrono>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "ChildPlatform.h"
+
+namespace {
+
+void WriteArguments(int argc, char** argv, int first)
+{
+    for (int index = first; index < argc; ++index) {
+        for (const char* at = argv[index]; *at != '\0'; ++at)
+            std::printf("%02x", static_cast<unsigned>(static_cast<unsigned char>(*at)));
+        std::printf("\n");
+    }
+}
+
+void Echo()
+{
+    std::vector<char> block(4096);
+    for (;;) {
+        const std::size_t count = ReadInput(block.data(), block.size());
+        if (count == 0)
+            return;
+        std::fwrite(block.data(), 1, count, stdout);
+        std::fflush(stdout);
+    }
+}
+
+void Flood(long long bytes)
+{
+    const std::string block(65536, 'x');
+    while (bytes > 0) {
+        const auto count = bytes < 65536 ? static_cast<std::size_t>(bytes) : block.size();
+        if (std::fwrite(block.data(), 1, count, stdout) != count)
+            std::exit(99);
+        bytes -= static_cast<long long>(count);
+    }
+    std::fflush(stdout);
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    PrepareStreams();
+    for (int index = 1; index < argc; ++index) {
+        const std::string word = argv[index];
+        const auto next = [&] { return index + 1 < argc ? argv[++index] : ""; };
+        if (word == "out") {
+            std::fprintf(stdout, "%s\n", next());
+            std::fflush(stdout);
+        } else if (word == "err") {
+            std::fprintf(stderr, "%s\n", next());
+        } else if (word == "exit") {
+            ExitNow(std::atoi(next()));
+        } else if (word == "sleep") {
+            std::this_thread::sleep_for(std::chrono::milliseconds(std::atoi(next())));
+        } else if (word == "echo") {
+            Echo();
+        } else if (word == "flood") {
+            Flood(std::atoll(next()));
+        } else if (word == "abort") {
+            CrashNow();
+        } else if (word == "close") {
+            CloseOutputs();
+        } else if (word == "spawn") {
+            SpawnSleeper(argv[0], next());
+        } else if (word == "state") {
+            WriteState();
+        } else if (word == "args") {
+            WriteArguments(argc, argv, index + 1);
+            return 0;
+        } else {
+            std::fprintf(stderr, "unknown word %s\n", word.c_str());
+            return 98;
+        }
+    }
+    return 0;
+}

@@ -1,0 +1,68 @@
+#include "ChildPlatform.h"
+
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <fcntl.h>
+#include <spawn.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+void PrepareStreams()
+{
+    const rlimit none{};
+    ::setrlimit(RLIMIT_CORE, &none);
+}
+
+std::size_t ReadInput(char* bytes, std::size_t size)
+{
+    const ssize_t count = ::read(STDIN_FILENO, bytes, size);
+    return count > 0 ? static_cast<std::size_t>(count) : 0;
+}
+
+void ExitNow(int code)
+{
+    std::fflush(stdout);
+    ::_exit(code);
+}
+
+void CrashNow()
+{
+    std::abort();
+}
+
+void CloseOutputs()
+{
+    ::close(STDOUT_FILENO);
+    ::close(STDERR_FILENO);
+}
+
+void SpawnSleeper(const char* program, const char* milliseconds)
+{
+    char sleep[] = "sleep";
+    char* const argv[] = {const_cast<char*>(program), static_cast<char*>(sleep),
+                          const_cast<char*>(milliseconds), nullptr};
+    ::posix_spawn(nullptr, program, nullptr, nullptr, argv, ::environ);
+}
+
+void WriteState()
+{
+    std::printf("descriptors");
+    for (int descriptor = 0; descriptor < 1024; ++descriptor) {
+        if (::fcntl(descriptor, F_GETFD) != -1)
+            std::printf(" %d", descriptor);
+    }
+    std::printf("\n");
+    sigset_t mask;
+    ::sigprocmask(SIG_BLOCK, nullptr, &mask);
+    int blocked = 0;
+    int changed = 0;
+    for (int number = 1; number < 32; ++number) {
+        struct sigaction action = {};
+        ::sigaction(number, nullptr, &action);
+        blocked += ::sigismember(&mask, number) == 1;
+        changed += action.sa_handler != SIG_DFL;
+    }
+    std::printf("signals blocked %d changed %d\n", blocked, changed);
+    std::fflush(stdout);
+}

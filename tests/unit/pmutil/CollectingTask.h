@@ -1,0 +1,122 @@
+// Consumers of a real child's output.
+#pragma once
+
+#include <boost/make_shared.hpp>
+#include <boost/thread/condition_variable.hpp>
+#include <boost/thread/lock_guard.hpp>
+#include <boost/thread/mutex.hpp>
+#include <string>
+
+#include "pmutil/ConsoleAppLauncher.h"
+#include "pmutil/OutputTask.h"
+
+namespace pmutil {
+
+// Lets the tasks of a launch stay until the launch is through its start.
+class StartedApp : public ConsoleApp {
+public:
+    using ConsoleApp::ConsoleApp;
+
+    // A launch that fails never gets there: this gives up a little before the launch would give up
+    // the task.
+    void AwaitStart()
+    {
+        boost::unique_lock<boost::mutex> lock(fStartMutex);
+        fStartCond.timed_wait(lock, boost::posix_time::milliseconds(800),
+                              [this] { return fStarted; });
+    }
+
+    void ForgetStart()
+    {
+        const boost::lock_guard<boost::mutex> lock(fStartMutex);
+        fStarted = false;
+    }
+
+protected:
+    void OnRunning() override
+    {
+        const boost::lock_guard<boost::mutex> lock(fStartMutex);
+        fStarted = true;
+        fStartCond.notify_all();
+    }
+
+private:
+    boost::mutex fStartMutex;
+    boost::condition_variable fStartCond;
+    bool fStarted = false;
+};
+
+// Reads everything, and doesn't return before the launch is through its start.
+class CollectingTask : public OutputTask {
+public:
+    explicit CollectingTask(boost::weak_ptr<StartedApp> app) : fApp(std::move(app)) {}
+
+    std::string Text()
+    {
+        const boost::lock_guard<boost::mutex> lock(fTextMutex);
+        return fText;
+    }
+
+    unsigned long long Count()
+    {
+        const boost::lock_guard<boost::mutex> lock(fTextMutex);
+        return fCount;
+    }
+
+protected:
+    void DoBegin(Lock& /*lock*/) override
+    {
+        const boost::lock_guard<boost::mutex> lock(fTextMutex);
+        fText.clear();
+        fCount = 0;
+    }
+
+    void DoRun() override
+    {
+        const boost::shared_ptr<Reader> reader = GetReader();
+        std::string block(65536, '\0');
+        for (auto count = reader->ReadSome(block.data(), block.size()); count > 0;
+             count = reader->ReadSome(block.data(), block.size())) {
+            const boost::lock_guard<boost::mutex> lock(fTextMutex);
+            fCount += count;
+            if (fText.size() < kMostKept)
+                fText.append(block, 0, count);
+        }
+        if (const auto app = fApp.lock())
+            app->AwaitStart();
+    }
+
+private:
+    static constexpr std::size_t kMostKept = 1 << 22;
+
+    boost::weak_ptr<StartedApp> fApp;
+    boost::mutex fTextMutex;
+    std::string fText;
+    unsigned long long fCount = 0;
+};
+
+// A launcher with an application and two collecting tasks.
+struct RealLaunch {
+    boost::shared_ptr<StartedApp> app = boost::make_shared<StartedApp>();
+    boost::shared_ptr<CollectingTask> out = boost::make_shared<CollectingTask>(app);
+    boost::shared_ptr<CollectingTask> err = boost::make_shared<CollectingTask>(app);
+    ConsoleAppLauncher launcher;
+
+    explicit RealLaunch(std::deque<std::string> args, bool keepStdin = false,
+                        std::wstring program = TEST_CHILD)
+    {
+        launcher.SetConsoleApp(app);
+        SetArgs(std::move(args), keepStdin, std::move(program));
+    }
+
+    void SetArgs(std::deque<std::string> args, bool keepStdin = false,
+                 std::wstring program = TEST_CHILD)
+    {
+        app->ForgetStart();
+        LaunchParams params(out, err, std::move(args), std::move(program));
+        params.fKeepStdin = keepStdin;
+        launcher.SetLaunchParams(params);
+    }
+};
+
+} // namespace pmutil

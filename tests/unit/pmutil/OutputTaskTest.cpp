@@ -1,0 +1,148 @@
+#include "pmutil/OutputTask.h"
+
+#include <boost/make_shared.hpp>
+#include <boost/thread/thread.hpp>
+#include <chrono>
+#include <gmock/gmock.h>
+#include <thread>
+
+#include "FakeChannel.h"
+#include "Throws.h"
+
+using namespace pmutil;
+using testing::ElementsAre;
+
+namespace {
+
+class RecordingTask : public OutputTask {
+public:
+    using OutputTask::GetReader;
+    using OutputTask::OutputTask;
+
+    std::vector<std::string> fCalls;
+    std::string fThrowIn;
+    bool fWasRunning = false;
+
+protected:
+    void DoBegin(Lock& lock) override { Record("begin", lock.owns_lock()); }
+
+    void DoRun() override
+    {
+        fWasRunning = IsRunning(0.0);
+        Record("run", false);
+    }
+
+    void DoEnd(Lock& lock) override { Record("end", lock.owns_lock()); }
+
+    void CloseReader(Lock& lock) override
+    {
+        Record("close", lock.owns_lock());
+        OutputTask::CloseReader(lock);
+    }
+
+private:
+    void Record(const std::string& name, bool locked)
+    {
+        fCalls.push_back(name + (locked ? " locked" : ""));
+        if (name == fThrowIn)
+            throw std::runtime_error(name + " failed");
+    }
+};
+
+TEST(OutputTask, RunsItsStepsInOrderWithTheRightLocks)
+{
+    const auto reader = boost::make_shared<FakeChannel>();
+    RecordingTask task(TaskID::kStdout, nullptr, reader);
+    EXPECT_FALSE(task.IsRunning(0.0));
+    task.Run();
+    EXPECT_THAT(task.fCalls, ElementsAre("begin locked", "run", "end locked", "close locked"));
+    EXPECT_TRUE(task.fWasRunning);
+    EXPECT_FALSE(task.IsRunning(0.0));
+    EXPECT_FALSE(reader->fOpen);
+    EXPECT_EQ(task.GetReader(), nullptr);
+}
+
+TEST(OutputTask, AnExceptionClosesTheReaderAndGoesOn)
+{
+    for (const char* const step : {"begin", "run", "end"}) {
+        const auto reader = boost::make_shared<FakeChannel>();
+        RecordingTask task(TaskID::kStdout, nullptr, reader);
+        task.fThrowIn = step;
+        EXPECT_TRUE(ThrowsRuntimeError(std::string(step) + " failed", [&] { task.Run(); }));
+        EXPECT_FALSE(task.IsRunning(0.0));
+        EXPECT_EQ(task.GetReader(), nullptr);
+        EXPECT_FALSE(reader->fOpen);
+        EXPECT_EQ(task.fCalls.back(), "close locked");
+    }
+}
+
+TEST(OutputTask, AClosedReaderIsNotClosedAgain)
+{
+    const auto reader = boost::make_shared<FakeChannel>();
+    reader->Close();
+    OutputTask task(TaskID::kStdout, nullptr, reader);
+    task.Run();
+    EXPECT_THAT(reader->fCalls, ElementsAre("close"));
+}
+
+TEST(OutputTask, IsRunningReturnsAsSoonAsItRuns)
+{
+    OutputTask task;
+    boost::thread starter([&] {
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        task.SetIsRunning(true);
+    });
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_TRUE(task.IsRunning(30.0));
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(20));
+    starter.join();
+    task.SetIsRunning(false);
+    EXPECT_FALSE(task.IsRunning(0.01));
+}
+
+TEST(OutputTask, CopyingARunningTaskFails)
+{
+    OutputTask task;
+    OutputTask other;
+    task.SetIsRunning(true);
+    const auto running = [](auto call) {
+        return ThrowsRuntimeError("OutputTask::AssignLocked: task is running", call);
+    };
+    EXPECT_TRUE(running([&] { const OutputTask copy(task); }));
+    EXPECT_TRUE(running([&] { other = task; }));
+    const OutputTask& same = task;
+    task = same;
+    task.SetIsRunning(false);
+    other = task;
+}
+
+TEST(OutputTask, CopiesTakeAllFields)
+{
+    const auto data = boost::make_shared<consoleapp::ExecutionData>(boost::weak_ptr<ConsoleApp>(),
+                                                                    boost::weak_ptr<OutputTask>(),
+                                                                    boost::weak_ptr<OutputTask>());
+    const auto reader = boost::make_shared<FakeChannel>();
+    const RecordingTask task(TaskID::kStderr, data, reader);
+    RecordingTask copy(task);
+    EXPECT_EQ(copy.GetTaskID(), TaskID::kStderr);
+    EXPECT_EQ(copy.GetExecutionData(), data);
+    EXPECT_EQ(copy.GetReader(), reader);
+    RecordingTask assigned;
+    assigned = copy;
+    EXPECT_EQ(assigned.GetTaskID(), TaskID::kStderr);
+    EXPECT_EQ(assigned.GetReader(), reader);
+}
+
+TEST(OutputTask, PrepareReadiesItForAnotherRun)
+{
+    RecordingTask task;
+    task.Run();
+    const auto reader = boost::make_shared<FakeChannel>();
+    task.Prepare(OutputChannel::kStderr, nullptr, reader);
+    EXPECT_EQ(task.GetTaskID(), TaskID::kStderr);
+    EXPECT_EQ(task.GetReader(), reader);
+    task.Run();
+    EXPECT_FALSE(reader->fOpen);
+}
+
+} // namespace

@@ -1,0 +1,372 @@
+#include "pmutil/LauncherPosix.h"
+
+#include <chrono>
+#include <csignal>
+#include <cstdio>
+#include <dirent.h>
+#include <fcntl.h>
+#include <fstream>
+#include <gmock/gmock.h>
+#include <memory>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <thread>
+#include <unistd.h>
+
+#include "../CollectingTask.h"
+#include "../Throws.h"
+#include "pmutil/PosixHandle.h"
+
+using namespace pmutil;
+
+namespace {
+
+constexpr double kLong = 60.0;
+
+int CountDescriptors()
+{
+    int count = 0;
+    DIR* const directory = ::opendir("/proc/self/fd");
+    while (::readdir(directory) != nullptr)
+        ++count;
+    ::closedir(directory);
+    return count;
+}
+
+// True if this process has a child at all, running or not.
+bool HasChildren()
+{
+    siginfo_t info = {};
+    return ::waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT) == 0;
+}
+
+std::string ReadRest(Reader& reader)
+{
+    std::string all;
+    char block[4096];
+    for (auto count = reader.ReadSome(block, sizeof block); count > 0;
+         count = reader.ReadSome(block, sizeof block))
+        all.append(block, count);
+    return all;
+}
+
+std::string Hex(const std::string& text)
+{
+    std::string hex;
+    for (const char byte : text) {
+        char digits[3];
+        std::snprintf(digits, sizeof digits, "%02x",
+                      static_cast<unsigned>(static_cast<unsigned char>(byte)));
+        hex += digits;
+    }
+    return hex;
+}
+
+struct Outcome {
+    WaitResult result = kEndedNormally;
+    int exitCode = -1;
+    std::string out;
+};
+
+Outcome RunChild(const std::deque<std::string>& args)
+{
+    LauncherPosix launcher;
+    Outcome run;
+    LaunchResult ends = launcher.Launch(TEST_CHILD, args);
+    ends.fAppInput.reset();
+    run.out = ReadRest(*ends.fAppOutput[1]);
+    run.result = launcher.Wait(&run.exitCode);
+    return run;
+}
+
+TEST(LauncherPosix, ArgumentsArriveByteByByte)
+{
+    std::string every;
+    for (int code = 1; code < 256; ++code)
+        every += static_cast<char>(code);
+    const std::deque<std::string> args{every, "", " ", "\"", "'", "\\"};
+    std::deque<std::string> all = args;
+    all.emplace_front("args");
+    std::string expected;
+    for (const std::string& arg : args)
+        expected += Hex(arg) + "\n";
+    EXPECT_EQ(RunChild(all).out, expected);
+}
+
+TEST(LauncherPosix, AnArgumentAboveTheSystemsLimitFailsTheStart)
+{
+    // One argument may have 32 pages with its zero byte.
+    const std::string fits(131'071, 'x');
+    EXPECT_EQ(RunChild({"args", fits}).out.size(), 2 * fits.size() + 1);
+    LauncherPosix launcher;
+    try {
+        launcher.Launch(TEST_CHILD, {"args", std::string(1'000'000, 'x')});
+        FAIL() << "started";
+    } catch (const std::runtime_error& error) {
+        EXPECT_THAT(error.what(), testing::StartsWith("posix_spawn failed: "));
+        EXPECT_THAT(error.what(), testing::EndsWith(": Argument list too long"));
+    }
+    EXPECT_FALSE(HasChildren());
+}
+
+TEST(LauncherPosix, ManyArgumentsArrive)
+{
+    const std::deque<std::string> args(1000, std::string(1000, 'y'));
+    std::deque<std::string> all = args;
+    all.emplace_front("args");
+    EXPECT_EQ(RunChild(all).out.size(), 1000U * 2001);
+}
+
+TEST(LauncherPosix, ArgumentWithAZeroByteFailsTheStart)
+{
+    LauncherPosix launcher;
+    EXPECT_TRUE(ThrowsRuntimeError("posix_spawn failed: Invalid argument",
+                                   [&] { launcher.Launch(TEST_CHILD, {std::string("a\0b", 3)}); }));
+}
+
+TEST(LauncherPosix, FailedStartsTellCallPathAndText)
+{
+    const int before = CountDescriptors();
+    char script[] = "/tmp/pmutil_notexecXXXXXX";
+    const PosixHandle file(::mkostemp(script, O_CLOEXEC), true);
+    char foreign[] = "/tmp/pmutil_foreignXXXXXX";
+    {
+        PosixHandle binary(::mkostemp(foreign, O_CLOEXEC), true);
+        binary.WriteAll("\x7F"
+                        "ELF\x02\x02\x01",
+                        7);
+        ::fchmod(binary.GetHandle(), 0700);
+    }
+    const struct {
+        std::string path;
+        const char* text;
+    } kRows[] = {
+        {"/nonexistent/program", "No such file or directory"},
+        {"/tmp", "Permission denied"},
+        {script, "Permission denied"},
+        {foreign, "Exec format error"},
+        {"/dev/null/x", "Not a directory"},
+    };
+    for (const auto& row : kRows) {
+        LauncherPosix launcher;
+        EXPECT_TRUE(ThrowsRuntimeError("posix_spawn failed: " + row.path + ": " + row.text, [&] {
+            launcher.Launch(std::wstring(row.path.begin(), row.path.end()), {});
+        }));
+        EXPECT_FALSE(HasChildren()) << "a zombie is left";
+    }
+    ::unlink(script);
+    ::unlink(foreign);
+    EXPECT_EQ(CountDescriptors(), before + 1);
+}
+
+TEST(LauncherPosix, PathIsPassedInUTF8)
+{
+    LauncherPosix launcher;
+    EXPECT_TRUE(ThrowsRuntimeError(
+        "posix_spawn failed: /nonexistent/\xC3\xBC\xE2\x82\xAC: No such file or directory",
+        [&] { launcher.Launch(L"/nonexistent/\u00FC\u20AC", {}); }));
+    EXPECT_TRUE(ThrowsRuntimeError(
+        "posix_spawn failed: Invalid or incomplete multibyte or wide character",
+        [&] { launcher.Launch(std::wstring(1, static_cast<wchar_t>(0xD800)), {}); }));
+}
+
+TEST(LauncherPosix, EndsAreMapped)
+{
+    EXPECT_EQ(RunChild({"exit", "255"}).exitCode, 255);
+    const Outcome crash = RunChild({"abort"});
+    EXPECT_EQ(crash.result, kEndedByCrash);
+    EXPECT_EQ(crash.exitCode, -1) << "left alone";
+}
+
+TEST(LauncherPosix, KillBeforeDuringAndAfter)
+{
+    LauncherPosix launcher;
+    launcher.Kill();
+    int exitCode = -1;
+    {
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "60000"});
+        boost::thread killer([&] {
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+            launcher.Kill();
+            launcher.Kill();
+        });
+        EXPECT_EQ(launcher.Wait(&exitCode), kEndedByKill);
+        killer.join();
+    }
+    EXPECT_EQ(exitCode, -1);
+    launcher.Kill();
+    {
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "60000"});
+        launcher.Kill();
+        EXPECT_FALSE(HasChildren()) << "a killed child that nobody waits for is seen off at once";
+        EXPECT_EQ(launcher.Wait(&exitCode), kEndedByKill);
+    }
+    const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", "4"});
+    EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally) << "the kill is forgotten";
+    EXPECT_EQ(exitCode, 4);
+}
+
+TEST(LauncherPosix, WaitWithoutALaunchFails)
+{
+    LauncherPosix launcher;
+    int exitCode = -1;
+    EXPECT_TRUE(
+        ThrowsRuntimeError("waitid failed: No child processes", [&] { launcher.Wait(&exitCode); }));
+}
+
+TEST(LauncherPosix, ChildHasItsStreamsAndNoOtherDescriptor)
+{
+    // Neither one that the host forgot to protect.
+    const PosixHandle forgotten(::open("/dev/null", O_RDONLY), true); // NOLINT: no O_CLOEXEC
+    EXPECT_THAT(RunChild({"state"}).out, testing::HasSubstr("descriptors 0 1 2\n"));
+}
+
+TEST(LauncherPosix, ChildHasDefaultSignals)
+{
+    struct sigaction ignore = {};
+    struct sigaction before = {};
+    ignore.sa_handler = SIG_IGN;
+    ::sigaction(SIGPIPE, &ignore, &before);
+    sigset_t some;
+    sigset_t oldMask;
+    ::sigemptyset(&some);
+    ::sigaddset(&some, SIGTERM);
+    ::pthread_sigmask(SIG_BLOCK, &some, &oldMask);
+    const std::string out = RunChild({"state"}).out;
+    ::pthread_sigmask(SIG_SETMASK, &oldMask, nullptr);
+    ::sigaction(SIGPIPE, &before, nullptr);
+    EXPECT_THAT(out, testing::HasSubstr("signals blocked 0 changed 0\n"));
+}
+
+TEST(LauncherPosix, HostWithoutStandardStreamsCanLaunch)
+{
+    const int input = ::fcntl(0, F_DUPFD_CLOEXEC, 10);
+    ::close(0);
+    const Outcome run = RunChild({"out", "fine", "exit", "3"});
+    if (input >= 0) {
+        ::dup2(input, 0);
+        ::close(input);
+    }
+    EXPECT_EQ(run.out, "fine\n");
+    EXPECT_EQ(run.exitCode, 3);
+}
+
+TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
+{
+    rlimit before = {};
+    ::getrlimit(RLIMIT_NOFILE, &before);
+    const int used = CountDescriptors();
+    int failures = 0;
+    for (int room = 0; room < 8; ++room) {
+        // Fills the table up to `room` free places.
+        rlimit narrow = before;
+        narrow.rlim_cur = 256;
+        ::setrlimit(RLIMIT_NOFILE, &narrow);
+        std::vector<std::unique_ptr<PosixHandle>> fill;
+        for (int fd = ::open("/dev/null", O_RDONLY | O_CLOEXEC); fd >= 0;
+             fd = ::open("/dev/null", O_RDONLY | O_CLOEXEC))
+            fill.push_back(std::make_unique<PosixHandle>(fd, true));
+        fill.resize(fill.size() - static_cast<std::size_t>(room));
+        try {
+            LauncherPosix launcher;
+            const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", "0"});
+            int exitCode = -1;
+            EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally);
+        } catch (const std::runtime_error& error) {
+            ++failures;
+            EXPECT_THAT(error.what(), testing::EndsWith(": Too many open files"));
+        }
+        fill.clear();
+        ::setrlimit(RLIMIT_NOFILE, &before);
+        EXPECT_EQ(CountDescriptors(), used) << "with room for " << room;
+        EXPECT_FALSE(HasChildren());
+    }
+    EXPECT_GE(failures, 6) << "three pipes need six places";
+}
+
+TEST(LauncherPosix, HostThatIgnoresChildrenGetsAClearFailure)
+{
+    struct sigaction ignore = {};
+    struct sigaction before = {};
+    ignore.sa_handler = SIG_IGN;
+    ::sigaction(SIGCHLD, &ignore, &before);
+    std::string text;
+    int exitCode = -1;
+    try {
+        LauncherPosix launcher;
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "50", "exit", "3"});
+        launcher.Wait(&exitCode);
+    } catch (const std::runtime_error& error) {
+        text = error.what();
+    }
+    ::sigaction(SIGCHLD, &before, nullptr);
+    EXPECT_EQ(text, "waitid failed: No child processes");
+    EXPECT_EQ(exitCode, -1);
+}
+
+TEST(LauncherPosix, OrphanIsSeenOffLater)
+{
+    {
+        LauncherPosix launcher;
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "100"});
+    }
+    EXPECT_TRUE(HasChildren());
+    std::this_thread::sleep_for(std::chrono::milliseconds(1000));
+    RunChild({"exit", "0"});
+    EXPECT_FALSE(HasChildren());
+}
+
+TEST(LauncherPosix, BrokenInputPipeDoesNotKillTheHost)
+{
+    LauncherPosix launcher;
+    const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", "0"});
+    int exitCode = -1;
+    launcher.Wait(&exitCode);
+    EXPECT_TRUE(
+        ThrowsRuntimeError("write failed: Broken pipe", [&] { ends.fAppInput->WriteAll("x", 1); }));
+}
+
+TEST(LaunchStorm, LeavesNoDescriptorZombieThreadOrEntry)
+{
+    const int launches = std::getenv("ASSAY_LONG_TESTS") != nullptr ? 10'000 : 300;
+    const int descriptors = CountDescriptors();
+    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
+    {
+        RealLaunch launch({});
+        for (int round = 0; round < launches; ++round) {
+            launch.SetArgs({"exit", std::to_string(round % 256)});
+            int exitCode = -1;
+            ASSERT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
+            ASSERT_EQ(exitCode, round % 256);
+        }
+    }
+    EXPECT_EQ(CountDescriptors(), descriptors);
+    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads);
+    EXPECT_FALSE(HasChildren());
+}
+
+TEST(LaunchStorm, KillsRacingNaturalEnds)
+{
+    const int descriptors = CountDescriptors();
+    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
+    {
+        RealLaunch launch({});
+        for (int round = 0; round < 200; ++round) {
+            launch.SetArgs({"sleep", "2"});
+            launch.launcher.Launch();
+            boost::thread killer([&, round] {
+                std::this_thread::sleep_for(std::chrono::microseconds(50 * (round % 80)));
+                launch.app->Kill();
+            });
+            const State end = launch.launcher.Wait(nullptr, kLong);
+            killer.join();
+            ASSERT_TRUE(end == State::kFinished || end == State::kKilled) << end;
+        }
+    }
+    EXPECT_EQ(CountDescriptors(), descriptors);
+    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads);
+    EXPECT_FALSE(HasChildren());
+}
+
+} // namespace
