@@ -1,0 +1,34 @@
+// The JSON form of a run: one stable document, and the events of the JSON Lines form.
+//
+// A JSON text is Unicode and a driver's bytes need not be. Bytes that aren't part of well-formed
+// UTF-8 become U+DC80 to U+DCFF's stand-in, told in docs/assay-host.md; the way back is exact.
+#pragma once
+
+#include <string>
+
+#include <nlohmann/json_fwd.hpp>
+
+#include "report/Report.h"
+#include "report/RunOutcome.h"
+
+namespace assay_host {
+
+// Raised when the document's form changes in a way that a reader must know of.
+constexpr int kSchemaVersion = 1;
+
+nlohmann::ordered_json MakeDocument(const Report& report, const RunOutcome& outcome);
+
+// Events; each has "event" and "seconds" (since the launch).
+nlohmann::ordered_json MakeStartEvent(const std::vector<std::string>& command);
+nlohmann::ordered_json MakeLineEvent(const ReportLine& line, double seconds);
+nlohmann::ordered_json MakeErrorLineEvent(const std::string& line, double seconds);
+nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome);
+
+// The report back from its document. Throws std::runtime_error with what is wrong with the document.
+Report ReadDocument(const nlohmann::ordered_json& document);
+
+// Any bytes as a valid JSON string, and back.
+std::string EncodeBytes(const std::string& bytes);
+std::string DecodeBytes(const std::string& text);
+
+} // namespace assay_host
