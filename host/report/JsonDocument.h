@@ -1,7 +1,8 @@
 // The JSON form of a run: one stable document, and the events of the JSON Lines form.
 //
 // A JSON text is Unicode and a driver's bytes need not be. Bytes that aren't part of well-formed
-// UTF-8 become U+DC80 to U+DCFF's stand-in, told in docs/assay-host.md; the way back is exact.
+// UTF-8 stand as U+F780 to U+F7FF, a private range: 0xF700 plus the byte. A real character of that
+// range is written the same way, byte by byte, so the way back is exact.
 #pragma once
 
 #include <string>
