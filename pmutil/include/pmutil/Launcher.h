@@ -47,4 +47,9 @@ public:
 // The launcher of this platform.
 boost::shared_ptr<Launcher> MakeLauncher();
 
+// What ended the latest child of this platform's launcher, if it was no exit code of 0 to 255:
+// "signal 11 (Segmentation fault)" or "code 0xC0000005". Empty before the end was waited for, and
+// for any other launcher. Any thread may ask.
+std::string GetTerminationText(const Launcher& launcher);
+
 } // namespace pmutil

@@ -26,6 +26,10 @@ public:
     WaitResult Wait(int* exitCode) override;
     void Kill() override;
 
+    // The number of the signal that ended the latest child; 0 if none did, or the child wasn't
+    // waited for yet.
+    int GetTermSignal() const;
+
 private:
     class Child;
 

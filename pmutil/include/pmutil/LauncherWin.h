@@ -9,6 +9,7 @@
 #pragma once
 
 #include <atomic>
+#include <cstdint>
 
 #include "pmutil/Launcher.h"
 
@@ -24,6 +25,9 @@ public:
     WaitResult Wait(int* exitCode) override;
     void Kill() override;
 
+    // The code with which the latest child ended, whatever it says; 0 before it was waited for.
+    std::uint32_t GetRawExitCode() const { return fRawExitCode; }
+
     // The command line that Launch makes.
     static std::wstring MakeCommandLine(const std::wstring& program,
                                         const std::deque<std::string>& args);
@@ -31,6 +35,7 @@ public:
 private:
     std::atomic<bool> fKilled{false};
     std::atomic<void*> fProcess{nullptr};
+    std::atomic<std::uint32_t> fRawExitCode{0};
 };
 
 } // namespace pmutil

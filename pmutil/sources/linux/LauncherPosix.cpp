@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <csignal>
+#include <cstring>
 #include <fcntl.h>
 #include <poll.h>
 #include <spawn.h>
@@ -260,6 +261,12 @@ public:
             ReapLocked();
     }
 
+    int GetTermSignal()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        return fEnd.si_code == CLD_KILLED || fEnd.si_code == CLD_DUMPED ? fEnd.si_status : 0;
+    }
+
 private:
     // The one place where the process is taken off the system's list. It has ended.
     void ReapLocked()
@@ -353,9 +360,27 @@ void LauncherPosix::Kill()
         child->Kill();
 }
 
+int LauncherPosix::GetTermSignal() const
+{
+    const boost::shared_ptr<Child> child = GetChild();
+    return child != nullptr ? child->GetTermSignal() : 0;
+}
+
 boost::shared_ptr<Launcher> MakeLauncher()
 {
     return boost::make_shared<LauncherPosix>();
+}
+
+std::string GetTerminationText(const Launcher& launcher)
+{
+    const auto* const own = dynamic_cast<const LauncherPosix*>(&launcher);
+    const int number = own != nullptr ? own->GetTermSignal() : 0;
+    if (number == 0)
+        return {};
+    std::string text = "signal " + std::to_string(number);
+    if (const char* const description = ::sigdescr_np(number))
+        text += " (" + std::string(description) + ")";
+    return text;
 }
 
 } // namespace pmutil

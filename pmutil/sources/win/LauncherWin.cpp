@@ -2,6 +2,8 @@
 
 #include <windows.h>
 
+#include <iomanip>
+#include <sstream>
 #include <stdexcept>
 #include <vector>
 
@@ -111,6 +113,7 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
 
     fKilled = false;
     fProcess = nullptr;
+    fRawExitCode = 0;
     PROCESS_INFORMATION process = {};
     if (::CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
                          &startup, &process) == 0)
@@ -132,6 +135,7 @@ WaitResult LauncherWin::Wait(int* exitCode)
     DWORD code = 0;
     if (::GetExitCodeProcess(process, &code) == 0)
         ThrowFailed("GetExitCodeProcess");
+    fRawExitCode = code;
     if (code < kFirstCrashCode) {
         *exitCode = static_cast<int>(code);
         return kEndedNormally;
@@ -149,6 +153,17 @@ void LauncherWin::Kill()
 boost::shared_ptr<Launcher> MakeLauncher()
 {
     return boost::make_shared<LauncherWin>();
+}
+
+std::string GetTerminationText(const Launcher& launcher)
+{
+    const auto* const own = dynamic_cast<const LauncherWin*>(&launcher);
+    if (own == nullptr || own->GetRawExitCode() < kFirstCrashCode)
+        return {};
+    std::ostringstream text;
+    text << "code 0x" << std::hex << std::uppercase << std::setw(8) << std::setfill('0')
+         << own->GetRawExitCode();
+    return text.str();
 }
 
 } // namespace pmutil

@@ -207,6 +207,30 @@ TEST(LauncherPosix, KillBeforeDuringAndAfter)
     EXPECT_EQ(exitCode, 4);
 }
 
+TEST(LauncherPosix, TellsWhichSignalEndedTheChild)
+{
+    LauncherPosix launcher;
+    EXPECT_EQ(launcher.GetTermSignal(), 0) << "no child yet";
+    int exitCode = -1;
+    {
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"abort"});
+        launcher.Wait(&exitCode);
+        EXPECT_EQ(launcher.GetTermSignal(), SIGABRT);
+        EXPECT_EQ(GetTerminationText(launcher), "signal 6 (Aborted)");
+    }
+    {
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "60000"});
+        EXPECT_EQ(GetTerminationText(launcher), "") << "that of the child before is forgotten";
+        launcher.Kill();
+        launcher.Wait(&exitCode);
+        EXPECT_EQ(GetTerminationText(launcher), "signal 9 (Killed)");
+    }
+    const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", "6"});
+    launcher.Wait(&exitCode);
+    EXPECT_EQ(launcher.GetTermSignal(), 0) << "a code is no signal";
+    EXPECT_EQ(GetTerminationText(launcher), "");
+}
+
 TEST(LauncherPosix, WaitWithoutALaunchFails)
 {
     LauncherPosix launcher;

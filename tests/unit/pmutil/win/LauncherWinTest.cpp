@@ -47,6 +47,28 @@ TEST(LauncherWin, CodesFrom256OnAreCrashes)
     }
 }
 
+TEST(LauncherWin, TellsTheRawExitCode)
+{
+    const struct {
+        const char* code;
+        std::uint32_t raw;
+        const char* text;
+    } kRows[] = {
+        {"255", 255, ""},
+        {"256", 256, "code 0x00000100"},
+        {"-1073741819", 0xC0000005, "code 0xC0000005"},
+    };
+    LauncherWin launcher;
+    EXPECT_EQ(launcher.GetRawExitCode(), 0U) << "no child yet";
+    for (const auto& row : kRows) {
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", row.code});
+        int exitCode = -1;
+        launcher.Wait(&exitCode);
+        EXPECT_EQ(launcher.GetRawExitCode(), row.raw);
+        EXPECT_EQ(GetTerminationText(launcher), row.text);
+    }
+}
+
 TEST(LauncherWin, KilledChildLeavesTheCodeAlone)
 {
     LauncherWin launcher;
