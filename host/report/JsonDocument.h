@@ -25,7 +25,8 @@ nlohmann::ordered_json MakeLineEvent(const ReportLine& line, double seconds);
 nlohmann::ordered_json MakeErrorLineEvent(const std::string& line, double seconds);
 nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome);
 
-// The report back from its document. Throws std::runtime_error with what is wrong with the document.
+// The report back from its document. Throws std::runtime_error with what is wrong with the
+// document.
 Report ReadDocument(const nlohmann::ordered_json& document);
 
 // Any bytes as a valid JSON string, and back.

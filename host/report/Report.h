@@ -2,9 +2,9 @@
 // lines as they come, whole or not.
 #pragma once
 
-#include <map>
-#include <optional>
+#include <cstddef>
 #include <string>
+#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -39,9 +39,20 @@ public:
     std::string ToText() const;
 
 private:
+    // Where the value of a key stands: its line, and for a device's key its device and its place
+    // in the device's list.
+    struct Place {
+        std::size_t fLine;
+        std::size_t fDevice;
+        std::size_t fKey;
+    };
+
+    void AddDeviceKey(const std::string& tag, const std::string& key, std::size_t line);
+
     std::vector<ReportLine> fLines;
     std::vector<Device> fDevices;
-    std::map<std::string, std::size_t> fKeys;
+    std::unordered_map<std::string, Place> fPlaces;     // of whole keys, tag and all
+    std::unordered_map<std::string, std::size_t> fTags; // index in fDevices
 };
 
 } // namespace assay_host

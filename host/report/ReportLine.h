@@ -21,8 +21,11 @@ struct ReportLine {
     // How the line ended: "\n", "\r\n", or nothing where the report broke off.
     std::string fLineEnd;
 
+    // Bytes behind fText were lost to the reader's limits.
+    bool fCut = false;
+
     // Of a kValue line: what stands before the first '=', and what stands behind it. A quoted value
-    // is without its two quotes.
+    // is without its two quotes, or without its first one if the line is cut.
     std::string fKey;
     std::string fValue;
     bool fQuoted = false;

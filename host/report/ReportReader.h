@@ -1,9 +1,10 @@
 // Takes a report apart while it arrives. Any bytes may come, in pieces of any size: nothing throws,
 // each byte is looked at a bounded number of times, and no more than the limits is held.
 //
-// A quoted value that isn't closed on its line goes on behind the line end, up to the line that ends
-// with a quote; unless a line in between begins like one of the report's own, in which case the open
-// line stands alone, raw.
+// A quoted value that isn't closed on its line goes on behind the line end, up to the line that
+// ends with a quote; unless a line in between begins like one of the report's own, the value grows
+// longer than a line may be, or the data ends: then each of those lines stands alone, the open one
+// raw.
 #pragma once
 
 #include <cstddef>
@@ -23,6 +24,8 @@ public:
         std::size_t fMaxLineBytes = std::size_t{1} << 16;
         // What comes behind so many bytes is lost and counted.
         std::uint64_t fMaxBytes = std::uint64_t{16} << 20;
+        // What comes behind so many lines is lost and counted: each costs memory, however short.
+        std::size_t fMaxLines = std::size_t{1} << 16;
     };
 
     ReportReader() = default;
@@ -39,10 +42,32 @@ public:
     std::uint64_t GetLostByteCount() const { return fLost; }
 
 private:
+    using Lines = std::vector<ReportLine>;
+
+    void Append(std::string_view piece);
+    void Hold(std::string_view piece);
+    void EndLine(const std::string& lineEnd, Lines& lines);
+    void ReleaseOpenQuote(Lines& lines);
+
+    // A line of an open quote.
+    struct OpenLine {
+        std::string fText;
+        std::string fLineEnd;
+    };
+
     Limits fLimits;
     std::uint64_t fBytes = 0;
     std::uint64_t fLost = 0;
-    std::string fOpen;
+    std::size_t fLineCount = 0;
+
+    // The line under way. A carriage return is held apart until it is known what follows it.
+    std::string fText;
+    bool fCarriageReturn = false;
+    bool fCut = false;
+
+    // The lines since a quote was opened.
+    std::vector<OpenLine> fQuote;
+    std::size_t fQuoteBytes = 0;
 };
 
 } // namespace assay_host

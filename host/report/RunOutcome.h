@@ -26,18 +26,18 @@ int GetVerdictStatus(Verdict verdict);
 
 struct RunOutcome {
     Verdict fVerdict = Verdict::kNeverStarted;
-    std::vector<std::string> fCommand;      // the child's path and its options
-    std::optional<int> fExitStatus;         // where the child ended by itself
-    std::string fTermination;               // of a crash: "signal 11 (Segmentation fault)", "code 0xC0000005"
-    std::string fReason;                    // one sentence for people
-    double fSeconds = 0;                    // from the launch to the end
-    double fTimeoutSeconds = 0;             // what was allowed; 0 without a limit
-    std::string fLastReportLine;            // as it came; empty without one
-    std::string fLastLogLine;               // as it came, if it is behind the last report line
-    std::vector<std::string> fErrorLines;   // standard error, as it came, without line ends
-    std::uint64_t fLostOutputBytes = 0;     // cut from a flood
+    std::vector<std::string> fCommand; // the child's path and its options
+    std::optional<int> fExitStatus;    // where the child ended by itself
+    std::string fTermination;    // of a crash: "signal 11 (Segmentation fault)", "code 0xC0000005"
+    std::string fReason;         // one sentence for people
+    double fSeconds = 0;         // from the launch to the end
+    double fTimeoutSeconds = 0;  // what was allowed; 0 without a limit
+    std::string fLastReportLine; // as it came; empty without one
+    std::string fLastLogLine;    // as it came, if it is behind the last report line
+    std::vector<std::string> fErrorLines; // standard error, as it came, without line ends
+    std::uint64_t fLostOutputBytes = 0;   // cut from a flood
     std::uint64_t fLostErrorBytes = 0;
-    bool fLeftBehind = false;               // a process that couldn't be ended may be left
+    bool fLeftBehind = false; // a process that couldn't be ended may be left
 };
 
 } // namespace assay_host

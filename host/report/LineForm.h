@@ -1,0 +1,26 @@
+// The forms that a line of a report has.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "report/ReportLine.h"
+
+namespace assay_host {
+
+// The line that these bytes are when they stand alone. `cut`: bytes were lost at its end, so that a
+// quote may lack its partner.
+ReportLine ReadLine(std::string text, std::string lineEnd, bool cut);
+
+// Whether the line is key=value with a quote that isn't closed.
+bool LeavesQuoteOpen(std::string_view text);
+
+// Whether the line can't be the inside of a quoted value, because it begins as lines of the report
+// do: a comment, a tagged key, a code of a constant, or one of the report's own keys.
+bool BeginsLikeReportLine(std::string_view text);
+
+// "glgpu[0]" of "glgpu[0].GLName"; nothing of a key without a device's tag.
+std::optional<std::string_view> GetDeviceTag(std::string_view key);
+
+} // namespace assay_host
