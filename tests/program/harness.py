@@ -21,11 +21,13 @@ SCRIPTED_EGL = BUILD / "drivers" / "egl"
 
 SECONDS = 60
 
+# The sanitizers that the build is under, as ASSAY_SANITIZE named them; "" without.
+SANITIZED_BY = os.environ.get("ASSAY_SANITIZE", "")
 # A sanitizer must leave a crash a crash: its signal is what a host sees.
+CRASHES = "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0:handle_sigfpe=0"
 SANITIZERS = {
-    "ASAN_OPTIONS": "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0",
-    "TSAN_OPTIONS": "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0:"
-                    "report_signal_unsafe=0",
+    "ASAN_OPTIONS": CRASHES,
+    "TSAN_OPTIONS": f"{CRASHES}:report_signal_unsafe=0",
     "UBSAN_OPTIONS": "print_stacktrace=1",
 }
 
