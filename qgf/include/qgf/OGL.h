@@ -153,7 +153,8 @@ enum class Type : std::int32_t { Default = -1 };
 class Texture2D {
 public:
     // `data` may be null: the content is undefined then. `mipmaps` asks for a full set of levels.
-    // Leaves no texture bound.
+    // Leaves no texture bound. Doesn't ask for OpenGL's errors: that is for whoever uses the
+    // texture, once it has been used.
     Texture2D(InternalFormat format, std::int32_t width, std::int32_t height, bool mipmaps,
               const void* data, Type type);
     ~Texture2D();

@@ -486,6 +486,20 @@ TEST_F(GPUImplHardwareTest, AnIncompleteFramebufferAnswersFalse)
     EXPECT_EQ(Device().objects, 0);
 }
 
+TEST_F(GPUImplHardwareTest, ATextureThatTheDriverRefusesAnswersFalseAndLeavesNoErrorBehind)
+{
+    Device().onCall["glTexImage2D"] = [this] {
+        Device().errors = {0x505};
+        Device().framebufferStatus = 0x8CD6;
+    };
+    EXPECT_FALSE(fImpl.GLFramebufferOK());
+    EXPECT_EQ(fGL.callsOf("glGetError").size(), 1U);
+    EXPECT_THAT(fLog.Lines(), ElementsAre("DoGLFramebufferOK: The framebuffer is not complete: "
+                                          "GL_FRAMEBUFFER_INCOMPLETE_ATTACHMENT, after OpenGL "
+                                          "error 0x0505"));
+    EXPECT_NO_THROW(fImpl.GLGetString(kGLVendor));
+}
+
 TEST_F(GPUImplHardwareTest, AFailingTextureAnswersFalse)
 {
     Device().makesObjects = false;

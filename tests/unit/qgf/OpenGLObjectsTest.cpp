@@ -249,6 +249,23 @@ TEST_F(OpenGLObjects, IncompleteFramebufferIsNamed)
               "The framebuffer is not complete: 0x0000");
 }
 
+TEST_F(OpenGLObjects, TextureThatTheDriverRefusesIsToldByTheFramebuffer)
+{
+    device().onCall["glTexImage2D"] = [this] {
+        device().errors = {0x505};
+        device().framebufferStatus = 0x8CD6;
+    };
+    const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);
+    EXPECT_THAT(gl.callsOf("glGetError"), SizeIs(0));
+    Framebuffer framebuffer;
+    framebuffer.bind();
+    EXPECT_EQ(FailureOf([&] { framebuffer.attach(texture, 0, 0); }),
+              "The framebuffer is not complete: GL_FRAMEBUFFER_INCOMPLETE_ATTACHMENT, "
+              "after OpenGL error 0x0505");
+    EXPECT_THAT(gl.callsOf("glGetError"), SizeIs(1));
+    EXPECT_THAT(device().errors, SizeIs(0));
+}
+
 TEST_F(OpenGLObjects, SenselessAttachmentsAreRefused)
 {
     const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);

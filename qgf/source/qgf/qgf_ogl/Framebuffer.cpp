@@ -33,16 +33,28 @@ constexpr StatusName kStatusNames[] = {
     {0x8D56, "GL_FRAMEBUFFER_INCOMPLETE_MULTISAMPLE"},
 };
 
+std::string HexText(std::uint32_t number)
+{
+    char text[16];
+    std::snprintf(text, sizeof text, "0x%04X", number);
+    return text;
+}
+
 std::string StatusText(std::uint32_t status)
 {
     const auto* const row =
         std::find_if(std::begin(kStatusNames), std::end(kStatusNames),
                      [status](const StatusName& candidate) { return candidate.status == status; });
-    if (row != std::end(kStatusNames))
-        return row->name;
-    char text[16];
-    std::snprintf(text, sizeof text, "0x%04X", status);
-    return text;
+    return row != std::end(kStatusNames) ? row->name : HexText(status);
+}
+
+// Most often the texture's own: making it asks for no error, since whoever works with it does so
+// once, at the end. Here there is no such end, and the error must not be left for the next
+// question.
+std::string ErrorText(const OpenGLInterceptor& gl)
+{
+    const std::uint32_t error = gl.glGetError(kSourceFile, __LINE__);
+    return error != kGLNoError ? ", after OpenGL error " + HexText(error) : "";
 }
 
 } // namespace
@@ -87,7 +99,8 @@ void Framebuffer::attach(const Texture2D& texture, std::uint32_t attachment, std
                               static_cast<std::int32_t>(level));
     const std::uint32_t status = gl.glCheckFramebufferStatus(kSourceFile, __LINE__, kGLFramebuffer);
     if (status != kGLFramebufferComplete)
-        throw LogicalException("The framebuffer is not complete: " + StatusText(status));
+        throw LogicalException("The framebuffer is not complete: " + StatusText(status) +
+                               ErrorText(gl));
 }
 
 } // namespace OGL
