@@ -4,6 +4,7 @@
 #include <optional>
 
 #include "CheckCLError.h"
+#include "OnProfilingQueue.h"
 #include "ProfilingDuration.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil_gpu/GPUImplHardware.h"
@@ -97,22 +98,8 @@ double checkBandwidthCL(const QGF::OCL::Context& context, const QGF::OCL::Comman
 
 double GPUImplHardware::DoGetCLBandwidth()
 {
-    constexpr char kName[] = "GPUImplHardware::DoGetCLBandwidth";
-    std::optional<PMLogScope> scope;
-    if (GetDebugValue(gGPUAssay) >= 1)
-        scope.emplace(kName, __FILE__, __LINE__);
-
-    const QGF::OCL::Platform platform = device.platform();
-    const QGF::OCL::ContextProperties properties(platform);
-    PM_LOG(gGPUAssay, kName << ": QGF::OCL::Context context(properties, *iDev);");
-    const QGF::OCL::Context clContext(properties, device, QGF::OCL::ContextCallback{});
-    PM_LOG(gGPUAssay, kName << ": QGF::OCL::CommandQueue cq(context, *iDev, false, true);");
-    const QGF::OCL::CommandQueue queue(clContext, device, false, true);
-
-    const double bytesPerSecond = checkBandwidthCL(clContext, queue);
-    PM_LOG(gGPUAssay, "bytesPerSecond=" << bytesPerSecond);
-    PM_LOG(gGPUAssay, kName << ": result=" << bytesPerSecond);
-    return bytesPerSecond;
+    return OnProfilingQueue("GPUImplHardware::DoGetCLBandwidth", "bytesPerSecond=", device,
+                            checkBandwidthCL);
 }
 
 } // namespace pmutil
