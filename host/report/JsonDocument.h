@@ -6,6 +6,8 @@
 #pragma once
 
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include <nlohmann/json_fwd.hpp>
 
@@ -28,6 +30,10 @@ nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome);
 // The report back from its document. Throws std::runtime_error with what is wrong with the
 // document.
 Report ReadDocument(const nlohmann::ordered_json& document);
+
+// The report back from the lines of the JSON Lines form. A last line that breaks off, as a host
+// that died leaves it, is left out. Throws std::runtime_error with what is wrong with the events.
+Report ReadEvents(std::string_view text);
 
 // Any bytes as a valid JSON string, and back.
 std::string EncodeBytes(const std::string& bytes);

@@ -3,14 +3,11 @@
 #include <algorithm>
 #include <utility>
 
+#include "report/KnownKeys.h"
+
 namespace assay_host {
 
 namespace {
-
-constexpr std::string_view kOwnKeys[] = {
-    "Tester",    "assayStart", "QGFCoreInitialized", "QGFOGLInitialized", "OGLContextCreated",
-    "NumGLGPUs", "NumCLGPUs",  "assayEnd",
-};
 
 // More digits than any machine has devices, and few enough for any integer.
 constexpr std::size_t kMaxIndexDigits = 9;
@@ -93,8 +90,8 @@ bool BeginsLikeReportLine(std::string_view text)
     if (StartsWith(text, "#") || StartsWith(text, "gputag.") || GetDeviceTag(text))
         return true;
     const std::string_view word = text.substr(0, text.find('='));
-    return word.size() < text.size() &&
-           std::find(std::begin(kOwnKeys), std::end(kOwnKeys), word) != std::end(kOwnKeys);
+    const Table<const char*> keys = GetReportKeys();
+    return word.size() < text.size() && std::find(keys.begin(), keys.end(), word) != keys.end();
 }
 
 std::optional<std::string_view> GetDeviceTag(std::string_view key)
@@ -105,7 +102,10 @@ std::optional<std::string_view> GetDeviceTag(std::string_view key)
     std::size_t end = first;
     while (end < key.size() && IsDigit(key[end]))
         ++end;
-    if (end == first || end - first > kMaxIndexDigits || key.substr(end, 2) != "].")
+    const std::size_t digits = end - first;
+    const bool isIndex =
+        digits > 0 && digits <= kMaxIndexDigits && (digits == 1 || key[first] != '0');
+    if (!isIndex || key.substr(end, 2) != "].")
         return std::nullopt;
     return key.substr(0, end + 1);
 }

@@ -64,7 +64,7 @@ TEST(Report, TakesNoTagForADeviceThatIsNone)
 {
     const Report report =
         ReadReport("gputag.GL_X=3\nglgpu[].A=1\nglgpu[x].A=1\nglgpu[1]A=1\nxglgpu[1].A=1\n"
-                   "glgpu[1234567890].A=1\nglgpu[-1].A=1\nclgpu[12].A=1\n");
+                   "glgpu[1234567890].A=1\nglgpu[-1].A=1\nglgpu[01].A=1\nclgpu[12].A=1\n");
     ASSERT_EQ(report.GetDevices().size(), 1U);
     EXPECT_EQ(report.GetDevices()[0].fTag, "clgpu[12]");
     EXPECT_EQ(Value(report.Find("gputag.GL_X")), "3");

@@ -1,0 +1,288 @@
+#include "report/TextView.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <iterator>
+#include <string_view>
+
+#include <fmt/format.h>
+
+#include "report/Answers.h"
+#include "report/Bytes.h"
+#include "report/TextTable.h"
+#include "report/ValueText.h"
+#include "report/Warnings.h"
+
+namespace assay_host {
+
+namespace {
+
+// Rows in the order in which a person asks for them.
+constexpr std::string_view kOpenGLRows[] = {
+    "GLName",
+    "GLRenderer",
+    "GLVendor",
+    "GLVendorID",
+    "GLRendererID",
+    "IsIntegratedGLGPU",
+    "GLMemoryMB",
+    "GLVersion",
+    "glGetString[GL_SHADING_LANGUAGE_VERSION]",
+    "GLDriver",
+    "GLDriverVersion",
+    "GLDriverDate",
+    "CanCompileProgramGLSL",
+    "GLFrameBufferOK",
+    "HasGLNPOTSupport",
+};
+constexpr std::string_view kOpenCLRows[] = {
+    "CLName",      "CLVendor",        "CLVendorID",        "IsIntegratedCLGPU",
+    "CLMemoryMB",  "CLDeviceVersion", "CLPlatformVersion", "CLDriverVersion",
+    "CLBandwidth", "CLCompute",       "CUDASupported",     "CUDAVersion",
+};
+
+// What a terminal can take in at once of standard error, or of lines that are no report's.
+constexpr std::size_t kMostOtherLines = 10;
+
+std::size_t GetWidth(int width)
+{
+    constexpr int kLeastWidth = 40;
+    return static_cast<std::size_t>(std::max(width, kLeastWidth));
+}
+
+Table<std::string_view> GetRows(DeviceKind kind)
+{
+    if (kind == DeviceKind::kOpenGL)
+        return {kOpenGLRows, std::size(kOpenGLRows)};
+    return {kOpenCLRows, std::size(kOpenCLRows)};
+}
+
+// A key that isn't known is its own label.
+std::string GetLabel(const Answer& answer)
+{
+    return answer.fKnown ? answer.fKnown->fLabel : ShowBytes(answer.fKey);
+}
+
+bool IsLost(const Answer& answer)
+{
+    return !answer.fLine && answer.fMissing != Missing::kNotPrinted;
+}
+
+void AppendToList(std::string& list, const std::string& item)
+{
+    list += list.empty() ? "" : ", ";
+    list += item;
+}
+
+class DeviceTable {
+public:
+    explicit DeviceTable(const DeviceAnswers& device) : fDevice(device) {}
+
+    void Print(std::ostream& out, std::size_t width)
+    {
+        AddMain();
+        AddLimits();
+        AddExtensions();
+        AddOthers();
+        AddLost();
+        std::string title = fmt::format("{} device {}", GetKindName(fDevice.fKind), fDevice.fTag);
+        const std::string name = GetDeviceName(fDevice);
+        if (!name.empty())
+            title += ": " + ShowBytes(name);
+        for (const std::string& line : WrapText(title, width))
+            out << line << "\n";
+        out << std::string(std::min(CountColumns(title), width), '-') << "\n";
+        fTable.Print(out, width);
+        out << "\n";
+    }
+
+private:
+    void AddMain()
+    {
+        for (const std::string_view key : GetRows(fDevice.fKind)) {
+            const auto answer = std::find_if(fDevice.fAnswers.begin(), fDevice.fAnswers.end(),
+                                             [key](const Answer& row) { return row.fKey == key; });
+            if (!IsLost(*answer))
+                fTable.Add(GetLabel(*answer), GetValueText(*answer));
+        }
+    }
+
+    template <typename Action>
+    void ForEach(KeyGroup group, Action action)
+    {
+        for (const Answer& answer : fDevice.fAnswers) {
+            if (answer.fKnown && answer.fKnown->fGroup == group && answer.fLine)
+                action(answer);
+        }
+    }
+
+    void AddLimits()
+    {
+        bool isFirst = true;
+        ForEach(KeyGroup::kLimit, [&](const Answer& answer) {
+            if (isFirst)
+                fTable.Add("Limits", "");
+            isFirst = false;
+            fTable.Add("  " + GetLabel(answer), GetValueText(answer));
+        });
+    }
+
+    void AddExtensions()
+    {
+        std::string present;
+        std::string absent;
+        std::string unclear;
+        ForEach(KeyGroup::kExtension, [&](const Answer& answer) {
+            const std::string text = GetValueText(answer);
+            if (text == "yes")
+                AppendToList(present, GetLabel(answer));
+            else if (text == "no")
+                AppendToList(absent, GetLabel(answer));
+            else
+                AppendToList(unclear, GetLabel(answer) + "=" + text);
+        });
+        if (!present.empty())
+            fTable.Add("Extensions", present);
+        if (!absent.empty())
+            fTable.Add("Extensions it lacks", absent);
+        if (!unclear.empty())
+            fTable.Add("Extensions, unclear", unclear);
+    }
+
+    void AddOthers()
+    {
+        bool isFirst = true;
+        for (const Answer& answer : fDevice.fAnswers) {
+            if (answer.fKnown)
+                continue;
+            if (isFirst)
+                fTable.Add("Others", "");
+            isFirst = false;
+            fTable.Add("  " + GetLabel(answer), GetValueText(answer));
+        }
+    }
+
+    // Thirty rows that say the same are no table: what is missing for one reason is one row.
+    void AddLost()
+    {
+        for (const Missing missing :
+             {Missing::kUnreadable, Missing::kDeviceFailed, Missing::kRunEnded}) {
+            std::string labels;
+            for (const Answer& answer : fDevice.fAnswers) {
+                if (!answer.fLine && answer.fMissing == missing)
+                    AppendToList(labels, GetLabel(answer));
+            }
+            if (!labels.empty())
+                fTable.Add("No answer", fmt::format("{} ({})", labels, GetMissingText(missing)));
+        }
+    }
+
+    const DeviceAnswers& fDevice;
+    TextTable fTable;
+};
+
+void PrintWarnings(std::ostream& out, const std::vector<std::string>& warnings, std::size_t width)
+{
+    if (warnings.empty())
+        return;
+    out << "Warnings\n--------\n";
+    TextTable table;
+    for (const std::string& warning : warnings)
+        table.Add("!", warning);
+    table.Print(out, width);
+    out << "\n";
+}
+
+// The last lines of many, under one label.
+void AddLines(TextTable& table, const std::string& label, const std::vector<std::string>& lines)
+{
+    std::string first = label;
+    const std::size_t left = lines.size() - std::min(lines.size(), kMostOtherLines);
+    if (left > 0)
+        table.Add(std::exchange(first, ""), fmt::format("({} lines before)", left));
+    for (std::size_t line = left; line < lines.size(); ++line) {
+        const std::string text = ShowBytes(lines[line]);
+        table.Add(std::exchange(first, ""), text.empty() ? "(empty)" : text);
+    }
+}
+
+std::vector<std::string> GetRawLines(const Report& report)
+{
+    std::vector<std::string> texts;
+    for (const ReportLine& line : report.GetLines()) {
+        if (line.fKind == LineKind::kRaw && !line.fText.empty())
+            texts.push_back(line.fText);
+    }
+    return texts;
+}
+
+std::string GetCommandText(const RunOutcome& outcome)
+{
+    std::string text;
+    for (const std::string& word : outcome.fCommand)
+        text += (text.empty() ? "" : " ") + ShowBytes(word);
+    return text;
+}
+
+std::string GetTimeText(const RunOutcome& outcome)
+{
+    std::string text = fmt::format("{:.2f} s", outcome.fSeconds);
+    if (outcome.fTimeoutSeconds > 0)
+        text += fmt::format(" of {:g} s", outcome.fTimeoutSeconds);
+    return text;
+}
+
+std::string GetCountText(const Answers& answers)
+{
+    const auto count = [&answers](DeviceKind kind) {
+        return std::count_if(answers.fDevices.begin(), answers.fDevices.end(),
+                             [kind](const DeviceAnswers& device) { return device.fKind == kind; });
+    };
+    const bool isWithout =
+        std::any_of(answers.fReport.begin(), answers.fReport.end(),
+                    [](const Answer& answer) { return answer.fMissing == Missing::kNoOpenCL; });
+    return fmt::format("{} OpenGL, {}", count(DeviceKind::kOpenGL),
+                       isWithout ? "no OpenCL"
+                                 : fmt::format("{} OpenCL", count(DeviceKind::kOpenCL)));
+}
+
+void PrintVerdict(std::ostream& out, const Report& report, const Answers& answers,
+                  const RunOutcome& outcome, std::size_t width)
+{
+    const std::string title = fmt::format("Verdict: {}", GetVerdictName(outcome.fVerdict));
+    out << title << "\n" << std::string(title.size(), '-') << "\n";
+    TextTable table;
+    const auto add = [&table](const char* label, const std::string& value) {
+        if (!value.empty())
+            table.Add(label, value);
+    };
+    add("What happened", ShowBytes(outcome.fReason));
+    add("Ended by", ShowBytes(outcome.fTermination));
+    add("Exit status", outcome.fExitStatus ? std::to_string(*outcome.fExitStatus) : "");
+    add("Command", GetCommandText(outcome));
+    add("Time", GetTimeText(outcome));
+    if (!report.GetLines().empty())
+        add("Devices", GetCountText(answers));
+    if (!report.IsWhole() && !report.GetLines().empty()) {
+        add("Last report line", ShowBytes(outcome.fLastReportLine));
+        add("Last log line", ShowBytes(outcome.fLastLogLine));
+        add("Next to report", answers.fNext);
+    }
+    AddLines(table, "Standard error", outcome.fErrorLines);
+    AddLines(table, "Other lines", GetRawLines(report));
+    table.Print(out, width);
+}
+
+} // namespace
+
+void PrintText(std::ostream& out, const Report& report, const RunOutcome& outcome, int width)
+{
+    const std::size_t columns = GetWidth(width);
+    const Answers answers = GetAnswers(report);
+    PrintWarnings(out, GetWarnings(answers, outcome), columns);
+    for (const DeviceAnswers& device : answers.fDevices)
+        DeviceTable(device).Print(out, columns);
+    PrintVerdict(out, report, answers, outcome, columns);
+}
+
+} // namespace assay_host

@@ -1,0 +1,154 @@
+#include "report/ValueText.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+#include <fmt/format.h>
+
+#include "report/Bytes.h"
+#include "report/Numbers.h"
+
+namespace assay_host {
+
+namespace {
+
+constexpr const char* kNotKnown = "not known";
+
+// Up to two decimals, without zeros at the end.
+std::string TrimNumber(double value)
+{
+    std::string text = fmt::format("{:.2f}", value);
+    text.erase(text.find_last_not_of('0') + 1);
+    if (text.back() == '.')
+        text.pop_back();
+    return text;
+}
+
+std::optional<std::string> GetMebibytesText(std::string_view value)
+{
+    const auto mebibytes = ReadUnsigned(value);
+    if (!mebibytes)
+        return std::nullopt;
+    if (*mebibytes == 0)
+        return kNotKnown;
+    if (*mebibytes < 1024)
+        return fmt::format("{} MiB", *mebibytes);
+    return TrimNumber(static_cast<double>(*mebibytes) / 1024) + " GiB";
+}
+
+std::optional<std::string> GetIdText(std::string_view value)
+{
+    const auto id = ReadUnsigned(value);
+    if (!id)
+        return std::nullopt;
+    if (*id == 0)
+        return kNotKnown;
+    return fmt::format("0x{:04X} ({})", *id, *id);
+}
+
+std::optional<std::string> GetSpeedText(std::string_view value)
+{
+    struct Unit {
+        double fSize;
+        const char* fName;
+    };
+    constexpr Unit kUnits[] = {{1e12, "TB/s"}, {1e9, "GB/s"}, {1e6, "MB/s"}, {1e3, "kB/s"}};
+    const auto speed = ReadDouble(value);
+    if (!speed)
+        return std::nullopt;
+    for (const Unit& unit : kUnits) {
+        if (*speed >= unit.fSize)
+            return fmt::format("{:.4g} {}", *speed / unit.fSize, unit.fName);
+    }
+    return fmt::format("{:.4g} B/s", *speed);
+}
+
+std::optional<std::string> GetFlagText(std::string_view value)
+{
+    if (value == "0")
+        return "no";
+    if (value == "1")
+        return "yes";
+    return std::nullopt;
+}
+
+// "[8]" is 8, "[8, 4]" stays.
+std::optional<std::string> GetCountText(std::string_view value)
+{
+    const auto numbers = ReadNumberList(value);
+    if (!numbers || numbers->size() != 1)
+        return std::nullopt;
+    return std::string(value.substr(1, value.size() - 2));
+}
+
+// The system's own form of a date, "20210315000000.000000-000".
+std::optional<std::string> GetDateText(std::string_view value)
+{
+    const auto isDigit = [](char character) { return character >= '0' && character <= '9'; };
+    constexpr std::size_t kPoint = 14;
+    if (value.size() != 25 || value[kPoint] != '.' ||
+        !std::all_of(value.begin(), value.begin() + kPoint, isDigit))
+        return std::nullopt;
+    return fmt::format("{}-{}-{}", value.substr(0, 4), value.substr(4, 2), value.substr(6, 2));
+}
+
+std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
+{
+    switch (form) {
+    case ValueForm::kText:
+        break;
+    case ValueForm::kDate:
+        return GetDateText(value);
+    case ValueForm::kFlag:
+        return GetFlagText(value);
+    case ValueForm::kCount:
+        return GetCountText(value);
+    case ValueForm::kTexels:
+        if (ReadUnsigned(value))
+            return std::string(value) + " texels";
+        break;
+    case ValueForm::kMebibytes:
+        return GetMebibytesText(value);
+    case ValueForm::kId:
+        return GetIdText(value);
+    case ValueForm::kBytesPerSecond:
+        return GetSpeedText(value);
+    case ValueForm::kScore:
+        break;
+    }
+    return std::nullopt;
+}
+
+} // namespace
+
+std::string GetValueText(const Answer& answer)
+{
+    if (!answer.fLine)
+        return fmt::format("- ({})", GetMissingText(answer.fMissing));
+    const std::string& value = answer.fLine->fValue;
+    std::optional<std::string> text;
+    if (answer.fKnown)
+        text = GetFormText(answer.fKnown->fForm, value);
+    if (!text && answer.fLine->fQuoted && value.empty())
+        text = "(empty)";
+    if (!text && answer.fLine->fQuoted && value == "?")
+        text = kNotKnown;
+    if (!text)
+        text = ShowBytes(value);
+    if (answer.fLine->fCut)
+        *text += "... (cut)";
+    return *text;
+}
+
+std::string GetDeviceName(const DeviceAnswers& device)
+{
+    if (device.fKind == DeviceKind::kOpenCL)
+        return device.GetValue("CLName");
+    const std::string name = device.GetValue("GLName");
+    return name.empty() ? device.GetValue("GLRenderer") : name;
+}
+
+} // namespace assay_host
