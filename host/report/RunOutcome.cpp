@@ -5,7 +5,7 @@ namespace assay_host {
 namespace {
 
 constexpr const char* kNames[] = {
-    "complete", "failed-tests", "usage-error", "crashed", "hung", "never-started",
+    "complete", "failed-tests", "usage-error", "crashed", "hung", "never-started", "interrupted",
 };
 
 } // namespace

@@ -9,18 +9,20 @@
 namespace assay_host {
 
 enum class Verdict {
-    kComplete,    // a whole report, and no test failed
-    kFailedTests, // the child ended by itself, but tests failed or the report isn't whole
-    kUsageError,  // the child refused its command line
-    kCrashed,     // the child died of a signal, or with a code above 255
-    kHung,        // the time ran out and the child was killed
-    kNeverStarted // there was no child
+    kComplete,     // a whole report, and no test failed
+    kFailedTests,  // the child ended by itself, but tests failed or the report isn't whole
+    kUsageError,   // the child refused its command line
+    kCrashed,      // the child died of a signal, or with a code above 255
+    kHung,         // the time ran out and the child was killed
+    kNeverStarted, // there was no child
+    kInterrupted   // the host was told to stop, and ended the child
 };
 
-// "complete", "failed-tests", "usage-error", "crashed", "hung", "never-started".
+// "complete", "failed-tests", "usage-error", "crashed", "hung", "never-started",
+// "interrupted".
 const char* GetVerdictName(Verdict verdict);
 
-// The exit status of `assay-host run` for it: 0, 1, 2, 3, 4, 5 in the order above. (A trouble of
+// The exit status of `assay-host run` for it: 0 to 6 in the order above. (A trouble of
 // the host's own, its command line or its output, is 10.)
 int GetVerdictStatus(Verdict verdict);
 

@@ -4,32 +4,43 @@
 #include <string>
 #include <vector>
 
+#include <boost/shared_ptr.hpp>
+
+#include "pmutil/Launcher.h"
 #include "report/ReportReader.h"
 #include "report/RunOutcome.h"
 
 namespace assay_host {
 
 struct ChildOptions {
-    std::wstring fProgram;
+    std::string fProgram; // its path
     std::vector<std::string> fArgs;
-    double fTimeoutSeconds = 60;
+    double fTimeoutSeconds = 60; // 0: no limit
     ReportReader::Limits fLimits;
 };
 
-// Told what comes while the child runs. All calls come from one thread at a time, the one that
-// called RunChild.
+// Told what comes while the child runs. All calls come from the thread that called RunChild, which
+// can't look after the child meanwhile.
 class RunObserver {
 public:
     virtual ~RunObserver() = default;
     virtual void OnStart() {}
     virtual void OnLine(const ReportLine& /*line*/, double /*seconds*/) {}
     virtual void OnErrorLine(const std::string& /*line*/, double /*seconds*/) {}
-    virtual void OnTick(double /*seconds*/) {} // ten times a second
+    virtual void OnTick(double /*seconds*/) {} // about ten times a second
+
+    // Asked about ten times a second; true kills the child, and the verdict is interrupted.
+    virtual bool ShouldStop() { return false; }
 };
 
-// Launches the child, waits for its end no longer than the timeout, kills it then, and judges.
-// Returns within the timeout plus two seconds, whatever the child does. Never throws for what the
-// child or the system does; that is in the outcome.
+// Launches the child with its standard input closed, waits for its end no longer than the timeout,
+// kills it then, ends what it left behind, and judges. Returns within the timeout plus two seconds,
+// whatever the child does. Never throws for what the child or the system does; that is in the
+// outcome.
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer);
+
+// The same with another launcher, used for this run alone.
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer,
+                    const boost::shared_ptr<pmutil::Launcher>& launcher);
 
 } // namespace assay_host

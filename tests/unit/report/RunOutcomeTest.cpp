@@ -19,6 +19,7 @@ TEST(RunOutcome, HasANameAndAStatusForEachVerdict)
         {Verdict::kCrashed, "crashed", 3},
         {Verdict::kHung, "hung", 4},
         {Verdict::kNeverStarted, "never-started", 5},
+        {Verdict::kInterrupted, "interrupted", 6},
     };
     for (const Row& row : kRows) {
         EXPECT_STREQ(GetVerdictName(row.fVerdict), row.fName);

@@ -1,0 +1,301 @@
+#include "supervise/ChildRun.h"
+
+#include <algorithm>
+#include <chrono>
+#include <deque>
+#include <utility>
+
+#include <boost/filesystem/operations.hpp>
+#include <boost/make_shared.hpp>
+
+#include "pmutil/ConsoleAppLauncher.h"
+#include "supervise/ErrorLines.h"
+#include "supervise/EventQueue.h"
+#include "supervise/Judge.h"
+#include "supervise/Paths.h"
+#include "supervise/ProcessTree.h"
+#include "supervise/PumpTask.h"
+#include "supervise/SupervisedApp.h"
+#include "supervise/WatchedLauncher.h"
+
+namespace assay_host {
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+using Seconds = std::chrono::duration<double>;
+using std::chrono::milliseconds;
+
+constexpr milliseconds kTick{100};
+
+// What follows the timeout has to fit into two seconds, of which pmutil takes one if its launch has
+// to be given up.
+constexpr Seconds kKillGrace{0.7};       // for a killed child to go
+constexpr Seconds kStreamGrace{0.2};     // for the streams to end behind the child
+constexpr Seconds kLastStreamGrace{0.2}; // the same once its descendants were ended
+constexpr double kTreeSeconds = 0.2;
+constexpr double kJoinSeconds = 0.3;
+
+class Supervision {
+public:
+    Supervision(const ChildOptions& options, RunObserver& observer,
+                boost::shared_ptr<pmutil::Launcher> launcher)
+        : fOptions(options),
+          fObserver(observer),
+          fPlatformLauncher(std::move(launcher)),
+          fReader(options.fLimits)
+    {
+        fOutcome.fCommand.push_back(options.fProgram);
+        fOutcome.fCommand.insert(fOutcome.fCommand.end(), options.fArgs.begin(),
+                                 options.fArgs.end());
+        fOutcome.fTimeoutSeconds = options.fTimeoutSeconds;
+    }
+
+    RunOutcome Run()
+    {
+        if (Launch()) {
+            fObserver.OnStart();
+            Follow();
+            Finish();
+        }
+        fOutcome.fLeftBehind = fLeftBehind;
+        Judge(fEvidence, fOutcome);
+        return std::move(fOutcome);
+    }
+
+private:
+    bool Launch()
+    {
+        const auto app = boost::make_shared<SupervisedApp>(fLauncher);
+        fOutTask = boost::make_shared<PumpTask>(pmutil::OutputChannel::kStdout, app, fQueue,
+                                                fOptions.fLimits.fMaxBytes);
+        fErrTask = boost::make_shared<PumpTask>(pmutil::OutputChannel::kStderr, app, fQueue,
+                                                ErrorLines::kMaxBytes);
+        fLaunch.SetConsoleApp(app);
+        try {
+            fLaunch.SetLaunchParams(pmutil::LaunchParams(
+                fOutTask, fErrTask,
+                std::deque<std::string>(fOptions.fArgs.begin(), fOptions.fArgs.end()),
+                ToProgram(fOptions.fProgram)));
+            fLaunch.Launch();
+        } catch (const std::exception& exc) {
+            NoteStartFailure(exc.what());
+            if (fLauncher->HasLaunched())
+                KillDirectly(); // the launch failed behind it
+            fLeftBehind = !fTree.EndAll(kTreeSeconds);
+            return false;
+        }
+        return true;
+    }
+
+    void NoteStartFailure(const std::string& text)
+    {
+        fOutcome.fSeconds = GetSeconds();
+        boost::system::error_code error;
+        const boost::filesystem::file_status status =
+            boost::filesystem::status(ToPath(fOptions.fProgram), error);
+        if (fOptions.fProgram.empty() || status.type() == boost::filesystem::file_not_found)
+            fEvidence.fStartFailure = "there is no file " + fOptions.fProgram;
+        else if (status.type() == boost::filesystem::directory_file)
+            fEvidence.fStartFailure = fOptions.fProgram + " is a directory";
+        else
+            fEvidence.fStartFailure = text;
+    }
+
+    // Until the child and its output have ended, or were given up.
+    void Follow()
+    {
+        while (fEvidence.fStartFailure.empty() && !IsOver()) {
+            const Clock::time_point before = Clock::now();
+            const std::optional<Event> event = fQueue->Pop(GetPatience());
+            if (fEnded)
+                fIdle += Clock::now() - before;
+            if (event)
+                Take(*event);
+            Tick();
+        }
+    }
+
+    bool IsOver()
+    {
+        if (fEnded && fOpenStreams == 0)
+            return true;
+        if (!fEnded)
+            return fKilled && Clock::now() - fKillTime >= kKillGrace;
+        if (fTreeEnded)
+            return fIdle >= kLastStreamGrace + kStreamGrace;
+        if (fIdle >= kStreamGrace) {
+            fTreeEnded = true;
+            fLeftBehind = !fTree.EndAll(kTreeSeconds);
+        }
+        return false;
+    }
+
+    // How long to wait for the next event: to the next thing that has its time.
+    milliseconds GetPatience() const
+    {
+        Seconds patience = kTick;
+        if (fEnded)
+            patience = std::min<Seconds>(patience, kStreamGrace / 4);
+        else if (!fKilled && fOptions.fTimeoutSeconds > 0)
+            patience = std::min(patience, Seconds(fOptions.fTimeoutSeconds - GetSeconds()));
+        return std::max(milliseconds(1), std::chrono::duration_cast<milliseconds>(patience));
+    }
+
+    void Take(const Event& event)
+    {
+        switch (event.fKind) {
+        case Event::Kind::kChildEnd:
+            fEnded = true;
+            fOutcome.fSeconds = GetSeconds();
+            break;
+        case Event::Kind::kStreamEnd:
+            --fOpenStreams;
+            break;
+        case Event::Kind::kBytes:
+            if (event.fChannel == pmutil::OutputChannel::kStdout)
+                TakeLines(fReader.Feed(event.fBytes));
+            else
+                TakeErrorLines(fErrorLines.Feed(event.fBytes));
+        }
+    }
+
+    void TakeLines(const std::vector<ReportLine>& lines)
+    {
+        for (const ReportLine& line : lines) {
+            fEvidence.fReport.Add(line);
+            fObserver.OnLine(line, GetSeconds());
+        }
+    }
+
+    void TakeErrorLines(std::vector<std::string> lines)
+    {
+        for (std::string& line : lines) {
+            fObserver.OnErrorLine(line, GetSeconds());
+            fOutcome.fErrorLines.push_back(std::move(line));
+        }
+    }
+
+    void Tick()
+    {
+        const Clock::time_point now = Clock::now();
+        const bool outOfTime =
+            fOptions.fTimeoutSeconds > 0 && GetSeconds() >= fOptions.fTimeoutSeconds;
+        if (now - fLastTick < kTick && !outOfTime)
+            return;
+        fLastTick = now;
+        fObserver.OnTick(GetSeconds());
+        if (fKilled || fEnded)
+            return;
+        LookForFailure();
+        if (fObserver.ShouldStop())
+            Kill(KillReason::kInterrupt);
+        else if (outOfTime)
+            Kill(KillReason::kTimeout);
+    }
+
+    // A failure of the launcher's own ends the launch, and pmutil has killed the child then. One of
+    // a pump costs its stream.
+    void LookForFailure()
+    {
+        try {
+            fLaunch.ThrowIfFailurePending();
+        } catch (const pmutil::consoleapp::Exception& exc) {
+            if (exc.GetTaskID() == pmutil::TaskID::kLauncher)
+                NoteStartFailure(exc.what());
+        }
+    }
+
+    void Kill(KillReason reason)
+    {
+        fKilled = true;
+        fKillTime = Clock::now();
+        fEvidence.fKillReason = reason;
+        try {
+            fLaunch.Kill();
+        } catch (const std::exception&) {
+            // A stored failure of the launch came first, and kept the child alive.
+            KillDirectly();
+        }
+    }
+
+    void KillDirectly()
+    {
+        try {
+            fLauncher->Kill();
+        } catch (const std::exception&) {
+            // What can't be killed is left behind, and said to be.
+        }
+    }
+
+    void Finish()
+    {
+        if (fEvidence.fKillReason == KillReason::kNone && fObserver.ShouldStop())
+            fEvidence.fKillReason = KillReason::kInterrupt; // which the child has seen first
+        while (const std::optional<Event> event = fQueue->Pop(milliseconds(0)))
+            Take(*event);
+        fQueue->Close();
+        TakeLines(fReader.Finish());
+        TakeErrorLines(fErrorLines.Finish());
+        if (!fEnded)
+            fOutcome.fSeconds = GetSeconds();
+        try {
+            int exitCode = 0;
+            fLaunch.Wait(&exitCode, fEnded ? kJoinSeconds : 0.0);
+        } catch (const std::exception&) {
+            // How the child ended is known without it.
+        }
+        fEvidence.fEnd = fLauncher->GetEnd();
+        if (fEvidence.fEnd && fEvidence.fEnd->fResult != pmutil::kEndedNormally)
+            fEvidence.fTermination = pmutil::GetTerminationText(*fPlatformLauncher);
+        if (!fTreeEnded)
+            fLeftBehind = !fTree.EndAll(kTreeSeconds);
+        fLeftBehind = fLeftBehind || (!fEnded && fEvidence.fStartFailure.empty()) ||
+                      (fEnded && fOpenStreams > 0);
+        fOutcome.fLostOutputBytes = fReader.GetLostByteCount() + fOutTask->GetDroppedByteCount();
+        fOutcome.fLostErrorBytes = fErrorLines.GetLostByteCount() + fErrTask->GetDroppedByteCount();
+    }
+
+    double GetSeconds() const { return Seconds(Clock::now() - fStart).count(); }
+
+    const ChildOptions& fOptions;
+    RunObserver& fObserver;
+    const boost::shared_ptr<pmutil::Launcher> fPlatformLauncher;
+    const boost::shared_ptr<EventQueue> fQueue = boost::make_shared<EventQueue>();
+    const boost::shared_ptr<WatchedLauncher> fLauncher =
+        boost::make_shared<WatchedLauncher>(fPlatformLauncher, fQueue);
+    boost::shared_ptr<PumpTask> fOutTask;
+    boost::shared_ptr<PumpTask> fErrTask;
+    ProcessTree fTree;
+    pmutil::ConsoleAppLauncher fLaunch;
+
+    ReportReader fReader;
+    ErrorLines fErrorLines;
+    Evidence fEvidence;
+    RunOutcome fOutcome;
+
+    const Clock::time_point fStart = Clock::now();
+    Clock::time_point fLastTick = fStart;
+    Clock::time_point fKillTime;
+    Seconds fIdle{0}; // waited for output since the child's end
+    bool fKilled = false;
+    bool fEnded = false;
+    bool fTreeEnded = false;
+    bool fLeftBehind = false;
+    int fOpenStreams = 2;
+};
+
+} // namespace
+
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer)
+{
+    return RunChild(options, observer, pmutil::MakeLauncher());
+}
+
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer,
+                    const boost::shared_ptr<pmutil::Launcher>& launcher)
+{
+    return Supervision(options, observer, launcher).Run();
+}
+
+} // namespace assay_host

@@ -1,0 +1,159 @@
+#include "supervise/Judge.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <cstdlib>
+
+#include <fmt/format.h>
+
+namespace assay_host {
+
+namespace {
+
+constexpr int kFailedStatus = 2;
+constexpr int kUsageStatus = 3;
+
+bool StartsWith(const std::string& text, const char* start)
+{
+    return text.rfind(start, 0) == 0;
+}
+
+bool TellsFailure(const std::string& line)
+{
+    return StartsWith(line, "exception: ") || StartsWith(line, "QGF::LogicalException: ") ||
+           line == "unknown exception";
+}
+
+bool TellsUsage(const std::string& line)
+{
+    return StartsWith(line, "Usage exception: ") || StartsWith(line, "usage: ");
+}
+
+std::string FindErrorLine(const RunOutcome& outcome, bool (*matches)(const std::string&))
+{
+    const auto line = std::find_if(outcome.fErrorLines.begin(), outcome.fErrorLines.end(), matches);
+    return line == outcome.fErrorLines.end() ? std::string() : *line;
+}
+
+// The status that the system makes of the one asked for, or the code where it is too large to be
+// told from a crash.
+bool IsAskedFor(const Evidence& evidence, int asked)
+{
+    if (evidence.fEnd->fResult == pmutil::kEndedNormally)
+        return evidence.fEnd->fExitCode == (asked & 0xFF);
+    return evidence.fTermination == fmt::format("code 0x{:08X}", static_cast<std::uint32_t>(asked));
+}
+
+// Behind which line, and in which question.
+std::string Where(const ReportProgress& report)
+{
+    if (!report.HasValues())
+        return " before its first line";
+    const std::string next = report.GetPosition().GetNextKey();
+    return fmt::format(" behind {}{}", report.GetLastKey(), next.empty() ? "" : ", at " + next);
+}
+
+void JudgeNormalEnd(const Evidence& evidence, RunOutcome& outcome)
+{
+    const int status = evidence.fEnd->fExitCode;
+    const std::string failure = FindErrorLine(outcome, TellsFailure);
+    if (status == kUsageStatus && !evidence.fReport.HasValues() &&
+        !FindErrorLine(outcome, TellsUsage).empty()) {
+        outcome.fVerdict = Verdict::kUsageError;
+        outcome.fReason = "The child refused its command line.";
+    } else if (!evidence.fReport.IsWhole()) {
+        outcome.fVerdict = Verdict::kFailedTests;
+        outcome.fReason = fmt::format("The report broke off{}; the child ended with status {}{}.",
+                                      Where(evidence.fReport), status,
+                                      failure.empty() ? "" : " (" + failure + ")");
+    } else {
+        outcome.fVerdict = Verdict::kFailedTests;
+        outcome.fReason = fmt::format("The report is whole, but the child ended with status {}{}.",
+                                      status, failure.empty() ? "" : " (" + failure + ")");
+    }
+}
+
+// An -exit= of 2 can't be told from failed tests but by what standard error says.
+bool IsComplete(const Evidence& evidence, const RunOutcome& outcome)
+{
+    if (!evidence.fReport.IsWhole())
+        return false;
+    const std::vector<std::string> options(outcome.fCommand.begin() + 1, outcome.fCommand.end());
+    const int asked = GetAskedStatus(options);
+    if (!IsAskedFor(evidence, asked))
+        return false;
+    return (asked & 0xFF) != kFailedStatus || FindErrorLine(outcome, TellsFailure).empty();
+}
+
+} // namespace
+
+void ReportProgress::Add(const ReportLine& line)
+{
+    if (line.fKind == LineKind::kComment) {
+        fLastLogLine = line.fText;
+        return;
+    }
+    if (line.fKind == LineKind::kRaw)
+        return;
+    fHasValues = true;
+    fHasStart = fHasStart || line.fKey == "assayStart";
+    fHasEnd = fHasEnd || line.fKey == "assayEnd";
+    fLastReportLine = line.fText;
+    fLastKey = line.fKey;
+    fLastLogLine.clear();
+    fPosition.Add(line);
+}
+
+void Judge(const Evidence& evidence, RunOutcome& outcome)
+{
+    outcome.fLastReportLine = evidence.fReport.GetLastReportLine();
+    outcome.fLastLogLine = evidence.fReport.GetLastLogLine();
+    if (!evidence.fStartFailure.empty()) {
+        outcome.fVerdict = Verdict::kNeverStarted;
+        outcome.fReason =
+            fmt::format("The child could not be started: {}.", evidence.fStartFailure);
+        return;
+    }
+    const bool endedByItself = evidence.fEnd && evidence.fEnd->fResult == pmutil::kEndedNormally;
+    if (endedByItself)
+        outcome.fExitStatus = evidence.fEnd->fExitCode;
+    else
+        outcome.fTermination = evidence.fTermination;
+
+    if (evidence.fEnd && evidence.fEnd->fResult != pmutil::kEndedByKill &&
+        IsComplete(evidence, outcome)) {
+        outcome.fVerdict = Verdict::kComplete;
+        outcome.fReason = "The report is whole, and no test failed.";
+    } else if (evidence.fKillReason == KillReason::kInterrupt) {
+        outcome.fVerdict = Verdict::kInterrupted;
+        outcome.fReason = fmt::format("The run was interrupted{}.", Where(evidence.fReport));
+    } else if (endedByItself) {
+        JudgeNormalEnd(evidence, outcome);
+    } else if (evidence.fKillReason == KillReason::kTimeout) {
+        outcome.fVerdict = Verdict::kHung;
+        outcome.fReason = fmt::format(
+            "The child did not end within {:g} s and was {}{}.", outcome.fTimeoutSeconds,
+            evidence.fEnd ? "killed" : "told to die, which it did not,", Where(evidence.fReport));
+    } else {
+        outcome.fVerdict = Verdict::kCrashed;
+        outcome.fReason =
+            fmt::format("The child died of {}{}.", outcome.fTermination, Where(evidence.fReport));
+    }
+}
+
+int GetAskedStatus(const std::vector<std::string>& options)
+{
+    constexpr char kExit[] = "-exit=";
+    int status = 0;
+    for (const std::string& option : options) {
+        if (!StartsWith(option, kExit))
+            continue;
+        std::string value = option.substr(sizeof kExit - 1);
+        if (value.size() >= 2 && value.front() == '"' && value.back() == '"')
+            value = value.substr(1, value.size() - 2);
+        status = static_cast<int>(std::strtol(value.c_str(), nullptr, 0));
+    }
+    return status;
+}
+
+} // namespace assay_host

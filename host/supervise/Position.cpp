@@ -1,0 +1,89 @@
+#include "supervise/Position.h"
+
+#include <algorithm>
+#include <cstdlib>
+
+#include "supervise/TestSequence.h"
+
+namespace assay_host {
+
+namespace {
+
+// More than any machine has; a forged line must not cost memory.
+constexpr std::size_t kMaxDevices = 256;
+
+std::size_t ReadCount(const std::string& text)
+{
+    return std::min<std::size_t>(std::strtoul(text.c_str(), nullptr, 10), kMaxDevices);
+}
+
+} // namespace
+
+Position::Position()
+{
+    Build();
+}
+
+void Position::Build()
+{
+    fEntries.clear();
+    for (const GlobalKey& key : GetFirstKeys())
+        fEntries.push_back({{}, key.fName, true, false});
+    AddTests(false, fGLCount);
+    fEntries.push_back({{}, kCLCountKey, true, true});
+    AddTests(true, fCLCount);
+    fEntries.push_back({{}, kLastKey, true, false});
+    fPlaces.clear();
+    for (std::size_t index = 0; index < fEntries.size(); ++index)
+        fPlaces[fEntries[index].fKey] = index;
+}
+
+void Position::AddTests(bool openCL, std::size_t count)
+{
+    for (const Test& test : openCL ? GetCLTests() : GetGLTests()) {
+        for (std::size_t index = 0; index < count; ++index) {
+            const std::string tag = openCL ? MakeCLTag(index) : MakeGLTag(index);
+            fEntries.push_back({tag, test.GetKey(tag), test.TakesStep(), test.fMayBeSilent});
+        }
+    }
+}
+
+void Position::Add(const ReportLine& line)
+{
+    if (line.fKind != LineKind::kValue)
+        return;
+    const auto place = fPlaces.find(line.fKey);
+    if (place == fPlaces.end() || place->second < fNext)
+        return;
+    if (fNext == 0)
+        ++fSteps; // that of the start
+    for (; fNext < place->second; ++fNext) {
+        const Entry& passed = fEntries[fNext];
+        if (!passed.fMayBeSilent)
+            fDropped.insert(passed.fTag);
+        else if (!passed.fTag.empty() && fDropped.count(passed.fTag) == 0)
+            ++fSteps;
+    }
+    if (fEntries[fNext].fTakesStep)
+        ++fSteps;
+    ++fNext;
+    if (line.fKey == kGLCountKey)
+        fGLCount = ReadCount(line.fValue);
+    else if (line.fKey == kCLCountKey)
+        fCLCount = ReadCount(line.fValue);
+    else
+        return;
+    Build();
+}
+
+std::string Position::GetNextKey() const
+{
+    for (std::size_t index = fNext; index < fEntries.size(); ++index) {
+        const Entry& entry = fEntries[index];
+        if (entry.fTag.empty() || fDropped.count(entry.fTag) == 0)
+            return entry.fKey;
+    }
+    return {};
+}
+
+} // namespace assay_host

@@ -1,0 +1,46 @@
+// Where in its sequence a child is, from the report so far.
+#pragma once
+
+#include <cstddef>
+#include <set>
+#include <string>
+#include <unordered_map>
+#include <vector>
+
+#include "report/ReportLine.h"
+
+namespace assay_host {
+
+class Position {
+public:
+    Position();
+
+    void Add(const ReportLine& line);
+
+    // Steps that are known to be taken.
+    std::size_t GetSteps() const { return fSteps; }
+
+    // The key whose line comes next, and so what the child is at; empty behind the last one.
+    std::string GetNextKey() const;
+
+private:
+    struct Entry {
+        std::string fTag; // empty if the key belongs to no device
+        std::string fKey;
+        bool fTakesStep;
+        bool fMayBeSilent;
+    };
+
+    void Build();
+    void AddTests(bool openCL, std::size_t count);
+
+    std::size_t fGLCount = 0;
+    std::size_t fCLCount = 0;
+    std::vector<Entry> fEntries;
+    std::unordered_map<std::string, std::size_t> fPlaces;
+    std::set<std::string> fDropped; // tags of devices that were passed over
+    std::size_t fNext = 0;
+    std::size_t fSteps = 0;
+};
+
+} // namespace assay_host

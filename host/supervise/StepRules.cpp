@@ -1,0 +1,325 @@
+#include "supervise/StepRules.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <iterator>
+#include <regex>
+#include <set>
+#include <stdexcept>
+
+#include <fmt/format.h>
+
+namespace assay_host {
+
+namespace {
+
+constexpr int kFailedStatus = 2;
+constexpr std::size_t kMaxDevices = 256;
+
+constexpr char kCrashText[] = "exception: programmed failure";
+constexpr char kThrowText[] = "exception: Programmed throw";
+
+// What enumerating the OpenGL devices may say.
+const std::set<std::string>& GetEnumerationTexts()
+{
+    static const std::set<std::string> texts = {
+        "ContextOffscreen exception caught and ignored.",
+        "DoGetGPUs fails with exception",
+    };
+    return texts;
+}
+
+bool IsFailure(const std::string& line)
+{
+    return line.rfind("exception: ", 0) == 0 || line.rfind("QGF::LogicalException: ", 0) == 0 ||
+           line == "unknown exception";
+}
+
+// What the child says of each failure, in order. A failed query of a device is told twice.
+std::vector<std::vector<std::string>> ListFailures(const std::vector<std::string>& errors)
+{
+    std::vector<std::vector<std::string>> result;
+    for (std::size_t index = 0; index < errors.size(); ++index) {
+        if (!IsFailure(errors[index]))
+            continue;
+        result.emplace_back();
+        if (index > 0 && errors[index] == "exception: " + errors[index - 1])
+            result.back().push_back(errors[index - 1]);
+        result.back().push_back(errors[index]);
+    }
+    return result;
+}
+
+std::vector<std::string> ListEnumerationTexts(const std::vector<std::string>& errors)
+{
+    std::vector<std::string> result;
+    std::copy_if(errors.begin(), errors.end(), std::back_inserter(result),
+                 [](const std::string& line) { return GetEnumerationTexts().count(line) != 0; });
+    return result;
+}
+
+// The child's own words of all that standard error holds.
+std::vector<std::string> ListOwnTexts(const std::vector<std::string>& errors)
+{
+    std::vector<std::string> result;
+    for (std::size_t index = 0; index < errors.size(); ++index) {
+        const bool announces =
+            index + 1 < errors.size() && errors[index + 1] == "exception: " + errors[index];
+        if (announces || IsFailure(errors[index]) ||
+            GetEnumerationTexts().count(errors[index]) != 0)
+            result.push_back(errors[index]);
+    }
+    return result;
+}
+
+std::vector<std::string> ListLines(const Report& report)
+{
+    std::vector<std::string> result;
+    for (const ReportLine& line : report.GetLines()) {
+        if (line.fKind != LineKind::kComment)
+            result.push_back(line.fText);
+    }
+    return result;
+}
+
+const ReportLine& Require(const Report& report, const std::string& key)
+{
+    const ReportLine* const line = report.Find(key);
+    if (line == nullptr)
+        throw std::runtime_error("the report has no line for " + key);
+    return *line;
+}
+
+std::vector<std::string> ListTags(const Report& report, const std::string& key,
+                                  std::string (*makeTag)(std::size_t))
+{
+    const std::size_t count = std::strtoul(Require(report, key).fValue.c_str(), nullptr, 10);
+    if (count > kMaxDevices)
+        throw std::runtime_error(fmt::format("the report tells of {} devices", count));
+    std::vector<std::string> tags;
+    for (std::size_t index = 0; index < count; ++index)
+        tags.push_back(makeTag(index));
+    return tags;
+}
+
+// The test that the device didn't survive, to go by its last line; behind the last test if it did.
+std::size_t FindFailingTest(const Report& report, const std::vector<Test>& tests,
+                            const std::string& tag)
+{
+    std::size_t next = tests.size();
+    while (next > 0 && report.Find(tests[next - 1].GetKey(tag)) == nullptr)
+        --next;
+    return next < tests.size() && tests[next].fMayBeSilent ? next + 1 : next;
+}
+
+const std::regex& GetShape(Match match)
+{
+    static const std::regex stamp("\"\\d{4}-\\d\\d-\\d\\d_\\d\\d:\\d\\d:\\d\\d\"");
+    static const std::regex integer("\\d+");
+    static const std::regex number("\\d+(\\.\\d+)?(e[+-]\\d+)?");
+    switch (match) {
+    case Match::kStamp:
+        return stamp;
+    case Match::kInteger:
+        return integer;
+    default:
+        return number;
+    }
+}
+
+// The lines of two lists side by side from shortly before the first difference on.
+std::string ShowLists(const std::string& title, const std::vector<std::string>& expected,
+                      const std::vector<std::string>& found, std::size_t first)
+{
+    constexpr std::size_t kBefore = 2;
+    constexpr std::size_t kBehind = 4;
+    std::string text = title + "\n";
+    for (std::size_t index = first - std::min(first, kBefore); index < first; ++index)
+        text += fmt::format("      {}\n", found[index]);
+    const auto show = [&](const char* mark, const std::vector<std::string>& lines) {
+        const std::size_t end = std::min(lines.size(), first + kBehind);
+        for (std::size_t index = first; index < end; ++index)
+            text += fmt::format("    {} {}\n", mark, lines[index]);
+        if (lines.size() > end)
+            text += fmt::format("    {} ({} more)\n", mark, lines.size() - end);
+        else
+            text += fmt::format("    {} (the end)\n", mark);
+    };
+    show("-", expected);
+    show("+", found);
+    return text;
+}
+
+} // namespace
+
+const char* GetOptionName(StepFailure failure)
+{
+    return failure == StepFailure::kCrash ? "crashAfter" : "throwAfter";
+}
+
+bool ExpectedLine::Matches(const std::string& text) const
+{
+    if (fMatch == Match::kExact)
+        return text == fText;
+    const std::size_t key = fText.find('=') + 1;
+    return text.compare(0, key, fText, 0, key) == 0 &&
+           std::regex_match(text.substr(key), GetShape(fMatch));
+}
+
+StepRules::StepRules(const Report& report, const RunOutcome& outcome)
+{
+    if (!report.IsWhole() || !outcome.fExitStatus)
+        throw std::runtime_error("the undisturbed run did not come to its end: " + outcome.fReason);
+
+    // Options such as -stdout= print before the start.
+    Operation start;
+    for (const std::string& line : ListLines(report)) {
+        if (line == Require(report, "Tester").fText)
+            break;
+        start.fLines.push_back({line, Match::kExact});
+    }
+    fOperations.push_back(start);
+    for (const GlobalKey& key : GetFirstKeys())
+        AddGlobal(report, key.fName, key.fMatch);
+    fOperations.back().fErrors = ListEnumerationTexts(outcome.fErrorLines);
+    const std::vector<std::string> glTags = ListTags(report, kGLCountKey, MakeGLTag);
+    fGLCount = glTags.size();
+    AddTests(report, GetGLTests(), glTags);
+    fHasOpenCL = report.Find(kCLCountKey) != nullptr;
+    if (fHasOpenCL) {
+        AddGlobal(report, kCLCountKey, Match::kExact);
+        const std::vector<std::string> clTags = ListTags(report, kCLCountKey, MakeCLTag);
+        fCLCount = clTags.size();
+        AddTests(report, GetCLTests(), clTags);
+    }
+    AddGlobal(report, kLastKey, Match::kStamp);
+    fOperations.push_back(Operation());
+
+    AddFailureTexts(outcome);
+    fStatus = *outcome.fExitStatus;
+    fStepCount = static_cast<std::size_t>(
+        std::count_if(fOperations.begin(), fOperations.end(), [](const Operation& operation) {
+            return operation.fTakesStep && !operation.fFails;
+        }));
+    const std::string difference = ShowDifference(Predict(StepFailure::kNone, 0), report, outcome);
+    if (!difference.empty())
+        throw std::runtime_error("the undisturbed run is not what the rules say:\n" + difference);
+}
+
+void StepRules::AddGlobal(const Report& report, const std::string& key, Match match)
+{
+    Operation operation;
+    operation.fLines.push_back({Require(report, key).fText, match});
+    fOperations.push_back(operation);
+}
+
+void StepRules::AddTests(const Report& report, const std::vector<Test>& tests,
+                         const std::vector<std::string>& tags)
+{
+    std::vector<std::size_t> failing; // by device, the test that has cost it the rest
+    failing.reserve(tags.size());
+    for (const std::string& tag : tags)
+        failing.push_back(FindFailingTest(report, tests, tag));
+
+    for (std::size_t index = 0; index < tests.size(); ++index) {
+        const Test& test = tests[index];
+        for (std::size_t device = 0; device < tags.size(); ++device) {
+            if (index > failing[device])
+                continue;
+            Operation operation;
+            operation.fTag = tags[device];
+            operation.fTakesStep = test.TakesStep();
+            operation.fFails = index == failing[device];
+            if (!operation.fFails || test.ShowsTagsFirst()) {
+                for (const std::string& line : test.GetTagLines())
+                    operation.fLines.push_back({line, Match::kExact});
+            }
+            const std::string key = test.GetKey(tags[device]);
+            if (!operation.fFails && (!test.fMayBeSilent || report.Find(key) != nullptr))
+                operation.fLines.push_back({Require(report, key).fText, test.fMatch});
+            fOperations.push_back(operation);
+        }
+    }
+}
+
+void StepRules::AddFailureTexts(const RunOutcome& outcome)
+{
+    const std::vector<std::vector<std::string>> failures = ListFailures(outcome.fErrorLines);
+    auto failure = failures.begin();
+    for (Operation& operation : fOperations) {
+        if (!operation.fFails)
+            continue;
+        if (failure == failures.end())
+            throw std::runtime_error(operation.fTag +
+                                     " has no more lines, and standard error doesn't say why");
+        operation.fErrors = *failure++;
+    }
+    if (failure != failures.end())
+        throw std::runtime_error("standard error tells of a failure that costs no device: " +
+                                 failure->back());
+}
+
+Prediction StepRules::Predict(StepFailure failure, std::size_t step) const
+{
+    Prediction result;
+    std::set<std::string> lost;
+    std::size_t steps = 0;
+    for (const Operation& operation : fOperations) {
+        if (lost.count(operation.fTag) != 0)
+            continue;
+        result.fErrors.insert(result.fErrors.end(), operation.fErrors.begin(),
+                              operation.fErrors.end());
+        result.fLines.insert(result.fLines.end(), operation.fLines.begin(), operation.fLines.end());
+        if (operation.fFails) {
+            lost.insert(operation.fTag);
+            continue;
+        }
+        if (!operation.fTakesStep)
+            continue;
+        const std::size_t number = steps++;
+        const bool crashes = failure == StepFailure::kCrash && number >= step;
+        const bool throws = failure == StepFailure::kThrow && number == step;
+        if (!crashes && !throws)
+            continue;
+        result.fErrors.emplace_back(crashes ? kCrashText : kThrowText);
+        if (operation.fTag.empty()) {
+            result.fStatus = kFailedStatus;
+            return result;
+        }
+        lost.insert(operation.fTag);
+    }
+    result.fStatus = lost.empty() ? fStatus : kFailedStatus;
+    return result;
+}
+
+std::string ShowDifference(const Prediction& expected, const Report& report,
+                           const RunOutcome& outcome)
+{
+    std::string text;
+    const std::vector<std::string> lines = ListLines(report);
+    const auto [line, unused] = std::mismatch(
+        expected.fLines.begin(), expected.fLines.end(), lines.begin(), lines.end(),
+        [](const ExpectedLine& wanted, const std::string& found) { return wanted.Matches(found); });
+    const auto first = static_cast<std::size_t>(line - expected.fLines.begin());
+    if (first < expected.fLines.size() || first < lines.size()) {
+        std::vector<std::string> wanted;
+        for (const ExpectedLine& each : expected.fLines)
+            wanted.push_back(each.fText);
+        text += ShowLists("  report (- predicted, + found):", wanted, lines, first);
+    }
+    const std::vector<std::string> errors = ListOwnTexts(outcome.fErrorLines);
+    if (errors != expected.fErrors) {
+        const auto differing = std::mismatch(expected.fErrors.begin(), expected.fErrors.end(),
+                                             errors.begin(), errors.end());
+        text += ShowLists("  standard error (- predicted, + found):", expected.fErrors, errors,
+                          static_cast<std::size_t>(differing.first - expected.fErrors.begin()));
+    }
+    if (outcome.fExitStatus != expected.fStatus) {
+        text += fmt::format("  exit status: predicted {}, found {}\n", expected.fStatus,
+                            outcome.fExitStatus ? std::to_string(*outcome.fExitStatus)
+                                                : "none: " + outcome.fReason);
+    }
+    return text;
+}
+
+} // namespace assay_host

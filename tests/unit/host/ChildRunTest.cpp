@@ -1,0 +1,298 @@
+#include "supervise/ChildRun.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <boost/make_shared.hpp>
+#include <boost/thread/condition_variable.hpp>
+#include <boost/thread/mutex.hpp>
+#include <chrono>
+#include <stdexcept>
+#include <thread>
+
+#include "pmutil/Reader.h"
+
+namespace assay_host {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Lt;
+using testing::StartsWith;
+
+// Keeps what it is told.
+class Recorder : public RunObserver {
+public:
+    void OnStart() override { ++fStarts; }
+    void OnLine(const ReportLine& line, double seconds) override
+    {
+        fLines.push_back(line.fText);
+        fLastSeconds = seconds;
+        std::this_thread::sleep_for(fDelay);
+    }
+    void OnErrorLine(const std::string& line, double /*seconds*/) override
+    {
+        fErrorLines.push_back(line);
+    }
+    void OnTick(double /*seconds*/) override { ++fTicks; }
+    bool ShouldStop() override { return fStopAtTick > 0 && fTicks >= fStopAtTick; }
+
+    int fStarts = 0;
+    int fTicks = 0;
+    int fStopAtTick = 0;
+    double fLastSeconds = 0;
+    std::chrono::milliseconds fDelay{0};
+    std::vector<std::string> fLines;
+    std::vector<std::string> fErrorLines;
+};
+
+struct Watched {
+    RunOutcome fOutcome;
+    Recorder fRecorder;
+    double fWallSeconds = 0;
+};
+
+Watched RunTestChild(std::vector<std::string> args, double timeout = 30, int stopAtTick = 0,
+                     const std::string& program = TEST_CHILD)
+{
+    Watched run;
+    run.fRecorder.fStopAtTick = stopAtTick;
+    ChildOptions options;
+    options.fProgram = program;
+    options.fArgs = std::move(args);
+    options.fTimeoutSeconds = timeout;
+    const auto start = std::chrono::steady_clock::now();
+    run.fOutcome = RunChild(options, run.fRecorder);
+    run.fWallSeconds =
+        std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+    return run;
+}
+
+const std::vector<std::string> kWhole = {"out", "assayStart=\"x\"", "out", "assayEnd=\"y\""};
+
+std::vector<std::string> operator+(std::vector<std::string> left,
+                                   const std::vector<std::string>& right)
+{
+    left.insert(left.end(), right.begin(), right.end());
+    return left;
+}
+
+TEST(ChildRun, BringsTheLinesOfAWholeReport)
+{
+    const Watched run = RunTestChild(kWhole + std::vector<std::string>{"err", "words"});
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kComplete) << run.fOutcome.fReason;
+    EXPECT_EQ(run.fOutcome.fExitStatus, 0);
+    EXPECT_THAT(run.fRecorder.fLines, ElementsAre("assayStart=\"x\"", "assayEnd=\"y\""));
+    EXPECT_THAT(run.fRecorder.fErrorLines, ElementsAre("words"));
+    EXPECT_THAT(run.fOutcome.fErrorLines, ElementsAre("words"));
+    EXPECT_EQ(run.fOutcome.fCommand.front(), TEST_CHILD);
+    EXPECT_EQ(run.fOutcome.fCommand.size(), 7U);
+    EXPECT_EQ(run.fOutcome.fLastReportLine, "assayEnd=\"y\"");
+    EXPECT_EQ(run.fOutcome.fTimeoutSeconds, 30);
+    EXPECT_EQ(run.fRecorder.fStarts, 1);
+    EXPECT_FALSE(run.fOutcome.fLeftBehind);
+    EXPECT_EQ(run.fOutcome.fLostOutputBytes, 0U);
+    EXPECT_GT(run.fOutcome.fSeconds, 0);
+    EXPECT_LE(run.fOutcome.fSeconds, run.fWallSeconds);
+}
+
+TEST(ChildRun, GivesTheChildTheEndOfItsInput)
+{
+    EXPECT_EQ(RunTestChild(std::vector<std::string>{"echo"} + kWhole).fOutcome.fVerdict,
+              Verdict::kComplete);
+}
+
+TEST(ChildRun, TellsAChildThatEndsTooEarly)
+{
+    const Watched run = RunTestChild({"out", "assayStart=\"x\"", "exit", "7"});
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kFailedTests);
+    EXPECT_EQ(run.fOutcome.fExitStatus, 7);
+    EXPECT_THAT(run.fOutcome.fReason, HasSubstr("status 7"));
+}
+
+TEST(ChildRun, TellsACrashAndWhereItCame)
+{
+    const Watched run =
+        RunTestChild({"out", "QGFOGLInitialized=1", "out", "# a log line", "abort"});
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kCrashed);
+    EXPECT_EQ(run.fOutcome.fExitStatus, std::nullopt);
+    EXPECT_THAT(run.fOutcome.fTermination,
+                testing::AnyOf(StartsWith("signal "), StartsWith("code 0x")));
+    EXPECT_EQ(run.fOutcome.fLastReportLine, "QGFOGLInitialized=1");
+    EXPECT_EQ(run.fOutcome.fLastLogLine, "# a log line");
+    EXPECT_THAT(run.fOutcome.fReason, HasSubstr("at OGLContextCreated"));
+}
+
+TEST(ChildRun, KillsAChildThatHangs)
+{
+    const Watched run = RunTestChild({"out", "Tester=\"x\"", "sleep", "60000"}, 0.5);
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kHung);
+    EXPECT_THAT(run.fOutcome.fReason, HasSubstr("0.5 s"));
+    EXPECT_THAT(run.fRecorder.fLines, ElementsAre("Tester=\"x\""));
+    EXPECT_GE(run.fWallSeconds, 0.5);
+    EXPECT_LT(run.fWallSeconds, 2.5);
+    EXPECT_FALSE(run.fOutcome.fLeftBehind);
+    EXPECT_GE(run.fRecorder.fTicks, 3);
+}
+
+TEST(ChildRun, StopsWhenItIsToldTo)
+{
+    const Watched run = RunTestChild({"sleep", "60000"}, 30, 3);
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kInterrupted);
+    EXPECT_LT(run.fWallSeconds, 2.5);
+    EXPECT_FALSE(run.fOutcome.fLeftBehind);
+}
+
+TEST(ChildRun, FollowsAChildThatClosedItsStreams)
+{
+    const Watched run = RunTestChild(kWhole + std::vector<std::string>{"close", "sleep", "300"});
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kComplete);
+    EXPECT_GE(run.fOutcome.fSeconds, 0.3);
+}
+
+TEST(ChildRun, EndsAGrandchildThatHoldsTheStreams)
+{
+    const Watched run = RunTestChild(kWhole + std::vector<std::string>{"spawn", "60000"});
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kComplete);
+    EXPECT_LT(run.fWallSeconds, 2);
+    EXPECT_FALSE(run.fOutcome.fLeftBehind);
+}
+
+TEST(ChildRun, EndsAHangingChildTogetherWithItsGrandchild)
+{
+    const Watched run = RunTestChild({"spawn", "60000", "sleep", "60000"}, 0.5);
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kHung);
+    EXPECT_LT(run.fWallSeconds, 2.5);
+    EXPECT_FALSE(run.fOutcome.fLeftBehind);
+}
+
+TEST(ChildRun, CutsAFloodAndSaysSo)
+{
+    constexpr std::uint64_t kFlood = std::uint64_t{1} << 30;
+    const Watched run =
+        RunTestChild(kWhole + std::vector<std::string>{"flood", std::to_string(kFlood)});
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kComplete) << run.fOutcome.fReason;
+    EXPECT_GT(run.fOutcome.fLostOutputBytes, kFlood - (std::uint64_t{16} << 20));
+    EXPECT_LE(run.fOutcome.fLostOutputBytes, kFlood);
+    EXPECT_EQ(run.fRecorder.fLines.size(), 3U);
+}
+
+TEST(ChildRun, KillsAnEndlessFlood)
+{
+    const Watched run = RunTestChild({"flood", "9000000000000000000"}, 0.5);
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kHung);
+    EXPECT_LT(run.fWallSeconds, 2.5);
+}
+
+TEST(ChildRun, LosesNothingToASlowObserver)
+{
+    Watched run;
+    run.fRecorder.fDelay = std::chrono::milliseconds(100);
+    ChildOptions options;
+    options.fProgram = TEST_CHILD;
+    for (int line = 0; line < 10; ++line) {
+        options.fArgs.emplace_back("out");
+        options.fArgs.push_back("line" + std::to_string(line) + "=1");
+    }
+    run.fOutcome = RunChild(options, run.fRecorder);
+    EXPECT_EQ(run.fRecorder.fLines.size(), 10U);
+}
+
+TEST(ChildRun, TellsWhatNeverStarted)
+{
+    const Watched missing = RunTestChild({}, 30, 0, "no/such/program");
+    EXPECT_EQ(missing.fOutcome.fVerdict, Verdict::kNeverStarted);
+    EXPECT_THAT(missing.fOutcome.fReason, HasSubstr("there is no file no/such/program"));
+    EXPECT_EQ(missing.fRecorder.fStarts, 0);
+    EXPECT_LT(missing.fWallSeconds, 2);
+    const Watched directory = RunTestChild({}, 30, 0, ".");
+    EXPECT_EQ(directory.fOutcome.fVerdict, Verdict::kNeverStarted);
+    EXPECT_THAT(directory.fOutcome.fReason, HasSubstr(". is a directory"));
+    const Watched foreign = RunTestChild({}, 30, 0, __FILE__);
+    EXPECT_EQ(foreign.fOutcome.fVerdict, Verdict::kNeverStarted);
+    EXPECT_EQ(RunTestChild({}, 30, 0, "").fOutcome.fVerdict, Verdict::kNeverStarted);
+}
+
+TEST(ChildRun, WorksAgainAndAgain)
+{
+    for (int round = 0; round < 20; ++round)
+        EXPECT_EQ(RunTestChild(kWhole).fOutcome.fVerdict, Verdict::kComplete);
+}
+
+// A stream that never brings anything and never ends, as one that another process holds.
+class SilentReader : public pmutil::Reader {
+public:
+    ~SilentReader() override = default;
+
+protected:
+    void BinioClose() override { fOpen = false; }
+    bool BinioIsOpen() const override { return fOpen; }
+    std::uint64_t BinioReadSome(void* /*bytes*/, std::uint64_t /*nbytes*/) override
+    {
+        std::this_thread::sleep_for(std::chrono::seconds(10));
+        return 0;
+    }
+
+private:
+    bool fOpen = true;
+};
+
+// Its child can't be killed, or leaves streams that can't be ended.
+class StubbornLauncher : public pmutil::Launcher {
+public:
+    explicit StubbornLauncher(bool ends) : fEnds(ends) {}
+
+    pmutil::LaunchResult Launch(const std::wstring& /*program*/,
+                                const std::deque<std::string>& /*args*/) override
+    {
+        pmutil::LaunchResult result;
+        result.fAppOutput[1] = boost::make_shared<SilentReader>();
+        result.fAppOutput[2] = boost::make_shared<SilentReader>();
+        return result;
+    }
+    pmutil::WaitResult Wait(int* exitCode) override
+    {
+        if (!fEnds)
+            std::this_thread::sleep_for(std::chrono::seconds(10));
+        *exitCode = 0;
+        return pmutil::kEndedNormally;
+    }
+    void Kill() override { throw std::runtime_error("no"); }
+
+private:
+    const bool fEnds;
+};
+
+Watched RunStubborn(bool ends)
+{
+    Watched run;
+    ChildOptions options;
+    options.fProgram = "stubborn";
+    options.fTimeoutSeconds = 0.3;
+    const auto start = std::chrono::steady_clock::now();
+    run.fOutcome = RunChild(options, run.fRecorder, boost::make_shared<StubbornLauncher>(ends));
+    run.fWallSeconds =
+        std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+    return run;
+}
+
+TEST(ChildRun, GivesUpAChildThatOutlivesItsKill)
+{
+    const Watched run = RunStubborn(false);
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kHung);
+    EXPECT_THAT(run.fOutcome.fReason, HasSubstr("which it did not"));
+    EXPECT_TRUE(run.fOutcome.fLeftBehind);
+    EXPECT_LT(run.fWallSeconds, 2.3);
+}
+
+TEST(ChildRun, GivesUpStreamsThatDontEnd)
+{
+    const Watched run = RunStubborn(true);
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kFailedTests);
+    EXPECT_TRUE(run.fOutcome.fLeftBehind);
+    EXPECT_LT(run.fWallSeconds, 2.3);
+}
+
+} // namespace
+} // namespace assay_host

@@ -1,0 +1,148 @@
+#include "supervise/Judge.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "Reports.h"
+
+namespace assay_host {
+namespace {
+
+using testing::HasSubstr;
+
+struct Case {
+    std::string fReport;
+    std::vector<std::string> fErrors;
+    std::vector<std::string> fArgs;
+    std::optional<ChildEnd> fEnd;
+    KillReason fKillReason = KillReason::kNone;
+    std::string fTermination{};
+
+    RunOutcome Judge() const
+    {
+        Evidence evidence;
+        const Report report = ReadReport(fReport);
+        for (const ReportLine& line : report.GetLines())
+            evidence.fReport.Add(line);
+        evidence.fEnd = fEnd;
+        evidence.fKillReason = fKillReason;
+        evidence.fTermination = fTermination;
+        RunOutcome outcome;
+        outcome.fCommand = {"assay"};
+        outcome.fCommand.insert(outcome.fCommand.end(), fArgs.begin(), fArgs.end());
+        outcome.fErrorLines = fErrors;
+        outcome.fTimeoutSeconds = 5;
+        assay_host::Judge(evidence, outcome);
+        return outcome;
+    }
+};
+
+ChildEnd Ended(int status)
+{
+    return {pmutil::kEndedNormally, status};
+}
+
+const std::string kWhole = "assayStart=\"x\"\nassayEnd=\"y\"\n";
+const std::string kBroken = "assayStart=\"x\"\nQGFCoreInitialized=1\n";
+
+TEST(Judge, CallsAWholeReportWithTheStatusAskedForComplete)
+{
+    EXPECT_EQ((Case{kWhole, {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kComplete);
+    EXPECT_EQ((Case{kWhole, {}, {"-exit=7"}, Ended(7)}.Judge().fVerdict), Verdict::kComplete);
+    EXPECT_EQ((Case{kWhole, {}, {"-exit=0x107"}, Ended(7)}.Judge().fVerdict), Verdict::kComplete);
+    EXPECT_EQ((Case{kWhole, {}, {"-exit=7", "-exit=\"3\""}, Ended(3)}.Judge().fVerdict),
+              Verdict::kComplete);
+    EXPECT_EQ((Case{kWhole, {"a driver's words"}, {"-exit=2"}, Ended(2)}.Judge().fVerdict),
+              Verdict::kComplete);
+}
+
+TEST(Judge, KnowsALargeStatusThatWasAskedFor)
+{
+    Case large{kWhole, {}, {"-exit=300"}, ChildEnd{pmutil::kEndedByCrash, 0}};
+    large.fTermination = "code 0x0000012C";
+    EXPECT_EQ(large.Judge().fVerdict, Verdict::kComplete);
+    large.fTermination = "code 0xC0000005";
+    EXPECT_EQ(large.Judge().fVerdict, Verdict::kCrashed);
+}
+
+TEST(Judge, CallsAnyOtherEndFailed)
+{
+    EXPECT_EQ((Case{kWhole, {}, {}, Ended(2)}.Judge().fVerdict), Verdict::kFailedTests);
+    EXPECT_EQ((Case{kWhole, {}, {"-exit=7"}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
+    EXPECT_EQ((Case{kBroken, {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
+    EXPECT_EQ((Case{"", {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
+    const RunOutcome told = Case{kWhole, {"exception: x"}, {"-exit=2"}, Ended(2)}.Judge();
+    EXPECT_EQ(told.fVerdict, Verdict::kFailedTests);
+    EXPECT_THAT(told.fReason, HasSubstr("exception: x"));
+    EXPECT_EQ(told.fExitStatus, 2);
+    EXPECT_THAT((Case{kBroken, {}, {}, Ended(2)}.Judge().fReason),
+                HasSubstr("behind QGFCoreInitialized, at QGFOGLInitialized"));
+    EXPECT_THAT((Case{"", {}, {}, Ended(0)}.Judge().fReason), HasSubstr("before its first line"));
+}
+
+TEST(Judge, KnowsAUsageErrorByStatusAndText)
+{
+    const std::vector<std::string> usage = {"Usage exception: usage", "usage: "};
+    EXPECT_EQ((Case{"# text\n", usage, {}, Ended(3)}.Judge().fVerdict), Verdict::kUsageError);
+    EXPECT_EQ((Case{"", {}, {}, Ended(3)}.Judge().fVerdict), Verdict::kFailedTests);
+    EXPECT_EQ((Case{"", usage, {}, Ended(4)}.Judge().fVerdict), Verdict::kFailedTests);
+    EXPECT_EQ((Case{kWhole, usage, {"-exit=3"}, Ended(3)}.Judge().fVerdict), Verdict::kComplete);
+}
+
+TEST(Judge, TellsACrashFromAHangAndFromAnInterrupt)
+{
+    Case died{kBroken, {}, {}, ChildEnd{pmutil::kEndedByCrash, 0}};
+    died.fTermination = "signal 11 (Segmentation fault)";
+    EXPECT_EQ(died.Judge().fVerdict, Verdict::kCrashed);
+    EXPECT_EQ(died.Judge().fTermination, died.fTermination);
+    EXPECT_THAT(died.Judge().fReason, HasSubstr(died.fTermination));
+    EXPECT_EQ(died.Judge().fExitStatus, std::nullopt);
+    EXPECT_EQ(died.Judge().fLastReportLine, "QGFCoreInitialized=1");
+
+    died.fKillReason = KillReason::kInterrupt; // Ctrl-C reaches the child too
+    EXPECT_EQ(died.Judge().fVerdict, Verdict::kInterrupted);
+    died.fEnd->fResult = pmutil::kEndedByKill;
+    EXPECT_EQ(died.Judge().fVerdict, Verdict::kInterrupted);
+    died.fKillReason = KillReason::kTimeout;
+    EXPECT_EQ(died.Judge().fVerdict, Verdict::kHung);
+    EXPECT_THAT(died.Judge().fReason, HasSubstr("within 5 s and was killed"));
+
+    // The whole report doesn't help a child that never came to its end.
+    died.fReport = kWhole;
+    EXPECT_EQ(died.Judge().fVerdict, Verdict::kHung);
+}
+
+TEST(Judge, KeepsAnEndThatCameJustBeforeTheKill)
+{
+    Case ended{kWhole, {}, {}, Ended(0)};
+    for (const KillReason reason : {KillReason::kTimeout, KillReason::kInterrupt}) {
+        ended.fKillReason = reason;
+        EXPECT_EQ(ended.Judge().fVerdict, Verdict::kComplete);
+    }
+}
+
+TEST(ReportProgress, KeepsALogLineOnlyBehindTheLastReportLine)
+{
+    ReportProgress progress;
+    const Report first = ReadReport("# one\na=1\n");
+    for (const ReportLine& line : first.GetLines())
+        progress.Add(line);
+    EXPECT_EQ(progress.GetLastLogLine(), "");
+    const Report second = ReadReport("# two\nraw\n");
+    for (const ReportLine& line : second.GetLines())
+        progress.Add(line);
+    EXPECT_EQ(progress.GetLastLogLine(), "# two");
+    EXPECT_EQ(progress.GetLastReportLine(), "a=1");
+}
+
+TEST(GetAskedStatus, ReadsAsTheChildDoes)
+{
+    EXPECT_EQ(GetAskedStatus({}), 0);
+    EXPECT_EQ(GetAskedStatus({"-exit=010"}), 8);
+    EXPECT_EQ(GetAskedStatus({"-exit=7x"}), 7);
+    EXPECT_EQ(GetAskedStatus({"-exit="}), 0);
+    EXPECT_EQ(GetAskedStatus({"exit=7", "-exit"}), 0);
+}
+
+} // namespace
+} // namespace assay_host
