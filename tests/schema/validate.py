@@ -1,0 +1,101 @@
+#!/usr/bin/env python3
+"""Validates JSON that the host made against the schemas that it ships.
+
+usage: validate.py FILE-OR-FOLDER...
+
+A .json file is a document, a .jsonl file has one event a line. A folder stands for what is in it,
+and must hold something.
+"""
+
+import json
+import pathlib
+import sys
+
+import jsonschema
+
+SCHEMAS = pathlib.Path(__file__).resolve().parents[2] / "host" / "schema"
+
+
+def _validator(name):
+    schemas = {path.name: json.loads(path.read_text()) for path in SCHEMAS.glob("*.json")}
+    schema = schemas[name]
+    resolver = jsonschema.RefResolver.from_schema(schema, store=schemas)
+    return jsonschema.Draft202012Validator(schema, resolver=resolver)
+
+
+def _no_constant(name):
+    raise ValueError(f"{name} is no JSON")
+
+
+def _load(text):
+    return json.loads(text, parse_constant=_no_constant)
+
+
+DOCUMENT = _validator("assay-report-1.schema.json")
+EVENT = _validator("assay-events-1.schema.json")
+
+
+def validate_document(data):
+    """The document in these bytes; raises for what is no JSON, or not of the schema."""
+    document = _load(data.decode("utf-8"))
+    DOCUMENT.validate(document)
+    return document
+
+
+def validate_events(data):
+    """The events in these bytes, one a line; raises as validate_document does."""
+    events = [_load(line) for line in data.decode("utf-8").split("\n") if line]
+    for event in events:
+        EVENT.validate(event)
+    return events
+
+
+def encode(data):
+    """Any bytes as the string that a document has for them."""
+    text = data.decode("utf-8", "surrogateescape")
+    return "".join(
+        chr(0xF700 + ord(character) - 0xDC00)
+        if 0xDC80 <= ord(character) <= 0xDCFF
+        else "".join(chr(0xF700 + byte) for byte in character.encode())
+        if 0xF780 <= ord(character) <= 0xF7FF
+        else character
+        for character in text
+    )
+
+
+def decode(text):
+    """The bytes that a string of a document stands for."""
+    return b"".join(
+        bytes([ord(character) - 0xF700])
+        if 0xF780 <= ord(character) <= 0xF7FF
+        else character.encode()
+        for character in text
+    )
+
+
+def report_bytes(document):
+    """The report of a document as it came, byte by byte."""
+    return b"".join(decode(line["text"]) + line["end"].encode() for line in document["lines"])
+
+
+def main(arguments):
+    files = []
+    for argument in map(pathlib.Path, arguments):
+        found = sorted(argument.glob("*.json*")) if argument.is_dir() else [argument]
+        if not found:
+            sys.exit(f"{argument}: nothing to validate")
+        files += found
+    failed = 0
+    for path in files:
+        validate = validate_events if path.suffix == ".jsonl" else validate_document
+        try:
+            validate(path.read_bytes())
+        except (ValueError, jsonschema.ValidationError) as failure:
+            failed += 1
+            print(f"{path}: {failure}", file=sys.stderr)
+    print(f"{len(files)} files, {failed} not valid")
+    return failed > 0
+
+
+if __name__ == "__main__":
+    sys.exit(main(sys.argv[1:]))

@@ -1,0 +1,46 @@
+// Keeps the JSON that a test makes in the folder ASSAY_JSON, if that is set, for another test to
+// validate.
+#pragma once
+
+#include <cstdlib>
+#include <fstream>
+#include <string>
+
+#include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+
+namespace assay_host {
+
+using Json = nlohmann::ordered_json;
+
+inline void SaveText(const std::string& text, const char* ending)
+{
+    const char* const folder = std::getenv("ASSAY_JSON");
+    if (!folder)
+        return;
+    static int count = 0;
+    const auto* const test = testing::UnitTest::GetInstance()->current_test_info();
+    const std::string path = std::string(folder) + "/" + test->test_suite_name() + "." +
+                             test->name() + "." + std::to_string(count++) + ending;
+    std::ofstream file(path, std::ios::binary);
+    file << text;
+    file.close();
+    EXPECT_TRUE(file) << path;
+}
+
+// The JSON as its reader gets it.
+inline Json SaveDocument(const Json& document)
+{
+    const std::string text = document.dump(2);
+    SaveText(text, ".json");
+    return Json::parse(text);
+}
+
+inline Json SaveEvent(const Json& event)
+{
+    const std::string text = event.dump() + "\n";
+    SaveText(text, ".jsonl");
+    return Json::parse(text);
+}
+
+} // namespace assay_host
