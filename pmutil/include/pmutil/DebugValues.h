@@ -29,6 +29,9 @@ struct DebugValue {
 // The value behind a record, to be read and written directly from any thread.
 using DebugInteger = std::atomic<std::int32_t>;
 
+// The name under which a process would be handed such values from outside. Nothing reads it.
+inline constexpr char kDebugFlagsName[] = "AssayDebugFlags";
+
 namespace detail {
 // Slot 0 is never assigned, so 100 names fit. It isn't 0, so that a record that isn't resolved yet
 // reads as one that may be set.

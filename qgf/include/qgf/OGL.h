@@ -153,8 +153,7 @@ enum class Type : std::int32_t { Default = -1 };
 class Texture2D {
 public:
     // `data` may be null: the content is undefined then. `mipmaps` asks for a full set of levels.
-    // Leaves no texture bound. Doesn't ask for OpenGL's errors: that is for whoever uses the
-    // texture, once it has been used.
+    // Leaves no texture bound.
     Texture2D(InternalFormat format, std::int32_t width, std::int32_t height, bool mipmaps,
               const void* data, Type type);
     ~Texture2D();
@@ -181,7 +180,8 @@ public:
     void unbind();
 
     // Attaches a level of the texture as the colour attachment of that index. The framebuffer must
-    // be bound. Throws if the driver then doesn't call the framebuffer complete.
+    // be bound. Throws if the driver then doesn't call the framebuffer complete; the first OpenGL
+    // error in the queue, most often that of the texture, goes into the text.
     void attach(const Texture2D& texture, std::uint32_t attachment, std::uint32_t level);
 
 private:

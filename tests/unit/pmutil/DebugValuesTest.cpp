@@ -49,6 +49,11 @@ TEST_F(DebugValuesTest, RecordsWithOneNameShareTheValue)
     EXPECT_EQ(GetDebugValue(first), 3);
 }
 
+TEST_F(DebugValuesTest, NameForValuesFromOutsideIsKept)
+{
+    EXPECT_STREQ(kDebugFlagsName, "AssayDebugFlags");
+}
+
 TEST_F(DebugValuesTest, UnresolvedRecordMayBeSet)
 {
     static DebugValue record{"DebugValuesTest.maybe", 0};
