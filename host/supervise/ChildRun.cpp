@@ -54,8 +54,14 @@ public:
     RunOutcome Run()
     {
         if (Launch()) {
-            fObserver.OnStart();
-            Follow();
+            try {
+                fObserver.OnStart();
+                Follow();
+            } catch (...) {
+                KillDirectly();
+                fQueue->Close();
+                throw;
+            }
             Finish();
         }
         fOutcome.fLeftBehind = fLeftBehind;

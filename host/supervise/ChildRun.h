@@ -20,7 +20,7 @@ struct ChildOptions {
 };
 
 // Told what comes while the child runs. All calls come from the thread that called RunChild, which
-// can't look after the child meanwhile.
+// can't look after the child meanwhile. What a call throws ends the child and leaves RunChild.
 class RunObserver {
 public:
     virtual ~RunObserver() = default;

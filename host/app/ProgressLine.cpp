@@ -1,0 +1,42 @@
+#include "app/ProgressLine.h"
+
+#include <algorithm>
+#include <cstdio>
+
+#include "app/Terminal.h"
+
+namespace assay_host {
+
+ProgressLine::ProgressLine() : fShows(IsErrorTerminal()) {}
+
+ProgressLine::~ProgressLine()
+{
+    Clear();
+}
+
+void ProgressLine::Show(std::string text)
+{
+    if (!fShows)
+        return;
+    // The last column would wrap. What isn't ASCII has a width of its own.
+    text.resize(std::min(text.size(), static_cast<std::size_t>(GetErrorWidth() - 1)));
+    std::replace_if(
+        text.begin(), text.end(), [](char byte) { return byte < ' ' || byte > '~'; }, '?');
+    const std::size_t length = text.size();
+    if (length < fLength)
+        text.append(fLength - length, ' ');
+    fLength = length;
+    std::fprintf(stderr, "\r%s", text.c_str());
+    std::fflush(stderr);
+}
+
+void ProgressLine::Clear()
+{
+    if (fLength == 0)
+        return;
+    std::fprintf(stderr, "\r%s\r", std::string(fLength, ' ').c_str());
+    std::fflush(stderr);
+    fLength = 0;
+}
+
+} // namespace assay_host

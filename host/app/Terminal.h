@@ -1,0 +1,17 @@
+// What this program's own streams are.
+#pragma once
+
+namespace assay_host {
+
+// Standard output takes bytes as they are from now on, also where text would get other line ends.
+void PrepareStandardOutput();
+
+bool IsErrorTerminal();
+
+// The columns of the terminal behind standard output, or what is usual where there is none.
+int GetOutputWidth();
+
+// The same for standard error.
+int GetErrorWidth();
+
+} // namespace assay_host

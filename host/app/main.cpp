@@ -1,0 +1,60 @@
+// assay-host: the host's side for people and scripts.
+#include <cstdio>
+#include <exception>
+#include <string>
+#include <vector>
+
+#include <boost/nowide/args.hpp>
+
+#include "app/CommandLine.h"
+#include "app/Commands.h"
+#include "app/Output.h"
+#include "app/Terminal.h"
+#include "pmutil/System.h"
+
+namespace {
+
+using namespace assay_host;
+
+int Act(const RunChoice& choice)
+{
+    return Run(choice);
+}
+
+int Act(const TortureChoice& choice)
+{
+    return Torture(choice);
+}
+
+int Act(const DiffChoice& choice)
+{
+    return Diff(choice);
+}
+
+int RunMain(const std::vector<std::string>& words)
+{
+    const Parsed parsed = ParseCommandLine(words);
+    if (parsed.fChoice)
+        return std::visit([](const auto& choice) { return Act(choice); }, *parsed.fChoice);
+    if (parsed.fStatus == 0)
+        OpenStandardOutput()->Write(parsed.fText);
+    else
+        std::fputs(parsed.fText.c_str(), stderr);
+    return parsed.fStatus;
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    pmutil::PrepareConsoleProcess();
+    PrepareStandardOutput();
+    const bool isDiff = argc > 1 && std::string(argv[1]) == "diff";
+    try {
+        const boost::nowide::args utf8(argc, argv);
+        return RunMain(std::vector<std::string>(argv + 1, argv + argc));
+    } catch (const std::exception& exc) {
+        std::fprintf(stderr, "assay-host: %s\n", exc.what());
+    }
+    return isDiff ? kDiffTroubleStatus : kTroubleStatus;
+}

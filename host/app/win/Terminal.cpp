@@ -1,0 +1,52 @@
+#include "app/Terminal.h"
+
+#include <windows.h>
+
+#include <cstdio>
+#include <fcntl.h>
+#include <io.h>
+
+namespace assay_host {
+
+namespace {
+
+constexpr int kUsualWidth = 80;
+
+// 0 if it is no console.
+int GetConsoleWidth(DWORD stream)
+{
+    CONSOLE_SCREEN_BUFFER_INFO info = {};
+    if (::GetConsoleScreenBufferInfo(::GetStdHandle(stream), &info) == 0)
+        return 0;
+    return info.srWindow.Right - info.srWindow.Left + 1;
+}
+
+int GetWidth(DWORD stream)
+{
+    const int width = GetConsoleWidth(stream);
+    return width > 0 ? width : kUsualWidth;
+}
+
+} // namespace
+
+void PrepareStandardOutput()
+{
+    ::_setmode(::_fileno(stdout), _O_BINARY);
+}
+
+bool IsErrorTerminal()
+{
+    return GetConsoleWidth(STD_ERROR_HANDLE) > 0;
+}
+
+int GetOutputWidth()
+{
+    return GetWidth(STD_OUTPUT_HANDLE);
+}
+
+int GetErrorWidth()
+{
+    return GetWidth(STD_ERROR_HANDLE);
+}
+
+} // namespace assay_host
