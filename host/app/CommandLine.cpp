@@ -79,7 +79,7 @@ public:
         fFormatter->AddUsage("assay-host", "run|torture|diff [option...]");
         fApp.formatter(fFormatter);
         fApp.set_help_flag("-h,--help", "show this text");
-        fApp.set_version_flag("--version", "assay-host " ASSAY_VERSION);
+        fApp.set_version_flag("--version", "assay-host " ASSAY_VERSION, "show the version");
         fApp.require_subcommand(1);
         fApp.footer("\"assay-host COMMAND --help\" tells more of each.");
         AddRun();
@@ -127,11 +127,9 @@ private:
                        "  3 crashed, 4 hung and killed, 5 never started, 6 interrupted,\n"
                        "  10 trouble with the command line or the output");
         AddChildOptions(*fRunCommand, fRun.fChild);
-        const std::map<std::string, Format> formats = {
-            {"text", Format::kText}, {"json", Format::kJson}, {"jsonl", Format::kJsonLines}};
-        fRunCommand->add_option("--format", fRun.fFormat, "text, json or jsonl [text]")
+        fRunCommand->add_option("--format", fFormat, "text, json or jsonl [text]")
             ->option_text("FORMAT")
-            ->transform(CLI::CheckedTransformer(formats).description("FORMAT"));
+            ->check(CLI::IsMember({"text", "json", "jsonl"}));
         fRunCommand->add_flag("--raw", fRun.fRaw,
                               "the child's own lines first, as they come; with text");
         fRunCommand->add_option("--output", fRun.fOutput, "write there [standard output]")
@@ -148,7 +146,7 @@ private:
         AddChildOptions(*fTortureCommand, fTorture.fChild);
         fTortureCommand->add_option("--kind", fKind, "crash, throw or both [both]")
             ->option_text("KIND")
-            ->check(CLI::IsMember({"crash", "throw", "both"}).description("KIND"));
+            ->check(CLI::IsMember({"crash", "throw", "both"}));
     }
 
     void AddDiff()
@@ -185,6 +183,9 @@ private:
                 fTorture.fFailures.push_back(StepFailure::kThrow);
             return fTorture;
         }
+        fRun.fFormat = fFormat == "json"    ? Format::kJson
+                       : fFormat == "jsonl" ? Format::kJsonLines
+                                            : Format::kText;
         if (fRun.fRaw && fRun.fFormat != Format::kText)
             throw CLI::ValidationError("--raw", "only with --format text");
         fRun.fChild.fArgs = words.fChild;
@@ -201,6 +202,7 @@ private:
     RunChoice fRun;
     TortureChoice fTorture;
     DiffChoice fDiff;
+    std::string fFormat = "text";
     std::string fKind = "both";
 };
 
