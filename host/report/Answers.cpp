@@ -19,11 +19,6 @@ constexpr std::size_t kMostDevices = 256;
 
 constexpr DeviceKind kKinds[] = {DeviceKind::kOpenGL, DeviceKind::kOpenCL};
 
-const char* GetCountKey(DeviceKind kind)
-{
-    return kind == DeviceKind::kOpenGL ? "NumGLGPUs" : "NumCLGPUs";
-}
-
 std::optional<std::size_t> FindKnown(DeviceKind kind, std::string_view key)
 {
     const Table<KnownKey> keys = GetDeviceKeys(kind);
@@ -168,7 +163,7 @@ DeviceAnswers Collector::CollectDevice(DeviceKind kind, std::uint32_t index, con
 void Collector::JudgeMissing(DeviceAnswers& device, const std::optional<Position>& last) const
 {
     const bool isBehind = IsBehind(device.fKind);
-    const bool isTerminated = fTerminated.count(device.fTag) > 0;
+    device.fFailed = fTerminated.count(device.fTag) > 0;
     const std::size_t keys = GetDeviceKeys(device.fKind).size();
     std::size_t answered = 0; // behind the last key that is there
     for (std::size_t key = 0; key < keys; ++key) {
@@ -184,14 +179,13 @@ void Collector::JudgeMissing(DeviceAnswers& device, const std::optional<Position
             answer.fMissing = isOptional ? Missing::kNotPrinted : Missing::kUnreadable;
         } else if (isOptional && device.GetValue("CUDASupported") == "0") {
             answer.fMissing = Missing::kNotPrinted;
-        } else if (isTerminated || isBehind || (last && Position{key, device.fIndex} < *last)) {
+        } else if (device.fFailed || isBehind || (last && Position{key, device.fIndex} < *last)) {
             answer.fMissing = Missing::kDeviceFailed;
             device.fFailed = true;
         } else {
             answer.fMissing = Missing::kRunEnded;
         }
     }
-    device.fFailed = device.fFailed || isTerminated;
 }
 
 void Collector::CollectReportKeys()

@@ -34,9 +34,10 @@ bool Contains(const Range& range, std::string_view text)
 
 std::string ShowAnswer(const Answer* answer)
 {
-    if (!answer || !answer->fLine)
-        return fmt::format("missing ({})", answer ? GetMissingText(answer->fMissing)
-                                                  : GetMissingText(Missing::kNotPrinted));
+    if (!answer)
+        return "missing";
+    if (!answer->fLine)
+        return fmt::format("missing ({})", GetMissingText(answer->fMissing));
     const ReportLine& line = *answer->fLine;
     const std::string text = ShowBytes(line.fValue);
     return line.fQuoted ? "\"" + text + "\"" : text;

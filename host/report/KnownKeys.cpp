@@ -16,11 +16,11 @@ constexpr KnownKey kOpenGLKeys[] = {
     {"GLVersion", "OpenGL version", ValueForm::kText, KeyGroup::kMain},
     {"IsIntegratedGLGPU", "Integrated", ValueForm::kFlag, KeyGroup::kMain},
     {"GLMemoryMB", "Memory", ValueForm::kMebibytes, KeyGroup::kMain},
-    {"GLName", "Adapter", ValueForm::kText, KeyGroup::kMain},
+    {"GLName", "Adapter", ValueForm::kAdapter, KeyGroup::kMain},
     {"GLVendor", "Vendor", ValueForm::kText, KeyGroup::kMain},
     {"GLVendorID", "Vendor id", ValueForm::kId, KeyGroup::kMain},
     {"GLDriverVersion", "Driver version", ValueForm::kText, KeyGroup::kMain},
-    {"GLRectTextureSize", "Largest rectangle texture", ValueForm::kTexels, KeyGroup::kLimit},
+    {"GLRectTextureSize", "Largest rectangle", ValueForm::kTexels, KeyGroup::kMain},
     {"GLRenderer", "Renderer", ValueForm::kText, KeyGroup::kMain},
     {"GLRendererID", "Device id", ValueForm::kId, KeyGroup::kMain},
     {"HasGLNPOTSupport", "Textures of any size", ValueForm::kFlag, KeyGroup::kMain},
@@ -96,6 +96,11 @@ const char* GetKindName(DeviceKind kind)
 const char* GetTagWord(DeviceKind kind)
 {
     return kind == DeviceKind::kOpenGL ? "glgpu" : "clgpu";
+}
+
+const char* GetCountKey(DeviceKind kind)
+{
+    return kind == DeviceKind::kOpenGL ? "NumGLGPUs" : "NumCLGPUs";
 }
 
 Table<KnownKey> GetDeviceKeys(DeviceKind kind)

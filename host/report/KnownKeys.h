@@ -15,9 +15,13 @@ const char* GetKindName(DeviceKind kind);
 // The word of a tag: "glgpu", "clgpu".
 const char* GetTagWord(DeviceKind kind);
 
+// The report's key with their number: "NumGLGPUs", "NumCLGPUs".
+const char* GetCountKey(DeviceKind kind);
+
 // What a value is, which is to say how a person likes to read it.
 enum class ValueForm {
     kText,
+    kAdapter,
     kDate,
     kFlag,
     kCount,

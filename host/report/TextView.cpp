@@ -3,7 +3,10 @@
 #include <algorithm>
 #include <cstddef>
 #include <iterator>
+#include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 #include <fmt/format.h>
 
@@ -34,6 +37,7 @@ constexpr std::string_view kOpenGLRows[] = {
     "CanCompileProgramGLSL",
     "GLFrameBufferOK",
     "HasGLNPOTSupport",
+    "GLRectTextureSize",
 };
 constexpr std::string_view kOpenCLRows[] = {
     "CLName",      "CLVendor",        "CLVendorID",        "IsIntegratedCLGPU",
@@ -168,13 +172,29 @@ private:
         for (const Missing missing :
              {Missing::kUnreadable, Missing::kDeviceFailed, Missing::kRunEnded}) {
             std::string labels;
-            for (const Answer& answer : fDevice.fAnswers) {
-                if (!answer.fLine && answer.fMissing == missing)
-                    AppendToList(labels, GetLabel(answer));
-            }
+            AddLost(labels, KeyGroup::kMain, missing, nullptr);
+            AddLost(labels, KeyGroup::kLimit, missing, "all limits");
+            AddLost(labels, KeyGroup::kExtension, missing, "all extensions");
             if (!labels.empty())
                 fTable.Add("No answer", fmt::format("{} ({})", labels, GetMissingText(missing)));
         }
+    }
+
+    // `all`: what says it shorter if the whole group is missing.
+    void AddLost(std::string& labels, KeyGroup group, Missing missing, const char* all)
+    {
+        std::string some;
+        bool isAll = all != nullptr;
+        for (const Answer& answer : fDevice.fAnswers) {
+            if (!answer.fKnown || answer.fKnown->fGroup != group)
+                continue;
+            if (answer.fMissing == missing)
+                AppendToList(some, GetLabel(answer));
+            else
+                isAll = false;
+        }
+        if (!some.empty())
+            AppendToList(labels, isAll ? all : some);
     }
 
     const DeviceAnswers& fDevice;
@@ -232,18 +252,33 @@ std::string GetTimeText(const RunOutcome& outcome)
     return text;
 }
 
+// "2 OpenGL, no OpenCL"
 std::string GetCountText(const Answers& answers)
 {
-    const auto count = [&answers](DeviceKind kind) {
-        return std::count_if(answers.fDevices.begin(), answers.fDevices.end(),
-                             [kind](const DeviceAnswers& device) { return device.fKind == kind; });
-    };
-    const bool isWithout =
-        std::any_of(answers.fReport.begin(), answers.fReport.end(),
-                    [](const Answer& answer) { return answer.fMissing == Missing::kNoOpenCL; });
-    return fmt::format("{} OpenGL, {}", count(DeviceKind::kOpenGL),
-                       isWithout ? "no OpenCL"
-                                 : fmt::format("{} OpenCL", count(DeviceKind::kOpenCL)));
+    std::string text;
+    for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL}) {
+        const auto count =
+            std::count_if(answers.fDevices.begin(), answers.fDevices.end(),
+                          [kind](const DeviceAnswers& device) { return device.fKind == kind; });
+        const auto answer =
+            std::find_if(answers.fReport.begin(), answers.fReport.end(),
+                         [kind](const Answer& row) { return row.fKey == GetCountKey(kind); });
+        const char* const name = GetKindName(kind);
+        if (answer->fMissing == Missing::kNoOpenCL)
+            AppendToList(text, fmt::format("no {}", name));
+        else if (answer->fMissing == Missing::kRunEnded && count == 0)
+            AppendToList(text, fmt::format("{} not reached", name));
+        else
+            AppendToList(text, fmt::format("{} {}", count, name));
+    }
+    return text;
+}
+
+bool HasValues(const Report& report)
+{
+    const std::vector<ReportLine>& lines = report.GetLines();
+    return std::any_of(lines.begin(), lines.end(),
+                       [](const ReportLine& line) { return line.fKind == LineKind::kValue; });
 }
 
 void PrintVerdict(std::ostream& out, const Report& report, const Answers& answers,
@@ -261,9 +296,9 @@ void PrintVerdict(std::ostream& out, const Report& report, const Answers& answer
     add("Exit status", outcome.fExitStatus ? std::to_string(*outcome.fExitStatus) : "");
     add("Command", GetCommandText(outcome));
     add("Time", GetTimeText(outcome));
-    if (!report.GetLines().empty())
+    if (HasValues(report))
         add("Devices", GetCountText(answers));
-    if (!report.IsWhole() && !report.GetLines().empty()) {
+    if (HasValues(report) && !report.IsWhole()) {
         add("Last report line", ShowBytes(outcome.fLastReportLine));
         add("Last log line", ShowBytes(outcome.fLastLogLine));
         add("Next to report", answers.fNext);

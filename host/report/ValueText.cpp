@@ -17,6 +17,12 @@ namespace {
 
 constexpr const char* kNotKnown = "not known";
 
+// Blanks at the end of a name are nothing to look at.
+std::string_view TrimEnd(std::string_view text)
+{
+    return text.substr(0, text.find_last_not_of(' ') + 1);
+}
+
 // Up to two decimals, without zeros at the end.
 std::string TrimNumber(double value)
 {
@@ -61,7 +67,8 @@ std::optional<std::string> GetSpeedText(std::string_view value)
         return std::nullopt;
     for (const Unit& unit : kUnits) {
         if (*speed >= unit.fSize)
-            return fmt::format("{:.4g} {}", *speed / unit.fSize, unit.fName);
+            return fmt::format(*speed < 1e15 ? "{:.4g} {}" : "{:.0f} {}", *speed / unit.fSize,
+                               unit.fName);
     }
     return fmt::format("{:.4g} B/s", *speed);
 }
@@ -100,6 +107,10 @@ std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
     switch (form) {
     case ValueForm::kText:
         break;
+    case ValueForm::kAdapter:
+        if (value.empty())
+            return "none of the system's";
+        break;
     case ValueForm::kDate:
         return GetDateText(value);
     case ValueForm::kFlag:
@@ -137,7 +148,7 @@ std::string GetValueText(const Answer& answer)
     if (!text && answer.fLine->fQuoted && value == "?")
         text = kNotKnown;
     if (!text)
-        text = ShowBytes(value);
+        text = ShowBytes(TrimEnd(value));
     if (answer.fLine->fCut)
         *text += "... (cut)";
     return *text;

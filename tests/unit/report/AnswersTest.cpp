@@ -107,6 +107,7 @@ TEST(Answers, TellAFailedDeviceFromTheOneThatWasUnderWay)
         Sample(3, 0).Fail("glgpu[0]", "GLName").EndBehind("glgpu[1].GLVendor").GetText());
     const Answers answers = GetAnswers(report);
     EXPECT_EQ(Tell(answers, "glgpu[0]", "GLName"), "- device failed before");
+    EXPECT_EQ(Tell(answers, "glgpu[0]", "GLFrameBufferOK"), "- device failed before");
     EXPECT_EQ(Tell(answers, "glgpu[1]", "GLVendor"), "Example Corporation");
     EXPECT_EQ(Tell(answers, "glgpu[1]", "GLVendorID"), "- run ended before");
     EXPECT_EQ(Tell(answers, "glgpu[2]", "GLName"), "Accelerator 4000");

@@ -1,0 +1,154 @@
+#include <gtest/gtest.h>
+
+#include <sstream>
+#include <string>
+
+#include "Lines.h"
+#include "Samples.h"
+#include "report/Diff.h"
+
+namespace assay_host {
+namespace {
+
+std::string Diff(const std::string& before, const std::string& after, double tolerance = 0.1)
+{
+    std::ostringstream out;
+    DiffOptions options;
+    options.fTolerance = tolerance;
+    const bool differs = PrintDiff(out, ReadReport(before), ReadReport(after), options);
+    EXPECT_EQ(differs, !out.str().empty());
+    return out.str();
+}
+
+std::string Diff(Sample before, Sample after, double tolerance = 0.1)
+{
+    return Diff(before.GetText(), after.GetText(), tolerance);
+}
+
+TEST(Diff, OfTheSameReportIsNone)
+{
+    EXPECT_EQ(Diff(Sample(2, 2), Sample(2, 2)), "");
+    EXPECT_EQ(Diff("", ""), "");
+}
+
+TEST(Diff, LeavesOutStampsAndLogLines)
+{
+    EXPECT_EQ(
+        Diff(Sample(1, 1).GetText(),
+             "# log\n" +
+                 Sample(1, 1).Set("assayStart", "\"2027\"").Set("assayEnd", "\"2028\"").GetText()),
+        "");
+}
+
+TEST(Diff, LeavesOutHowLinesEnd)
+{
+    std::string text = Sample(1, 1).GetText();
+    std::string windows;
+    for (const char character : text)
+        windows += character == '\n' ? std::string("\r\n") : std::string(1, character);
+    EXPECT_EQ(Diff(text, windows), "");
+}
+
+TEST(Diff, TellsAChangedValue)
+{
+    EXPECT_EQ(Diff(Sample(2, 1), Sample(2, 1)
+                                     .Set("QGFOGLInitialized", "0")
+                                     .Set("glgpu[1].GLDriverVersion", "\"32.0\"")
+                                     .Set("clgpu[0].CLMemoryMB", "8192")),
+              "QGFOGLInitialized: 1 -> 0\n"
+              "glgpu[1].GLDriverVersion: \"31.0.15.2802\" -> \"32.0\"\n"
+              "clgpu[0].CLMemoryMB: 24564 -> 8192\n");
+    EXPECT_EQ(Diff("a=\"1\"\n", "a=1\n"), "a: \"1\" -> 1\n");
+    EXPECT_EQ(Diff("a=\"\x1B\"\n", "a=\"\xFF\n\"\n"), "a: \"\\x1B\" -> \"\\xFF\\n\"\n");
+}
+
+TEST(Diff, AllowsMeasuredNumbersTheirTolerance)
+{
+    const auto diff = [](const char* before, const char* after, double tolerance) {
+        return Diff(Sample(0, 1).Set("clgpu[0].CLBandwidth", before),
+                    Sample(0, 1).Set("clgpu[0].CLBandwidth", after), tolerance);
+    };
+    EXPECT_EQ(diff("1e+11", "9.1e+10", 0.1), "");
+    EXPECT_EQ(diff("9.1e+10", "1e+11", 0.1), "");
+    EXPECT_EQ(diff("1e+11", "8.9e+10", 0.1), "clgpu[0].CLBandwidth: 1e+11 -> 8.9e+10\n");
+    EXPECT_EQ(diff("8.9e+10", "1e+11", 0.1), "clgpu[0].CLBandwidth: 8.9e+10 -> 1e+11\n");
+    EXPECT_EQ(diff("1e+11", "1.01e+11", 0), "clgpu[0].CLBandwidth: 1e+11 -> 1.01e+11\n");
+    EXPECT_EQ(diff("1e+11", "1e+11", 0), "");
+    EXPECT_EQ(diff("0", "1", 0.5), "clgpu[0].CLBandwidth: 0 -> 1\n");
+    EXPECT_EQ(diff("0", "1", 1), "");
+    EXPECT_EQ(diff("inf", "1e+11", 1), "clgpu[0].CLBandwidth: inf -> 1e+11\n");
+    EXPECT_EQ(diff("inf", "inf", 0), "");
+    EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CLCompute", "1200")), "");
+    EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CLCompute", "1000")),
+              "clgpu[0].CLCompute: 1234.56 -> 1000\n");
+    EXPECT_EQ(Diff(Sample(1, 0), Sample(1, 0).Set("glgpu[0].GLMemoryMB", "24563"), 0.5),
+              "glgpu[0].GLMemoryMB: 24564 -> 24563\n");
+}
+
+TEST(Diff, TellsWhatIsMissingAndWhy)
+{
+    EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CUDAVersion", "")),
+              "clgpu[0].CUDAVersion: \"12.0.89\" -> missing (not printed by this device)\n");
+    EXPECT_EQ(Diff(Sample(0, 1).Fail("clgpu[0]", "CLCompute"), Sample(0, 1)),
+              "clgpu[0].CLCompute: missing (device failed before) -> 1234.56\n");
+    EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).EndBehind("clgpu[0].CLBandwidth")),
+              "report: whole -> broken off\n"
+              "clgpu[0].CLCompute: 1234.56 -> missing (run ended before)\n");
+    EXPECT_EQ(Diff(Sample(0, 0), Sample(0, -1)), "NumCLGPUs: 0 -> missing (no OpenCL)\n");
+    EXPECT_EQ(Diff("a=1\nglgpu[0].x=1\n", "b=2\nglgpu[0].y=2\n"), "a: 1 -> missing\n"
+                                                                  "b: missing -> 2\n"
+                                                                  "glgpu[0].x: 1 -> missing\n"
+                                                                  "glgpu[0].y: missing -> 2\n");
+}
+
+Sample Named(int count, const char* first, const char* second)
+{
+    return Sample(count, 0)
+        .Set("glgpu[0].GLName", std::string("\"") + first + "\"")
+        .Set("glgpu[1].GLName", std::string("\"") + second + "\"");
+}
+
+TEST(Diff, MatchesDevicesByName)
+{
+    EXPECT_EQ(Diff(Named(2, "A", "B"), Named(2, "B", "A")), "glgpu[0] \"A\": now glgpu[1]\n"
+                                                            "glgpu[1] \"B\": now glgpu[0]\n");
+    EXPECT_EQ(Diff(Named(2, "A", "B"), Named(2, "B", "A").Set("glgpu[0].GLMemoryMB", "1")),
+              "glgpu[0] \"A\": now glgpu[1]\n"
+              "glgpu[1] \"B\": now glgpu[0]\n"
+              "glgpu[1].GLMemoryMB: 24564 -> 1\n");
+    EXPECT_EQ(Diff(Named(2, "A", "B"), Named(1, "B", "")),
+              "NumGLGPUs: 2 -> 1\n"
+              "glgpu[0] \"A\": only in the first report\n"
+              "glgpu[1] \"B\": now glgpu[0]\n");
+    EXPECT_EQ(Diff(Named(1, "A", ""), Named(2, "B", "A")),
+              "NumGLGPUs: 1 -> 2\n"
+              "glgpu[0] \"B\": only in the second report\n"
+              "glgpu[0] \"A\": now glgpu[1]\n");
+}
+
+TEST(Diff, MatchesEqualNamesByPlace)
+{
+    EXPECT_EQ(Diff(Named(2, "A", "A"), Named(2, "A", "A").Set("glgpu[1].GLMemoryMB", "1")),
+              "glgpu[1].GLMemoryMB: 24564 -> 1\n");
+    EXPECT_EQ(Diff(Named(2, "A", "A"), Named(2, "B", "A")), "glgpu[0].GLName: \"A\" -> \"B\"\n");
+}
+
+TEST(Diff, MatchesByPlaceWhatHasNoNameInCommon)
+{
+    EXPECT_EQ(Diff(Named(1, "A", ""), Named(1, "B", "")), "glgpu[0].GLName: \"A\" -> \"B\"\n");
+    EXPECT_EQ(Diff("glgpu[0].GLVendor=\"A\"\n", "glgpu[0].GLVendor=\"B\"\n"),
+              "glgpu[0].GLVendor: \"A\" -> \"B\"\n");
+    EXPECT_EQ(Diff("glgpu[0].x=1\n", "clgpu[0].x=1\n"), "glgpu[0]: only in the first report\n"
+                                                        "clgpu[0]: only in the second report\n");
+}
+
+TEST(Diff, TellsLinesThatAreNoReportLines)
+{
+    EXPECT_EQ(Diff("a=1\nx\ny\ny\n", "y\na=1\nz\x1B\n"),
+              "other line, only in the first report: x\n"
+              "other line, only in the first report: y\n"
+              "other line, only in the second report: z\\x1B\n");
+}
+
+} // namespace
+} // namespace assay_host

@@ -1,0 +1,102 @@
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "Lines.h"
+#include "report/ValueText.h"
+
+namespace assay_host {
+namespace {
+
+// How the value of a device's key is shown, as it stands in a report.
+std::string Show(const std::string& line)
+{
+    const Report report = ReadReport(line + "\n");
+    const Answers answers = GetAnswers(report);
+    for (const Answer& answer : answers.fDevices.at(0).fAnswers) {
+        if (answer.fLine)
+            return GetValueText(answer);
+    }
+    return "no value";
+}
+
+TEST(ValueText, HasSensibleUnits)
+{
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=0"), "not known");
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=512"), "512 MiB");
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=1023"), "1023 MiB");
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=1024"), "1 GiB");
+    EXPECT_EQ(Show("clgpu[0].CLMemoryMB=1536"), "1.5 GiB");
+    EXPECT_EQ(Show("clgpu[0].CLMemoryMB=24564"), "23.99 GiB");
+    EXPECT_EQ(Show("clgpu[0].CLMemoryMB=81920"), "80 GiB");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=0"), "0 B/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=999"), "999 B/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=1500"), "1.5 kB/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=2.5e+06"), "2.5 MB/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=8.34512e+11"), "834.5 GB/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=3.2e+12"), "3.2 TB/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=3.35544e+16"), "33554 TB/s");
+    EXPECT_EQ(Show("clgpu[0].CLCompute=1234.56"), "1234.56");
+    EXPECT_EQ(Show("glgpu[0].GLRectTextureSize=16384"), "16384 texels");
+    EXPECT_EQ(Show("glgpu[0].glGetIntegerv[GL_MAX_TEXTURE_UNITS]=[8]"), "8");
+    EXPECT_EQ(Show("glgpu[0].glGetIntegerv[GL_MAX_TEXTURE_UNITS]=[8, 4]"), "[8, 4]");
+}
+
+TEST(ValueText, HasIdsAsBooksHaveThem)
+{
+    EXPECT_EQ(Show("glgpu[0].GLVendorID=4318"), "0x10DE (4318)");
+    EXPECT_EQ(Show("glgpu[0].GLRendererID=1"), "0x0001 (1)");
+    EXPECT_EQ(Show("clgpu[0].CLVendorID=65541"), "0x10005 (65541)");
+    EXPECT_EQ(Show("glgpu[0].GLVendorID=0"), "not known");
+}
+
+TEST(ValueText, HasWordsForFlagsAndForWhatIsNotKnown)
+{
+    EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=1"), "yes");
+    EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=0"), "no");
+    EXPECT_EQ(Show("glgpu[0].GLDriver=\"?\""), "not known");
+    EXPECT_EQ(Show("glgpu[0].GLDriver=\"\""), "(empty)");
+    EXPECT_EQ(Show("glgpu[0].GLName=\"\""), "none of the system's");
+    EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"?\""), "not known");
+    EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"20210315000000.000000-000\""), "2021-03-15");
+    EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"March 2021\""), "March 2021");
+}
+
+TEST(ValueText, ShowsWhatHasAnotherFormAsItCame)
+{
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=much"), "much");
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=-1"), "-1");
+    EXPECT_EQ(Show("glgpu[0].GLVendorID=0x10DE"), "0x10DE");
+    EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=2"), "2");
+    EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK="), "");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=inf"), "inf");
+    EXPECT_EQ(Show("glgpu[0].GLRectTextureSize=big"), "big");
+    EXPECT_EQ(Show("glgpu[0].Extra=\"a\tb\x80\""), "a\\tb\\x80");
+    EXPECT_EQ(Show("glgpu[0].GLRenderer=\"3.0  \""), "3.0");
+}
+
+TEST(ValueText, SaysWhatWasCutAndWhatIsMissing)
+{
+    ReportReader::Limits limits;
+    limits.fMaxLineBytes = 28;
+    Report report;
+    report.Add(ReadLines("glgpu[0].GLRenderer=\"0123456789\"\n", 100, limits));
+    const Answers answers = GetAnswers(report);
+    EXPECT_EQ(GetValueText(answers.fDevices.at(0).fAnswers.at(8)), "0123456... (cut)");
+    EXPECT_EQ(GetValueText(answers.fDevices.at(0).fAnswers.at(9)), "- (run ended before)");
+}
+
+TEST(ValueText, NamesADevice)
+{
+    const Report report = ReadReport("glgpu[0].GLName=\"A\"\nglgpu[0].GLRenderer=\"B\"\n"
+                                     "glgpu[1].GLName=\"\"\nglgpu[1].GLRenderer=\"C\"\n"
+                                     "glgpu[2].GLVendor=\"D\"\nclgpu[0].CLName=\"E\"\n");
+    const Answers answers = GetAnswers(report);
+    EXPECT_EQ(GetDeviceName(answers.fDevices.at(0)), "A");
+    EXPECT_EQ(GetDeviceName(answers.fDevices.at(1)), "C");
+    EXPECT_EQ(GetDeviceName(answers.fDevices.at(2)), "");
+    EXPECT_EQ(GetDeviceName(answers.fDevices.at(3)), "E");
+}
+
+} // namespace
+} // namespace assay_host
