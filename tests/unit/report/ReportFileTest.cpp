@@ -1,0 +1,104 @@
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <fstream>
+#include <stdexcept>
+#include <string>
+
+#include "Lines.h"
+#include "Samples.h"
+#include "SavedJson.h"
+#include "report/JsonDocument.h"
+#include "report/ReportFile.h"
+
+namespace assay_host {
+namespace {
+
+// A file that is gone with its object.
+class File {
+public:
+    explicit File(const std::string& text) : fPath(testing::TempDir() + "assay-report-file")
+    {
+        std::ofstream file(fPath, std::ios::binary);
+        file << text;
+    }
+    ~File() { std::remove(fPath.c_str()); }
+    File(const File&) = delete;
+    File& operator=(const File&) = delete;
+
+    const std::string fPath;
+};
+
+std::string LoadFailure(const std::string& text)
+{
+    const File file(text);
+    try {
+        LoadReport(file.fPath);
+    } catch (const std::runtime_error& failure) {
+        const std::string message = failure.what();
+        EXPECT_EQ(message.substr(0, file.fPath.size() + 2), file.fPath + ": ");
+        return message.substr(file.fPath.size() + 2);
+    }
+    return "no failure";
+}
+
+std::string Load(const std::string& text)
+{
+    const File file(text);
+    return LoadReport(file.fPath).ToText();
+}
+
+std::string MakeEvents(const std::string& text)
+{
+    std::string events = MakeStartEvent({"assay"}).dump() + "\n";
+    for (const ReportLine& line : ReadLines(text))
+        events += MakeLineEvent(line, 1).dump() + "\n";
+    return events + MakeEndEvent({}).dump() + "\n";
+}
+
+TEST(ReportFile, GivesTheReportOfEachForm)
+{
+    for (const std::string& text :
+         {Sample(1, 1).GetText(), std::string("x\na=\"\xFF\r\n\"\r\n# log"), std::string("a=1")}) {
+        EXPECT_EQ(Load(text), text);
+        const Json document = MakeDocument(ReadReport(text), {});
+        EXPECT_EQ(Load(document.dump(2) + "\n"), text);
+        EXPECT_EQ(Load(document.dump()), text);
+        EXPECT_EQ(Load(" \t\r\n" + document.dump(1)), text);
+        EXPECT_EQ(Load(MakeEvents(text)), text);
+    }
+    EXPECT_EQ(Load("\n \na=1\n"), "\n \na=1\n");
+    EXPECT_EQ(Load(MakeDocument({}, {}).dump()), "");
+}
+
+TEST(ReportFile, SaysWhatIsWrongWithAFile)
+{
+    EXPECT_EQ(LoadFailure(""), "neither a JSON document nor a report");
+    EXPECT_EQ(LoadFailure("# only a comment\nand text"), "neither a JSON document nor a report");
+    EXPECT_EQ(LoadFailure(std::string(300, '\xFF')), "neither a JSON document nor a report");
+    EXPECT_EQ(LoadFailure("a=" + std::string(70000, 'x')),
+              "lines too long, or too many, for a report");
+    EXPECT_EQ(LoadFailure("{}"), "the document: \"schema\" is missing");
+    EXPECT_EQ(LoadFailure("{\"event\": \"x\"}"), "line 1 is not the event \"start\"");
+    EXPECT_EQ(LoadFailure("{\"schema\": 1").substr(0, 16), "not valid JSON: ");
+    EXPECT_EQ(LoadFailure("{\"schema\": \"\xFF\"}").substr(0, 16), "not valid JSON: ");
+    EXPECT_EQ(LoadFailure(std::string(200000, '{')).substr(0, 16), "not valid JSON: ");
+    EXPECT_EQ(LoadFailure("{\"a\":" + std::string(200000, '[')).substr(0, 16), "not valid JSON: ");
+    EXPECT_EQ(LoadFailure("{} {}").substr(0, 16), "not valid JSON: ");
+}
+
+TEST(ReportFile, SaysThatAFileCannotBeRead)
+{
+    const std::string path = testing::TempDir() + "assay-no-such-file";
+    try {
+        LoadReport(path);
+        ADD_FAILURE();
+    } catch (const std::runtime_error& failure) {
+        EXPECT_EQ(failure.what(), path + ": can't open: No such file or directory");
+    }
+    EXPECT_THROW(LoadReport(testing::TempDir()), std::runtime_error);
+    EXPECT_THROW(LoadReport(""), std::runtime_error);
+}
+
+} // namespace
+} // namespace assay_host
