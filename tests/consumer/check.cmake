@@ -1,7 +1,8 @@
 # Installs pmutil into a folder and builds and runs the consumer against it, once with CMake and
 # once with pkg-config.
 #
-# usage: cmake -DBUILD=DIR -DSOURCE=DIR -DWORK=DIR -DCOMPILER=PATH -DFLAGS=LIST -P check.cmake
+# usage: cmake -DBUILD=DIR -DSOURCE=DIR -DWORK=DIR -DGENERATOR=NAME -DCOMPILER=PATH -DFLAGS=LIST
+#          -P check.cmake
 file(REMOVE_RECURSE ${WORK})
 set(prefix ${WORK}/prefix)
 
@@ -20,7 +21,7 @@ endfunction()
 run(${CMAKE_COMMAND} --install ${BUILD} --component pmutil --prefix ${prefix})
 string(REPLACE ";" " " flags "${FLAGS}")
 
-run(${CMAKE_COMMAND} -S ${SOURCE} -B ${WORK}/cmake -DCMAKE_PREFIX_PATH=${prefix}
+run(${CMAKE_COMMAND} -G ${GENERATOR} -S ${SOURCE} -B ${WORK}/cmake -DCMAKE_PREFIX_PATH=${prefix}
   -DCMAKE_CXX_COMPILER=${COMPILER} "-DCMAKE_CXX_FLAGS=${flags}")
 run(${CMAKE_COMMAND} --build ${WORK}/cmake)
 expect_hello(${WORK}/cmake/consumer)

@@ -485,6 +485,10 @@ def use_mesa_as_gpu(host):
 def test_processors_are_never_listed(host):
     """PoCL has nothing but the processor."""
     use_vendor(host, "pocl.icd")
+    peer = subprocess.run(["clinfo", "-l"], capture_output=True, check=False,
+                          env=host.environment(opencl="real"))
+    if peer.returncode != 0:
+        pytest.skip(f"PoCL doesn't work here: clinfo ends with {peer.returncode}")
     run = host.run(script="# no OpenGL\n", opencl="real")
     check(run, predict([], opencl=0, ogl=0, context=0))
 
