@@ -8,5 +8,5 @@ std::size_t ReadInput(char* bytes, std::size_t size);
 [[noreturn]] void ExitNow(int code);
 [[noreturn]] void CrashNow();
 void CloseOutputs();
-void SpawnSleeper(const char* program, const char* milliseconds);
+void SpawnGrandchild(const char* program, const char* word);
 void WriteState();

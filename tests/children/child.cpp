@@ -8,7 +8,7 @@
 //   abort                  dies of it
 //   args ...               writes the rest of the arguments, each in hexadecimal, and ends
 //   close                  closes standard output and standard error
-//   spawn MILLISECONDS     starts a grandchild that sleeps, with this child's streams
+//   spawn WORD             starts a grandchild with this child's streams that does the word
 //   state                  writes the descriptors it has and its signal state (Linux only)
 #include <chrono>
 #include <cstdio>
@@ -80,7 +80,7 @@ int main(int argc, char** argv)
         } else if (word == "close") {
             CloseOutputs();
         } else if (word == "spawn") {
-            SpawnSleeper(argv[0], next());
+            SpawnGrandchild(argv[0], next());
         } else if (word == "state") {
             WriteState();
         } else if (word == "args") {

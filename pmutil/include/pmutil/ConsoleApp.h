@@ -114,6 +114,8 @@ protected:
 private:
     bool HasEventLocked() const;
     State WaitForEnd(double deadline);
+    bool JoinAfterEnd(int* exitCode, double deadline);
+    bool JoinAfterFailure(double seconds);
     void NotifyFailureLocked(const Lock& lock, const consoleapp::Exception& exc);
     void ThrowIfFailurePendingLocked(const Lock& lock);
     void ThrowIfInjectedLocked(const Lock& lock, TaskID who, Fault fault, const char* caller);
@@ -131,6 +133,10 @@ private:
     LaunchParams fLaunchParams;
     boost::shared_ptr<consoleapp::ExecutionData> fExecutionData;
     std::deque<consoleapp::Exception> fFailures;
+
+    // Held to join fLauncherThread or let go of it, by one client thread at a time; taken before
+    // fMutex. Only Launch, with fMutex and while Idle, when nobody joins, sets it without.
+    boost::mutex fJoinMutex;
 };
 
 } // namespace pmutil

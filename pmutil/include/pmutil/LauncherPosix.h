@@ -18,11 +18,12 @@ public:
 
     // `program` is used in UTF-8, without a search; arguments are passed byte by byte. A failed
     // start throws with the call, the path and the system's text:
-    // "posix_spawn failed: /bin/thing: No such file or directory".
+    // "posix_spawn failed: /bin/thing: No such file or directory". So it does where the host
+    // ignores SIGCHLD, and the system would throw away how children end.
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override;
 
-    // Throws std::runtime_error "waitid failed: No child processes" where the host has the system
-    // throw away how children end, as it does by ignoring SIGCHLD.
+    // Throws std::runtime_error "waitid failed: No child processes" where something else in the
+    // host has taken the child's end, such as a handler that waits for any child.
     WaitResult Wait(int* exitCode) override;
     void Kill() override;
 
@@ -32,6 +33,8 @@ public:
 
 private:
     class Child;
+
+    LaunchResult Start(const std::string& path, const std::deque<std::string>& args);
 
     boost::shared_ptr<Child> GetChild() const;
 

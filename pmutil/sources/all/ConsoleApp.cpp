@@ -5,6 +5,8 @@
 #include <sstream>
 #include <stdexcept>
 
+#include <boost/thread/lock_guard.hpp>
+
 #include "all/ConsoleAppLog.h"
 #include "all/LaunchThreadTask.h"
 #include "all/WaitTime.h"
@@ -14,6 +16,8 @@ namespace pmutil {
 
 using consoleapp::Exception;
 using consoleapp::ExecutionData;
+
+using JoinLock = boost::lock_guard<boost::mutex>;
 
 namespace {
 
@@ -106,8 +110,11 @@ void ConsoleApp::LaunchHandleException(Lock& lock, const std::exception* exc,
     PM_LOG(gConsoleAppLog, "ConsoleApp::LaunchHandleException exc="
                                << GetText(exc) << " joinWaitSEconds=" << joinWaitSeconds);
     lock.unlock();
-    const bool joined = fLauncherThread.TimedJoin(joinWaitSeconds);
-    PM_LOG(gConsoleAppLog, "fLauncherThread.TimedJoin returns " << joined);
+    {
+        const JoinLock joinLock(fJoinMutex);
+        const bool joined = fLauncherThread.TimedJoin(joinWaitSeconds);
+        PM_LOG(gConsoleAppLog, "fLauncherThread.TimedJoin returns " << joined);
+    }
     lock.lock();
 }
 
@@ -117,21 +124,9 @@ State ConsoleApp::Wait(int* exitCode, double maxWaitSeconds)
     const double deadline = GetWaitClock() + maxWaitSeconds;
     try {
         State result = WaitForEnd(deadline);
-        if (HasEnded(result)) {
-            const double joinWait = std::min(GetTimeLeft(deadline), GetShortWaitSeconds());
-            PM_LOG(gConsoleAppLog,
-                   "ConsoleApp::Wait fLauncherThread.TimedJoin(" << joinWait << ")");
-            if (fLauncherThread.TimedJoin(joinWait)) {
-                const Lock lock(fMutex);
-                SetStateLocked(lock, State::kIdle);
-                if (exitCode != nullptr)
-                    *exitCode = fExitCode;
-            } else {
-                PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread never finished");
-                fLauncherThread.Abandon();
-                Reset();
-                result = State::kTimeout;
-            }
+        if (HasEnded(result) && !JoinAfterEnd(exitCode, deadline)) {
+            Reset();
+            result = State::kTimeout;
         }
         ThrowIfFailurePending();
         PM_LOG(gConsoleAppLog, "ConsoleApp::Wait returns " << result);
@@ -140,6 +135,32 @@ State ConsoleApp::Wait(int* exitCode, double maxWaitSeconds)
         Reset();
         throw;
     }
+}
+
+// The last part of Wait, after which the object is Idle; false if the launcher's thread won't end.
+bool ConsoleApp::JoinAfterEnd(int* exitCode, double deadline)
+{
+    const JoinLock joinLock(fJoinMutex);
+    {
+        const Lock lock(fMutex);
+        if (fState == State::kIdle) { // another thread's wait was first
+            if (exitCode != nullptr)
+                *exitCode = fExitCode;
+            return true;
+        }
+    }
+    const double joinWait = std::min(GetTimeLeft(deadline), GetShortWaitSeconds());
+    PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread.TimedJoin(" << joinWait << ")");
+    if (!fLauncherThread.TimedJoin(joinWait)) {
+        PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread never finished");
+        fLauncherThread.Abandon();
+        return false;
+    }
+    const Lock lock(fMutex);
+    SetStateLocked(lock, State::kIdle);
+    if (exitCode != nullptr)
+        *exitCode = fExitCode;
+    return true;
 }
 
 // The first part of Wait: Finished, Crashed, Killed or Idle, or Timeout if none came.
@@ -181,19 +202,24 @@ void ConsoleApp::HandleWaitException(Lock& lock, const std::exception* exc, doub
     PM_LOG(gConsoleAppLog, "ConsoleApp::HandleWaitException exc=" << GetText(exc)
                                                                   << " waitSeconds=" << waitSeconds
                                                                   << " fState=" << fState);
-    if (!fLauncherThread.HoldsThread())
-        return;
-    if (fState != State::kTimeout) {
-        PM_LOG(gConsoleAppLog, "TimedJoin(" << waitSeconds << ")");
-        lock.unlock();
-        const bool joined = fLauncherThread.TimedJoin(waitSeconds);
-        lock.lock();
-        PM_LOG(gConsoleAppLog, "fLauncherThread.TimedJoin timeout=" << !joined);
-        if (joined)
-            return;
+    const bool mayJoin = fState != State::kTimeout;
+    lock.unlock();
+    {
+        const JoinLock joinLock(fJoinMutex);
+        if (fLauncherThread.HoldsThread() && !(mayJoin && JoinAfterFailure(waitSeconds))) {
+            PM_LOG(gConsoleAppLog, "abandon fLauncherThread");
+            fLauncherThread.Abandon();
+        }
     }
-    PM_LOG(gConsoleAppLog, "abandon fLauncherThread");
-    fLauncherThread.Abandon();
+    lock.lock();
+}
+
+bool ConsoleApp::JoinAfterFailure(double seconds)
+{
+    PM_LOG(gConsoleAppLog, "TimedJoin(" << seconds << ")");
+    const bool joined = fLauncherThread.TimedJoin(seconds);
+    PM_LOG(gConsoleAppLog, "fLauncherThread.TimedJoin timeout=" << joined);
+    return joined;
 }
 
 void ConsoleApp::Kill()
@@ -247,11 +273,17 @@ void ConsoleApp::SetStateLocked(const Lock& /*lock*/, State state)
 
 void ConsoleApp::Reset()
 {
-    if (const auto data = fExecutionData) {
+    boost::shared_ptr<ExecutionData> data;
+    {
+        const Lock lock(fMutex);
+        data = fExecutionData;
+    }
+    if (data != nullptr) {
         data->ClearConsoleApp();
         data->SetOutputTask(OutputChannel::kStdout, {});
         data->SetOutputTask(OutputChannel::kStderr, {});
     }
+    const JoinLock joinLock(fJoinMutex);
     Lock lock(fMutex);
     if (fLauncherThread.HoldsThread()) {
         lock.unlock();

@@ -28,6 +28,7 @@ namespace pmutil {
 namespace {
 
 // More than the usual pipe holds, for a child that writes much; what the system allows everybody.
+// Only standard output gets it: a user's pipes share an allowance.
 constexpr int kPipeBytes = 1 << 20;
 
 // Descriptors below are the child's standard streams, and in its way.
@@ -47,9 +48,18 @@ int SendSignal(int pidfd, int number)
     return static_cast<int>(::syscall(SYS_pidfd_send_signal, pidfd, number, nullptr, 0));
 }
 
-[[noreturn]] void ThrowFailed(const std::string& call, int error)
+// A failed call before it is known for whom it was made.
+struct CallFailure {
+    const char* call;
+    int error;
+};
+
+[[noreturn]] void ThrowFailed(const CallFailure& failure, const std::string& path = {})
 {
-    throw std::runtime_error(call + " failed: " + std::system_category().message(error));
+    // A path with a zero byte ends there, so that the text behind it can be seen.
+    throw std::runtime_error(std::string(failure.call) + " failed: " + path.c_str() +
+                             (path.empty() ? "" : ": ") +
+                             std::system_category().message(failure.error));
 }
 
 // One end for the parent and one for the child.
@@ -61,11 +71,15 @@ struct ChildPipe {
     {
         int ends[2];
         if (::pipe2(ends, O_CLOEXEC) != 0)
-            ThrowFailed("pipe2", errno);
+            throw CallFailure{"pipe2", errno};
         reader->Reset(ends[0], true);
         writer->Reset(ends[1], true);
         MoveUp(*reader);
         MoveUp(*writer);
+    }
+
+    void Enlarge() const
+    {
         ::fcntl(writer->GetHandle(), F_SETPIPE_SZ, kPipeBytes); // a smaller pipe does as well
     }
 
@@ -82,7 +96,7 @@ private:
             return;
         const int moved = ::fcntl(end.GetHandle(), F_DUPFD_CLOEXEC, kFirstFree);
         if (moved < 0)
-            ThrowFailed("fcntl", errno);
+            throw CallFailure{"fcntl", errno};
         end.Reset(moved, true);
     }
 };
@@ -134,7 +148,7 @@ private:
     static void Check(int error)
     {
         if (error != 0)
-            ThrowFailed("posix_spawn", error);
+            throw CallFailure{"posix_spawn", error};
     }
 
     posix_spawn_file_actions_t fActions{};
@@ -151,7 +165,7 @@ bool PollEnd(int pidfd, int milliseconds)
         result = ::poll(&poll, 1, milliseconds);
     while (result < 0 && errno == EINTR);
     if (result < 0)
-        ThrowFailed("poll", errno);
+        ThrowFailed({"poll", errno});
     return result > 0;
 }
 
@@ -193,14 +207,31 @@ std::string GetUTF8(const std::wstring& program)
     try {
         return boost::filesystem::path(program, GetPathCodecvt()).native();
     } catch (const std::exception&) {
-        ThrowFailed("posix_spawn", EILSEQ);
+        ThrowFailed({"posix_spawn", EILSEQ});
     }
 }
 
 void RequireNoZeroByte(const std::string& text)
 {
     if (text.find('\0') != std::string::npos)
-        ThrowFailed("posix_spawn", EINVAL);
+        throw CallFailure{"posix_spawn", EINVAL};
+}
+
+// Where the host has the system throw away how children end, nobody could tell how this one did,
+// and its number could be another process's before it has a descriptor.
+void RequireEndsAreKept(const std::string& path)
+{
+    struct sigaction action = {};
+    if (::sigaction(SIGCHLD, nullptr, &action) == 0 &&
+        (action.sa_handler == SIG_IGN || (action.sa_flags & SA_NOCLDWAIT) != 0))
+        throw std::runtime_error("posix_spawn failed: " + path +
+                                 ": SIGCHLD is ignored, so that no child can be waited for");
+}
+
+void LogPipe(const char* stream, const ChildPipe& pipe)
+{
+    PM_LOG(gBinioLog, "child" << stream << "Rd=" << pipe.reader->GetHandle() << " child" << stream
+                              << "Wr=" << pipe.writer->GetHandle());
 }
 
 } // namespace
@@ -209,15 +240,17 @@ void RequireNoZeroByte(const std::string& text)
 // another process that has got its number since.
 class LauncherPosix::Child {
 public:
-    explicit Child(::pid_t pid)
-        : fPidfd(boost::make_shared<PosixHandle>(PosixCalls::GetInvalid(), false))
+    Child() : fPidfd(boost::make_shared<PosixHandle>(PosixCalls::GetInvalid(), false)) {}
+
+    // Called once, with a process just started.
+    void Adopt(::pid_t pid)
     {
         const int pidfd = OpenPidfd(pid);
         if (pidfd < 0) {
             const int error = errno;
             ::kill(pid, SIGKILL); // not waited for yet, so the number is still the child's
             ::waitpid(pid, nullptr, 0);
-            ThrowFailed("pidfd_open", error);
+            throw CallFailure{"pidfd_open", error};
         }
         fPidfd->Reset(pidfd, true);
     }
@@ -256,7 +289,7 @@ public:
         if (!fPidfd->IsOpen())
             return;
         if (SendSignal(fPidfd->GetHandle(), SIGKILL) != 0 && errno != ESRCH)
-            ThrowFailed("pidfd_send_signal", errno);
+            ThrowFailed({"pidfd_send_signal", errno});
         if (!fHasWaiter && PollEnd(fPidfd->GetHandle(), kReapMilliseconds))
             ReapLocked();
     }
@@ -278,7 +311,7 @@ private:
         const int error = errno;
         fPidfd->Close();
         if (result != 0)
-            ThrowFailed("waitid", error);
+            ThrowFailed({"waitid", error});
     }
 
     boost::mutex fMutex;
@@ -301,6 +334,16 @@ LaunchResult LauncherPosix::Launch(const std::wstring& program, const std::deque
 {
     Orphans::Get().Reap();
     const std::string path = GetUTF8(program);
+    try {
+        return Start(path, args);
+    } catch (const CallFailure& failure) {
+        ThrowFailed(failure, path);
+    }
+}
+
+LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std::string>& args)
+{
+    RequireEndsAreKept(path);
     RequireNoZeroByte(path);
     std::vector<char*> argv;
     argv.push_back(const_cast<char*>(path.c_str()));
@@ -313,12 +356,10 @@ LaunchResult LauncherPosix::Launch(const std::wstring& program, const std::deque
     const ChildPipe input;
     const ChildPipe output;
     const ChildPipe error;
-    PM_LOG(gBinioLog, "childStdinRd=" << input.reader->GetHandle()
-                                      << " childStdinWr=" << input.writer->GetHandle());
-    PM_LOG(gBinioLog, "childStdoutRd=" << output.reader->GetHandle()
-                                       << " childStdoutWr=" << output.writer->GetHandle());
-    PM_LOG(gBinioLog, "childStderrRd=" << error.reader->GetHandle()
-                                       << " childStderrWr=" << error.writer->GetHandle());
+    output.Enlarge();
+    LogPipe("Stdin", input);
+    LogPipe("Stdout", output);
+    LogPipe("Stderr", error);
     SpawnOptions options;
     options.SetStream(STDIN_FILENO, *input.reader);
     options.SetStream(STDOUT_FILENO, *output.writer);
@@ -326,13 +367,14 @@ LaunchResult LauncherPosix::Launch(const std::wstring& program, const std::deque
     options.CloseOthers();
     options.ResetSignals();
 
+    // Made first, so that no failure can come between the process and its owner.
+    const auto child = boost::make_shared<Child>();
     ::pid_t pid = 0;
     const int failure = ::posix_spawn(&pid, path.c_str(), options.GetActions(),
                                       options.GetAttributes(), argv.data(), ::environ);
     if (failure != 0)
-        throw std::runtime_error("posix_spawn failed: " + path + ": " +
-                                 std::system_category().message(failure));
-    const auto child = boost::make_shared<Child>(pid);
+        throw CallFailure{"posix_spawn", failure};
+    child->Adopt(pid);
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
         fChild = child;
@@ -349,7 +391,7 @@ WaitResult LauncherPosix::Wait(int* exitCode)
 {
     const boost::shared_ptr<Child> child = GetChild();
     if (child == nullptr)
-        ThrowFailed("waitid", ECHILD);
+        ThrowFailed({"waitid", ECHILD});
     return child->Wait(exitCode);
 }
 

@@ -40,9 +40,9 @@ void CloseOutputs()
     ::_close(2);
 }
 
-void SpawnSleeper(const char* program, const char* milliseconds)
+void SpawnGrandchild(const char* program, const char* word)
 {
-    std::string line = "\"" + std::string(program) + "\" sleep " + milliseconds;
+    std::string line = "\"" + std::string(program) + "\" " + word;
     STARTUPINFOA startup = {};
     startup.cb = sizeof startup;
     PROCESS_INFORMATION process = {};

@@ -1,29 +1,60 @@
 // Consumers of a real child's output.
 #pragma once
 
+#include <atomic>
 #include <boost/make_shared.hpp>
 #include <boost/thread/condition_variable.hpp>
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
+#include <functional>
+#include <gtest/gtest.h>
 #include <string>
 
+#include "Waits.h"
 #include "pmutil/ConsoleAppLauncher.h"
 #include "pmutil/OutputTask.h"
 
 namespace pmutil {
 
+// The platform's launcher, which tells when a child is killed.
+class WatchedLauncher : public Launcher {
+public:
+    LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override
+    {
+        ++fLaunches;
+        return fPlatform->Launch(program, args);
+    }
+
+    WaitResult Wait(int* exitCode) override { return fPlatform->Wait(exitCode); }
+
+    void Kill() override
+    {
+        fPlatform->Kill();
+        fOnKill();
+    }
+
+    std::function<void()> fOnKill = [] {};
+    std::atomic<int> fLaunches{0};
+
+private:
+    const boost::shared_ptr<Launcher> fPlatform = MakeLauncher();
+};
+
 // Lets the tasks of a launch stay until the launch is through its start.
 class StartedApp : public ConsoleApp {
 public:
-    using ConsoleApp::ConsoleApp;
+    StartedApp() : StartedApp(boost::make_shared<WatchedLauncher>()) {}
+    ~StartedApp() override
+    {
+        fLauncher->fOnKill = [] {};
+    }
 
-    // A launch that fails never gets there: this gives up a little before the launch would give up
-    // the task.
+    // Until the child runs, or is killed since the launch failed.
     void AwaitStart()
     {
         boost::unique_lock<boost::mutex> lock(fStartMutex);
-        fStartCond.timed_wait(lock, boost::posix_time::milliseconds(800),
-                              [this] { return fStarted; });
+        EXPECT_TRUE(fStartCond.timed_wait(lock, boost::posix_time::seconds(30),
+                                          [this] { return fStarted; }));
     }
 
     void ForgetStart()
@@ -32,15 +63,26 @@ public:
         fStarted = false;
     }
 
+    WatchedLauncher& GetLauncher() { return *fLauncher; }
+
 protected:
-    void OnRunning() override
+    void OnRunning() override { SetStarted(); }
+
+private:
+    explicit StartedApp(const boost::shared_ptr<WatchedLauncher>& launcher)
+        : ConsoleApp(launcher), fLauncher(launcher)
+    {
+        launcher->fOnKill = [this] { SetStarted(); };
+    }
+
+    void SetStarted()
     {
         const boost::lock_guard<boost::mutex> lock(fStartMutex);
         fStarted = true;
         fStartCond.notify_all();
     }
 
-private:
+    const boost::shared_ptr<WatchedLauncher> fLauncher;
     boost::mutex fStartMutex;
     boost::condition_variable fStartCond;
     bool fStarted = false;

@@ -23,7 +23,7 @@ struct Parts {
     ~Parts() { End(); }
     void End()
     {
-        out->fOpen = true;
+        out->fGate.Open();
         platform->End(kEndedNormally);
     }
     ConsoleAppLauncher MakeLauncher() const
@@ -140,8 +140,8 @@ TEST(ConsoleAppAccessor, GetStateIgnoresItsArgument)
     ConsoleAppAccessor accessor(TaskID::kClient, parts.data);
     parts.app->SetState(State::kLaunched);
     const auto start = std::chrono::steady_clock::now();
-    EXPECT_EQ(accessor.GetState(1000.0), State::kTimeout);
-    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(100));
+    EXPECT_EQ(accessor.GetState(kLong), State::kTimeout);
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(30));
     parts.app->Reset();
 }
 
@@ -201,11 +201,11 @@ TEST(ConsoleAppLauncher, RefusesChangesAfterALaunch)
     EXPECT_EQ(launcher.Wait(nullptr, 0.0), State::kTimeout);
     EXPECT_THROW(launcher.Launch(), std::runtime_error) << "a timeout keeps the launch";
     parts.End();
-    EXPECT_EQ(launcher.Wait(nullptr, 10.0), State::kFinished);
-    parts.out->fOpen = false;
+    EXPECT_EQ(launcher.Wait(nullptr, kLong), State::kFinished);
+    parts.out->fGate.Close();
     launcher.Launch();
     parts.End();
-    EXPECT_EQ(launcher.Wait(nullptr, 10.0), State::kFinished);
+    EXPECT_EQ(launcher.Wait(nullptr, kLong), State::kFinished);
 }
 
 TEST(ConsoleAppLauncher, CopiesLaunchThroughTheSameApp)
@@ -218,7 +218,7 @@ TEST(ConsoleAppLauncher, CopiesLaunchThroughTheSameApp)
     launcher.Launch();
     EXPECT_TRUE(ThrowsRuntimeError("ConsoleApp: must be idle", [&] { copy.Launch(); }));
     parts.End();
-    EXPECT_EQ(launcher.Wait(nullptr, 10.0), State::kFinished);
+    EXPECT_EQ(launcher.Wait(nullptr, kLong), State::kFinished);
 }
 
 TEST(ConsoleAppLauncher, KillReachesTheApp)
@@ -226,9 +226,9 @@ TEST(ConsoleAppLauncher, KillReachesTheApp)
     Parts parts;
     ConsoleAppLauncher launcher = parts.MakeLauncher();
     launcher.Launch();
-    parts.out->fOpen = true;
+    parts.platform->fOnKill = [&] { parts.out->fGate.Open(); };
     launcher.Kill();
-    EXPECT_EQ(launcher.Wait(nullptr, 10.0), State::kKilled);
+    EXPECT_EQ(launcher.Wait(nullptr, kLong), State::kKilled);
     EXPECT_EQ(parts.platform->fKills, 1);
 }
 

@@ -1,17 +1,19 @@
 // A launcher without processes, a task and an application that record what happens to them.
 #pragma once
 
+#include <algorithm>
 #include <atomic>
 #include <boost/make_shared.hpp>
 #include <boost/thread/condition_variable.hpp>
+#include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
 #include <boost/thread/thread.hpp>
-#include <chrono>
+#include <functional>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "FakeChannel.h"
+#include "Waits.h"
 #include "pmutil/ConsoleApp.h"
 #include "pmutil/Launcher.h"
 #include "pmutil/OutputTask.h"
@@ -29,7 +31,7 @@ public:
         ++fLaunches;
         fProgram = program;
         fArgs = args;
-        fEnded = fEndsAtOnce;
+        fEnded = false;
         fKilled = false;
         fInput = boost::make_shared<FakeChannel>();
         LaunchResult result;
@@ -38,12 +40,15 @@ public:
             fOutput[channel] = boost::make_shared<FakeChannel>();
             result.fAppOutput[channel] = fOutput[channel];
         }
+        if (fOnLaunch)
+            fOnLaunch();
         return result;
     }
 
     WaitResult Wait(int* exitCode) override
     {
         boost::unique_lock<boost::mutex> lock(fMutex);
+        ++fWaits;
         while (!fEnded)
             fCond.wait(lock);
         if (!fWaitFailure.empty())
@@ -57,13 +62,17 @@ public:
 
     void Kill() override
     {
-        const boost::lock_guard<boost::mutex> lock(fMutex);
-        ++fKills;
-        if (!fEnded && fMortal) {
-            fKilled = true;
-            fEnded = true;
+        {
+            const boost::lock_guard<boost::mutex> lock(fMutex);
+            ++fKills;
+            if (!fEnded && fMortal) {
+                fKilled = true;
+                fEnded = true;
+            }
+            fCond.notify_all();
         }
-        fCond.notify_all();
+        if (fOnKill)
+            fOnKill();
     }
 
     void End(WaitResult result, int exitCode = 0)
@@ -75,6 +84,12 @@ public:
         fCond.notify_all();
     }
 
+    // A kill may come a little after the failure that brings it about is told.
+    bool AwaitKills(int kills)
+    {
+        return Eventually([&] { return fKills >= kills; }) && fKills == kills;
+    }
+
     boost::mutex fMutex;
     boost::condition_variable fCond;
     std::string fLaunchFailure;
@@ -83,32 +98,54 @@ public:
     std::deque<std::string> fArgs;
     boost::shared_ptr<FakeChannel> fInput;
     boost::shared_ptr<FakeChannel> fOutput[kOutputSlots];
-    bool fEndsAtOnce = false;
+    std::function<void()> fOnLaunch;
+    std::function<void()> fOnKill;
     bool fMortal = true;
     bool fEnded = false;
     bool fKilled = false;
     WaitResult fResult = kEndedNormally;
     int fExitCode = 0;
     std::atomic<int> fLaunches{0};
+    std::atomic<int> fWaits{0};
     std::atomic<int> fKills{0};
 };
 
-// Runs until it is let go, or until its launch's application runs or has failed.
-class PatientTask : public OutputTask {
+// Something that threads wait for; closed at first.
+class Gate {
 public:
-    ~PatientTask() override { fOpen = true; }
+    void Open() { Set(true); }
+    void Close() { Set(false); }
 
-    std::atomic<bool> fOpen{false};
-
-protected:
-    void DoRun() override
+    void Await()
     {
+        boost::unique_lock<boost::mutex> lock(fMutex);
         while (!fOpen)
-            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+            fCond.wait(lock);
     }
+
+private:
+    void Set(bool open)
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fOpen = open;
+        fCond.notify_all();
+    }
+
+    boost::mutex fMutex;
+    boost::condition_variable fCond;
+    bool fOpen = false;
 };
 
-// Records its notifications, and whether its lock was free in each: GetState from within takes it.
+// Runs until its gate is open.
+class PatientTask : public OutputTask {
+public:
+    Gate fGate;
+
+protected:
+    void DoRun() override { fGate.Await(); }
+};
+
+// Records its notifications, and whether its lock was free in each.
 class RecordingApp : public ConsoleApp {
 public:
     explicit RecordingApp(const boost::shared_ptr<Launcher>& launcher) : ConsoleApp(launcher) {}
@@ -122,7 +159,37 @@ public:
         return fEvents;
     }
 
-    std::string fThrowIn;
+    auto CountEvents(const std::string& event)
+    {
+        const auto events = Events();
+        return std::count(events.begin(), events.end(), event);
+    }
+
+    // True if the calling thread, or another, holds the lock for good.
+    bool IsLocked()
+    {
+        const auto done = boost::make_shared<std::atomic<bool>>(false);
+        boost::thread asker([this, done] {
+            ThrowIfInjected(TaskID::kClient, Fault::kNoFault, nullptr); // takes the lock
+            *done = true;
+        });
+        const bool locked = !asker.timed_join(boost::posix_time::milliseconds(fLockPatience));
+        if (locked)
+            fAskers.push_back(std::move(asker));
+        return locked;
+    }
+
+    // To be called when the lock is free again.
+    void JoinAskers()
+    {
+        for (boost::thread& asker : fAskers)
+            asker.join();
+        fAskers.clear();
+    }
+
+    std::string fThrowIn;                                   // the event that fails
+    std::function<void(const std::string& event)> fOnEvent; // called in each
+    int fLockPatience = 20'000;
 
 protected:
     void OnLaunching() override { Record("OnLaunching"); }
@@ -136,22 +203,25 @@ protected:
         Record(channel == OutputChannel::kStdout ? "end stdout" : "end stderr");
     }
     void OnFinished(int exitCode) override { Record("OnFinished " + std::to_string(exitCode)); }
+    void OnReserved() override { Record("OnReserved"); }
 
 private:
     void Record(const std::string& event)
     {
-        TakeTheLock();
-        const boost::lock_guard<boost::mutex> lock(fEventMutex);
-        fEvents.push_back(event);
+        const bool locked = IsLocked();
+        {
+            const boost::lock_guard<boost::mutex> lock(fEventMutex);
+            fEvents.push_back(event + (locked ? " locked" : ""));
+        }
+        if (fOnEvent)
+            fOnEvent(event);
         if (event == fThrowIn)
             throw std::runtime_error(event + " failed");
     }
 
-    // Hangs, and the test with it, if the caller holds the lock.
-    void TakeTheLock() { ThrowIfInjected(TaskID::kClient, Fault::kNoFault, nullptr); }
-
     boost::mutex fEventMutex;
     std::vector<std::string> fEvents;
+    std::vector<boost::thread> fAskers;
 };
 
 } // namespace pmutil

@@ -1,18 +1,16 @@
 // Launches of a real child, from end to end.
-#include <chrono>
 #include <gmock/gmock.h>
 #include <sstream>
 #include <thread>
 
 #include "CollectingTask.h"
+#include "TempFolder.h"
 #include "Throws.h"
 
 using namespace pmutil;
 using consoleapp::Exception;
 
 namespace {
-
-constexpr double kLong = 60.0;
 
 TEST(Launch, OutputAndCodeArrive)
 {
@@ -21,7 +19,7 @@ TEST(Launch, OutputAndCodeArrive)
     EXPECT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
     EXPECT_EQ(exitCode, 7);
     EXPECT_EQ(launch.out->Text(), "hello\n");
-    EXPECT_EQ(launch.err->Text().substr(0, 7), "trouble");
+    EXPECT_EQ(launch.err->Text(), "trouble\n");
 }
 
 TEST(Launch, ExitCodesUpTo255AreCodes)
@@ -47,14 +45,15 @@ TEST(Launch, HangingChildTimesOutAndIsKilled)
 {
     RealLaunch launch({"out", "started", "sleep", "60000"});
     int exitCode = -1;
-    EXPECT_EQ(launch.launcher.LaunchAndWait(&exitCode, 0.2), State::kTimeout);
+    launch.launcher.Launch();
+    EXPECT_TRUE(Eventually([&] { return launch.out->Text() == "started\n"; }));
+    EXPECT_EQ(launch.launcher.Wait(&exitCode, 0.0), State::kTimeout);
     EXPECT_EQ(exitCode, -1);
     EXPECT_TRUE(ThrowsRuntimeError("ConsoleAppLauncher::Launch: already launched",
                                    [&] { launch.launcher.Launch(); }));
     launch.launcher.Kill();
     EXPECT_EQ(launch.launcher.Wait(&exitCode, kLong), State::kKilled);
     EXPECT_EQ(exitCode, 0);
-    EXPECT_EQ(launch.out->Text(), "started\n");
     launch.launcher.Kill();
     launch.SetArgs({"exit", "3"});
     EXPECT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
@@ -95,6 +94,18 @@ TEST(Launch, WritingToAChildThatHasGoneRaises)
     EXPECT_EQ(launch.launcher.Wait(nullptr, kLong), State::kFinished);
 }
 
+TEST(Launch, ChildThatNeverReadsItsInputBlocksTheWriterUntilItEnds)
+{
+    RealLaunch launch({"sleep", "200", "exit", "3"}, true);
+    launch.launcher.Launch();
+    launch.app->AwaitStart();
+    const std::string text(16 << 20, 'x'); // more than any pipe takes
+    EXPECT_THROW(launch.app->WritelnAppStdin(text), std::runtime_error);
+    int exitCode = -1;
+    EXPECT_EQ(launch.launcher.Wait(&exitCode, kLong), State::kFinished);
+    EXPECT_EQ(exitCode, 3);
+}
+
 TEST(Launch, FloodIsPumped)
 {
     constexpr long long kFlood = 100LL << 20;
@@ -105,103 +116,187 @@ TEST(Launch, FloodIsPumped)
     EXPECT_EQ(launch.out->Count(), static_cast<unsigned long long>(kFlood));
 }
 
-TEST(Launch, ChildThatClosesItsOutputsIsStillWaitedFor)
+TEST(Launch, ChildThatClosesItsOutputsAtOnceIsStillWaitedFor)
 {
-    RealLaunch launch({"close", "sleep", "200", "exit", "6"});
+    RealLaunch launch({"close", "echo", "exit", "6"}, true);
+    launch.launcher.Launch();
+    EXPECT_TRUE(Eventually([&] {
+        return !launch.out->IsRunning(0.0) && !launch.err->IsRunning(0.0);
+    })) << "both channels are at their end";
+    EXPECT_EQ(launch.app->GetState(0.0), State::kRunning);
+    launch.app->CloseAppStdin();
     int exitCode = -1;
-    EXPECT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
+    EXPECT_EQ(launch.launcher.Wait(&exitCode, kLong), State::kFinished);
     EXPECT_EQ(exitCode, 6);
 }
 
 TEST(Launch, GrandchildThatHoldsThePipesIsGivenUp)
 {
     const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
-    RealLaunch launch({"spawn", "6000", "exit", "0"});
+    // The grandchild reads its input, which is the child's, to its end.
+    RealLaunch launch({"spawn", "echo", "exit", "0"}, true);
     // Both pumps hang, for a short wait each: the launcher's thread is given up before that.
     EXPECT_EQ(launch.launcher.LaunchAndWait(nullptr, kLong), State::kTimeout);
     EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
     EXPECT_GT(ManagedThread::GetRegisteredThreadCount(), threads);
-    std::this_thread::sleep_for(std::chrono::seconds(6));
+    // The reset has closed the input, so that the grandchild ends, and with it the pumps.
+    EXPECT_TRUE(
+        Eventually([&] { return !launch.out->IsRunning(0.0) && !launch.err->IsRunning(0.0); }));
+    EXPECT_EQ(launch.launcher.Wait(nullptr, 0.0), State::kIdle) << "nothing left to wait for";
 }
 
-TEST(Launch, MissingProgramFailsTheLaunch)
+TEST(Launch, ProgramsThatCannotBeStartedFailTheLaunch)
 {
-    RealLaunch launch({}, false, L"/nonexistent/program");
-    EXPECT_THROW(launch.launcher.Launch(), Exception);
-    EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
-    EXPECT_EQ(launch.launcher.Wait(nullptr, 0.0), State::kIdle);
-    launch.SetArgs({"exit", "2"});
-    int exitCode = -1;
-    EXPECT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
-    EXPECT_EQ(exitCode, 2);
-}
-
-TEST(Launch, KillAndEndRace)
-{
-    RealLaunch launch({});
-    for (int round = 0; round < 50; ++round) {
-        launch.SetArgs({"sleep", std::to_string(round % 5)});
-        launch.launcher.Launch();
-        std::this_thread::sleep_for(std::chrono::milliseconds(round % 7));
-        launch.launcher.Kill();
-        const State end = launch.launcher.Wait(nullptr, kLong);
-        EXPECT_TRUE(end == State::kKilled || end == State::kFinished) << end;
+    const TempFolder folder;
+    const std::string text = folder.File("text");
+    std::ofstream(text) << "not a program\n";
+    for (const std::wstring& program :
+         {std::wstring(L"/nonexistent/program"), folder.Path().wstring(),
+          boost::filesystem::path(text).wstring()}) {
+        RealLaunch launch({}, false, program);
+        EXPECT_THROW(launch.launcher.Launch(), Exception);
+        EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
+        EXPECT_EQ(launch.launcher.Wait(nullptr, 0.0), State::kIdle);
+        launch.SetArgs({"exit", "2"});
+        int exitCode = -1;
+        EXPECT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
+        EXPECT_EQ(exitCode, 2);
     }
 }
 
-// Every fault against every kind of child ends Idle and reusable.
-class FaultMatrix : public testing::TestWithParam<std::tuple<Fault, const char*>> {};
-
-TEST_P(FaultMatrix, EndsIdleAndReusable)
+TEST(Launch, ATaskServesOneLaunchAfterTheOther)
 {
-    const auto [fault, kind] = GetParam();
-    const std::string child = kind;
-    std::deque<std::string> args;
-    if (child == "ends")
-        args = {"exit", "0"};
-    else if (child == "runs")
-        args = {"out", "x", "sleep", "300", "exit", "0"};
-    else if (child == "crashes")
-        args = {"abort"};
-    else if (child == "floods")
-        args = {"flood", "1000000000000"};
-    else
-        args = {"sleep", "20000"};
-    RealLaunch launch(args);
-    launch.app->SetInjectedFault(fault);
-    std::string text;
+    RealLaunch launch({"out", "one"});
+    EXPECT_EQ(launch.launcher.LaunchAndWait(nullptr, kLong), State::kFinished);
+    EXPECT_EQ(launch.out->Text(), "one\n");
+    launch.SetArgs({"out", "two"});
+    EXPECT_EQ(launch.launcher.LaunchAndWait(nullptr, kLong), State::kFinished);
+    EXPECT_EQ(launch.out->Text(), "two\n");
+}
+
+// Every fault against every kind of child.
+class FaultMatrix : public testing::TestWithParam<std::tuple<Fault, const char*>> {
+protected:
+    struct Kind {
+        const char* name;
+        std::deque<std::string> args;
+        bool endless;
+        State end;
+        int exitCode;
+    };
+
+    static const Kind& GetKind()
+    {
+        static const Kind kKinds[] = {
+            {"ends", {"exit", "5"}, false, State::kFinished, 5},
+            {"runs", {"out", "x", "sleep", "50", "exit", "6"}, false, State::kFinished, 6},
+            {"crashes", {"abort"}, false, State::kCrashed, 0},
+            {"floods", {"flood", "1000000000000"}, true, State::kKilled, 0},
+            {"hangs", {"sleep", "60000"}, true, State::kKilled, 0},
+        };
+        const std::string name = std::get<1>(GetParam());
+        return *std::find_if(std::begin(kKinds), std::end(kKinds),
+                             [&](const Kind& kind) { return kind.name == name; });
+    }
+
+    static Fault GetFault() { return std::get<0>(GetParam()); }
+
+    // Up to which point of the launch the fault comes.
+    static bool BeforeTheStart()
+    {
+        return GetFault() == Fault::kNotifyLaunching || GetFault() == Fault::kLauncherLaunch;
+    }
+    static bool KillsTheChild()
+    {
+        return GetFault() == Fault::kNotifyLaunched || GetFault() == Fault::kNotifyRunning ||
+               GetFault() == Fault::kNotifyOutputTaskBegin || GetFault() == Fault::kLauncherWait;
+    }
+    static bool FailsLaunch()
+    {
+        return BeforeTheStart() || (KillsTheChild() && GetFault() != Fault::kLauncherWait);
+    }
+
+    // The texts of which one is thrown; none if the launch goes well.
+    static std::vector<std::string> GetFailures()
+    {
+        std::ostringstream fault;
+        fault << GetFault();
+        switch (GetFault()) {
+        case Fault::kNoFault:
+            return {};
+        case Fault::kLauncherKill:
+            if (!GetKind().endless)
+                return {};
+            return {"Client: LauncherKill"};
+        case Fault::kNotifyOutputTaskBegin:
+            return {"stdout: NotifyOutputTaskBegin"};
+        case Fault::kNotifyOutputTaskEnd:
+            // For the channel that is through first.
+            return {"stdout: NotifyOutputTaskEnd", "stderr: NotifyOutputTaskEnd"};
+        default:
+            return {"Launcher: " + fault.str()};
+        }
+    }
+};
+
+TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
+{
+    const Kind& kind = GetKind();
+    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
+    RealLaunch launch(kind.args);
+    launch.app->SetInjectedFault(GetFault());
+    std::string failure;
+    bool launched = false;
+    bool killed = false;
     State result = State::kUndefined;
+    int exitCode = -1;
     try {
         launch.launcher.Launch();
-        result = launch.launcher.Wait(nullptr, 0.5);
-        if (result == State::kTimeout) {
+        launched = true;
+        if (kind.endless && !KillsTheChild()) {
             try {
                 launch.launcher.Kill();
             } catch (const Exception& exc) {
-                EXPECT_STREQ(exc.what(), "Client: LauncherKill");
+                failure = exc.what();
                 launch.launcher.Kill(); // fires once
-                text = exc.what();
             }
-            result = launch.launcher.Wait(nullptr, kLong);
+            killed = true;
         }
+        result = launch.launcher.Wait(&exitCode, kLong);
     } catch (const Exception& exc) {
-        text = exc.what();
+        failure = exc.what();
     }
-    const bool endsByItself = child == "ends" || child == "runs" || child == "crashes";
-    std::ostringstream name;
-    name << fault;
-    if (fault == Fault::kNoFault || (fault == Fault::kLauncherKill && endsByItself)) {
-        EXPECT_EQ(text, "");
-        EXPECT_EQ(result, child == "crashes" ? State::kCrashed
-                          : endsByItself     ? State::kFinished
-                                             : State::kKilled);
+
+    const std::vector<std::string> failures = GetFailures();
+    if (failures.empty())
+        EXPECT_EQ(failure, "");
+    else
+        EXPECT_THAT(failures, testing::Contains(failure));
+    if (failures.empty() || GetFault() == Fault::kLauncherKill) {
+        EXPECT_EQ(result, kind.end);
+        EXPECT_EQ(exitCode, kind.exitCode);
     } else {
-        EXPECT_THAT(text, testing::EndsWith(": " + name.str())) << result;
+        // A failure of an output thread may come when the code is known already.
+        EXPECT_TRUE(exitCode == -1 ||
+                    (GetFault() == Fault::kNotifyOutputTaskEnd && exitCode == kind.exitCode))
+            << exitCode;
+        EXPECT_FALSE(FailsLaunch() && launched);
     }
     EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
+    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads) << "nothing was given up";
+
+    // The child has gone: this wait doesn't last.
+    WatchedLauncher& platform = launch.app->GetLauncher();
+    EXPECT_EQ(platform.fLaunches, BeforeTheStart() ? 0 : 1);
+    if (!BeforeTheStart() && kind.endless) {
+        int code = -1;
+        EXPECT_EQ(platform.Wait(&code), kEndedByKill);
+        EXPECT_EQ(code, -1);
+        EXPECT_TRUE(killed || KillsTheChild());
+    }
+
     launch.launcher.Wait(nullptr, 0.0);
     launch.SetArgs({"exit", "9"});
-    int exitCode = -1;
     EXPECT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
     EXPECT_EQ(exitCode, 9);
 }

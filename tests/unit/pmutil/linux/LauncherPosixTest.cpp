@@ -1,9 +1,8 @@
 #include "pmutil/LauncherPosix.h"
 
-#include <chrono>
+#include <boost/thread/thread.hpp>
 #include <csignal>
 #include <cstdio>
-#include <dirent.h>
 #include <fcntl.h>
 #include <fstream>
 #include <gmock/gmock.h>
@@ -14,32 +13,14 @@
 #include <thread>
 #include <unistd.h>
 
-#include "../CollectingTask.h"
+#include "../OpenThings.h"
 #include "../Throws.h"
+#include "../Waits.h"
 #include "pmutil/PosixHandle.h"
 
 using namespace pmutil;
 
 namespace {
-
-constexpr double kLong = 60.0;
-
-int CountDescriptors()
-{
-    int count = 0;
-    DIR* const directory = ::opendir("/proc/self/fd");
-    while (::readdir(directory) != nullptr)
-        ++count;
-    ::closedir(directory);
-    return count;
-}
-
-// True if this process has a child at all, running or not.
-bool HasChildren()
-{
-    siginfo_t info = {};
-    return ::waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT) == 0;
-}
 
 std::string ReadRest(Reader& reader)
 {
@@ -118,16 +99,18 @@ TEST(LauncherPosix, ManyArgumentsArrive)
     EXPECT_EQ(RunChild(all).out.size(), 1000U * 2001);
 }
 
-TEST(LauncherPosix, ArgumentWithAZeroByteFailsTheStart)
+TEST(LauncherPosix, TextWithAZeroByteFailsTheStart)
 {
     LauncherPosix launcher;
-    EXPECT_TRUE(ThrowsRuntimeError("posix_spawn failed: Invalid argument",
-                                   [&] { launcher.Launch(TEST_CHILD, {std::string("a\0b", 3)}); }));
+    EXPECT_TRUE(ThrowsRuntimeError("posix_spawn failed: /bin/p: Invalid argument",
+                                   [&] { launcher.Launch(L"/bin/p", {std::string("a\0b", 3)}); }));
+    EXPECT_TRUE(ThrowsRuntimeError("posix_spawn failed: /bin/p: Invalid argument",
+                                   [&] { launcher.Launch(std::wstring(L"/bin/p\0q", 8), {}); }));
 }
 
 TEST(LauncherPosix, FailedStartsTellCallPathAndText)
 {
-    const int before = CountDescriptors();
+    const long before = CountOpenThings();
     char script[] = "/tmp/pmutil_notexecXXXXXX";
     const PosixHandle file(::mkostemp(script, O_CLOEXEC), true);
     char foreign[] = "/tmp/pmutil_foreignXXXXXX";
@@ -157,7 +140,7 @@ TEST(LauncherPosix, FailedStartsTellCallPathAndText)
     }
     ::unlink(script);
     ::unlink(foreign);
-    EXPECT_EQ(CountDescriptors(), before + 1);
+    EXPECT_EQ(CountOpenThings(), before + 1);
 }
 
 TEST(LauncherPosix, PathIsPassedInUTF8)
@@ -187,7 +170,6 @@ TEST(LauncherPosix, KillBeforeDuringAndAfter)
     {
         const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "60000"});
         boost::thread killer([&] {
-            std::this_thread::sleep_for(std::chrono::milliseconds(20));
             launcher.Kill();
             launcher.Kill();
         });
@@ -263,24 +245,31 @@ TEST(LauncherPosix, ChildHasDefaultSignals)
     EXPECT_THAT(out, testing::HasSubstr("signals blocked 0 changed 0\n"));
 }
 
-TEST(LauncherPosix, HostWithoutStandardStreamsCanLaunch)
+TEST(LauncherPosix, HostWithClosedStandardStreamsCanLaunch)
 {
-    const int input = ::fcntl(0, F_DUPFD_CLOEXEC, 10);
-    ::close(0);
-    const Outcome run = RunChild({"out", "fine", "exit", "3"});
-    if (input >= 0) {
-        ::dup2(input, 0);
-        ::close(input);
+    for (const int closed : {1, 2, 3}) { // the first of them, and those behind it
+        int kept[3];
+        for (int stream = 0; stream < closed; ++stream) {
+            kept[stream] = ::fcntl(stream, F_DUPFD_CLOEXEC, 10);
+            ::close(stream);
+        }
+        const Outcome run = RunChild({"out", "fine", "exit", "3"});
+        for (int stream = 0; stream < closed; ++stream) {
+            if (kept[stream] < 0)
+                continue;
+            ::dup2(kept[stream], stream);
+            ::close(kept[stream]);
+        }
+        EXPECT_EQ(run.out, "fine\n");
+        EXPECT_EQ(run.exitCode, 3);
     }
-    EXPECT_EQ(run.out, "fine\n");
-    EXPECT_EQ(run.exitCode, 3);
 }
 
 TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
 {
     rlimit before = {};
     ::getrlimit(RLIMIT_NOFILE, &before);
-    const int used = CountDescriptors();
+    const long used = CountOpenThings();
     int failures = 0;
     for (int room = 0; room < 8; ++room) {
         // Fills the table up to `room` free places.
@@ -303,94 +292,93 @@ TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
         }
         fill.clear();
         ::setrlimit(RLIMIT_NOFILE, &before);
-        EXPECT_EQ(CountDescriptors(), used) << "with room for " << room;
+        EXPECT_EQ(CountOpenThings(), used) << "with room for " << room;
         EXPECT_FALSE(HasChildren());
     }
     EXPECT_GE(failures, 6) << "three pipes need six places";
 }
 
+// Ignores the signal that tells of ended children, as long as it lives.
+class IgnoreChildren {
+public:
+    explicit IgnoreChildren(int flags = 0)
+    {
+        struct sigaction ignore = {};
+        ignore.sa_handler = flags == 0 ? SIG_IGN : SIG_DFL;
+        ignore.sa_flags = flags;
+        ::sigaction(SIGCHLD, &ignore, &fBefore);
+    }
+    ~IgnoreChildren() { ::sigaction(SIGCHLD, &fBefore, nullptr); }
+    IgnoreChildren(const IgnoreChildren&) = delete;
+    IgnoreChildren& operator=(const IgnoreChildren&) = delete;
+
+private:
+    struct sigaction fBefore = {};
+};
+
 TEST(LauncherPosix, HostThatIgnoresChildrenGetsAClearFailure)
 {
-    struct sigaction ignore = {};
-    struct sigaction before = {};
-    ignore.sa_handler = SIG_IGN;
-    ::sigaction(SIGCHLD, &ignore, &before);
-    std::string text;
-    int exitCode = -1;
-    try {
+    for (const int flags : {0, SA_NOCLDWAIT}) {
+        const IgnoreChildren ignore(flags);
         LauncherPosix launcher;
-        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "50", "exit", "3"});
-        launcher.Wait(&exitCode);
-    } catch (const std::runtime_error& error) {
-        text = error.what();
+        EXPECT_TRUE(ThrowsRuntimeError(
+            "posix_spawn failed: /bin/p: SIGCHLD is ignored, so that no child can be waited for",
+            [&] { launcher.Launch(L"/bin/p", {}); }));
     }
-    ::sigaction(SIGCHLD, &before, nullptr);
-    EXPECT_EQ(text, "waitid failed: No child processes");
-    EXPECT_EQ(exitCode, -1);
+}
+
+TEST(LauncherPosix, HostThatIgnoresChildrenLaterGetsAClearFailure)
+{
+    LauncherPosix launcher;
+    LaunchResult ends = launcher.Launch(TEST_CHILD, {"echo", "exit", "3"});
+    const IgnoreChildren ignore;
+    ends.fAppInput.reset(); // now it ends
+    int exitCode = -1;
+    EXPECT_TRUE(
+        ThrowsRuntimeError("waitid failed: No child processes", [&] { launcher.Wait(&exitCode); }));
+    EXPECT_EQ(exitCode, -1) << "no wrong code";
 }
 
 TEST(LauncherPosix, OrphanIsSeenOffLater)
 {
     {
         LauncherPosix launcher;
-        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "100"});
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "50"});
     }
     EXPECT_TRUE(HasChildren());
-    std::this_thread::sleep_for(std::chrono::milliseconds(1000));
-    RunChild({"exit", "0"});
-    EXPECT_FALSE(HasChildren());
+    EXPECT_TRUE(Eventually([] {
+        RunChild({"exit", "0"}); // a launch looks after those of before
+        return !HasChildren();
+    }));
+}
+
+TEST(LauncherPosix, StandardOutputIsAWidePipe)
+{
+    LauncherPosix launcher;
+    const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", "0"});
+    int exitCode = -1;
+    launcher.Wait(&exitCode);
+    const auto size = [](const auto& end) {
+        return ::fcntl(dynamic_cast<const PosixHandle&>(*end).GetHandle(), F_GETPIPE_SZ);
+    };
+    EXPECT_GE(size(ends.fAppOutput[1]), size(ends.fAppOutput[2]));
+    EXPECT_GE(size(ends.fAppOutput[1]), 65536) << "a pipe of the usual size at least";
 }
 
 TEST(LauncherPosix, BrokenInputPipeDoesNotKillTheHost)
 {
+    struct sigaction before = {};
+    ::sigaction(SIGPIPE, nullptr, &before);
+    ASSERT_EQ(before.sa_handler, SIG_DFL) << "the signal would kill";
     LauncherPosix launcher;
     const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", "0"});
     int exitCode = -1;
     launcher.Wait(&exitCode);
     EXPECT_TRUE(
         ThrowsRuntimeError("write failed: Broken pipe", [&] { ends.fAppInput->WriteAll("x", 1); }));
-}
-
-TEST(LaunchStorm, LeavesNoDescriptorZombieThreadOrEntry)
-{
-    const int launches = std::getenv("ASSAY_LONG_TESTS") != nullptr ? 10'000 : 300;
-    const int descriptors = CountDescriptors();
-    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
-    {
-        RealLaunch launch({});
-        for (int round = 0; round < launches; ++round) {
-            launch.SetArgs({"exit", std::to_string(round % 256)});
-            int exitCode = -1;
-            ASSERT_EQ(launch.launcher.LaunchAndWait(&exitCode, kLong), State::kFinished);
-            ASSERT_EQ(exitCode, round % 256);
-        }
-    }
-    EXPECT_EQ(CountDescriptors(), descriptors);
-    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads);
-    EXPECT_FALSE(HasChildren());
-}
-
-TEST(LaunchStorm, KillsRacingNaturalEnds)
-{
-    const int descriptors = CountDescriptors();
-    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
-    {
-        RealLaunch launch({});
-        for (int round = 0; round < 200; ++round) {
-            launch.SetArgs({"sleep", "2"});
-            launch.launcher.Launch();
-            boost::thread killer([&, round] {
-                std::this_thread::sleep_for(std::chrono::microseconds(50 * (round % 80)));
-                launch.app->Kill();
-            });
-            const State end = launch.launcher.Wait(nullptr, kLong);
-            killer.join();
-            ASSERT_TRUE(end == State::kFinished || end == State::kKilled) << end;
-        }
-    }
-    EXPECT_EQ(CountDescriptors(), descriptors);
-    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads);
-    EXPECT_FALSE(HasChildren());
+    struct sigaction after = {};
+    ::sigaction(SIGPIPE, nullptr, &after);
+    EXPECT_EQ(after.sa_handler, SIG_DFL);
 }
 
 } // namespace

@@ -1,0 +1,101 @@
+// An application over a fake launcher, with tasks that run as long as the test lets them.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include "FakeLauncher.h"
+#include "Throws.h"
+
+namespace pmutil {
+
+template <typename Call>
+testing::AssertionResult ThrowsFailure(const std::string& text, Call call)
+{
+    return ThrowsExactly<consoleapp::Exception>(text, call);
+}
+
+class ConsoleAppFixture : public testing::Test {
+protected:
+    ConsoleAppFixture()
+    {
+        fParams.SetOutputTask(OutputChannel::kStdout, fStdout);
+        fParams.SetOutputTask(OutputChannel::kStderr, fStderr);
+        fParams.fProgram = L"program";
+        // As a real child's output, that of a killed one ends.
+        fLauncher->fOnKill = [out = fStdout, err = fStderr] {
+            out->fGate.Open();
+            err->fGate.Open();
+        };
+        NewData();
+    }
+
+    ~ConsoleAppFixture() override
+    {
+        OpenTasks();
+        fLauncher->End(kEndedNormally);
+    }
+
+    void OpenTasks()
+    {
+        fStdout->fGate.Open();
+        fStderr->fGate.Open();
+    }
+
+    void NewData()
+    {
+        fData = boost::make_shared<consoleapp::ExecutionData>(boost::weak_ptr<ConsoleApp>(fApp),
+                                                              boost::weak_ptr<OutputTask>(fStdout),
+                                                              boost::weak_ptr<OutputTask>(fStderr));
+    }
+
+    void Launch()
+    {
+        NewData();
+        fStdout->fGate.Close();
+        fStderr->fGate.Close();
+        fApp->Launch(fData, fParams);
+    }
+
+    // Launches, and returns when the launcher's thread waits for the child.
+    void LaunchUntilItWaits()
+    {
+        const int waits = fLauncher->fWaits;
+        Launch();
+        EXPECT_TRUE(Eventually([&] { return fLauncher->fWaits > waits; }));
+    }
+
+    // Lets the child and its output end.
+    void End(WaitResult result, int exitCode = 0)
+    {
+        OpenTasks();
+        fLauncher->End(result, exitCode);
+    }
+
+    // Whether a launch goes well.
+    testing::AssertionResult RunsClean()
+    {
+        try {
+            Launch();
+            End(kEndedNormally, 3);
+            int exitCode = -1;
+            const State end = fApp->Wait(&exitCode, kLong);
+            if (end == State::kFinished && exitCode == 3)
+                return testing::AssertionSuccess();
+            return testing::AssertionFailure() << end << ' ' << exitCode;
+        } catch (const std::exception& exc) {
+            return testing::AssertionFailure() << exc.what();
+        }
+    }
+
+    State Peek() { return fApp->GetState(0.0); }
+
+    boost::shared_ptr<FakeLauncher> fLauncher = boost::make_shared<FakeLauncher>();
+    boost::shared_ptr<RecordingApp> fApp = boost::make_shared<RecordingApp>(fLauncher);
+    boost::shared_ptr<PatientTask> fStdout = boost::make_shared<PatientTask>();
+    boost::shared_ptr<PatientTask> fStderr = boost::make_shared<PatientTask>();
+    boost::shared_ptr<Gate> fGate = boost::make_shared<Gate>(); // for what a test wants to hold up
+    boost::shared_ptr<consoleapp::ExecutionData> fData;
+    LaunchParams fParams;
+};
+
+} // namespace pmutil
