@@ -2,11 +2,13 @@
 #pragma once
 
 #include <cstddef>
+#include <string>
+#include <vector>
 
 void PrepareStreams();
 std::size_t ReadInput(char* bytes, std::size_t size);
 [[noreturn]] void ExitNow(int code);
 [[noreturn]] void CrashNow();
 void CloseOutputs();
-void SpawnGrandchild(const char* program, const char* word);
+void SpawnGrandchild(const std::vector<std::string>& command); // of words without blanks
 void WriteState();

@@ -8,7 +8,8 @@
 //   abort                  dies of it
 //   args ...               writes the rest of the arguments, each in hexadecimal, and ends
 //   close                  closes standard output and standard error
-//   spawn WORD             starts a grandchild with this child's streams that does the word
+//   spawn MILLISECONDS     starts a grandchild that sleeps, with this child's streams
+//   heir                   starts a grandchild with this child's streams that does echo
 //   state                  writes the descriptors it has and its signal state (Linux only)
 #include <chrono>
 #include <cstdio>
@@ -80,7 +81,9 @@ int main(int argc, char** argv)
         } else if (word == "close") {
             CloseOutputs();
         } else if (word == "spawn") {
-            SpawnGrandchild(argv[0], next());
+            SpawnGrandchild({argv[0], "sleep", next()});
+        } else if (word == "heir") {
+            SpawnGrandchild({argv[0], "echo"});
         } else if (word == "state") {
             WriteState();
         } else if (word == "args") {

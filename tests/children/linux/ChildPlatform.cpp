@@ -37,10 +37,13 @@ void CloseOutputs()
     ::close(STDERR_FILENO);
 }
 
-void SpawnGrandchild(const char* program, const char* word)
+void SpawnGrandchild(const std::vector<std::string>& command)
 {
-    char* const argv[] = {const_cast<char*>(program), const_cast<char*>(word), nullptr};
-    ::posix_spawn(nullptr, program, nullptr, nullptr, argv, ::environ);
+    std::vector<char*> argv;
+    for (const std::string& word : command)
+        argv.push_back(const_cast<char*>(word.c_str()));
+    argv.push_back(nullptr);
+    ::posix_spawn(nullptr, argv[0], nullptr, nullptr, argv.data(), ::environ);
 }
 
 void WriteState()

@@ -40,9 +40,11 @@ void CloseOutputs()
     ::_close(2);
 }
 
-void SpawnGrandchild(const char* program, const char* word)
+void SpawnGrandchild(const std::vector<std::string>& command)
 {
-    std::string line = "\"" + std::string(program) + "\" " + word;
+    std::string line = "\"" + command[0] + "\"";
+    for (std::size_t index = 1; index < command.size(); ++index)
+        line += " " + command[index];
     STARTUPINFOA startup = {};
     startup.cb = sizeof startup;
     PROCESS_INFORMATION process = {};

@@ -134,7 +134,7 @@ TEST(Launch, GrandchildThatHoldsThePipesIsGivenUp)
 {
     const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
     // The grandchild reads its input, which is the child's, to its end.
-    RealLaunch launch({"spawn", "echo", "exit", "0"}, true);
+    RealLaunch launch({"heir", "exit", "0"}, true);
     // Both pumps hang, for a short wait each: the launcher's thread is given up before that.
     EXPECT_EQ(launch.launcher.LaunchAndWait(nullptr, kLong), State::kTimeout);
     EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
