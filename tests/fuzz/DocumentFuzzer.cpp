@@ -1,0 +1,107 @@
+// Any bytes as a report: what is made of it is valid, and the way back is exact. Any JSON as a
+// document: read, or refused with a text.
+#include <cstdint>
+#include <cstdlib>
+#include <sstream>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+
+#include <nlohmann/json.hpp>
+
+#include "report/Diff.h"
+#include "report/JsonDocument.h"
+#include "report/ReportReader.h"
+#include "report/TextView.h"
+
+namespace {
+
+using namespace assay_host;
+using Json = nlohmann::ordered_json;
+
+void Require(bool holds)
+{
+    if (!holds)
+        std::abort();
+}
+
+Report ReadReport(std::string_view text)
+{
+    ReportReader reader;
+    Report report;
+    report.Add(reader.Feed(text));
+    report.Add(reader.Finish());
+    return report;
+}
+
+RunOutcome MakeOutcome(const std::string& bytes)
+{
+    RunOutcome outcome;
+    outcome.fCommand = {bytes};
+    outcome.fTermination = bytes;
+    outcome.fReason = bytes;
+    outcome.fLastReportLine = bytes;
+    outcome.fErrorLines = {bytes};
+    return outcome;
+}
+
+void CheckReport(const std::string& bytes)
+{
+    const Report report = ReadReport(bytes);
+    const RunOutcome outcome = MakeOutcome(bytes);
+    const Json document = Json::parse(MakeDocument(report, outcome).dump());
+    const Report back = ReadDocument(document);
+    Require(back.ToText() == report.ToText());
+    Require(MakeDocument(back, outcome) == document);
+
+    std::string events = MakeStartEvent({bytes}).dump() + "\n";
+    for (const ReportLine& line : report.GetLines())
+        events += MakeLineEvent(line, 1).dump() + "\n";
+    events += MakeErrorLineEvent(bytes, 1).dump() + "\n" + MakeEndEvent(outcome).dump() + "\n";
+    Require(ReadEvents(events).ToText() == report.ToText());
+
+    Require(DecodeBytes(EncodeBytes(bytes)) == bytes);
+    std::ostringstream nothing;
+    Require(!PrintDiff(nothing, report, back, DiffOptions()));
+    Require(nothing.str().empty());
+
+    std::ostringstream out;
+    PrintText(out, report, outcome, 60);
+    for (const char character : out.str())
+        Require(character == '\n' || static_cast<unsigned char>(character) >= ' ');
+
+    const std::size_t half = bytes.size() / 2;
+    PrintDiff(nothing, ReadReport(bytes.substr(0, half)), ReadReport(bytes.substr(half)),
+              DiffOptions());
+}
+
+template <typename Read>
+void CheckRead(Read read)
+{
+    try {
+        read();
+    } catch (const std::runtime_error& failure) {
+        Require(*failure.what() != '\0');
+    }
+}
+
+void CheckJson(const std::string& bytes)
+{
+    const Json document = Json::parse(bytes, nullptr, false);
+    if (!document.is_discarded())
+        CheckRead([&document] { ReadDocument(document); });
+    CheckRead([&bytes] { ReadEvents(bytes); });
+    CheckRead([&bytes] { ReadEvents(MakeStartEvent({}).dump() + "\n" + bytes); });
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size)
+{
+    const std::string bytes(data, data + size);
+    CheckReport(bytes);
+    CheckJson(bytes);
+    return 0;
+}
