@@ -64,8 +64,11 @@ void Position::Add(const ReportLine& line)
         else if (!passed.fTag.empty() && fDropped.count(passed.fTag) == 0)
             ++fSteps;
     }
-    if (fEntries[fNext].fTakesStep)
+    const Entry& entry = fEntries[fNext];
+    if (entry.fTakesStep)
         ++fSteps;
+    if (entry.fKey == entry.fTag + ".CUDASupported" && line.fValue == "0")
+        fSilent.insert(entry.fTag);
     ++fNext;
     if (line.fKey == kGLCountKey)
         fGLCount = ReadCount(line.fValue);
@@ -80,7 +83,8 @@ std::string Position::GetNextKey() const
 {
     for (std::size_t index = fNext; index < fEntries.size(); ++index) {
         const Entry& entry = fEntries[index];
-        if (entry.fTag.empty() || fDropped.count(entry.fTag) == 0)
+        const bool isSilent = entry.fMayBeSilent && fSilent.count(entry.fTag) > 0;
+        if (entry.fTag.empty() || (!isSilent && fDropped.count(entry.fTag) == 0))
             return entry.fKey;
     }
     return {};

@@ -20,7 +20,8 @@ public:
     // Steps that are known to be taken.
     std::size_t GetSteps() const { return fSteps; }
 
-    // The key whose line comes next, and so what the child is at; empty behind the last one.
+    // The key whose line comes next, and so what the child is at; empty behind the last one. A
+    // device without CUDA has no line for its version, and asks nothing risky there.
     std::string GetNextKey() const;
 
 private:
@@ -39,6 +40,7 @@ private:
     std::vector<Entry> fEntries;
     std::unordered_map<std::string, std::size_t> fPlaces;
     std::set<std::string> fDropped; // tags of devices that were passed over
+    std::set<std::string> fSilent;  // tags of devices that print no CUDAVersion
     std::size_t fNext = 0;
     std::size_t fSteps = 0;
 };

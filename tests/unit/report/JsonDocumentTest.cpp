@@ -85,6 +85,17 @@ TEST(JsonDocument, TellsTheOutcome)
     EXPECT_EQ(Document("", RunOutcome())["outcome"], none);
 }
 
+TEST(JsonDocument, HasEachVerdictWithItsStatus)
+{
+    for (int status = 0; status <= static_cast<int>(Verdict::kInterrupted); ++status) {
+        RunOutcome outcome;
+        outcome.fVerdict = static_cast<Verdict>(status);
+        const Json json = Document("", outcome)["outcome"];
+        EXPECT_EQ(json["status"], status);
+        EXPECT_EQ(json["verdict"], GetVerdictName(outcome.fVerdict));
+    }
+}
+
 TEST(JsonDocument, KeepsTimesThatJsonCanSay)
 {
     RunOutcome outcome;
