@@ -11,4 +11,5 @@ std::size_t ReadInput(char* bytes, std::size_t size);
 [[noreturn]] void CrashNow();
 void CloseOutputs();
 void SpawnGrandchild(const std::vector<std::string>& command); // of words without blanks
+void WriteCommandLine();
 void WriteState();

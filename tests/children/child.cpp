@@ -10,6 +10,7 @@
 //   close                  closes standard output and standard error
 //   spawn MILLISECONDS     starts a grandchild that sleeps, with this child's streams
 //   heir                   starts a grandchild with this child's streams that does echo
+//   line                   writes its command line, each character in hexadecimal (Windows only)
 //   state                  writes the descriptors it has and its signal state (Linux only)
 #include <chrono>
 #include <cstdio>
@@ -84,6 +85,9 @@ int main(int argc, char** argv)
             SpawnGrandchild({argv[0], "sleep", next()});
         } else if (word == "heir") {
             SpawnGrandchild({argv[0], "echo"});
+        } else if (word == "line") {
+            WriteCommandLine();
+            return 0;
         } else if (word == "state") {
             WriteState();
         } else if (word == "args") {

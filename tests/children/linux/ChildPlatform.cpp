@@ -46,6 +46,8 @@ void SpawnGrandchild(const std::vector<std::string>& command)
     ::posix_spawn(nullptr, argv[0], nullptr, nullptr, argv.data(), ::environ);
 }
 
+void WriteCommandLine() {}
+
 void WriteState()
 {
     std::printf("descriptors");

@@ -52,4 +52,11 @@ void SpawnGrandchild(const std::vector<std::string>& command)
                      &process);
 }
 
+void WriteCommandLine()
+{
+    for (const wchar_t* at = ::GetCommandLineW(); *at != L'\0'; ++at)
+        std::printf("%04x", static_cast<unsigned>(*at));
+    std::fflush(stdout);
+}
+
 void WriteState() {}
