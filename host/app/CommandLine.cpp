@@ -192,9 +192,7 @@ private:
         return fRun;
     }
 
-    CLI::App fApp{
-        "Runs assay as a child, survives whatever a driver does to it, and says what came of "
-        "it."};
+    CLI::App fApp{"Runs assay as a child, survives whatever a driver does, says what came of it."};
     const std::shared_ptr<HelpFormatter> fFormatter = std::make_shared<HelpFormatter>();
     CLI::App* fRunCommand = nullptr;
     CLI::App* fTortureCommand = nullptr;

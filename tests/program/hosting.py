@@ -1,0 +1,152 @@
+"""Runs assay-host as its users do, and holds what it says to its own schemas."""
+
+import json
+import os
+import signal
+import subprocess
+import sys
+import time
+import uuid
+from dataclasses import dataclass
+from pathlib import Path
+
+import pytest
+
+from harness import BUILD, PROGRAM, TREE, text_of
+
+sys.path.insert(0, str(TREE / "tests" / "schema"))
+pytest.importorskip("jsonschema", reason="python3-jsonschema isn't there")
+
+from validate import decode, report_bytes, validate_document, validate_events  # noqa: E402
+
+HOST = BUILD / "bin" / "assay-host"
+CHILD = BUILD / "bin" / "test_child"
+
+STATUSES = {"complete": 0, "failed-tests": 1, "usage-error": 2, "crashed": 3, "hung": 4,
+            "never-started": 5, "interrupted": 6}
+TROUBLE = 10
+
+# What a verdict may take beyond the timeout, and what a busy machine adds.
+GRACE = 2.0
+SLACK = 1.0
+
+
+@dataclass
+class Hosted:
+    """How assay-host ended, and what it said."""
+
+    status: int
+    out: bytes
+    err: bytes
+    seconds: float
+    peak_kib: int  # the most memory that it had itself
+
+    @property
+    def text(self):
+        return text_of(self.out)
+
+    def document(self):
+        """The JSON document, held to the schema and to the status."""
+        result = validate_document(self.out)
+        assert self.status == result["outcome"]["status"]
+        assert self.status == STATUSES[result["outcome"]["verdict"]]
+        return result
+
+    def events(self):
+        result = validate_events(self.out)
+        assert result[0]["event"] == "start"
+        assert result[-1]["event"] == "end"
+        assert self.status == result[-1]["outcome"]["status"]
+        return result
+
+
+def processes_with(mark):
+    """The processes that have the mark among their variables."""
+    found = []
+    for folder in Path("/proc").iterdir():
+        try:
+            if folder.name.isdigit() and mark in (folder / "environ").read_bytes():
+                found.append((int(folder.name), (folder / "stat").read_text().split()[2]))
+        except OSError:
+            pass
+    return found
+
+
+class Watched:
+    """assay-host at work. Used as a context: at its end nothing that it started may be left."""
+
+    def __init__(self, *arguments, environment=None, stdin=subprocess.DEVNULL,
+                 stdout=subprocess.PIPE, stderr=subprocess.PIPE, program=HOST, **options):
+        self.mark = f"ASSAY_TEST_MARK={uuid.uuid4()}".encode()
+        name, value = self.mark.decode().split("=")
+        self.start = time.monotonic()
+        self.process = subprocess.Popen(
+            [program, *arguments], stdin=stdin, stdout=stdout, stderr=stderr,
+            env={**(os.environ if environment is None else environment), name: value}, **options)
+        self.peak_kib = 0
+
+    def __enter__(self):
+        return self
+
+    def __exit__(self, *_):
+        left = processes_with(self.mark)
+        self.process.kill()
+        self.process.wait()
+        for number, _ in left:
+            try:
+                os.kill(number, signal.SIGKILL)
+            except ProcessLookupError:
+                pass
+        assert left == []
+
+    def look(self):
+        try:
+            for line in Path(f"/proc/{self.process.pid}/status").read_text().splitlines():
+                if line.startswith("VmHWM:"):
+                    self.peak_kib = max(self.peak_kib, int(line.split()[1]))
+        except OSError:
+            pass
+
+    def finish(self, seconds=60):
+        deadline = time.monotonic() + seconds
+        while True:
+            self.look()
+            try:
+                out, err = self.process.communicate(timeout=0.02)
+                break
+            except subprocess.TimeoutExpired:
+                assert time.monotonic() < deadline, "assay-host doesn't end"
+        return Hosted(self.process.returncode, out or b"", err or b"",
+                      time.monotonic() - self.start, self.peak_kib)
+
+
+def host_run(*arguments, seconds=60, **options):
+    """One run of assay-host to its end."""
+    with Watched(*arguments, **options) as watched:
+        return watched.finish(seconds)
+
+
+def run_assay(host, *options, child=(), assay=None, machine=None, **more):
+    """`assay-host run` on a machine as the harness describes one."""
+    machine = dict(machine or {})
+    machine.setdefault("opencl", "absent")
+    arguments = ["run", "--assay", str(assay or PROGRAM), *options]
+    if child:
+        arguments += ["--", *child]
+    return host_run(*arguments, environment=host.environment(**machine), **more)
+
+
+def script_child(folder, text, name="child"):
+    """An executable shell script that plays the child."""
+    file = folder / name
+    file.write_text("#!/bin/sh\n" + text + "\n")
+    file.chmod(0o755)
+    return file
+
+
+def texts(document, kind="value"):
+    return [text_of(decode(line["text"])) for line in document["lines"] if line["kind"] == kind]
+
+
+__all__ = ["CHILD", "GRACE", "HOST", "SLACK", "STATUSES", "TROUBLE", "Hosted", "Watched", "decode",
+           "host_run", "json", "report_bytes", "run_assay", "script_child", "texts"]

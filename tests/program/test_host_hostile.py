@@ -1,0 +1,343 @@
+"""Children that do what no child should: assay-host ends within the timeout plus two seconds, says
+clearly what it saw, keeps its memory bounded, and leaves no process behind."""
+
+import os
+import re
+import struct
+import time
+
+import pytest
+
+from harness import PROGRAM, SANITIZED_BY, text_of
+from hosting import (CHILD, GRACE, TROUBLE, Watched, host_run, report_bytes, script_child, texts)
+
+TIMEOUT = 1.5
+MEBIBYTE = 1 << 20
+
+# What assay-host may need for any child, limits reached and all.
+MOST_KIB = 192 * 1024
+REPORT = 'echo \'assayStart="x"\'; echo \'assayEnd="y"\''
+
+
+def run_child(program, *options, timeout=TIMEOUT, child=(), **more):
+    """A document of a run that must end in time."""
+    arguments = ["run", "--assay", str(program), "--format", "json", "--timeout", str(timeout),
+                 *options]
+    if child:
+        arguments += ["--", *map(str, child)]
+    run = host_run(*arguments, **more)
+    assert run.seconds < timeout + GRACE
+    if not SANITIZED_BY:
+        assert run.peak_kib < MOST_KIB
+    return run
+
+
+def verdict_of(run):
+    return run.document()["outcome"]["verdict"]
+
+
+def test_missing(tmp_path):
+    run = run_child(tmp_path / "missing")
+    assert verdict_of(run) == "never-started"
+    assert f"there is no file {tmp_path / 'missing'}" in run.document()["outcome"]["reason"]
+    assert run.seconds < TIMEOUT
+
+
+def test_directory(tmp_path):
+    run = run_child(tmp_path)
+    assert verdict_of(run) == "never-started"
+    assert f"{tmp_path} is a directory" in run.document()["outcome"]["reason"]
+
+
+def test_no_permission(tmp_path):
+    file = tmp_path / "file"
+    file.write_bytes(PROGRAM.read_bytes())
+    file.chmod(0o644)
+    run = run_child(file)
+    assert verdict_of(run) == "never-started"
+    assert "Permission denied" in run.document()["outcome"]["reason"]
+
+
+def foreign_elf(folder):
+    """This machine's program, said to be for another one (EM_SPARC)."""
+    data = bytearray(PROGRAM.read_bytes())
+    assert data[:4] == b"\x7fELF"
+    struct.pack_into("<H", data, 18, 2)
+    (folder / "foreign").write_bytes(data)
+    return folder / "foreign"
+
+
+@pytest.mark.parametrize("content", [b"no program at all\n", b"", b"MZ\x90\x00", b"\x7fELF", None])
+def test_foreign_executable(tmp_path, content):
+    if content is None:
+        file = foreign_elf(tmp_path)
+    else:
+        file = tmp_path / "file"
+        file.write_bytes(content)
+    file.chmod(0o755)
+    run = run_child(file)
+    assert verdict_of(run) == "never-started"
+    assert str(file) in run.document()["outcome"]["reason"]
+
+
+def test_missing_interpreter(tmp_path):
+    file = tmp_path / "file"
+    file.write_text("#!/no/such/interpreter\n")
+    file.chmod(0o755)
+    assert verdict_of(run_child(file)) == "never-started"
+
+
+def test_another_program_than_assay():
+    document = run_child("/bin/true").document()
+    assert document["outcome"]["verdict"] == "failed-tests"
+    assert document["lines"] == []
+
+
+@pytest.mark.parametrize("line, form, size", [
+    ("xxxxxxxxxx", "json", 3_000_000_000), ("a=1", "json", 1_000_000_000),
+    ("", "json", 1_000_000_000), ('a="', "json", 1_000_000_000), ("a=1", "jsonl", 200_000_000),
+    ("xxxxxxxxxx", "text", 200_000_000), ("a=1", "text", 200_000_000)])
+def test_flood(tmp_path, line, form, size):
+    """Gigabytes, in one line or in many; bounded memory, and the cut is told."""
+    flood = f"yes '{line}' | head -c {size}"
+    if line.startswith("x"):
+        flood += " | tr '\\n' x"
+    child = script_child(tmp_path, f"{flood}; {REPORT}")
+    arguments = ["run", "--assay", str(child), "--format", form, "--timeout", "30"]
+    run = host_run(*arguments, seconds=60)
+    assert run.status == 1 # the report's own lines went down in the flood
+    if not SANITIZED_BY:
+        assert run.peak_kib < MOST_KIB
+    if form == "text":
+        assert re.search(r"output was too much: \d{9} bytes of it were cut", run.text)
+        return
+    outcome = run.document()["outcome"] if form == "json" else run.events()[-1]["outcome"]
+    assert outcome["verdict"] == "failed-tests"
+    assert outcome["lostOutputBytes"] > 0.9 * size
+
+
+def test_flood_on_standard_error(tmp_path):
+    child = script_child(tmp_path, f"{REPORT}; yes words | head -c 500000000 >&2")
+    run = run_child(child, timeout=30)
+    document = run.document()
+    assert document["outcome"]["verdict"] == "complete"
+    assert document["outcome"]["lostErrorBytes"] > 490_000_000
+    assert len(document["outcome"]["errorLines"]) == 10000
+
+
+@pytest.mark.parametrize("stream", ["", ">&2"])
+def test_endless_flood(tmp_path, stream):
+    run = run_child(script_child(tmp_path, f"exec yes words {stream}"))
+    assert verdict_of(run) == "hung"
+    assert run.seconds >= TIMEOUT
+
+
+def test_binary_garbage(tmp_path):
+    data = os.urandom(3 * MEBIBYTE)
+    (tmp_path / "garbage").write_bytes(data)
+    child = script_child(tmp_path, f"cat {tmp_path}/garbage; cat {tmp_path}/garbage >&2; {REPORT}")
+    run = run_child(child, timeout=20)
+    document = run.document()
+    # The first line of the report went into the garbage's last one.
+    assert document["outcome"]["verdict"] == "failed-tests"
+    assert report_bytes(document).startswith(data)
+    assert texts(document)[-1] == 'assayEnd="y"'
+
+
+def test_garbage_that_is_no_line(tmp_path):
+    data = bytes(range(256)) * 64
+    data = data.replace(b"\n", b"")
+    (tmp_path / "garbage").write_bytes(data)
+    run = run_child(script_child(tmp_path, f"{REPORT}; cat {tmp_path}/garbage"))
+    document = run.document()
+    assert document["outcome"]["verdict"] == "complete"
+    assert report_bytes(document).endswith(data)
+
+
+def test_deaf_to_signals(tmp_path):
+    child = script_child(tmp_path, "trap '' TERM INT HUP; while :; do sleep 0.1; done")
+    assert verdict_of(run_child(child)) == "hung"
+
+
+def test_deaf_to_the_end_of_its_input(tmp_path):
+    child = script_child(tmp_path, f"cat; {REPORT}; while :; do sleep 0.1; done")
+    document = run_child(child).document()
+    assert document["outcome"]["verdict"] == "hung"
+    assert texts(document)[-1] == 'assayEnd="y"' # its input had ended
+
+
+def test_own_input_is_not_the_childs(tmp_path):
+    read, write = os.pipe()
+    try:
+        run = run_child(script_child(tmp_path, f"cat; {REPORT}"), stdin=read)
+        assert verdict_of(run) == "complete"
+    finally:
+        os.close(read)
+        os.close(write)
+
+
+LEFT_BEHIND = {
+    "with the pipe": "sleep 1000 &",
+    "in a session of its own": "setsid sleep 1000 &",
+    "twice removed": "(setsid sh -c 'sleep 1000 & sleep 1000 &' &)",
+    "without the pipe": "setsid sleep 1000 >/dev/null 2>&1 </dev/null &",
+    "deaf": "sh -c \"trap '' TERM; while :; do sleep 1; done\" &",
+    "many": "for i in 1 2 3 4 5 6 7 8 9 10 11 12 13 14 15 16; do sleep 1000 & done",
+}
+
+
+@pytest.mark.parametrize("name", LEFT_BEHIND)
+def test_grandchild(tmp_path, name):
+    """Watched sees to it that none is left."""
+    run = run_child(script_child(tmp_path, f"{REPORT}; {LEFT_BEHIND[name]}"), timeout=20)
+    assert verdict_of(run) == "complete"
+    assert not run.document()["outcome"]["leftBehind"]
+    assert run.seconds < GRACE
+
+
+def test_grandchild_that_floods(tmp_path):
+    run = run_child(script_child(tmp_path, f"{REPORT}; yes words &"), timeout=20)
+    assert verdict_of(run) == "complete"
+    assert run.seconds < GRACE
+
+
+def test_grandchild_of_a_child_that_hangs(tmp_path):
+    run = run_child(script_child(tmp_path, "setsid sleep 1000 & sleep 1000"))
+    assert verdict_of(run) == "hung"
+
+
+def test_closed_streams(tmp_path):
+    run = run_child(script_child(tmp_path, f"{REPORT}; exec >&- 2>&-; sleep 0.3"))
+    assert verdict_of(run) == "complete"
+    run = run_child(script_child(tmp_path, f"{REPORT}; exec >&- 2>&-; sleep 1000"))
+    assert verdict_of(run) == "hung"
+
+
+def test_stopped_child(tmp_path):
+    assert verdict_of(run_child(script_child(tmp_path, "kill -STOP $$"))) == "hung"
+
+
+def test_child_that_kills_its_group(tmp_path):
+    """A host of its own group survives no such thing; as a shell's job it is in one of its own."""
+    child = script_child(tmp_path, "kill -KILL $$")
+    document = run_child(child).document()
+    assert document["outcome"]["verdict"] == "crashed"
+    assert document["outcome"]["termination"].startswith("signal 9 ")
+
+
+def test_arguments_reach_the_child_as_they_are():
+    words = ["", "a b", '"', "'", "\\", "-x=--", "*", "caf\u00e9", "\udcff", "--", "--help"]
+    run = run_child(CHILD, child=["args", *words])
+    shown = [bytes.fromhex(line) for line in text_of(report_bytes(run.document())).splitlines()]
+    assert shown == [os.fsencode(word) for word in words]
+
+
+# The host's own output.
+
+@pytest.mark.parametrize("form", ["text", "json", "jsonl"])
+def test_output_that_is_full(form):
+    with open("/dev/full", "wb") as full:
+        run = host_run("run", "--assay", CHILD, "--format", form, "--", "out", "a=1", stdout=full)
+    assert run.status == TROUBLE
+    assert b"cannot write to standard output: No space left on device" in run.err
+
+
+@pytest.mark.parametrize("form", ["text", "json", "jsonl"])
+def test_reader_that_has_gone(form):
+    read, write = os.pipe()
+    os.close(read)
+    start = time.monotonic()
+    run = host_run("run", "--assay", CHILD, "--format", form, "--", "out", "a=1", "sleep", "500",
+                   stdout=write)
+    os.close(write)
+    assert run.status == TROUBLE
+    assert b"cannot write to standard output: Broken pipe" in run.err
+    assert time.monotonic() - start < 5
+
+
+def test_closed_standard_output():
+    run = host_run("run", "--assay", CHILD, "--", "out", "a=1", stdout=None,
+                   preexec_fn=lambda: os.close(1))
+    assert run.status == TROUBLE
+    assert b"cannot write to standard output" in run.err
+
+
+def test_reader_that_leaves_ends_the_run():
+    """Nobody is left to run for."""
+    read, write = os.pipe()
+    with Watched("run", "--assay", CHILD, "--raw", "--timeout", "60", "--", "out", "a=1", "sleep",
+                 "300", "out", "b=1", "sleep", "50000", stdout=write) as watched:
+        os.close(write)
+        assert os.read(read, 100) == b"a=1\n"
+        os.close(read)
+        run = watched.finish(20)
+    assert run.status == TROUBLE
+    assert run.seconds < 5
+
+
+def test_output_file(tmp_path):
+    file = tmp_path / "result.json"
+    run = run_child(CHILD, "--output", file, child=["out", "a=1"])
+    assert run.out == b""
+    assert b'"a=1"' in file.read_bytes()
+    assert [each.name for each in tmp_path.iterdir()] == ["result.json"]
+
+
+def test_output_file_is_replaced_in_one_piece(tmp_path):
+    file = tmp_path / "result"
+    file.write_text("before")
+    file.chmod(0o640)
+    link = tmp_path / "link"
+    link.symlink_to(file)
+    with Watched("run", "--assay", CHILD, "--format", "jsonl", "--output", link, "--", "out", "a=1",
+                 "sleep", "700") as watched:
+        time.sleep(0.4)
+        assert file.read_text() == "before"
+        others = [each for each in tmp_path.iterdir() if each not in (file, link)]
+        assert len(others) == 1
+        assert b"a=1" in others[0].read_bytes() # there, should the host itself die
+        watched.finish()
+    assert b"a=1" in file.read_bytes()
+    assert file.stat().st_mode & 0o777 == 0o640
+    assert link.is_symlink()
+    assert sorted(each.name for each in tmp_path.iterdir()) == ["link", "result"]
+
+
+@pytest.mark.parametrize("path, text", [
+    ("missing/result", "No such file or directory"), (".", "Is a directory"),
+    ("file/result", "Not a directory")])
+def test_output_that_cannot_be(tmp_path, path, text):
+    (tmp_path / "file").touch()
+    run = host_run("run", "--assay", CHILD, "--output", tmp_path / path, "--", "out", "a=1")
+    assert run.status == TROUBLE
+    assert text_of(run.err).startswith(f"assay-host: cannot write {tmp_path / path}: ")
+    assert text in text_of(run.err)
+    assert [each.name for each in tmp_path.iterdir()] == ["file"]
+
+
+def test_output_on_a_device():
+    run = host_run("run", "--assay", CHILD, "--output", "/dev/full", "--", "out", "a=1")
+    assert run.status == TROUBLE
+    assert b"cannot write /dev/full: No space left on device" in run.err
+    assert not os.path.isfile("/dev/full")
+    assert host_run("run", "--assay", CHILD, "--output", "/dev/null", "--", "out",
+                    'assayStart="x"', "out", 'assayEnd="y"').status == 0
+    assert not os.path.isfile("/dev/null")
+
+
+def test_output_on_a_full_disk(tmp_path):
+    """The limit on a file's size stands for the disk."""
+    import resource
+    import signal
+
+    def limit():
+        signal.signal(signal.SIGXFSZ, signal.SIG_IGN)
+        resource.setrlimit(resource.RLIMIT_FSIZE, (100, 100))
+
+    file = tmp_path / "result"
+    file.write_text("before")
+    run = host_run("run", "--assay", CHILD, "--output", file, "--", "out", "a=1", preexec_fn=limit)
+    assert run.status == TROUBLE
+    assert b"File too large" in run.err
+    assert file.read_text() == "before"
+    assert [each.name for each in tmp_path.iterdir()] == ["result"]

@@ -1,0 +1,146 @@
+"""`assay-host torture`: every step of real and scripted machines, and children that break the rules."""
+
+import os
+import re
+import shutil
+import signal
+import time
+
+import pytest
+
+from harness import PROGRAM, PROGRAM_AT_ROOT
+from hosting import HOST, Watched, host_run, script_child
+from model import Gpu
+from test_opencl import Machine
+
+SUMMARY = re.compile(r"(\d+) runs, each as predicted, in \d+\.\d s\.\n$")
+
+
+def torture(environment, *options, assay=PROGRAM, seconds=120, **more):
+    return host_run("torture", "--assay", assay, *options, environment=environment, seconds=seconds,
+                    **more)
+
+
+def test_two_devices_of_each_kind(host):
+    machine = Machine(host, gl=2)
+    machine.script("".join(platform.script() for platform in machine.platforms))
+    run = torture(host.environment(**machine.found), assay=PROGRAM_AT_ROOT)
+    steps = 10 + 2 * 35 + 2 * 12
+    assert run.text.startswith(f"2 OpenGL and 2 OpenCL devices, {steps} steps.\n"
+                               f"-crashAfter=0 to {steps}: as predicted.\n"
+                               f"-throwAfter=0 to {steps}: as predicted.\n")
+    assert int(SUMMARY.search(run.text).group(1)) == 2 * (steps + 1)
+    assert (run.status, run.err) == (0, b"")
+
+
+@pytest.mark.parametrize("kind, runs", [("crash", 10), ("throw", 10), ("both", 20)])
+def test_kinds(host, kind, runs):
+    run = torture(host.environment(script="# nothing\n", opencl="absent"), "--kind", kind)
+    assert run.text.startswith("0 OpenGL and no OpenCL devices, 9 steps.\n")
+    assert int(SUMMARY.search(run.text).group(1)) == runs
+    assert ("crashAfter" in run.text, "throwAfter" in run.text) == (kind != "throw",
+                                                                    kind != "crash")
+
+
+def test_device_that_fails_by_itself(host):
+    """In the middle of its tests, and at a test that prints before it asks."""
+    for rule in ("at glGetString(GL_RENDERER) error GL_INVALID_OPERATION",
+                 "at glGetString(GL_SHADING_LANGUAGE_VERSION) error GL_INVALID_OPERATION"):
+        run = torture(host.environment(script=Gpu().script() + rule + "\n", opencl="absent"))
+        assert run.status == 0, run.text
+
+
+def test_child_options_go_along(host):
+    run = torture(host.environment(script=Gpu().script(), opencl="absent"), "--kind", "throw", "--",
+                  "-exit=7", "-stdout=in front", "-verbose=1")
+    assert run.status == 0, run.text
+
+
+def wrapped(folder, condition, action):
+    """A child that is assay but where the condition holds of its last argument."""
+    return script_child(folder, f'for last; do :; done\ncase "$last" in\n{condition}) {action};;\nesac\n'
+                        f'exec {PROGRAM} "$@"')
+
+
+RULE_BREAKERS = {
+    "a wrong status": (f"{PROGRAM} \"$@\"; exit 0", "exit status: predicted 2, found 0"),
+    "a crash in earnest": ("kill -SEGV $$", "predicted 2, found none: The child died of signal 11"),
+    "a line too few": (f"{PROGRAM} \"$@\" | sed '$d'; exit 2", "    + (the end)"),
+    "a line too many": (f"{PROGRAM} \"$@\"; echo NumGLGPUs=1; exit 2", "    + NumGLGPUs=1"),
+    "another order": (f"{PROGRAM} \"$@\" | sed '$!{{h;d}};G'; exit 2", "report (- predicted"),
+    "other words": ("echo exception: other >&2; exec " + str(PROGRAM) + ' "$@"',
+                    "    + exception: other"),
+    "no failure": (f"exec {PROGRAM}", "exit status: predicted 2, found 0"),
+    "no end": ("sleep 1000", "did not end within 2 s"),
+}
+
+
+@pytest.mark.parametrize("name", RULE_BREAKERS)
+def test_first_outcome_that_is_not_predicted(host, tmp_path, name):
+    action, shown = RULE_BREAKERS[name]
+    child = wrapped(tmp_path, "-crashAfter=5", action)
+    run = torture(host.environment(script=Gpu().script(), opencl="absent"), "--timeout", "2",
+                  assay=child)
+    assert run.status == 1
+    assert "\n-crashAfter=5 is not what the rules predict:\n" in run.text
+    assert shown in run.text
+    assert run.text.endswith(f"  command: {child} -crashAfter=5\n")
+
+
+def test_undisturbed_run_that_is_none(host, tmp_path):
+    environment = host.environment(script=Gpu().script(), opencl="absent")
+    run = torture(environment, assay="/bin/true")
+    assert run.status == 1
+    assert run.text.startswith("Nothing can be predicted: the undisturbed run did not come to its end")
+    run = torture(environment, assay=script_child(tmp_path, f'{PROGRAM} "$@" | grep -v GLVendor='))
+    assert run.status == 1
+    assert "Nothing can be predicted: the report has no line for glgpu[0].GLVendor" in run.text
+    run = torture(environment, assay=tmp_path / "missing")
+    assert run.status == 5
+    assert "there is no file" in run.text
+
+
+def test_interrupt(host):
+    environment = host.environment(opencl="absent", script=Gpu().script() +
+                                   "at glLinkProgram sleep 300\n")
+    with Watched("torture", "--assay", PROGRAM, environment=environment) as watched:
+        time.sleep(1.5)
+        watched.process.send_signal(signal.SIGINT)
+        run = watched.finish(10)
+    assert run.status == 6
+    assert re.search(r"Interrupted at -crashAfter=\d+\.\n$", run.text)
+
+
+def test_llvmpipe(host):
+    run = torture(host.environment(egl="real", opencl="empty"))
+    if run.text.startswith("0 OpenGL"):
+        pytest.skip("no OpenGL driver here")
+    assert run.status == 0, run.text
+
+
+@pytest.mark.parametrize("kind", ["crash", "throw"])
+def test_llvmpipe_with_opencl(host, kind):
+    if kind == "throw" and not os.environ.get("ASSAY_LONG_TESTS"):
+        pytest.skip("takes minutes: set ASSAY_LONG_TESTS=1")
+    if shutil.which("clinfo") is None and not os.path.isdir("/etc/OpenCL/vendors"):
+        pytest.skip("no OpenCL driver here")
+    environment = {**host.environment(egl="real", opencl="real"), "RUSTICL_ENABLE": "llvmpipe",
+                   "RUSTICL_DEVICE_TYPE": "gpu"}
+    run = torture(environment, "--kind", kind, seconds=590)
+    if " and 0 OpenCL" in run.text or " and no OpenCL" in run.text:
+        pytest.skip("no OpenCL driver here presents a GPU")
+    assert run.status == 0, run.text
+
+
+def test_progress_on_a_terminal(host):
+    import pty
+    control, terminal = pty.openpty()
+    with Watched("torture", "--assay", PROGRAM, "--kind", "crash", stderr=terminal,
+                 environment=host.environment(script="# nothing\n", opencl="absent"),
+                 program=HOST) as watched:
+        os.close(terminal)
+        run = watched.finish()
+    shown = os.read(control, 65536).decode()
+    os.close(control)
+    assert run.status == 0
+    assert "\r-crashAfter=3 of 9" in shown
