@@ -28,6 +28,69 @@ MALFORMED = [
     "-\"stdout\"=x", "-stdout\n=x", "-\xff=1", "-exit:1", "–exit=1",
 ]
 
+# What behind the "=" of a text option gives what text.
+TEXTS = [
+    ("x", "x"),
+    ("", ""),
+    ('"a b"', "a b"),
+    ('"', '"'),
+    ('""', ""),
+    ('"""', '"'),
+    ('""""', '""'),
+    ('""x""', '"x"'),
+    ('"x', '"x'),
+    ('x"', 'x"'),
+    ("'x'", "'x'"),
+    ("a=b", "a=b"),
+    ("=", "="),
+    ('"a"=b"', 'a"=b'),
+    (r"a\nb\"", r"a\nb\""),
+    (" x ", " x "),
+    ("%s%n%d", "%s%n%d"),
+    ("\u00e9\u4e2d", "\u00e9\u4e2d"),
+    ("\udcff\udc80", "\udcff\udc80"),
+]
+
+# What behind "-exit=" gives what status.
+STATUSES = [
+    ("0", 0),
+    ("7", 7),
+    ("255", 255),
+    ("256", 0),
+    ("-1", 255),
+    ("0x10", 16),
+    ("010", 8),
+    ("08", 0),
+    ("+5", 5),
+    (" 5", 5),
+    ("\t\n5", 5),
+    ("5abc", 5),
+    ("abc", 0),
+    ("", 0),
+    ('"9"', 9),
+    ('""', 0),
+    ("0x", 0),
+    ("1e3", 1),
+    # Clamped to 2147483647 or to -2147483648 before the system keeps the low byte.
+    ("2147483647", 255),
+    ("2147483648", 255),
+    ("4294967295", 255),
+    ("4294967296", 255),
+    ("4294967299", 255),
+    ("9223372036854775808", 255),
+    ("99999999999999999999999", 255),
+    ("-2147483648", 0),
+    ("-2147483649", 0),
+    ("-4294967293", 0),
+    ("-99999999999999999999999", 0),
+]
+
+# What behind "-crashAfter=" and "-throwAfter=" is what step.
+THRESHOLDS = [
+    ("0", 0), ("abc", 0), ("", 0), ("5", 5), ("0x0c", 12), ("014", 12), ("-1", -1),
+    ("4294967295", 2**31 - 1), ("-5", -5), ("2 and more", 2),
+]
+
 
 @pytest.fixture
 def one(host):
@@ -94,27 +157,7 @@ def test_no_driver_call_for_a_bad_command_line(one):
     assert not (one.folder / "record").exists() or one.record() == []
 
 
-@pytest.mark.parametrize("value, line", [
-    ("x", "x"),
-    ("", ""),
-    ('"a b"', "a b"),
-    ('"', '"'),
-    ('""', ""),
-    ('"""', '"'),
-    ('""""', '""'),
-    ('""x""', '"x"'),
-    ('"x', '"x'),
-    ('x"', 'x"'),
-    ("'x'", "'x'"),
-    ("a=b", "a=b"),
-    ("=", "="),
-    ('"a"=b"', 'a"=b'),
-    (r"a\nb\"", r"a\nb\""),
-    (" x ", " x "),
-    ("%s%n%d", "%s%n%d"),
-    ("\u00e9\u4e2d", "\u00e9\u4e2d"),
-    ("\udcff\udc80", "\udcff\udc80"),
-])
+@pytest.mark.parametrize("value, line", TEXTS)
 def test_text_options(one, value, line):
     run = one.run(f"-stdout={value}", f"-comment={value}", f"-stderr={value}", "-help",
                   **one.found)
@@ -134,46 +177,12 @@ def test_texts_come_before_the_report_and_in_order(one):
     assert run.status == 0
 
 
-@pytest.mark.parametrize("value, status", [
-    ("0", 0),
-    ("7", 7),
-    ("255", 255),
-    ("256", 0),
-    ("-1", 255),
-    ("0x10", 16),
-    ("010", 8),
-    ("08", 0),
-    ("+5", 5),
-    (" 5", 5),
-    ("\t\n5", 5),
-    ("5abc", 5),
-    ("abc", 0),
-    ("", 0),
-    ('"9"', 9),
-    ('""', 0),
-    ("0x", 0),
-    ("1e3", 1),
-    # Clamped to 2147483647 or to -2147483648 before the system keeps the low byte.
-    ("2147483647", 255),
-    ("2147483648", 255),
-    ("4294967295", 255),
-    ("4294967296", 255),
-    ("4294967299", 255),
-    ("9223372036854775808", 255),
-    ("99999999999999999999999", 255),
-    ("-2147483648", 0),
-    ("-2147483649", 0),
-    ("-4294967293", 0),
-    ("-99999999999999999999999", 0),
-])
+@pytest.mark.parametrize("value, status", STATUSES)
 def test_exit_status(one, value, status):
     check(one.run(f"-exit={value}", **one.found), predict([one.gpu], exit_status=status))
 
 
-@pytest.mark.parametrize("value, threshold", [
-    ("0", 0), ("abc", 0), ("", 0), ("5", 5), ("0x0c", 12), ("014", 12), ("-1", -1),
-    ("4294967295", 2**31 - 1), ("-5", -5), ("2 and more", 2),
-])
+@pytest.mark.parametrize("value, threshold", THRESHOLDS)
 def test_thresholds(one, value, threshold):
     check(one.run(f"-crashAfter={value}", **one.found),
           predict([one.gpu], crash_after=threshold))

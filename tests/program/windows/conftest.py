@@ -13,9 +13,10 @@ import pytest
 
 TREE = Path(__file__).resolve().parents[3]
 sys.path.insert(0, str(TREE / "tests" / "program"))
-pytest.register_assert_rewrite("harness", "model")
+pytest.register_assert_rewrite("harness", "model", "clmodel")
 
 import harness  # noqa: E402
+from model import BATTERY_EXTENSIONS, BATTERY_INTEGERS, Gpu  # noqa: E402
 
 BUILD = Path(os.environ.get("ASSAY_BUILD_DIR", TREE / "build" / "windows")).resolve()
 PROGRAM = BUILD / "bin" / "assay.exe"
@@ -39,6 +40,28 @@ def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, **variab
 def is_noise(line):
     """What the virtual display and Wine itself say."""
     return line.startswith((b"X connection", b"Authorization required", b"wine:", b"MESA"))
+
+
+def gpu_of(run):
+    """The device that a report tells of, for the prediction of other runs on it."""
+    facts = run.facts
+
+    def text(key):
+        return facts[f"glgpu[0].{key}"].strip('"')
+
+    def number(query):
+        return int(facts[f"glgpu[0].{query}"].strip("[]"))
+
+    return Gpu(
+        vendor=text("GLVendor"), renderer=text("GLRenderer"), version=text("GLVersion"),
+        language=text("glGetString[GL_SHADING_LANGUAGE_VERSION]"),
+        rectangle=int(facts["glgpu[0].GLRectTextureSize"]),
+        instructions=number("glGetProgramivARB[GL_FRAGMENT_PROGRAM_ARB]"
+                            "[GL_MAX_PROGRAM_INSTRUCTIONS_ARB]"),
+        integers=[number(f"glGetIntegerv[{name}]") for name, _ in BATTERY_INTEGERS],
+        extensions=["GL_ARB_texture_non_power_of_two"] + [
+            extension for name, _, extension, _ in BATTERY_EXTENSIONS
+            if facts[f"glgpu[0].extension[QGF::OGL::{name}]"] == "1"])
 
 
 @pytest.fixture(scope="session")

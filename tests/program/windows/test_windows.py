@@ -1,35 +1,12 @@
-"""The Windows program under Wine: its report, its command line, and a failure at every step."""
+"""The Windows program under Wine: its report, a failure at every step, and missing pieces."""
 
 import re
 import subprocess
 
 import pytest
 
-from conftest import (BUILD, NO_OPENCL_PLATFORM, OPENCL_GPU, PROGRAM, run_under_wine)
-from model import BATTERY_EXTENSIONS, BATTERY_INTEGERS, Gpu, KEYS, check, predict
-from test_command_line import USAGE
-
-
-def gpu_of(run):
-    """The device that a report tells of, for the prediction of other runs on it."""
-    facts = run.facts
-
-    def text(key):
-        return facts[f"glgpu[0].{key}"].strip('"')
-
-    def number(query):
-        return int(facts[f"glgpu[0].{query}"].strip("[]"))
-
-    return Gpu(
-        vendor=text("GLVendor"), renderer=text("GLRenderer"), version=text("GLVersion"),
-        language=text("glGetString[GL_SHADING_LANGUAGE_VERSION]"),
-        rectangle=int(facts["glgpu[0].GLRectTextureSize"]),
-        instructions=number("glGetProgramivARB[GL_FRAGMENT_PROGRAM_ARB]"
-                            "[GL_MAX_PROGRAM_INSTRUCTIONS_ARB]"),
-        integers=[number(f"glGetIntegerv[{name}]") for name, _ in BATTERY_INTEGERS],
-        extensions=["GL_ARB_texture_non_power_of_two"] + [
-            extension for name, _, extension, _ in BATTERY_EXTENSIONS
-            if facts[f"glgpu[0].extension[QGF::OGL::{name}]"] == "1"])
+from conftest import NO_OPENCL_PLATFORM, PROGRAM, gpu_of, run_under_wine
+from model import KEYS, check, predict
 
 
 def test_report(whole_run):
@@ -84,51 +61,6 @@ def test_failure_at_every_step(whole_run, option, field):
     for step, run in enumerate(runs):
         check(run, predict([gpu], opencl=0, **{field: step}))
     assert [run.status for run in runs] == [2] * steps + [0]
-
-
-@pytest.mark.parametrize("arguments, status", [
-    (["-exit=7"], 7),
-    (["-exit=0x10"], 16),
-    (["-exit=4294967295"], 255),
-    (["-exit=7", "-throwAfter=10"], 2),
-])
-def test_exit_status(arguments, status):
-    """The status that a Linux parent of Wine sees is cut to 8 bits."""
-    assert run_under_wine(*arguments, **NO_OPENCL_PLATFORM).status == status
-
-
-@pytest.mark.parametrize("argument", ["foo", "-foo", "-crashAfter", "--help", "-help=1", "-help"])
-def test_usage(argument):
-    run = run_under_wine(argument)
-    assert (run.status, run.errors, run.out) == (3, USAGE, b"")
-
-
-def test_text_options_print_in_order():
-    run = run_under_wine("-stdout=a=b", "-comment=c", "-stderr=d", "-bogus")
-    assert run.lines == ["a=b", "# c"]
-    assert run.errors == ["d", *USAGE]
-
-
-def test_whole_report_with_opencl():
-    run = run_under_wine(**OPENCL_GPU)
-    facts = run.facts
-    if facts.get("NumCLGPUs") == "0":
-        pytest.skip("no OpenCL driver here presents a GPU")
-    assert run.status == 0
-    assert facts["NumCLGPUs"] == "1"
-    keys = [key.split(".", 1)[1] for key in facts if key.startswith("clgpu[0].")]
-    assert keys == ["CLPlatformVersion", "CLDeviceVersion", "IsIntegratedCLGPU", "CLMemoryMB",
-                    "CLName", "CLVendor", "CLVendorID", "CLDriverVersion", "CUDASupported",
-                    "CLBandwidth", "CLCompute"]
-    assert run.lines[-1] == 'assayEnd="STAMP"'
-
-
-def test_no_opencl_library():
-    """Wine finds no OpenCL.dll where it is overridden away: no OpenCL line at all."""
-    run = run_under_wine(WINEDLLOVERRIDES="mscoree,mshtml,opencl=")
-    assert run.status == 0
-    assert not [line for line in run.lines if "CL" in line.split("=")[0] and "CLGPU" in line]
-    assert run.lines[-1] == 'assayEnd="STAMP"'
 
 
 def test_no_display():

@@ -1,0 +1,91 @@
+"""OpenCL under Wine: OpenCL.dll over the Linux drivers, a real one and the scripted one."""
+
+import pytest
+
+from clmodel import ClGpu, ClPlatform, cl_script_of, cl_values_of
+from conftest import BUILD, OPENCL_GPU, gpu_of, run_under_wine
+from model import check, predict
+
+# Wine hands OpenCL calls on to Linux drivers, so the scripted one is that of the Linux build.
+DRIVER = BUILD.parent / "linux" / "drivers" / "opencl"
+
+
+@pytest.fixture
+def scripted(tmp_path):
+    """Runs the program on scripted OpenCL platforms."""
+    if not DRIVER.exists():
+        pytest.skip(f"the scripted OpenCL driver isn't built: {DRIVER}")
+
+    def run(platforms, *arguments, extra=""):
+        script = tmp_path / "script"
+        script.write_text(cl_script_of(platforms) + extra)
+        return run_under_wine(*arguments, OCL_ICD_VENDORS=str(DRIVER),
+                              OCL_ICD_PLATFORM_SORT="none", ASSAY_SCRIPTED_OPENCL=str(script))
+    return run
+
+
+def two_platforms():
+    return [ClPlatform([ClGpu(name="First"), ClGpu(name="A processor", type="cpu")],
+                       version="OpenCL 1.2 CUDA 8.0.0"),
+            ClPlatform([ClGpu(name="Second", vendor_id=0x1002, integrated=True, batch=100_000_000,
+                              kernel=1_000_000)])]
+
+
+def test_whole_report_with_opencl():
+    run = run_under_wine(**OPENCL_GPU)
+    facts = run.facts
+    if facts.get("NumCLGPUs") == "0":
+        pytest.skip("no OpenCL driver here presents a GPU")
+    assert run.status == 0
+    assert facts["NumCLGPUs"] == "1"
+    keys = [key.split(".", 1)[1] for key in facts if key.startswith("clgpu[0].")]
+    assert keys == ["CLPlatformVersion", "CLDeviceVersion", "IsIntegratedCLGPU", "CLMemoryMB",
+                    "CLName", "CLVendor", "CLVendorID", "CLDriverVersion", "CUDASupported",
+                    "CLBandwidth", "CLCompute"]
+    assert run.lines[-1] == 'assayEnd="STAMP"'
+
+
+def test_no_opencl_library():
+    """Wine finds no OpenCL.dll where it is overridden away: no OpenCL line at all."""
+    run = run_under_wine(WINEDLLOVERRIDES="mscoree,mshtml,opencl=")
+    assert run.status == 0
+    assert not [line for line in run.lines if "CL" in line.split("=")[0] and "CLGPU" in line]
+    assert run.lines[-1] == 'assayEnd="STAMP"'
+
+
+@pytest.mark.parametrize("option, field", [("crashAfter", "crash_after"),
+                                           ("throwAfter", "throw_after")])
+def test_failure_at_every_step_of_two_scripted_devices(whole_run, scripted, option, field):
+    platforms = two_platforms()
+    gpu = gpu_of(whole_run)
+    values = cl_values_of(platforms)
+    first = predict([gpu], opencl=0).steps - 2
+    steps = predict([gpu], opencl=values).steps
+    assert steps - first == 26
+    # The steps before are those of a machine without OpenCL.
+    for step in range(first, steps + 1):
+        check(scripted(platforms, f"-{option}={step}"),
+              predict([gpu], opencl=values, **{field: step}))
+
+
+@pytest.mark.parametrize("batch, bandwidth", [
+    (200_000_000, "1.67772e+09"), (100_000_000, "3.35544e+09"), (0, "0")])
+def test_bandwidth_of_scripted_counters(scripted, batch, bandwidth):
+    run = scripted([ClPlatform([ClGpu(batch=batch)])])
+    assert run.facts["clgpu[0].CLBandwidth"] == bandwidth
+
+
+@pytest.mark.parametrize("call", ["clCreateContext", "clEnqueueCopyBuffer", "clBuildProgram"])
+def test_crash_in_a_linux_driver_is_a_failing_call(scripted, call):
+    """Wine survives what happens on the Linux side, and the call comes back with an error."""
+    run = scripted([ClPlatform([ClGpu()])], extra=f"at {call} crash\n")
+    assert run.status == 2
+    assert run.errors == ["Failed requirement: ciErrNum == CL_SUCCESS",
+                          "exception: Failed requirement: ciErrNum == CL_SUCCESS"]
+    assert run.lines[-1] == 'assayEnd="STAMP"'
+
+
+def test_driver_that_aborts_takes_down_the_child_alone(scripted):
+    run = scripted([ClPlatform([ClGpu()])], extra="at clBuildProgram abort\n")
+    assert run.status not in (0, 2, 3, 4)
+    assert run.lines[-1].startswith("clgpu[0].CLBandwidth=")
