@@ -93,22 +93,3 @@ def test_reader_that_has_gone(whole_run):
     assert errors.count("DoStdout failed") == len(
         [line for line in whole_run.lines if not line.startswith("#")])
     assert "status 0" in errors
-
-
-def test_imports_system_libraries_only():
-    dump = subprocess.run(["x86_64-w64-mingw32-objdump", "-p", PROGRAM], stdout=subprocess.PIPE,
-                          check=True, text=True).stdout
-    names = {name.lower() for name in re.findall(r"DLL Name: (\S+)", dump)}
-    assert names
-    assert not names & {"opengl32.dll", "opencl.dll"}
-    assert not [name for name in names if name.startswith(("libgcc", "libstdc++", "libwinpthread"))]
-
-
-def test_runs_in_an_empty_prefix(tmp_path):
-    """Beside nothing but itself, for a user whom Wine has never seen."""
-    program = tmp_path / "assay.exe"
-    program.write_bytes(PROGRAM.read_bytes())
-    run = run_under_wine("-exit=5", program=program, WINEPREFIX=str(tmp_path / "prefix"),
-                         **NO_OPENCL_PLATFORM)
-    assert run.status == 5
-    assert run.lines[-1] == 'assayEnd="STAMP"'
