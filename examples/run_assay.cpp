@@ -79,7 +79,7 @@ int main(int argc, char** argv)
             launcher.Kill();
             end = launcher.Wait(&exitCode, pmutil::ConsoleApp::GetDefaultWaitSeconds());
         }
-        std::ostringstream verdict; // Finished, Crashed, Killed, or Timeout for one that won't die
+        std::ostringstream verdict; // Idle if another process holds its output
         verdict << "Verdict: " << end << ", exit code " << exitCode << '\n';
         std::fputs(verdict.str().c_str(), stderr);
         return end == pmutil::State::kFinished ? exitCode : 3;
