@@ -14,7 +14,7 @@ namespace {
 struct Form {
     unsigned char fFirstLow;
     unsigned char fFirstHigh;
-    std::size_t fSize;
+    unsigned char fSize;
     unsigned char fSecondLow;
     unsigned char fSecondHigh;
     unsigned char fFirstBits;

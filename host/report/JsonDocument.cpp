@@ -157,7 +157,7 @@ ReportLine ReadJsonLine(const Json& json, const std::string& where)
     const std::string kind = GetString(json, where, "kind");
     std::string text = DecodeBytes(GetString(json, where, "text"));
     std::string end = GetString(json, where, "end");
-    if (end != "" && end != "\n" && end != "\r\n")
+    if (!end.empty() && end != "\n" && end != "\r\n")
         throw std::runtime_error(where + ": \"end\" is not a line end");
     const bool cut =
         json.contains("cut") && Get(json, where, "cut", &Json::is_boolean, "a bool").get<bool>();
