@@ -2,11 +2,14 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstdint>
+#include <cstddef>
+#include <filesystem>
 #include <fstream>
 #include <stdexcept>
+#include <string>
 #include <string_view>
 #include <system_error>
+#include <vector>
 
 #include <fmt/format.h>
 #include <nlohmann/json.hpp>
@@ -29,7 +32,7 @@ std::runtime_error SystemFailure(const char* what)
 
 std::string ReadFile(const std::string& path)
 {
-    std::ifstream file(path, std::ios::binary);
+    std::ifstream file(std::filesystem::u8path(path), std::ios::binary);
     if (!file)
         throw SystemFailure("can't open");
     std::string text;

@@ -1,9 +1,10 @@
 #include <gtest/gtest.h>
 
-#include <cstdio>
+#include <filesystem>
 #include <fstream>
 #include <stdexcept>
 #include <string>
+#include <system_error>
 
 #include "Lines.h"
 #include "Samples.h"
@@ -17,12 +18,17 @@ namespace {
 // A file that is gone with its object.
 class File {
 public:
-    explicit File(const std::string& text) : fPath(testing::TempDir() + "assay-report-file")
+    explicit File(const std::string& text, const char* name = "assay-report-file")
+        : fPath(testing::TempDir() + name)
     {
-        std::ofstream file(fPath, std::ios::binary);
+        std::ofstream file(std::filesystem::u8path(fPath), std::ios::binary);
         file << text;
     }
-    ~File() { std::remove(fPath.c_str()); }
+    ~File()
+    {
+        std::error_code ignored;
+        std::filesystem::remove(std::filesystem::u8path(fPath), ignored);
+    }
     File(const File&) = delete;
     File& operator=(const File&) = delete;
 
@@ -69,6 +75,12 @@ TEST(ReportFile, GivesTheReportOfEachForm)
     }
     EXPECT_EQ(Load("\n \na=1\n"), "\n \na=1\n");
     EXPECT_EQ(Load(MakeDocument({}, {}).dump()), "");
+}
+
+TEST(ReportFile, HasAPathOfAnyLanguage)
+{
+    const File file("a=1\n", "assay-r\xC3\xA9port-\xE4\xB8\xAD");
+    EXPECT_EQ(LoadReport(file.fPath).ToText(), "a=1\n");
 }
 
 TEST(ReportFile, SaysWhatIsWrongWithAFile)
