@@ -29,7 +29,7 @@ def test_name_tells_version_and_machine(package):
 
 def test_holds_programs_and_what_to_read(package):
     assert {path.name for path in package.iterdir()} == {
-        "assay.exe", "assay-host.exe", "README.md", "docs", "licences"}
+        "assay.exe", "assay-host.exe", "README.md", "docs", "schema", "licences"}
     assert (package / "docs" / "report-format.md").stat().st_size > 0
     for name in ["Boost", "GCC-runtime", "MinGW-w64", "CLI11", "fmt", "nlohmann-json"]:
         assert (package / "licences" / f"{name}.txt").stat().st_size > 0
