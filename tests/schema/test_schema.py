@@ -91,6 +91,22 @@ def test_documents_have_all_their_members_and_no_others():
         check_strictness(validate.DOCUMENT, json.loads(path.read_bytes()))
 
 
+def test_the_schema_requires_the_keys_that_the_host_knows():
+    seen = set()
+    definitions = validate.DOCUMENT.schema["$defs"]["device"]["oneOf"]
+    required = {device["properties"]["kind"]["const"]: device["properties"]["keys"]["required"]
+                for device in definitions}
+    for path in read(".json"):
+        for device in json.loads(path.read_bytes())["devices"]:
+            keys = list(device["keys"])
+            missing = {key for key in keys if device["keys"][key]["value"] is None}
+            # A key that has no line is known, or it would not be there.
+            assert keys[:len(required[device["kind"]])] == required[device["kind"]]
+            assert missing <= set(required[device["kind"]])
+            seen.add(device["kind"])
+    assert seen == set(required)
+
+
 def test_events_have_all_their_members_and_no_others():
     for path in read(".jsonl"):
         for line in path.read_text(encoding="utf-8").splitlines()[:6]:
