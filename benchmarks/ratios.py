@@ -81,7 +81,7 @@ def main() -> int:
     programs = dict.fromkeys(row[0] for row in RATIOS + CLOCK_RATIOS + DIFFERENCES)
     measured = {name: medians(folder / name, repetitions) for name in programs}
     missed = 0
-    print(f"{'measured':<24}{'against':<35}{'ns':>12}{'ns':>12}{'ratio':>8}  goal")
+    print(f"{'measured':<24}{'against':<35}{'ns':>14}{'ns':>14}{'ratio':>8}  goal")
     rows = [(*row, "cpu_time") for row in RATIOS] + [(*row, "real_time") for row in CLOCK_RATIOS]
     for program, name, base, goal, clock in rows:
         time, base_time = measured[program][name][clock], measured[program][base][clock]
@@ -91,7 +91,7 @@ def main() -> int:
             met = ratio <= goal
             missed += not met
             verdict = f"{goal:.4g} {'met' if met else 'MISSED'}"
-        print(f"{name:<24}{base:<35}{time:>12.2f}{base_time:>12.2f}{ratio:>8.2f}  {verdict}")
+        print(f"{name:<24}{base:<35}{time:>14.2f}{base_time:>14.2f}{ratio:>8.2f}  {verdict}")
     print(f"{'measured':<21}{'against':<17}{'ns':>12}{'ns':>12}{'difference':>14}  goal")
     for program, name, base, goal in DIFFERENCES:
         time, base_time = measured[program][name]["cpu_time"], measured[program][base]["cpu_time"]

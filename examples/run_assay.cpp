@@ -3,6 +3,7 @@
 // usage: run_assay PROGRAM SECONDS [argument...]
 #include <cstdio>
 #include <cstdlib>
+#include <sstream>
 
 #include <boost/filesystem/path.hpp>
 #include <boost/make_shared.hpp>
@@ -63,7 +64,7 @@ private:
 };
 
 int main(int argc, char** argv)
-{
+try {
     if (argc < 3)
         return std::fputs("usage: run_assay PROGRAM SECONDS [argument...]\n", stderr), 2;
     const auto app = boost::make_shared<App>();
@@ -72,19 +73,17 @@ int main(int argc, char** argv)
     launcher.SetLaunchParams(pmutil::LaunchParams(
         boost::make_shared<LinePrinter>(app, stdout), boost::make_shared<LinePrinter>(app, stderr),
         {argv + 3, argv + argc}, boost::filesystem::path(argv[1]).wstring()));
-    try {
-        int exitCode = 0;
-        pmutil::State end = launcher.LaunchAndWait(&exitCode, std::atof(argv[2]));
-        if (end == pmutil::State::kTimeout) {
-            launcher.Kill();
-            end = launcher.Wait(&exitCode, pmutil::ConsoleApp::GetDefaultWaitSeconds());
-        }
-        std::ostringstream verdict; // Idle if another process holds its output
-        verdict << "Verdict: " << end << ", exit code " << exitCode << '\n';
-        std::fputs(verdict.str().c_str(), stderr);
-        return end == pmutil::State::kFinished ? exitCode : 3;
-    } catch (const std::exception& failure) {
-        std::fprintf(stderr, "Verdict: no run, %s\n", failure.what());
-        return 4;
+    int exitCode = 0;
+    pmutil::State end = launcher.LaunchAndWait(&exitCode, std::atof(argv[2]));
+    if (end == pmutil::State::kTimeout) {
+        launcher.Kill();
+        end = launcher.Wait(&exitCode, pmutil::ConsoleApp::GetDefaultWaitSeconds());
     }
+    std::ostringstream verdict; // Idle if another process holds its output
+    verdict << "Verdict: " << end << ", exit code " << exitCode << '\n';
+    std::fputs(verdict.str().c_str(), stderr);
+    return end == pmutil::State::kFinished ? exitCode : 3;
+} catch (const std::exception& failure) {
+    std::fprintf(stderr, "Verdict: no run, %s\n", failure.what());
+    return 4;
 }

@@ -76,6 +76,7 @@ TaskID GetTaskID(OutputChannel channel);
 OutputChannel GetOutputChannel(TaskID id);
 
 // What to launch, and who consumes its output.
+// NOLINTNEXTLINE(bugprone-reserved-identifier): the compiler's own, which copies the array
 class LaunchParams {
 public:
     LaunchParams() = default;

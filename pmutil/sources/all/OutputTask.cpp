@@ -28,6 +28,8 @@ OutputTask::OutputTask(const OutputTask& other) : OutputTask()
 OutputTask& OutputTask::operator=(const OutputTask& other)
 {
     if (this != &other) {
+        // The copy is made under the other's lock, and refused while it runs.
+        // NOLINTNEXTLINE(performance-unnecessary-copy-initialization)
         const OutputTask copy(other);
         const boost::lock_guard<boost::mutex> lock(fMutex);
         AssignLocked(copy);

@@ -33,6 +33,7 @@ boost::posix_time::time_duration ToWaitDuration(double seconds)
         return boost::posix_time::pos_infin;
     if (seconds < -kLongestWait)
         return boost::posix_time::neg_infin;
+    // NOLINTNEXTLINE(bugprone-incorrect-roundings): negative times are all the same to a wait
     const auto milliseconds = static_cast<std::int64_t>(seconds * 1000.0 + 0.5);
     return boost::posix_time::microseconds(milliseconds * 1000);
 }

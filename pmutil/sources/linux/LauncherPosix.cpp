@@ -57,6 +57,7 @@ struct CallFailure {
 [[noreturn]] void ThrowFailed(const CallFailure& failure, const std::string& path = {})
 {
     // A path with a zero byte ends there, so that the text behind it can be seen.
+    // NOLINTNEXTLINE(readability-redundant-string-cstr)
     throw std::runtime_error(std::string(failure.call) + " failed: " + path.c_str() +
                              (path.empty() ? "" : ": ") +
                              std::system_category().message(failure.error));
@@ -257,9 +258,13 @@ public:
 
     ~Child()
     {
-        if (fPidfd->IsOpen()) {
+        if (!fPidfd->IsOpen())
+            return;
+        try {
             Orphans::Get().Add(fPidfd);
             Orphans::Get().Reap();
+        } catch (...) {
+            // Without memory for it, an ended child stays a zombie until this process ends.
         }
     }
     Child(const Child&) = delete;

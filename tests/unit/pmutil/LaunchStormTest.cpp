@@ -62,7 +62,7 @@ TEST_F(LaunchStorm, TenThousandLaunchesInARow)
     const char* const wanted = std::getenv("ASSAY_LONG_TESTS"); // NOLINT(concurrency-mt-unsafe):
                                                                 // the environment is only read
     if (wanted == nullptr || std::string(wanted) != "1")
-        GTEST_SKIP() << "takes minutes; set ASSAY_LONG_TESTS=1";
+        GTEST_SKIP() << "takes long; set ASSAY_LONG_TESTS=1";
     LaunchInARow(10'000);
 }
 
