@@ -4,6 +4,9 @@
 // Descriptors, or handles.
 long CountOpenThings();
 
+// All threads of this process.
+long CountThreads();
+
 // True if this process has a child at all, running or ended.
 bool HasChildren();
 

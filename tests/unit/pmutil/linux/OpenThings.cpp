@@ -5,14 +5,28 @@
 
 const long kKeptPerLaunch = 0;
 
-long CountOpenThings()
+namespace {
+
+long CountEntries(const char* folder)
 {
     long count = 0;
-    DIR* const directory = ::opendir("/proc/self/fd");
+    DIR* const directory = ::opendir(folder);
     while (::readdir(directory) != nullptr)
         ++count;
     ::closedir(directory);
     return count;
+}
+
+} // namespace
+
+long CountOpenThings()
+{
+    return CountEntries("/proc/self/fd");
+}
+
+long CountThreads()
+{
+    return CountEntries("/proc/self/task");
 }
 
 bool HasChildren()

@@ -52,6 +52,19 @@ long CountOpenThings()
     return count;
 }
 
+long CountThreads()
+{
+    const HANDLE threads = ::CreateToolhelp32Snapshot(TH32CS_SNAPTHREAD, 0);
+    THREADENTRY32 entry = {};
+    entry.dwSize = sizeof entry;
+    long count = 0;
+    for (BOOL more = ::Thread32First(threads, &entry); more != 0;
+         more = ::Thread32Next(threads, &entry))
+        count += entry.th32OwnerProcessID == ::GetCurrentProcessId();
+    ::CloseHandle(threads);
+    return count;
+}
+
 bool HasChildren()
 {
     const HANDLE processes = ::CreateToolhelp32Snapshot(TH32CS_SNAPPROCESS, 0);
