@@ -1,0 +1,175 @@
+"""assay-host.exe under Wine: verdicts, formats, hostile children, every step."""
+
+import re
+import subprocess
+import sys
+import time
+
+import pytest
+
+from conftest import BUILD, NO_OPENCL_PLATFORM, OPENCL_GPU, TREE, run_under_wine
+from harness import text_of
+
+sys.path.insert(0, str(TREE / "tests" / "schema"))
+pytest.importorskip("jsonschema", reason="python3-jsonschema isn't there")
+
+from validate import report_bytes, validate_document, validate_events  # noqa: E402
+
+HOST = BUILD / "bin" / "assay-host.exe"
+CHILD = BUILD / "bin" / "test_child.exe"
+REPORT = ["out", "assayStart=x", "out", "assayEnd=y"]
+# Wine's own start is in it.
+SLACK = 4.0
+TIMEOUT = 2.0
+
+
+@pytest.fixture(autouse=True, scope="module")
+def desktop():
+    """Wine's desktop, which takes seconds to start, is started by the first program that needs one:
+    it would be one of that program's descendants, and be ended with it. A window keeps it."""
+    with subprocess.Popen([TREE / "scripts" / "run-under-wine", "notepad"], stdin=subprocess.DEVNULL,
+                          stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL) as window:
+        assert run_under_wine(**NO_OPENCL_PLATFORM).status == 0
+        yield
+        window.kill()
+
+
+def host_run(*arguments, **variables):
+    return run_under_wine(*arguments, program=HOST, **{**NO_OPENCL_PLATFORM, **variables})
+
+
+def document_of(run):
+    document = validate_document(run.out)
+    assert run.status == document["outcome"]["status"]
+    return document
+
+
+def run_child(*words, timeout=TIMEOUT, program=CHILD):
+    start = time.monotonic()
+    run = host_run("run", "--assay", str(program), "--format", "json", "--timeout", str(timeout),
+                   "--", *words)
+    assert time.monotonic() - start < timeout + 2 + SLACK
+    return document_of(run)
+
+
+def test_complete(whole_run):
+    document = document_of(host_run("run", "--format", "json"))
+    assert document["outcome"]["verdict"] == "complete"
+    kept = report_bytes(document).replace(b"\r\n", b"\n")
+    stamps = re.compile(rb'="\d{4}-\d\d-\d\d_\d\d:\d\d:\d\d"')
+    assert stamps.sub(b"", kept) == stamps.sub(b"", whole_run.out)
+    assert b"\r\n" in report_bytes(document)
+    assert all(line["end"] == "\r\n" for line in document["lines"])
+
+
+def test_text_and_events():
+    run = host_run("run", "--raw")
+    assert run.status == 0
+    raw, table = text_of(run.out).split("\n\n", 1)
+    assert raw.startswith('Tester="Pixmere"\n')
+    assert "OpenGL device glgpu[0]: " in table
+    events = validate_events(host_run("run", "--format", "jsonl").out)
+    assert [events[0]["event"], events[-1]["event"]] == ["start", "end"]
+    assert events[-1]["outcome"]["verdict"] == "complete"
+
+
+@pytest.mark.parametrize("options, verdict", [
+    (["-throwAfter=8"], "failed-tests"), (["-bogus"], "usage-error"), (["-exit=7"], "complete"),
+    (["-exit=300"], "complete")])
+def test_ends_of_assay(options, verdict):
+    document = document_of(host_run("run", "--format", "json", "--", *options))
+    assert document["outcome"]["verdict"] == verdict
+
+
+def test_crash():
+    document = run_child("out", "QGFOGLInitialized=1", "abort")
+    assert document["outcome"]["verdict"] == "crashed"
+    assert re.fullmatch("code 0x[0-9A-F]{8}", document["outcome"]["termination"])
+    assert document["outcome"]["lastReportLine"] == "QGFOGLInitialized=1"
+
+
+def test_hang():
+    document = run_child("out", "a=1", "sleep", "60000")
+    assert document["outcome"]["verdict"] == "hung"
+    assert not document["outcome"]["leftBehind"]
+    assert report_bytes(document).rstrip() == b"a=1"
+
+
+def test_never_started(tmp_path):
+    assert run_child(program="no-such.exe")["outcome"]["verdict"] == "never-started"
+    assert run_child(program=str(tmp_path))["outcome"]["verdict"] == "never-started"
+    foreign = tmp_path / "foreign.exe"
+    foreign.write_text("no program\n")
+    assert run_child(program=foreign)["outcome"]["verdict"] == "never-started"
+
+
+def test_grandchild_with_the_pipe():
+    start = time.monotonic()
+    document = run_child(*REPORT, "spawn", "77000", timeout=30)
+    assert time.monotonic() - start < 2 + SLACK
+    assert document["outcome"]["verdict"] == "complete"
+    assert not document["outcome"]["leftBehind"]
+    left = subprocess.run(["pgrep", "-f", "test_child.exe sleep 77000"], stdout=subprocess.PIPE,
+                          check=False)
+    assert left.stdout == b""
+
+
+def test_flood():
+    document = run_child(*REPORT, "flood", "300000000", timeout=60)
+    assert document["outcome"]["verdict"] == "complete"
+    assert document["outcome"]["lostOutputBytes"] > 280_000_000
+
+
+def test_closed_streams_and_end_of_input():
+    assert run_child(*REPORT, "close", "sleep", "300")["outcome"]["verdict"] == "complete"
+    assert run_child("echo", *REPORT)["outcome"]["verdict"] == "complete"
+
+
+def test_program_with_blanks_in_its_path(tmp_path):
+    folder = tmp_path / "a folder"
+    folder.mkdir()
+    (folder / "a child.exe").write_bytes(CHILD.read_bytes())
+    assert run_child(*REPORT, program=folder / "a child.exe")["outcome"]["verdict"] == "complete"
+
+
+def test_output_file(tmp_path):
+    file = tmp_path / "r\u00e9sultat.json"
+    for _ in range(2):
+        run = host_run("run", "--assay", str(CHILD), "--format", "json", "--output", str(file), "--",
+                       *REPORT)
+        assert (run.status, run.out) == (0, b"")
+        assert validate_document(file.read_bytes())["outcome"]["verdict"] == "complete"
+        assert [each.name for each in tmp_path.iterdir()] == [file.name]
+    run = host_run("run", "--assay", str(CHILD), "--output", str(tmp_path / "no" / "file"), "--",
+                   *REPORT)
+    assert run.status == 10
+    assert run.errors[0].startswith("assay-host: cannot write ")
+
+
+def test_help_and_version():
+    assert host_run("--version").out.startswith(b"assay-host ")
+    assert len(host_run("run", "--help").lines) <= 24
+    assert host_run("bogus").status == 10
+
+
+def test_torture():
+    run = host_run("torture")
+    assert run.status == 0, text_of(run.out)
+    assert re.search(r"92 runs, each as predicted", text_of(run.out))
+
+
+def test_torture_with_opencl():
+    run = run_under_wine("torture", "--kind", "crash", program=HOST, **OPENCL_GPU)
+    if " and 0 OpenCL" in text_of(run.out):
+        pytest.skip("no OpenCL driver here presents a GPU")
+    assert run.status == 0, text_of(run.out)
+
+
+def test_imports_system_libraries_only():
+    dump = subprocess.run(["x86_64-w64-mingw32-objdump", "-p", HOST], stdout=subprocess.PIPE,
+                          check=True, text=True).stdout
+    names = {name.lower() for name in re.findall(r"DLL Name: (\S+)", dump)}
+    assert names
+    assert not [name for name in names if name.startswith(("libgcc", "libstdc++", "libwinpthread"))]
+
+
