@@ -7,6 +7,9 @@ from conftest import TREE
 # A program test of Linux and the ones that stand for it here, or why there are none.
 COUNTERPARTS = {
     "test_command_line": "test_windows_command_line",
+    "test_host_hostile": "test_windows_host",
+    "test_host_run": "test_windows_host",
+    "test_host_torture": "test_windows_host",
     "test_opencl": "test_windows_opencl",
     "test_steps": "test_windows",
     "test_verbose": "test_windows",

@@ -1,0 +1,132 @@
+#!/usr/bin/env python3
+"""Times a supervised run against the bare child, and takes the host's memory.
+
+usage: compare_host.py [--build FOLDER] [--runs N] [--real] [--json FILE]
+
+`assay-host run` and `assay` alone are started alternately and to their end, on the scripted OpenGL
+driver of the tests, which answers at once, or with --real on the machine's own. Figures are medians:
+wall time in milliseconds, and the most memory that the host itself had, without its child, in MiB.
+The goals are below 20 ms and below 10 MiB beyond the child's.
+"""
+
+import argparse
+import fcntl
+import json
+import os
+import statistics
+import subprocess
+import sys
+import time
+from pathlib import Path
+
+TREE = Path(__file__).resolve().parents[1]
+
+GOAL_MS = 20.0
+GOAL_MIB = 10.0
+
+F_SETPIPE_SZ = 1031  # fcntl has a name for it only in newer versions
+
+FORMATS = ["text", "json", "jsonl"]
+
+SCRIPT = """device
+software
+string GL_VENDOR "A vendor"
+string GL_RENDERER "A renderer"
+version "2.1 Scripted"
+extensions "GL_ARB_vertex_program GL_ARB_fragment_program GL_EXT_framebuffer_object"
+"""
+
+
+def time_once(command, environment):
+    start = time.perf_counter()
+    with open(os.devnull, "r+b") as null:
+        status = subprocess.run(command, env=environment, stdin=null, stdout=null, stderr=null,
+                                check=False).returncode
+    taken = 1000 * (time.perf_counter() - start)
+    if status != 0:
+        sys.exit(f"{' '.join(map(str, command))} ended with {status}")
+    return taken
+
+
+def peak_of(command, environment):
+    """The most memory that the process itself had. Its reader takes little at a time, so that it is
+    still there to be looked at when it writes its last."""
+    read, write = os.pipe()
+    fcntl.fcntl(write, F_SETPIPE_SZ, 4096)
+    process = subprocess.Popen(command, env=environment, stdin=subprocess.DEVNULL, stdout=write,
+                               stderr=subprocess.DEVNULL)
+    os.close(write)
+    peak = 0
+    try:
+        while process.poll() is None:
+            for line in Path(f"/proc/{process.pid}/status").read_text().splitlines():
+                if line.startswith("VmHWM:"):
+                    peak = max(peak, int(line.split()[1]))
+            os.set_blocking(read, False)
+            time.sleep(0.002)
+            try:
+                os.read(read, 256)
+            except BlockingIOError:
+                pass
+    except FileNotFoundError:
+        pass
+    finally:
+        os.close(read)
+        process.wait()
+    return peak / 1024
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__.splitlines()[0])
+    parser.add_argument("--build", type=Path, default=TREE / "build" / "linux")
+    parser.add_argument("--runs", type=int, default=100)
+    parser.add_argument("--real", action="store_true")
+    parser.add_argument("--json", type=Path)
+    options = parser.parse_args()
+    build = options.build.resolve()
+    assay, host = build / "bin" / "assay", build / "bin" / "assay-host"
+
+    environment = dict(os.environ)
+    if not options.real:
+        script = build / "compare_host.script"
+        script.write_text(SCRIPT)
+        empty = build / "compare_host.no-opencl"
+        empty.mkdir(exist_ok=True)
+        for name in ("libOpenCL.so.1", "libOpenCL.so"):
+            (empty / name).touch()
+        environment["LD_LIBRARY_PATH"] = f"{build / 'drivers' / 'egl'}:{empty}"
+        environment["ASSAY_SCRIPTED_EGL"] = str(script)
+
+    commands = {"assay alone": [assay]}
+    for form in FORMATS:
+        commands[f"supervised, {form}"] = [host, "run", "--format", form]
+    times = {name: [] for name in commands}
+    for command in commands.values():
+        time_once(command, environment)
+    for _ in range(options.runs):
+        for name, command in commands.items():
+            times[name].append(time_once(command, environment))
+    peaks = {name: statistics.median(peak_of(command, environment) for _ in range(5))
+             for name, command in commands.items()}
+
+    alone = statistics.median(times["assay alone"])
+    result = {"runs": options.runs, "real": options.real, "rows": {}}
+    met = True
+    print(f"{'':24}{'median ms':>10}{'beyond ms':>11}{'peak MiB':>10}")
+    for name in commands:
+        median = statistics.median(times[name])
+        beyond = median - alone
+        result["rows"][name] = {"ms": median, "beyond": beyond, "peak": peaks[name]}
+        peak = f"{peaks[name]:.2f}" if peaks[name] > 0 else "-"  # gone before it could be looked at
+        print(f"{name:24}{median:10.2f}{beyond:11.2f}{peak:>10}")
+        if name != "assay alone":
+            met = met and beyond < GOAL_MS and peaks[name] < GOAL_MIB
+    print(f"goals: below {GOAL_MS:g} ms and {GOAL_MIB:g} MiB beyond the child's: "
+          f"{'met' if met else 'MISSED'}")
+    if options.json:
+        options.json.write_text(json.dumps(result, indent=2) + "\n")
+    return 0 if met else 1
+
+
+if __name__ == "__main__":
+    sys.exit(main())
