@@ -239,14 +239,12 @@ TEST_F(Notification, MayCallBackIn)
 TEST_F(Notification, KillOfThePlatformIsCalledUnderTheLock)
 {
     bool locked = false;
-    fApp->fLockPatience = 50;
     fLauncher->fMortal = false;
-    fLauncher->fOnKill = [&] { locked = fApp->IsLocked(); };
-    Launch();
+    fLauncher->fOnKill = [&] { locked = fApp->IsLocked(50); };
+    LaunchUntilItWaits();
     fApp->Kill();
     fApp->JoinAskers();
     EXPECT_TRUE(locked);
-    fApp->fLockPatience = 20'000;
     End(kEndedByKill);
     fApp->Wait(nullptr, kLong);
 }

@@ -166,16 +166,18 @@ public:
     }
 
     // True if the calling thread, or another, holds the lock for good.
-    bool IsLocked()
+    bool IsLocked(int milliseconds = 20'000)
     {
         const auto done = boost::make_shared<std::atomic<bool>>(false);
         boost::thread asker([this, done] {
             ThrowIfInjected(TaskID::kClient, Fault::kNoFault, nullptr); // takes the lock
             *done = true;
         });
-        const bool locked = !asker.timed_join(boost::posix_time::milliseconds(fLockPatience));
-        if (locked)
+        const bool locked = !asker.timed_join(boost::posix_time::milliseconds(milliseconds));
+        if (locked) {
+            const boost::lock_guard<boost::mutex> lock(fEventMutex);
             fAskers.push_back(std::move(asker));
+        }
         return locked;
     }
 
@@ -189,7 +191,6 @@ public:
 
     std::string fThrowIn;                                   // the event that fails
     std::function<void(const std::string& event)> fOnEvent; // called in each
-    int fLockPatience = 20'000;
 
 protected:
     void OnLaunching() override { Record("OnLaunching"); }
