@@ -41,6 +41,10 @@ public:
 
     bool HoldsThread() const { return fThread != nullptr; }
 
+    // A share of the thread held, empty if none is. A thread that is joined while somebody has one
+    // stays registered.
+    boost::shared_ptr<boost::thread> GetThread() const { return fThread; }
+
     void SetName(const char* name);
 
     // How many threads are registered: those held, and those abandoned. Any thread may ask.

@@ -128,6 +128,21 @@ TEST(ManagedThread, AbandonedThreadRunsOnAndStaysRegistered)
     EXPECT_EQ(Count(), before + 1);
 }
 
+TEST(ManagedThread, JoinedThreadThatSomebodySharesStaysRegistered)
+{
+    const std::size_t before = Count();
+    Gate gate;
+    ManagedThread thread("label");
+    EXPECT_EQ(thread.GetThread(), nullptr);
+    thread.Assign(gate.NewThread());
+    const auto share = thread.GetThread();
+    gate.Open();
+    EXPECT_TRUE(thread.TimedJoin(10.0));
+    EXPECT_FALSE(thread.HoldsThread());
+    EXPECT_FALSE(share->joinable());
+    EXPECT_EQ(Count(), before + 1);
+}
+
 TEST(ManagedThread, AssignAbandonsWhatIsHeld)
 {
     const std::size_t before = Count();
