@@ -7,6 +7,7 @@ import time
 
 import pytest
 
+from clmodel import ClGpu, ClPlatform, cl_script_of
 from conftest import BUILD, NO_OPENCL_PLATFORM, OPENCL_GPU, TREE, run_under_wine
 from harness import text_of
 
@@ -173,3 +174,27 @@ def test_imports_system_libraries_only():
     assert not [name for name in names if name.startswith(("libgcc", "libstdc++", "libwinpthread"))]
 
 
+
+
+# Wine hands OpenCL calls on to Linux drivers, so the scripted one is that of the Linux build.
+DRIVER = BUILD.parent / "linux" / "drivers" / "opencl"
+
+
+@pytest.mark.parametrize("rule, verdict, key", [
+    ("at clCreateContext hang", "hung", "CLBandwidth"),
+    ("at clBuildProgram hang", "hung", "CLCompute"),
+    ("at clBuildProgram abort", "crashed", "CLCompute"),
+    ("at clCreateBuffer error CL_OUT_OF_RESOURCES", "failed-tests", None),
+])
+def test_opencl_drivers(tmp_path, rule, verdict, key):
+    if not DRIVER.exists():
+        pytest.skip(f"the scripted OpenCL driver isn't built: {DRIVER}")
+    script = tmp_path / "script"
+    script.write_text(cl_script_of([ClPlatform([ClGpu()])]) + rule + "\n")
+    run = run_under_wine("run", "--format", "json", "--timeout", "4", program=HOST,
+                         OCL_ICD_VENDORS=str(DRIVER), OCL_ICD_PLATFORM_SORT="none",
+                         ASSAY_SCRIPTED_OPENCL=str(script))
+    document = document_of(run)
+    assert document["outcome"]["verdict"] == verdict
+    if key is not None:
+        assert document["report"]["next"] == f"clgpu[0].{key}"
