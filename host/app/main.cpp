@@ -49,12 +49,12 @@ int main(int argc, char** argv)
 {
     pmutil::PrepareConsoleProcess();
     PrepareStandardOutput();
-    const bool isDiff = argc > 1 && std::string(argv[1]) == "diff";
     try {
         const boost::nowide::args utf8(argc, argv);
         return RunMain(std::vector<std::string>(argv + 1, argv + argc));
     } catch (const std::exception& exc) {
         std::fprintf(stderr, "assay-host: %s\n", exc.what());
+        const bool isDiff = argc > 1 && std::string(argv[1]) == "diff";
+        return isDiff ? kDiffTroubleStatus : kTroubleStatus;
     }
-    return isDiff ? kDiffTroubleStatus : kTroubleStatus;
 }
