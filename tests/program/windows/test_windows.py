@@ -56,7 +56,6 @@ def test_failure_at_every_step(whole_run, option, field):
     def run_to(step):
         return run_under_wine(f"-{option}={step}", **NO_OPENCL_PLATFORM)
 
-    # One after the other: Wine's own start doesn't bear company well.
     runs = [run_to(step) for step in range(steps + 1)]
     for step, run in enumerate(runs):
         check(run, predict([gpu], opencl=0, **{field: step}))
