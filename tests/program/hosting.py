@@ -1,5 +1,6 @@
 """Runs assay-host as its users do, and holds what it says to its own schemas."""
 
+import errno
 import json
 import os
 import signal
@@ -150,3 +151,15 @@ def texts(document, kind="value"):
 
 __all__ = ["CHILD", "GRACE", "HOST", "SLACK", "STATUSES", "TROUBLE", "Hosted", "Watched", "decode",
            "host_run", "json", "report_bytes", "run_assay", "script_child", "texts"]
+
+
+def read_to_the_end(control):
+    """What was written to a pseudo-terminal whose other side is closed: it may come in pieces, and
+    its end is an error."""
+    data = b""
+    try:
+        while piece := os.read(control, 65536):
+            data += piece
+    except OSError as error:
+        assert error.errno == errno.EIO
+    return data

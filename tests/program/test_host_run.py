@@ -13,8 +13,8 @@ import pytest
 
 from clmodel import ClGpu, ClPlatform
 from harness import PROGRAM, PROGRAM_AT_ROOT, STAMP, text_of
-from hosting import (GRACE, HOST, SLACK, TROUBLE, Watched, decode, host_run, report_bytes, run_assay,
-                     texts)
+from hosting import (GRACE, HOST, SLACK, TROUBLE, Watched, decode, host_run, read_to_the_end,
+                     report_bytes, run_assay, texts)
 from model import KEYS, Gpu, predict
 from test_opencl import Machine
 
@@ -273,7 +273,7 @@ def test_progress_only_on_a_terminal(host):
     with Watched("run", "--assay", PROGRAM, environment=environment, stderr=terminal) as watched:
         os.close(terminal)
         watched.finish()
-    shown = os.read(control, 65536).decode()
+    shown = read_to_the_end(control).decode()
     os.close(control)
     assert re.search(r"\r0\.\d s, \d+ steps, at glgpu\[0\]\.CanCompileProgramGLSL", shown)
     assert shown.endswith(" \r")

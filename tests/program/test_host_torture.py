@@ -9,7 +9,7 @@ import time
 import pytest
 
 from harness import PROGRAM, PROGRAM_AT_ROOT
-from hosting import HOST, Watched, host_run, script_child
+from hosting import HOST, Watched, host_run, read_to_the_end, script_child
 from model import Gpu
 from test_opencl import Machine
 
@@ -140,7 +140,7 @@ def test_progress_on_a_terminal(host):
                  program=HOST) as watched:
         os.close(terminal)
         run = watched.finish()
-    shown = os.read(control, 65536).decode()
+    shown = read_to_the_end(control).decode()
     os.close(control)
     assert run.status == 0
     assert "\r-crashAfter=3 of 9" in shown
