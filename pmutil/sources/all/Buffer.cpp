@@ -50,8 +50,10 @@ Buffer::Buffer(void* block, std::uint64_t size)
 }
 
 Buffer::Buffer(const Buffer& other)
+    // NOLINTBEGIN(readability-redundant-member-init): GCC wants a copy to name its bases.
     : Channel(),
       RandomAccess(),
+      // NOLINTEND(readability-redundant-member-init)
       fOffset(other.fOffset),
       fEndOfData(other.fEndOfData),
       fCapacity(other.fCapacity),
