@@ -61,11 +61,11 @@ class Failed(Exception):
 
 class EGL:
     def __init__(self):
-        self.library = c.CDLL("libEGL.so.1")
-        self.library.eglGetProcAddress.restype = Handle
+        self.egl = c.CDLL("libEGL.so.1")
+        self.egl.eglGetProcAddress.restype = Handle
 
     def function(self, name, result, *arguments):
-        address = self.library.eglGetProcAddress(name.encode())
+        address = self.egl.eglGetProcAddress(name.encode())
         if not address:
             raise Failed(f"{name} isn't there")
         return c.CFUNCTYPE(result, *arguments)(address)
