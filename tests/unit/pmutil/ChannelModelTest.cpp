@@ -396,9 +396,6 @@ private:
 
 TEST(ChannelModel, AMillionRandomOperationsAgreeWithAPlainModel)
 {
-#ifdef ASSAY_SANITIZED
-    GTEST_SKIP() << "takes gigabytes of memory under a sanitizer";
-#endif
     const std::uint64_t seed = std::random_device{}();
     SCOPED_TRACE("seed " + std::to_string(seed));
     RecordProperty("seed", std::to_string(seed));

@@ -65,7 +65,8 @@ TEST_F(LaunchStorm, TenThousandLaunchesInARow)
     const char* const wanted = std::getenv("ASSAY_LONG_TESTS"); // NOLINT(concurrency-mt-unsafe):
                                                                 // the environment is only read
     if (wanted == nullptr || std::string(wanted) != "1")
-        GTEST_SKIP() << "takes long; set ASSAY_LONG_TESTS=1";
+        GTEST_SKIP()
+            << "10,000 launches take long: scripts/test --long sets ASSAY_LONG_TESTS=1 on Linux";
     LaunchInARow(10'000);
 }
 
