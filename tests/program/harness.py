@@ -87,13 +87,14 @@ class Call:
     arguments: str
 
 
+def read_call(line):
+    number, device, name, *arguments = line.split(" ", 3)
+    return Call(int(number), -1 if device == "-" else int(device), name,
+                arguments[0] if arguments else "")
+
+
 def read_record(path):
-    calls = []
-    for line in Path(path).read_text(encoding="ascii").splitlines():
-        number, device, name, *arguments = line.split(" ", 3)
-        calls.append(Call(int(number), -1 if device == "-" else int(device), name,
-                          arguments[0] if arguments else ""))
-    return calls
+    return [read_call(line) for line in Path(path).read_text(encoding="ascii").splitlines()]
 
 
 @dataclass

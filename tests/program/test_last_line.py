@@ -1,85 +1,85 @@
-"""What docs/report-format.md tells a host of the last line behind a crash: each driver call that the
-program makes crashes in turn, and the output must end as the document says; each word of its tables
-is used."""
+"""What docs/report-format.md tells a host of the last line behind a crash: whatever driver call the
+program makes, on whatever machine and also behind a failure, the tables name it behind the line that
+stands last then; each word of them is used."""
 
 import ctypes.util
-import dataclasses
-import re
 from concurrent.futures import ThreadPoolExecutor
 
 import pytest
 
-from adapters import Adapter, write_tree
-from clmodel import ClGpu, ClPlatform, cl_script_of
-from harness import BUILD, TREE, ended_by
-from model import Gpu
+from calls import FullMachine, LastLines, calls_of
 
 WORKERS = 2
-PREFIX = re.compile(r"# \d{5}\.\S+\[tid=[0-9a-f]+\] ")
+
+pytestmark = pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
+                                reason="this machine has no OpenCL loader library")
+
+# What makes the program take another way than usual.
+MACHINES = {
+    "extensions in one text": "version \"2.1 Scripted\"",
+    "no extensions in one text": "version \"2.1 Scripted\"\nstring GL_EXTENSIONS null",
+    "no extension by its number": "at glGetStringi return 0",
+    "default display": 'client-extensions ""',
+    "surfaceless platform": 'client-extensions "EGL_MESA_platform_surfaceless"',
+    "surface": 'display-string EGL_EXTENSIONS ""',
+    "surface, and a failing GPU": 'display-string EGL_EXTENSIONS ""\n'
+                                  "at glGetString(GL_VENDOR) error GL_INVALID_OPERATION",
+    "no vertex shader": 'vertex-fails "x"',
+    "no program": 'link-fails "x"',
+}
+
+ERRORS = {"egl": "EGL_BAD_ALLOC", "gl": "GL_OUT_OF_MEMORY", "cl": "CL_OUT_OF_RESOURCES"}
+
+# The loader's name for what reaches the driver as clIcdGetPlatformIDsKHR.
+UNSEEN = {"clGetPlatformIDs"}
 
 
-def table(heading):
-    """The rows below a heading: the pattern of a last line, and the calls that it stands for."""
-    text = (TREE / "docs" / "report-format.md").read_text(encoding="utf-8")
-    section = text.split(f"\n#### {heading}\n")[1].split("\n#")[0].split("The log changes")[0]
-    rows = []
-    for line in section.splitlines():
-        cells = [cell.strip() for cell in line.strip("|").split(" | ")]
-        if line.startswith("| `") and len(cells) == 2:
-            pattern = re.escape(cells[0].strip("` ")).replace(re.escape("..."), ".*")
-            rows.append((pattern, re.findall(r"`((?:egl|gl|cl)[A-Z]\w+)`", cells[1])))
-    return rows
+def library_of(name):
+    return name[:3] if name.startswith("egl") else name[:2]
 
 
-def crash_everywhere(run_with, calls, rows, unseen=()):
-    """Crashes in each call. `unseen`: names in the rows that don't reach the scripted driver."""
-    with ThreadPoolExecutor(WORKERS) as workers:
-        runs = list(workers.map(
-            lambda call: run_with(call.number, f"at {call.number} any crash\n"), calls))
+def test_every_call(tmp_path):
+    machine = FullMachine(tmp_path)
+    table = LastLines()
     seen = set()
-    for run, call in zip(runs, calls):
-        assert ended_by(run, "SIGSEGV"), call
-        last = PREFIX.sub("", run.lines[-1])
-        rows_of_line = [row for row, (pattern, _) in enumerate(rows)
-                        if re.fullmatch(pattern, last)]
-        assert len(rows_of_line) == 1, f"{last!r} has no row of its own"
-        row = rows_of_line[0]
-        assert call.name in rows[row][1], f"{call.name} isn't told behind {last!r}"
-        seen.add((row, call.name))
-    told = {(row, name) for row, (_, names) in enumerate(rows) for name in names
-            if name not in unseen}
-    assert told == seen
+
+    def learn(run):
+        assert run.status in (0, 2)
+        pairs = [(call, table.check(call.name, last)) for call, last in calls_of(run.lines)]
+        seen.update((row, call.name) for call, row in pairs)
+        return pairs
+
+    plain = machine.run("plain")
+    assert plain.status == 0
+    first = {}
+    for call, row in learn(plain):
+        first.setdefault((row, call.name), call)
+
+    def run_disturbed(job):
+        number, (call, action) = job
+        rule = f"at {call.number} any {action}\n"
+        opencl = library_of(call.name) == "cl"
+        return machine.run(number, cl_lines=rule if opencl else "", gl_lines="" if opencl else rule)
+
+    jobs = [(call, f"error {ERRORS[library_of(call.name)]}") for call in first.values()]
+    # A platform that can't be made at all.
+    jobs += [(call, 'throw "thrown"') for call in first.values() if library_of(call.name) == "egl"]
+    with ThreadPoolExecutor(WORKERS) as workers:
+        for run in workers.map(run_disturbed, enumerate(jobs)):
+            learn(run)
+    for name, lines in MACHINES.items():
+        learn(machine.run(name.replace(" ", "-"), gl_lines=lines + "\n"))
+
+    told = {(row, name) for row, (_, names) in enumerate(table.rows) for name in names}
+    assert {each for each in told - seen if each[1] not in UNSEEN} == set()
 
 
-def test_opengl_calls(host):
-    gpu = Gpu(adapter=Adapter(0, "Card"))
-    write_tree(host.folder / "root", [gpu.adapter])
-
-    def run_with(number, line):
-        file = host.folder / f"script-{number}"
-        file.write_text(gpu.script() + line)
-        return host.run("-verbose=1", script=file, root=host.folder / "root")
-
-    assert run_with("whole", host.fresh_record()).status == 0
-    crash_everywhere(run_with, host.record(), table("OpenGL calls"))
-
-
-@pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
-                    reason="this machine has no OpenCL loader library")
-def test_opencl_calls(host):
-    # A batch of a second, so that there is one only.
-    script = cl_script_of([ClPlatform([ClGpu(batch=1_000_000_000)])])
-    host.variables.update(OCL_ICD_VENDORS=str(BUILD / "drivers" / "opencl"),
-                          OCL_ICD_PLATFORM_SORT="none")
-    gl_script = host.folder / "gl-script"
-    gl_script.write_text("# nothing\n")
-
-    def run_with(number, line):
-        file = host.folder / f"script-{number}"
-        file.write_text(script + line)
-        own = dataclasses.replace(
-            host, variables={**host.variables, "ASSAY_SCRIPTED_OPENCL": str(file)})
-        return own.run("-verbose=1", script=gl_script, opencl="empty")
-
-    assert run_with("whole", host.fresh_record()).status == 0
-    crash_everywhere(run_with, host.record(), table("OpenCL calls"), unseen=["clGetPlatformIDs"])
+def test_a_call_without_a_row_fails():
+    """The tables are read as they are meant."""
+    table = LastLines()
+    table.check("glGetStringi", "NumGLGPUs=1")
+    table.check("eglGetError", "NumGLGPUs=1")
+    for name, last in [("glFinish", "NumGLGPUs=1"), ("glGetString", "NumGLGPU=1"),
+                       ("eglGetError", "NumCLGPUs=1")]:
+        with pytest.raises(AssertionError):
+            table.check(name, last)

@@ -1,0 +1,105 @@
+"""The driver calls of a run, each with the line that stood last in the output when it was made: what a
+host would see if the call crashed. The scripted drivers record to standard output for that, where their
+lines come between those of the report. And what docs/report-format.md tells of such last lines."""
+
+import re
+from dataclasses import dataclass, field, replace
+from pathlib import Path
+
+from adapters import Adapter, write_tree
+from clmodel import ClGpu, ClPlatform, cl_script_of
+from harness import BUILD, TREE, Host, read_call, text_of
+from model import Gpu
+
+RECORD_HERE = "record /dev/stdout\n"
+PREFIX = re.compile(r"# \d{5}\.\S+\[tid=[0-9a-f]+\] ")
+CALL = re.compile(r"\d+ (?:-|\d+) (?:egl|gl|cl)[A-Z]")
+
+
+def last_line_of(lines):
+    """The last line as the document writes it."""
+    return PREFIX.sub("", lines[-1]) if lines else ""
+
+
+def without_calls(lines):
+    return [line for line in lines if not CALL.match(line)]
+
+
+def calls_of(lines):
+    """Pairs of a call and of the line that stood last before it."""
+    last, found = "", []
+    for line in lines:
+        if CALL.match(line):
+            found.append((read_call(line), last))
+        else:
+            last = PREFIX.sub("", line)
+    return found
+
+
+class LastLines:
+    """The tables of last lines and calls. A new call without a row of its own is a mistake of theirs."""
+
+    def __init__(self):
+        text = (TREE / "docs" / "report-format.md").read_text(encoding="utf-8")
+        self.rows = []
+        for heading in ("OpenGL calls", "OpenCL calls"):
+            section = text.split(f"\n#### {heading}\n")[1].split("\n#")[0]
+            for line in section.split("The log changes")[0].splitlines():
+                cells = [cell.strip() for cell in line.strip("|").split(" | ")]
+                if line.startswith("| `") and len(cells) == 2:
+                    pattern = re.escape(cells[0].strip("` ")).replace(re.escape("..."), ".*")
+                    self.rows.append(
+                        (pattern, re.findall(r"`((?:egl|gl|cl)[A-Z]\w+)`", cells[1])))
+
+    def row_of(self, last):
+        """The number of the one row that the last line has."""
+        rows = [number for number, (pattern, _) in enumerate(self.rows)
+                if re.fullmatch(pattern, last)]
+        assert len(rows) == 1, f"{last!r} has {len(rows)} rows of its own"
+        return rows[0]
+
+    def check(self, name, last):
+        """Asserts that the call is told behind that last line; gives the row's number."""
+        row = self.row_of(last)
+        names = self.rows[row][1]
+        if name == "eglGetError":
+            assert any(each.startswith("egl") for each in names), f"{name} behind {last!r}"
+        else:
+            assert name in names, f"{name} isn't told behind {last!r}"
+        return row
+
+
+@dataclass
+class FullMachine:
+    """A machine with one GPU for OpenGL and one for OpenCL, both by scripted drivers."""
+
+    folder: Path
+    gpu: Gpu = field(default_factory=lambda: Gpu(adapter=Adapter(0, "Card"), version="4.6 Scripted"))
+    # A batch of a second, so that there is one only.
+    opencl: list = field(default_factory=lambda: [ClPlatform([ClGpu(batch=1_000_000_000)])])
+
+    def __post_init__(self):
+        if not (self.folder / "root").exists():
+            write_tree(self.folder / "root", [self.gpu.adapter])
+
+    def host(self, name, gl_lines="", cl_lines=""):
+        """A host for one run, and what it finds: the machine with these lines in front of its
+        scripts' own."""
+        scripts = {"gl": self.gpu.script() + gl_lines, "cl": cl_script_of(self.opencl) + cl_lines}
+        files = {}
+        for kind, text in scripts.items():
+            files[kind] = self.folder / f"{kind}-{name}"
+            files[kind].write_bytes(text.encode("utf-8", "surrogateescape"))
+        host = replace(Host(self.folder), variables={
+            "OCL_ICD_VENDORS": str(BUILD / "drivers" / "opencl"), "OCL_ICD_PLATFORM_SORT": "none",
+            "ASSAY_SCRIPTED_OPENCL": str(files["cl"])})
+        return host, {"script": files["gl"], "opencl": "empty", "root": self.folder / "root"}
+
+    def run(self, name, gl_lines="", cl_lines="", **options):
+        """A run with the log and with the calls between its lines."""
+        host, found = self.host(name, RECORD_HERE + gl_lines, RECORD_HERE + cl_lines)
+        return host.run("-verbose=1", **found, **options)
+
+
+__all__ = ["CALL", "FullMachine", "LastLines", "RECORD_HERE", "calls_of", "last_line_of",
+           "text_of", "without_calls"]
