@@ -112,6 +112,47 @@ std::vector<Word> SplitLine(const std::string& text, const std::string& file, in
     return words;
 }
 
+// False once nobody reads any more.
+bool WriteAll(int file, const std::string& text)
+{
+    std::size_t done = 0;
+    while (done < text.size()) {
+        const ssize_t written = ::write(file, text.data() + done, text.size() - done);
+        if (written < 0 && errno != EINTR) {
+            return false;
+        }
+        done += written > 0 ? static_cast<std::size_t>(written) : 0;
+    }
+    return true;
+}
+
+void Flood(int file, const std::string& line, std::int64_t lines)
+{
+    // Many short lines in one write.
+    constexpr std::size_t kChunk = 65536;
+    std::string chunk;
+    for (std::int64_t i = 0; i < lines; ++i) {
+        chunk += line;
+        if (chunk.size() >= kChunk || i + 1 == lines) {
+            if (!WriteAll(file, chunk)) {
+                return;
+            }
+            chunk.clear();
+        }
+    }
+}
+
+// Starts a process that keeps all files of this one open until it is killed.
+void LeaveGrandchild()
+{
+    if (::fork() == 0) {
+        ::setsid();
+        for (;;) {
+            ::pause();
+        }
+    }
+}
+
 std::optional<std::int64_t> ToNumber(const std::string& text, const Line::Names& names)
 {
     if (names) {
@@ -241,17 +282,25 @@ struct Monitor::Rule {
         Abort,
         Hang,
         Exit,
+        QuickExit,
         Signal,
         Sleep,
         Print,
+        Flood,
+        Grandchild,
         Throw,
         ThrowInt,
         Error,
-        Return
+        Return,
+        Claim,
+        Text
     };
     Kind kind = Kind::Crash;
     std::int64_t number = 0;
     std::string text;
+    std::int64_t lines = 0; // of a flood
+    std::string file;       // of the script
+    int line = 0;
 
     bool Matches(const char* call, int callDevice, const std::vector<Argument>& arguments) const
     {
@@ -270,7 +319,7 @@ struct Monitor::Rule {
 
 struct Monitor::State {
     std::mutex mutex;
-    std::vector<Rule> rules;
+    std::vector<std::shared_ptr<Rule>> rules; // never removed: texts of theirs are given away
     std::uint64_t calls = 0;
     int record = -1;
 };
@@ -329,12 +378,15 @@ void Monitor::AddRule(Line& line, const Line::Names& names)
     }
 
     static const std::map<std::string, Rule::Kind> kPlain = {
-        {"crash", Rule::Kind::Crash}, {"abort", Rule::Kind::Abort}, {"hang", Rule::Kind::Hang}};
-    static const std::map<std::string, Rule::Kind> kWithNumber = {{"exit", Rule::Kind::Exit},
-                                                                  {"signal", Rule::Kind::Signal},
-                                                                  {"sleep", Rule::Kind::Sleep},
-                                                                  {"error", Rule::Kind::Error},
-                                                                  {"return", Rule::Kind::Return}};
+        {"crash", Rule::Kind::Crash},
+        {"abort", Rule::Kind::Abort},
+        {"hang", Rule::Kind::Hang},
+        {"grandchild", Rule::Kind::Grandchild}};
+    static const std::map<std::string, Rule::Kind> kWithNumber = {
+        {"exit", Rule::Kind::Exit},     {"_exit", Rule::Kind::QuickExit},
+        {"signal", Rule::Kind::Signal}, {"sleep", Rule::Kind::Sleep},
+        {"error", Rule::Kind::Error},   {"return", Rule::Kind::Return},
+        {"claim", Rule::Kind::Claim}};
     const std::string action = line.Take("an action").text;
     if (const auto plain = kPlain.find(action); plain != kPlain.end()) {
         rule.kind = plain->second;
@@ -353,18 +405,30 @@ void Monitor::AddRule(Line& line, const Line::Names& names)
         rule.kind = Rule::Kind::Print;
         rule.number = line.TakeNumber("the number of a file descriptor");
         rule.text = line.TakeText("the text to print").value_or("");
+    } else if (action == "text") {
+        rule.kind = Rule::Kind::Text;
+        rule.text = line.TakeText("the text to give").value_or("");
+    } else if (action == "flood") {
+        rule.kind = Rule::Kind::Flood;
+        rule.number = line.TakeNumber("the number of a file descriptor");
+        rule.lines = line.TakeNumber("the number of lines");
+        const std::int64_t length = line.TakeNumber("the length of a line");
+        rule.text = std::string(static_cast<std::size_t>(length), 'f') + '\n';
     } else {
         line.Fail("unknown action \"" + action + "\"");
     }
     if (!line.AtEnd()) {
         line.Fail("words are left behind the action");
     }
-    fState->rules.push_back(std::move(rule));
+    rule.file = line.File();
+    rule.line = line.Number();
+    fState->rules.push_back(std::make_shared<Rule>(std::move(rule)));
 }
 
-Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>& arguments)
+Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>& arguments,
+                      Gives gives)
 {
-    std::vector<Rule> due;
+    std::vector<std::shared_ptr<const Rule>> due;
     {
         const std::lock_guard<std::mutex> lock(fState->mutex);
         ++fState->calls;
@@ -387,10 +451,10 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
                 Refuse("record", 0, std::strerror(errno));
             }
         }
-        for (Rule& rule : fState->rules) {
-            if (rule.Matches(name, device, arguments)) {
-                ++rule.matched;
-                if (rule.matched >= rule.first && rule.matched <= rule.last) {
+        for (const std::shared_ptr<Rule>& rule : fState->rules) {
+            if (rule->Matches(name, device, arguments)) {
+                ++rule->matched;
+                if (rule->matched >= rule->first && rule->matched <= rule->last) {
                     due.push_back(rule);
                 }
             }
@@ -398,7 +462,8 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
     }
 
     Effect effect;
-    for (const Rule& rule : due) {
+    for (const std::shared_ptr<const Rule>& each : due) {
+        const Rule& rule = *each;
         switch (rule.kind) {
         case Rule::Kind::Crash: {
             // A page that no process has; not null itself, which sanitizers catch before it faults.
@@ -414,6 +479,8 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
             }
         case Rule::Kind::Exit:
             std::exit(static_cast<int>(rule.number));
+        case Rule::Kind::QuickExit:
+            ::_exit(static_cast<int>(rule.number));
         case Rule::Kind::Signal:
             std::raise(static_cast<int>(rule.number));
             break;
@@ -421,9 +488,13 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
             std::this_thread::sleep_for(std::chrono::milliseconds(rule.number));
             break;
         case Rule::Kind::Print:
-            if (::write(static_cast<int>(rule.number), rule.text.data(), rule.text.size()) < 0) {
-                continue;
-            }
+            WriteAll(static_cast<int>(rule.number), rule.text);
+            break;
+        case Rule::Kind::Flood:
+            Flood(static_cast<int>(rule.number), rule.text, rule.lines);
+            break;
+        case Rule::Kind::Grandchild:
+            LeaveGrandchild();
             break;
         case Rule::Kind::Throw:
             throw std::runtime_error(rule.text);
@@ -434,6 +505,18 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
             break;
         case Rule::Kind::Return:
             effect.returns = rule.number;
+            break;
+        case Rule::Kind::Claim:
+            if (gives != Gives::Number && gives != Gives::TextAndSize) {
+                Refuse(rule.file, rule.line, std::string(name) + " gives no number");
+            }
+            effect.claim = rule.number;
+            break;
+        case Rule::Kind::Text:
+            if (gives != Gives::Text && gives != Gives::TextAndSize) {
+                Refuse(rule.file, rule.line, std::string(name) + " gives no text");
+            }
+            effect.text = &rule.text;
             break;
         }
     }

@@ -38,6 +38,9 @@ public:
     // Takes a text: "...", or `repeat N "..."`, or several of them joined by +. `null` gives
     // nothing.
     std::optional<std::string> TakeText(const char* what);
+    // Where the line stands.
+    const std::string& File() const { return fFile; }
+    int Number() const { return fNumber; }
     // Ends the process with `problem`.
     [[noreturn]] void Fail(const std::string& problem) const;
 
@@ -62,7 +65,12 @@ struct Argument {
 struct Effect {
     std::optional<std::int64_t> error;   // the call fails with this error code
     std::optional<std::int64_t> returns; // the call gives this and does nothing else
+    std::optional<std::int64_t> claim;   // the number or size that the call tells
+    const std::string* text = nullptr;   // the text that the call gives; stays
 };
+
+// What a caller gets from a call, as far as rules change it.
+enum class Gives { Neither, Number, Text, TextAndSize };
 
 // The rules of a script, the counters of calls that they go by, and the record. Thread-safe.
 class Monitor {
@@ -78,8 +86,10 @@ public:
     void RecordTo(const std::string& path);
 
     // An entry point was called, on that device (negative if it concerns none). Does to the process
-    // what the rules say, or throws what they say; else gives what is left to do.
-    Effect Enter(const char* name, int device, const std::vector<Argument>& arguments);
+    // what the rules say, or throws what they say; else gives what is left to do. A rule with a
+    // `claim` or a `text` for a call that gives none is a mistake of the script.
+    Effect Enter(const char* name, int device, const std::vector<Argument>& arguments,
+                 Gives gives = Gives::Neither);
 
 private:
     struct Rule;

@@ -123,9 +123,13 @@ Argument AttributesArgument(const T* attributes)
 struct Call {
     Effect effect;
 
-    Call(const char* name, int device, const std::vector<Argument>& arguments)
-        : effect(TheModel().monitor.Enter(name, device, arguments))
+    Call(const char* name, int device, const std::vector<Argument>& arguments,
+         Gives gives = Gives::Neither)
+        : effect(TheModel().monitor.Enter(name, device, arguments, gives))
     {
+        if (effect.claim) {
+            effect.returns = effect.claim;
+        }
         // The error stays as it is while it is asked for.
         if (std::strcmp(name, "eglGetError") != 0) {
             tError = EGL_SUCCESS;
@@ -134,7 +138,9 @@ struct Call {
             tError = static_cast<EGLint>(*effect.error);
         }
     }
-    bool Over() const { return effect.error || effect.returns; }
+    bool Over() const { return effect.error || effect.returns || effect.text != nullptr; }
+    // The text of a call that is over.
+    const char* Text() const { return effect.text != nullptr ? effect.text->c_str() : nullptr; }
     EGLBoolean Answer() const
     {
         return effect.error ? EGL_FALSE : static_cast<EGLBoolean>(*effect.returns);
@@ -209,7 +215,7 @@ bool OffersDisplay(const DisplayObject& display, const char* extension)
 
 EGLBoolean QueryDevices(EGLint size, EGLDeviceEXT* devices, EGLint* count)
 {
-    const Call call("eglQueryDevicesEXT", -1, {Number(size)});
+    const Call call("eglQueryDevicesEXT", -1, {Number(size)}, Gives::Number);
     if (call.Over()) {
         // `return N` claims N devices.
         if (call.effect.returns && count != nullptr) {
@@ -235,9 +241,9 @@ const char* QueryDeviceString(EGLDeviceEXT handle, EGLint name)
 {
     const int device = DeviceOf(handle);
     const Call call("eglQueryDeviceStringEXT", device,
-                    {DeviceArgument(handle), Enum(static_cast<std::uint32_t>(name))});
+                    {DeviceArgument(handle), Enum(static_cast<std::uint32_t>(name))}, Gives::Text);
     if (call.Over()) {
-        return nullptr;
+        return call.Text();
     }
     if (device < 0) {
         Fail(EGL_BAD_DEVICE_EXT);
@@ -305,9 +311,9 @@ EGLAPI EGLint EGLAPIENTRY eglGetError(void)
 EGLAPI const char* EGLAPIENTRY eglQueryString(EGLDisplay handle, EGLint name)
 {
     const Call call("eglQueryString", DeviceOfDisplay(handle),
-                    {DisplayArgument(handle), Enum(static_cast<std::uint32_t>(name))});
+                    {DisplayArgument(handle), Enum(static_cast<std::uint32_t>(name))}, Gives::Text);
     if (call.Over()) {
-        return nullptr;
+        return call.Text();
     }
     if (handle == EGL_NO_DISPLAY) {
         if (name == EGL_EXTENSIONS && TheModel().clientExtensions) {

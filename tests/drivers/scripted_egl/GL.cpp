@@ -24,15 +24,27 @@ struct Call {
     ContextObject* context = CurrentContext();
     Effect effect;
 
-    Call(const char* name, const std::vector<Argument>& arguments)
-        : effect(
-              TheModel().monitor.Enter(name, context == nullptr ? -1 : context->device, arguments))
+    Call(const char* name, const std::vector<Argument>& arguments, Gives gives = Gives::Neither)
+        : effect(TheModel().monitor.Enter(name, context == nullptr ? -1 : context->device,
+                                          arguments, gives))
     {
+        if (effect.claim) {
+            effect.returns = effect.claim;
+        }
         if (effect.error) {
             Error(static_cast<GLenum>(*effect.error));
         }
     }
-    bool Over() const { return context == nullptr || effect.error || effect.returns; }
+    bool Over() const
+    {
+        return context == nullptr || effect.error || effect.returns || effect.text != nullptr;
+    }
+    // The text of a call that is over.
+    const GLubyte* Text() const
+    {
+        return effect.text != nullptr ? reinterpret_cast<const GLubyte*>(effect.text->c_str())
+                                      : nullptr;
+    }
     std::int64_t Answer() const { return effect.returns.value_or(0); }
     GLState& GL() const { return context->gl; }
     Device& Model() const { return DeviceOfContext(*context); }
@@ -64,9 +76,9 @@ const GLubyte* AsBytes(const char* text)
 
 const GLubyte* GetString(GLenum name)
 {
-    const Call call("glGetString", {Enum(name)});
+    const Call call("glGetString", {Enum(name)}, Gives::Text);
     if (call.Over()) {
-        return nullptr;
+        return call.Text();
     }
     const Texts& texts = call.Model().glTexts;
     const auto found = texts.find(name);
@@ -79,9 +91,9 @@ const GLubyte* GetString(GLenum name)
 
 const GLubyte* GetStringi(GLenum name, GLuint index)
 {
-    const Call call("glGetStringi", {Enum(name), Number(index)});
+    const Call call("glGetStringi", {Enum(name), Number(index)}, Gives::Text);
     if (call.Over()) {
-        return nullptr;
+        return call.Text();
     }
     if (name != GL_EXTENSIONS) {
         call.Error(GL_INVALID_ENUM);
@@ -102,7 +114,7 @@ const GLubyte* GetStringi(GLenum name, GLuint index)
 
 GLenum GetError()
 {
-    const Call call("glGetError", {});
+    const Call call("glGetError", {}, Gives::Number);
     if (call.effect.returns) {
         return static_cast<GLenum>(*call.effect.returns);
     }
@@ -129,7 +141,7 @@ std::pair<GLint, GLint> Version(const Device& device)
 
 void GetIntegerv(GLenum name, GLint* result)
 {
-    const Call call("glGetIntegerv", {Enum(name)});
+    const Call call("glGetIntegerv", {Enum(name)}, Gives::Number);
     if (call.Over()) {
         if (call.effect.returns) {
             *result = static_cast<GLint>(call.Answer());
@@ -153,7 +165,7 @@ void GetIntegerv(GLenum name, GLint* result)
 
 void GetProgramivARB(GLenum target, GLenum name, GLint* result)
 {
-    const Call call("glGetProgramivARB", {Enum(target), Enum(name)});
+    const Call call("glGetProgramivARB", {Enum(target), Enum(name)}, Gives::Number);
     if (call.Over()) {
         if (call.effect.returns) {
             *result = static_cast<GLint>(call.Answer());
@@ -204,7 +216,7 @@ void Clear(GLbitfield mask)
 
 GLuint CreateShader(GLenum kind)
 {
-    const Call call("glCreateShader", {Enum(kind)});
+    const Call call("glCreateShader", {Enum(kind)}, Gives::Number);
     if (call.Over()) {
         return static_cast<GLuint>(call.Answer());
     }
@@ -289,7 +301,7 @@ void CopyLog(const std::string& log, GLsizei size, GLsizei* length, GLchar* text
 
 void GetShaderiv(GLuint shader, GLenum name, GLint* result)
 {
-    const Call call("glGetShaderiv", {Number(shader), Enum(name)});
+    const Call call("glGetShaderiv", {Number(shader), Enum(name)}, Gives::Number);
     if (call.effect.returns) {
         *result = static_cast<GLint>(call.Answer());
     }
@@ -332,7 +344,7 @@ void DeleteShader(GLuint shader)
 
 GLuint CreateProgram()
 {
-    const Call call("glCreateProgram", {});
+    const Call call("glCreateProgram", {}, Gives::Number);
     if (call.Over()) {
         return static_cast<GLuint>(call.Answer());
     }
@@ -367,7 +379,7 @@ void LinkProgram(GLuint program)
 
 void GetProgramiv(GLuint program, GLenum name, GLint* result)
 {
-    const Call call("glGetProgramiv", {Number(program), Enum(name)});
+    const Call call("glGetProgramiv", {Number(program), Enum(name)}, Gives::Number);
     if (call.effect.returns) {
         *result = static_cast<GLint>(call.Answer());
     }
@@ -406,7 +418,7 @@ void DeleteProgram(GLuint program)
 
 void GenTextures(GLsizei count, GLuint* ids)
 {
-    const Call call("glGenTextures", {Number(count)});
+    const Call call("glGenTextures", {Number(count)}, Gives::Number);
     for (GLsizei i = 0; i < count; ++i) {
         ids[i] = call.Over() ? static_cast<GLuint>(call.Answer()) : call.GL().nextID++;
         if (!call.Over()) {
@@ -475,7 +487,7 @@ void DeleteTextures(GLsizei count, const GLuint* ids)
 
 void GenFramebuffers(GLsizei count, GLuint* ids)
 {
-    const Call call("glGenFramebuffers", {Number(count)});
+    const Call call("glGenFramebuffers", {Number(count)}, Gives::Number);
     for (GLsizei i = 0; i < count; ++i) {
         ids[i] = call.Over() ? static_cast<GLuint>(call.Answer()) : call.GL().nextID++;
         if (!call.Over()) {
@@ -514,7 +526,7 @@ void FramebufferTexture2D(GLenum target, GLenum attachment, GLenum textureTarget
 
 GLenum CheckFramebufferStatus(GLenum target)
 {
-    const Call call("glCheckFramebufferStatus", {Enum(target)});
+    const Call call("glCheckFramebufferStatus", {Enum(target)}, Gives::Number);
     return call.Over() ? static_cast<GLenum>(call.Answer()) : FramebufferStatus(call.GL());
 }
 

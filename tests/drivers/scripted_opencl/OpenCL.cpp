@@ -48,14 +48,18 @@ int DeviceOf(const Handle* handle)
 }
 
 // What a call that gives a status gives in place of doing its work, if anything.
-std::optional<cl_int> Enter(const char* name, int device, const std::vector<Argument>& arguments)
+std::optional<cl_int> StatusOf(const Effect& effect)
 {
-    const Effect effect = TheModel().monitor.Enter(name, device, arguments);
     if (effect.error)
         return static_cast<cl_int>(*effect.error);
     if (effect.returns)
         return static_cast<cl_int>(*effect.returns);
     return {};
+}
+
+std::optional<cl_int> Enter(const char* name, int device, const std::vector<Argument>& arguments)
+{
+    return StatusOf(TheModel().monitor.Enter(name, device, arguments));
 }
 
 // Objects stay: handles remain comparable, and what was leaked is no affair of the process's end.
@@ -84,12 +88,19 @@ Object* Make(const char* name, int device, const std::vector<Argument>& argument
 }
 
 cl_int Tell(const Answers& answers, std::int64_t name, std::size_t size, void* value,
-            std::size_t* actualSize)
+            std::size_t* actualSize, const Effect& effect)
 {
     const auto found = answers.find(name);
     if (found == answers.end())
         return CL_INVALID_VALUE;
-    const Answer& answer = found->second;
+    Answer answer = found->second;
+    if (effect.text != nullptr) {
+        answer.bytes = *effect.text + '\0';
+        // So that what has room for less gets as much as fits.
+        answer.claim = answer.bytes.size();
+    }
+    if (effect.claim)
+        answer.claim = static_cast<std::uint64_t>(*effect.claim);
     if (value != nullptr) {
         if (size < answer.bytes.size() && !answer.claim)
             return CL_INVALID_VALUE;
@@ -103,8 +114,10 @@ cl_int Tell(const Answers& answers, std::int64_t name, std::size_t size, void* v
 // Gives a list the way OpenCL's two-call queries do.
 template <typename Item>
 void TellList(const std::vector<Item>& items, std::optional<std::uint32_t> claim, cl_uint count,
-              Item* list, cl_uint* actualCount)
+              Item* list, cl_uint* actualCount, const Effect& effect)
 {
+    if (effect.claim)
+        claim = static_cast<std::uint32_t>(*effect.claim);
     if (list != nullptr)
         for (std::size_t i = 0; i < items.size() && i < count; ++i)
             list[i] = items[i];
@@ -115,38 +128,45 @@ void TellList(const std::vector<Item>& items, std::optional<std::uint32_t> claim
 cl_int CL_API_CALL GetPlatformIDs(cl_uint count, cl_platform_id* platforms, cl_uint* actualCount)
 {
     Model& model = TheModel();
-    if (const auto status = Enter("clIcdGetPlatformIDsKHR", -1, {Number(count)}))
+    const Effect effect =
+        model.monitor.Enter("clIcdGetPlatformIDsKHR", -1, {Number(count)}, Gives::Number);
+    if (const auto status = StatusOf(effect))
         return *status;
     std::vector<cl_platform_id> all;
     for (const Platform& platform : model.platforms)
         all.push_back(platform.handle);
     if (all.empty() && !model.claimedPlatforms)
         return CL_PLATFORM_NOT_FOUND_KHR;
-    TellList(all, model.claimedPlatforms, count, platforms, actualCount);
+    TellList(all, model.claimedPlatforms, count, platforms, actualCount, effect);
     return CL_SUCCESS;
 }
 
 cl_int CL_API_CALL GetPlatformInfo(cl_platform_id platform, cl_platform_info name, std::size_t size,
                                    void* value, std::size_t* actualSize)
 {
-    if (const auto status = Enter("clGetPlatformInfo", -1,
-                                  {Object("platform", platform), Enumerant(name),
-                                   Number(static_cast<std::int64_t>(size)), Pointer(value)}))
+    const Effect effect =
+        TheModel().monitor.Enter("clGetPlatformInfo", -1,
+                                 {Object("platform", platform), Enumerant(name),
+                                  Number(static_cast<std::int64_t>(size)), Pointer(value)},
+                                 Gives::TextAndSize);
+    if (const auto status = StatusOf(effect))
         return *status;
     for (const Platform& each : TheModel().platforms)
         if (each.handle == platform)
-            return Tell(each.answers, name, size, value, actualSize);
+            return Tell(each.answers, name, size, value, actualSize, effect);
     return CL_INVALID_PLATFORM;
 }
 
 cl_int CL_API_CALL GetDeviceIDs(cl_platform_id platform, cl_device_type type, cl_uint count,
                                 cl_device_id* devices, cl_uint* actualCount)
 {
-    if (const auto status = Enter("clGetDeviceIDs", -1,
-                                  {Object("platform", platform),
-                                   Enumerant(static_cast<std::int64_t>(type)), Number(count)}))
-        return *status;
     Model& model = TheModel();
+    const Effect effect = model.monitor.Enter(
+        "clGetDeviceIDs", -1,
+        {Object("platform", platform), Enumerant(static_cast<std::int64_t>(type)), Number(count)},
+        Gives::Number);
+    if (const auto status = StatusOf(effect))
+        return *status;
     for (const Platform& each : model.platforms) {
         if (each.handle != platform)
             continue;
@@ -158,7 +178,7 @@ cl_int CL_API_CALL GetDeviceIDs(cl_platform_id platform, cl_device_type type, cl
         }
         if (found.empty() && !each.claimedDevices)
             return CL_DEVICE_NOT_FOUND;
-        TellList(found, each.claimedDevices, count, devices, actualCount);
+        TellList(found, each.claimedDevices, count, devices, actualCount, effect);
         return CL_SUCCESS;
     }
     return CL_INVALID_PLATFORM;
@@ -167,13 +187,16 @@ cl_int CL_API_CALL GetDeviceIDs(cl_platform_id platform, cl_device_type type, cl
 cl_int CL_API_CALL GetDeviceInfo(cl_device_id device, cl_device_info name, std::size_t size,
                                  void* value, std::size_t* actualSize)
 {
-    if (const auto status = Enter("clGetDeviceInfo", DeviceOf(device),
-                                  {Object("device", device), Enumerant(name),
-                                   Number(static_cast<std::int64_t>(size)), Pointer(value)}))
+    const Effect effect =
+        TheModel().monitor.Enter("clGetDeviceInfo", DeviceOf(device),
+                                 {Object("device", device), Enumerant(name),
+                                  Number(static_cast<std::int64_t>(size)), Pointer(value)},
+                                 Gives::TextAndSize);
+    if (const auto status = StatusOf(effect))
         return *status;
     for (const Device& each : TheModel().devices)
         if (device != nullptr && each.handle == device)
-            return Tell(each.answers, name, size, value, actualSize);
+            return Tell(each.answers, name, size, value, actualSize, effect);
     return CL_INVALID_DEVICE;
 }
 
@@ -392,15 +415,19 @@ cl_int CL_API_CALL ReleaseEvent(cl_event event)
 cl_int CL_API_CALL GetEventProfilingInfo(cl_event event, cl_profiling_info name, std::size_t size,
                                          void* value, std::size_t* actualSize)
 {
-    if (const auto status = Enter(
-            "clGetEventProfilingInfo", DeviceOf(event),
-            {Object("event", event), Enumerant(name), Number(static_cast<std::int64_t>(size))}))
+    const Effect effect = TheModel().monitor.Enter(
+        "clGetEventProfilingInfo", DeviceOf(event),
+        {Object("event", event), Enumerant(name), Number(static_cast<std::int64_t>(size))},
+        Gives::Number);
+    if (const auto status = StatusOf(effect))
         return *status;
     if (event == nullptr)
         return CL_INVALID_EVENT;
     if (size < sizeof(cl_ulong) || value == nullptr)
         return CL_INVALID_VALUE;
-    const cl_ulong counter = name == CL_PROFILING_COMMAND_END ? event->end : event->start;
+    cl_ulong counter = name == CL_PROFILING_COMMAND_END ? event->end : event->start;
+    if (effect.claim)
+        counter = static_cast<cl_ulong>(*effect.claim);
     std::memcpy(value, &counter, sizeof counter);
     if (actualSize != nullptr)
         *actualSize = sizeof counter;
