@@ -2,13 +2,15 @@
 host would see if the call crashed. The scripted drivers record to standard output for that, where their
 lines come between those of the report. And what docs/report-format.md tells of such last lines."""
 
+import functools
 import re
 from dataclasses import dataclass, field, replace
 from pathlib import Path
+from typing import NamedTuple
 
 from adapters import Adapter, write_tree
 from clmodel import ClGpu, ClPlatform, cl_script_of
-from harness import BUILD, TREE, Host, read_call, text_of
+from harness import BUILD, TREE, Call, Host, read_call
 from model import Gpu
 
 RECORD_HERE = "record /dev/stdout\n"
@@ -16,23 +18,26 @@ PREFIX = re.compile(r"# \d{5}\.\S+\[tid=[0-9a-f]+\] ")
 CALL = re.compile(r"\d+ (?:-|\d+) (?:egl|gl|cl)[A-Z]")
 
 
-def last_line_of(lines):
-    """The last line as the document writes it."""
-    return PREFIX.sub("", lines[-1]) if lines else ""
-
-
 def without_calls(lines):
     return [line for line in lines if not CALL.match(line)]
 
 
+class Made(NamedTuple):
+    """A call, and what stood in the output by then."""
+
+    call: Call
+    last: str  # the last line, as the document writes it
+    printed: int  # how many lines
+
+
 def calls_of(lines):
-    """Pairs of a call and of the line that stood last before it."""
-    last, found = "", []
+    """The calls of a run, in their order."""
+    last, printed, found = "", 0, []
     for line in lines:
         if CALL.match(line):
-            found.append((read_call(line), last))
+            found.append(Made(read_call(line), last, printed))
         else:
-            last = PREFIX.sub("", line)
+            last, printed = PREFIX.sub("", line), printed + 1
     return found
 
 
@@ -51,8 +56,9 @@ class LastLines:
                     self.rows.append(
                         (pattern, re.findall(r"`((?:egl|gl|cl)[A-Z]\w+)`", cells[1])))
 
-    def row_of(self, last):
-        """The number of the one row that the last line has."""
+        self._row_of = functools.lru_cache(1000)(self._find_row)
+
+    def _find_row(self, last):
         rows = [number for number, (pattern, _) in enumerate(self.rows)
                 if re.fullmatch(pattern, last)]
         assert len(rows) == 1, f"{last!r} has {len(rows)} rows of its own"
@@ -60,7 +66,7 @@ class LastLines:
 
     def check(self, name, last):
         """Asserts that the call is told behind that last line; gives the row's number."""
-        row = self.row_of(last)
+        row = self._row_of(last)
         names = self.rows[row][1]
         if name == "eglGetError":
             assert any(each.startswith("egl") for each in names), f"{name} behind {last!r}"
@@ -71,12 +77,13 @@ class LastLines:
 
 @dataclass
 class FullMachine:
-    """A machine with one GPU for OpenGL and one for OpenCL, both by scripted drivers."""
+    """A machine with one GPU for OpenGL and one for OpenCL, both by scripted drivers that are asked
+    for as much as possible: extensions one by one, and a surface for the context."""
 
     folder: Path
     gpu: Gpu = field(default_factory=lambda: Gpu(adapter=Adapter(0, "Card"), version="4.6 Scripted"))
-    # A batch of a second, so that there is one only.
-    opencl: list = field(default_factory=lambda: [ClPlatform([ClGpu(batch=1_000_000_000)])])
+    # Two batches make the second of the measurement full.
+    opencl: list = field(default_factory=lambda: [ClPlatform([ClGpu(batch=600_000_000)])])
 
     def __post_init__(self):
         if not (self.folder / "root").exists():
@@ -85,7 +92,8 @@ class FullMachine:
     def host(self, name, gl_lines="", cl_lines=""):
         """A host for one run, and what it finds: the machine with these lines in front of its
         scripts' own."""
-        scripts = {"gl": self.gpu.script() + gl_lines, "cl": cl_script_of(self.opencl) + cl_lines}
+        surface = 'display-string EGL_EXTENSIONS ""\n'
+        scripts = {"gl": self.gpu.script() + surface + gl_lines, "cl": cl_script_of(self.opencl) + cl_lines}
         files = {}
         for kind, text in scripts.items():
             files[kind] = self.folder / f"{kind}-{name}"
@@ -100,6 +108,3 @@ class FullMachine:
         host, found = self.host(name, RECORD_HERE + gl_lines, RECORD_HERE + cl_lines)
         return host.run("-verbose=1", **found, **options)
 
-
-__all__ = ["CALL", "FullMachine", "LastLines", "RECORD_HERE", "calls_of", "last_line_of",
-           "text_of", "without_calls"]

@@ -3,6 +3,7 @@
 import errno
 import json
 import os
+import select
 import signal
 import subprocess
 import sys
@@ -90,15 +91,32 @@ class Watched:
         return self
 
     def __exit__(self, *_):
-        left = processes_with(self.mark)
+        left = self.end_what_is_left()
         self.process.kill()
         self.process.wait()
+        assert left == 0
+
+    def end_what_is_left(self):
+        """Kills what was started and still runs, and waits until it is gone; gives how many that
+        were."""
+        left = processes_with(self.mark)
         for number, _ in left:
             try:
                 os.kill(number, signal.SIGKILL)
             except ProcessLookupError:
                 pass
-        assert left == []
+        while left and processes_with(self.mark):
+            time.sleep(0.01)
+        return len(left)
+
+    def wait(self, seconds):
+        """Waits for the end of the process itself, whatever holds its streams."""
+        descriptor = os.pidfd_open(self.process.pid)
+        try:
+            assert select.select([descriptor], [], [], seconds)[0], "the process doesn't end"
+        finally:
+            os.close(descriptor)
+        self.process.wait()
 
     def look(self):
         try:

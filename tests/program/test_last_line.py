@@ -8,6 +8,7 @@ from concurrent.futures import ThreadPoolExecutor
 import pytest
 
 from calls import FullMachine, LastLines, calls_of
+from faults import ERRORS, library_of
 
 WORKERS = 2
 
@@ -21,21 +22,15 @@ MACHINES = {
     "no extension by its number": "at glGetStringi return 0",
     "default display": 'client-extensions ""',
     "surfaceless platform": 'client-extensions "EGL_MESA_platform_surfaceless"',
-    "surface": 'display-string EGL_EXTENSIONS ""',
-    "surface, and a failing GPU": 'display-string EGL_EXTENSIONS ""\n'
-                                  "at glGetString(GL_VENDOR) error GL_INVALID_OPERATION",
+    "no surface": 'display-string EGL_EXTENSIONS "EGL_KHR_surfaceless_context"',
+    "neither surface nor configuration":
+        'display-string EGL_EXTENSIONS "EGL_KHR_no_config_context EGL_KHR_surfaceless_context"',
     "no vertex shader": 'vertex-fails "x"',
     "no program": 'link-fails "x"',
 }
 
-ERRORS = {"egl": "EGL_BAD_ALLOC", "gl": "GL_OUT_OF_MEMORY", "cl": "CL_OUT_OF_RESOURCES"}
-
 # The loader's name for what reaches the driver as clIcdGetPlatformIDsKHR.
 UNSEEN = {"clGetPlatformIDs"}
-
-
-def library_of(name):
-    return name[:3] if name.startswith("egl") else name[:2]
 
 
 def test_every_call(tmp_path):
@@ -45,9 +40,9 @@ def test_every_call(tmp_path):
 
     def learn(run):
         assert run.status in (0, 2)
-        pairs = [(call, table.check(call.name, last)) for call, last in calls_of(run.lines)]
-        seen.update((row, call.name) for call, row in pairs)
-        return pairs
+        rows = [(made.call, table.check(made.call.name, made.last)) for made in calls_of(run.lines)]
+        seen.update((row, call.name) for call, row in rows)
+        return rows
 
     plain = machine.run("plain")
     assert plain.status == 0

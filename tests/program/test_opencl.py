@@ -5,7 +5,6 @@ import ctypes.util
 import re
 import shutil
 import subprocess
-import time
 from concurrent.futures import ThreadPoolExecutor
 from pathlib import Path
 
@@ -13,12 +12,11 @@ import pytest
 
 from adapters import Adapter, write_tree
 from clmodel import CL_KEYS, ClGpu, ClPlatform, cl_script_of, cl_values_of
-from harness import BUILD, PROGRAM, SANITIZED_BY, ended_by
+from harness import BUILD, PROGRAM, SANITIZED_BY
 from model import Gpu, check, predict, script_of
 
 WORKERS = 2
 VENDORS = Path("/etc/OpenCL/vendors")
-PREFIX = re.compile(r"# \d{5}\.\S+\[tid=[0-9a-f]+\] ")
 
 REQUIREMENT = ("Failed requirement: ciErrNum == CL_SUCCESS\n"
                "exception: Failed requirement: ciErrNum == CL_SUCCESS")
@@ -383,91 +381,10 @@ def test_platforms_that_cannot_be_listed(one):
           predict([], opencl=0, **one.checks))
 
 
-SETUP = "GPUImplHardware::Do{}: QGF::OCL::{};"
-CONTEXT = "Context context(properties, *iDev)"
-QUEUE = "CommandQueue cq(context, *iDev, false, true)"
-CHECK = "GPUImplHardware::checkBandwidthCL: "
-MEASURE = "BEGIN GPUImplHardware::MeasureCLCompute"
-
-# Where the driver crashes, and what the log's last line is then.
-CRASHES = [
-    ("1 clCreateContext", SETUP.format("GetCLBandwidth", CONTEXT)),
-    ("1 clCreateCommandQueue", SETUP.format("GetCLBandwidth", QUEUE)),
-    ("1 clCreateBuffer", CHECK + "clCreateBuffer d_idata nbytes=16777216"),
-    ("2 clCreateBuffer", CHECK + "clCreateBuffer d_odata nbytes=16777216"),
-    ("1 clFinish", CHECK + "clFinish"),
-    ("1 clEnqueueCopyBuffer", CHECK + "0 of 100, totalSeconds=0"),
-    ("2 clFinish", CHECK + "0 of 100, totalSeconds=0"),
-    ("1 clGetEventProfilingInfo", CHECK + "0 of 100, totalSeconds=0"),
-    ("25 clEnqueueCopyBuffer", CHECK + "20 of 100, totalSeconds=0.4"),
-    ("7 clFinish", CHECK + "clFinish"),
-    ("1 clReleaseEvent", CHECK + "clFinish"),
-    ("1 clReleaseMemObject", CHECK + "releasing"),
-    ("1 clReleaseCommandQueue", "GPUImplHardware::DoGetCLBandwidth: result=1.67772e+09"),
-    ("2 clCreateContext", SETUP.format("GetCLCompute", CONTEXT)),
-    ("2 clCreateCommandQueue", SETUP.format("GetCLCompute", QUEUE)),
-    ("1 clCreateProgramWithSource", MEASURE),
-    ("1 clBuildProgram", MEASURE),
-    ("1 clCreateKernel", MEASURE),
-    ("3 clCreateBuffer", MEASURE),
-    ("1 clSetKernelArg", MEASURE),
-    ("1 clEnqueueNDRangeKernel", MEASURE),
-    ("1 clWaitForEvents", MEASURE),
-    ("8 clFinish", "GPUImplHardware::MeasureCLCompute: clFinish"),
-    ("3 clReleaseMemObject", "GPUImplHardware::MeasureCLCompute: clFinish"),
-]
-
-
-@pytest.mark.parametrize("call, last", CRASHES)
-@pytest.mark.parametrize("way, signal", [("crash", "SIGSEGV"), ("abort", "SIGABRT")])
-def test_log_of_a_crash_ends_with_the_operation(one, call, last, way, signal):
-    run = one.run("-verbose=1", extra=f"at {call} {way}\n")
-    assert ended_by(run, signal)
-    assert run.lines[-1].startswith("# ")
-    assert PREFIX.sub("", run.lines[-1]) == last
-    # What was reported before stands.
-    whole = [line for line in one.predict().lines if not line.startswith("assayEnd")]
-    facts = [line for line in run.lines if not line.startswith("#")]
-    assert facts == whole[:len(facts)]
-    assert len(facts) == len(whole) - (1 if "CLBandwidth" in facts[-1] else 2)
-
-
-@pytest.mark.parametrize("name, key", [
-    ("CL_DEVICE_PLATFORM", None), ("CL_DEVICE_VERSION", "CLPlatformVersion"),
-    ("CL_DEVICE_NAME", "CLMemoryMB"), ("CL_DRIVER_VERSION", "CLVendorID"),
-])
-def test_report_of_a_crash_in_a_query_ends_with_the_line_before(one, name, key):
-    run = one.run(extra=f"at clGetDeviceInfo(*,{name}) crash\n")
-    assert ended_by(run, "SIGSEGV")
-    last = "NumCLGPUs=1" if key is None else f"clgpu[0].{key}="
-    assert run.lines[-1].startswith(last)
-
-
 def test_driver_that_exits_takes_the_run_along(one):
     run = one.run(extra="at clBuildProgram exit 41\n")
     assert run.status == 41
     assert run.lines[-1].startswith("clgpu[0].CLBandwidth=")
-
-
-@pytest.mark.parametrize("call", ["clBuildProgram", "clEnqueueCopyBuffer", "clGetDeviceInfo"])
-def test_driver_that_hangs_leaves_what_was_reported(one, call):
-    one.script(cl_script_of(one.platforms) + f"at {call} hang\n" + one.host.fresh_record())
-    child = one.host.start("-verbose=1", **one.found)
-    try:
-        deadline = time.monotonic() + 30
-        while not any(each.name == call for each in one.host.record_so_far()):
-            assert time.monotonic() < deadline, f"{call} was never called"
-            assert child.poll() is None
-            time.sleep(0.05)
-        time.sleep(0.2)
-        assert child.poll() is None, "the program ended although the driver hangs"
-    finally:
-        child.kill()
-        out, _ = child.communicate(timeout=30)
-    lines = [line for line in out.decode().splitlines() if not line.startswith("#")]
-    last = {"clBuildProgram": "clgpu[0].CLBandwidth=", "clEnqueueCopyBuffer": "clgpu[0].CUDASupp",
-            "clGetDeviceInfo": "NumCLGPUs=1"}[call]
-    assert lines[-1].startswith(last)
 
 
 def use_vendor(host, name, **variables):

@@ -422,11 +422,12 @@ EGLAPI EGLBoolean EGLAPIENTRY eglChooseConfig(EGLDisplay handle, const EGLint* a
                                               EGLConfig* configs, EGLint size, EGLint* count)
 {
     const Call call("eglChooseConfig", DeviceOfDisplay(handle),
-                    {DisplayArgument(handle), AttributesArgument(attributes), Number(size)});
+                    {DisplayArgument(handle), AttributesArgument(attributes), Number(size)},
+                    Gives::Number);
     if (call.Over()) {
-        // `return 0` finds no configuration.
+        // `return N` claims N configurations and gives none.
         if (call.effect.returns && count != nullptr) {
-            *count = 0;
+            *count = static_cast<EGLint>(*call.effect.returns);
         }
         return call.effect.error ? EGL_FALSE : EGL_TRUE;
     }

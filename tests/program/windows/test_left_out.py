@@ -20,6 +20,7 @@ LEFT_OUT = {
     "program/test_adapters": "adapter trees are folders of the Linux kernel",
     "program/test_bad_drivers": "the scripted OpenGL driver is an EGL library",
     "program/test_failing_gpu": "the scripted OpenGL driver is an EGL library",
+    "program/test_fault_sweep": "the scripted OpenGL driver is an EGL library",
     "program/test_last_line": "the scripted OpenGL driver is an EGL library",
     "program/test_opengl_peers": "the peer asks the driver through EGL",
     "unit/gpu": "how Linux tells of its adapters",

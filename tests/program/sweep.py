@@ -1,0 +1,150 @@
+"""Runs with one fault in one driver call, for every call of a full run: bare, and under assay-host."""
+
+import contextlib
+import os
+import re
+import threading
+import time
+from collections import Counter
+from dataclasses import dataclass, field
+
+from calls import RECORD_HERE, FullMachine, PREFIX, calls_of, without_calls
+from faults import FAULTS, Fault, library_of
+from harness import PROGRAM_AT_ROOT, Call, Run
+from hosting import HOST, Hosted, Watched
+
+WORKERS = max(2, os.cpu_count() or 1)
+# Far beyond what the way to any call takes; a child that hangs under assay-host costs that long.
+TIMEOUT = 20
+# For what must happen, on however busy a machine.
+DEADLINE = 200
+# Of a sample, one pair in so many of an entry point and a fault.
+ONE_IN = 4
+
+DURATION = re.compile(r"duration=\S+")
+
+
+@dataclass
+class Pair:
+    """A call of the undisturbed run, and a fault of it."""
+
+    call: Call
+    fault: Fault
+    before: list = field(repr=False)  # the lines that are printed by then
+    by_loader: bool  # the OpenCL loader made the call, and trusts the answer
+
+    @property
+    def name(self):
+        fault = re.sub(r"\W+", "-", self.fault.name)
+        return f"{library_of(self.call.name)}-{self.call.number}-{fault}"
+
+    def __str__(self):
+        return f"{self.fault.name} in call {self.call.number}, {self.call.name}"
+
+
+def normal(lines):
+    """Lines without what differs from run to run."""
+    return [DURATION.sub("duration=", PREFIX.sub("# ", line)) for line in lines]
+
+
+def sample(pairs, shift):
+    """Some of a fault's pairs: of each entry point or of one in ONE_IN of them, by the fault's number,
+    always the same one of its calls."""
+    by_name = {}
+    for pair in pairs:
+        by_name.setdefault(pair.call.name, []).append(pair)
+    step = ONE_IN if len(by_name) > 2 * ONE_IN else 1
+    return [of_name[(7 * shift + index) % len(of_name)]
+            for index, of_name in enumerate(by_name.values()) if (index + shift) % step == 0]
+
+
+class Sweep:
+    """The undisturbed run, and what can be done to it. Its runs may be made by several threads."""
+
+    def __init__(self, folder):
+        self.folder = folder
+        self.machine = FullMachine(folder)
+        plain = self.machine.run("plain")
+        assert (plain.status, plain.errors) == (0, [])
+        self.whole = normal(without_calls(plain.lines))
+        self.calls = calls_of(plain.lines)
+        self._starting = threading.Semaphore(WORKERS)
+
+    def pairs(self, fault, all_of_them):
+        """The fault's pairs, and how many calls it makes no sense for, by reason."""
+        found, left_out = [], Counter()
+        # What is asked before the program's own first question comes from the loader.
+        first = next(made.call.number for made in self.calls if made.call.name == "clGetDeviceIDs")
+        for made in self.calls:
+            reason = fault.why_not(made.call)
+            by_loader = library_of(made.call.name) == "cl" and made.call.number < first
+            if reason:
+                left_out[reason] += 1
+            else:
+                found.append(Pair(made.call, fault, self.whole[:made.printed], by_loader))
+        shift = list(FAULTS).index(fault.name)
+        return (found if all_of_them else sample(found, shift)), left_out
+
+    def _watch(self, pair, way, *arguments, program, record, out, err):
+        opencl = library_of(pair.call.name) == "cl"
+        rules = pair.fault.rules(pair.call)
+        gl_lines, cl_lines = ("", rules) if opencl else (rules, "")
+        host, found = self.machine.host(f"{pair.name}-{way}", gl_lines=record["gl"] + gl_lines,
+                                        cl_lines=record["cl"] + cl_lines)
+        return Watched(*arguments, program=program, environment=host.environment(**found),
+                       stdout=out, stderr=err)
+
+    def _wait_until_called(self, pair, record, process):
+        """Waits until the call stands last in the record, which is the fault's begin."""
+        deadline = time.monotonic() + DEADLINE
+        start = f"{pair.call.number} ".encode()
+        while True:
+            lines = record.read_bytes().splitlines() if record.exists() else []
+            if lines and lines[-1].startswith(start) and pair.call.name.encode() in lines[-1]:
+                return
+            assert process.poll() is None, "the program ended although the driver hangs"
+            assert time.monotonic() < deadline, "the call isn't made"
+            time.sleep(0.01)
+
+    def bare(self, pair):
+        """The program by itself, with its calls between its lines."""
+        files = [self.folder / f"{pair.name}-{stream}" for stream in ("out", "err")]
+        with open(files[0], "ab") as out, open(files[1], "ab") as err, self._watch(
+                pair, "bare", "-verbose=1", program=PROGRAM_AT_ROOT, out=out, err=err,
+                record={"gl": RECORD_HERE, "cl": RECORD_HERE}) as watched:
+            if pair.fault.ends == "hang":
+                self._wait_until_called(pair, files[0], watched.process)
+                watched.process.kill()
+            watched.wait(DEADLINE)
+            if pair.fault.leaves:
+                # Nobody else does.
+                assert watched.end_what_is_left() == pair.fault.leaves
+        run = Run(watched.process.returncode, *(file.read_bytes() for file in files))
+        for file in files:
+            file.unlink()
+        return run
+
+    def hosted(self, pair):
+        """The same under assay-host."""
+        record = {library: self.folder / f"{pair.name}-{library}-record"
+                  for library in ("gl", "cl")}
+        files = [self.folder / f"{pair.name}-host-{stream}" for stream in ("out", "err")]
+        hangs = pair.fault.ends == "hang"
+        with contextlib.ExitStack() as stack:
+            out, err = (stack.enter_context(open(file, "wb")) for file in files)
+            # As many as there are cores on their way to the call, however many wait there.
+            with self._starting:
+                watched = stack.enter_context(self._watch(
+                    pair, "hosted", "run", "--assay", str(PROGRAM_AT_ROOT), "--format", "json",
+                    "--timeout", str(TIMEOUT if hangs else DEADLINE), "--", "-verbose=1",
+                    program=HOST, out=out, err=err,
+                    record={library: f"record {file}\n" for library, file in record.items()}))
+                if hangs:
+                    library = "cl" if library_of(pair.call.name) == "cl" else "gl"
+                    self._wait_until_called(pair, record[library], watched.process)
+            watched.wait(DEADLINE + TIMEOUT)
+        run = Hosted(watched.process.returncode, *(file.read_bytes() for file in files),
+                     seconds=time.monotonic() - watched.start, peak_kib=watched.peak_kib)
+        for file in [*files, *record.values()]:
+            file.unlink(missing_ok=True)
+        return run

@@ -1,0 +1,192 @@
+"""Every OpenGL, EGL and OpenCL call of a full run, with every fault that a driver can have there, bare
+and under assay-host. By ASSAY_LONG_TESTS=1 that is each call; else a sample in which each fault and
+each entry point occurs.
+
+A fault that ends the run: the output is that of an undisturbed run up to that call, the documented
+table names the call behind the last line, and the end is the fault's own; for assay-host that is the
+verdict, the reason and the status.
+
+A fault behind which the run goes on: the output is that of an undisturbed run up to that call; behind it
+no key comes that isn't due, none out of order, and no value of another form; a text is a beginning of
+the given one; the report is whole, or standard error says why not; the status agrees with standard
+error. The documented table names each further call too. Under assay-host the report and the exit
+status are the same as bare.
+
+No process of a run is left, whatever happens."""
+
+import ctypes.util
+import json
+import os
+import re
+import traceback
+from concurrent.futures import ThreadPoolExecutor
+
+import pytest
+
+from calls import LastLines, PREFIX, calls_of, without_calls
+from clmodel import cl_values_of
+from faults import FAULTS, GIVES
+from harness import STAMP, Run, ended_by, split_lines, text_of
+from hosting import STATUSES, report_bytes
+from model import check, predict
+from sweep import WORKERS, Sweep, normal
+
+pytestmark = pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
+                                reason="this machine has no OpenCL loader library")
+
+ALL = bool(os.environ.get("ASSAY_LONG_TESTS"))
+# Runs that hang wait and don't compute.
+HANGING = 64
+
+# What assay-host keeps of a line, and how many lines.
+LINE_BYTES = 65536
+LINES = 65536
+# What two runs must agree on: the prefix of a log line may differ a little in its length.
+COMPARED = LINE_BYTES - 100
+
+UNKNOWN = '"?"'
+
+FORMS = {"text": r'".*"', "list": r"\[-?\d+\]", "number": r"-?(\d+(\.\d+)?(e[+-]\d+)?|inf|nan)"}
+ENDS = {"SIGSEGV": "crashed", "SIGABRT": "crashed", "hang": "hung"}
+SIGNALS = {"SIGSEGV": "signal 11 ", "SIGABRT": "signal 6 ", "hang": "signal 9 "}
+
+
+@pytest.fixture(scope="module")
+def sweep(tmp_path_factory):
+    return Sweep(tmp_path_factory.mktemp("sweep"))
+
+
+@pytest.fixture(scope="module")
+def table():
+    return LastLines()
+
+
+def values(lines):
+    return [tuple(line.split("=", 1)) for line in lines if "=" in line and line[0] != "#"]
+
+
+def form(value):
+    return next((name for name, pattern in FORMS.items() if re.fullmatch(pattern, value, re.DOTALL)),
+                "none")
+
+
+def is_part(part, whole):
+    """Whether the items stand in the other list, in that order."""
+    rest = iter(whole)
+    return all(each in rest for each in part)
+
+
+def check_end(sweep, table, pair, run):
+    """A run that the fault ended."""
+    ends = pair.fault.ends
+    if ends == "_exit":
+        assert run.status == 0
+    else:
+        assert ended_by(run, "SIGKILL" if ends == "hang" else ends)
+    calls = calls_of(run.lines)
+    assert (calls[-1].call.number, calls[-1].call.name) == (pair.call.number, pair.call.name)
+    table.check(pair.call.name, calls[-1].last)
+    assert normal(without_calls(run.lines)) == pair.before
+
+
+def check_going_on(sweep, table, pair, run):
+    """A run that came to an end of its own."""
+    assert run.status in (0, 2)
+    lines = normal(without_calls(run.lines))
+    own = lines[:len(pair.before)] + lines[len(pair.before) + len(pair.fault.prints):]
+    assert lines[:len(pair.before)] == pair.before
+    assert lines[len(pair.before):][:len(pair.fault.prints)] == pair.fault.prints
+    for made in calls_of(run.lines):
+        if made.last not in pair.fault.prints:
+            table.check(made.call.name, made.last)
+
+    due = dict(values(sweep.whole))
+    found = values(own)
+    assert is_part([key for key, _ in found], list(due))
+    for key, value in found:
+        assert form(value) == form(due[key]), key
+        if pair.fault.text is not None and form(value) == "text" and value not in (due[key], UNKNOWN):
+            assert pair.fault.text.startswith(value[1:-1]), key
+    if run.status == 2:
+        assert run.errors != []
+    else:
+        assert own[-1] == 'assayEnd="STAMP"'
+    if pair.fault.prints or pair.fault.leaves:
+        assert (run.status, run.errors, own) == (0, [], sweep.whole)
+
+
+def check_hosted(table, pair, bare, hosted):
+    """assay-host tells of the run what the run bare was."""
+    # What the schema says of it, others test: it would take most of the time.
+    document = json.loads(hosted.out)
+    outcome = document["outcome"]
+    lines = without_calls(bare.lines)
+    wanted = [line[:COMPARED] for line in normal(lines)]
+    kept = STAMP.sub(r'\1="STAMP"', text_of(report_bytes(document)))
+    assert [line[:COMPARED] for line in normal(split_lines(kept))] == wanted[:LINES]
+    assert not outcome["leftBehind"]
+    assert (outcome["lostOutputBytes"] > 0) == (
+        len(lines) > LINES or any(len(line) > LINE_BYTES for line in lines))
+
+    ends = next((name for name in SIGNALS if name != "hang" and ended_by(bare, name)), None)
+    ends = pair.fault.ends if pair.fault.ends in ENDS else ends
+    whole = 'assayEnd="STAMP"' in wanted[:LINES]
+    if ends is None:
+        assert outcome["exitStatus"] == bare.status
+        assert outcome["verdict"] == ("complete" if whole and bare.status == 0 else "failed-tests")
+        if not pair.fault.prints:
+            assert outcome["errorLines"] == bare.errors
+    else:
+        assert outcome["verdict"] == ENDS[ends]
+        assert outcome["termination"].startswith(SIGNALS[ends])
+    if ends is not None or pair.fault.ends == "_exit":
+        last = outcome["lastLogLine"] or outcome["lastReportLine"]
+        table.check(pair.call.name, PREFIX.sub("", last))
+    assert document["report"]["whole"] == whole
+    assert hosted.err == b""
+    assert hosted.status == STATUSES[outcome["verdict"]]
+
+
+def run_pair(sweep, table, pair):
+    """None if all is well, else what isn't."""
+    try:
+        bare = sweep.bare(pair)
+        if pair.fault.ends is not None:
+            check_end(sweep, table, pair, bare)
+        elif pair.by_loader and ended_by(bare, "SIGSEGV", "SIGABRT"):
+            assert normal(without_calls(bare.lines)) == pair.before
+        else:
+            check_going_on(sweep, table, pair, bare)
+        check_hosted(table, pair, bare, sweep.hosted(pair))
+    except Exception as error:  # the other pairs go on
+        place = traceback.extract_tb(error.__traceback__)[-1]
+        return f"{pair}: {place.name}:{place.lineno}: {place.line}: {str(error)[:500]}"
+    return None
+
+
+def test_the_undisturbed_run(sweep):
+    """What all others are compared with is what such a machine must report."""
+    machine = sweep.machine
+    check(Run(0, "".join(f"{line}\n" for line in sweep.whole if line[0] != "#").encode(), b""),
+          predict([machine.gpu], opencl=cl_values_of(machine.opencl)))
+
+
+@pytest.mark.parametrize("fault", FAULTS.values(), ids=FAULTS)
+def test_fault_in_every_call(sweep, table, fault, closing_lines):
+    pairs, left_out = sweep.pairs(fault, ALL)
+    with ThreadPoolExecutor(HANGING if fault.ends == "hang" else WORKERS) as workers:
+        failures = [failure for failure in workers.map(
+            lambda pair: run_pair(sweep, table, pair), pairs) if failure]
+    told = ", ".join(f"{count} calls: {reason}" for reason, count in left_out.items())
+    closing_lines.append(
+        f"fault sweep: {fault.name}: {len(pairs)} of {len(sweep.calls)} calls, bare and under "
+        f"assay-host, {len(failures)} wrong" + (f"; makes no sense for {told}" if told else ""))
+    assert not failures, "\n".join(failures)
+
+
+def test_the_sample_has_every_fault_and_every_entry_point(sweep):
+    names = {made.call.name for made in sweep.calls}
+    sampled = [pair for fault in FAULTS.values() for pair in sweep.pairs(fault, False)[0]]
+    assert {pair.call.name for pair in sampled} == names
+    assert {pair.fault.name for pair in sampled} == set(FAULTS)
+    assert set().union(*GIVES.values()) == names
