@@ -10,6 +10,7 @@
 #include <stdexcept>
 #include <thread>
 
+#include "TestChild.h"
 #include "pmutil/Reader.h"
 
 namespace assay_host {

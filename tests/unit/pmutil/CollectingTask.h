@@ -10,6 +10,7 @@
 #include <gtest/gtest.h>
 #include <string>
 
+#include "TestChild.h"
 #include "Waits.h"
 #include "pmutil/ConsoleAppLauncher.h"
 #include "pmutil/OutputTask.h"

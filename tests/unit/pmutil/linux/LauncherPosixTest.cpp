@@ -16,6 +16,7 @@
 #include "../OpenThings.h"
 #include "../Throws.h"
 #include "../Waits.h"
+#include "TestChild.h"
 #include "pmutil/PosixHandle.h"
 
 using namespace pmutil;

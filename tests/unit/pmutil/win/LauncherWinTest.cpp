@@ -11,6 +11,7 @@
 #include "../OpenThings.h"
 #include "../TempFolder.h"
 #include "../Throws.h"
+#include "TestChild.h"
 #include "pmutil/WinHandle.h"
 
 using namespace pmutil;
