@@ -36,9 +36,16 @@ std::FILE* OpenSharedAppend(const std::string& path);
 // afresh and the lost one never turns up behind it.
 void DiscardUnwritten(std::FILE* stream);
 
-// Keeps a crash of this process from raising a dialog or leaving a core dump, and a write to a pipe
-// whose reader has gone from ending it. A standard stream that is closed stays one that fails: no
-// file opened later takes its place. Call it first in main.
+// Makes the process independent of how it was started. Call it first in main, before any thread.
+// - A crash raises no dialog and leaves no core dump. On Linux a hard core limit of 0 is beyond an
+//   unprivileged process's reach: a crash reporter that core_pattern names still sees it then.
+// - A write to a pipe whose reader has gone, or beyond the file-size limit, fails and doesn't end
+//   the process; one to the terminal of another job succeeds and doesn't stop it.
+// - On Linux no signal is blocked, and those that tell of a crash or of a child's end aren't
+// ignored.
+//   Others keep what they were given: SIGHUP stays ignored under nohup, SIGXCPU ends the process at
+//   its CPU limit, SIGTTIN and SIGTSTP stop it as the user's shell means them to.
+// - A standard stream that is closed stays one that fails: no file opened later takes its place.
 void PrepareConsoleProcess();
 
 } // namespace pmutil

@@ -78,13 +78,47 @@ std::string GetNarrowDesktopFolder()
     return named.empty() ? home + "/Desktop" : named;
 }
 
+// A soft limit of 1 is the kernel's word for "no core dump", to a file or to the program that
+// core_pattern names, which is how desktops raise their crash dialogs. 0 keeps away files only.
+void PreventCoreDump()
+{
+    rlimit limit{};
+    if (getrlimit(RLIMIT_CORE, &limit) != 0)
+        return;
+    const rlimit none{1, std::max<rlim_t>(limit.rlim_max, 1)};
+    if (setrlimit(RLIMIT_CORE, &none) == 0)
+        return;
+    limit.rlim_cur = 0; // a hard limit of 0, which only a privileged process may raise
+    setrlimit(RLIMIT_CORE, &limit);
+}
+
+// What the process was started with comes from whoever started it, and survives exec.
+void PrepareSignals()
+{
+    // A write to a pipe without reader, beyond a size limit or to the terminal of another job must
+    // neither end nor stop the process: the first two fail, the last one succeeds.
+    for (const int number : {SIGPIPE, SIGXFSZ, SIGTTOU})
+        std::signal(number, SIG_IGN);
+    // Crashes must show as such, and drivers wait for the helpers that they start. A handler stays:
+    // it is a sanitizer's.
+    for (const int number : {SIGABRT, SIGBUS, SIGCHLD, SIGFPE, SIGILL, SIGSEGV, SIGSYS, SIGTRAP}) {
+        struct sigaction action = {};
+        if (sigaction(number, nullptr, &action) == 0 && action.sa_handler == SIG_IGN)
+            std::signal(number, SIG_DFL);
+    }
+    sigset_t none;
+    sigemptyset(&none);
+    pthread_sigmask(SIG_SETMASK, &none, nullptr);
+}
+
 // A file that a driver opens would get the number of a closed standard stream, and with it the
-// report. What takes the place fails every read and write, as the closed stream did.
+// report. What takes the place exists everywhere and fails every read and write with EBADF, as the
+// closed stream did.
 void OccupyClosedStreams()
 {
     for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) {
         if (fcntl(stream, F_GETFD) < 0 && errno == EBADF)
-            open("/dev/null", stream == STDIN_FILENO ? O_WRONLY : O_RDONLY);
+            open("/", O_PATH);
     }
 }
 
@@ -156,12 +190,8 @@ void DiscardUnwritten(std::FILE* stream)
 
 void PrepareConsoleProcess()
 {
-    rlimit limit{};
-    if (getrlimit(RLIMIT_CORE, &limit) == 0) {
-        limit.rlim_cur = 0;
-        setrlimit(RLIMIT_CORE, &limit);
-    }
-    std::signal(SIGPIPE, SIG_IGN);
+    PreventCoreDump();
+    PrepareSignals();
     OccupyClosedStreams();
 }
 

@@ -15,6 +15,7 @@
 #include <boost/thread/thread.hpp>
 #include <gmock/gmock.h>
 
+#include "pmutil/FreshProcess.h"
 #include "pmutil/LogSinks.h"
 #include "pmutil/TempFolder.h"
 #include "pmutil/Threads.h"
@@ -105,20 +106,116 @@ TEST_F(FifoTest, LogLineThatIsLostNeverTurnsUpAndALaterOneDoes)
     EXPECT_THAT(text, EndsWith("] later\n"));
 }
 
-TEST(PrepareConsoleProcessDeathTest, LeavesNoCoreDumpAndSurvivesAClosedPipe)
+// Each runs in a process of its own: what is prepared is never undone.
+
+rlimit GetLimit(__rlimit_resource resource)
+{
+    rlimit limit{};
+    getrlimit(resource, &limit);
+    return limit;
+}
+
+bool IsIgnored(int number)
+{
+    struct sigaction action = {};
+    return sigaction(number, nullptr, &action) == 0 && action.sa_handler == SIG_IGN;
+}
+
+void BlockAllSignals()
+{
+    sigset_t all;
+    sigfillset(&all);
+    pthread_sigmask(SIG_BLOCK, &all, nullptr);
+}
+
+TEST(PrepareConsoleProcessDeathTest, LeavesNoCoreDump)
+{
+    ExpectInFreshProcess([] {
+        const rlim_t hardBefore = GetLimit(RLIMIT_CORE).rlim_max;
+        PrepareConsoleProcess();
+        REQUIRE_SO(GetLimit(RLIMIT_CORE).rlim_cur == 1);
+        REQUIRE_SO(GetLimit(RLIMIT_CORE).rlim_max >= hardBefore);
+    });
+}
+
+TEST(PrepareConsoleProcessDeathTest, LeavesAHardCoreLimitOfZeroThatItMayNotRaise)
+{
+    ExpectInFreshProcess([] {
+        constexpr uid_t kNobody = 65534;
+        const rlimit none{0, 0};
+        REQUIRE_SO(setrlimit(RLIMIT_CORE, &none) == 0);
+        REQUIRE_SO(geteuid() != 0 || seteuid(kNobody) == 0);
+        PrepareConsoleProcess();
+        REQUIRE_SO(GetLimit(RLIMIT_CORE).rlim_cur == 0);
+        REQUIRE_SO(GetLimit(RLIMIT_CORE).rlim_max == 0);
+    });
+}
+
+TEST(PrepareConsoleProcessDeathTest, LetsAWriteToAClosedPipeFail)
+{
+    ExpectInFreshProcess([] {
+        PrepareConsoleProcess();
+        int ends[2];
+        REQUIRE_SO(pipe(ends) == 0 && close(ends[0]) == 0);
+        REQUIRE_SO(write(ends[1], "x", 1) == -1 && errno == EPIPE);
+    });
+}
+
+TEST(PrepareConsoleProcessDeathTest, LetsAWriteBeyondTheFileSizeLimitFail)
+{
+    ExpectInFreshProcess([] {
+        PrepareConsoleProcess();
+        const int file = fileno(std::tmpfile());
+        const rlimit one{1, GetLimit(RLIMIT_FSIZE).rlim_max};
+        REQUIRE_SO(setrlimit(RLIMIT_FSIZE, &one) == 0);
+        REQUIRE_SO(write(file, "ab", 2) == 1);
+        REQUIRE_SO(write(file, "b", 1) == -1 && errno == EFBIG);
+    });
+}
+
+TEST(PrepareConsoleProcessDeathTest, UndoesInheritedSignalSettings)
+{
+    ExpectInFreshProcess([] {
+        for (const int number : {SIGABRT, SIGCHLD, SIGHUP, SIGSEGV})
+            std::signal(number, SIG_IGN);
+        BlockAllSignals();
+        PrepareConsoleProcess();
+        sigset_t blocked;
+        pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
+        REQUIRE_SO(sigisemptyset(&blocked) == 1);
+        for (const int number : {SIGABRT, SIGCHLD, SIGSEGV})
+            REQUIRE_SO(!IsIgnored(number));
+        for (const int number : {SIGHUP, SIGPIPE, SIGTTOU, SIGXFSZ})
+            REQUIRE_SO(IsIgnored(number));
+    });
+}
+
+TEST(PrepareConsoleProcessDeathTest, LetsACrashSignalThatWasIgnoredEndTheProcess)
 {
     testing::GTEST_FLAG(death_test_style) = "threadsafe";
-    EXPECT_EXIT(
-        {
-            PrepareConsoleProcess();
-            rlimit limit{};
-            const bool noCore = getrlimit(RLIMIT_CORE, &limit) == 0 && limit.rlim_cur == 0;
-            int ends[2];
-            const bool piped = pipe(ends) == 0 && close(ends[0]) == 0;
-            const bool refused = write(ends[1], "x", 1) == -1 && errno == EPIPE;
-            std::_Exit(noCore && piped && refused ? 0 : 1);
-        },
-        testing::ExitedWithCode(0), "^$");
+    const auto crash = [] {
+        std::signal(SIGBUS, SIG_IGN);
+        BlockAllSignals();
+        PrepareConsoleProcess();
+        kill(getpid(), SIGBUS);
+        std::_Exit(0);
+    };
+    EXPECT_EXIT(crash(), testing::KilledBySignal(SIGBUS), "^$");
+}
+
+TEST(PrepareConsoleProcessDeathTest, OccupiesClosedStreamsWithWhatFails)
+{
+    ExpectInFreshProcess([] {
+        for (const int stream : {STDIN_FILENO, STDOUT_FILENO})
+            close(stream);
+        PrepareConsoleProcess();
+        REQUIRE_SO(open("/dev/null", O_RDWR | O_CLOEXEC) > STDERR_FILENO);
+        char byte = 0;
+        for (const int stream : {STDIN_FILENO, STDOUT_FILENO}) {
+            REQUIRE_SO(read(stream, &byte, 1) == -1 && errno == EBADF);
+            REQUIRE_SO(write(stream, &byte, 1) == -1 && errno == EBADF);
+        }
+    });
 }
 
 TEST(SystemTest, ClockIsUniversalTimeSince1970)
