@@ -2,6 +2,7 @@
 // ASSAY_TEST_ROOT: the only difference from the real one, which takes nothing but its arguments.
 #include <cstdlib>
 
+#include "Output.h"
 #include "PixmereAssay.h"
 #include "pmutil/System.h"
 #include "qgf/AdapterName.h"
@@ -9,6 +10,7 @@
 int main(int argc, char** argv)
 {
     pmutil::PrepareConsoleProcess();
+    assay::PrepareOutput();
     if (const char* root = std::getenv("ASSAY_TEST_ROOT"))
         QGF::SetSystemRoot(root);
     assay::PixmereAssay::Arguments arguments(argv, argv + argc);

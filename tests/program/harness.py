@@ -180,11 +180,11 @@ class Host:
         return Run(done.returncode, done.stdout or b"", done.stderr or b"")
 
     def start(self, *arguments, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
-              stderr=subprocess.PIPE, **machine):
-        """Starts the program and leaves it to the caller."""
+              stderr=subprocess.PIPE, before=None, **machine):
+        """Starts the program and leaves it to the caller. `before` is called in the child."""
         program = PROGRAM if machine.get("root") is None else PROGRAM_AT_ROOT
         return subprocess.Popen([program, *arguments], stdin=stdin, stdout=stdout, stderr=stderr,
-                                env=self.environment(**machine))
+                                env=self.environment(**machine), preexec_fn=before)
 
 
 def ended_by(run, *signals):

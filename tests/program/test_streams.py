@@ -1,12 +1,20 @@
 """Standard streams that fail: the run goes on, and its status is what the tests earned."""
 
+import errno
 import fcntl
 import os
+import pty
+import resource
+import signal
+import subprocess
+import sys
+import tempfile
 import time
+from pathlib import Path
 
 import pytest
 
-from harness import Run
+from harness import PROGRAM, Run, ended_by
 from model import Gpu, check, predict
 
 
@@ -108,6 +116,80 @@ def test_output_that_fails_for_a_while(one):
     assert run.status == 0
 
 
+STOP = "at 1 glGetString(GL_RENDERER) signal 19\n"
+
+
+def wait_until_stopped(child):
+    """Waits for the driver to stop the process, as STOP has it."""
+    state = os.waitid(os.P_PID, child.pid, os.WEXITED | os.WSTOPPED | os.WNOWAIT)
+    assert state.si_code == os.CLD_STOPPED
+
+
+def rest_of(child):
+    """Lets a stopped child go on, and gives what it then prints on standard error and its status."""
+    child.send_signal(signal.SIGCONT)
+    errors = child.stderr.read()
+    child.stderr.close()
+    return errors, child.wait(30)
+
+
+@pytest.mark.parametrize("options", [[], ["-verbose=1"]])
+def test_line_that_a_pipe_takes_in_part(one, options):
+    """The next line stands on a line of its own."""
+    capacity = 4096
+    one.gpu.vendor = "v" * (2 * capacity)
+    reader, writer = os.pipe()
+    assert fcntl.fcntl(writer, fcntl.F_SETPIPE_SZ, capacity) == capacity
+    os.set_blocking(writer, False)
+    child = one.start(*options, script=one.gpu.script() + STOP, stdout=writer)
+    os.close(writer)
+    wait_until_stopped(child)
+    out = os.read(reader, capacity)
+    errors, status = rest_of(child)
+    with open(reader, "rb") as rest:
+        later = rest.read()
+    assert len(out) == capacity
+    assert later.startswith(b"\n")
+    whole = predict([one.gpu]).lines
+    facts = [line for line in Run(0, out + later, b"").lines if not line.startswith("#")]
+    cut = next(index for index, line in enumerate(whole) if ".GLVendor=" in line)
+    told = facts.index(next(line for line in facts if ".GLRenderer=" in line))
+    assert facts[:cut] == whole[:cut]
+    if options:  # a log line or a report line, whichever came when the pipe was almost full
+        assert told <= cut + 1
+    else:
+        assert told == cut + 1
+        assert whole[cut].startswith(facts[cut])
+    assert facts[told:] == whole[cut + 1:]
+    assert Run(status, b"", errors).errors == [LOST]
+    assert status == 0
+
+
+@pytest.mark.parametrize("options", [[], ["-verbose=1"]])
+def test_line_that_a_full_disk_takes_in_part(one, options):
+    """Wherever the cut is, at a line's first byte or its last, the next line stands on its own."""
+    whole = predict([one.gpu]).lines
+    first = len(Run(0, one.run(*options, **one.found).out, b"").out.split(b"\n")[0])
+    told = next(index for index, line in enumerate(whole) if ".GLRenderer=" in line)
+    for limit in [*range(first - 1, first + 4), *range(120, 340, 23)]:
+        with tempfile.TemporaryFile() as file:
+            child = one.start(*options, script=one.gpu.script() + STOP, stdout=file,
+                              before=lambda: resource.setrlimit(
+                                  resource.RLIMIT_FSIZE, (limit, resource.RLIM_INFINITY)))
+            wait_until_stopped(child)
+            resource.prlimit(child.pid, resource.RLIMIT_FSIZE,
+                             (resource.RLIM_INFINITY, resource.RLIM_INFINITY))
+            errors, status = rest_of(child)
+            file.seek(0)
+            out = file.read()
+        lines = Run(status, out, errors).lines
+        facts = [line for line in lines if line and not line.startswith("#")]
+        assert "" not in lines, limit
+        assert facts[-len(whole[told:]):] == whole[told:], limit
+        assert (out[limit - 1:limit] == b"\n") != (out[limit:limit + 1] == b"\n"), limit
+        assert status == 0
+
+
 def closed(*descriptors):
     def close():
         for descriptor in descriptors:
@@ -175,3 +257,82 @@ def test_every_line_is_flushed_on_its_own(one):
         child.kill()
         child.communicate()
     assert child.returncode == -9
+
+
+def test_file_size_limit(one):
+    """What fits is there to the byte; each line beyond it is told as lost."""
+    limit = 500
+    whole = b"".join(line.encode() + b"\n" for line in predict([one.gpu]).lines)
+    with tempfile.TemporaryFile() as file:
+        run = one.run("-exit=7", stdout=file, **one.found, before=lambda: resource.setrlimit(
+            resource.RLIMIT_FSIZE, (limit, resource.RLIM_INFINITY)))
+        file.seek(0)
+        out = file.read()
+    assert len(out) == limit
+    stamped = Run(run.status, out, run.err).report.encode()
+    assert whole.startswith(stamped)
+    assert run.errors == [LOST] * whole[len(stamped):].count(b"\n")
+    assert run.status == 7
+
+
+# Runs its arguments as a background job of a terminal that stops such jobs when they write to it.
+BACKGROUND = """
+import fcntl, os, subprocess, sys, termios
+fcntl.ioctl(0, termios.TIOCSCTTY, 0)
+settings = termios.tcgetattr(0)
+settings[1] &= ~termios.OPOST
+settings[3] |= termios.TOSTOP
+termios.tcsetattr(0, termios.TCSANOW, settings)
+assert os.tcgetpgrp(0) == os.getpgrp()
+job = subprocess.Popen(sys.argv[1:], stderr=subprocess.PIPE, preexec_fn=os.setpgrp)
+state = os.waitid(os.P_PID, job.pid, os.WEXITED | os.WSTOPPED | os.WNOWAIT)
+if state.si_code == os.CLD_STOPPED:
+    job.kill()
+    sys.exit("stopped by signal %d" % state.si_status)
+sys.stderr.buffer.write(job.stderr.read())
+sys.exit(job.wait())
+"""
+
+
+def test_background_of_a_terminal(one):
+    """A terminal that stops background jobs that write to it doesn't stop this one."""
+    main, terminal = pty.openpty()
+    leader = subprocess.Popen([sys.executable, "-c", BACKGROUND, PROGRAM, "-exit=7"],
+                              stdin=terminal, stdout=terminal, stderr=subprocess.PIPE,
+                              env=one.environment(**one.found), start_new_session=True)
+    os.close(terminal)
+    out = b""
+    try:
+        while piece := os.read(main, 4096):
+            out += piece
+    except OSError as error:  # the terminal's last user has gone
+        assert error.errno == errno.EIO
+    errors = leader.communicate(timeout=30)[1]
+    os.close(main)
+    check(Run(leader.returncode, out, errors), predict([one.gpu], exit_status=7))
+
+
+def test_signals_blocked_and_ignored_on_entry(one):
+    """A driver's raised signal is a crash, whoever ignored it before."""
+    def ignore():
+        signal.signal(signal.SIGBUS, signal.SIG_IGN)
+        signal.pthread_sigmask(signal.SIG_BLOCK, signal.valid_signals())
+
+    script = one.gpu.script() + "at glGetString(GL_VENDOR) signal 7\n"
+    run = one.run(script=script, before=ignore)
+    assert ended_by(run, "SIGBUS")
+    whole = predict([one.gpu]).lines
+    assert run.lines == whole[:len(run.lines)]
+
+
+def test_core_limit(one):
+    """The limit that the kernel takes for "no dump", also to a crash reporter."""
+    child = one.start(script=one.gpu.script() + "at glGetString(GL_VENDOR) hang\n")
+    try:
+        assert child.stdout.readline().startswith(b"assayStart=")
+        limits = Path(f"/proc/{child.pid}/limits").read_text(encoding="ascii")
+    finally:
+        child.kill()
+        child.communicate()
+    line = next(line for line in limits.splitlines() if line.startswith("Max core file size"))
+    assert line.split()[4] == "1"

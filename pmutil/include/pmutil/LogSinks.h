@@ -32,12 +32,19 @@ private:
     std::FILE* fFile;
 };
 
-// Writes to standard output in the form of a comment of the report: each line begins with "# ".
+// Writes to standard output in the form of a comment of the report: each line begins with "# ". A
+// line goes out in one piece when it is flushed; one that standard output takes in part only leaves
+// the next line, of the log or of the report, on a line of its own (PutLine).
 class AssayLogger : public PMStdioLogger {
 public:
     AssayLogger();
     ~AssayLogger() override;
     std::string GetPrefix(const char* file, int line) override;
+    void Flush() override;
+    void Write(const char* data, std::size_t size) override;
+
+private:
+    std::string fLine;
 };
 
 // Writes to a file in the user's desktop folder, "pmlog.txt" for a null name; the bare name in the

@@ -1,12 +1,14 @@
 #include "pmutil/LogSinks.h"
 
 #include <set>
+#include <utility>
 
 #include <boost/filesystem/operations.hpp>
 #include <boost/thread/lock_guard.hpp>
 
 #include "all/LogTimer.h"
 #include "all/PathCodecvt.h"
+#include "pmutil/PutLine.h"
 #include "pmutil/System.h"
 
 namespace pmutil {
@@ -101,6 +103,23 @@ AssayLogger::~AssayLogger() = default;
 std::string AssayLogger::GetPrefix(const char* file, int line)
 {
     return "# " + PMStdioLogger::GetPrefix(file, line);
+}
+
+void AssayLogger::Flush()
+{
+    const LogTimer timer;
+    const std::string line = std::exchange(fLine, {});
+    const bool isWhole = line.empty() || PutLine(stdout, line, [](const std::string& text) {
+                             return std::fwrite(text.data(), 1, text.size(), stdout);
+                         });
+    if (isWhole)
+        PMStdioLogger::Flush();
+}
+
+void AssayLogger::Write(const char* data, std::size_t size)
+{
+    const LogTimer timer;
+    fLine.append(data, size);
 }
 
 PMFileLogger::PMFileLogger(const char* name) : PMFileLogger(GetDesktopFolder(), name) {}

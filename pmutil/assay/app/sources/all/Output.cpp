@@ -1,17 +1,26 @@
 #include "Output.h"
 
-#include "pmutil/System.h"
+#include "pmutil/PutLine.h"
 
 namespace assay {
+
+void PrepareOutput()
+{
+    std::setvbuf(stdout, nullptr, _IONBF, 0);
+}
 
 bool WriteLine(std::ostream& out, std::FILE* file, const std::string& text) noexcept
 {
     try {
-        out << text << std::endl;
-        if (out)
+        std::streambuf& buffer = *out.rdbuf();
+        const bool isWhole = pmutil::PutLine(file, text + '\n', [&buffer](const std::string& line) {
+            return static_cast<std::size_t>(
+                buffer.sputn(line.data(), static_cast<std::streamsize>(line.size())));
+        });
+        if (isWhole && buffer.pubsync() == 0)
             return true;
-        out.clear();
-        pmutil::DiscardUnwritten(file);
+        if (isWhole)
+            pmutil::DiscardUnwritten(file); // it was buffered, and how much got out nobody knows
     } catch (...) {
         // The line is lost like any other that can't be written.
     }

@@ -1,3 +1,4 @@
+#include "Output.h"
 #include "PixmereAssay.h"
 #include "pmutil/System.h"
 
@@ -6,6 +7,7 @@ int main(int argc, char** argv)
     constexpr int kStatusEscaped = 4;
 
     pmutil::PrepareConsoleProcess();
+    assay::PrepareOutput();
     try {
         assay::PixmereAssay::Arguments arguments(argv, argv + argc);
         return assay::PixmereAssay::Instance().Run(arguments);
