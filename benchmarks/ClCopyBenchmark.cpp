@@ -30,7 +30,7 @@ public:
         fBuffer = Table().clCreateBuffer(context.handle(), flags, kBufferBytes, nullptr, &status);
         Require(status, "clCreateBuffer");
     }
-    ~Buffer() { Table().clReleaseMemObject(fBuffer); }
+    ~Buffer() { QGF::OCL::HandleTraits<cl_mem>::Release(fBuffer); }
     Buffer(const Buffer&) = delete;
     Buffer& operator=(const Buffer&) = delete;
 

@@ -283,6 +283,10 @@ def test_failing_call_costs_one_gpu_its_remaining_tests(machine, line, key, erro
     "at clReleaseMemObject error CL_INVALID_MEM_OBJECT",
     "at clReleaseCommandQueue error CL_INVALID_COMMAND_QUEUE",
     "at clReleaseContext error CL_INVALID_CONTEXT",
+    'at clReleaseEvent throw "x"',
+    'at clReleaseMemObject throw "x"',
+    'at clReleaseCommandQueue throw "x"',
+    "at clReleaseContext throw int 5",
 ])
 def test_failures_that_nobody_reports(one, line):
     check(one.run(extra=line + "\n"), one.predict())

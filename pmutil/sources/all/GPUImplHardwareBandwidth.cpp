@@ -86,10 +86,10 @@ double checkBandwidthCL(const QGF::OCL::Context& context, const QGF::OCL::Comman
     PM_LOG(gGPUAssay, kName << ": clFinish");
     table.clFinish(queue.handle());
     for (cl_event event : events)
-        table.clReleaseEvent(event);
+        QGF::OCL::HandleTraits<cl_event>::Release(event);
     PM_LOG(gGPUAssay, kName << ": releasing");
-    table.clReleaseMemObject(d_idata);
-    table.clReleaseMemObject(d_odata);
+    QGF::OCL::HandleTraits<cl_mem>::Release(d_idata);
+    QGF::OCL::HandleTraits<cl_mem>::Release(d_odata);
     PM_LOG(gGPUAssay, kName << ": result=" << maxBW);
     return maxBW;
 }

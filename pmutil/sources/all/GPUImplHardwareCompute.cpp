@@ -71,7 +71,7 @@ double MeasureCLCompute(const QGF::OCL::Context& context, const QGF::OCL::Comman
     PM_LOG(gGPUAssay, kName << ": clFinish");
     table.clFinish(queue.handle());
     // Program, kernel and event go with the process.
-    table.clReleaseMemObject(buffer);
+    QGF::OCL::HandleTraits<cl_mem>::Release(buffer);
     PM_LOG(gGPUAssay, kName << ": result=" << seconds);
     return seconds > 0.0 ? kScoreNumerator / seconds : 0.0;
 }

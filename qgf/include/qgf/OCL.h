@@ -41,7 +41,8 @@ private:
     FunctionTable fTable;
 };
 
-// Retains and releases one kind of OpenCL object; device and platform ids have nothing to release.
+// Releases one kind of OpenCL object; device and platform ids have nothing to release. Whatever the
+// driver makes of it is ignored: its status, and an exception that it throws.
 template <typename Handle>
 struct HandleTraits;
 template <>
@@ -59,6 +60,14 @@ struct HandleTraits<cl_context> {
 template <>
 struct HandleTraits<cl_command_queue> {
     static void Release(cl_command_queue queue) noexcept;
+};
+template <>
+struct HandleTraits<cl_mem> {
+    static void Release(cl_mem buffer) noexcept;
+};
+template <>
+struct HandleTraits<cl_event> {
+    static void Release(cl_event event) noexcept;
 };
 
 // A raw OpenCL handle in a C++ object.

@@ -298,6 +298,18 @@ TEST_F(CLMeasurementsTest, BandwidthReleasesEverythingButTheEventsOfEarlierBatch
     EXPECT_THAT(cl.calls, testing::Contains("clReleaseEvent(event 50)"));
 }
 
+TEST_F(CLMeasurementsTest, ExceptionsOutOfReleasesCostNothing)
+{
+    cl.throwing = {"clReleaseCommandQueue", "clReleaseContext", "clReleaseEvent",
+                   "clReleaseMemObject"};
+    cl.counters = [](int) { return std::pair<cl_ulong, cl_ulong>{0, 250000000}; };
+    EXPECT_EQ(impl.GetCLBandwidth(), 335544320.0 / 2.5);
+    EXPECT_EQ(impl.GetCLCompute(), 32.0);
+    EXPECT_EQ(CountCalls("clReleaseEvent"), 10);
+    EXPECT_EQ(CountCalls("clReleaseMemObject"), 3);
+    EXPECT_EQ(CountCalls("clReleaseContext"), 2);
+}
+
 TEST_F(CLMeasurementsTest, ASecondBandwidthMeasurementMeasuresAgain)
 {
     cl.counters = BatchesOf(1000000000);

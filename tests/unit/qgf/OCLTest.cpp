@@ -325,6 +325,24 @@ TEST_F(OCLTest, AQueueThatCantBeMadeIsAFailureAndReleasesTheContext)
                                       "clReleaseContext(context 1)"));
 }
 
+TEST_F(OCLTest, AnExceptionOutOfAReleaseIsSwallowed)
+{
+    cl.throwing = {"clReleaseCommandQueue", "clReleaseContext", "clReleaseEvent",
+                   "clReleaseMemObject"};
+    {
+        const QGF::OCL::ContextProperties properties(platform);
+        const QGF::OCL::Context context(properties, device, {});
+        const QGF::OCL::CommandQueue queue(context, device, false, true);
+        QGF::OCL::HandleTraits<cl_event>::Release(nullptr);
+        QGF::OCL::HandleTraits<cl_mem>::Release(nullptr);
+    }
+    EXPECT_THAT(cl.calls,
+                ElementsAre("clCreateContext(4228=11, device 101, null, null)",
+                            "clCreateCommandQueue(context 1, device 101, 2)",
+                            "clReleaseEvent(event 0)", "clReleaseMemObject(buffer 0)",
+                            "clReleaseCommandQueue(queue 1)", "clReleaseContext(context 1)"));
+}
+
 // A library that has every entry point but one.
 struct ShortLibrary {
     std::string missing;

@@ -8,7 +8,9 @@
 #include <functional>
 #include <map>
 #include <optional>
+#include <set>
 #include <sstream>
+#include <stdexcept>
 #include <string>
 #include <utility>
 #include <vector>
@@ -103,6 +105,9 @@ public:
     // The call with that index in `calls` fails with the status and does nothing else.
     std::map<std::size_t, cl_int> failing;
 
+    // Calls by these names throw a std::runtime_error.
+    std::set<std::string> throwing;
+
     // Each call with its arguments, in order.
     std::vector<std::string> calls;
 
@@ -147,6 +152,8 @@ private:
         ((line << separator << arguments, separator = ", "), ...);
         line << ')';
         calls.push_back(line.str());
+        if (throwing.count(name) != 0)
+            throw std::runtime_error(std::string(name) + " throws");
         const auto found = failing.find(calls.size() - 1);
         return found != failing.end() ? found->second : CL_SUCCESS;
     }

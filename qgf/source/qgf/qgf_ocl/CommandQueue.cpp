@@ -22,11 +22,6 @@ cl_command_queue Create(cl_context context, cl_device_id device, bool outOfOrder
 
 } // namespace
 
-void HandleTraits<cl_command_queue>::Release(cl_command_queue queue) noexcept
-{
-    ExtensionManager::instance().table().clReleaseCommandQueue(queue);
-}
-
 CommandQueue::CommandQueue(const Context& context, const Device& device, bool outOfOrder,
                            bool profiling)
     : OpenCLObjectWrapper(Create(context.handle(), device.id(), outOfOrder, profiling))

@@ -20,11 +20,6 @@ cl_context Create(const ContextProperties& properties, cl_device_id device,
 
 } // namespace
 
-void HandleTraits<cl_context>::Release(cl_context context) noexcept
-{
-    ExtensionManager::instance().table().clReleaseContext(context);
-}
-
 ContextProperties::ContextProperties(const Platform& platform)
     : fProperties{CL_CONTEXT_PLATFORM, reinterpret_cast<cl_context_properties>(platform.id()), 0}
 {}

@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "qgf/AdapterName.h"
+#include "qgf/qgf_core/Quietly.h"
 
 namespace QGF {
 namespace OGL {
@@ -77,17 +78,6 @@ bool HasWord(std::string_view list, std::string_view word)
     return false;
 }
 
-// For calls on the way out. A driver written in C++ may throw through its C interface; that must
-// not end the process here.
-template <typename Call>
-void Quietly(Call call) noexcept
-{
-    try {
-        call();
-    } catch (...) {
-    }
-}
-
 class EGLOffscreen : public PlatformContext {
 public:
     EGLOffscreen(const EGLTable& egl, EGLDisplay display, EGLContext context, std::string device)
@@ -96,11 +86,11 @@ public:
 
     ~EGLOffscreen() override
     {
-        Quietly([this] {
+        Core::Quietly([this] {
             if (fSurface != EGL_NO_SURFACE)
                 fEGL.eglDestroySurface(fDisplay, fSurface);
         });
-        Quietly([this] { fEGL.eglDestroyContext(fDisplay, fContext); });
+        Core::Quietly([this] { fEGL.eglDestroyContext(fDisplay, fContext); });
     }
 
     EGLOffscreen(const EGLOffscreen&) = delete;
@@ -125,7 +115,7 @@ public:
 
     void release() noexcept override
     {
-        Quietly([this] {
+        Core::Quietly([this] {
             fEGL.eglMakeCurrent(fDisplay, EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT);
         });
     }

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <string>
 
+#include "qgf/qgf_core/Quietly.h"
 #include "qgf/qgf_core/win/SystemError.h"
 #include "qgf/qgf_ogl/win/HiddenWindow.h"
 
@@ -27,7 +28,10 @@ public:
                                    key.deviceName() + ": " + Core::SystemErrorText(error));
     }
 
-    ~WGLOffscreen() override { fWGL.wglDeleteContext(fContext); }
+    ~WGLOffscreen() override
+    {
+        Core::Quietly([this] { fWGL.wglDeleteContext(fContext); });
+    }
 
     WGLOffscreen(const WGLOffscreen&) = delete;
     WGLOffscreen& operator=(const WGLOffscreen&) = delete;
@@ -39,7 +43,10 @@ public:
                                    Core::SystemErrorText(GetLastError()));
     }
 
-    void release() noexcept override { fWGL.wglMakeCurrent(nullptr, nullptr); }
+    void release() noexcept override
+    {
+        Core::Quietly([this] { fWGL.wglMakeCurrent(nullptr, nullptr); });
+    }
 
     Core::Proc getProc(const char* name) override
     {
