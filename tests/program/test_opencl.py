@@ -133,6 +133,51 @@ def test_library_without_opencls_entry_points(machine, tmp_path):
     assert "CL" not in run.report.replace("GL", "")
 
 
+# The entry points that the program calls.
+CALLED = """
+    clBuildProgram clCreateBuffer clCreateCommandQueue clCreateContext clCreateKernel
+    clCreateProgramWithSource clEnqueueCopyBuffer clEnqueueNDRangeKernel clFinish clGetDeviceIDs
+    clGetDeviceInfo clGetEventProfilingInfo clGetPlatformIDs clGetPlatformInfo
+    clReleaseCommandQueue clReleaseContext clReleaseEvent clReleaseMemObject clSetKernelArg
+    clWaitForEvents""".split()
+
+
+def loader_without(machine, folder, lacks):
+    """Lets the program find a copy of the loader that lacks the names for which `lacks` is true;
+    returns those names."""
+    found = subprocess.run(["ldconfig", "-p"], capture_output=True, text=True, check=True).stdout
+    loader = next(line.split("=>")[1].strip() for line in found.splitlines()
+                  if "libOpenCL.so.1 " in line and "x86-64" in line)
+    missing = []
+
+    def rename(name):
+        if not lacks(name[1].decode()):
+            return name[0]
+        missing.append(name[1].decode())
+        return b"\0_" + name[1][1:]  # no longer the name that its hash stands for
+
+    library = re.sub(rb"\0(cl[A-Z]\w+)(?=\0)", rename, Path(loader).read_bytes())
+    folder.mkdir()
+    (folder / "libOpenCL.so.1").write_bytes(library)
+    path = machine.host.environment(**machine.found).get("LD_LIBRARY_PATH", "")
+    machine.host.variables["LD_LIBRARY_PATH"] = f"{folder}:{path}"
+    return missing
+
+
+def test_loader_that_lacks_what_is_not_called(one, tmp_path):
+    """Whatever nobody calls may be missing."""
+    missing = loader_without(one, tmp_path / "loader", lambda name: name not in CALLED)
+    assert "clUnloadCompiler" in missing
+    check(one.run(), one.predict())
+
+
+@pytest.mark.parametrize("name", CALLED)
+def test_loader_that_lacks_what_is_called(one, tmp_path, name):
+    """OpenCL is missing, and nothing else happens."""
+    assert loader_without(one, tmp_path / "loader", lambda each: each == name) == [name]
+    check(one.run(), predict([], **one.checks))
+
+
 @pytest.mark.parametrize("batch, batches, bandwidth", [
     (200_000_000, 5, "1.67772e+09"),
     (100_000_000, 10, "3.35544e+09"),

@@ -18,8 +18,9 @@ namespace OCL {
 
 class Library {
 public:
-    // Whether an OpenCL loader library opens and has every entry point of the FunctionTable.
-    // `path` names a library file to open; an empty one stands for the platform's usual names.
+    // Whether an OpenCL loader library opens and has every entry point that is called; it may lack
+    // the others of the FunctionTable. `path` names a library file to open; an empty one stands for
+    // the platform's usual names.
     static bool IsOpenCLAvailable(const std::string& path);
 
     // Opens the library for good. Throws if it isn't available. Repeating it does nothing.

@@ -1,5 +1,6 @@
 // OpenCL's entry points as one plain struct, in the order in which the OpenCL 1.0 header declares
-// them.
+// them. Those that are called are plain pointers to functions, never null in the library's own
+// table.
 #pragma once
 
 #ifndef CL_TARGET_OPENCL_VERSION
@@ -14,77 +15,84 @@
 namespace QGF {
 namespace OCL {
 
+// An entry point that nothing here calls, so that a library may lack it: the pointer is null then.
+// Whoever begins to call one makes it a plain function pointer first, and by that required.
+template <typename Function>
+struct Uncalled {
+    Function address;
+};
+
 struct FunctionTable {
     decltype(&::clGetPlatformIDs) clGetPlatformIDs;
     decltype(&::clGetPlatformInfo) clGetPlatformInfo;
     decltype(&::clGetDeviceIDs) clGetDeviceIDs;
     decltype(&::clGetDeviceInfo) clGetDeviceInfo;
     decltype(&::clCreateContext) clCreateContext;
-    decltype(&::clCreateContextFromType) clCreateContextFromType;
-    decltype(&::clRetainContext) clRetainContext;
+    Uncalled<decltype(&::clCreateContextFromType)> clCreateContextFromType;
+    Uncalled<decltype(&::clRetainContext)> clRetainContext;
     decltype(&::clReleaseContext) clReleaseContext;
-    decltype(&::clGetContextInfo) clGetContextInfo;
+    Uncalled<decltype(&::clGetContextInfo)> clGetContextInfo;
     decltype(&::clCreateCommandQueue) clCreateCommandQueue;
-    decltype(&::clRetainCommandQueue) clRetainCommandQueue;
+    Uncalled<decltype(&::clRetainCommandQueue)> clRetainCommandQueue;
     decltype(&::clReleaseCommandQueue) clReleaseCommandQueue;
-    decltype(&::clGetCommandQueueInfo) clGetCommandQueueInfo;
-    decltype(&::clSetCommandQueueProperty) clSetCommandQueueProperty;
+    Uncalled<decltype(&::clGetCommandQueueInfo)> clGetCommandQueueInfo;
+    Uncalled<decltype(&::clSetCommandQueueProperty)> clSetCommandQueueProperty;
     decltype(&::clCreateBuffer) clCreateBuffer;
-    decltype(&::clCreateImage2D) clCreateImage2D;
-    decltype(&::clCreateImage3D) clCreateImage3D;
-    decltype(&::clRetainMemObject) clRetainMemObject;
+    Uncalled<decltype(&::clCreateImage2D)> clCreateImage2D;
+    Uncalled<decltype(&::clCreateImage3D)> clCreateImage3D;
+    Uncalled<decltype(&::clRetainMemObject)> clRetainMemObject;
     decltype(&::clReleaseMemObject) clReleaseMemObject;
-    decltype(&::clGetSupportedImageFormats) clGetSupportedImageFormats;
-    decltype(&::clGetMemObjectInfo) clGetMemObjectInfo;
-    decltype(&::clGetImageInfo) clGetImageInfo;
-    decltype(&::clCreateSampler) clCreateSampler;
-    decltype(&::clRetainSampler) clRetainSampler;
-    decltype(&::clReleaseSampler) clReleaseSampler;
-    decltype(&::clGetSamplerInfo) clGetSamplerInfo;
+    Uncalled<decltype(&::clGetSupportedImageFormats)> clGetSupportedImageFormats;
+    Uncalled<decltype(&::clGetMemObjectInfo)> clGetMemObjectInfo;
+    Uncalled<decltype(&::clGetImageInfo)> clGetImageInfo;
+    Uncalled<decltype(&::clCreateSampler)> clCreateSampler;
+    Uncalled<decltype(&::clRetainSampler)> clRetainSampler;
+    Uncalled<decltype(&::clReleaseSampler)> clReleaseSampler;
+    Uncalled<decltype(&::clGetSamplerInfo)> clGetSamplerInfo;
     decltype(&::clCreateProgramWithSource) clCreateProgramWithSource;
-    decltype(&::clCreateProgramWithBinary) clCreateProgramWithBinary;
-    decltype(&::clRetainProgram) clRetainProgram;
-    decltype(&::clReleaseProgram) clReleaseProgram;
+    Uncalled<decltype(&::clCreateProgramWithBinary)> clCreateProgramWithBinary;
+    Uncalled<decltype(&::clRetainProgram)> clRetainProgram;
+    Uncalled<decltype(&::clReleaseProgram)> clReleaseProgram;
     decltype(&::clBuildProgram) clBuildProgram;
-    decltype(&::clUnloadCompiler) clUnloadCompiler;
-    decltype(&::clGetProgramInfo) clGetProgramInfo;
-    decltype(&::clGetProgramBuildInfo) clGetProgramBuildInfo;
+    Uncalled<decltype(&::clUnloadCompiler)> clUnloadCompiler;
+    Uncalled<decltype(&::clGetProgramInfo)> clGetProgramInfo;
+    Uncalled<decltype(&::clGetProgramBuildInfo)> clGetProgramBuildInfo;
     decltype(&::clCreateKernel) clCreateKernel;
-    decltype(&::clCreateKernelsInProgram) clCreateKernelsInProgram;
-    decltype(&::clRetainKernel) clRetainKernel;
-    decltype(&::clReleaseKernel) clReleaseKernel;
+    Uncalled<decltype(&::clCreateKernelsInProgram)> clCreateKernelsInProgram;
+    Uncalled<decltype(&::clRetainKernel)> clRetainKernel;
+    Uncalled<decltype(&::clReleaseKernel)> clReleaseKernel;
     decltype(&::clSetKernelArg) clSetKernelArg;
-    decltype(&::clGetKernelInfo) clGetKernelInfo;
-    decltype(&::clGetKernelWorkGroupInfo) clGetKernelWorkGroupInfo;
+    Uncalled<decltype(&::clGetKernelInfo)> clGetKernelInfo;
+    Uncalled<decltype(&::clGetKernelWorkGroupInfo)> clGetKernelWorkGroupInfo;
     decltype(&::clWaitForEvents) clWaitForEvents;
-    decltype(&::clGetEventInfo) clGetEventInfo;
-    decltype(&::clRetainEvent) clRetainEvent;
+    Uncalled<decltype(&::clGetEventInfo)> clGetEventInfo;
+    Uncalled<decltype(&::clRetainEvent)> clRetainEvent;
     decltype(&::clReleaseEvent) clReleaseEvent;
     decltype(&::clGetEventProfilingInfo) clGetEventProfilingInfo;
-    decltype(&::clFlush) clFlush;
+    Uncalled<decltype(&::clFlush)> clFlush;
     decltype(&::clFinish) clFinish;
-    decltype(&::clEnqueueReadBuffer) clEnqueueReadBuffer;
-    decltype(&::clEnqueueWriteBuffer) clEnqueueWriteBuffer;
+    Uncalled<decltype(&::clEnqueueReadBuffer)> clEnqueueReadBuffer;
+    Uncalled<decltype(&::clEnqueueWriteBuffer)> clEnqueueWriteBuffer;
     decltype(&::clEnqueueCopyBuffer) clEnqueueCopyBuffer;
-    decltype(&::clEnqueueReadImage) clEnqueueReadImage;
-    decltype(&::clEnqueueWriteImage) clEnqueueWriteImage;
-    decltype(&::clEnqueueCopyImage) clEnqueueCopyImage;
-    decltype(&::clEnqueueCopyImageToBuffer) clEnqueueCopyImageToBuffer;
-    decltype(&::clEnqueueCopyBufferToImage) clEnqueueCopyBufferToImage;
-    decltype(&::clEnqueueMapBuffer) clEnqueueMapBuffer;
-    decltype(&::clEnqueueMapImage) clEnqueueMapImage;
-    decltype(&::clEnqueueUnmapMemObject) clEnqueueUnmapMemObject;
+    Uncalled<decltype(&::clEnqueueReadImage)> clEnqueueReadImage;
+    Uncalled<decltype(&::clEnqueueWriteImage)> clEnqueueWriteImage;
+    Uncalled<decltype(&::clEnqueueCopyImage)> clEnqueueCopyImage;
+    Uncalled<decltype(&::clEnqueueCopyImageToBuffer)> clEnqueueCopyImageToBuffer;
+    Uncalled<decltype(&::clEnqueueCopyBufferToImage)> clEnqueueCopyBufferToImage;
+    Uncalled<decltype(&::clEnqueueMapBuffer)> clEnqueueMapBuffer;
+    Uncalled<decltype(&::clEnqueueMapImage)> clEnqueueMapImage;
+    Uncalled<decltype(&::clEnqueueUnmapMemObject)> clEnqueueUnmapMemObject;
     decltype(&::clEnqueueNDRangeKernel) clEnqueueNDRangeKernel;
-    decltype(&::clEnqueueTask) clEnqueueTask;
-    decltype(&::clEnqueueNativeKernel) clEnqueueNativeKernel;
-    decltype(&::clEnqueueMarker) clEnqueueMarker;
-    decltype(&::clEnqueueWaitForEvents) clEnqueueWaitForEvents;
-    decltype(&::clEnqueueBarrier) clEnqueueBarrier;
-    decltype(&::clGetExtensionFunctionAddress) clGetExtensionFunctionAddress;
+    Uncalled<decltype(&::clEnqueueTask)> clEnqueueTask;
+    Uncalled<decltype(&::clEnqueueNativeKernel)> clEnqueueNativeKernel;
+    Uncalled<decltype(&::clEnqueueMarker)> clEnqueueMarker;
+    Uncalled<decltype(&::clEnqueueWaitForEvents)> clEnqueueWaitForEvents;
+    Uncalled<decltype(&::clEnqueueBarrier)> clEnqueueBarrier;
+    Uncalled<decltype(&::clGetExtensionFunctionAddress)> clGetExtensionFunctionAddress;
 };
 
-// Fills the table with what `getProc(context, name)` gives. False if an entry point is missing; its
-// member is null then, and the others are filled all the same.
+// Fills the table with what `getProc(context, name)` gives. False if an entry point that is called
+// is missing; its member is null then, and the others are filled all the same.
 bool FillFunctionTable(FunctionTable& table, Core::Proc (*getProc)(void* context, const char* name),
                        void* context);
 

@@ -72,10 +72,8 @@ public:
         fTable.clCreateBuffer = CreateBuffer;
         fTable.clReleaseMemObject = ReleaseMemObject;
         fTable.clCreateProgramWithSource = CreateProgramWithSource;
-        fTable.clReleaseProgram = ReleaseProgram;
         fTable.clBuildProgram = BuildProgram;
         fTable.clCreateKernel = CreateKernel;
-        fTable.clReleaseKernel = ReleaseKernel;
         fTable.clSetKernelArg = SetKernelArg;
         fTable.clWaitForEvents = WaitForEvents;
         fTable.clReleaseEvent = ReleaseEvent;
@@ -348,13 +346,6 @@ private:
         return cl.Make<cl_program>("program", result, status);
     }
 
-    static cl_int CL_API_CALL ReleaseProgram(cl_program program)
-    {
-        FakeOpenCL& cl = *Current();
-        return cl.Release("program",
-                          cl.Enter("clReleaseProgram", Show("program", Number(program))));
-    }
-
     static cl_int CL_API_CALL BuildProgram(cl_program program, cl_uint count,
                                            const cl_device_id* devices, const char* options,
                                            void(CL_CALLBACK* callback)(cl_program, void*),
@@ -370,12 +361,6 @@ private:
         FakeOpenCL& cl = *Current();
         const cl_int result = cl.Enter("clCreateKernel", Show("program", Number(program)), name);
         return cl.Make<cl_kernel>("kernel", result, status);
-    }
-
-    static cl_int CL_API_CALL ReleaseKernel(cl_kernel kernel)
-    {
-        FakeOpenCL& cl = *Current();
-        return cl.Release("kernel", cl.Enter("clReleaseKernel", Show("kernel", Number(kernel))));
     }
 
     static cl_int CL_API_CALL SetKernelArg(cl_kernel kernel, cl_uint index, std::size_t size,

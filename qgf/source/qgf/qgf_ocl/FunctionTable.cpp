@@ -3,6 +3,25 @@
 namespace QGF {
 namespace OCL {
 
+namespace {
+
+// Each tells whether the table can do with what it was given.
+template <typename Function>
+bool Fill(Function& member, Core::Proc proc)
+{
+    member = reinterpret_cast<Function>(proc);
+    return proc != nullptr;
+}
+
+template <typename Function>
+bool Fill(Uncalled<Function>& member, Core::Proc proc)
+{
+    member.address = reinterpret_cast<Function>(proc);
+    return true;
+}
+
+} // namespace
+
 bool FillFunctionTable(FunctionTable& table, Core::Proc (*getProc)(void* context, const char* name),
                        void* context)
 {
@@ -10,9 +29,7 @@ bool FillFunctionTable(FunctionTable& table, Core::Proc (*getProc)(void* context
 
 // A member and the entry point behind it have one name, which only the preprocessor can write
 // twice.
-#define QGF_OCL_FILL(name)                                                                         \
-    table.name = reinterpret_cast<decltype(table.name)>(getProc(context, #name));                  \
-    complete = complete && table.name != nullptr
+#define QGF_OCL_FILL(name) complete = Fill(table.name, getProc(context, #name)) && complete
 
     QGF_OCL_FILL(clGetPlatformIDs);
     QGF_OCL_FILL(clGetPlatformInfo);

@@ -23,7 +23,7 @@ LoadedLibrary Load(const char* const* names)
 {
     LoadedLibrary loaded{Core::OpenLibrary(names), {}};
     if (!FillFunctionTable(loaded.table, GetProcOf, loaded.loader.get()))
-        throw LogicalException("The OpenCL library lacks entry points of OpenCL 1.0");
+        throw LogicalException("The OpenCL library lacks entry points that are needed");
     return loaded;
 }
 
