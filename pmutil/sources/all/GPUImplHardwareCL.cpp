@@ -8,15 +8,13 @@
 #include "pmutil_gpu/GPU.h"
 #include "pmutil_gpu/GPUImplHardware.h"
 #include "pmutil_gpu/GPUImplWin.h"
+#include "qgf/TextRoom.h"
 
 namespace pmutil {
 
 namespace {
 
 constexpr std::string_view kVersionPrefix = "OpenCL ";
-
-// A driver's text that claims to be longer isn't asked for.
-constexpr std::size_t kMaxTextBytes = 1024UL * 1024;
 
 const QGF::OCL::FunctionTable& Table()
 {
@@ -116,11 +114,10 @@ std::string GPUImplHardware::DoGetCLDriverVersion()
     require(clGetDeviceInfo(device.id(), CL_DRIVER_VERSION, 0, nullptr, &size) == CL_SUCCESS);
     if (size == 0)
         return {};
-    require(size <= kMaxTextBytes);
-    std::string text(size, '\0');
+    QGF::Core::TextRoom text(size);
     require(clGetDeviceInfo(device.id(), CL_DRIVER_VERSION, size, text.data(), nullptr) ==
             CL_SUCCESS);
-    return CutAtZero(text);
+    return text.beforeFirstZero();
 }
 
 bool GPUImplHardware::DoGetCUDASupported()
@@ -153,13 +150,12 @@ std::string GPUImplHardware::DoGetCLDeviceVersion()
     const auto clGetDeviceInfo = Table().clGetDeviceInfo;
     std::size_t size = 0;
     require(clGetDeviceInfo(device.id(), CL_DEVICE_VERSION, 0, nullptr, &size) == CL_SUCCESS);
-    // Not even a terminator is no answer either: the text would be one byte shorter than nothing.
-    require(size != 0 && size <= kMaxTextBytes);
-    std::string text(size, '\0');
+    // The driver's terminator falls on the room's own. For a size of 0, which hasn't even that, the
+    // length wraps around, and there is no such room.
+    QGF::Core::TextRoom text(size - 1);
     require(clGetDeviceInfo(device.id(), CL_DEVICE_VERSION, size, text.data(), nullptr) ==
             CL_SUCCESS);
-    text.pop_back();
-    return CutAtZero(WithoutVersionPrefix(text));
+    return WithoutVersionPrefix(text.beforeFirstZero());
 }
 
 bool GPUImplHardware::DoIsIntegratedCLGPU()

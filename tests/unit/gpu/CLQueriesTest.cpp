@@ -1,4 +1,5 @@
 // What is asked of an OpenCL device, and how its answers become report values.
+#include <new>
 #include <stdexcept>
 #include <utility>
 
@@ -19,7 +20,8 @@ using pmutil::GPUImplWin;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-constexpr std::size_t kTerabyte = std::size_t{1} << 40U;
+// More than the address space of any machine holds.
+constexpr std::size_t kPetabyte = std::size_t{1} << 50U;
 
 // The text of the std::runtime_error that `action` throws; empty if it throws none.
 template <typename Action>
@@ -169,11 +171,21 @@ TEST_F(CLQueriesTest, DriverVersionThatFailsOnEitherCallIsAFailure)
     EXPECT_THAT(failures.texts(), ElementsAre("clGetDeviceInfo failed", "clGetDeviceInfo failed"));
 }
 
-TEST_F(CLQueriesTest, DriverVersionBeyondReasonIsAFailureAndNotAllocated)
+TEST_F(CLQueriesTest, ALongDriverVersionIsReadWhole)
 {
-    answers()[CL_DRIVER_VERSION].claimed = kTerabyte;
-    EXPECT_EQ(ErrorOf([&] { impl.GetCLDriverVersion(); }), "clGetDeviceInfo failed");
-    EXPECT_EQ(cl.calls.size(), 1U);
+    answers()[CL_DRIVER_VERSION] = CLText(std::string(3 * 1024 * 1024, 'x'));
+    EXPECT_EQ(impl.GetCLDriverVersion().size(), 3U * 1024 * 1024);
+}
+
+TEST_F(CLQueriesTest, ADriverVersionForWhichThereIsNoRoomIsTheAllocationsFailure)
+{
+    for (const std::size_t claimed : {kPetabyte, ~std::size_t{0}}) {
+        cl.calls.clear();
+        answers()[CL_DRIVER_VERSION].claimed = claimed;
+        EXPECT_THROW(impl.GetCLDriverVersion(), std::bad_alloc) << claimed;
+        EXPECT_EQ(cl.calls.size(), 1U);
+    }
+    EXPECT_THAT(failures.texts(), IsEmpty());
 }
 
 TEST_F(CLQueriesTest, DeviceVersionLosesItsPrefix)
@@ -225,15 +237,22 @@ TEST_F(CLQueriesTest, DeviceVersionThatFailsOnEitherCallIsAFailure)
                                               "Failed requirement: status == CL_SUCCESS"));
 }
 
-TEST_F(CLQueriesTest, DeviceVersionOfNoSizeOrBeyondReasonIsAFailureAndNotAllocated)
+TEST_F(CLQueriesTest, ALongDeviceVersionIsReadWhole)
 {
-    for (const std::size_t claimed : {std::size_t{0}, kTerabyte, ~std::size_t{0}}) {
+    answers()[CL_DEVICE_VERSION] = CLText("OpenCL " + std::string(3 * 1024 * 1024, 'x'));
+    EXPECT_EQ(impl.GetCLDeviceVersion().size(), 3U * 1024 * 1024);
+}
+
+TEST_F(CLQueriesTest, ADeviceVersionForWhichThereIsNoRoomIsTheAllocationsFailure)
+{
+    // A text one byte shorter than no bytes has no room either.
+    for (const std::size_t claimed : {std::size_t{0}, kPetabyte, ~std::size_t{0}}) {
         cl.calls.clear();
         answers()[CL_DEVICE_VERSION].claimed = claimed;
-        EXPECT_EQ(ErrorOf([&] { impl.GetCLDeviceVersion(); }),
-                  "Failed requirement: status == CL_SUCCESS");
+        EXPECT_THROW(impl.GetCLDeviceVersion(), std::bad_alloc) << claimed;
         EXPECT_EQ(cl.calls.size(), 1U) << claimed;
     }
+    EXPECT_THAT(failures.texts(), IsEmpty());
 }
 
 struct VersionRow {

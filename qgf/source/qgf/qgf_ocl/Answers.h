@@ -5,32 +5,28 @@
 #include <string>
 #include <vector>
 
+#include "qgf/TextRoom.h"
 #include "qgf/qgf_ocl/Status.h"
 
 namespace QGF {
 namespace OCL {
 
 // What a driver may claim before it isn't believed any more.
-inline constexpr std::size_t kMaxTextBytes = 1024UL * 1024;
 inline constexpr cl_uint kMaxListEntries = 4096;
 
-// The text that `query(size, value, actualSize)` gives, as long as the driver says it is, zero
-// bytes included, less a terminating one. Throws LogicalException with the call's name if the
-// driver refuses or claims more than kMaxTextBytes.
+// The text that `query(size, value, actualSize)` gives, zero bytes included, less those at its end.
+// Throws LogicalException with the call's name if the driver refuses, and std::bad_alloc if there
+// is no room for what it claims.
 template <typename Query>
 std::string ReadText(const char* call, const Query& query)
 {
     std::size_t size = 0;
     CheckStatus(call, query(std::size_t{0}, nullptr, &size));
-    if (size > kMaxTextBytes)
-        RefuseAnswer(call, "the driver claims a text of " + std::to_string(size) + " bytes");
-    std::string text(size, '\0');
     if (size == 0)
-        return text;
-    CheckStatus(call, query(size, text.data(), nullptr));
-    if (text.back() == '\0')
-        text.pop_back();
-    return text;
+        return {};
+    Core::TextRoom room(size);
+    CheckStatus(call, query(size, room.data(), nullptr));
+    return room.withoutLastZeros();
 }
 
 // The handles that `query(count, handles, actualCount)` gives; none if it answers `emptyStatus`.

@@ -1,0 +1,41 @@
+#include "qgf/TextRoom.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <limits>
+#include <new>
+
+namespace QGF {
+namespace Core {
+
+void TextRoom::Free::operator()(char* bytes) const noexcept
+{
+    std::free(bytes);
+}
+
+TextRoom::TextRoom(std::size_t length)
+    : fLength(length),
+      fBytes(length < std::numeric_limits<std::size_t>::max()
+                 ? static_cast<char*>(std::calloc(length + 1, 1))
+                 : nullptr)
+{
+    if (!fBytes)
+        throw std::bad_alloc();
+}
+
+std::string TextRoom::beforeFirstZero() const
+{
+    const char* const begin = fBytes.get();
+    return {begin, std::find(begin, begin + fLength, '\0')};
+}
+
+std::string TextRoom::withoutLastZeros() const
+{
+    std::size_t length = fLength;
+    while (length > 0 && fBytes.get()[length - 1] == '\0')
+        --length;
+    return std::string(fBytes.get(), length);
+}
+
+} // namespace Core
+} // namespace QGF
