@@ -195,6 +195,19 @@ def test_bandwidth_of_scripted_counters(one, batch, batches, bandwidth):
     check(run, one.predict())
 
 
+@pytest.mark.parametrize("copy, batches, bandwidth", [
+    (20_000_000, 6, "1.67772e+09"),
+    (50_000_000, 3, "6.71089e+08"),
+    (15_625_000, 7, "2.14748e+09"),
+])
+def test_bandwidth_of_even_copies(one, copy, batches, bandwidth):
+    """The sum of ten durations is what doubles make of it, here and there just less than expected."""
+    run = one.run(extra=f"copy-ns {copy}\n" + one.host.fresh_record())
+    assert run.facts["clgpu[0].CLBandwidth"] == bandwidth
+    copies = [call for call in one.host.record() if call.name == "clEnqueueCopyBuffer"]
+    assert len(copies) == 10 * batches
+
+
 @pytest.mark.parametrize("kernel, score", [(250_000_000, "32"), (1_000, "8e+06"), (0, "0")])
 def test_compute_of_scripted_counters(one, kernel, score):
     one.platforms[0].devices[0].kernel = kernel

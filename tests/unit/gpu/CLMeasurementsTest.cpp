@@ -229,6 +229,28 @@ TEST_F(CLMeasurementsTest, BatchesOfAFifthOfASecondAreFive)
     EXPECT_EQ(CountCalls("clFinish"), 7);
 }
 
+// Ten copies that take 0.02 s each add up to just less than 0.2 s, and five such batches to just
+// less than 1 s, so that a sixth one runs. Sums of binary fractions are exact.
+TEST_F(CLMeasurementsTest, EvenCopiesAddUpAsDoublesDo)
+{
+    const struct {
+        cl_ulong nanoseconds; // of each copy
+        double batch;         // in seconds
+        int batches;
+    } rows[] = {
+        {10000000, 0.09999999999999999, 10}, {15625000, 0.15625, 7},
+        {20000000, 0.19999999999999998, 6},  {50000000, 0.49999999999999994, 3},
+        {100000000, 0.9999999999999999, 2},  {125000000, 1.25, 1},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.nanoseconds);
+        cl.calls.clear();
+        cl.counters = [&row](int) { return std::pair<cl_ulong, cl_ulong>{0, row.nanoseconds}; };
+        EXPECT_EQ(impl.GetCLBandwidth(), 335544320.0 / row.batch);
+        EXPECT_EQ(CountCalls("clEnqueueCopyBuffer"), 10 * row.batches);
+    }
+}
+
 TEST_F(CLMeasurementsTest, BatchesOfATenthOfASecondGive3355443200BytesPerSecond)
 {
     cl.counters = BatchesOf(100000000);
