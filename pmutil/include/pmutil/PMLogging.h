@@ -25,7 +25,7 @@ namespace pmutil {
 class PMLogger : public Stackable<PMLogger> {
 public:
     // Becomes the current logger. If logging has started, the logger that was current until now
-    // gets the line "Activating new logger NAME".
+    // gets the line "Activating new logger NAME"; its failure to write it is ignored.
     explicit PMLogger(const std::string& name);
     ~PMLogger() override;
 

@@ -69,7 +69,11 @@ LoggerHolder GetCurrentLogger()
     LoggerHolder top = PMLogger::Top();
     if (top)
         return top;
-    static const PMNullLogger nullLogger;
+    // It stands on the stack before it is complete: nobody may look there meanwhile.
+    const LogLock logLock(GetLogMutex());
+    const LogLock stackLock(PMLogger::Mutex());
+    if (!PMLogger::Top())
+        static const PMNullLogger nullLogger;
     return PMLogger::Top();
 }
 
@@ -77,8 +81,12 @@ PMLogger::PMLogger(const std::string& name) : fName(name)
 {
     if (!gLoggingStarted)
         return;
-    if (PMLogger* const previous = Below(this))
-        previous->LogPrintf(__FILE__, __LINE__, "Activating new logger %s", fName.c_str());
+    try {
+        if (PMLogger* const previous = Below(this))
+            previous->LogPrintf(__FILE__, __LINE__, "Activating new logger %s", fName.c_str());
+    } catch (...) {
+        // The previous logger's trouble is none of this one's.
+    }
 }
 
 PMLogger::~PMLogger() = default;

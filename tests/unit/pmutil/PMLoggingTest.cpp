@@ -7,6 +7,7 @@
 #include <stdexcept>
 
 #include <boost/date_time/posix_time/posix_time_types.hpp>
+#include <boost/thread/barrier.hpp>
 #include <boost/thread/thread.hpp>
 #include <gmock/gmock.h>
 
@@ -77,6 +78,39 @@ TEST(PMLoggingDeathTest, LoggerMadeBeforeInitLoggingIsCurrentAfterwards)
         REQUIRE_SO(first.lines.empty()); // no word of the change before logging starts
         InitLogging();
         REQUIRE_SO(GetCurrentLogger().get() == &second);
+    });
+}
+
+// While it is made it stands on the stack without being a whole logger.
+TEST(PMLoggingDeathTest, ThePMNullLoggerIsMadeUnderTheLogMutex)
+{
+    ExpectInFreshProcess([] {
+        InitLogging();
+        GetLogMutex().lock();
+        boost::thread first([] { GetCurrentLogger(); });
+        REQUIRE_SO(!first.timed_join(boost::posix_time::milliseconds(200)));
+        REQUIRE_SO(!PMLogger::Top());
+        GetLogMutex().unlock();
+        first.join();
+        REQUIRE_SO(PMLogger::Top()->GetName() == "PMNullLogger");
+    });
+}
+
+TEST(PMLoggingDeathTest, FirstStatementsOfSeveralThreadsMeetAWholeLogger)
+{
+    ExpectInFreshProcess([] {
+        InitLogging();
+        constexpr unsigned kThreads = 8;
+        boost::barrier start(kThreads);
+        boost::thread_group threads;
+        for (unsigned i = 0; i < kThreads; ++i)
+            threads.create_thread([&start] {
+                start.wait();
+                const LoggerHolder logger = GetCurrentLogger();
+                REQUIRE_SO(!logger->IsEnabledWrapper());
+                PM_LOG(gOn, "text");
+            });
+        threads.join_all();
     });
 }
 
@@ -370,6 +404,23 @@ TEST_F(PMLoggingTest, NewLoggerIsToldToTheOneItReplaces)
     EXPECT_EQ(MessageOf(first.lines[0]), "to first\n");
     EXPECT_EQ(MessageOf(first.lines[1]), "Activating new logger second\n");
     EXPECT_EQ(MessageOf(first.lines[2]), "first again\n");
+}
+
+TEST_F(PMLoggingTest, FailureToTellOfANewLoggerDoesNotReachIt)
+{
+    struct Broken : RecordingLogger {
+        void Write(const char*, std::size_t) override
+        {
+            ++failures;
+            throw std::runtime_error("disk full");
+        }
+        int failures = 0;
+    } broken;
+    RecordingLogger next("next");
+    EXPECT_EQ(broken.failures, 1);
+    PM_LOG(gOn, "line");
+    ASSERT_THAT(next.lines, SizeIs(1));
+    EXPECT_EQ(MessageOf(next.lines[0]), "line\n");
 }
 
 TEST_F(PMLoggingTest, StackMutexIsFreeWhileALineIsWritten)
