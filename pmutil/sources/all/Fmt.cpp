@@ -367,7 +367,7 @@ void Fmt::FormatPointer(std::string& out, const void* value, const char* format)
     if (GetConversion(format) == 'p')
         Print(out, format, value);
     else
-        FormatULongLong(out, reinterpret_cast<std::uintptr_t>(value), format);
+        Fmt::FormatULongLong(out, reinterpret_cast<std::uintptr_t>(value), format);
 }
 
 void Fmt::FormatCString(std::string& out, const char* value, const char* format)

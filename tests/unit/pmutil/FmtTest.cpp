@@ -243,6 +243,24 @@ TEST(Fmt, ATableOfItsOwn)
     EXPECT_EQ(Text(10U), "0x0000000a") << "the head's table is another one";
 }
 
+TEST(Fmt, PointersDoNotGoThroughTheOverrideOfAnotherKind)
+{
+    class Loud : public Fmt {
+        void FormatULongLong(std::string& out, unsigned long long /*value*/,
+                             const char* /*format*/) override
+        {
+            out = "number";
+        }
+    };
+    Loud fmt;
+    std::string text;
+    fmt.Format(text, 5ULL);
+    EXPECT_EQ(text, "number");
+    const void* pointer = nullptr;
+    fmt.Format(text, pointer);
+    EXPECT_EQ(text, "0x0000000000000000");
+}
+
 TEST(Fmt, OverridesOfTheVirtualOperationsAreCalled)
 {
     class Loud : public Fmt {
