@@ -2,7 +2,9 @@
 //
 // Position <= data size <= capacity, and the dirty range lies within the data. All sizes and
 // positions are in bytes. A failed operation leaves the buffer as it was (Attach tells the one
-// exception), and memory that can't be had throws std::bad_alloc.
+// exception), and memory that can't be had throws std::bad_alloc. CopyOut, CopyIn, Grow and
+// SetCapacity to another size throw std::runtime_error "pmutil::Channel not open" after Close;
+// Attach and assignment open the buffer again.
 #pragma once
 
 #include <cstdint>
@@ -35,6 +37,7 @@ public:
     // count of 0 if they don't fit a buffer that doesn't grow.
     void CopyIn(const void* bytes, std::uint64_t nbytes);
 
+    // SetState and SetOffset set the position, and with it forget what was put back with Unread.
     // Each setter throws std::runtime_error, SetState std::invalid_argument, if the buffer would
     // contradict itself: "Buffer::SetState: bad args", "Buffer: bad endOfData param",
     // "Buffer: bad offset param", "Buffer: bad dirty bounds".
@@ -49,7 +52,8 @@ public:
 
     // Drops the present block and wraps another, as the constructor does. A null one is reported as
     // a failed requirement, "Failed requirement: buf != NULL", which throws std::runtime_error; if
-    // `size` is not 0 the old block is gone by then, and the buffer empty and closed.
+    // `size` is not 0 the old block is gone by then, and the buffer empty and closed. What was put
+    // back with Unread came out of the old block and is forgotten.
     void Attach(void* block, std::uint64_t size);
 
     // Makes room for `extra` more bytes, rounded up to whole pages of 4096. Throws
@@ -96,7 +100,8 @@ private:
     static bool IsConsistent(const void* data, std::uint64_t offset, std::uint64_t endOfData,
                              std::uint64_t capacity, std::uint64_t dirtyBegin,
                              std::uint64_t dirtyEnd);
-    void RequireBlock() const;
+    // Closing leaves sizes and flags as they are, so that they alone don't tell.
+    void RequireNotClosed() const;
     void FreeBlock();
     void Reallocate(std::uint64_t capacity, std::uint64_t nbytesToKeep);
     void Put(const void* bytes, std::uint64_t nbytes);
@@ -108,6 +113,7 @@ private:
     std::uint64_t fDirtyBegin = 0;
     std::uint64_t fDirtyEnd = 0;
     std::uint32_t fFlags = 0;
+    bool fClosed = false;
     unsigned char* fData = nullptr;
 };
 

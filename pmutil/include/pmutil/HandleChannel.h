@@ -40,7 +40,8 @@ public:
     HandleChannel(Handle handle, bool owned, const Path* path = nullptr);
     ~HandleChannel() override;
 
-    // Lets go of the present handle, as the destructor does, and takes another.
+    // Lets go of the present handle, as the destructor does, and takes another. What was put back
+    // with Unread came from the old one and is forgotten.
     void Reset(Handle handle, bool owned, const Path* path = nullptr);
 
     Handle GetHandle() const { return fHandle; }

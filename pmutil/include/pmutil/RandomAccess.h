@@ -21,6 +21,10 @@ public:
     void SetEOF();
 
 protected:
+    // What was read before and put back isn't what stands at the new position.
+    void DoSeek(std::uint64_t position) override;
+    void DoSeekRelative(std::int64_t delta) override;
+    void DoSeekEnd() override;
     virtual void DoSetEOF();
     virtual void BinioSetEOF();
 };

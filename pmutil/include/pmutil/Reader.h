@@ -35,7 +35,9 @@ public:
     bool ReadAll(void* bytes, std::uint64_t nbytes);
 
     // Puts bytes back: the next read delivers them. They take the place of what was put back
-    // earlier and not yet read again.
+    // earlier and not yet read again. What was put back, here or by ReadAll or a preview, is
+    // forgotten when the channel is closed, forwards to another reader, or moves its position
+    // otherwise than by reading and writing; a preview across that puts nothing back.
     void Unread(const void* bytes, std::uint64_t nbytes);
 
     // The Reader's side of a preview; see Previewer for the use of it.
@@ -63,7 +65,9 @@ protected:
     // The next byte, 0 to 255, or 0xFFFFFFFF at the end of the data.
     virtual std::uint32_t DoReadByte();
 
-    // Forgets what was put back.
+    void DoClose() override;
+
+    // Forgets what was put back, and what an active preview has read.
     void DropPushback();
 
 private:
@@ -72,6 +76,7 @@ private:
     Reader* fReader = nullptr;
     std::unique_ptr<Buffer> fPushback;
     Previewer* fPreviewer = nullptr;
+    bool fPreviewIsStale = false;
 };
 
 } // namespace pmutil

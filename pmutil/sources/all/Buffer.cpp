@@ -59,9 +59,10 @@ Buffer::Buffer(const Buffer& other)
       fCapacity(other.fCapacity),
       fDirtyBegin(other.fDirtyBegin),
       fDirtyEnd(other.fDirtyEnd),
-      fFlags((other.fFlags & kGrowable) | kOwned)
+      fFlags((other.fFlags & kGrowable) | kOwned),
+      fClosed(other.fClosed)
 {
-    if (fCapacity != 0 && other.fData != nullptr) {
+    if (fCapacity != 0 && !fClosed) {
         fData = Allocate(fCapacity);
         Copy(fData, other.fData, fEndOfData);
     }
@@ -90,6 +91,7 @@ void Buffer::Swap(Buffer& other) noexcept
     std::swap(fDirtyBegin, other.fDirtyBegin);
     std::swap(fDirtyEnd, other.fDirtyEnd);
     std::swap(fFlags, other.fFlags);
+    std::swap(fClosed, other.fClosed);
     std::swap(fData, other.fData);
 }
 
@@ -100,10 +102,9 @@ bool Buffer::IsConsistent(const void* data, std::uint64_t offset, std::uint64_t 
            dirtyEnd <= endOfData && (data != nullptr || capacity == 0);
 }
 
-// Closing leaves the sizes as they are, so that they alone don't tell whether there is a block.
-void Buffer::RequireBlock() const
+void Buffer::RequireNotClosed() const
 {
-    if (fData == nullptr && fCapacity > 0)
+    if (fClosed)
         throw std::runtime_error("pmutil::Channel not open");
 }
 
@@ -136,7 +137,7 @@ void Buffer::CopyOut(void* bytes, std::uint64_t nbytes)
 {
     if (nbytes > fEndOfData - fOffset)
         throw std::runtime_error("Buffer: CopyOut nbytes too large");
-    RequireBlock();
+    RequireNotClosed();
     Copy(bytes, fData + fOffset, nbytes);
     fOffset += nbytes;
 }
@@ -149,7 +150,7 @@ void Buffer::CopyIn(const void* bytes, std::uint64_t nbytes)
             throw XUnderrun(0);
         Grow(nbytes - room);
     }
-    RequireBlock();
+    RequireNotClosed();
     if (nbytes > 0)
         Put(bytes, nbytes);
 }
@@ -163,6 +164,7 @@ void Buffer::SetState(std::uint64_t offset, std::uint64_t endOfData, std::uint64
     fEndOfData = endOfData;
     fDirtyBegin = dirtyBegin;
     fDirtyEnd = dirtyEnd;
+    DropPushback();
 }
 
 void Buffer::SetEndOfData(std::uint64_t end)
@@ -177,6 +179,7 @@ void Buffer::SetOffset(std::uint64_t offset)
     if (!IsConsistent(fData, offset, fEndOfData, fCapacity, fDirtyBegin, fDirtyEnd))
         throw std::runtime_error(kBadOffset);
     fOffset = offset;
+    DropPushback();
 }
 
 void Buffer::SetDirtyBounds(std::uint64_t begin, std::uint64_t end)
@@ -195,7 +198,9 @@ void Buffer::Attach(void* block, std::uint64_t size)
     };
     if (size == 0)
         requireBlock();
+    DropPushback();
     FreeBlock();
+    fClosed = false;
     fOffset = fEndOfData = fCapacity = fDirtyBegin = fDirtyEnd = 0;
     fFlags = 0;
     requireBlock();
@@ -212,7 +217,7 @@ void Buffer::Grow(std::uint64_t extra)
         throw std::runtime_error("not IsGrowable");
     if (extra > kLargest - fCapacity)
         throw std::runtime_error("cannot Grow Buffer that large");
-    RequireBlock();
+    RequireNotClosed();
     std::uint64_t wanted = fCapacity + extra;
     if (wanted <= kLargest - (kPage - 1))
         wanted = (wanted + (kPage - 1)) / kPage * kPage;
@@ -226,7 +231,7 @@ void Buffer::SetCapacity(std::uint64_t capacity)
     RequireOwnership();
     if (capacity < fEndOfData)
         throw std::runtime_error("shrinking Buffer would invalidate data");
-    RequireBlock();
+    RequireNotClosed();
     Reallocate(capacity, fEndOfData);
 }
 
@@ -239,6 +244,7 @@ void Buffer::RequireOwnership() const
 void Buffer::BinioClose()
 {
     FreeBlock();
+    fClosed = true;
 }
 
 bool Buffer::BinioIsOpen() const

@@ -39,6 +39,7 @@ void HandleChannel<Platform>::Reset(Handle handle, bool owned, const Path* path)
         Platform::Close(fHandle);
         Platform::Delete(fDeletePath);
     }
+    DropPushback();
     fHandle = handle;
     fOwned = owned;
     fDeletePath.swap(newPath);

@@ -23,6 +23,24 @@ void RandomAccess::SetEOF()
     DoSetEOF();
 }
 
+void RandomAccess::DoSeek(std::uint64_t position)
+{
+    Seeker::DoSeek(position);
+    DropPushback();
+}
+
+void RandomAccess::DoSeekRelative(std::int64_t delta)
+{
+    Seeker::DoSeekRelative(delta);
+    DropPushback();
+}
+
+void RandomAccess::DoSeekEnd()
+{
+    Seeker::DoSeekEnd();
+    DropPushback();
+}
+
 void RandomAccess::DoSetEOF()
 {
     BinioSetEOF();

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <stdexcept>
+#include <utility>
 
 #include "pmutil/Buffer.h"
 
@@ -26,6 +27,8 @@ Reader::~Reader() = default;
 void Reader::SetReader(Reader* reader, bool own)
 {
     SetTarget(reader, own);
+    if (fReader != reader)
+        DropPushback();
     fReader = reader;
 }
 
@@ -103,6 +106,8 @@ std::uint64_t Reader::ReadPreview(void* bytes, std::uint64_t nbytes)
 void Reader::EndPreview(std::unique_ptr<Buffer> data)
 {
     fPreviewer = nullptr;
+    if (std::exchange(fPreviewIsStale, false))
+        return;
     if (fPushback != nullptr) {
         // The bytes came out of it, so they are still there.
         fPushback->SeekRelative(-static_cast<std::int64_t>(data->GetEndOfData()));
@@ -142,9 +147,16 @@ std::uint32_t Reader::DoReadByte()
     return DoReadSome(&byte, 1) == 0 ? kNoByte : byte;
 }
 
+void Reader::DoClose()
+{
+    Channel::DoClose();
+    DropPushback();
+}
+
 void Reader::DropPushback()
 {
     fPushback.reset();
+    fPreviewIsStale = fPreviewer != nullptr;
 }
 
 } // namespace pmutil

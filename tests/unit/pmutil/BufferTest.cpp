@@ -195,6 +195,51 @@ TEST(Buffer, ClosedBufferRefusesItsOwnOperations)
     EXPECT_TRUE(ThrowsRuntimeError("Buffer: bad offset param", [&] { buffer.SetOffset(0); }));
 }
 
+TEST(Buffer, NothingButAnotherBlockOpensAClosedBuffer)
+{
+    const auto notOpen = [](auto call) {
+        return ThrowsRuntimeError("pmutil::Channel not open", call);
+    };
+    char byte = 'x';
+    for (const std::uint64_t capacity : {0U, 10U}) {
+        Buffer buffer(capacity);
+        buffer.Close();
+        EXPECT_TRUE(notOpen([&] { buffer.Grow(1); }));
+        EXPECT_TRUE(notOpen([&] { buffer.SetCapacity(20); }));
+        EXPECT_TRUE(notOpen([&] { buffer.CopyIn(&byte, 1); }));
+        Buffer copy(buffer);
+        EXPECT_TRUE(notOpen([&] { copy.Grow(1); }));
+        EXPECT_FALSE(buffer.IsOpen());
+        EXPECT_FALSE(copy.IsOpen());
+
+        copy = Buffer(5);
+        EXPECT_TRUE(copy.IsOpen());
+        copy.Grow(1);
+        buffer.Attach(&byte, 1);
+        EXPECT_TRUE(buffer.IsOpen());
+        EXPECT_EQ(ReadSomeText(buffer, 9), "x");
+    }
+}
+
+TEST(Buffer, ForgetsWhatWasPutBackWhenItsBlockOrPositionIsSet)
+{
+    char block[] = "1234";
+    char other[] = "56";
+    Buffer buffer(block, 4);
+    buffer.Unread("old", 3);
+    buffer.SetOffset(1);
+    EXPECT_EQ(ReadSomeText(buffer, 9), "234");
+    buffer.Unread("old", 3);
+    buffer.SetState(2, 4, 0, 0);
+    EXPECT_EQ(ReadSomeText(buffer, 9), "34");
+    buffer.Unread("old", 3);
+    buffer.Attach(other, 2);
+    EXPECT_EQ(ReadSomeText(buffer, 9), "56");
+    buffer.Unread("old", 3);
+    EXPECT_TRUE(ThrowsRuntimeError("Buffer: bad offset param", [&] { buffer.SetOffset(9); }));
+    EXPECT_EQ(ReadSomeText(buffer, 9), "old");
+}
+
 TEST(Buffer, CloseOfAWrappedBlockDoesNotFreeIt)
 {
     char block[] = "1234";

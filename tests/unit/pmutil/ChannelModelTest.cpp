@@ -51,6 +51,12 @@ public:
         return result;
     }
 
+    void MoveTo(std::uint64_t position)
+    {
+        fOffset = position;
+        fPushback.reset();
+    }
+
     bool ReadAll(std::uint64_t wanted, std::vector<int>& all)
     {
         while (all.size() < wanted) {
@@ -291,7 +297,7 @@ private:
             const bool valid = position <= fModel.fEnd;
             Expect(valid, Try([&] { fBuffer.Seek(position); }), "Buffer: bad offset param");
             if (valid)
-                fModel.fOffset = position;
+                fModel.MoveTo(position);
             break;
         }
         case 10: {
@@ -302,12 +308,12 @@ private:
             Expect(valid, Try([&] { fBuffer.SeekRelative(delta); }),
                    sum < 0 ? "Buffer: offset would be negative" : "Buffer: bad offset param");
             if (valid)
-                fModel.fOffset = static_cast<std::uint64_t>(sum);
+                fModel.MoveTo(static_cast<std::uint64_t>(sum));
             break;
         }
         case 11:
             fBuffer.SeekEnd();
-            fModel.fOffset = fModel.fEnd;
+            fModel.MoveTo(fModel.fEnd);
             break;
         case 12: {
             const bool valid =
@@ -336,7 +342,7 @@ private:
             Expect(valid, Try([&] { fBuffer.SetState(state[0], state[1], state[2], state[3]); }),
                    "Buffer::SetState: bad args");
             if (valid) {
-                fModel.fOffset = state[0];
+                fModel.MoveTo(state[0]);
                 fModel.fEnd = state[1];
                 fModel.fDirtyBegin = state[2];
                 fModel.fDirtyEnd = state[3];

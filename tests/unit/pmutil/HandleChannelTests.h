@@ -350,6 +350,19 @@ TYPED_TEST_P(HandleChannelTest, ResetRepointsAndClosesWhatItOwned)
     EXPECT_EQ(this->ReadRest(second), "2");
 }
 
+TYPED_TEST_P(HandleChannelTest, ResetForgetsWhatWasPutBack)
+{
+    using Channel = typename TypeParam::Channel;
+    typename Channel::Handle read{};
+    typename Channel::Handle write{};
+    TypeParam::MakePipe(read, write);
+    auto channel = Channel::MakeTemporaryFile(this->MakePath("tst"));
+    channel->Unread("old", 3);
+    channel->Reset(read, true);
+    Channel(write, true).WriteAll("new", 3);
+    EXPECT_EQ(this->ReadRest(*channel), "new");
+}
+
 TYPED_TEST_P(HandleChannelTest, ReadAllThatComesShortPutsBack)
 {
     using Channel = typename TypeParam::Channel;
@@ -403,5 +416,5 @@ REGISTER_TYPED_TEST_SUITE_P(HandleChannelTest, BadAccessFlagsTouchNothing,
                             PipeWhoseWriteEndIsClosedReadsAsEndOfData,
                             WriteToAPipeWithoutReaderRaises, CloseOfAnUnownedHandleClosesItOnce,
                             UnownedHandleOutlivesTheChannel, ResetRepointsAndClosesWhatItOwned,
-                            ReadAllThatComesShortPutsBack, ResetLogsTheHandleItCloses,
-                            StandardChannelsAreMadeOnce);
+                            ResetForgetsWhatWasPutBack, ReadAllThatComesShortPutsBack,
+                            ResetLogsTheHandleItCloses, StandardChannelsAreMadeOnce);

@@ -35,6 +35,26 @@ TEST(Previewer, PutsBackEverythingItRead)
     EXPECT_EQ(ReadSomeText(source, 10), "f");
 }
 
+TEST(Previewer, PutsNothingBackAcrossASeek)
+{
+    Buffer source(10);
+    source.WriteAll("abcdef", 6);
+    source.Seek(0);
+    {
+        Previewer preview(source);
+        EXPECT_EQ(ReadSomeText(preview, 2), "ab");
+        source.Seek(4);
+        EXPECT_EQ(ReadSomeText(preview, 1), "e");
+    }
+    EXPECT_EQ(ReadSomeText(source, 9), "f");
+    source.Seek(1);
+    {
+        Previewer preview(source);
+        EXPECT_EQ(ReadSomeText(preview, 2), "bc");
+    }
+    EXPECT_EQ(ReadSomeText(source, 9), "bc");
+}
+
 TEST(Previewer, EndsWithItsScope)
 {
     FakeChannel source;

@@ -1,9 +1,12 @@
 #include "pmutil/Reader.h"
 
+#include <functional>
+
 #include <gmock/gmock.h>
 
 #include "FakeChannel.h"
 #include "Throws.h"
+#include "pmutil/Buffer.h"
 
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -112,6 +115,47 @@ TEST(Reader, UnreadReplacesEarlierPushback)
     source.Unread("de", 2);
     EXPECT_EQ(ReadSomeText(source, 5), "de");
     EXPECT_EQ(ReadSomeText(source, 5), "");
+}
+
+TEST(Reader, PushbackOfAnotherPlaceIsForgotten)
+{
+    const std::function<void(FakeChannel&)> moves[] = {
+        [](FakeChannel& source) { source.Seek(5); },
+        [](FakeChannel& source) { source.SeekRelative(-1); },
+        [](FakeChannel& source) { source.SeekEnd(); },
+        [](FakeChannel& source) {
+            source.Close();
+            source.fOpen = true;
+        },
+    };
+    for (const auto& move : moves) {
+        FakeChannel source;
+        source.fPieces = {"new"};
+        source.Unread("old", 3);
+        move(source);
+        EXPECT_EQ(ReadSomeText(source, 9), "new");
+    }
+}
+
+TEST(Reader, PushbackOfAnotherTargetIsForgotten)
+{
+    FakeChannel first;
+    FakeChannel second;
+    second.fPieces = {"second"};
+    pmutil::RandomAccess channel(&first);
+    channel.Unread("first", 5);
+    channel.SetRandomAccess(&first, false);
+    EXPECT_EQ(ReadSomeText(channel, 2), "fi");
+    channel.SetRandomAccess(&second, false);
+    EXPECT_EQ(ReadSomeText(channel, 9), "second");
+}
+
+TEST(Reader, PushbackOutlivesASeekThatFails)
+{
+    pmutil::Buffer source(3);
+    source.Unread("old", 3);
+    EXPECT_ANY_THROW(source.Seek(9));
+    EXPECT_EQ(ReadSomeText(source, 9), "old");
 }
 
 TEST(Reader, EmptyPushbackGoesStraightOnToTheSource)
