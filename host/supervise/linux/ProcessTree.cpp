@@ -8,9 +8,10 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <chrono>
 #include <fstream>
-#include <set>
+#include <map>
 #include <sstream>
 #include <string>
 #include <thread>
@@ -27,23 +28,36 @@ bool HasChildren()
     return ::waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT) == 0 || errno != ECHILD;
 }
 
-// 0 if there is no such process any more.
-::pid_t GetParent(const std::string& process)
+struct Status {
+    char fState = 'X';
+    ::pid_t fParent = 0; // 0 if there is no such process any more
+};
+
+Status ReadStatus(const std::string& process)
 {
+    Status result;
     std::ifstream file("/proc/" + process + "/stat");
     std::stringstream text;
     text << file.rdbuf();
     const std::string stat = text.str();
-    // The name, in parentheses, may hold anything; behind it come the state and the parent.
+    // The name, in parentheses, may hold anything; after it come the state and the parent.
     const std::size_t name = stat.rfind(')');
     if (name == std::string::npos || name + 4 >= stat.size())
-        return 0;
-    return static_cast<::pid_t>(std::strtol(stat.c_str() + name + 4, nullptr, 10));
+        return result;
+    result.fState = stat[name + 2];
+    result.fParent = static_cast<::pid_t>(std::strtol(stat.c_str() + name + 4, nullptr, 10));
+    return result;
 }
 
-std::set<::pid_t> ListChildren()
+bool HasEnded(char state)
 {
-    std::set<::pid_t> result;
+    return state == 'Z' || state == 'X';
+}
+
+// The children of this process, with their states.
+std::map<::pid_t, char> ListChildren()
+{
+    std::map<::pid_t, char> result;
     if (!HasChildren())
         return result;
     DIR* const folder = ::opendir("/proc");
@@ -53,8 +67,12 @@ std::set<::pid_t> ListChildren()
     // NOLINTNEXTLINE(concurrency-mt-unsafe): each stream is read by one thread
     while (const dirent* entry = ::readdir(folder)) {
         const std::string name = entry->d_name;
-        if (name.find_first_not_of("0123456789") == std::string::npos && GetParent(name) == self)
-            result.insert(static_cast<::pid_t>(std::strtol(name.c_str(), nullptr, 10)));
+        if (name.find_first_not_of("0123456789") != std::string::npos)
+            continue;
+        const Status status = ReadStatus(name);
+        if (status.fParent == self)
+            result.emplace(static_cast<::pid_t>(std::strtol(name.c_str(), nullptr, 10)),
+                           status.fState);
     }
     ::closedir(folder);
     return result;
@@ -77,32 +95,32 @@ public:
         const auto deadline =
             std::chrono::steady_clock::now() + std::chrono::duration<double>(seconds);
         for (;;) {
+            const std::map<::pid_t, char> children = ListNewChildren();
+            if (children.empty())
+                return true;
+            if (std::chrono::steady_clock::now() >= deadline)
+                return std::all_of(children.begin(), children.end(),
+                                   [](const auto& child) { return HasEnded(child.second); });
             bool left = false;
-            for (const ::pid_t child : ListChildren()) {
-                if (fBefore.count(child) != 0)
-                    continue;
+            for (const auto& [child, state] : children) {
                 ::kill(child, SIGKILL);
                 left = ::waitpid(child, nullptr, WNOHANG) == 0 || left;
             }
-            if (!left && !HasNewChildren())
-                return true;
-            if (std::chrono::steady_clock::now() >= deadline)
-                return false;
-            std::this_thread::sleep_for(kPause);
+            if (left)
+                std::this_thread::sleep_for(kPause);
         }
     }
 
 private:
-    bool HasNewChildren() const
+    std::map<::pid_t, char> ListNewChildren() const
     {
-        for (const ::pid_t child : ListChildren()) {
-            if (fBefore.count(child) == 0)
-                return true;
-        }
-        return false;
+        std::map<::pid_t, char> children = ListChildren();
+        for (const auto& [child, state] : fBefore)
+            children.erase(child);
+        return children;
     }
 
-    const std::set<::pid_t> fBefore;
+    const std::map<::pid_t, char> fBefore;
 };
 
 ProcessTree::ProcessTree() : fPlatform(std::make_unique<Platform>()) {}
