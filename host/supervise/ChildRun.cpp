@@ -38,10 +38,11 @@ constexpr double kJoinSeconds = 0.3;
 
 class Supervision {
 public:
-    Supervision(const ChildOptions& options, RunObserver& observer,
+    Supervision(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
                 boost::shared_ptr<pmutil::Launcher> launcher)
         : fOptions(options),
           fObserver(observer),
+          fStop(stop),
           fPlatformLauncher(std::move(launcher)),
           fReader(options.fLimits)
     {
@@ -49,11 +50,18 @@ public:
         fOutcome.fCommand.insert(fOutcome.fCommand.end(), options.fArgs.begin(),
                                  options.fArgs.end());
         fOutcome.fTimeoutSeconds = options.fTimeoutSeconds;
+        fStop.SetListener([queue = fQueue] { queue->Wake(); });
     }
+
+    ~Supervision() { fStop.SetListener({}); }
+    Supervision(const Supervision&) = delete;
+    Supervision& operator=(const Supervision&) = delete;
 
     RunOutcome Run()
     {
-        if (Launch()) {
+        if (fStop.IsRaised()) {
+            fEvidence.fKillReason = KillReason::kInterrupt;
+        } else if (Launch()) {
             try {
                 fObserver.OnStart();
                 Follow();
@@ -185,18 +193,17 @@ private:
     void Tick()
     {
         const Clock::time_point now = Clock::now();
-        const bool outOfTime =
-            fOptions.fTimeoutSeconds > 0 && GetSeconds() >= fOptions.fTimeoutSeconds;
-        if (now - fLastTick < kTick && !outOfTime)
-            return;
-        fLastTick = now;
-        fObserver.OnTick(GetSeconds());
+        if (now - fLastTick >= kTick) {
+            fLastTick = now;
+            fObserver.OnTick(GetSeconds());
+            if (!fKilled && !fEnded)
+                LookForFailure();
+        }
         if (fKilled || fEnded)
             return;
-        LookForFailure();
-        if (fObserver.ShouldStop())
+        if (fStop.IsRaised())
             Kill(KillReason::kInterrupt);
-        else if (outOfTime)
+        else if (fOptions.fTimeoutSeconds > 0 && GetSeconds() >= fOptions.fTimeoutSeconds)
             Kill(KillReason::kTimeout);
     }
 
@@ -236,7 +243,7 @@ private:
 
     void Finish()
     {
-        if (fEvidence.fKillReason == KillReason::kNone && fObserver.ShouldStop())
+        if (fEvidence.fKillReason == KillReason::kNone && fStop.IsRaised())
             fEvidence.fKillReason = KillReason::kInterrupt; // which the child has seen first
         while (const std::optional<Event> event = fQueue->Pop(milliseconds(0)))
             Take(*event);
@@ -266,6 +273,7 @@ private:
 
     const ChildOptions& fOptions;
     RunObserver& fObserver;
+    StopRequest& fStop;
     const boost::shared_ptr<pmutil::Launcher> fPlatformLauncher;
     const boost::shared_ptr<EventQueue> fQueue = boost::make_shared<EventQueue>();
     const boost::shared_ptr<WatchedLauncher> fLauncher =
@@ -293,15 +301,15 @@ private:
 
 } // namespace
 
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer)
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop)
 {
-    return RunChild(options, observer, pmutil::MakeLauncher());
+    return RunChild(options, observer, stop, pmutil::MakeLauncher());
 }
 
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer,
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
                     const boost::shared_ptr<pmutil::Launcher>& launcher)
 {
-    return Supervision(options, observer, launcher).Run();
+    return Supervision(options, observer, stop, launcher).Run();
 }
 
 } // namespace assay_host

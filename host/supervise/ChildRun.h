@@ -9,6 +9,7 @@
 #include "pmutil/Launcher.h"
 #include "report/ReportReader.h"
 #include "report/RunOutcome.h"
+#include "supervise/StopRequest.h"
 
 namespace assay_host {
 
@@ -20,7 +21,8 @@ struct ChildOptions {
 };
 
 // Told what comes while the child runs. All calls come from the thread that called RunChild, which
-// can't look after the child meanwhile. What a call throws ends the child and leaves RunChild.
+// can't look after the child meanwhile: no call may wait for anything. What a call throws ends the
+// child and leaves RunChild.
 class RunObserver {
 public:
     virtual ~RunObserver() = default;
@@ -28,19 +30,19 @@ public:
     virtual void OnLine(const ReportLine& /*line*/, double /*seconds*/) {}
     virtual void OnErrorLine(const std::string& /*line*/, double /*seconds*/) {}
     virtual void OnTick(double /*seconds*/) {} // about ten times a second
-
-    // Asked about ten times a second; true kills the child, and the verdict is interrupted.
-    virtual bool ShouldStop() { return false; }
 };
 
 // Launches the child with its standard input closed, waits for its end no longer than the timeout,
 // kills it then, ends what it left behind, and judges. Returns within the timeout plus two seconds,
 // whatever the child does. Never throws for what the child or the system does; that is in the
 // outcome.
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer);
+//
+// A stop that is raised kills the child at once, and the verdict is interrupted; if it was raised
+// before, there is no child. The stop's listener is this function's while it runs.
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop);
 
 // The same with another launcher, used for this run alone.
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer,
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
                     const boost::shared_ptr<pmutil::Launcher>& launcher);
 
 } // namespace assay_host

@@ -2,8 +2,6 @@
 
 #include <utility>
 
-#include <boost/thread/lock_guard.hpp>
-
 namespace assay_host {
 
 namespace {
@@ -14,9 +12,9 @@ constexpr std::size_t kMaxBytes = std::size_t{1} << 18;
 
 void EventQueue::Push(Event event)
 {
-    boost::unique_lock<boost::mutex> lock(fMutex);
-    while (!fClosed && fBytes > 0 && fBytes + event.fBytes.size() > kMaxBytes)
-        fCond.wait(lock);
+    std::unique_lock<std::mutex> lock(fMutex);
+    fCond.wait(lock,
+               [&] { return fClosed || fBytes == 0 || fBytes + event.fBytes.size() <= kMaxBytes; });
     if (fClosed)
         return;
     fBytes += event.fBytes.size();
@@ -26,13 +24,12 @@ void EventQueue::Push(Event event)
 
 std::optional<Event> EventQueue::Pop(std::chrono::milliseconds limit)
 {
-    boost::unique_lock<boost::mutex> lock(fMutex);
-    const boost::system_time deadline =
-        boost::get_system_time() + boost::posix_time::milliseconds(limit.count());
-    while (fEvents.empty()) {
-        if (!fCond.timed_wait(lock, deadline) && fEvents.empty())
-            return std::nullopt;
-    }
+    std::unique_lock<std::mutex> lock(fMutex);
+    fCond.wait_until(lock, std::chrono::steady_clock::now() + limit,
+                     [this] { return fWoken || !fEvents.empty(); });
+    fWoken = false;
+    if (fEvents.empty())
+        return std::nullopt;
     Event event = std::move(fEvents.front());
     fEvents.pop_front();
     fBytes -= event.fBytes.size();
@@ -40,9 +37,16 @@ std::optional<Event> EventQueue::Pop(std::chrono::milliseconds limit)
     return event;
 }
 
+void EventQueue::Wake()
+{
+    const std::lock_guard<std::mutex> lock(fMutex);
+    fWoken = true;
+    fCond.notify_all();
+}
+
 void EventQueue::Close()
 {
-    const boost::lock_guard<boost::mutex> lock(fMutex);
+    const std::lock_guard<std::mutex> lock(fMutex);
     fClosed = true;
     fEvents.clear();
     fBytes = 0;

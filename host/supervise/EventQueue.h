@@ -3,14 +3,13 @@
 #pragma once
 
 #include <chrono>
+#include <condition_variable>
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <mutex>
 #include <optional>
 #include <string>
-
-#include <boost/thread/condition_variable.hpp>
-#include <boost/thread/mutex.hpp>
 
 #include "pmutil/ConsoleAppTypes.h"
 
@@ -34,17 +33,22 @@ public:
     // Waits while too many bytes are held. After Close it drops the event.
     void Push(Event event);
 
-    // The oldest event; nothing if none came within the time.
+    // The oldest event; nothing if none came within the time, whatever the system's clock is set to
+    // meanwhile, or before a Wake.
     std::optional<Event> Pop(std::chrono::milliseconds limit);
+
+    // The Pop under way, or else the next one, doesn't wait.
+    void Wake();
 
     // Nobody will take events any more.
     void Close();
 
 private:
-    boost::mutex fMutex;
-    boost::condition_variable fCond;
+    std::mutex fMutex;
+    std::condition_variable fCond;
     std::deque<Event> fEvents;
     std::size_t fBytes = 0;
+    bool fWoken = false;
     bool fClosed = false;
 };
 

@@ -1,39 +1,46 @@
 #include "supervise/Interrupt.h"
 
-#include <atomic>
+#include <cerrno>
 #include <csignal>
-#include <initializer_list>
+
+#include <thread>
+#include <utility>
+
+#include "supervise/InterruptNotes.h"
+#include "supervise/linux/Guarded.h"
+#include "supervise/linux/Signals.h"
 
 namespace assay_host {
 
-namespace {
-
-std::atomic<bool> gInterrupted{false};
-static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler sets it");
-
-void NoteInterrupt(int /*number*/)
+void PrepareSignals()
 {
-    gInterrupted = true;
+    std::signal(SIGCHLD, SIG_DFL);
+    std::signal(SIGPIPE, SIG_IGN);
+    std::signal(SIGXFSZ, SIG_IGN);
+    sigset_t none;
+    ::sigemptyset(&none);
+    ::pthread_sigmask(SIG_SETMASK, &none, nullptr);
 }
 
-} // namespace
-
-void WatchForInterrupt()
+void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
 {
-    struct sigaction action = {};
-    action.sa_handler = NoteInterrupt;
-    action.sa_flags = static_cast<int>(SA_RESETHAND) | SA_RESTART;
-    for (const int number : {SIGINT, SIGTERM, SIGHUP}) {
-        struct sigaction before = {};
-        ::sigaction(number, nullptr, &before);
-        if (before.sa_handler != SIG_IGN) // as nohup has it
-            ::sigaction(number, &action, nullptr);
-    }
-}
-
-bool WasInterrupted()
-{
-    return gInterrupted;
+    SetInterruptStop(std::move(stop));
+    // In the background of a terminal the run goes on.
+    std::signal(SIGTTIN, SIG_IGN);
+    std::signal(SIGTTOU, SIG_IGN);
+    const sigset_t awaited = GetEndSignals();
+    // Of all threads, since all come from this one.
+    ::pthread_sigmask(SIG_SETMASK, &awaited, nullptr);
+    std::thread([awaited] {
+        for (;;) {
+            if (::sigwaitinfo(&awaited, nullptr) < 0)
+                continue;
+            NoteInterrupt();
+            if (!IsGuarded())
+                NoteInterrupt(); // the user ended what the user can see: there is nothing to wait
+                                 // for
+        }
+    }).detach();
 }
 
 } // namespace assay_host

@@ -2,37 +2,34 @@
 
 #include <windows.h>
 
-#include <atomic>
+#include <utility>
+
+#include "supervise/InterruptNotes.h"
 
 namespace assay_host {
 
 namespace {
 
-std::atomic<bool> gInterrupted{false};
-
 // Windows ends the process when this returns after a closed console, a logoff or a shutdown; it
 // allows some seconds before.
 constexpr DWORD kTimeForTheEnd = 4000;
 
-BOOL WINAPI NoteInterrupt(DWORD event)
+BOOL WINAPI TakeEvent(DWORD event)
 {
-    const bool second = gInterrupted.exchange(true);
-    if (event == CTRL_C_EVENT || event == CTRL_BREAK_EVENT)
-        return second ? FALSE : TRUE;
-    ::Sleep(kTimeForTheEnd);
+    NoteInterrupt();
+    if (event != CTRL_C_EVENT && event != CTRL_BREAK_EVENT)
+        ::Sleep(kTimeForTheEnd);
     return TRUE;
 }
 
 } // namespace
 
-void WatchForInterrupt()
-{
-    ::SetConsoleCtrlHandler(NoteInterrupt, TRUE);
-}
+void PrepareSignals() {}
 
-bool WasInterrupted()
+void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
 {
-    return gInterrupted;
+    SetInterruptStop(std::move(stop));
+    ::SetConsoleCtrlHandler(TakeEvent, TRUE);
 }
 
 } // namespace assay_host

@@ -36,9 +36,13 @@ public:
     {
         fErrorLines.push_back(line);
     }
-    void OnTick(double /*seconds*/) override { ++fTicks; }
-    bool ShouldStop() override { return fStopAtTick > 0 && fTicks >= fStopAtTick; }
+    void OnTick(double /*seconds*/) override
+    {
+        if (++fTicks == fStopAtTick)
+            fStop->Raise();
+    }
 
+    std::shared_ptr<StopRequest> fStop = std::make_shared<StopRequest>();
     int fStarts = 0;
     int fTicks = 0;
     int fStopAtTick = 0;
@@ -64,7 +68,7 @@ Watched RunTestChild(std::vector<std::string> args, double timeout = 30, int sto
     options.fArgs = std::move(args);
     options.fTimeoutSeconds = timeout;
     const auto start = std::chrono::steady_clock::now();
-    run.fOutcome = RunChild(options, run.fRecorder);
+    run.fOutcome = RunChild(options, run.fRecorder, *run.fRecorder.fStop);
     run.fWallSeconds =
         std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
     return run;
@@ -145,6 +149,19 @@ TEST(ChildRun, StopsWhenItIsToldTo)
     EXPECT_FALSE(run.fOutcome.fLeftBehind);
 }
 
+TEST(ChildRun, StartsNothingOnceItIsToldToStop)
+{
+    Recorder recorder;
+    recorder.fStop->Raise();
+    ChildOptions options;
+    options.fProgram = TEST_CHILD;
+    options.fArgs = kWhole;
+    const RunOutcome outcome = RunChild(options, recorder, *recorder.fStop);
+    EXPECT_EQ(outcome.fVerdict, Verdict::kInterrupted);
+    EXPECT_EQ(recorder.fStarts, 0);
+    EXPECT_THAT(recorder.fLines, IsEmpty());
+}
+
 TEST(ChildRun, FollowsAChildThatClosedItsStreams)
 {
     const Watched run = RunTestChild(kWhole + std::vector<std::string>{"close", "sleep", "300"});
@@ -196,7 +213,7 @@ TEST(ChildRun, LosesNothingToASlowObserver)
         options.fArgs.emplace_back("out");
         options.fArgs.push_back("line" + std::to_string(line) + "=1");
     }
-    run.fOutcome = RunChild(options, run.fRecorder);
+    run.fOutcome = RunChild(options, run.fRecorder, *run.fRecorder.fStop);
     EXPECT_EQ(run.fRecorder.fLines.size(), 10U);
 }
 
@@ -272,7 +289,8 @@ Watched RunStubborn(bool ends)
     options.fProgram = "stubborn";
     options.fTimeoutSeconds = 0.3;
     const auto start = std::chrono::steady_clock::now();
-    run.fOutcome = RunChild(options, run.fRecorder, boost::make_shared<StubbornLauncher>(ends));
+    run.fOutcome = RunChild(options, run.fRecorder, *run.fRecorder.fStop,
+                            boost::make_shared<StubbornLauncher>(ends));
     run.fWallSeconds =
         std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
     return run;

@@ -1,0 +1,137 @@
+#include "supervise/Guardian.h"
+
+#include <cerrno>
+#include <csignal>
+#include <sys/prctl.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include "supervise/Interrupt.h"
+#include "supervise/ProcessTree.h"
+#include "supervise/linux/Guarded.h"
+
+namespace assay_host {
+
+namespace {
+
+constexpr double kTreeSeconds = 0.9;
+
+// Shells tell the end by a signal like this.
+constexpr int kSignalStatus = 128;
+
+// A name of its own keeps the worker from what is meant for all processes of the program's name.
+constexpr char kWorkerName[] = "assay-worker";
+
+// Tells the worker that its guardian has ended. Nobody else's, as a rule.
+int GetDeathSignal()
+{
+    return SIGRTMAX;
+}
+
+::pid_t gGuardian = 0;
+
+// Waits for its worker, and ends as it did.
+class Guardian {
+public:
+    Guardian(::pid_t worker, ProcessTree& tree) : fWorker(worker), fTree(tree) {}
+
+    [[noreturn]] void Watch(const sigset_t& awaited)
+    {
+        siginfo_t end = {};
+        for (;;) {
+            const int number = ::sigwaitinfo(&awaited, nullptr);
+            if (number == SIGCHLD) {
+                if (::waitid(P_PID, static_cast<id_t>(fWorker), &end, WEXITED | WNOHANG) == 0 &&
+                    end.si_pid != 0)
+                    break;
+            } else if (number == SIGTSTP) {
+                Suspend();
+            } else if (number > 0) {
+                ::kill(fWorker, number); // a number that is its own until it is waited for
+            }
+        }
+        fTree.EndAll(kTreeSeconds);
+        if (end.si_code != CLD_EXITED)
+            EndBy(end.si_status);
+        EndProcess(end.si_status);
+    }
+
+private:
+    // The worker's group isn't the terminal's, and so isn't reached by Ctrl-Z.
+    void Suspend() const
+    {
+        ::kill(-fWorker, SIGSTOP);
+        ::kill(::getpid(), SIGSTOP);
+        ::kill(-fWorker, SIGCONT);
+    }
+
+    [[noreturn]] static void EndBy(int number)
+    {
+        std::signal(number, SIG_DFL);
+        sigset_t only;
+        ::sigemptyset(&only);
+        ::sigaddset(&only, number);
+        ::sigprocmask(SIG_UNBLOCK, &only, nullptr);
+        ::kill(::getpid(), number);
+        EndProcess(kSignalStatus + number);
+    }
+
+    const ::pid_t fWorker;
+    ProcessTree& fTree;
+};
+
+// All signals but those that are ignored, since even these would come where they are blocked, and
+// those that are to do what they always do.
+sigset_t GetGuardianSignals()
+{
+    sigset_t result;
+    ::sigfillset(&result);
+    for (int number = 1; number <= SIGRTMAX; ++number) {
+        struct sigaction action = {};
+        if (::sigaction(number, nullptr, &action) == 0 && action.sa_handler == SIG_IGN)
+            ::sigdelset(&result, number);
+    }
+    for (const int number : {SIGCONT, SIGURG, SIGWINCH})
+        ::sigdelset(&result, number);
+    return result;
+}
+
+void BecomeWorker()
+{
+    ::setpgid(0, 0);
+    ::prctl(PR_SET_NAME, kWorkerName, 0, 0, 0);
+    std::signal(GetDeathSignal(), SIG_DFL); // a parent may have ignored it
+    ::prctl(PR_SET_PDEATHSIG, GetDeathSignal(), 0, 0, 0);
+    if (!IsGuarded())
+        EndProcess(kSignalStatus + SIGKILL); // it ended before this, and nothing is started yet
+}
+
+} // namespace
+
+bool IsGuarded()
+{
+    return gGuardian == 0 || ::getppid() == gGuardian;
+}
+
+void GuardProcess()
+{
+    const sigset_t awaited = GetGuardianSignals();
+    sigset_t before;
+    ::sigprocmask(SIG_SETMASK, &awaited, &before);
+    ProcessTree tree;
+    gGuardian = ::getpid();
+    const ::pid_t worker = ::fork();
+    if (worker == 0) {
+        BecomeWorker();
+        return;
+    }
+    if (worker > 0) {
+        ::setpgid(worker, worker); // whichever of the two is first
+        Guardian(worker, tree).Watch(awaited);
+    }
+    // Where nothing more can be started, nothing is to be guarded.
+    gGuardian = 0;
+    ::sigprocmask(SIG_SETMASK, &before, nullptr);
+}
+
+} // namespace assay_host

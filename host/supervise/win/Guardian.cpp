@@ -1,0 +1,12 @@
+#include "supervise/Guardian.h"
+
+#include "supervise/ProcessTree.h"
+
+namespace assay_host {
+
+void GuardProcess()
+{
+    const ProcessTree job; // which the system ends with this process
+}
+
+} // namespace assay_host
