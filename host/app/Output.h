@@ -14,11 +14,19 @@ public:
     Output(const Output&) = delete;
     Output& operator=(const Output&) = delete;
 
+    // Before anything else: what may have to wait for a reader, as the opening of a pipe with a
+    // name.
+    virtual void Open() {}
+
     // Has reached the system when it returns.
     virtual void Write(std::string_view text) = 0;
 
     // Nothing more comes. A file gets its name here.
     virtual void Finish() = 0;
+
+    // No result will come: deletes a temporary file. May be called from another thread, while one
+    // of the others is under way or stuck.
+    virtual void Abandon() {}
 
 protected:
     Output() = default;

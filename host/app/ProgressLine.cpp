@@ -1,8 +1,8 @@
 #include "app/ProgressLine.h"
 
 #include <algorithm>
-#include <cstdio>
 
+#include "app/Stream.h"
 #include "app/Terminal.h"
 
 namespace assay_host {
@@ -26,16 +26,14 @@ void ProgressLine::Show(std::string text)
     if (length < fLength)
         text.append(fLength - length, ' ');
     fLength = length;
-    std::fprintf(stderr, "\r%s", text.c_str());
-    std::fflush(stderr);
+    WriteStream(StandardStream::kError, "\r" + text);
 }
 
 void ProgressLine::Clear()
 {
     if (fLength == 0)
         return;
-    std::fprintf(stderr, "\r%s\r", std::string(fLength, ' ').c_str());
-    std::fflush(stderr);
+    WriteStream(StandardStream::kError, "\r" + std::string(fLength, ' ') + "\r");
     fLength = 0;
 }
 

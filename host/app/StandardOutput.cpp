@@ -1,9 +1,7 @@
-#include <cerrno>
-#include <cstdio>
 #include <stdexcept>
-#include <system_error>
 
 #include "app/Output.h"
+#include "app/Stream.h"
 
 namespace assay_host {
 
@@ -13,12 +11,8 @@ class StandardOutput : public Output {
 public:
     void Write(std::string_view text) override
     {
-        if (text.empty())
-            return;
-        if (std::fwrite(text.data(), 1, text.size(), stdout) != text.size() ||
-            std::fflush(stdout) != 0)
-            throw std::runtime_error("cannot write to standard output: " +
-                                     std::generic_category().message(errno));
+        if (const std::error_code error = WriteStream(StandardStream::kOutput, text))
+            throw std::runtime_error("cannot write to standard output: " + error.message());
     }
 
     void Finish() override {}

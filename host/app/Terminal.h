@@ -3,9 +3,6 @@
 
 namespace assay_host {
 
-// Standard output takes bytes as they are from now on, also where text would get other line ends.
-void PrepareStandardOutput();
-
 bool IsErrorTerminal();
 
 // The columns of the terminal behind standard output, or what is usual where there is none.

@@ -1,3 +1,4 @@
+#include <atomic>
 #include <cerrno>
 #include <fcntl.h>
 #include <stdexcept>
@@ -8,6 +9,7 @@
 #include <boost/filesystem/operations.hpp>
 
 #include "app/Output.h"
+#include "app/linux/WriteAll.h"
 
 namespace assay_host {
 
@@ -21,12 +23,11 @@ public:
     {
         struct stat found = {};
         const bool exists = ::stat(fPath.c_str(), &found) == 0;
-        if (exists && !S_ISREG(found.st_mode)) {
-            Open(fPath, O_WRONLY);
+        if (exists && !S_ISREG(found.st_mode))
             return;
-        }
         fTemporary = fPath + boost::filesystem::unique_path(".%%%%%%%%.tmp").native();
-        Open(fTemporary, O_WRONLY | O_CREAT | O_EXCL);
+        OpenPath(fTemporary, O_WRONLY | O_CREAT | O_EXCL);
+        fHasTemporary = true;
         if (exists)
             ::fchmod(fFile, found.st_mode);
     }
@@ -35,19 +36,19 @@ public:
     {
         if (fFile >= 0)
             ::close(fFile);
-        if (!fTemporary.empty())
-            ::unlink(fTemporary.c_str());
+        Abandon();
+    }
+
+    void Open() override
+    {
+        if (fTemporary.empty())
+            OpenPath(fPath, O_WRONLY);
     }
 
     void Write(std::string_view text) override
     {
-        while (!text.empty()) {
-            const ::ssize_t count = ::write(fFile, text.data(), text.size());
-            if (count >= 0)
-                text.remove_prefix(static_cast<std::size_t>(count));
-            else if (errno != EINTR)
-                Fail();
-        }
+        if (const std::error_code error = WriteAll(fFile, text))
+            Fail(error.value());
     }
 
     void Finish() override
@@ -56,8 +57,14 @@ public:
             return;
         if (::fsync(fFile) != 0 || ::close(std::exchange(fFile, -1)) != 0 ||
             ::rename(fTemporary.c_str(), fPath.c_str()) != 0)
-            Fail();
-        fTemporary.clear();
+            Fail(errno);
+        fHasTemporary = false;
+    }
+
+    void Abandon() override
+    {
+        if (fHasTemporary.exchange(false))
+            ::unlink(fTemporary.c_str());
     }
 
 private:
@@ -69,24 +76,23 @@ private:
         return error ? path : resolved.native();
     }
 
-    void Open(const std::string& path, int flags)
+    void OpenPath(const std::string& path, int flags)
     {
         fFile = ::open(path.c_str(), flags | O_CLOEXEC, kMode);
-        if (fFile < 0) {
-            fTemporary.clear();
-            Fail();
-        }
+        if (fFile < 0)
+            Fail(errno);
     }
 
-    [[noreturn]] void Fail() const
+    [[noreturn]] void Fail(int error) const
     {
         throw std::runtime_error("cannot write " + fName + ": " +
-                                 std::generic_category().message(errno));
+                                 std::generic_category().message(error));
     }
 
     const std::string fName;
     const std::string fPath;
-    std::string fTemporary; // empty if there is none
+    std::string fTemporary; // empty if what is there is written to directly; set by the constructor
+    std::atomic<bool> fHasTemporary{false};
     int fFile = -1;
 };
 

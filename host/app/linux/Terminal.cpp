@@ -19,8 +19,6 @@ int GetWidth(int stream)
 
 } // namespace
 
-void PrepareStandardOutput() {}
-
 bool IsErrorTerminal()
 {
     return ::isatty(STDERR_FILENO) != 0;

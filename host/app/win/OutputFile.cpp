@@ -1,19 +1,18 @@
 #include <windows.h>
 
-#include <algorithm>
+#include <atomic>
 #include <stdexcept>
 #include <system_error>
 
 #include <boost/filesystem/operations.hpp>
 
 #include "app/Output.h"
+#include "app/win/WriteAll.h"
 #include "supervise/Paths.h"
 
 namespace assay_host {
 
 namespace {
-
-constexpr std::size_t kMaxWrite = std::size_t{1} << 20;
 
 class OutputFile : public Output {
 public:
@@ -21,32 +20,30 @@ public:
     {
         boost::system::error_code error;
         const boost::filesystem::file_type type = boost::filesystem::status(fPath, error).type();
-        if (type != boost::filesystem::file_not_found && type != boost::filesystem::regular_file) {
-            Open(fPath, OPEN_EXISTING);
+        if (type != boost::filesystem::file_not_found && type != boost::filesystem::regular_file)
             return;
-        }
         fTemporary = fPath;
         fTemporary += boost::filesystem::unique_path(L".%%%%%%%%.tmp");
-        Open(fTemporary, CREATE_NEW);
+        OpenPath(fTemporary, CREATE_NEW);
+        fHasTemporary = true;
     }
 
     ~OutputFile() override
     {
         Close();
-        if (!fTemporary.empty())
-            ::DeleteFileW(fTemporary.c_str());
+        Abandon();
+    }
+
+    void Open() override
+    {
+        if (fTemporary.empty())
+            OpenPath(fPath, OPEN_EXISTING);
     }
 
     void Write(std::string_view text) override
     {
-        while (!text.empty()) {
-            DWORD count = 0;
-            if (::WriteFile(fFile, text.data(),
-                            static_cast<DWORD>(std::min(text.size(), kMaxWrite)), &count,
-                            nullptr) == 0)
-                Fail();
-            text.remove_prefix(count);
-        }
+        if (const std::error_code error = WriteAll(fFile, text))
+            Fail(error);
     }
 
     void Finish() override
@@ -54,23 +51,27 @@ public:
         if (fTemporary.empty())
             return;
         if (::FlushFileBuffers(fFile) == 0)
-            Fail();
+            Fail(GetLastCode());
         Close();
         if (::MoveFileExW(fTemporary.c_str(), fPath.c_str(),
                           MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH) == 0)
-            Fail();
-        fTemporary.clear();
+            Fail(GetLastCode());
+        fHasTemporary = false;
+    }
+
+    void Abandon() override
+    {
+        if (fHasTemporary.exchange(false))
+            ::DeleteFileW(fTemporary.c_str());
     }
 
 private:
-    void Open(const boost::filesystem::path& path, DWORD disposition)
+    void OpenPath(const boost::filesystem::path& path, DWORD disposition)
     {
-        fFile = ::CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr, disposition,
-                              FILE_ATTRIBUTE_NORMAL, nullptr);
-        if (fFile == INVALID_HANDLE_VALUE) {
-            fTemporary.clear();
-            Fail();
-        }
+        fFile = ::CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ | FILE_SHARE_DELETE,
+                              nullptr, disposition, FILE_ATTRIBUTE_NORMAL, nullptr);
+        if (fFile == INVALID_HANDLE_VALUE)
+            Fail(GetLastCode());
     }
 
     void Close()
@@ -80,16 +81,20 @@ private:
         fFile = INVALID_HANDLE_VALUE;
     }
 
-    [[noreturn]] void Fail() const
+    static std::error_code GetLastCode()
     {
-        const auto error = static_cast<int>(::GetLastError());
-        throw std::runtime_error("cannot write " + fName + ": " +
-                                 std::system_category().message(error));
+        return {static_cast<int>(::GetLastError()), std::system_category()};
+    }
+
+    [[noreturn]] void Fail(const std::error_code& error) const
+    {
+        throw std::runtime_error("cannot write " + fName + ": " + error.message());
     }
 
     const std::string fName;
     const boost::filesystem::path fPath;
-    boost::filesystem::path fTemporary; // empty if there is none
+    boost::filesystem::path fTemporary; // empty if what is there is written to directly
+    std::atomic<bool> fHasTemporary{false};
     HANDLE fFile = INVALID_HANDLE_VALUE;
 };
 

@@ -2,10 +2,6 @@
 
 #include <windows.h>
 
-#include <cstdio>
-#include <fcntl.h>
-#include <io.h>
-
 namespace assay_host {
 
 namespace {
@@ -28,11 +24,6 @@ int GetWidth(DWORD stream)
 }
 
 } // namespace
-
-void PrepareStandardOutput()
-{
-    ::_setmode(::_fileno(stdout), _O_BINARY);
-}
 
 bool IsErrorTerminal()
 {
