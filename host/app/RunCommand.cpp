@@ -1,5 +1,4 @@
-#include <cstdio>
-#include <exception>
+#include <memory>
 #include <sstream>
 #include <utility>
 
@@ -7,14 +6,16 @@
 #include <nlohmann/json.hpp>
 
 #include "app/Commands.h"
+#include "app/Delivery.h"
 #include "app/FindAssay.h"
 #include "app/Output.h"
-#include "app/ProgressLine.h"
 #include "app/Terminal.h"
+#include "app/WriterThread.h"
 #include "report/JsonDocument.h"
 #include "report/Report.h"
 #include "report/TextView.h"
 #include "supervise/ChildRun.h"
+#include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
 #include "supervise/Position.h"
 
@@ -24,56 +25,51 @@ namespace {
 
 constexpr int kFileWidth = 100;
 
-// Takes the report in, and says at once what is to be said at once.
+// Takes the report in, and has said at once what is to be said at once.
 class Session : public RunObserver {
 public:
-    Session(const RunChoice& choice, Output& output) : fChoice(choice), fOutput(output) {}
+    Session(const RunChoice& choice, WriterThread& writer) : fChoice(choice), fWriter(writer) {}
 
     void Start(const std::vector<std::string>& command)
     {
         if (fChoice.fFormat == Format::kJsonLines)
-            WriteEvent(MakeStartEvent(command));
+            WriteEvent([command] { return MakeStartEvent(command); });
     }
 
     void OnLine(const ReportLine& line, double seconds) override
     {
         fPosition.Add(line);
         if (fChoice.fFormat == Format::kJsonLines)
-            WriteEvent(MakeLineEvent(line, seconds));
+            WriteEvent([line, seconds] { return MakeLineEvent(line, seconds); });
         else
             fReport.Add(line);
         if (fChoice.fRaw)
-            Write(line.fText + line.fLineEnd);
+            fWriter.Write(line.fText + line.fLineEnd);
     }
 
     void OnErrorLine(const std::string& line, double seconds) override
     {
         if (fChoice.fFormat == Format::kJsonLines)
-            WriteEvent(MakeErrorLineEvent(line, seconds));
-        if (fChoice.fRaw) {
-            fProgress.Clear();
-            std::fprintf(stderr, "%s\n", line.c_str());
-        }
+            WriteEvent([line, seconds] { return MakeErrorLineEvent(line, seconds); });
+        if (fChoice.fRaw)
+            fWriter.WriteError([line] { return line + "\n"; });
     }
 
     void OnTick(double seconds) override
     {
         const std::string next = fPosition.GetNextKey();
-        fProgress.Show(fmt::format("{:.1f} s, {} steps, {}", seconds, fPosition.GetSteps(),
-                                   next.empty() ? "at the end" : "at " + next));
+        fWriter.ShowProgress(fmt::format("{:.1f} s, {} steps, {}", seconds, fPosition.GetSteps(),
+                                         next.empty() ? "at the end" : "at " + next));
     }
-
-    bool ShouldStop() override { return WasInterrupted() || fFailure != nullptr; }
 
     void Finish(const RunOutcome& outcome)
     {
-        fProgress.Clear();
         switch (fChoice.fFormat) {
         case Format::kJsonLines:
-            WriteEvent(MakeEndEvent(outcome));
+            WriteEvent([outcome] { return MakeEndEvent(outcome); });
             break;
         case Format::kJson:
-            Write(MakeDocument(fReport, outcome).dump(2) + "\n");
+            fWriter.Write(MakeDocument(fReport, outcome).dump(2) + "\n");
             break;
         case Format::kText: {
             std::ostringstream text;
@@ -81,52 +77,43 @@ public:
                 text << "\n";
             PrintText(text, fReport, outcome,
                       fChoice.fOutput.empty() ? GetOutputWidth() : kFileWidth);
-            Write(text.str());
+            fWriter.Write(text.str());
         }
         }
-        if (fFailure != nullptr)
-            std::rethrow_exception(fFailure);
-        fOutput.Finish();
     }
 
 private:
-    void WriteEvent(const nlohmann::ordered_json& event) { Write(event.dump() + "\n"); }
-
-    // Throws only from Finish: the child must be ended before.
-    void Write(const std::string& text)
+    template <class MakeEvent>
+    void WriteEvent(MakeEvent makeEvent)
     {
-        if (fFailure != nullptr)
-            return;
-        fProgress.Clear();
-        try {
-            fOutput.Write(text);
-        } catch (...) {
-            fFailure = std::current_exception();
-        }
+        fWriter.Write([makeEvent = std::move(makeEvent)] { return makeEvent().dump() + "\n"; });
     }
 
     const RunChoice& fChoice;
-    Output& fOutput;
-    ProgressLine fProgress;
+    WriterThread& fWriter;
     Report fReport;
     Position fPosition;
-    std::exception_ptr fFailure;
 };
 
 } // namespace
 
 int Run(const RunChoice& choice)
 {
-    const std::unique_ptr<Output> output =
-        choice.fOutput.empty() ? OpenStandardOutput() : OpenFile(choice.fOutput);
+    GuardProcess();
+    const auto stop = std::make_shared<StopRequest>();
+    WatchForInterrupt(stop);
+    const auto writer = std::make_shared<WriterThread>(
+        choice.fOutput.empty() ? OpenStandardOutput() : OpenFile(choice.fOutput),
+        [stop] { stop->Raise(); });
     const ChildOptions options = MakeChildOptions(choice.fChild);
-    WatchForInterrupt();
-    Session session(choice, *output);
+    Session session(choice, *writer);
     std::vector<std::string> command = {options.fProgram};
     command.insert(command.end(), options.fArgs.begin(), options.fArgs.end());
     session.Start(command);
-    const RunOutcome outcome = RunChild(options, session);
+    const RunOutcome outcome = RunChild(options, session, *stop);
+    const Delivery delivery(writer);
     session.Finish(outcome);
+    delivery.Finish();
     return GetVerdictStatus(outcome.fVerdict);
 }
 

@@ -1,14 +1,18 @@
 #include <chrono>
+#include <memory>
 #include <stdexcept>
+#include <utility>
 
 #include <fmt/format.h>
 
 #include "app/Commands.h"
+#include "app/Delivery.h"
 #include "app/FindAssay.h"
 #include "app/Output.h"
-#include "app/ProgressLine.h"
+#include "app/WriterThread.h"
 #include "report/Report.h"
 #include "supervise/ChildRun.h"
+#include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
 #include "supervise/StepRules.h"
 
@@ -23,7 +27,6 @@ using Clock = std::chrono::steady_clock;
 class Collector : public RunObserver {
 public:
     void OnLine(const ReportLine& line, double /*seconds*/) override { fReport.Add(line); }
-    bool ShouldStop() override { return WasInterrupted(); }
 
     Report fReport;
 };
@@ -38,15 +41,15 @@ std::string ShowCommand(const RunOutcome& outcome)
 
 class Torturer {
 public:
-    explicit Torturer(const TortureChoice& choice)
-        : fChoice(choice), fOptions(MakeChildOptions(choice.fChild))
+    Torturer(const TortureChoice& choice, WriterThread& writer, StopRequest& stop)
+        : fChoice(choice), fOptions(MakeChildOptions(choice.fChild)), fWriter(writer), fStop(stop)
     {}
 
     int Run()
     {
         Collector undisturbed;
-        fProgress.Show("an undisturbed run");
-        const RunOutcome outcome = RunChild(fOptions, undisturbed);
+        fWriter.ShowProgress("an undisturbed run");
+        const RunOutcome outcome = RunChild(fOptions, undisturbed, fStop);
         if (outcome.fVerdict == Verdict::kNeverStarted ||
             outcome.fVerdict == Verdict::kInterrupted) {
             Say(outcome.fReason + "\n");
@@ -78,11 +81,11 @@ private:
         const std::size_t steps = fRules->GetStepCount();
         for (std::size_t step = 0; step <= steps; ++step) {
             const std::string option = fmt::format("-{}={}", GetOptionName(failure), step);
-            fProgress.Show(fmt::format("{} of {}", option, steps));
+            fWriter.ShowProgress(fmt::format("{} of {}", option, steps));
             ChildOptions options = fOptions;
             options.fArgs.push_back(option);
             Collector collector;
-            const RunOutcome outcome = RunChild(options, collector);
+            const RunOutcome outcome = RunChild(options, collector, fStop);
             ++fRuns;
             if (outcome.fVerdict == Verdict::kInterrupted) {
                 Say(fmt::format("Interrupted at {}.\n", option));
@@ -100,17 +103,13 @@ private:
         return 0;
     }
 
-    void Say(const std::string& text)
-    {
-        fProgress.Clear();
-        fOutput->Write(text);
-    }
+    void Say(std::string text) { fWriter.Write(std::move(text)); }
 
     const TortureChoice& fChoice;
     const ChildOptions fOptions;
-    const std::unique_ptr<Output> fOutput = OpenStandardOutput();
+    WriterThread& fWriter;
+    StopRequest& fStop;
     const Clock::time_point fStart = Clock::now();
-    ProgressLine fProgress;
     std::optional<StepRules> fRules;
     std::size_t fRuns = 0;
 };
@@ -119,8 +118,14 @@ private:
 
 int Torture(const TortureChoice& choice)
 {
-    WatchForInterrupt();
-    return Torturer(choice).Run();
+    GuardProcess();
+    const auto stop = std::make_shared<StopRequest>();
+    WatchForInterrupt(stop);
+    const auto writer =
+        std::make_shared<WriterThread>(OpenStandardOutput(), [stop] { stop->Raise(); });
+    const int status = Torturer(choice, *writer, *stop).Run();
+    Delivery(writer).Finish();
+    return status;
 }
 
 } // namespace assay_host

@@ -9,8 +9,9 @@
 #include "app/CommandLine.h"
 #include "app/Commands.h"
 #include "app/Output.h"
-#include "app/Terminal.h"
 #include "pmutil/System.h"
+#include "report/RunOutcome.h"
+#include "supervise/Interrupt.h"
 
 namespace {
 
@@ -48,11 +49,12 @@ int RunMain(const std::vector<std::string>& words)
 int main(int argc, char** argv)
 {
     pmutil::PrepareConsoleProcess();
-    PrepareStandardOutput();
+    PrepareSignals();
     try {
         const boost::nowide::args utf8(argc, argv);
         return RunMain(std::vector<std::string>(argv + 1, argv + argc));
     } catch (const std::exception& exc) {
+        SetInterruptEnd([] { EndProcess(GetVerdictStatus(Verdict::kInterrupted)); });
         std::fprintf(stderr, "assay-host: %s\n", exc.what());
         const bool isDiff = argc > 1 && std::string(argv[1]) == "diff";
         return isDiff ? kDiffTroubleStatus : kTroubleStatus;

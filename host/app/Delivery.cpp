@@ -1,0 +1,38 @@
+#include "app/Delivery.h"
+
+#include <chrono>
+#include <optional>
+#include <utility>
+
+#include "report/RunOutcome.h"
+#include "supervise/Interrupt.h"
+
+namespace assay_host {
+
+namespace {
+
+constexpr std::chrono::milliseconds kPatience{1000};
+
+[[noreturn]] void GiveUp(WriterThread& writer)
+{
+    writer.Abandon();
+    EndProcess(GetVerdictStatus(Verdict::kInterrupted));
+}
+
+} // namespace
+
+Delivery::Delivery(std::shared_ptr<WriterThread> writer) : fWriter(std::move(writer))
+{
+    fInterrupts = SetInterruptEnd([shared = fWriter] { GiveUp(*shared); });
+}
+
+void Delivery::Finish() const
+{
+    std::optional<std::chrono::milliseconds> patience;
+    if (fInterrupts > 0)
+        patience = fInterrupts == 1 ? kPatience : std::chrono::milliseconds(0);
+    if (!fWriter->Finish(patience))
+        GiveUp(*fWriter);
+}
+
+} // namespace assay_host

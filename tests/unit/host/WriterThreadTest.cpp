@@ -1,0 +1,167 @@
+#include "app/WriterThread.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <condition_variable>
+#include <mutex>
+#include <stdexcept>
+#include <thread>
+
+namespace assay_host {
+namespace {
+
+using std::chrono::milliseconds;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+// What an output got, and whether its reader reads.
+struct Reader {
+    void Stop() { SetReads(false); }
+    void GoOn() { SetReads(true); }
+
+    void Take(std::string_view text)
+    {
+        std::unique_lock<std::mutex> lock(fMutex);
+        ++fAsked;
+        fCond.notify_all();
+        fCond.wait(lock, [this] { return fReads; });
+        fTaken.emplace_back(text);
+    }
+
+    void AwaitAsked(int times)
+    {
+        std::unique_lock<std::mutex> lock(fMutex);
+        fCond.wait(lock, [&] { return fAsked >= times; });
+    }
+
+    std::vector<std::string> GetTaken()
+    {
+        const std::lock_guard<std::mutex> lock(fMutex);
+        return fTaken;
+    }
+
+    std::atomic<bool> fFinished{false};
+    std::atomic<bool> fAbandoned{false};
+
+private:
+    void SetReads(bool reads)
+    {
+        const std::lock_guard<std::mutex> lock(fMutex);
+        fReads = reads;
+        fCond.notify_all();
+    }
+
+    std::mutex fMutex;
+    std::condition_variable fCond;
+    std::vector<std::string> fTaken;
+    bool fReads = true;
+    int fAsked = 0;
+};
+
+class TestOutput : public Output {
+public:
+    explicit TestOutput(std::shared_ptr<Reader> reader) : fReader(std::move(reader)) {}
+
+    void Write(std::string_view text) override
+    {
+        if (text == "bad")
+            throw std::runtime_error("no room");
+        fReader->Take(text);
+    }
+    void Finish() override { fReader->fFinished = true; }
+    void Abandon() override { fReader->fAbandoned = true; }
+
+private:
+    const std::shared_ptr<Reader> fReader;
+};
+
+class WriterThreadTest : public testing::Test {
+protected:
+    // A thread that still waits must not outlive the test.
+    ~WriterThreadTest() override { fReader->GoOn(); }
+
+    std::shared_ptr<Reader> fReader = std::make_shared<Reader>();
+    std::shared_ptr<std::atomic<int>> fFailures = std::make_shared<std::atomic<int>>(0);
+    WriterThread fWriter{std::make_unique<TestOutput>(fReader),
+                         [failures = fFailures] { ++*failures; }};
+};
+
+TEST_F(WriterThreadTest, WritesInOrder)
+{
+    fWriter.Write("one");
+    fWriter.Write([] { return std::string("two"); });
+    fWriter.Write(std::string());
+    EXPECT_TRUE(fWriter.Finish(std::nullopt));
+    EXPECT_THAT(fReader->GetTaken(), ElementsAre("one", "two"));
+    EXPECT_TRUE(fReader->fFinished);
+    EXPECT_EQ(*fFailures, 0);
+    fWriter.Abandon();
+    EXPECT_FALSE(fReader->fAbandoned); // it is finished
+}
+
+TEST_F(WriterThreadTest, KeepsNobodyWaitingForAReader)
+{
+    fReader->Stop();
+    for (int line = 0; line < 10000; ++line)
+        fWriter.Write("a line");
+    fReader->AwaitAsked(1);
+    EXPECT_THAT(fReader->GetTaken(), IsEmpty());
+    fReader->GoOn();
+    EXPECT_TRUE(fWriter.Finish(std::nullopt));
+    EXPECT_EQ(fReader->GetTaken().size(), 10000U);
+}
+
+TEST_F(WriterThreadTest, GivesUpAReaderThatDoesNotRead)
+{
+    fReader->Stop();
+    fWriter.Write("one");
+    EXPECT_FALSE(fWriter.Finish(milliseconds(20)));
+    fWriter.Abandon();
+    EXPECT_TRUE(fReader->fAbandoned);
+    EXPECT_FALSE(fReader->fFinished);
+}
+
+TEST_F(WriterThreadTest, MakesATextWhenItsTurnHasCome)
+{
+    fReader->Stop();
+    std::atomic<bool> made{false};
+    fWriter.Write("one");
+    fWriter.Write([&made] {
+        made = true;
+        return std::string("two");
+    });
+    fReader->AwaitAsked(1);
+    EXPECT_FALSE(made);
+    fReader->GoOn();
+    EXPECT_TRUE(fWriter.Finish(std::nullopt));
+    EXPECT_TRUE(made);
+}
+
+TEST_F(WriterThreadTest, WritesALongTextInPieces)
+{
+    const std::string text(10000, 'x');
+    fWriter.Write(text);
+    EXPECT_TRUE(fWriter.Finish(std::nullopt));
+    std::string taken;
+    for (const std::string& piece : fReader->GetTaken())
+        taken += piece;
+    EXPECT_EQ(taken, text);
+    EXPECT_GT(fReader->GetTaken().size(), 1U);
+}
+
+TEST_F(WriterThreadTest, TellsAFailureOnceAndThrowsItAtTheEnd)
+{
+    fWriter.Write("bad");
+    fWriter.Write("one");
+    while (*fFailures == 0)
+        std::this_thread::sleep_for(milliseconds(1));
+    fWriter.Write("two");
+    EXPECT_THROW(fWriter.Finish(std::nullopt), std::runtime_error);
+    EXPECT_EQ(*fFailures, 1);
+    EXPECT_THAT(fReader->GetTaken(), IsEmpty());
+    EXPECT_FALSE(fReader->fFinished);
+}
+
+} // namespace
+} // namespace assay_host
