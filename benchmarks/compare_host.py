@@ -48,6 +48,31 @@ def time_once(command, environment):
     return taken
 
 
+def figure(path, name):
+    """A line's figure in KiB, of a file of /proc; 0 if it isn't there."""
+    try:
+        for line in Path(path).read_text().splitlines():
+            if line.startswith(name):
+                return int(line.split()[1])
+    except OSError:
+        pass
+    return 0
+
+
+def own_memory(pid):
+    """What assay-host has itself: the peak of its worker, and the guardian's own share."""
+    try:
+        children = Path(f"/proc/{pid}/task/{pid}/children").read_text().split()
+        workers = [child for child in children
+                   if Path(f"/proc/{child}/comm").read_text() == "assay-worker\n"]
+    except OSError:
+        return 0
+    if not workers:
+        return figure(f"/proc/{pid}/status", "VmHWM:")
+    return (figure(f"/proc/{workers[0]}/status", "VmHWM:") +
+            figure(f"/proc/{pid}/smaps_rollup", "Pss:"))
+
+
 def peak_of(command, environment):
     """The most memory that the process itself had. Its reader takes little at a time, so that it is
     still there to be looked at when it writes its last."""
@@ -59,17 +84,13 @@ def peak_of(command, environment):
     peak = 0
     try:
         while process.poll() is None:
-            for line in Path(f"/proc/{process.pid}/status").read_text().splitlines():
-                if line.startswith("VmHWM:"):
-                    peak = max(peak, int(line.split()[1]))
+            peak = max(peak, own_memory(process.pid))
             os.set_blocking(read, False)
             time.sleep(0.002)
             try:
                 os.read(read, 256)
             except BlockingIOError:
                 pass
-    except FileNotFoundError:
-        pass
     finally:
         os.close(read)
         process.wait()

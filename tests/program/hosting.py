@@ -23,6 +23,7 @@ from validate import decode, report_bytes, validate_document, validate_events  #
 
 HOST = BUILD / "bin" / "assay-host"
 CHILD = BUILD / "bin" / "test_child"
+WORKER = "assay-worker"
 
 STATUSES = {"complete": 0, "failed-tests": 1, "usage-error": 2, "crashed": 3, "hung": 4,
             "never-started": 5, "interrupted": 6}
@@ -41,7 +42,7 @@ class Hosted:
     out: bytes
     err: bytes
     seconds: float
-    peak_kib: int  # the most memory that it had itself
+    peak_kib: int  # the most memory that it had itself, guardian and worker together
 
     @property
     def text(self):
@@ -72,6 +73,24 @@ def processes_with(mark):
         except OSError:
             pass
     return found
+
+
+def name_of(pid):
+    try:
+        return Path(f"/proc/{pid}/comm").read_text().strip()
+    except OSError:
+        return ""
+
+
+def peak_of(pid):
+    """In KiB; 0 of a process that has gone."""
+    try:
+        for line in Path(f"/proc/{pid}/status").read_text().splitlines():
+            if line.startswith("VmHWM:"):
+                return int(line.split()[1])
+    except OSError:
+        pass
+    return 0
 
 
 class Watched:
@@ -118,13 +137,20 @@ class Watched:
             os.close(descriptor)
         self.process.wait()
 
-    def look(self):
+    def worker(self):
+        """The process that does the work; None if there is none any more, or none yet."""
+        pid = self.process.pid
         try:
-            for line in Path(f"/proc/{self.process.pid}/status").read_text().splitlines():
-                if line.startswith("VmHWM:"):
-                    self.peak_kib = max(self.peak_kib, int(line.split()[1]))
+            children = Path(f"/proc/{pid}/task/{pid}/children").read_text().split()
         except OSError:
-            pass
+            return None
+        names = {int(child): name_of(child) for child in children}
+        return next((child for child, name in names.items() if name == WORKER), None)
+
+    def look(self):
+        worker = self.worker()
+        peak = peak_of(self.process.pid) + (peak_of(worker) if worker else 0)
+        self.peak_kib = max(self.peak_kib, peak)
 
     def finish(self, seconds=60):
         deadline = time.monotonic() + seconds
@@ -167,8 +193,9 @@ def texts(document, kind="value"):
     return [text_of(decode(line["text"])) for line in document["lines"] if line["kind"] == kind]
 
 
-__all__ = ["CHILD", "GRACE", "HOST", "SLACK", "STATUSES", "TROUBLE", "Hosted", "Watched", "decode",
-           "host_run", "json", "report_bytes", "run_assay", "script_child", "texts"]
+__all__ = ["CHILD", "GRACE", "HOST", "SLACK", "STATUSES", "TROUBLE", "Hosted", "WORKER",
+           "Watched", "decode", "host_run", "json", "processes_with", "report_bytes", "run_assay",
+           "script_child", "texts"]
 
 
 def read_to_the_end(control):

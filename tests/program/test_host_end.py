@@ -1,0 +1,474 @@
+"""What ends assay-host, and who keeps it waiting: readers that don't read, signals, limits, and its own
+sudden end. Whatever comes, the child and what that started end first, or at once behind it."""
+
+import os
+import pty
+import random
+import resource
+import signal
+import subprocess
+import sys
+import termios
+import time
+
+import pytest
+
+from harness import SANITIZED_BY
+from hosting import CHILD, HOST, TROUBLE, Watched, host_run, processes_with, script_child, texts
+
+INTERRUPTED = 6
+DEADLINE = 30  # for what must come at all
+TIMEOUT = 1.5
+LONG = bool(os.environ.get("ASSAY_LONG_TESTS"))
+
+# Many lines, then nothing more; with a grandchild that no group and no session reaches.
+CHATTERBOX = """
+i=0
+while [ $i -lt 2000 ]; do
+    echo "key$i=$i aaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaa"
+    echo "an error $i aaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaa" >&2
+    i=$((i + 1))
+done
+trap '' INT TERM HUP
+setsid sh -c "trap '' INT TERM HUP; while :; do sleep 1; done" &
+touch "$READY"
+while :; do sleep 1; done
+"""
+
+
+def until(condition, what):
+    deadline = time.monotonic() + DEADLINE
+    while not condition():
+        assert time.monotonic() < deadline, what
+        time.sleep(0.01)
+
+
+class Scene:
+    """A child that is ready to be left alone, and a pipe that nobody reads unless a test does."""
+
+    def __init__(self, folder):
+        self.folder = folder
+        self.ready = folder / "ready"
+        self.child = script_child(folder, CHATTERBOX)
+        self.read, self.write = os.pipe()
+
+    def watch(self, *options, **more):
+        environment = {**os.environ, "READY": str(self.ready)}
+        more.setdefault("stdout", self.write)
+        more.setdefault("stderr", subprocess.DEVNULL)
+        return Watched("run", "--assay", self.child, *options, environment=environment, **more)
+
+    def await_ready(self):
+        until(self.ready.exists, "the child isn't ready")
+
+    def close(self):
+        for end in ("read", "write"):
+            self.close_end(end)
+
+    def close_end(self, end):
+        if getattr(self, end) is not None:
+            os.close(getattr(self, end))
+            setattr(self, end, None)
+
+    def rest(self):
+        """All that is still to be read."""
+        self.close_end("write")
+        data = b""
+        while piece := os.read(self.read, 65536):
+            data += piece
+        return data
+
+
+@pytest.fixture
+def scene(tmp_path):
+    found = Scene(tmp_path)
+    yield found
+    found.close()
+
+
+def children_of(watched):
+    """What the host started, without itself."""
+    own = {watched.process.pid, watched.worker()}
+    return [number for number, _ in processes_with(watched.mark) if number not in own]
+
+
+def await_none(watched):
+    """Twice, since a process that starts another one and ends may hide both from one look."""
+    for _ in range(2):
+        until(lambda: not children_of(watched), "something is left")
+
+
+# Readers.
+
+def blocked(scene, name):
+    """Options and streams of a run that gets no word out."""
+    if name == "json lines":
+        return ["--format", "jsonl"], {}
+    if name == "raw":
+        return ["--raw"], {}
+    if name == "raw standard error":
+        return ["--raw"], {"stdout": subprocess.DEVNULL, "stderr": scene.write}
+    if name == "unread fifo":
+        os.mkfifo(scene.folder / "fifo")
+        return ["--output", scene.folder / "fifo"], {"stdout": subprocess.DEVNULL}
+    assert name == "pipe that doesn't block"
+    os.set_blocking(scene.write, False)
+    return ["--format", "jsonl"], {}
+
+
+BLOCKED = ["json lines", "raw", "raw standard error", "unread fifo", "pipe that doesn't block"]
+
+
+@pytest.mark.parametrize("name", BLOCKED)
+def test_reader_that_does_not_read(scene, name):
+    """The child's time runs out all the same, and one signal ends the wait for the reader."""
+    options, streams = blocked(scene, name)
+    with scene.watch("--timeout", str(TIMEOUT), *options, **streams) as watched:
+        scene.await_ready()
+        await_none(watched)
+        assert watched.process.poll() is None # it still wants to be read
+        watched.process.send_signal(signal.SIGTERM)
+        assert watched.finish().status == INTERRUPTED
+
+
+@pytest.mark.parametrize("name", BLOCKED)
+def test_signal_before_the_time_is_out(scene, name):
+    options, streams = blocked(scene, name)
+    with scene.watch("--timeout", "600", *options, **streams) as watched:
+        scene.await_ready()
+        watched.process.send_signal(signal.SIGTERM)
+        assert watched.finish().status == INTERRUPTED # not kept by a reader that doesn't read
+
+
+def test_reader_that_comes_late_gets_all(scene):
+    with scene.watch("--timeout", str(TIMEOUT), "--format", "jsonl") as watched:
+        await_none_once_ready(scene, watched)
+        data = scene.rest()
+        assert watched.finish().status == 4
+    lines = data.decode().splitlines()
+    assert len(lines) == 1 + 2000 + 2000 + 1
+    assert '"verdict":"hung"' in lines[-1]
+
+
+def await_none_once_ready(scene, watched):
+    scene.await_ready()
+    await_none(watched)
+
+
+def test_fifo_that_is_read_late(scene):
+    fifo = scene.folder / "fifo"
+    os.mkfifo(fifo)
+    with scene.watch("--timeout", str(TIMEOUT), "--output", fifo,
+                     stdout=subprocess.DEVNULL) as watched:
+        await_none_once_ready(scene, watched)
+        assert b"Verdict: hung" in fifo.read_bytes()
+        assert watched.finish().status == 4
+
+
+def test_stopped_terminal(scene):
+    """As after Ctrl-S: the progress line isn't taken."""
+    control, terminal = pty.openpty()
+    try:
+        with scene.watch("--timeout", str(TIMEOUT), stdout=subprocess.DEVNULL,
+                         stderr=terminal) as watched:
+            termios.tcflow(terminal, termios.TCOOFF)
+            await_none_once_ready(scene, watched)
+            watched.process.send_signal(signal.SIGTERM)
+            assert watched.finish().status in (4, INTERRUPTED) # it may not have shown any
+    finally:
+        os.close(terminal)
+        os.close(control)
+
+
+def test_output_file_of_a_run_that_is_given_up(scene):
+    """Standard error keeps the writer, and the temporary file goes with it."""
+    file = scene.folder / "result"
+    with scene.watch("--timeout", str(TIMEOUT), "--raw", "--output", file,
+                     stdout=subprocess.DEVNULL, stderr=scene.write) as watched:
+        await_none_once_ready(scene, watched)
+        watched.process.send_signal(signal.SIGINT)
+        assert watched.finish().status == INTERRUPTED
+    assert {each.name for each in scene.folder.iterdir()} == {"child", "ready"}
+
+
+# Signals.
+
+STKFLT = 16 # which this Python may have no name for
+DEFAULT_IS_TO_END = [signal.SIGHUP, signal.SIGINT, signal.SIGQUIT, signal.SIGUSR1, signal.SIGUSR2,
+                     signal.SIGALRM, signal.SIGTERM, STKFLT, signal.SIGXCPU, signal.SIGVTALRM,
+                     signal.SIGPROF, signal.SIGIO, signal.SIGPWR, signal.SIGRTMIN, signal.SIGRTMAX]
+
+
+@pytest.mark.parametrize("number", DEFAULT_IS_TO_END, ids=str)
+def test_signal_that_ends(scene, number):
+    with scene.watch("--timeout", "600", "--format", "json", stdout=subprocess.PIPE) as watched:
+        scene.await_ready()
+        watched.process.send_signal(number)
+        run = watched.finish()
+        assert run.document()["outcome"]["verdict"] == "interrupted"
+        assert texts(run.document())[0].startswith("key0=")
+
+
+@pytest.mark.parametrize("number", [signal.SIGPIPE, signal.SIGXFSZ, signal.SIGCHLD, signal.SIGURG,
+                                    signal.SIGWINCH, signal.SIGCONT, signal.SIGTTIN, signal.SIGTTOU],
+                         ids=str)
+def test_signal_that_does_not(number):
+    with Watched("run", "--assay", CHILD, "--", "sleep", "300", "out", 'assayStart="x"', "out",
+                 'assayEnd="y"') as watched:
+        until(watched.worker, "no worker")
+        for _ in range(5):
+            watched.process.send_signal(number)
+            os.kill(watched.worker() or watched.process.pid, number)
+            time.sleep(0.02)
+        assert watched.finish().status == 0
+
+
+@pytest.mark.parametrize("number", [signal.SIGINT, signal.SIGTERM, signal.SIGHUP], ids=str)
+@pytest.mark.parametrize("pause", [0, 0.001, 0.01, 0.1])
+def test_signals_one_after_the_other(scene, number, pause):
+    """None but the first two have anything to do, and none ends the host before its child."""
+    with scene.watch("--timeout", "600") as watched:
+        scene.await_ready()
+        while watched.process.poll() is None:
+            watched.process.send_signal(number)
+            time.sleep(pause)
+        assert children_of(watched) == [] # at the very moment
+        assert watched.process.returncode == INTERRUPTED
+
+
+def test_ignored_hangup_stays_ignored():
+    with Watched("run", "--assay", CHILD, "--", "sleep", "400", "out", 'assayStart="x"', "out",
+                 'assayEnd="y"',
+                 preexec_fn=lambda: signal.signal(signal.SIGHUP, signal.SIG_IGN)) as watched:
+        until(watched.worker, "no worker")
+        watched.process.send_signal(signal.SIGHUP)
+        os.kill(watched.worker() or watched.process.pid, signal.SIGHUP)
+        assert watched.finish().status == 0
+
+
+def test_torture_is_interrupted(scene):
+    with Watched("torture", "--assay", scene.child, "--timeout", "600", stdout=scene.write,
+                 environment={**os.environ, "READY": str(scene.ready)}) as watched:
+        scene.await_ready()
+        watched.process.send_signal(signal.SIGINT)
+        watched.process.send_signal(signal.SIGTERM)
+        assert watched.finish().status == INTERRUPTED
+
+
+def test_suspended_and_continued():
+    """As by Ctrl-Z and fg: the whole run stands still, and goes on."""
+    with Watched("run", "--assay", CHILD, "--", "sleep", "400", "out", 'assayStart="x"', "out",
+                 'assayEnd="y"') as watched:
+        until(lambda: children_of(watched), "no child")
+        worker = watched.worker()
+        watched.process.send_signal(signal.SIGTSTP)
+        until(lambda: state_of(watched.process.pid) == "T" and state_of(worker) == "T", "not stopped")
+        assert all(state_of(child) == "T" for child in children_of(watched))
+        watched.process.send_signal(signal.SIGCONT)
+        assert watched.finish().status == 0
+
+
+def state_of(pid):
+    with open(f"/proc/{pid}/stat", encoding="utf-8", errors="replace") as stat:
+        return stat.read().rpartition(")")[2].split()[0]
+
+
+# What is inherited.
+
+def whole(*options, **more):
+    return host_run("run", "--assay", CHILD, *options, "--", "out", 'assayStart="x"', "out",
+                    'assayEnd="y"', **more)
+
+
+@pytest.mark.parametrize("command", ["run", "torture"])
+def test_ignored_ends_of_children(command, host):
+    environment = host.environment(script="# nothing\n", opencl="absent")
+    run = host_run(command, environment=environment,
+                   preexec_fn=lambda: signal.signal(signal.SIGCHLD, signal.SIG_IGN))
+    assert run.status == 0, run.text
+
+
+def test_blocked_signals(scene):
+    with scene.watch("--timeout", "600", preexec_fn=lambda: signal.pthread_sigmask(
+            signal.SIG_BLOCK, signal.valid_signals())) as watched:
+        scene.await_ready()
+        watched.process.send_signal(signal.SIGTERM)
+        assert watched.finish().status == INTERRUPTED
+
+
+def test_child_inherits_no_signal_state():
+    def disturb():
+        for number in (signal.SIGTERM, signal.SIGHUP, signal.SIGCHLD, signal.SIGPIPE):
+            signal.signal(number, signal.SIG_IGN)
+        signal.pthread_sigmask(signal.SIG_BLOCK, signal.valid_signals())
+
+    def state(**more):
+        run = host_run("run", "--raw", "--assay", CHILD, "--", "state", **more)
+        return run.text.split("\n\n")[0]
+
+    assert state(preexec_fn=disturb) == state()
+
+
+@pytest.mark.parametrize("closed", [(0,), (1,), (2,), (0, 1), (0, 2), (1, 2), (0, 1, 2)], ids=str)
+def test_closed_streams(tmp_path, closed):
+    file = tmp_path / "result"
+    run = whole("--output", file, preexec_fn=lambda: [os.close(stream) for stream in closed],
+                stdin=None, stdout=None, stderr=None)
+    assert run.status == 0
+    assert "Verdict: complete" in file.read_text()
+
+
+def test_orphans_of_an_earlier_program(tmp_path):
+    """Children that the process had before it was assay-host aren't its own."""
+    script = script_child(tmp_path, f'sleep 1000 >&- 2>&- & echo $! > {tmp_path}/pid; exec {HOST} "$@"',
+                          "wrapper")
+    with Watched("run", "--assay", CHILD, "--", "out", "a=1", program=script) as watched:
+        watched.finish()
+        other = int((tmp_path / "pid").read_text())
+        os.kill(other, 0)
+        os.kill(other, signal.SIGKILL)
+        until(lambda: other not in dict(processes_with(watched.mark)), "it doesn't end")
+
+
+# Limits.
+
+def limit(kind, value):
+    return lambda: resource.setrlimit(kind, (value, value))
+
+
+@pytest.mark.parametrize("form", ["text", "json", "jsonl"])
+def test_file_that_may_not_grow(tmp_path, form):
+    """SIGXFSZ isn't ignored by whoever starts the host, as a rule."""
+    with open(tmp_path / "out", "wb") as out:
+        run = whole("--format", form, stdout=out,
+                    preexec_fn=limit(resource.RLIMIT_FSIZE, 100), restore_signals=True)
+    assert run.status == TROUBLE
+    assert b"cannot write to standard output: File too large" in run.err
+    run = whole("--format", form, "--output", tmp_path / "result",
+                preexec_fn=limit(resource.RLIMIT_FSIZE, 100), restore_signals=True)
+    assert run.status == TROUBLE
+    assert b"File too large" in run.err
+    assert [each.name for each in tmp_path.iterdir()] == ["out"]
+
+
+@pytest.mark.parametrize("arguments", [["--help"], ["diff", "a", "b"], ["torture"]], ids=str)
+def test_other_commands_with_a_file_that_may_not_grow(tmp_path, arguments, host):
+    (tmp_path / "a").write_text('assayStart="x"\nKey=1\n')
+    (tmp_path / "b").write_text('assayStart="x"\nKey=2\n')
+    environment = host.environment(script="# nothing\n", opencl="absent")
+    with open(tmp_path / "out", "wb") as out:
+        run = host_run(*arguments, stdout=out, cwd=tmp_path, environment=environment,
+                       preexec_fn=limit(resource.RLIMIT_FSIZE, 5), restore_signals=True)
+    assert run.status == (2 if arguments[0] == "diff" else TROUBLE)
+    assert b"cannot write to standard output: File too large" in run.err
+
+
+# Runs its arguments in the background of the terminal that is its standard input.
+BACKGROUND = """
+import fcntl, os, sys, termios
+os.setsid()
+fcntl.ioctl(0, termios.TIOCSCTTY, 0)
+attributes = termios.tcgetattr(0)
+attributes[3] |= termios.TOSTOP
+termios.tcsetattr(0, termios.TCSANOW, attributes)
+job = os.fork()
+if job == 0:
+    os.setpgid(0, 0)
+    os.execv(sys.argv[1], sys.argv[1:])
+os.waitpid(job, os.WUNTRACED)
+"""
+
+
+def test_background_of_a_terminal(tmp_path):
+    """With the terminal's tostop a write from there stops a process, unless it minds that."""
+    file = tmp_path / "result"
+    control, terminal = pty.openpty()
+    try:
+        with Watched("-c", BACKGROUND, HOST, "run", "--raw", "--assay", CHILD, "--output", file, "--",
+                     "err", "aside", "sleep", "300", "out", 'assayStart="x"', "out",
+                     'assayEnd="y"', program=sys.executable, stdin=terminal, stdout=terminal,
+                     stderr=terminal) as watched:
+            watched.finish()
+            assert "Verdict: complete" in file.read_text()
+    finally:
+        os.close(terminal)
+        os.close(control)
+
+
+def test_processor_time_that_is_used_up(tmp_path):
+    """First it is asked to end, then it is killed."""
+    child = script_child(tmp_path, "setsid sleep 1000 & while :; do echo 'a=\"'; done")
+    with Watched("run", "--assay", child, "--timeout", "600", stdout=subprocess.DEVNULL,
+                 preexec_fn=lambda: resource.setrlimit(resource.RLIMIT_CPU, (1, 600))) as watched:
+        assert watched.finish(120).status in (3, INTERRUPTED) # the child's time may be up first
+
+
+# Its own sudden end.
+
+def kill_host(watched):
+    watched.process.kill()
+
+
+def kill_group(watched):
+    os.killpg(watched.process.pid, signal.SIGKILL)
+
+
+def kill_worker(watched):
+    worker = watched.worker()
+    os.kill(worker if worker is not None else watched.process.pid, signal.SIGKILL)
+
+
+def kill_by_name(watched):
+    """As killall does, which knows the name only."""
+    for number, _ in processes_with(watched.mark):
+        try:
+            with open(f"/proc/{number}/comm", encoding="utf-8") as name:
+                if name.read().strip() == "assay-host":
+                    os.kill(number, signal.SIGKILL)
+        except (FileNotFoundError, ProcessLookupError):
+            pass
+
+
+def quit_worker(watched):
+    os.kill(watched.worker() or watched.process.pid, signal.SIGSEGV)
+
+
+ENDS = [kill_host, kill_group, kill_worker, kill_by_name, quit_worker]
+
+
+@pytest.mark.parametrize("end", ENDS, ids=lambda end: end.__name__)
+def test_sudden_end(scene, end):
+    with scene.watch("--timeout", "600", start_new_session=True) as watched:
+        scene.await_ready()
+        end(watched)
+        watched.process.wait(DEADLINE)
+        until(lambda: processes_with(watched.mark) == [], "something is left")
+        expected = signal.SIGSEGV if end is quit_worker else signal.SIGKILL
+        assert watched.process.returncode == -expected
+
+
+def test_end_while_suspended(scene):
+    with scene.watch("--timeout", "600") as watched:
+        scene.await_ready()
+        worker = watched.worker()
+        watched.process.send_signal(signal.SIGTSTP)
+        until(lambda: state_of(watched.process.pid) == "T" and state_of(worker) == "T", "not stopped")
+        watched.process.kill()
+        until(lambda: processes_with(watched.mark) == [], "something is left")
+
+
+def test_sudden_end_again_and_again(tmp_path):
+    """At any moment of a run, with nothing left."""
+    child = script_child(tmp_path, "setsid sh -c 'setsid sleep 1000 & sleep 1000' & sleep 0.02\n"
+                                   "setsid sleep 1000 & echo a=1; sleep 1000")
+    rounds = 1000 if LONG else 40
+    chance = random.Random(rounds)
+    for number in range(rounds):
+        command = "torture" if number % 5 == 4 else "run"
+        with Watched(command, "--assay", child, "--timeout", "600", stdout=subprocess.DEVNULL,
+                     stderr=subprocess.DEVNULL, start_new_session=True) as watched:
+            time.sleep(chance.uniform(0, 0.12 if not SANITIZED_BY else 0.5))
+            chance.choice(ENDS)(watched)
+            watched.process.wait(DEADLINE)
+            for _ in range(2):
+                until(lambda: processes_with(watched.mark) == [], f"left in round {number}")
