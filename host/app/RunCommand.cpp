@@ -12,6 +12,7 @@
 #include "app/Terminal.h"
 #include "app/WriterThread.h"
 #include "report/JsonDocument.h"
+#include "report/LineForm.h"
 #include "report/Report.h"
 #include "report/TextView.h"
 #include "supervise/ChildRun.h"
@@ -24,6 +25,24 @@ namespace assay_host {
 namespace {
 
 constexpr int kFileWidth = 100;
+
+// A line that waits to be written keeps each of its bytes once.
+ReportLine ShortenLine(const ReportLine& line)
+{
+    ReportLine kept;
+    kept.fKind = line.fKind;
+    kept.fText = line.fText;
+    kept.fLineEnd = line.fLineEnd;
+    kept.fCut = line.fCut;
+    return kept;
+}
+
+ReportLine RestoreLine(const ReportLine& kept)
+{
+    if (kept.fKind != LineKind::kValue)
+        return kept;
+    return ReadLine(kept.fText, kept.fLineEnd, kept.fCut);
+}
 
 // Takes the report in, and has said at once what is to be said at once.
 class Session : public RunObserver {
@@ -40,7 +59,9 @@ public:
     {
         fPosition.Add(line);
         if (fChoice.fFormat == Format::kJsonLines)
-            WriteEvent([line, seconds] { return MakeLineEvent(line, seconds); });
+            WriteEvent([kept = ShortenLine(line), seconds] {
+                return MakeLineEvent(RestoreLine(kept), seconds);
+            });
         else
             fReport.Add(line);
         if (fChoice.fRaw)
@@ -52,7 +73,7 @@ public:
         if (fChoice.fFormat == Format::kJsonLines)
             WriteEvent([line, seconds] { return MakeErrorLineEvent(line, seconds); });
         if (fChoice.fRaw)
-            fWriter.WriteError([line] { return line + "\n"; });
+            fWriter.WriteError(line + "\n");
     }
 
     void OnTick(double seconds) override

@@ -22,8 +22,9 @@ namespace {
 constexpr std::size_t kPieceBytes = 4096;
 
 struct Item {
-    bool fIsError = false;
-    WriterThread::Text fText;
+    StandardStream fStream = StandardStream::kOutput;
+    std::string fText;
+    WriterThread::MakeText fMakeText; // if there is one, instead of the text
 };
 
 } // namespace
@@ -56,7 +57,10 @@ struct WriterThread::State {
         const std::lock_guard<std::mutex> lock(fMutex);
         if (fFailure != nullptr)
             return;
-        fItems.push_back(std::move(item));
+        if (CanJoin(item))
+            fItems.back().fText += item.fText;
+        else
+            fItems.push_back(std::move(item));
         fCond.notify_all();
     }
 
@@ -80,6 +84,14 @@ struct WriterThread::State {
     bool fDone = false;
 
 private:
+    // Short texts wait together: each item costs memory beyond its text.
+    bool CanJoin(const Item& item) const
+    {
+        return !fItems.empty() && !fItems.back().fMakeText && !item.fMakeText &&
+               fItems.back().fStream == item.fStream &&
+               fItems.back().fText.size() + item.fText.size() <= kPieceBytes;
+    }
+
     // False once there is nothing more to be written.
     bool WriteNext()
     {
@@ -112,14 +124,14 @@ private:
 
     void WriteItem(const Item& item)
     {
-        const std::string text = item.fText();
-        std::string_view left = text;
+        const std::string made = item.fMakeText ? item.fMakeText() : std::string();
+        std::string_view left = item.fMakeText ? made : item.fText;
         while (!left.empty()) {
             const std::string_view piece = left.substr(0, kPieceBytes);
             left.remove_prefix(piece.size());
-            if (!item.fIsError)
+            if (item.fStream == StandardStream::kOutput)
                 fOutput->Write(piece);
-            else if (WriteStream(StandardStream::kError, piece))
+            else if (WriteStream(item.fStream, piece))
                 return;
             ++fPieces;
         }
@@ -151,19 +163,19 @@ WriterThread::~WriterThread()
     Abandon();
 }
 
-void WriterThread::Write(Text text)
-{
-    fState->Add({false, std::move(text)});
-}
-
 void WriterThread::Write(std::string text)
 {
-    Write([text = std::move(text)]() mutable { return std::move(text); });
+    fState->Add({StandardStream::kOutput, std::move(text), {}});
 }
 
-void WriterThread::WriteError(Text text)
+void WriterThread::Write(MakeText makeText)
 {
-    fState->Add({true, std::move(text)});
+    fState->Add({StandardStream::kOutput, {}, std::move(makeText)});
+}
+
+void WriterThread::WriteError(std::string text)
+{
+    fState->Add({StandardStream::kError, std::move(text), {}});
 }
 
 void WriterThread::ShowProgress(std::string text)

@@ -17,8 +17,8 @@ namespace assay_host {
 // Any thread may call, but Finish is called once and is the last of all but Abandon.
 class WriterThread {
 public:
-    // Called once, on the writer's thread, when its turn has come: what waits stays small.
-    using Text = std::function<std::string()>;
+    // Called once, on the writer's thread, when its turn has come.
+    using MakeText = std::function<std::string()>;
 
     // `failed` is called on the writer's thread if the output fails before Finish. What comes after
     // a failure is dropped.
@@ -29,12 +29,12 @@ public:
     WriterThread(const WriterThread&) = delete;
     WriterThread& operator=(const WriterThread&) = delete;
 
-    // To the output.
-    void Write(Text text);
+    // To the output. What grows when it is put into its form is better made when it is written.
     void Write(std::string text);
+    void Write(MakeText makeText);
 
     // To standard error. If that fails, the text is lost.
-    void WriteError(Text text);
+    void WriteError(std::string text);
 
     // Shows one line of progress, where standard error is a terminal, as soon as nothing else is to
     // be written; the next one takes its place.
