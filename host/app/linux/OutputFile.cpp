@@ -36,7 +36,7 @@ public:
     {
         if (fFile >= 0)
             ::close(fFile);
-        Abandon();
+        OutputFile::Abandon();
     }
 
     void Open() override

@@ -31,7 +31,7 @@ public:
     ~OutputFile() override
     {
         Close();
-        Abandon();
+        OutputFile::Abandon();
     }
 
     void Open() override

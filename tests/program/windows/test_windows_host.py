@@ -1,10 +1,13 @@
 """assay-host.exe under Wine: verdicts, formats, hostile children, every step."""
 
 import os
+import random
 import re
+import signal
 import subprocess
 import sys
 import time
+from pathlib import Path
 
 import pytest
 
@@ -153,6 +156,69 @@ def test_output_file(tmp_path):
                    *REPORT)
     assert run.status == 10
     assert run.errors[0].startswith("assay-host: cannot write ")
+
+
+class Running:
+    """assay-host.exe at work, with a child that can be told from all others."""
+
+    def __init__(self, *words, options=(), **streams):
+        self.word = str(random.randrange(10**8, 2 * 10**9)) # how long the child sleeps
+        self.process = subprocess.Popen(
+            [TREE / "scripts" / "run-under-wine", HOST, "run", *options, "--assay", CHILD, "--",
+             *words, "sleep", self.word], stdin=subprocess.DEVNULL, stderr=subprocess.DEVNULL,
+            env={**os.environ, **NO_OPENCL_PLATFORM}, **streams)
+
+    def numbers(self, of_host):
+        """Of the Windows processes; Wine's are those whose program is a loader of its."""
+        found = []
+        for folder in Path("/proc").iterdir():
+            try:
+                command = (folder / "cmdline").read_bytes() if folder.name.isdigit() else b""
+                if self.word.encode() in command and "wine" in os.readlink(folder / "exe"):
+                    if (b"assay-host" in command) == of_host:
+                        found.append(int(folder.name))
+            except OSError:
+                pass
+        return found
+
+    def until_child(self, there):
+        deadline = time.monotonic() + 60
+        while bool(self.numbers(of_host=False)) != there:
+            assert time.monotonic() < deadline, f"no child: {not there}"
+            time.sleep(0.05)
+
+    def __enter__(self):
+        return self
+
+    def __exit__(self, *_):
+        for number in self.numbers(of_host=True) + self.numbers(of_host=False):
+            os.kill(number, signal.SIGKILL)
+        self.process.kill()
+        self.process.wait()
+
+
+def test_reader_that_does_not_read():
+    """The child's time runs out all the same."""
+    read, write = os.pipe()
+    with Running("flood", "300000", options=["--format", "jsonl", "--timeout", "3"],
+                 stdout=write) as running:
+        os.close(write)
+        running.until_child(there=True)
+        running.until_child(there=False)
+        assert running.process.poll() is None # it still wants to be read
+        with os.fdopen(read, "rb") as reader:
+            data = reader.read()
+        assert running.process.wait(60) == 4
+    assert b'"verdict":"hung"' in data
+
+
+def test_killed_host():
+    """The job takes the child with it."""
+    with Running(options=["--timeout", "600"], stdout=subprocess.DEVNULL) as running:
+        running.until_child(there=True)
+        for number in running.numbers(of_host=True):
+            os.kill(number, signal.SIGKILL)
+        running.until_child(there=False)
 
 
 def test_help_and_version():
