@@ -19,7 +19,7 @@ TIMEOUT = 20
 # For what must happen, on however busy a machine.
 DEADLINE = 200
 # Of a sample, one pair in so many of an entry point and a fault.
-ONE_IN = 4
+ONE_IN = 2
 
 DURATION = re.compile(r"duration=\S+")
 
