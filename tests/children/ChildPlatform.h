@@ -6,9 +6,11 @@
 #include <vector>
 
 void PrepareStreams();
+std::vector<std::string> GetArguments(int argc, char** argv);
 std::size_t ReadInput(char* bytes, std::size_t size);
 [[noreturn]] void ExitNow(int code);
 [[noreturn]] void CrashNow();
+void DieOf(const std::string& how);
 void CloseOutputs();
 void SpawnGrandchild(const std::vector<std::string>& command); // of words without blanks
 void WriteCommandLine();

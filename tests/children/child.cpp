@@ -6,7 +6,9 @@
 //   echo                   copies standard input to standard output until it ends
 //   flood BYTES            writes that much to standard output
 //   abort                  dies of it
-//   args ...               writes the rest of the arguments, each in hexadecimal, and ends
+//   die HOW                the same in the ways of broken drivers (Windows only)
+//   args ...               writes the rest of the arguments, each in hexadecimal, and ends; on
+//                          Windows as the C runtime takes the command line apart, in UTF-8
 //   close                  closes standard output and standard error
 //   spawn MILLISECONDS     starts a grandchild that sleeps, with this child's streams
 //   heir                   starts a grandchild with this child's streams that does echo
@@ -23,11 +25,11 @@
 
 namespace {
 
-void WriteArguments(int argc, char** argv, int first)
+void WriteArguments(const std::vector<std::string>& arguments, int first)
 {
-    for (int index = first; index < argc; ++index) {
-        for (const char* at = argv[index]; *at != '\0'; ++at)
-            std::printf("%02x", static_cast<unsigned>(static_cast<unsigned char>(*at)));
+    for (auto index = static_cast<std::size_t>(first); index < arguments.size(); ++index) {
+        for (const char byte : arguments[index])
+            std::printf("%02x", static_cast<unsigned>(static_cast<unsigned char>(byte)));
         std::printf("\n");
     }
 }
@@ -79,6 +81,8 @@ int main(int argc, char** argv)
             Flood(std::atoll(next()));
         } else if (word == "abort") {
             CrashNow();
+        } else if (word == "die") {
+            DieOf(next());
         } else if (word == "close") {
             CloseOutputs();
         } else if (word == "spawn") {
@@ -91,7 +95,7 @@ int main(int argc, char** argv)
         } else if (word == "state") {
             WriteState();
         } else if (word == "args") {
-            WriteArguments(argc, argv, index + 1);
+            WriteArguments(GetArguments(argc, argv), index + 1);
             return 0;
         } else {
             std::fprintf(stderr, "unknown word %s\n", word.c_str());

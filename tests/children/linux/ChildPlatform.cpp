@@ -14,6 +14,11 @@ void PrepareStreams()
     ::setrlimit(RLIMIT_CORE, &none);
 }
 
+std::vector<std::string> GetArguments(int argc, char** argv)
+{
+    return {argv, argv + argc};
+}
+
 std::size_t ReadInput(char* bytes, std::size_t size)
 {
     const ssize_t count = ::read(STDIN_FILENO, bytes, size);
@@ -30,6 +35,8 @@ void CrashNow()
 {
     std::abort();
 }
+
+void DieOf(const std::string& /*how*/) {}
 
 void CloseOutputs()
 {

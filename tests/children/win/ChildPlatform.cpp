@@ -3,12 +3,50 @@
 #include <windows.h>
 
 #include <cstdio>
+#include <cwchar>
 #include <fcntl.h>
 #include <io.h>
 #include <string>
 
+#include "win/Misbehave.h"
+
+// The C runtime's own, which no header has: it takes the wide command line apart.
+struct StartupInfo {
+    int newMode;
+};
+extern "C" int __cdecl __wgetmainargs(int* argc, wchar_t*** argv, wchar_t*** environment,
+                                      int expandWildcards, StartupInfo* info);
+
+std::vector<std::string> GetArguments(int /*argc*/, char** /*argv*/)
+{
+    int argc = 0;
+    wchar_t** argv = nullptr;
+    wchar_t** environment = nullptr;
+    StartupInfo info = {};
+    __wgetmainargs(&argc, &argv, &environment, 0, &info);
+    std::vector<std::string> arguments;
+    for (int index = 0; index < argc; ++index) {
+        std::string text(4 * std::wcslen(argv[index]) + 1, '\0');
+        const int size = ::WideCharToMultiByte(CP_UTF8, 0, argv[index], -1, text.data(),
+                                               static_cast<int>(text.size()), nullptr, nullptr);
+        text.resize(static_cast<std::size_t>(size - 1));
+        arguments.push_back(text);
+    }
+    return arguments;
+}
+
+namespace {
+
+LONG WINAPI EndAtException(EXCEPTION_POINTERS* /*pointers*/)
+{
+    return EXCEPTION_EXECUTE_HANDLER; // Wine asks its debugger otherwise
+}
+
+} // namespace
+
 void PrepareStreams()
 {
+    ::SetUnhandledExceptionFilter(EndAtException);
     ::SetErrorMode(SEM_FAILCRITICALERRORS | SEM_NOGPFAULTERRORBOX);
     ::_setmode(0, _O_BINARY);
     ::_setmode(1, _O_BINARY);
@@ -32,6 +70,11 @@ void CrashNow()
     ::TerminateProcess(::GetCurrentProcess(), STATUS_ACCESS_VIOLATION);
     for (;;) {
     }
+}
+
+void DieOf(const std::string& how)
+{
+    Misbehave(how);
 }
 
 void CloseOutputs()

@@ -1,0 +1,23 @@
+# Drivers for Windows. OpenCL.dll misbehaves as ASSAY_MISBEHAVE says as soon as it is asked for
+# platforms; it has each entry point that the program looks for. planted.dll tells on standard error
+# that it was loaded, under whatever name it lies there.
+file(STRINGS ${CMAKE_SOURCE_DIR}/qgf/source/qgf/qgf_ocl/FunctionTable.cpp lines
+  REGEX "^ +QGF_OCL_FILL\\(")
+set(exports "EXPORTS\n")
+foreach(line ${lines})
+  string(REGEX REPLACE "^ +QGF_OCL_FILL\\(([A-Za-z0-9]+)\\).*$" "\\1" name ${line})
+  string(APPEND exports "${name} = Misbehaving\n")
+endforeach()
+file(GENERATE OUTPUT ${CMAKE_CURRENT_BINARY_DIR}/OpenCL.def CONTENT "${exports}")
+add_library(misbehaving_opencl MODULE misbehaving_opencl/OpenCL.cpp
+  ${CMAKE_SOURCE_DIR}/tests/children/win/Misbehave.cpp)
+target_include_directories(misbehaving_opencl PRIVATE ${CMAKE_SOURCE_DIR}/tests/children)
+target_link_libraries(misbehaving_opencl PRIVATE assay_options
+  ${CMAKE_CURRENT_BINARY_DIR}/OpenCL.def)
+set_target_properties(misbehaving_opencl PROPERTIES PREFIX "" OUTPUT_NAME OpenCL
+  LIBRARY_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/drivers/opencl)
+
+add_library(planted MODULE planted/Planted.cpp)
+target_link_libraries(planted PRIVATE assay_options)
+set_target_properties(planted PROPERTIES PREFIX ""
+  LIBRARY_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/drivers/planted)
