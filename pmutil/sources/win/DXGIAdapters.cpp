@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "qgf/Core.h"
 #include "win/ComTypes.h"
 
 #include <dxgi.h>
@@ -88,12 +89,29 @@ private:
     ComPtr<IDXGIFactory> fFactory;
 };
 
+// Loaded at the first call and kept; null if the system hasn't got it.
+decltype(&::CreateDXGIFactory) FindCreateFunction()
+{
+    static const char* const kNames[] = {"dxgi.dll", nullptr};
+    try {
+        static const QGF::Core::DynamicLibrary* const gLibrary =
+            QGF::Core::OpenLibrary(kNames).release();
+        return reinterpret_cast<decltype(&::CreateDXGIFactory)>(
+            gLibrary->getProc("CreateDXGIFactory"));
+    } catch (const QGF::LogicalException&) {
+        return nullptr;
+    }
+}
+
 } // namespace
 
 ResultCode MakeDXGIAdapterFactory(std::unique_ptr<AdapterFactory>& factory)
 {
+    const auto create = FindCreateFunction();
+    if (create == nullptr)
+        return HRESULT_FROM_WIN32(ERROR_MOD_NOT_FOUND);
     void* made = nullptr;
-    const HRESULT result = CreateDXGIFactory(IID_IDXGIFactory, &made);
+    const HRESULT result = create(IID_IDXGIFactory, &made);
     if (made != nullptr)
         factory = std::make_unique<DXGIFactory>(TakeReference(static_cast<IDXGIFactory*>(made)));
     return result;

@@ -57,8 +57,8 @@ public:
     virtual Proc getProc(const char* name) const = 0;
 };
 
-// Opens the first library of a null-terminated list of file names that the platform's loader finds.
-// Throws LogicalException naming each one with the loader's reason if there is none.
+// Opens the first library of a null-terminated list of file names that the platform's loader finds,
+// on Windows in the system's folder. Throws LogicalException naming each with the loader's reason.
 std::unique_ptr<DynamicLibrary> OpenLibrary(const char* const* names);
 
 class Library {

@@ -4,6 +4,7 @@ The tests share what the Linux ones know of reports. Whatever Wine offers is the
 DXGI, WGL on Mesa, OpenCL.dll over the Linux drivers.
 """
 
+import contextlib
 import os
 import subprocess
 import sys
@@ -27,7 +28,7 @@ OPENCL_GPU = {"RUSTICL_ENABLE": "llvmpipe", "RUSTICL_DEVICE_TYPE": "gpu"}
 NO_OPENCL_PLATFORM = {"OCL_ICD_VENDORS": "/nonexistent"}
 
 
-def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, **variables):
+def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, cwd=None, **variables):
     """Runs the program to its end; text mode's line ends come back as plain newlines.
 
     Once in some hundred times Wine doesn't get as far as the program, and ends with the status 1 and
@@ -35,7 +36,8 @@ def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, **variab
     for _ in range(3):
         done = subprocess.run([TREE / "scripts" / "run-under-wine", program, *arguments],
                               stdin=subprocess.DEVNULL, stdout=stdout, stderr=subprocess.PIPE,
-                              env={**os.environ, **variables}, timeout=SECONDS, check=False)
+                              env={**os.environ, **variables}, timeout=SECONDS, check=False,
+                              cwd=cwd)
         errors = [line for line in done.stderr.split(b"\n") if not is_noise(line)]
         if done.returncode != 1 or done.stdout or any(errors):
             break
@@ -46,6 +48,37 @@ def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, **variab
 def is_noise(line):
     """What the virtual display and Wine itself say."""
     return line.startswith((b"X connection", b"Authorization required", b"wine:", b"MESA"))
+
+
+@contextlib.contextmanager
+def wine_desktop(**variables):
+    """Keeps Wine's desktop process alive, which takes seconds to start: one that a program under
+    test starts would hold the streams of whoever started that, and outlive it."""
+    wine = TREE / "scripts" / "run-under-wine"
+    options = {"stdin": subprocess.DEVNULL, "stdout": subprocess.DEVNULL,
+               "stderr": subprocess.DEVNULL, "env": {**os.environ, **variables}}
+    with subprocess.Popen([wine, "C:\\windows\\system32\\notepad.exe"], **options) as window:
+        try:
+            # It needs a window, and so it waits for the desktop.
+            subprocess.run([wine, PROGRAM], timeout=SECONDS, check=False,
+                           **{**options, "env": {**options["env"], **NO_OPENCL_PLATFORM}})
+            yield
+        finally:
+            window.kill()
+
+
+@pytest.fixture(scope="module")
+def own_prefix(tmp_path_factory):
+    """The folder of a Wine prefix that a test may change, with its desktop running."""
+    folder = tmp_path_factory.mktemp("prefix") / "wine"
+    variables = {"WINEPREFIX": str(folder)}
+    wine = TREE / "scripts" / "run-under-wine"
+    subprocess.run([wine, "wineboot", "--init"], stdin=subprocess.DEVNULL,
+                   stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL,
+                   env={**os.environ, **variables}, timeout=300, check=True)
+    with wine_desktop(**variables):
+        yield folder
+    subprocess.run(["wineserver", "-k"], env={**os.environ, **variables}, check=False)
 
 
 def gpu_of(run):

@@ -12,7 +12,7 @@ from pathlib import Path
 import pytest
 
 from clmodel import ClGpu, ClPlatform, cl_script_of
-from conftest import BUILD, NO_OPENCL_PLATFORM, OPENCL_GPU, PROGRAM, TREE, run_under_wine
+from conftest import BUILD, NO_OPENCL_PLATFORM, OPENCL_GPU, TREE, run_under_wine, wine_desktop
 from harness import text_of
 
 sys.path.insert(0, str(TREE / "tests" / "schema"))
@@ -30,19 +30,9 @@ TIMEOUT = 2.0
 
 @pytest.fixture(autouse=True, scope="module")
 def desktop():
-    """Wine's desktop, which takes seconds to start, is started by the first program that needs one:
-    it would be one of that program's descendants, and be ended with it. A window keeps it, and with
-    it the streams of whoever started it."""
-    wine = TREE / "scripts" / "run-under-wine"
-    nowhere = {"stdin": subprocess.DEVNULL, "stdout": subprocess.DEVNULL,
-               "stderr": subprocess.DEVNULL}
-    with subprocess.Popen([wine, "C:\\windows\\system32\\notepad.exe"], **nowhere) as window:
-        try:
-            subprocess.run([wine, PROGRAM], env={**os.environ, **NO_OPENCL_PLATFORM}, timeout=120,
-                           check=True, **nowhere)
-            yield
-        finally:
-            window.kill()
+    """One that a child needs first would be among the child's descendants, and be ended with it."""
+    with wine_desktop():
+        yield
 
 
 def host_run(*arguments, **variables):

@@ -33,7 +33,9 @@ std::unique_ptr<DynamicLibrary> OpenLibrary(const char* const* names)
 {
     std::string reasons;
     for (; *names != nullptr; ++names) {
-        if (const HMODULE handle = LoadLibraryA(*names))
+        // The system's folder alone, for the library and for what it needs: a file of that name in
+        // the program's folder, the current directory or on the PATH is never loaded.
+        if (const HMODULE handle = LoadLibraryExA(*names, nullptr, LOAD_LIBRARY_SEARCH_SYSTEM32))
             return std::make_unique<Module>(handle);
         const DWORD error = GetLastError();
         if (!reasons.empty())
