@@ -11,6 +11,7 @@
 #include "app/Output.h"
 #include "pmutil/System.h"
 #include "report/RunOutcome.h"
+#include "supervise/ErrorDialogs.h"
 #include "supervise/Interrupt.h"
 
 namespace {
@@ -50,6 +51,7 @@ int main(int argc, char** argv)
 {
     pmutil::PrepareConsoleProcess();
     PrepareSignals();
+    KeepDialogsAway();
     try {
         const boost::nowide::args utf8(argc, argv);
         return RunMain(std::vector<std::string>(argv + 1, argv + argc));

@@ -6,6 +6,7 @@
 #include <shlobj.h>
 
 #include <csignal>
+#include <cstdlib>
 #include <share.h>
 #include <stdexcept>
 #include <vector>
@@ -35,6 +36,45 @@ LONG CALLBACK SwallowThreadNameException(EXCEPTION_POINTERS* pointers)
     return pointers->ExceptionRecord->ExceptionCode == kThreadNameException
                ? EXCEPTION_CONTINUE_EXECUTION
                : EXCEPTION_CONTINUE_SEARCH;
+}
+
+// An abort would end the process with 3, as a chosen status. This is the code by which newer
+// runtimes end an aborted process.
+[[noreturn]] void EndAsCrash(int /*signal*/)
+{
+    constexpr UINT kAborted = 0xC0000409; // STATUS_STACK_BUFFER_OVERRUN
+    TerminateProcess(GetCurrentProcess(), kAborted);
+    for (;;)
+        Sleep(INFINITE); // until it has taken effect
+}
+
+LPTOP_LEVEL_EXCEPTION_FILTER gFilterBefore = nullptr;
+
+// Ends the process with the exception's code, before the system asks a debugger or error reporting.
+// The C runtime's own filter comes first: it goes on after a C++ exception that nobody catches, so
+// that std::terminate is called.
+LONG WINAPI EndAtException(EXCEPTION_POINTERS* pointers)
+{
+    const LONG answer =
+        gFilterBefore != nullptr ? gFilterBefore(pointers) : EXCEPTION_CONTINUE_SEARCH;
+    return answer == EXCEPTION_CONTINUE_EXECUTION ? answer : EXCEPTION_EXECUTE_HANDLER;
+}
+
+// What error reporting shows for crashes that the error mode doesn't cover, where the system can be
+// told.
+void HideErrorReports()
+{
+    constexpr DWORD kNoUI = 0x20; // WER_FAULT_REPORTING_NO_UI
+    using GetFlags = HRESULT(WINAPI*)(HANDLE process, DWORD * flags);
+    using SetFlags = HRESULT(WINAPI*)(DWORD flags);
+    const HMODULE kernel = GetModuleHandleW(L"kernel32.dll");
+    const auto get =
+        reinterpret_cast<GetFlags>(reinterpret_cast<void*>(GetProcAddress(kernel, "WerGetFlags")));
+    const auto set =
+        reinterpret_cast<SetFlags>(reinterpret_cast<void*>(GetProcAddress(kernel, "WerSetFlags")));
+    DWORD flags = 0;
+    if (get != nullptr && set != nullptr && SUCCEEDED(get(GetCurrentProcess(), &flags)))
+        set(flags | kNoUI);
 }
 
 } // namespace
@@ -116,6 +156,15 @@ void PrepareConsoleProcess()
 {
     const UINT before = SetErrorMode(SEM_NOGPFAULTERRORBOX);
     SetErrorMode(before | SEM_NOGPFAULTERRORBOX);
+    // What else would ask the user, on this thread, which is the one that calls drivers: a library
+    // that lacks another one, a drive without a disk.
+    SetThreadErrorMode(SEM_FAILCRITICALERRORS | SEM_NOGPFAULTERRORBOX | SEM_NOOPENFILEERRORBOX,
+                       nullptr);
+    HideErrorReports();
+    gFilterBefore = SetUnhandledExceptionFilter(EndAtException);
+    _set_error_mode(_OUT_TO_STDERR);
+    std::signal(SIGABRT, EndAsCrash);
+    SetDllDirectoryW(L""); // no library comes from the current directory
 }
 
 const boost::filesystem::path::codecvt_type& GetPathCodecvt()

@@ -1,0 +1,76 @@
+#include "pmutil/System.h"
+
+#include <windows.h>
+
+#include <cassert>
+#include <cstdlib>
+#include <exception>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+using namespace pmutil;
+
+namespace {
+
+// As in Windows' own header of result codes, which are unsigned there.
+constexpr int kAborted = static_cast<int>(0xC0000409);
+constexpr int kAccessViolation = static_cast<int>(0xC0000005);
+
+struct Interface {
+    virtual ~Interface() = default;
+    Interface() { CallIt(); }
+    virtual void Missing() = 0;
+
+private:
+    void CallIt();
+};
+
+struct Implementation : Interface {
+    void Missing() override {}
+};
+
+void Interface::CallIt()
+{
+    Missing();
+}
+
+// Each ends as a crash: neither with the status 3, which says of a bad command line, nor in a
+// dialog, which would never end.
+TEST(PrepareConsoleProcessDeathTest, AbortIsACrash)
+{
+    const auto run = [](void (*fail)()) {
+        PrepareConsoleProcess();
+        fail();
+    };
+    EXPECT_EXIT(run([] { std::abort(); }), testing::ExitedWithCode(kAborted), "");
+    EXPECT_EXIT(run([] { std::terminate(); }), testing::ExitedWithCode(kAborted), "");
+    EXPECT_EXIT(run([] { assert(std::getenv("no such variable") != nullptr); }),
+                testing::ExitedWithCode(kAborted), "no such variable");
+    EXPECT_EXIT(run([] { Implementation pureCall; }), testing::ExitedWithCode(kAborted), "pure");
+}
+
+TEST(PrepareConsoleProcessDeathTest, AccessViolationIsACrash)
+{
+    EXPECT_EXIT(
+        {
+            PrepareConsoleProcess();
+            volatile int* volatile nowhere = nullptr;
+            *nowhere = 1;
+        },
+        testing::ExitedWithCode(kAccessViolation), "");
+}
+
+// The process keeps the mode that it inherits; everything else is the calling thread's alone.
+TEST(PrepareConsoleProcessDeathTest, NothingAsksTheUser)
+{
+    EXPECT_EXIT(
+        {
+            ::SetErrorMode(0);
+            PrepareConsoleProcess();
+            const bool none = (::GetThreadErrorMode() & SEM_FAILCRITICALERRORS) != 0;
+            ::ExitProcess(none ? ::GetErrorMode() : 99);
+        },
+        testing::ExitedWithCode(SEM_NOGPFAULTERRORBOX), "");
+}
+
+} // namespace
