@@ -2,13 +2,13 @@
 
 #include <algorithm>
 #include <chrono>
-#include <deque>
 #include <utility>
 
 #include <boost/filesystem/operations.hpp>
 #include <boost/make_shared.hpp>
 
 #include "pmutil/ConsoleAppLauncher.h"
+#include "supervise/ChildCommand.h"
 #include "supervise/ErrorLines.h"
 #include "supervise/EventQueue.h"
 #include "supervise/Judge.h"
@@ -87,10 +87,9 @@ private:
                                                 ErrorLines::kMaxBytes);
         fLaunch.SetConsoleApp(app);
         try {
-            fLaunch.SetLaunchParams(pmutil::LaunchParams(
-                fOutTask, fErrTask,
-                std::deque<std::string>(fOptions.fArgs.begin(), fOptions.fArgs.end()),
-                ToProgram(fOptions.fProgram)));
+            const ChildCommand command = MakeChildCommand(fOptions.fProgram, fOptions.fArgs);
+            fLaunch.SetLaunchParams(
+                pmutil::LaunchParams(fOutTask, fErrTask, command.fArgs, command.fProgram));
             fLaunch.Launch();
         } catch (const std::exception& exc) {
             NoteStartFailure(exc.what());

@@ -1,4 +1,4 @@
-// Paths as people type them, in UTF-8, and as the system and pmutil's launcher take them.
+// Paths as people type them, in UTF-8, and as the system takes them.
 #pragma once
 
 #include <string>
@@ -9,8 +9,5 @@ namespace assay_host {
 
 boost::filesystem::path ToPath(const std::string& text);
 std::string ToText(const boost::filesystem::path& path);
-
-// The program of a launch.
-std::wstring ToProgram(const std::string& text);
 
 } // namespace assay_host

@@ -1,0 +1,20 @@
+// What a launch takes, so that the child gets exactly the arguments that were asked for.
+#pragma once
+
+#include <deque>
+#include <string>
+#include <vector>
+
+namespace assay_host {
+
+// The program and the arguments of a pmutil::LaunchParams.
+struct ChildCommand {
+    std::wstring fProgram;
+    std::deque<std::string> fArgs;
+};
+
+// `program` is a path, all texts are UTF-8. On Windows the whole command line stands in fProgram:
+// the launcher takes it as it is, while its own way with arguments loses some of them.
+ChildCommand MakeChildCommand(const std::string& program, const std::vector<std::string>& args);
+
+} // namespace assay_host
