@@ -10,6 +10,7 @@
 #include "app/Commands.h"
 #include "app/Output.h"
 #include "pmutil/System.h"
+#include "pmutil/UTF8Console.h"
 #include "report/RunOutcome.h"
 #include "supervise/ErrorDialogs.h"
 #include "supervise/Interrupt.h"
@@ -52,6 +53,7 @@ int main(int argc, char** argv)
     pmutil::PrepareConsoleProcess();
     PrepareSignals();
     KeepDialogsAway();
+    const pmutil::UTF8Console console;
     try {
         const boost::nowide::args utf8(argc, argv);
         return RunMain(std::vector<std::string>(argv + 1, argv + argc));

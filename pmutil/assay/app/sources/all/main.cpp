@@ -1,6 +1,9 @@
+#include <boost/nowide/args.hpp>
+
 #include "Output.h"
 #include "PixmereAssay.h"
 #include "pmutil/System.h"
+#include "pmutil/UTF8Console.h"
 
 int main(int argc, char** argv)
 {
@@ -9,6 +12,8 @@ int main(int argc, char** argv)
     pmutil::PrepareConsoleProcess();
     assay::PrepareOutput();
     try {
+        const pmutil::UTF8Console console;
+        const boost::nowide::args utf8(argc, argv);
         assay::PixmereAssay::Arguments arguments(argv, argv + argc);
         return assay::PixmereAssay::Instance().Run(arguments);
     } catch (...) {

@@ -1,0 +1,51 @@
+#include "pmutil/UTF8Console.h"
+
+#include <windows.h>
+
+#include <atomic>
+
+namespace pmutil {
+
+namespace {
+
+std::atomic<UINT> gCodePageBefore{0}; // 0: none to put back
+
+bool IsConsole(DWORD stream)
+{
+    DWORD mode = 0;
+    return GetConsoleMode(GetStdHandle(stream), &mode) != 0;
+}
+
+void PutBack()
+{
+    if (const UINT codePage = gCodePageBefore.exchange(0))
+        SetConsoleOutputCP(codePage);
+}
+
+// Comes after the handlers that were added later, and only if none of them goes on with the run.
+BOOL WINAPI PutBackBeforeTheEnd(DWORD /*event*/)
+{
+    PutBack();
+    return FALSE;
+}
+
+} // namespace
+
+UTF8Console::UTF8Console()
+{
+    if (!IsConsole(STD_OUTPUT_HANDLE) && !IsConsole(STD_ERROR_HANDLE))
+        return;
+    const UINT before = GetConsoleOutputCP();
+    if (before == CP_UTF8 || SetConsoleOutputCP(CP_UTF8) == 0)
+        return;
+    gCodePageBefore = before;
+    SetConsoleCtrlHandler(PutBackBeforeTheEnd, TRUE);
+}
+
+UTF8Console::~UTF8Console()
+{
+    SetConsoleCtrlHandler(PutBackBeforeTheEnd, FALSE);
+    PutBack();
+}
+
+} // namespace pmutil
