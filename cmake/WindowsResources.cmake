@@ -1,0 +1,28 @@
+# assay_windows_resources(TARGET DESCRIPTION): a version resource, and for a program a manifest.
+# Nothing on other platforms.
+function(assay_windows_resources target description)
+  if(NOT WIN32)
+    return()
+  endif()
+  set(folder ${CMAKE_SOURCE_DIR}/cmake/windows)
+  set(made ${CMAKE_CURRENT_BINARY_DIR}/${target}-resources)
+  string(REPLACE "." "," version_numbers ${PROJECT_VERSION}.0)
+  get_target_property(type ${target} TYPE)
+  if(type STREQUAL "EXECUTABLE")
+    set(suffix .exe)
+    set(file_type 1)
+    configure_file(${folder}/program.manifest.in ${made}/program.manifest @ONLY)
+    set(manifest "1 24 \"${made}/program.manifest\"")
+  else()
+    set(suffix .dll)
+    set(file_type 2)
+  endif()
+  configure_file(${folder}/resources.rc.in ${made}/resources.rc @ONLY)
+  # A library of its own, so that the C++ compiler's options don't reach the resource compiler.
+  add_library(${target}_resources OBJECT ${made}/resources.rc)
+  if(manifest)
+    set_source_files_properties(${made}/resources.rc PROPERTIES
+      OBJECT_DEPENDS ${made}/program.manifest)
+  endif()
+  target_sources(${target} PRIVATE $<TARGET_OBJECTS:${target}_resources>)
+endfunction()
