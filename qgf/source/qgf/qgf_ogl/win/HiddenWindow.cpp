@@ -1,5 +1,7 @@
 #include "qgf/qgf_ogl/win/HiddenWindow.h"
 
+#include <future>
+
 #include "qgf/Core.h"
 #include "qgf/qgf_core/win/SystemError.h"
 
@@ -18,13 +20,19 @@ constexpr int kSize = 32; // nothing is drawn on it
                            Core::SystemErrorText(error));
 }
 
+// Whoever asks all programs to close gets no window of a running measurement.
+LRESULT CALLBACK TakeMessage(HWND window, UINT message, WPARAM wide, LPARAM extra)
+{
+    return message == WM_CLOSE ? 0 : DefWindowProcW(window, message, wide, extra);
+}
+
 // Registered once per process; the system drops it at the end.
 void RegisterWindowClass(const std::string& deviceName)
 {
     WNDCLASSEXW windowClass{};
     windowClass.cbSize = sizeof windowClass;
     windowClass.style = CS_OWNDC;
-    windowClass.lpfnWndProc = DefWindowProcW;
+    windowClass.lpfnWndProc = TakeMessage;
     windowClass.hInstance = GetModuleHandleW(nullptr);
     windowClass.lpszClassName = kClassName;
     if (RegisterClassExW(&windowClass) == 0 && GetLastError() != ERROR_CLASS_ALREADY_EXISTS)
@@ -40,29 +48,69 @@ POINT GetDesktopPosition(const std::string& deviceName)
     return {mode.dmPosition.x, mode.dmPosition.y};
 }
 
-} // namespace
-
-HiddenWindow::HiddenWindow(const std::string& deviceName)
+HWND MakeWindow(const std::string& deviceName)
 {
     RegisterWindowClass(deviceName);
     const POINT position = GetDesktopPosition(deviceName);
-    fWindow = CreateWindowExW(0, kClassName, L"", WS_POPUP | WS_CLIPCHILDREN | WS_CLIPSIBLINGS,
-                              position.x, position.y, kSize, kSize, nullptr, nullptr,
-                              GetModuleHandleW(nullptr), nullptr);
-    if (fWindow == nullptr)
+    const HWND window = CreateWindowExW(
+        0, kClassName, L"", WS_POPUP | WS_CLIPCHILDREN | WS_CLIPSIBLINGS, position.x, position.y,
+        kSize, kSize, nullptr, nullptr, GetModuleHandleW(nullptr), nullptr);
+    if (window == nullptr)
         ThrowFailed("CreateWindowExW", deviceName);
+    return window;
+}
+
+// Makes the window, hands it over and takes its messages until this thread is told to quit.
+void RunWindow(const std::string& deviceName, std::promise<HWND> made)
+{
+    HWND window = nullptr;
+    try {
+        window = MakeWindow(deviceName);
+    } catch (...) {
+        made.set_exception(std::current_exception());
+        return;
+    }
+    made.set_value(window);
+    MSG message{};
+    while (GetMessageW(&message, nullptr, 0, 0) > 0)
+        DispatchMessageW(&message);
+    DestroyWindow(window);
+}
+
+} // namespace
+
+// Only the window is the other thread's: drivers are called on the maker's.
+HiddenWindow::HiddenWindow(const std::string& deviceName)
+{
+    std::promise<HWND> promise;
+    std::future<HWND> made = promise.get_future();
+    fThread = std::thread(RunWindow, deviceName, std::move(promise));
+    try {
+        fWindow = made.get();
+    } catch (...) {
+        fThread.join();
+        throw;
+    }
+    fThreadID = GetWindowThreadProcessId(fWindow, nullptr);
     try {
         ChooseFormat(deviceName);
     } catch (...) {
-        DestroyWindow(fWindow);
+        Close();
         throw;
     }
 }
 
 HiddenWindow::~HiddenWindow()
 {
-    ReleaseDC(fWindow, fDC);
-    DestroyWindow(fWindow);
+    Close();
+}
+
+void HiddenWindow::Close()
+{
+    if (fDC != nullptr)
+        ReleaseDC(fWindow, fDC);
+    PostThreadMessageW(fThreadID, WM_QUIT, 0, 0);
+    fThread.join();
 }
 
 void HiddenWindow::ChooseFormat(const std::string& deviceName)

@@ -2,13 +2,16 @@
 #pragma once
 
 #include <string>
+#include <thread>
 
 #include <windows.h>
 
 namespace QGF {
 namespace OGL {
 
-// Has a pixel format that OpenGL can use. Not copyable; destroyed on the thread that made it.
+// Has a pixel format that OpenGL can use. A thread of its own takes the window's messages, so that
+// another program's broadcast is answered at once, whatever the maker's thread is busy with. Not
+// copyable; destroyed on the thread that made it.
 class HiddenWindow {
 public:
     // Lies on the part of the desktop that `deviceName` shows, so that a driver that serves one
@@ -23,7 +26,10 @@ public:
 
 private:
     void ChooseFormat(const std::string& deviceName);
+    void Close();
 
+    std::thread fThread;
+    DWORD fThreadID = 0;
     HWND fWindow = nullptr;
     HDC fDC = nullptr;
 };
