@@ -5,10 +5,12 @@
 #include <knownfolders.h>
 #include <shlobj.h>
 
+#include <algorithm>
 #include <csignal>
 #include <cstdlib>
 #include <share.h>
 #include <stdexcept>
+#include <utility>
 #include <vector>
 
 #include "all/PathCodecvt.h"
@@ -37,6 +39,43 @@ LONG CALLBACK SwallowThreadNameException(EXCEPTION_POINTERS* pointers)
                ? EXCEPTION_CONTINUE_EXECUTION
                : EXCEPTION_CONTINUE_SEARCH;
 }
+
+// The code page of the narrow file calls, as Boost has it; but a path that it can't say fails, and
+// isn't another path with question marks.
+class PathFacet : public boost::filesystem::path::codecvt_type {
+public:
+    PathFacet() : codecvt_type(1) {} // the reference that keeps locales from deleting it
+
+private:
+    using codecvt_type = boost::filesystem::path::codecvt_type;
+
+    result do_out(state_type& state, const wchar_t* from, const wchar_t* fromEnd,
+                  const wchar_t*& fromNext, char* to, char* toEnd, char*& toNext) const override
+    {
+        const codecvt_type& base = boost::filesystem::path::codecvt();
+        const result converted = base.out(state, from, fromEnd, fromNext, to, toEnd, toNext);
+        if (converted != ok)
+            return converted;
+        std::wstring back(static_cast<std::size_t>(toNext - to), L'\0');
+        const char* read = to;
+        wchar_t* backEnd = back.data();
+        if (base.in(state, to, toNext, read, back.data(), back.data() + back.size(), backEnd) != ok)
+            return error;
+        return std::equal(from, fromEnd, std::as_const(back).data(),
+                          static_cast<const wchar_t*>(backEnd))
+                   ? ok
+                   : error;
+    }
+
+    result do_in(state_type& state, const char* from, const char* fromEnd, const char*& fromNext,
+                 wchar_t* to, wchar_t* toEnd, wchar_t*& toNext) const override
+    {
+        return boost::filesystem::path::codecvt().in(state, from, fromEnd, fromNext, to, toEnd,
+                                                     toNext);
+    }
+
+    bool do_always_noconv() const noexcept override { return false; }
+};
 
 // An abort would end the process with 3, as a chosen status. This is the code by which newer
 // runtimes end an aborted process.
@@ -169,7 +208,8 @@ void PrepareConsoleProcess()
 
 const boost::filesystem::path::codecvt_type& GetPathCodecvt()
 {
-    return boost::filesystem::path::codecvt(); // the code page of the narrow file calls
+    static const PathFacet& facet = *new PathFacet; // outlives all users
+    return facet;
 }
 
 } // namespace pmutil

@@ -17,6 +17,7 @@ constexpr DWORD kShareAll = FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELE
     throw std::runtime_error(std::string(call) + " failed");
 }
 
+// Both are called with flags that OpenFile has looked at.
 DWORD GetDesiredAccess(int access)
 {
     static constexpr DWORD kAccess[] = {GENERIC_READ, GENERIC_WRITE, GENERIC_READ | GENERIC_WRITE};
@@ -113,7 +114,8 @@ void WinCalls::SetEndOfFile(Handle handle)
 WinCalls::Path WinCalls::GetTemporaryDirectory()
 {
     wchar_t buffer[kPathLength] = {};
-    if (::GetTempPathW(kPathLength, buffer) == 0)
+    const DWORD length = ::GetTempPathW(kPathLength, buffer);
+    if (length == 0 || length >= kPathLength) // from there on it is the length that was needed
         ThrowCallFailed("GetTempPathW");
     return buffer;
 }

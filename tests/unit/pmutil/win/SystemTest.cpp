@@ -8,6 +8,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "all/PathCodecvt.h"
+
 using namespace pmutil;
 
 namespace {
@@ -32,6 +34,20 @@ struct Implementation : Interface {
 void Interface::CallIt()
 {
     Missing();
+}
+
+TEST(PathCodecvt, PathThatTheCodePageCannotSayFails)
+{
+    using boost::filesystem::path;
+    EXPECT_EQ(path(L"C:\\plain.txt").string(GetPathCodecvt()), "C:\\plain.txt");
+    EXPECT_EQ(path("C:\\plain.txt").wstring(GetPathCodecvt()), L"C:\\plain.txt");
+    const wchar_t kNowhere[] = {L'C', L':', L'\\', 0xD83D, L'\0'}; // half a character
+    try {
+        path(kNowhere).string(GetPathCodecvt());
+        FAIL() << "converted";
+    } catch (const boost::system::system_error& error) {
+        EXPECT_THAT(error.what(), testing::StartsWith("boost::filesystem::path codecvt to string"));
+    }
 }
 
 // Each ends as a crash: neither with the status 3, which says of a bad command line, nor in a

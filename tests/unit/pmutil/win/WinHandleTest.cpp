@@ -4,6 +4,7 @@
 #include <winioctl.h>
 
 #include "../HandleChannelTests.h"
+#include "../Throws.h"
 #include "pmutil/Fmt.h"
 
 using namespace pmutil;
@@ -55,6 +56,19 @@ TEST(WinHandle, TemporaryDirectoryIsTheUsersFolder)
     wchar_t buffer[MAX_PATH] = {};
     ASSERT_NE(::GetTempPathW(MAX_PATH, buffer), 0U);
     EXPECT_EQ(WinHandle::GetTemporaryDirectory(), buffer);
+}
+
+TEST(WinHandle, TemporaryDirectoryThatIsTooLongFails)
+{
+    const std::wstring usual = WinHandle::GetTemporaryDirectory();
+    wchar_t variable[MAX_PATH + 2] = {};
+    ASSERT_NE(::GetEnvironmentVariableW(L"TMP", variable, MAX_PATH), 0U);
+    ::SetEnvironmentVariableW(L"TMP", (L"C:\\" + std::wstring(257, L'x')).c_str());
+    EXPECT_TRUE(ThrowsRuntimeError("GetTempPathW failed", [] {
+        WinHandle::GetTemporaryDirectory();
+    })) << "260 characters and the backslash after them";
+    ::SetEnvironmentVariableW(L"TMP", variable);
+    EXPECT_EQ(WinHandle::GetTemporaryDirectory(), usual);
 }
 
 TEST(WinHandle, StandardChannelsStandOverTheProcessesHandles)
