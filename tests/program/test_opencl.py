@@ -359,12 +359,14 @@ def test_profiling_that_fails_is_no_failure(one):
 
 # A bad answer of the only device: the script line, the key, and standard error or a value.
 BAD_ANSWERS = [
-    ("claim CL_DEVICE_NAME 0x4000000000000", "CLName", NO_ROOM),
+    ("claim CL_DEVICE_NAME -1", "CLName", NO_ROOM),
     ("claim CL_DEVICE_VENDOR -1", "CLVendor", NO_ROOM),
-    ("claim CL_DRIVER_VERSION 0x4000000000000", "CLDriverVersion", NO_ROOM),
     ("claim CL_DRIVER_VERSION -1", "CLDriverVersion", NO_ROOM),
-    ("claim CL_DEVICE_VERSION 0x4000000000000", "CLDeviceVersion", NO_ROOM),
     ("claim CL_DEVICE_VERSION -1", "CLDeviceVersion", NO_ROOM),
+    # More than an address space holds.
+    pytest.param("claim CL_DRIVER_VERSION 0x4000000000000", "CLDriverVersion", NO_ROOM,
+                 marks=pytest.mark.skipif(SANITIZED_BY != "",
+                                          reason="the sanitizer's allocator ends the process")),
     # Not even the terminating zero byte.
     ("claim CL_DEVICE_VERSION 0", "CLDeviceVersion", NO_ROOM),
     ("bytes CL_DEVICE_GLOBAL_MEM_SIZE \"abc\"", "CLMemoryMB",

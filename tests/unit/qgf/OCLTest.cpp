@@ -20,8 +20,8 @@ using QGF::OCL::Platform;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// More than the address space of any machine holds.
-constexpr std::size_t kPetabyte = std::size_t{1} << 50U;
+// More than any object may have.
+constexpr std::size_t kHalfOfAll = std::size_t{1} << 63U;
 
 // The text of the LogicalException that `action` throws; empty if it throws none.
 template <typename Action>
@@ -217,7 +217,7 @@ TEST_F(OCLTest, ATextThatEndsBeforeItsClaimIsNoLonger)
 
 TEST_F(OCLTest, ATextForWhichThereIsNoRoomIsTheAllocationsFailure)
 {
-    for (const std::size_t claim : {kPetabyte, ~std::size_t{0}}) {
+    for (const std::size_t claim : {kHalfOfAll, ~std::size_t{0}}) {
         cl.calls.clear();
         answers()[CL_DEVICE_VENDOR] = CLAnswer{"x", claim, CL_SUCCESS, CL_SUCCESS};
         EXPECT_THROW((void)device.vendor(), std::bad_alloc) << claim;

@@ -1,6 +1,7 @@
 #include "qgf/TextRoom.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdlib>
 #include <limits>
 #include <new>
@@ -13,12 +14,11 @@ void TextRoom::Free::operator()(char* bytes) const noexcept
     std::free(bytes);
 }
 
-TextRoom::TextRoom(std::size_t length)
-    : fLength(length),
-      fBytes(length < std::numeric_limits<std::size_t>::max()
-                 ? static_cast<char*>(std::calloc(length + 1, 1))
-                 : nullptr)
+TextRoom::TextRoom(std::size_t length) : fLength(length)
 {
+    // No object is larger, and the byte behind the text must not make the size wrap around.
+    if (length < static_cast<std::size_t>(std::numeric_limits<std::ptrdiff_t>::max()))
+        fBytes.reset(static_cast<char*>(std::calloc(length + 1, 1)));
     if (!fBytes)
         throw std::bad_alloc();
 }
