@@ -11,6 +11,8 @@
 
 namespace pmutil {
 
+class ChildProcess;
+
 class LauncherPosix : public Launcher {
 public:
     LauncherPosix();
@@ -23,7 +25,8 @@ public:
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override;
 
     // Throws std::runtime_error "waitid failed: No child processes" where something else in the
-    // host has taken the child's end, such as a handler that waits for any child.
+    // host has taken the child's end, such as a handler that waits for any child, however early. A
+    // Kill signals nobody from then on: the child's number may be another process's.
     WaitResult Wait(int* exitCode) override;
     void Kill() override;
 
@@ -32,14 +35,12 @@ public:
     int GetTermSignal() const;
 
 private:
-    class Child;
-
     LaunchResult Start(const std::string& path, const std::deque<std::string>& args);
 
-    boost::shared_ptr<Child> GetChild() const;
+    boost::shared_ptr<ChildProcess> GetChild() const;
 
     mutable boost::mutex fMutex;
-    boost::shared_ptr<Child> fChild; // that of the latest launch
+    boost::shared_ptr<ChildProcess> fChild; // that of the latest launch
 };
 
 } // namespace pmutil

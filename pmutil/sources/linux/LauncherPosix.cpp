@@ -4,15 +4,11 @@
 #include <csignal>
 #include <cstring>
 #include <fcntl.h>
-#include <poll.h>
 #include <spawn.h>
-#include <sys/syscall.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
-#include <algorithm>
+#include <sstream>
 #include <stdexcept>
-#include <system_error>
 #include <vector>
 
 #include <boost/filesystem/path.hpp>
@@ -21,6 +17,8 @@
 
 #include "all/BinioLog.h"
 #include "all/PathCodecvt.h"
+#include "linux/CallFailure.h"
+#include "linux/ChildProcess.h"
 #include "pmutil/PosixHandle.h"
 
 namespace pmutil {
@@ -33,35 +31,6 @@ constexpr int kPipeBytes = 1 << 20;
 
 // Descriptors below are the child's standard streams, and in its way.
 constexpr int kFirstFree = 3;
-
-// How long Kill waits to see off a child that nobody waits for.
-constexpr int kReapMilliseconds = 1000;
-
-// The C library's own are missing from older ones, and not meant for C++ in others.
-int OpenPidfd(::pid_t pid)
-{
-    return static_cast<int>(::syscall(SYS_pidfd_open, pid, 0));
-}
-
-int SendSignal(int pidfd, int number)
-{
-    return static_cast<int>(::syscall(SYS_pidfd_send_signal, pidfd, number, nullptr, 0));
-}
-
-// A failed call before it is known for whom it was made.
-struct CallFailure {
-    const char* call;
-    int error;
-};
-
-[[noreturn]] void ThrowFailed(const CallFailure& failure, const std::string& path = {})
-{
-    // A path with a zero byte ends there, so that the text behind it can be seen.
-    // NOLINTNEXTLINE(readability-redundant-string-cstr)
-    throw std::runtime_error(std::string(failure.call) + " failed: " + path.c_str() +
-                             (path.empty() ? "" : ": ") +
-                             std::system_category().message(failure.error));
-}
 
 // One end for the parent and one for the child.
 struct ChildPipe {
@@ -156,53 +125,6 @@ private:
     posix_spawnattr_t fAttributes{};
 };
 
-// True once the process behind `pidfd` has ended, waiting up to `milliseconds`, or without a limit
-// for -1.
-bool PollEnd(int pidfd, int milliseconds)
-{
-    pollfd poll{pidfd, POLLIN, 0};
-    int result = 0;
-    do
-        result = ::poll(&poll, 1, milliseconds);
-    while (result < 0 && errno == EINTR);
-    if (result < 0)
-        ThrowFailed({"poll", errno});
-    return result > 0;
-}
-
-// Children that nobody waits for any more. Each is looked after at times, so that it doesn't stay a
-// zombie for long once it has ended.
-class Orphans {
-public:
-    static Orphans& Get()
-    {
-        static Orphans& orphans = *new Orphans; // threads may outlive statics
-        return orphans;
-    }
-
-    void Add(boost::shared_ptr<PosixHandle> pidfd)
-    {
-        const boost::lock_guard<boost::mutex> lock(fMutex);
-        fPidfds.push_back(std::move(pidfd));
-    }
-
-    void Reap()
-    {
-        const boost::lock_guard<boost::mutex> lock(fMutex);
-        const auto hasEnded = [](const boost::shared_ptr<PosixHandle>& pidfd) {
-            siginfo_t info = {};
-            return ::waitid(P_PIDFD, static_cast<id_t>(pidfd->GetHandle()), &info,
-                            WEXITED | WNOHANG) != 0 ||
-                   info.si_pid != 0;
-        };
-        fPidfds.erase(std::remove_if(fPidfds.begin(), fPidfds.end(), hasEnded), fPidfds.end());
-    }
-
-private:
-    boost::mutex fMutex;
-    std::vector<boost::shared_ptr<PosixHandle>> fPidfds;
-};
-
 std::string GetUTF8(const std::wstring& program)
 {
     try {
@@ -237,99 +159,10 @@ void LogPipe(const char* stream, const ChildPipe& pipe)
 
 } // namespace
 
-// A started process. It is addressed by its process descriptor only, so that no signal can reach
-// another process that has got its number since.
-class LauncherPosix::Child {
-public:
-    Child() : fPidfd(boost::make_shared<PosixHandle>(PosixCalls::GetInvalid(), false)) {}
-
-    // Called once, with a process just started.
-    void Adopt(::pid_t pid)
-    {
-        const int pidfd = OpenPidfd(pid);
-        if (pidfd < 0) {
-            const int error = errno;
-            ::kill(pid, SIGKILL); // not waited for yet, so the number is still the child's
-            ::waitpid(pid, nullptr, 0);
-            throw CallFailure{"pidfd_open", error};
-        }
-        fPidfd->Reset(pidfd, true);
-    }
-
-    ~Child()
-    {
-        if (!fPidfd->IsOpen())
-            return;
-        try {
-            Orphans::Get().Add(fPidfd);
-            Orphans::Get().Reap();
-        } catch (...) {
-            // Without memory for it, an ended child stays a zombie until this process ends.
-        }
-    }
-    Child(const Child&) = delete;
-    Child& operator=(const Child&) = delete;
-
-    WaitResult Wait(int* exitCode)
-    {
-        {
-            const boost::lock_guard<boost::mutex> lock(fMutex);
-            fHasWaiter = true;
-        }
-        if (fPidfd->IsOpen())
-            PollEnd(fPidfd->GetHandle(), -1);
-        const boost::lock_guard<boost::mutex> lock(fMutex);
-        ReapLocked();
-        if (fEnd.si_code == CLD_EXITED) {
-            *exitCode = fEnd.si_status;
-            return kEndedNormally;
-        }
-        return fKilled ? kEndedByKill : kEndedByCrash;
-    }
-
-    void Kill()
-    {
-        const boost::lock_guard<boost::mutex> lock(fMutex);
-        fKilled = true;
-        if (!fPidfd->IsOpen())
-            return;
-        if (SendSignal(fPidfd->GetHandle(), SIGKILL) != 0 && errno != ESRCH)
-            ThrowFailed({"pidfd_send_signal", errno});
-        if (!fHasWaiter && PollEnd(fPidfd->GetHandle(), kReapMilliseconds))
-            ReapLocked();
-    }
-
-    int GetTermSignal()
-    {
-        const boost::lock_guard<boost::mutex> lock(fMutex);
-        return fEnd.si_code == CLD_KILLED || fEnd.si_code == CLD_DUMPED ? fEnd.si_status : 0;
-    }
-
-private:
-    // The one place where the process is taken off the system's list. It has ended.
-    void ReapLocked()
-    {
-        if (!fPidfd->IsOpen())
-            return;
-        const int result =
-            ::waitid(P_PIDFD, static_cast<id_t>(fPidfd->GetHandle()), &fEnd, WEXITED);
-        const int error = errno;
-        fPidfd->Close();
-        if (result != 0)
-            ThrowFailed({"waitid", error});
-    }
-
-    boost::mutex fMutex;
-    boost::shared_ptr<PosixHandle> fPidfd; // closed once the end is known
-    bool fHasWaiter = false;               // from then on only the waiter reaps
-    bool fKilled = false;
-    siginfo_t fEnd{};
-};
-
 LauncherPosix::LauncherPosix() = default;
 LauncherPosix::~LauncherPosix() = default;
 
-boost::shared_ptr<LauncherPosix::Child> LauncherPosix::GetChild() const
+boost::shared_ptr<ChildProcess> LauncherPosix::GetChild() const
 {
     const boost::lock_guard<boost::mutex> lock(fMutex);
     return fChild;
@@ -337,7 +170,7 @@ boost::shared_ptr<LauncherPosix::Child> LauncherPosix::GetChild() const
 
 LaunchResult LauncherPosix::Launch(const std::wstring& program, const std::deque<std::string>& args)
 {
-    Orphans::Get().Reap();
+    ReapOrphans();
     const std::string path = GetUTF8(program);
     try {
         return Start(path, args);
@@ -373,12 +206,15 @@ LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std:
     options.ResetSignals();
 
     // Made first, so that no failure can come between the process and its owner.
-    const auto child = boost::make_shared<Child>();
+    const auto child = boost::make_shared<ChildProcess>();
     ::pid_t pid = 0;
     const int failure = ::posix_spawn(&pid, path.c_str(), options.GetActions(),
                                       options.GetAttributes(), argv.data(), ::environ);
     if (failure != 0)
         throw CallFailure{"posix_spawn", failure};
+    // The child has its ends; the room is wanted for its process descriptor.
+    for (const auto& end : {input.reader, output.writer, error.writer})
+        end->Close();
     child->Adopt(pid);
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
@@ -394,7 +230,7 @@ LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std:
 
 WaitResult LauncherPosix::Wait(int* exitCode)
 {
-    const boost::shared_ptr<Child> child = GetChild();
+    const boost::shared_ptr<ChildProcess> child = GetChild();
     if (child == nullptr)
         ThrowFailed({"waitid", ECHILD});
     return child->Wait(exitCode);
@@ -402,14 +238,14 @@ WaitResult LauncherPosix::Wait(int* exitCode)
 
 void LauncherPosix::Kill()
 {
-    const boost::shared_ptr<Child> child = GetChild();
+    const boost::shared_ptr<ChildProcess> child = GetChild();
     if (child != nullptr)
         child->Kill();
 }
 
 int LauncherPosix::GetTermSignal() const
 {
-    const boost::shared_ptr<Child> child = GetChild();
+    const boost::shared_ptr<ChildProcess> child = GetChild();
     return child != nullptr ? child->GetTermSignal() : 0;
 }
 
