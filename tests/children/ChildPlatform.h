@@ -14,4 +14,5 @@ void DieOf(const std::string& how);
 void CloseOutputs();
 void SpawnGrandchild(const std::vector<std::string>& command); // of words without blanks
 void WriteCommandLine();
+int CountPipes();
 void WriteState();

@@ -13,6 +13,7 @@
 //   spawn MILLISECONDS     starts a grandchild that sleeps, with this child's streams
 //   heir                   starts a grandchild with this child's streams that does echo
 //   line                   writes its command line, each character in hexadecimal (Windows only)
+//   pipes                  writes how many ends of pipes it has
 //   state                  writes the descriptors it has and its signal state (Linux only)
 #include <chrono>
 #include <cstdio>
@@ -92,6 +93,9 @@ int main(int argc, char** argv)
         } else if (word == "line") {
             WriteCommandLine();
             return 0;
+        } else if (word == "pipes") {
+            std::printf("pipes %d\n", CountPipes());
+            std::fflush(stdout);
         } else if (word == "state") {
             WriteState();
         } else if (word == "args") {

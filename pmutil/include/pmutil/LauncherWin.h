@@ -1,5 +1,7 @@
 // Starts, awaits and kills children by CreateProcessW.
 //
+// The child inherits its three pipes and no other handle, inheritable or not.
+//
 // A child that ends with a code of 256 or more crashed, or was killed if Kill was called.
 //
 // Each argument is put in double quotation marks, or in apostrophes if it holds a double quotation

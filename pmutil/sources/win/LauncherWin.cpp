@@ -2,6 +2,7 @@
 
 #include <windows.h>
 
+#include <cstddef>
 #include <iomanip>
 #include <sstream>
 #include <stdexcept>
@@ -52,6 +53,38 @@ void KeepFromChild(const WinHandle& end)
         ThrowFailed("SetHandleInformation");
 }
 
+// The handles that a child gets, of all that could be inherited: another launch's ends among them,
+// while that one makes its own child.
+class HandleList {
+public:
+    explicit HandleList(const STARTUPINFOW& startup)
+        : fHandles{startup.hStdInput, startup.hStdOutput, startup.hStdError}
+    {
+        SIZE_T size = 0;
+        ::InitializeProcThreadAttributeList(nullptr, 1, 0, &size);
+        fMemory.resize(size / sizeof(std::max_align_t) + 1);
+        if (::InitializeProcThreadAttributeList(Get(), 1, 0, &size) == 0)
+            ThrowFailed("InitializeProcThreadAttributeList");
+        if (::UpdateProcThreadAttribute(Get(), 0, PROC_THREAD_ATTRIBUTE_HANDLE_LIST, fHandles,
+                                        sizeof fHandles, nullptr, nullptr) == 0) {
+            ::DeleteProcThreadAttributeList(Get());
+            ThrowFailed("UpdateProcThreadAttribute");
+        }
+    }
+    ~HandleList() { ::DeleteProcThreadAttributeList(Get()); }
+    HandleList(const HandleList&) = delete;
+    HandleList& operator=(const HandleList&) = delete;
+
+    LPPROC_THREAD_ATTRIBUTE_LIST Get()
+    {
+        return reinterpret_cast<LPPROC_THREAD_ATTRIBUTE_LIST>(fMemory.data());
+    }
+
+private:
+    HANDLE fHandles[3];
+    std::vector<std::max_align_t> fMemory;
+};
+
 } // namespace
 
 LauncherWin::LauncherWin() = default;
@@ -86,8 +119,9 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
     std::vector<wchar_t> commandLine(text.begin(), text.end());
     commandLine.push_back(L'\0');
 
-    STARTUPINFOW startup = {};
-    startup.cb = sizeof startup;
+    STARTUPINFOEXW extended = {};
+    STARTUPINFOW& startup = extended.StartupInfo;
+    startup.cb = sizeof extended;
     startup.dwFlags = STARTF_USESHOWWINDOW;
     startup.wShowWindow = SW_HIDE;
     startup.hStdInput = ::GetStdHandle(STD_INPUT_HANDLE);
@@ -111,12 +145,15 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
     PM_LOG(gBinioLog, "childStderrRd=" << error.reader->GetHandle()
                                        << " childStderrWr=" << error.writer->GetHandle());
 
+    HandleList inherited(startup);
+    extended.lpAttributeList = inherited.Get();
+
     fKilled = false;
     fProcess = nullptr;
     fRawExitCode = 0;
     PROCESS_INFORMATION process = {};
-    if (::CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr,
-                         &startup, &process) == 0)
+    if (::CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE,
+                         EXTENDED_STARTUPINFO_PRESENT, nullptr, nullptr, &startup, &process) == 0)
         ThrowFailed("CreateProcessW");
     fProcess = process.hProcess;
 

@@ -6,7 +6,14 @@
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/resource.h>
+#include <sys/stat.h>
 #include <unistd.h>
+
+namespace {
+
+constexpr int kDescriptors = 1024; // all that could be open
+
+} // namespace
 
 void PrepareStreams()
 {
@@ -55,10 +62,19 @@ void SpawnGrandchild(const std::vector<std::string>& command)
 
 void WriteCommandLine() {}
 
+int CountPipes()
+{
+    int count = 0;
+    struct stat status = {};
+    for (int descriptor = 0; descriptor < kDescriptors; ++descriptor)
+        count += ::fstat(descriptor, &status) == 0 && S_ISFIFO(status.st_mode);
+    return count;
+}
+
 void WriteState()
 {
     std::printf("descriptors");
-    for (int descriptor = 0; descriptor < 1024; ++descriptor) {
+    for (int descriptor = 0; descriptor < kDescriptors; ++descriptor) {
         if (::fcntl(descriptor, F_GETFD) != -1)
             std::printf(" %d", descriptor);
     }

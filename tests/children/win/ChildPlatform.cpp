@@ -102,4 +102,12 @@ void WriteCommandLine()
     std::fflush(stdout);
 }
 
+int CountPipes()
+{
+    int count = 0;
+    for (ULONG_PTR handle = 4; handle < 4096; handle += 4)
+        count += ::GetFileType(reinterpret_cast<HANDLE>(handle)) == FILE_TYPE_PIPE;
+    return count;
+}
+
 void WriteState() {}

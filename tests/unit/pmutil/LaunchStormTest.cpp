@@ -1,4 +1,6 @@
 // Many launches of real children, and what is left of them.
+#include <atomic>
+#include <boost/thread/barrier.hpp>
 #include <chrono>
 #include <cstdlib>
 #include <gtest/gtest.h>
@@ -106,6 +108,81 @@ TEST_F(LaunchStorm, TwoThreadsWaitWhileTwoKill)
         }
         ASSERT_GE(informed, 1) << "one of them must learn the end";
         ASSERT_EQ(fLaunch->launcher.Wait(nullptr, 0.0), State::kIdle);
+    }
+}
+
+// A child on pipes whose output a thread reads to its end.
+class PipedChild {
+public:
+    void Launch(std::deque<std::string> args)
+    {
+        fEnds = fLauncher->Launch(TEST_CHILD, args);
+        for (int channel = 1; channel < kOutputSlots; ++channel)
+            fReaders.create_thread([this, channel] { ReadOutput(channel); });
+    }
+
+    void CloseInput() { fEnds.fAppInput->Close(); }
+
+    std::string Text()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        return fText;
+    }
+
+    bool IsAtEnd() const { return fAtEnd == 2; }
+
+    int Finish()
+    {
+        fReaders.join_all();
+        int exitCode = -1;
+        fLauncher->Wait(&exitCode);
+        return exitCode;
+    }
+
+private:
+    void ReadOutput(int channel)
+    {
+        char block[256];
+        Reader& reader = *fEnds.fAppOutput[channel];
+        while (const auto count = reader.ReadSome(block, sizeof block)) {
+            const boost::lock_guard<boost::mutex> lock(fMutex);
+            fText.append(block, count);
+        }
+        ++fAtEnd;
+    }
+
+    const boost::shared_ptr<Launcher> fLauncher = MakeLauncher();
+    LaunchResult fEnds;
+    boost::thread_group fReaders;
+    boost::mutex fMutex;
+    std::string fText;
+    std::atomic<int> fAtEnd{0};
+};
+
+TEST(SimultaneousLaunches, HoldNoPipesOfEachOther)
+{
+    constexpr std::size_t kLaunches = 8;
+    for (int round = 0; round < 5; ++round) {
+        PipedChild children[kLaunches];
+        boost::barrier start(kLaunches);
+        boost::thread_group launching;
+        for (PipedChild& child : children)
+            launching.create_thread([&] {
+                start.wait();
+                child.Launch({"pipes", "echo", "exit", "3"});
+            });
+        launching.join_all();
+        for (PipedChild& child : children) {
+            EXPECT_TRUE(Eventually([&] { return child.Text().find('\n') != std::string::npos; }));
+            EXPECT_EQ(child.Text(), "pipes 3\n");
+        }
+        // Each ends with its own input, and its output with it, while the rest live.
+        for (PipedChild& child : children) {
+            child.CloseInput();
+            EXPECT_TRUE(Eventually([&] { return child.IsAtEnd(); }));
+        }
+        for (PipedChild& child : children)
+            EXPECT_EQ(child.Finish(), 3);
     }
 }
 

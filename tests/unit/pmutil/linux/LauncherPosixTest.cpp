@@ -1,5 +1,7 @@
 #include "pmutil/LauncherPosix.h"
 
+#include <atomic>
+#include <boost/filesystem/path.hpp>
 #include <boost/thread/thread.hpp>
 #include <csignal>
 #include <cstdio>
@@ -7,6 +9,7 @@
 #include <fstream>
 #include <gmock/gmock.h>
 #include <memory>
+#include <spawn.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -227,6 +230,45 @@ TEST(LauncherPosix, ChildHasItsStreamsAndNoOtherDescriptor)
     // Neither one that the host forgot to protect.
     const PosixHandle forgotten(::open("/dev/null", O_RDONLY), true); // NOLINT: no O_CLOEXEC
     EXPECT_THAT(RunChild({"state"}).out, testing::HasSubstr("descriptors 0 1 2\n"));
+}
+
+// What a child of another part of the host says, which keeps every descriptor that it is left.
+std::string RunForeignChild()
+{
+    int ends[2];
+    EXPECT_EQ(::pipe2(ends, O_CLOEXEC), 0);
+    PosixHandle out(ends[0], true);
+    PosixHandle in(ends[1], true);
+    posix_spawn_file_actions_t actions;
+    ::posix_spawn_file_actions_init(&actions);
+    ::posix_spawn_file_actions_adddup2(&actions, ends[1], STDOUT_FILENO);
+    std::string program = boost::filesystem::path(std::wstring(TEST_CHILD)).string();
+    std::string word = "pipes";
+    char* argv[] = {program.data(), word.data(), nullptr};
+    ::pid_t pid = 0;
+    EXPECT_EQ(::posix_spawn(&pid, argv[0], &actions, nullptr, argv, ::environ), 0);
+    ::posix_spawn_file_actions_destroy(&actions);
+    in.Close();
+    const std::string text = ReadRest(out);
+    ::waitpid(pid, nullptr, 0);
+    return text;
+}
+
+TEST(LauncherPosix, DescriptorsAreTheHostsFromTheirBirth)
+{
+    const std::string alone = RunForeignChild();
+    EXPECT_THAT(alone, testing::StartsWith("pipes "));
+    std::atomic<bool> done{false};
+    boost::thread_group launching;
+    for (int thread = 0; thread < 8; ++thread)
+        launching.create_thread([&] {
+            while (!done)
+                RunChild({"exit", "0"});
+        });
+    for (int round = 0; round < 50; ++round)
+        EXPECT_EQ(RunForeignChild(), alone);
+    done = true;
+    launching.join_all();
 }
 
 TEST(LauncherPosix, ChildHasDefaultSignals)

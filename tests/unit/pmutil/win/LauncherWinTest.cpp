@@ -197,6 +197,20 @@ TEST(LauncherWin, ParentKeepsItsEndsToItself)
     EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally);
 }
 
+TEST(LauncherWin, ChildInheritsItsPipesOnly)
+{
+    // As the ends that another launch, in another thread, has for its child.
+    SECURITY_ATTRIBUTES inheritable = {};
+    inheritable.nLength = sizeof inheritable;
+    inheritable.bInheritHandle = TRUE;
+    HANDLE readEnd = nullptr;
+    HANDLE writeEnd = nullptr;
+    ASSERT_NE(::CreatePipe(&readEnd, &writeEnd, &inheritable, 0), 0);
+    const WinHandle reader(readEnd, true);
+    const WinHandle writer(writeEnd, true);
+    EXPECT_EQ(RunChild({"pipes"}).out, "pipes 3\n");
+}
+
 TEST(LauncherWin, HandlesOfTheProcessStayOpen)
 {
     RunChild({"exit", "0"});
