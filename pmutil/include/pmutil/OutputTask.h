@@ -28,12 +28,19 @@ public:
     OutputTask& operator=(const OutputTask& other);
     ~OutputTask() override;
 
-    // Readies the task for a launch.
+    // Readies the task for a launch. Throws std::runtime_error "OutputTask::Prepare: task is
+    // running", and changes nothing, until Run has returned: a task whose DoRun was given up serves
+    // no other launch before.
     void Prepare(OutputChannel channel, boost::shared_ptr<consoleapp::ExecutionData> data,
                  boost::shared_ptr<Reader> reader);
 
-    // DoBegin, DoRun and DoEnd in turn; closes the reader in any case.
-    void Run();
+    // DoBegin, DoRun and DoEnd in turn; closes the reader in any case. With a launch, throws
+    // consoleapp::Exception "no output task" if the task was readied for another, or discarded.
+    void Run(const consoleapp::ExecutionData* launch = nullptr);
+
+    // Closes the reader if the task was readied for this launch and isn't in Run; a Run for this
+    // launch that comes later is refused.
+    void Discard(const consoleapp::ExecutionData* launch) noexcept;
 
     // Whether the task runs. Waits up to `maxWaitSeconds` for one that doesn't.
     bool IsRunning(double maxWaitSeconds);
@@ -55,6 +62,7 @@ private:
 
     boost::shared_ptr<Reader> fReader;
     bool fIsRunning = false;
+    bool fIsInRun = false; // from the begin of Run until it returns
 };
 
 } // namespace pmutil

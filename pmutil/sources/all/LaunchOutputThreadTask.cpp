@@ -26,7 +26,7 @@ void LaunchOutputThreadTask::operator()()
         NotifyOutputTaskBegin();
         ThrowIfFailurePending();
         const boost::shared_ptr<OutputTask> task = GetOutputTask(GetOutputChannel(fTaskID));
-        task->Run();
+        task->Run(fExecutionData.get());
         ThrowIfFailurePending();
         NotifyOutputTaskEnd();
     } catch (const Exception& exc) {

@@ -1,12 +1,12 @@
 #include "all/LaunchThreadTask.h"
 
-#include <memory>
 #include <sstream>
 #include <stdexcept>
 #include <utility>
 
 #include "all/ConsoleAppLog.h"
 #include "all/LaunchOutputThreadTask.h"
+#include "all/ThreadEnd.h"
 #include "pmutil/OutputTask.h"
 #include "pmutil/Threads.h"
 
@@ -51,8 +51,9 @@ void LaunchThreadTask::operator()()
         PM_LOG(gConsoleAppLog, "LaunchThreadTask::operator()()");
         Threads threads;
         bool mustKill = false;
+        LaunchResult result;
         try {
-            RunLaunch(mustKill, threads);
+            RunLaunch(mustKill, result, threads);
         } catch (const Exception& exc) {
             PM_LOG(gConsoleAppLog, "LaunchThreadTask inner exception=" << exc.what());
             NotifyFailure(exc);
@@ -63,16 +64,21 @@ void LaunchThreadTask::operator()()
             PM_LOG(gConsoleAppLog, "LaunchThreadTask inner exception=?");
             NotifyFailure(Exception(fTaskID, "LaunchThreadTask failed"));
         }
-        CleanupLaunchThreadTask(mustKill, threads);
+        CleanupLaunchThreadTask(mustKill, result, threads);
     } catch (const std::exception& exc) {
         PM_LOG(gConsoleAppLog, "LaunchThreadTask outer exception=" << exc.what());
     } catch (...) {
         PM_LOG(gConsoleAppLog, "LaunchThreadTask outer exception=?");
     }
+    for (const OutputChannel channel : kChannels) {
+        if (const boost::shared_ptr<OutputTask> task = fLaunchParams.GetOutputTask(channel))
+            task->Discard(fExecutionData.get());
+    }
 }
 
-// `mustKill` tells whether the child was started and not yet seen to end.
-void LaunchThreadTask::RunLaunch(bool& mustKill, Threads& threads)
+// `mustKill` tells whether the child was started and not yet seen to end. `result` outlives a
+// failure: a child that must be killed doesn't see the end of its input before.
+void LaunchThreadTask::RunLaunch(bool& mustKill, LaunchResult& result, Threads& threads)
 {
     NotifyLaunching();
     for (const OutputChannel channel : kChannels) {
@@ -81,7 +87,7 @@ void LaunchThreadTask::RunLaunch(bool& mustKill, Threads& threads)
         threads[GetOutputIndex(channel)].SetName(label.str().c_str());
     }
     ThrowIfInjected(Fault::kLauncherLaunch, "LauncherLaunch");
-    LaunchResult result = fLauncher->Launch(fLaunchParams.fProgram, fLaunchParams.fArgs);
+    result = fLauncher->Launch(fLaunchParams.fProgram, fLaunchParams.fArgs);
     mustKill = true;
     NotifyLaunched();
 
@@ -94,9 +100,7 @@ void LaunchThreadTask::RunLaunch(bool& mustKill, Threads& threads)
 
     // This thread keeps no end of a pipe: the child sees the end of its input when the client's
     // writer goes, and a reader's owner decides alone when it is closed.
-    for (boost::shared_ptr<Reader>& reader : result.fAppOutput)
-        reader.reset();
-    result.fAppInput.reset();
+    result = LaunchResult();
 
     ThrowIfInjected(Fault::kLauncherWait, "LauncherWait");
     PM_LOG(gConsoleAppLog, "calling fLauncher->Wait");
@@ -121,8 +125,7 @@ void LaunchThreadTask::StartOutputTask(OutputChannel channel,
     task->Prepare(channel, data, reader);
     {
         const LaunchOutputThreadTask body(channel, data);
-        auto started = std::make_unique<boost::thread>(body);
-        thread.Assign(started.release());
+        thread.Assign(StartThread(body).release());
     }
     PM_LOG(gConsoleAppLog, "LaunchThreadTask OutputThreadTask spawned, use_count["
                                << channel << "]=" << reader.use_count());
@@ -136,7 +139,8 @@ void LaunchThreadTask::StartOutputTask(OutputChannel channel,
     throw std::runtime_error(text.str());
 }
 
-void LaunchThreadTask::CleanupLaunchThreadTask(bool mustKill, Threads& threads)
+void LaunchThreadTask::CleanupLaunchThreadTask(bool mustKill, LaunchResult& result,
+                                               Threads& threads)
 {
     PM_LOG(gConsoleAppLog, "LaunchThreadTask::CleanupLaunchThreadTask mustKill=" << mustKill);
     if (mustKill) {
@@ -146,6 +150,7 @@ void LaunchThreadTask::CleanupLaunchThreadTask(bool mustKill, Threads& threads)
             app->ThrowIfInjected(fTaskID, Fault::kLauncherKill, "LauncherKill");
         PM_LOG(gConsoleAppLog, "CleanupLaunchThreadTask: calling fLauncher->Kill()");
         fLauncher->Kill();
+        result = LaunchResult();
     }
     for (const OutputChannel channel : kChannels) {
         ManagedThread& thread = threads[GetOutputIndex(channel)];

@@ -19,11 +19,11 @@ public:
 private:
     using Threads = ManagedThread[kOutputSlots];
 
-    void RunLaunch(bool& mustKill, Threads& threads);
+    void RunLaunch(bool& mustKill, LaunchResult& result, Threads& threads);
     void StartOutputTask(OutputChannel channel,
                          const boost::shared_ptr<consoleapp::ExecutionData>& data,
                          const boost::shared_ptr<Reader>& reader, ManagedThread& thread);
-    void CleanupLaunchThreadTask(bool mustKill, Threads& threads);
+    void CleanupLaunchThreadTask(bool mustKill, LaunchResult& result, Threads& threads);
 
     boost::shared_ptr<Launcher> fLauncher;
     LaunchParams fLaunchParams;

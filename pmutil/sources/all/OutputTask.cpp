@@ -54,14 +54,22 @@ void OutputTask::Prepare(OutputChannel channel, boost::shared_ptr<ExecutionData>
 {
     const TaskID id = pmutil::GetTaskID(channel);
     const boost::lock_guard<boost::mutex> lock(fMutex);
+    if (fIsInRun)
+        throw std::runtime_error("OutputTask::Prepare: task is running");
     fTaskID = id;
     fExecutionData.swap(data);
     fReader.swap(reader);
 }
 
-void OutputTask::Run()
+void OutputTask::Run(const ExecutionData* launch)
 {
     PM_LOG(gConsoleAppLog, "OutputTask::Run " << fTaskID);
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        if (launch != nullptr && launch != fExecutionData.get())
+            throw consoleapp::Exception(fTaskID, "no output task");
+        fIsInRun = true;
+    }
     try {
         {
             Lock lock(fMutex);
@@ -79,12 +87,27 @@ void OutputTask::Run()
         }
         PM_LOG(gConsoleAppLog, "OutputTask::Run CloseReader");
         Lock lock(fMutex);
+        fIsInRun = false;
         CloseReader(lock);
     } catch (...) {
         SetIsRunning(false);
         Lock lock(fMutex);
+        fIsInRun = false;
         CloseReader(lock);
         throw;
+    }
+}
+
+void OutputTask::Discard(const ExecutionData* launch) noexcept
+{
+    try {
+        Lock lock(fMutex);
+        if (fIsInRun || launch == nullptr || launch != fExecutionData.get())
+            return;
+        fExecutionData.reset();
+        CloseReader(lock);
+    } catch (...) {
+        // The reader closes with its owner.
     }
 }
 

@@ -3,6 +3,7 @@
 #include <boost/make_shared.hpp>
 #include <boost/thread/thread.hpp>
 #include <chrono>
+#include <functional>
 #include <gmock/gmock.h>
 #include <thread>
 
@@ -21,6 +22,7 @@ public:
 
     std::vector<std::string> fCalls;
     std::string fThrowIn;
+    std::function<void()> fDo = [] {};
     bool fWasRunning = false;
 
 protected:
@@ -29,6 +31,7 @@ protected:
     void DoRun() override
     {
         fWasRunning = IsRunning(0.0);
+        fDo();
         Record("run", false);
     }
 
@@ -48,6 +51,13 @@ private:
             throw std::runtime_error(name + " failed");
     }
 };
+
+boost::shared_ptr<consoleapp::ExecutionData> MakeData()
+{
+    return boost::make_shared<consoleapp::ExecutionData>(boost::weak_ptr<ConsoleApp>(),
+                                                         boost::weak_ptr<OutputTask>(),
+                                                         boost::weak_ptr<OutputTask>());
+}
 
 TEST(OutputTask, RunsItsStepsInOrderWithTheRightLocks)
 {
@@ -118,9 +128,7 @@ TEST(OutputTask, CopyingARunningTaskFails)
 
 TEST(OutputTask, CopiesTakeAllFields)
 {
-    const auto data = boost::make_shared<consoleapp::ExecutionData>(boost::weak_ptr<ConsoleApp>(),
-                                                                    boost::weak_ptr<OutputTask>(),
-                                                                    boost::weak_ptr<OutputTask>());
+    const auto data = MakeData();
     const auto reader = boost::make_shared<FakeChannel>();
     const RecordingTask task(TaskID::kStderr, data, reader);
     RecordingTask copy(task);
@@ -143,6 +151,63 @@ TEST(OutputTask, PrepareReadiesItForAnotherRun)
     EXPECT_EQ(task.GetReader(), reader);
     task.Run();
     EXPECT_FALSE(reader->fOpen);
+}
+
+TEST(OutputTask, PrepareRefusesATaskInItsRun)
+{
+    const auto reader = boost::make_shared<FakeChannel>();
+    const auto next = boost::make_shared<FakeChannel>();
+    RecordingTask task(TaskID::kStdout, nullptr, reader);
+    const auto prepare = [&] { task.Prepare(OutputChannel::kStderr, MakeData(), next); };
+    task.fDo = [&] {
+        EXPECT_TRUE(ThrowsRuntimeError("OutputTask::Prepare: task is running", prepare));
+        EXPECT_EQ(task.GetReader(), reader);
+        EXPECT_EQ(task.GetTaskID(), TaskID::kStdout);
+    };
+    task.fThrowIn = "end";
+    EXPECT_THROW(task.Run(), std::runtime_error);
+    EXPECT_EQ(next.use_count(), 1);
+    prepare();
+    EXPECT_EQ(task.GetReader(), next) << "free after a run that failed too";
+    EXPECT_TRUE(next->fOpen);
+}
+
+TEST(OutputTask, RunOfAnotherLaunchIsRefused)
+{
+    const auto old = MakeData();
+    const auto present = MakeData();
+    const auto reader = boost::make_shared<FakeChannel>();
+    RecordingTask task;
+    task.Prepare(OutputChannel::kStdout, present, reader);
+    EXPECT_TRUE(ThrowsExactly<consoleapp::Exception>("stdout: no output task",
+                                                     [&] { task.Run(old.get()); }));
+    EXPECT_THAT(task.fCalls, ElementsAre());
+    EXPECT_TRUE(reader->fOpen);
+    task.Run(present.get());
+    EXPECT_FALSE(reader->fOpen);
+}
+
+TEST(OutputTask, DiscardEndsALaunchBeforeItsRun)
+{
+    const auto old = MakeData();
+    const auto present = MakeData();
+    const auto reader = boost::make_shared<FakeChannel>();
+    RecordingTask task;
+    task.Prepare(OutputChannel::kStdout, present, reader);
+    task.Discard(old.get());
+    EXPECT_TRUE(reader->fOpen) << "not that launch's";
+    task.Discard(present.get());
+    EXPECT_FALSE(reader->fOpen);
+    EXPECT_EQ(task.GetReader(), nullptr);
+    EXPECT_THROW(task.Run(present.get()), consoleapp::Exception) << "too late";
+    const auto next = boost::make_shared<FakeChannel>();
+    task.Prepare(OutputChannel::kStdout, present, next);
+    task.fDo = [&] {
+        task.Discard(present.get());
+        EXPECT_TRUE(next->fOpen) << "a run closes its reader itself";
+    };
+    task.Run(present.get());
+    EXPECT_FALSE(next->fOpen);
 }
 
 } // namespace

@@ -1,0 +1,56 @@
+// The end of a thread, for any number of threads that wait for it, and threads that leave nothing
+// behind but their object.
+#pragma once
+
+#include <memory>
+#include <utility>
+
+#include <boost/make_shared.hpp>
+#include <boost/shared_ptr.hpp>
+#include <boost/thread/condition_variable.hpp>
+#include <boost/thread/mutex.hpp>
+#include <boost/thread/thread.hpp>
+
+namespace pmutil {
+
+// A join, other than this, is for one thread at a time.
+class ThreadEnd {
+public:
+    // For the thread: its first and its last statement.
+    void Begin();
+    void End();
+
+    bool HasEnded() const;
+
+    // Waits up to `seconds` for the end. False if it doesn't come: at once on the thread itself,
+    // and as soon as the thread is given up.
+    bool Await(double seconds) const;
+
+    // Nobody is to wait any longer.
+    void GiveUp();
+
+private:
+    mutable boost::mutex fMutex;
+    mutable boost::condition_variable fCond;
+    boost::thread::id fThread;
+    bool fEnded = false;
+    bool fGivenUp = false;
+};
+
+// Starts a thread on a copy of `task`, which is destroyed when it has run: the thread's object may
+// stay registered for good. `end`, unless empty, learns of the end after that.
+template <typename Task>
+std::unique_ptr<boost::thread> StartThread(const Task& task,
+                                           const boost::shared_ptr<ThreadEnd>& end = nullptr)
+{
+    return std::make_unique<boost::thread>([copy = boost::make_shared<Task>(task), end]() mutable {
+        if (end != nullptr)
+            end->Begin();
+        (*copy)();
+        copy.reset();
+        if (end != nullptr)
+            end->End();
+    });
+}
+
+} // namespace pmutil
