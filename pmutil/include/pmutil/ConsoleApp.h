@@ -7,12 +7,21 @@
 //
 // Clients derive from it if they want the notifications, and drive it through ConsoleAppLauncher.
 // Hold it by boost::shared_ptr.
+//
+// One Launcher serves all launches in turn, as long as the thread of each ends. The thread of a
+// launch that was given up keeps the launcher that it has, so that it reaches its own child and no
+// other; the next launch gets a new one from then on, if that thread still runs.
+//
+// A boost::thread interruption ends a wait of a client as any failure does. Reset isn't
+// interrupted, and leaves an interruption for later.
 #pragma once
 
 #include <atomic>
 #include <cstddef>
+#include <cstdint>
 #include <deque>
 #include <exception>
+#include <functional>
 #include <string>
 
 #include <boost/shared_ptr.hpp>
@@ -24,6 +33,12 @@
 #include "pmutil/ManagedThread.h"
 
 namespace pmutil {
+
+class ThreadEnd;
+
+// Makes a launcher of the kind that an application launches with; never an empty one. Called by
+// ConsoleApp::Launch with the application's lock held.
+using LauncherFactory = std::function<boost::shared_ptr<Launcher>()>;
 
 class ConsoleApp {
 public:
@@ -40,26 +55,41 @@ public:
 
     // Starts the child and returns when it runs or has ended, or after the short wait, whatever
     // comes first. Throws std::runtime_error "ConsoleApp: must be idle" and leaves a running launch
-    // alone; after any other failure, which it throws, the object is Idle.
+    // alone; after any other failure, which it throws, the object is Idle. One of them is
+    // "ConsoleApp: the launcher still serves a launch that was given up", for an application
+    // without a LauncherFactory.
     void Launch(const boost::shared_ptr<consoleapp::ExecutionData>& data,
                 const LaunchParams& params);
 
     // Waits for the end of the child. Finished, Crashed or Killed: it has ended, and the object is
     // Idle again; `*exitCode`, unless null, gets the code, 0 after a crash or a kill. Timeout: it
     // goes on, and so may the caller, with another Wait or a Kill; unless the launcher's thread was
-    // given up, which leaves the object Idle. Idle: there was nothing to wait for. Throws the
+    // given up, which leaves the object Idle. Idle: there was nothing to wait for, or another
+    // thread has seen the launch to its end meanwhile; a newer launch isn't waited for. Throws the
     // oldest stored failure and leaves the object Idle.
+    //
+    // The join of the launcher's thread must fit into the wait too. A client that polls with a wait
+    // of 0 seconds may find the child ended but that thread still busy, and gets Timeout, an Idle
+    // object and no code.
+    //
+    // A failure of an output task, or an interruption, doesn't end the child: this waits for its
+    // end, up to the limit, before it throws. The launch is given up then.
     State Wait(int* exitCode, double maxWaitSeconds);
 
     // Asks for the child's end if it is Running or the last wait ran out; doesn't wait for it.
-    // Waits up to the short wait for a stable state before. Throws the oldest stored failure.
+    // Waits up to the short wait for a stable state before, and for a WriteAppStdin that blocks
+    // without a limit. Throws the oldest stored failure.
+    //
+    // While the start lasts longer than the short wait there may be no child to kill yet: the call
+    // is lost then, the launch goes on, and the client must call again.
     void Kill();
 
     // Waits up to `maxWaitSeconds` for a stable state; Timeout if none came. Throws the oldest
     // stored failure.
     State GetState(double maxWaitSeconds);
 
-    // Back to Idle whatever it was doing; gives the launcher's thread the short wait to end.
+    // Back to Idle whatever it was doing; gives the launcher's thread the short wait to end, none
+    // if the caller is that thread. The child isn't killed.
     void Reset();
 
     // A bit for each thread of the launch that runs, at the place of its TaskID. Needs a launch,
@@ -80,23 +110,34 @@ public:
     static double GetShortWaitSeconds();
     static double GetDefaultStateWaitSeconds();
 
-    // For the threads of a launch, through ConsoleAppAccessor.
+    // For the threads of a launch, through ConsoleAppAccessor. `launch` is the one that the caller
+    // belongs to, null for that of the moment. One that was given up is refused with
+    // consoleapp::Exception "no console app", and has no failure or fault to throw.
 
-    void NotifyLaunching(TaskID who);
-    void NotifyLaunched(TaskID who);
-    void NotifyRunning(TaskID who, const LaunchResult& result);
-    void NotifyFinished(TaskID who, int exitCode, State state);
-    void NotifyOutputTaskBegin(OutputChannel channel);
-    void NotifyOutputTaskEnd(OutputChannel channel);
-    void NotifyFailure(const consoleapp::Exception& exc);
-    void ThrowIfFailurePending();
-    void ThrowIfInjected(TaskID who, Fault fault, const char* caller);
+    void NotifyLaunching(TaskID who, const consoleapp::ExecutionData* launch = nullptr);
+    void NotifyLaunched(TaskID who, const consoleapp::ExecutionData* launch = nullptr);
+    void NotifyRunning(TaskID who, const LaunchResult& result,
+                       const consoleapp::ExecutionData* launch = nullptr);
+    void NotifyFinished(TaskID who, int exitCode, State state,
+                        const consoleapp::ExecutionData* launch = nullptr);
+    void NotifyOutputTaskBegin(OutputChannel channel,
+                               const consoleapp::ExecutionData* launch = nullptr);
+    void NotifyOutputTaskEnd(OutputChannel channel,
+                             const consoleapp::ExecutionData* launch = nullptr);
+    void NotifyFailure(const consoleapp::Exception& exc,
+                       const consoleapp::ExecutionData* launch = nullptr);
+    void ThrowIfFailurePending(const consoleapp::ExecutionData* launch = nullptr);
+    void ThrowIfInjected(TaskID who, Fault fault, const char* caller,
+                         const consoleapp::ExecutionData* launch = nullptr);
 
     // Arms a fault, which fires once; call it before Launch.
     void SetInjectedFault(Fault fault) { fInjectedFault = fault; }
 
 protected:
-    explicit ConsoleApp(const boost::shared_ptr<Launcher>& launcher);
+    // Without `makeLauncher` there is no other launcher than `launcher`: Launch fails as long as
+    // the thread of a launch that was given up still runs, since both would reach the same child.
+    explicit ConsoleApp(const boost::shared_ptr<Launcher>& launcher,
+                        LauncherFactory makeLauncher = nullptr);
 
     // Called on the threads of a launch, without a lock, so that they may call back in. An
     // exception is a failure of the launch.
@@ -112,15 +153,30 @@ protected:
     void SetStateLocked(const Lock& lock, State state);
 
 private:
+    using LaunchNumber = std::uint64_t;
+
+    void ReadyLauncherLocked();
     bool HasEventLocked() const;
-    State WaitForEnd(double deadline);
-    bool JoinAfterEnd(int* exitCode, double deadline);
-    bool JoinAfterFailure(double seconds);
+    LaunchNumber GetLaunchNumber();
+    State WaitForEnd(LaunchNumber launch, int& exitCode, double deadline);
+    bool JoinAfterEnd(LaunchNumber launch, double deadline);
+    bool IsOver(LaunchNumber launch);
+    bool AwaitThreadEnd(LaunchNumber launch, double seconds);
+    bool JoinEndedThread(LaunchNumber launch);
+    bool TimedJoin(LaunchNumber launch, double seconds);
+    void GiveThreadUp();
+    void ResetLaunch(LaunchNumber launch);
+    void RequireLinkedLocked(const Lock& lock, TaskID who,
+                             const consoleapp::ExecutionData* launch) const;
+    void ThrowIfOutputInjected(OutputChannel channel, Fault fault, const char* caller,
+                               const consoleapp::ExecutionData* launch);
     void NotifyFailureLocked(const Lock& lock, const consoleapp::Exception& exc);
     void ThrowIfFailurePendingLocked(const Lock& lock);
     void ThrowIfInjectedLocked(const Lock& lock, TaskID who, Fault fault, const char* caller);
-    void LaunchHandleException(Lock& lock, const std::exception* exc, double joinWaitSeconds);
-    void HandleWaitException(Lock& lock, const std::exception* exc, double deadline);
+    void LaunchHandleException(Lock& lock, const std::exception* exc, double joinWaitSeconds,
+                               LaunchNumber launch);
+    void HandleWaitException(Lock& lock, const std::exception* exc, double deadline,
+                             LaunchNumber launch);
 
     boost::mutex fMutex;
     boost::condition_variable fCond;
@@ -134,8 +190,14 @@ private:
     boost::shared_ptr<consoleapp::ExecutionData> fExecutionData;
     std::deque<consoleapp::Exception> fFailures;
 
-    // Held to join fLauncherThread or let go of it, by one client thread at a time; taken before
-    // fMutex. Only Launch, with fMutex and while Idle, when nobody joins, sets it without.
+    const LauncherFactory fMakeLauncher;
+    LaunchNumber fLaunchNumber = 0;              // of the latest launch
+    boost::shared_ptr<ThreadEnd> fThreadEnd;     // of fLauncherThread, while that holds a thread
+    boost::shared_ptr<ThreadEnd> fGivenUpThread; // of the latest thread that was given up
+
+    // Held to join fLauncherThread once it has ended, or to let go of it; never while it goes on.
+    // Taken before fMutex. Only Launch, with fMutex and while Idle, when nobody joins, sets it
+    // without.
     boost::mutex fJoinMutex;
 };
 

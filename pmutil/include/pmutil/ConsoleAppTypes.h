@@ -83,7 +83,8 @@ public:
     LaunchParams(boost::shared_ptr<OutputTask> stdoutTask, boost::shared_ptr<OutputTask> stderrTask,
                  std::deque<std::string> args, std::wstring program);
 
-    // Empty if nobody consumes the channel; the child may block then once it has filled the pipe.
+    // Empty if nobody consumes the channel: its pipe is closed then once the child runs, so that a
+    // child that writes to it fails to, or on Linux dies of SIGPIPE.
     boost::shared_ptr<OutputTask> GetOutputTask(OutputChannel channel) const;
     void SetOutputTask(OutputChannel channel, boost::shared_ptr<OutputTask> task);
 
@@ -121,6 +122,7 @@ public:
     // Empty if the application is gone or was reset.
     boost::shared_ptr<ConsoleApp> GetConsoleApp() const;
     void ClearConsoleApp();
+    bool HasConsoleApp() const;
 
     // Empty if the task is gone.
     boost::shared_ptr<OutputTask> GetOutputTask(OutputChannel channel) const;

@@ -22,6 +22,7 @@ struct LaunchResult {
 // How a child ended.
 enum WaitResult : int { kEndedNormally = 0, kEndedByCrash = 1, kEndedByKill = 2 };
 
+// Serves one launch at a time, and any number in turn: Wait and Kill mean the latest child.
 // Failures throw std::runtime_error with the name of the system's call.
 class Launcher {
 public:

@@ -1,14 +1,17 @@
 #include "pmutil/ConsoleApp.h"
 
 #include <algorithm>
-#include <memory>
 #include <sstream>
 #include <stdexcept>
+#include <utility>
 
+#include <boost/make_shared.hpp>
 #include <boost/thread/lock_guard.hpp>
+#include <boost/thread/thread.hpp>
 
 #include "all/ConsoleAppLog.h"
 #include "all/LaunchThreadTask.h"
+#include "all/ThreadEnd.h"
 #include "all/WaitTime.h"
 #include "pmutil/OutputTask.h"
 
@@ -27,11 +30,20 @@ DebugValue gShortWaitSecondsMinusOne{"ConsoleAppShortWaitSecondsMinusOne", 0};
 DebugValue gDefaultStateWaitSecondsTimesTenMinus1{"ConsoleAppDefaultStateWaitSecondsTimesTenMinus1",
                                                   0};
 
+// A thread that has told its end needs no more than this to end, on a machine that works.
+constexpr double kThreadExitSeconds = 10.0;
+
 constexpr char kNotOpen[] = "pmutil::Channel not open";
 
 const char* GetText(const std::exception* exc)
 {
     return exc != nullptr ? exc->what() : "?";
+}
+
+// Whether a launch, null for that of the moment, wasn't given up.
+bool IsLinked(const ExecutionData* launch)
+{
+    return launch == nullptr || launch->HasConsoleApp();
 }
 
 bool HasEnded(State state)
@@ -41,9 +53,10 @@ bool HasEnded(State state)
 
 } // namespace
 
-ConsoleApp::ConsoleApp() : ConsoleApp(MakeLauncher()) {}
+ConsoleApp::ConsoleApp() : ConsoleApp(MakeLauncher(), MakeLauncher) {}
 
-ConsoleApp::ConsoleApp(const boost::shared_ptr<Launcher>& launcher) : fLauncher(launcher)
+ConsoleApp::ConsoleApp(const boost::shared_ptr<Launcher>& launcher, LauncherFactory makeLauncher)
+    : fLauncher(launcher), fMakeLauncher(std::move(makeLauncher))
 {
     PM_LOG(gConsoleAppLog, "ConsoleApp::ConsoleApp()");
 }
@@ -78,43 +91,61 @@ void ConsoleApp::Launch(const boost::shared_ptr<ExecutionData>& data, const Laun
     Lock lock(fMutex);
     if (fState != State::kIdle)
         throw std::runtime_error("ConsoleApp: must be idle");
+    ReadyLauncherLocked();
+    const LaunchNumber launch = ++fLaunchNumber;
     try {
         SetStateLocked(lock, State::kLaunching);
         fExecutionData = data;
         fLaunchParams = params;
         {
             const LaunchThreadTask task(fExecutionData, fLauncher, fLaunchParams);
-            auto thread = std::make_unique<boost::thread>(task);
-            fLauncherThread.Assign(thread.release());
+            const auto end = boost::make_shared<ThreadEnd>();
+            fLauncherThread.Assign(StartThread(task, end).release());
+            fThreadEnd = end;
         }
         try {
             GetStateLocked(lock, GetShortWaitSeconds());
         } catch (const std::exception& exc) {
-            LaunchHandleException(lock, &exc, GetShortWaitSeconds());
+            LaunchHandleException(lock, &exc, GetShortWaitSeconds(), launch);
             throw;
         } catch (...) {
-            LaunchHandleException(lock, nullptr, GetShortWaitSeconds());
+            LaunchHandleException(lock, nullptr, GetShortWaitSeconds(), launch);
             throw;
         }
     } catch (...) {
         PM_LOG(gConsoleAppLog, "Launch exception: calling Reset()");
         lock.unlock();
-        Reset();
+        ResetLaunch(launch);
         throw;
     }
 }
 
+// Sees to it that fLauncher serves no other launch.
+void ConsoleApp::ReadyLauncherLocked()
+{
+    if (fGivenUpThread != nullptr && !fGivenUpThread->HasEnded()) {
+        if (!fMakeLauncher)
+            throw std::runtime_error(
+                "ConsoleApp: the launcher still serves a launch that was given up");
+        fLauncher = fMakeLauncher();
+    }
+    fGivenUpThread.reset();
+}
+
 void ConsoleApp::LaunchHandleException(Lock& lock, const std::exception* exc,
-                                       double joinWaitSeconds)
+                                       double joinWaitSeconds, LaunchNumber launch)
 {
     PM_LOG(gConsoleAppLog, "ConsoleApp::LaunchHandleException exc="
                                << GetText(exc) << " joinWaitSEconds=" << joinWaitSeconds);
+    // An interruption would take the failure's place.
+    const boost::this_thread::disable_interruption uninterrupted;
     lock.unlock();
-    {
+    bool joined = false;
+    if (AwaitThreadEnd(launch, joinWaitSeconds)) {
         const JoinLock joinLock(fJoinMutex);
-        const bool joined = fLauncherThread.TimedJoin(joinWaitSeconds);
-        PM_LOG(gConsoleAppLog, "fLauncherThread.TimedJoin returns " << joined);
+        joined = JoinEndedThread(launch);
     }
+    PM_LOG(gConsoleAppLog, "fLauncherThread.TimedJoin returns " << joined);
     lock.lock();
 }
 
@@ -122,70 +153,133 @@ State ConsoleApp::Wait(int* exitCode, double maxWaitSeconds)
 {
     PM_LOG(gConsoleAppLog, "ConsoleApp::Wait() maxWaitSeconds=" << maxWaitSeconds);
     const double deadline = GetWaitClock() + maxWaitSeconds;
+    const LaunchNumber launch = GetLaunchNumber();
     try {
-        State result = WaitForEnd(deadline);
-        if (HasEnded(result) && !JoinAfterEnd(exitCode, deadline)) {
-            Reset();
-            result = State::kTimeout;
+        int code = 0;
+        State result = WaitForEnd(launch, code, deadline);
+        if (HasEnded(result)) {
+            if (!JoinAfterEnd(launch, deadline)) {
+                ResetLaunch(launch);
+                result = State::kTimeout;
+            } else if (exitCode != nullptr) {
+                *exitCode = code;
+            }
         }
-        ThrowIfFailurePending();
+        {
+            const Lock lock(fMutex);
+            if (fLaunchNumber == launch)
+                ThrowIfFailurePendingLocked(lock);
+        }
         PM_LOG(gConsoleAppLog, "ConsoleApp::Wait returns " << result);
         return result;
     } catch (...) {
-        Reset();
+        ResetLaunch(launch);
         throw;
     }
 }
 
-// The last part of Wait, after which the object is Idle; false if the launcher's thread won't end.
-bool ConsoleApp::JoinAfterEnd(int* exitCode, double deadline)
+ConsoleApp::LaunchNumber ConsoleApp::GetLaunchNumber()
 {
-    const JoinLock joinLock(fJoinMutex);
-    {
-        const Lock lock(fMutex);
-        if (fState == State::kIdle) { // another thread's wait was first
-            if (exitCode != nullptr)
-                *exitCode = fExitCode;
-            return true;
-        }
-    }
+    const Lock lock(fMutex);
+    return fLaunchNumber;
+}
+
+// The last part of Wait, after which the object is Idle; false if the launcher's thread won't end.
+bool ConsoleApp::JoinAfterEnd(LaunchNumber launch, double deadline)
+{
+    if (IsOver(launch)) // another thread's wait was first
+        return true;
     const double joinWait = std::min(GetTimeLeft(deadline), GetShortWaitSeconds());
     PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread.TimedJoin(" << joinWait << ")");
-    if (!fLauncherThread.TimedJoin(joinWait)) {
+    const bool ended = AwaitThreadEnd(launch, joinWait);
+    const JoinLock joinLock(fJoinMutex);
+    if (IsOver(launch))
+        return true;
+    if (!ended || !JoinEndedThread(launch)) {
         PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread never finished");
-        fLauncherThread.Abandon();
+        GiveThreadUp();
         return false;
     }
-    const Lock lock(fMutex);
-    SetStateLocked(lock, State::kIdle);
-    if (exitCode != nullptr)
-        *exitCode = fExitCode;
+    SetState(State::kIdle);
     return true;
 }
 
-// The first part of Wait: Finished, Crashed, Killed or Idle, or Timeout if none came.
-State ConsoleApp::WaitForEnd(double deadline)
+// Whether another thread has brought the launch to its end, so that nothing is left of it.
+bool ConsoleApp::IsOver(LaunchNumber launch)
+{
+    const Lock lock(fMutex);
+    return fLaunchNumber != launch || fState == State::kIdle;
+}
+
+// Waits until the launcher's thread of this launch comes to its end; false if it doesn't, or isn't
+// held. No lock is held meanwhile, so that any number of threads may wait.
+bool ConsoleApp::AwaitThreadEnd(LaunchNumber launch, double seconds)
+{
+    boost::shared_ptr<ThreadEnd> end;
+    {
+        const Lock lock(fMutex);
+        if (fLaunchNumber == launch)
+            end = fThreadEnd;
+    }
+    return end != nullptr && end->Await(seconds);
+}
+
+// With fJoinMutex held, after AwaitThreadEnd. False if the thread isn't held any more.
+bool ConsoleApp::JoinEndedThread(LaunchNumber launch)
+{
+    {
+        const Lock lock(fMutex);
+        if (fLaunchNumber != launch)
+            return false;
+    }
+    const boost::this_thread::disable_interruption uninterrupted;
+    if (!fLauncherThread.TimedJoin(kThreadExitSeconds))
+        return false;
+    const Lock lock(fMutex);
+    fThreadEnd.reset();
+    return true;
+}
+
+// With fJoinMutex held: the launcher's thread goes on with its launcher, and nobody waits for it.
+void ConsoleApp::GiveThreadUp()
+{
+    fLauncherThread.Abandon();
+    const Lock lock(fMutex);
+    if (fThreadEnd == nullptr)
+        return;
+    fThreadEnd->GiveUp();
+    fGivenUpThread.swap(fThreadEnd);
+    fThreadEnd.reset();
+}
+
+// The first part of Wait: Finished, Crashed, Killed, of which the first has a code, or Idle, or
+// Timeout if none came.
+State ConsoleApp::WaitForEnd(LaunchNumber launch, int& exitCode, double deadline)
 {
     Lock lock(fMutex);
     try {
-        for (;;) {
+        while (fLaunchNumber == launch) {
             const State state = GetStateLocked(lock, GetTimeLeft(deadline));
+            if (HasEnded(state))
+                exitCode = fExitCode;
             if (HasEnded(state) || state == State::kIdle)
                 return state;
             const double left = GetTimeLeft(deadline);
             PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fState="
                                        << fState << " fCond.timed_wait waitSeconds=" << left);
-            if (fCond.timed_wait(lock, ToWaitDuration(left)) || HasEventLocked())
+            if (fCond.timed_wait(lock, ToWaitDuration(left)) || HasEventLocked() ||
+                fLaunchNumber != launch)
                 continue;
             PM_LOG(gConsoleAppLog, "ConsoleApp::Wait Wait timed out");
             SetStateLocked(lock, State::kTimeout);
             return State::kTimeout;
         }
+        return State::kIdle;
     } catch (const std::exception& exc) {
-        HandleWaitException(lock, &exc, deadline);
+        HandleWaitException(lock, &exc, deadline, launch);
         throw;
     } catch (...) {
-        HandleWaitException(lock, nullptr, deadline);
+        HandleWaitException(lock, nullptr, deadline, launch);
         throw;
     }
 }
@@ -196,28 +290,35 @@ bool ConsoleApp::HasEventLocked() const
     return HasEnded(fState) || fState == State::kIdle || !fFailures.empty();
 }
 
-void ConsoleApp::HandleWaitException(Lock& lock, const std::exception* exc, double deadline)
+void ConsoleApp::HandleWaitException(Lock& lock, const std::exception* exc, double deadline,
+                                     LaunchNumber launch)
 {
     const double waitSeconds = GetTimeLeft(deadline);
     PM_LOG(gConsoleAppLog, "ConsoleApp::HandleWaitException exc=" << GetText(exc)
                                                                   << " waitSeconds=" << waitSeconds
                                                                   << " fState=" << fState);
+    if (fLaunchNumber != launch || fThreadEnd == nullptr)
+        return;
     const bool mayJoin = fState != State::kTimeout;
     lock.unlock();
-    {
+    if (!mayJoin || !TimedJoin(launch, waitSeconds)) {
         const JoinLock joinLock(fJoinMutex);
-        if (fLauncherThread.HoldsThread() && !(mayJoin && JoinAfterFailure(waitSeconds))) {
+        if (!IsOver(launch) && fLauncherThread.HoldsThread()) {
             PM_LOG(gConsoleAppLog, "abandon fLauncherThread");
-            fLauncherThread.Abandon();
+            GiveThreadUp();
         }
     }
     lock.lock();
 }
 
-bool ConsoleApp::JoinAfterFailure(double seconds)
+bool ConsoleApp::TimedJoin(LaunchNumber launch, double seconds)
 {
     PM_LOG(gConsoleAppLog, "TimedJoin(" << seconds << ")");
-    const bool joined = fLauncherThread.TimedJoin(seconds);
+    bool joined = false;
+    if (AwaitThreadEnd(launch, seconds)) {
+        const JoinLock joinLock(fJoinMutex);
+        joined = JoinEndedThread(launch);
+    }
     PM_LOG(gConsoleAppLog, "fLauncherThread.TimedJoin timeout=" << joined);
     return joined;
 }
@@ -242,6 +343,7 @@ State ConsoleApp::GetState(double maxWaitSeconds)
 State ConsoleApp::GetStateLocked(Lock& lock, double maxWaitSeconds)
 {
     const double deadline = GetWaitClock() + maxWaitSeconds;
+    const LaunchNumber launch = fLaunchNumber;
     for (int nloops = 0;; ++nloops) {
         PM_LOG(gConsoleAppLog,
                "ConsoleApp::GetStateLocked nloops=" << nloops << " fState=" << fState);
@@ -250,6 +352,8 @@ State ConsoleApp::GetStateLocked(Lock& lock, double maxWaitSeconds)
             return fState;
         const auto duration = ToWaitDuration(GetTimeLeft(deadline));
         const bool woken = !duration.is_not_a_date_time() && fCond.timed_wait(lock, duration);
+        if (fLaunchNumber != launch)
+            return State::kIdle; // what was waited for is over
         if (woken || IsStable(fState) || !fFailures.empty())
             continue;
         PM_LOG(gConsoleAppLog, "ConsoleApp::GetStateLocked timeout, fState=" << fState);
@@ -273,23 +377,35 @@ void ConsoleApp::SetStateLocked(const Lock& /*lock*/, State state)
 
 void ConsoleApp::Reset()
 {
+    ResetLaunch(GetLaunchNumber());
+}
+
+// Does nothing if a newer launch has come.
+void ConsoleApp::ResetLaunch(LaunchNumber launch)
+{
+    // It must come to its end: the next launch needs an Idle object.
+    const boost::this_thread::disable_interruption uninterrupted;
     boost::shared_ptr<ExecutionData> data;
     {
         const Lock lock(fMutex);
-        data = fExecutionData;
+        if (fLaunchNumber == launch)
+            data = fExecutionData;
     }
     if (data != nullptr) {
         data->ClearConsoleApp();
         data->SetOutputTask(OutputChannel::kStdout, {});
         data->SetOutputTask(OutputChannel::kStderr, {});
     }
+    const bool ended = AwaitThreadEnd(launch, GetShortWaitSeconds());
     const JoinLock joinLock(fJoinMutex);
     Lock lock(fMutex);
+    if (fLaunchNumber != launch)
+        return;
     if (fLauncherThread.HoldsThread()) {
         lock.unlock();
-        if (!fLauncherThread.TimedJoin(GetShortWaitSeconds())) {
+        if (!ended || !JoinEndedThread(launch)) {
             PM_LOG(gConsoleAppLog, "ConsoleApp::Reset abandon fLauncherThread");
-            fLauncherThread.Abandon();
+            GiveThreadUp();
         }
         lock.lock();
     }
@@ -347,27 +463,39 @@ void ConsoleApp::WritelnAppStdin(const std::string& str)
     WriteAppStdin(reinterpret_cast<const unsigned char*>(line.data()), line.size());
 }
 
-void ConsoleApp::NotifyLaunching(TaskID who)
+// Reset unlinks a launch before it takes the mutex, and says what the state is after that: what
+// passes here before is a part of the launch still, and what comes later is refused.
+void ConsoleApp::RequireLinkedLocked(const Lock& /*lock*/, TaskID who,
+                                     const ExecutionData* launch) const
+{
+    if (!IsLinked(launch))
+        throw Exception(who, "no console app");
+}
+
+void ConsoleApp::NotifyLaunching(TaskID who, const ExecutionData* launch)
 {
     {
         const Lock lock(fMutex);
+        RequireLinkedLocked(lock, who, launch);
         ThrowIfInjectedLocked(lock, who, Fault::kNotifyLaunching, "NotifyLaunching");
         SetStateLocked(lock, State::kLaunching);
     }
     OnLaunching();
 }
 
-void ConsoleApp::NotifyLaunched(TaskID who)
+void ConsoleApp::NotifyLaunched(TaskID who, const ExecutionData* launch)
 {
     const Lock lock(fMutex);
+    RequireLinkedLocked(lock, who, launch);
     ThrowIfInjectedLocked(lock, who, Fault::kNotifyLaunched, "NotifyLaunched");
     SetStateLocked(lock, State::kLaunched);
 }
 
-void ConsoleApp::NotifyRunning(TaskID who, const LaunchResult& result)
+void ConsoleApp::NotifyRunning(TaskID who, const LaunchResult& result, const ExecutionData* launch)
 {
     {
         const Lock lock(fMutex);
+        RequireLinkedLocked(lock, who, launch);
         ThrowIfInjectedLocked(lock, who, Fault::kNotifyRunning, "NotifyRunning");
         if (fAppStdin != nullptr)
             fAppStdin->Close();
@@ -379,10 +507,11 @@ void ConsoleApp::NotifyRunning(TaskID who, const LaunchResult& result)
     OnRunning();
 }
 
-void ConsoleApp::NotifyFinished(TaskID who, int exitCode, State state)
+void ConsoleApp::NotifyFinished(TaskID who, int exitCode, State state, const ExecutionData* launch)
 {
     {
         const Lock lock(fMutex);
+        RequireLinkedLocked(lock, who, launch);
         ThrowIfInjectedLocked(lock, who, Fault::kNotifyFinished, "NotifyFinished");
         fExitCode = exitCode;
         SetStateLocked(lock, state);
@@ -390,21 +519,31 @@ void ConsoleApp::NotifyFinished(TaskID who, int exitCode, State state)
     OnFinished(exitCode);
 }
 
-void ConsoleApp::NotifyOutputTaskBegin(OutputChannel channel)
+void ConsoleApp::NotifyOutputTaskBegin(OutputChannel channel, const ExecutionData* launch)
 {
-    ThrowIfInjected(GetTaskID(channel), Fault::kNotifyOutputTaskBegin, "NotifyOutputTaskBegin");
+    ThrowIfOutputInjected(channel, Fault::kNotifyOutputTaskBegin, "NotifyOutputTaskBegin", launch);
     OnOutputTaskBegin(channel);
 }
 
-void ConsoleApp::NotifyOutputTaskEnd(OutputChannel channel)
+void ConsoleApp::NotifyOutputTaskEnd(OutputChannel channel, const ExecutionData* launch)
 {
-    ThrowIfInjected(GetTaskID(channel), Fault::kNotifyOutputTaskEnd, "NotifyOutputTaskEnd");
+    ThrowIfOutputInjected(channel, Fault::kNotifyOutputTaskEnd, "NotifyOutputTaskEnd", launch);
     OnOutputTaskEnd(channel);
 }
 
-void ConsoleApp::NotifyFailure(const Exception& exc)
+void ConsoleApp::ThrowIfOutputInjected(OutputChannel channel, Fault fault, const char* caller,
+                                       const ExecutionData* launch)
+{
+    const TaskID who = GetTaskID(channel);
+    const Lock lock(fMutex);
+    RequireLinkedLocked(lock, who, launch);
+    ThrowIfInjectedLocked(lock, who, fault, caller);
+}
+
+void ConsoleApp::NotifyFailure(const Exception& exc, const ExecutionData* launch)
 {
     const Lock lock(fMutex);
+    RequireLinkedLocked(lock, exc.GetTaskID(), launch);
     NotifyFailureLocked(lock, exc);
 }
 
@@ -417,10 +556,11 @@ void ConsoleApp::NotifyFailureLocked(const Lock& /*lock*/, const Exception& exc)
     fCond.notify_all();
 }
 
-void ConsoleApp::ThrowIfFailurePending()
+void ConsoleApp::ThrowIfFailurePending(const ExecutionData* launch)
 {
     const Lock lock(fMutex);
-    ThrowIfFailurePendingLocked(lock);
+    if (IsLinked(launch))
+        ThrowIfFailurePendingLocked(lock);
 }
 
 void ConsoleApp::ThrowIfFailurePendingLocked(const Lock& /*lock*/)
@@ -436,10 +576,12 @@ void ConsoleApp::ThrowIfFailurePendingLocked(const Lock& /*lock*/)
     throw Exception(oldest);
 }
 
-void ConsoleApp::ThrowIfInjected(TaskID who, Fault fault, const char* caller)
+void ConsoleApp::ThrowIfInjected(TaskID who, Fault fault, const char* caller,
+                                 const ExecutionData* launch)
 {
     const Lock lock(fMutex);
-    ThrowIfInjectedLocked(lock, who, fault, caller);
+    if (IsLinked(launch))
+        ThrowIfInjectedLocked(lock, who, fault, caller);
 }
 
 void ConsoleApp::ThrowIfInjectedLocked(const Lock& /*lock*/, TaskID who, Fault fault,

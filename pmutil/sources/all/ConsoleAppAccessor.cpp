@@ -144,12 +144,12 @@ void ConsoleAppAccessor::WritelnAppStdin(const std::string& str)
 
 void ConsoleAppAccessor::ThrowIfFailurePending()
 {
-    GetConsoleApp()->ThrowIfFailurePending();
+    GetConsoleApp()->ThrowIfFailurePending(fExecutionData.get());
 }
 
 void ConsoleAppAccessor::ThrowIfInjected(Fault fault, const char* caller)
 {
-    GetConsoleApp()->ThrowIfInjected(fTaskID, fault, caller);
+    GetConsoleApp()->ThrowIfInjected(fTaskID, fault, caller, fExecutionData.get());
 }
 
 void ConsoleAppAccessor::SetInjectedFault(Fault fault)
@@ -160,7 +160,7 @@ void ConsoleAppAccessor::SetInjectedFault(Fault fault)
 void ConsoleAppAccessor::NotifyFailure(const Exception& exc) noexcept
 {
     try {
-        GetConsoleApp()->NotifyFailure(exc);
+        GetConsoleApp()->NotifyFailure(exc, fExecutionData.get());
     } catch (const std::exception& reason) {
         PM_LOG(gConsoleAppLog, "ConsoleAppAccessor::NotifyFailure exc="
                                    << exc.what() << " could not notify app because "
@@ -193,32 +193,35 @@ bool ConsoleAppAccessor::IsOutputChannel() const
 
 void ConsoleAppAccessor::NotifyLaunching()
 {
-    GetConsoleAppFor(TaskID::kLauncher)->NotifyLaunching(fTaskID);
+    GetConsoleAppFor(TaskID::kLauncher)->NotifyLaunching(fTaskID, fExecutionData.get());
 }
 
 void ConsoleAppAccessor::NotifyLaunched()
 {
-    GetConsoleAppFor(TaskID::kLauncher)->NotifyLaunched(fTaskID);
+    GetConsoleAppFor(TaskID::kLauncher)->NotifyLaunched(fTaskID, fExecutionData.get());
 }
 
 void ConsoleAppAccessor::NotifyRunning(const LaunchResult& result)
 {
-    GetConsoleAppFor(TaskID::kLauncher)->NotifyRunning(fTaskID, result);
+    GetConsoleAppFor(TaskID::kLauncher)->NotifyRunning(fTaskID, result, fExecutionData.get());
 }
 
 void ConsoleAppAccessor::NotifyFinished(int exitCode, State state)
 {
-    GetConsoleAppFor(TaskID::kLauncher)->NotifyFinished(fTaskID, exitCode, state);
+    GetConsoleAppFor(TaskID::kLauncher)
+        ->NotifyFinished(fTaskID, exitCode, state, fExecutionData.get());
 }
 
 void ConsoleAppAccessor::NotifyOutputTaskBegin()
 {
-    GetConsoleAppIf(IsOutputChannel())->NotifyOutputTaskBegin(GetOutputChannel(fTaskID));
+    GetConsoleAppIf(IsOutputChannel())
+        ->NotifyOutputTaskBegin(GetOutputChannel(fTaskID), fExecutionData.get());
 }
 
 void ConsoleAppAccessor::NotifyOutputTaskEnd()
 {
-    GetConsoleAppIf(IsOutputChannel())->NotifyOutputTaskEnd(GetOutputChannel(fTaskID));
+    GetConsoleAppIf(IsOutputChannel())
+        ->NotifyOutputTaskEnd(GetOutputChannel(fTaskID), fExecutionData.get());
 }
 
 } // namespace pmutil

@@ -133,6 +133,12 @@ void ExecutionData::ClearConsoleApp()
     fConsoleApp.reset();
 }
 
+bool ExecutionData::HasConsoleApp() const
+{
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    return !fConsoleApp.expired();
+}
+
 boost::shared_ptr<OutputTask> ExecutionData::GetOutputTask(OutputChannel channel) const
 {
     const int index = GetOutputIndex(channel);

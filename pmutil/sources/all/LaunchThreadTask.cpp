@@ -147,7 +147,8 @@ void LaunchThreadTask::CleanupLaunchThreadTask(bool mustKill, LaunchResult& resu
         // The child must go even if the application, and with it a fault, has gone before.
         const boost::shared_ptr<ConsoleApp> app = GetExecutionData()->GetConsoleApp();
         if (app != nullptr)
-            app->ThrowIfInjected(fTaskID, Fault::kLauncherKill, "LauncherKill");
+            app->ThrowIfInjected(fTaskID, Fault::kLauncherKill, "LauncherKill",
+                                 fExecutionData.get());
         PM_LOG(gConsoleAppLog, "CleanupLaunchThreadTask: calling fLauncher->Kill()");
         fLauncher->Kill();
         result = LaunchResult();

@@ -90,7 +90,9 @@ protected:
     State Peek() { return fApp->GetState(0.0); }
 
     boost::shared_ptr<FakeLauncher> fLauncher = boost::make_shared<FakeLauncher>();
-    boost::shared_ptr<RecordingApp> fApp = boost::make_shared<RecordingApp>(fLauncher);
+    // The one fake serves as a new launcher too.
+    boost::shared_ptr<RecordingApp> fApp =
+        boost::make_shared<RecordingApp>(fLauncher, [this] { return fLauncher; });
     boost::shared_ptr<PatientTask> fStdout = boost::make_shared<PatientTask>();
     boost::shared_ptr<PatientTask> fStderr = boost::make_shared<PatientTask>();
     boost::shared_ptr<Gate> fGate = boost::make_shared<Gate>(); // for what a test wants to hold up

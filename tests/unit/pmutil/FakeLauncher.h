@@ -148,7 +148,10 @@ protected:
 // Records its notifications, and whether its lock was free in each.
 class RecordingApp : public ConsoleApp {
 public:
-    explicit RecordingApp(const boost::shared_ptr<Launcher>& launcher) : ConsoleApp(launcher) {}
+    explicit RecordingApp(const boost::shared_ptr<Launcher>& launcher,
+                          LauncherFactory makeLauncher = nullptr)
+        : ConsoleApp(launcher, std::move(makeLauncher))
+    {}
 
     using ConsoleApp::GetStateLocked;
     using ConsoleApp::SetState;
