@@ -1,4 +1,4 @@
-// The one place where a PCI graphics adapter gets its name. The display devices of QGF::OGL and the
+// The one place where a graphics adapter gets its name. The display devices of QGF::OGL and the
 // system's adapter list both ask here, so that their names match.
 //
 // What is known of the adapters is read at the first question and kept until the root changes, so
@@ -6,7 +6,6 @@
 // thread only.
 #pragma once
 
-#include <map>
 #include <string>
 #include <vector>
 
@@ -14,25 +13,20 @@
 
 namespace QGF {
 
-// The PCI addresses of the display adapters, such as "0000:01:00.0", in ascending order: every PCI
-// device of the display class, and every other one that has a DRM node.
+// The places (qgf/DrmNodes.h) of the display adapters: in ascending order the PCI addresses of
+// every PCI device of the display class and every other one that has a DRM node, then in ascending
+// order the adapters that aren't on PCI.
 const std::vector<std::string>& DisplayAdapters();
 
-// The name of the adapter at a PCI address: the first that is known of the NVIDIA driver's own
-// model text (left alone while the card is suspended, for asking would wake it), amdgpu's product
-// name, the PCI id database's "vendor device", and "vendor:device" in hexadecimal. It is printable
-// ASCII without double quotes and backslashes, since the adapter lists escape all else in ways
-// that no other text matches. If another display adapter of the machine would get the same name,
-// " (PCI address)" is appended to each. At most 127 characters. Empty if there is no such adapter.
-std::string AdapterName(const std::string& pciAddress);
-
-// The DRM nodes of PCI adapters as the kernel lists them now: from "card0" or "renderD128" to the
-// PCI address.
-std::map<std::string, std::string> DrmNodes();
-
-// The PCI address of the adapter behind a DRM node file such as "/dev/dri/card0"; empty if the
-// kernel knows no such node or it isn't on PCI.
-std::string AdapterOfDrmNode(const std::string& file);
+// The name of the adapter at a place. Of a PCI adapter the first that is known of the NVIDIA
+// driver's own model text (left alone while the card is suspended, for asking would wake it),
+// amdgpu's product name, the PCI id database's "vendor device", and "vendor:device" in hexadecimal;
+// of another adapter what the device tree says it is compatible with, else the driver's name. It is
+// printable ASCII without double quotes and backslashes, since the adapter lists escape all else in
+// ways that no other text matches. If another display adapter of the machine would get the same
+// name, " (PCI address)" is appended to each, or, outside PCI, a number in their order. At most 127
+// characters. Empty if there is no such adapter.
+std::string AdapterName(const std::string& place);
 
 // The PCI addresses of NVIDIA devices that an EGL driver lists without a DRM node, in their order
 // there; empty where one can't be told. `names` are the names that the devices give themselves

@@ -2,26 +2,29 @@
 // device print fields of the kernel's struct pci_dev (drivers/pci/pci-sysfs.c, pci_config_attr;
 // Documentation/ABI/testing/sysfs-bus-pci), unlike "config" and the link speeds, which resume the
 // device to read it. amdgpu's "product_name" prints what the driver read when it started
-// (drivers/gpu/drm/amd/amdgpu/amdgpu_fru_eeprom.c). NvidiaProc.cpp tells of the one file that does
-// wake its card.
+// (drivers/gpu/drm/amd/amdgpu/amdgpu_fru_eeprom.c), for the server cards that have such a text.
+// "uevent" of a device without PCI prints what the device tree says (drivers/of/device.c,
+// of_device_uevent) and asks no driver. NvidiaProc.cpp tells of the one file that does wake its
+// card.
 #include "qgf/AdapterName.h"
 
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <map>
 #include <memory>
 #include <set>
 
-#include "qgf/qgf_core/SystemRoot.h"
+#include "qgf/DrmNodes.h"
 #include "qgf/qgf_core/linux/NvidiaProc.h"
 #include "qgf/qgf_core/linux/PciAddress.h"
 #include "qgf/qgf_core/linux/PciIds.h"
+#include "qgf/qgf_core/linux/Uevent.h"
 
 namespace QGF {
 namespace {
 
 const char kPciDevices[] = "/sys/bus/pci/devices";
-const char kDrmClass[] = "/sys/class/drm";
 constexpr unsigned kDisplayClass = 0x03;
 constexpr std::uint16_t kNvidia = 0x10DE;
 
@@ -30,13 +33,13 @@ constexpr std::size_t kNameLimit = 127 - 19;
 
 struct Adapters {
     unsigned rootCount = 0;
-    std::vector<std::string> addresses;
+    std::vector<std::string> places;
     std::map<std::string, std::string> names;
 };
 
-std::string AttributeOf(const std::string& address, const char* attribute)
+std::string AttributeOf(const std::string& place, const char* attribute)
 {
-    return ReadSystemLine(std::string(kPciDevices) + "/" + address + "/" + attribute);
+    return ReadSystemLine(AdapterFolder(place) + attribute);
 }
 
 // A number as the kernel prints ids, "0x10de"; 0 for anything else.
@@ -54,31 +57,22 @@ std::uint16_t ShortIdOf(const std::string& address, const char* attribute)
     return static_cast<std::uint16_t>(id <= 0xFFFF ? id : 0);
 }
 
-bool IsDrmNode(const std::string& name)
-{
-    for (const char* prefix : {"card", "renderD"}) {
-        const std::size_t length = std::char_traits<char>::length(prefix);
-        if (name.compare(0, length, prefix) == 0 && name.size() > length &&
-            name.find_first_not_of("0123456789", length) == std::string::npos) {
-            return true;
-        }
-    }
-    return false;
-}
-
+// PCI addresses first, then the places of the others.
 std::vector<std::string> FindAdapters()
 {
-    std::set<std::string> withNode;
-    for (const auto& node : DrmNodes()) {
-        withNode.insert(node.second);
+    std::set<std::string> onPci;
+    std::set<std::string> elsewhere;
+    for (const DrmNode& node : DrmNodes()) {
+        (IsPciAddress(node.place) ? onPci : elsewhere).insert(node.place);
     }
     std::vector<std::string> adapters;
     for (const std::string& address : ListSystemFolder(kPciDevices)) {
         if (IsPciAddress(address) &&
-            (IdOf(address, "class") >> 16 == kDisplayClass || withNode.count(address) != 0)) {
+            (onPci.count(address) != 0 || IdOf(address, "class") >> 16 == kDisplayClass)) {
             adapters.push_back(address);
         }
     }
+    adapters.insert(adapters.end(), elsewhere.begin(), elsewhere.end());
     return adapters;
 }
 
@@ -108,7 +102,7 @@ std::string Plain(const std::string& name)
     return plain;
 }
 
-std::string NameOf(const std::string& address, PciIds& ids)
+std::string PciNameOf(const std::string& address, PciIds& ids)
 {
     const std::uint16_t vendor = ShortIdOf(address, "vendor");
     const std::uint16_t device = ShortIdOf(address, "device");
@@ -125,21 +119,34 @@ std::string NameOf(const std::string& address, PciIds& ids)
     return name.empty() ? HexName(vendor, device) : name;
 }
 
+// What the device tree calls it, else its driver: nothing better is known of such a device.
+std::string DeviceNameOf(const std::string& place)
+{
+    std::string uevent;
+    ReadSystemFile(AdapterFolder(place) + "uevent", uevent);
+    std::string name = Plain(UeventValue(uevent, "OF_COMPATIBLE_0"));
+    if (name.empty()) {
+        name = Plain(LastOfPath(ReadSystemLink(AdapterFolder(place) + "driver")));
+    }
+    return name.empty() ? Plain(LastOfPath(place)) : name;
+}
+
 Adapters ReadAdapters()
 {
     Adapters adapters;
     adapters.rootCount = SystemRootCount();
-    adapters.addresses = FindAdapters();
+    adapters.places = FindAdapters();
     PciIds ids;
     std::map<std::string, int> uses;
-    for (const std::string& address : adapters.addresses) {
-        const std::string name = NameOf(address, ids);
-        adapters.names[address] = name;
+    for (const std::string& place : adapters.places) {
+        const std::string name = IsPciAddress(place) ? PciNameOf(place, ids) : DeviceNameOf(place);
+        adapters.names[place] = name;
         ++uses[name];
     }
-    for (auto& entry : adapters.names) {
-        if (uses[entry.second] > 1) {
-            entry.second += " (" + entry.first + ")";
+    int elsewhere = 0;
+    for (auto& [place, name] : adapters.names) {
+        if (uses[name] > 1) {
+            name += " (" + (IsPciAddress(place) ? place : std::to_string(++elsewhere)) + ")";
         }
     }
     return adapters;
@@ -165,39 +172,14 @@ void Take(std::vector<std::string>& cards, std::vector<std::string>::iterator ca
 
 const std::vector<std::string>& DisplayAdapters()
 {
-    return GetAdapters().addresses;
+    return GetAdapters().places;
 }
 
-std::string AdapterName(const std::string& pciAddress)
+std::string AdapterName(const std::string& place)
 {
     const Adapters& adapters = GetAdapters();
-    const auto entry = adapters.names.find(pciAddress);
+    const auto entry = adapters.names.find(place);
     return entry == adapters.names.end() ? std::string() : entry->second;
-}
-
-std::map<std::string, std::string> DrmNodes()
-{
-    std::map<std::string, std::string> nodes;
-    for (const std::string& name : ListSystemFolder(kDrmClass)) {
-        if (!IsDrmNode(name)) {
-            continue;
-        }
-        const std::string address =
-            LastPciAddress(ReadSystemLink(std::string(kDrmClass) + "/" + name));
-        if (!address.empty()) {
-            nodes[name] = address;
-        }
-    }
-    return nodes;
-}
-
-std::string AdapterOfDrmNode(const std::string& file)
-{
-    const std::string name = LastOfPath(file);
-    if (!IsDrmNode(name)) {
-        return std::string();
-    }
-    return LastPciAddress(ReadSystemLink(std::string(kDrmClass) + "/" + name));
 }
 
 std::vector<std::string> NvidiaAdapters(const std::vector<std::string>& names,

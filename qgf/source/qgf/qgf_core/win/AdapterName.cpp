@@ -3,7 +3,7 @@
 namespace QGF {
 
 // The system names its adapters itself, the same way to everyone who asks.
-std::string AdapterName(const std::string& /*pciAddress*/)
+std::string AdapterName(const std::string& /*place*/)
 {
     return {};
 }

@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "qgf/AdapterName.h"
+#include "qgf/DrmNodes.h"
 #include "qgf/qgf_core/Quietly.h"
 
 namespace QGF {

@@ -18,7 +18,8 @@ class EGLPlatform : public Platform {
 public:
     // How the addresses of adapters are found; replaceable for tests.
     struct AdapterLookup {
-        // The PCI address of the adapter behind a DRM node such as "/dev/dri/card0"; "" if unknown.
+        // The place (qgf/DrmNodes.h) of the adapter behind a DRM node such as "/dev/dri/card0"; ""
+        // if unknown.
         std::string (*addressOfNode)(const std::string& node);
         // The PCI addresses of NVIDIA devices that no DRM node leads to, in their order; "" where
         // unknown.
@@ -26,7 +27,7 @@ public:
         // addresses that other devices have.
         std::vector<std::string> (*addressesOfNvidia)(const std::vector<std::string>& names,
                                                       const std::vector<std::string>& taken);
-        // The adapter's name by its address; "" if unknown.
+        // The adapter's name by its place; "" if unknown.
         std::string (*nameOfAddress)(const std::string& address);
     };
 
@@ -64,7 +65,7 @@ private:
         bool nvidia;
         std::string node;     // "" if it has none
         std::string renderer; // "" if it doesn't say
-        std::string address;  // "" if unknown
+        std::string address;  // the adapter's place; "" if unknown
     };
 
     void FindDevices();
