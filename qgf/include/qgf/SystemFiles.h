@@ -17,6 +17,9 @@ namespace QGF {
 void SetSystemRoot(const std::string& root);
 const std::string& SystemRoot();
 
+// How often the root has been set: what was found at another count is stale.
+unsigned SystemRootCount();
+
 // No file of /sys holds more than a page, and those of /proc that are read here are as short.
 inline constexpr std::size_t kSystemFileLimit = 4096;
 

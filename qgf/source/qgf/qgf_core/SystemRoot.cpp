@@ -1,6 +1,4 @@
-#include "qgf/qgf_core/SystemRoot.h"
-
-#include "qgf/AdapterName.h"
+#include "qgf/SystemFiles.h"
 
 namespace QGF {
 
