@@ -8,8 +8,12 @@
 // - amdgpu's "mem_info_vram_total" and "mem_info_gtt_total" print sizes kept since the driver
 //   started (drivers/gpu/drm/amd/amdgpu/amdgpu_vram_mgr.c, amdgpu_gtt_mgr.c;
 //   Documentation/gpu/amdgpu/driver-misc.rst), unlike its clocks and sensors.
-// - i915's "lmem_total_bytes" and xe's "physical_vram_size_bytes" print sizes probed at start (xe:
-//   drivers/gpu/drm/xe/xe_tile_sysfs.c).
+// - "resource" prints the kernel's own table of the function's BARs (drivers/pci/pci-sysfs.c,
+//   resource_show). Of the "hwmon" folder, which i915 and xe register for discrete cards only
+//   (i915_hwmon_register, xe_hwmon_register), the presence says enough; its files would wake the
+//   card.
+// - A render node is opened only while "power/runtime_status" says "active"; the state is the
+//   kernel's own variable (drivers/base/power/sysfs.c). DrmQuery.cpp tells what opening does.
 // - /sys/module/NAME/version and the links "driver" and "module" belong to the module, not to a
 //   device (Documentation/ABI/stable/sysfs-module).
 // - /proc/driver/nvidia/version belongs to the module as well, and listing the folder of its cards
@@ -18,12 +22,15 @@
 
 #include <algorithm>
 #include <charconv>
-#include <limits>
 #include <map>
 
+#include "linux/DrmMemory.h"
+#include "linux/DrmQuery.h"
 #include "linux/NvidiaVersion.h"
 #include "linux/SystemNumbers.h"
+#include "pmutil_gpu/DXGIData.h"
 #include "qgf/AdapterName.h"
+#include "qgf/DrmNodes.h"
 #include "qgf/SystemFiles.h"
 
 namespace pmutil {
@@ -32,23 +39,27 @@ namespace {
 const char kDrmClass[] = "/sys/class/drm/";
 constexpr std::uint32_t kMaxModeSize = 1U << 16;
 
-// The DRM nodes of one adapter.
-struct Nodes {
-    std::vector<std::string> cards;
-    std::string render;
-};
+// The DRM nodes of one adapter, in the order of their names.
+using Nodes = std::vector<QGF::DrmNode>;
 
-std::map<std::string, Nodes> NodesByAddress()
+std::map<std::string, Nodes> NodesByPlace()
 {
     std::map<std::string, Nodes> nodes;
-    for (const auto& [name, address] : QGF::DrmNodes()) {
-        if (name.compare(0, 4, "card") == 0) {
-            nodes[address].cards.push_back(name);
-        } else if (nodes[address].render.empty()) {
-            nodes[address].render = name;
-        }
+    for (QGF::DrmNode& node : QGF::DrmNodes()) {
+        nodes[node.place].push_back(std::move(node));
     }
     return nodes;
+}
+
+bool IsRenderNode(const QGF::DrmNode& node)
+{
+    return node.name.compare(0, 6, "render") == 0;
+}
+
+std::string RenderNodeOf(const Nodes& nodes)
+{
+    const auto node = std::find_if(nodes.begin(), nodes.end(), IsRenderNode);
+    return node == nodes.end() ? std::string() : node->name;
 }
 
 std::uint32_t ReadId(const std::string& path, std::uint32_t limit)
@@ -72,38 +83,45 @@ std::optional<std::uint64_t> ReadSize(const std::string& path)
     return ReadSystemNumber(path, bytes) ? std::optional<std::uint64_t>(bytes) : std::nullopt;
 }
 
-// xe's figure: one per tile of the card.
-std::optional<std::uint64_t> ReadTiles(const std::string& folder)
+// The driver's own figure; 0 if it says that the card has no memory of its own.
+std::optional<std::uint64_t> AskForMemory(const std::string& folder, const Nodes& nodes,
+                                          const std::string& driver)
 {
-    std::optional<std::uint64_t> total;
-    for (const std::string& name : QGF::ListSystemFolder(folder)) {
-        if (name.compare(0, 4, "tile") != 0) {
-            continue;
-        }
-        const std::optional<std::uint64_t> tile =
-            ReadSize(folder + name + "/physical_vram_size_bytes");
-        if (tile && *tile <= std::numeric_limits<std::uint64_t>::max() - total.value_or(0)) {
-            total = total.value_or(0) + *tile;
-        }
+    const std::string node = RenderNodeOf(nodes);
+    if (node.empty() || !AnswersOnDrmNode(driver) ||
+        QGF::ReadSystemLine(folder + "power/runtime_status") != "active") {
+        return std::nullopt;
     }
-    return total;
+    return MemoryInAnswer(driver, AskDrmNode(node, driver));
+}
+
+// For a card whose driver gives no figure. Intel's processors have their graphics at 00:02; a card
+// at that place, as virtual machines put it, is known by its sensors.
+bool HasOwnMemory(const std::string& folder, const DrmAdapter& adapter)
+{
+    if (adapter.vendor == kVendorIntel) {
+        return adapter.place.compare(0, 11, "0000:00:02.") != 0 ||
+               !QGF::ListSystemFolder(folder + "hwmon").empty();
+    }
+    return adapter.vendor == kVendorAMD;
 }
 
 void ReadMemory(const std::string& folder, const Nodes& nodes, DrmAdapter& adapter)
 {
     adapter.dedicatedBytes = ReadSize(folder + "mem_info_vram_total");
-    if (!adapter.dedicatedBytes) {
-        adapter.dedicatedBytes = ReadSize(folder + "lmem_total_bytes");
-    }
-    for (const std::string& card : nodes.cards) {
-        if (!adapter.dedicatedBytes) {
-            adapter.dedicatedBytes = ReadSize(kDrmClass + card + "/lmem_total_bytes");
-        }
-    }
-    if (!adapter.dedicatedBytes) {
-        adapter.dedicatedBytes = ReadTiles(folder);
-    }
     adapter.sharedBytes = ReadSize(folder + "mem_info_gtt_total");
+    if (adapter.dedicatedBytes) {
+        return;
+    }
+    adapter.dedicatedBytes = AskForMemory(folder, nodes, adapter.driver);
+    if (!adapter.dedicatedBytes && HasOwnMemory(folder, adapter)) {
+        std::string resource;
+        QGF::ReadSystemFile(folder + "resource", resource);
+        adapter.dedicatedBytes = LargestPrefetchableBar(resource);
+    }
+    if (adapter.dedicatedBytes == 0U) {
+        adapter.dedicatedBytes.reset();
+    }
 }
 
 // The module behind a device's driver, or the driver itself where it is built into the kernel.
@@ -116,17 +134,46 @@ std::string ModuleOf(const std::string& device)
     return QGF::LastOfPath(QGF::ReadSystemLink(device + "driver"));
 }
 
-void ReadDriver(const std::string& folder, const Nodes& nodes, DrmAdapter& adapter)
+// The folder of the device that the adapter's nodes belong to: the adapter's own if one is its or
+// none is anyone's, else the one below it that has the render node. A firmware framebuffer is no
+// driver's.
+std::string DeviceOfNodes(const std::string& folder, const std::string& place, const Nodes& nodes)
 {
-    // The node's own device comes first: of a virtual card, the PCI function is only the transport.
-    for (const std::string& card : nodes.cards) {
-        if (adapter.driver.empty()) {
-            adapter.driver = ModuleOf(kDrmClass + card + "/device/");
+    const QGF::DrmNode* best = nullptr;
+    for (const QGF::DrmNode& node : nodes) {
+        if (node.firmware) {
+            continue;
+        }
+        if (QGF::LastOfPath(node.device) == QGF::LastOfPath(place)) {
+            return folder;
+        }
+        if (best == nullptr || IsRenderNode(node)) {
+            best = &node;
         }
     }
-    if (adapter.driver.empty()) {
-        adapter.driver = ModuleOf(folder);
+    return best == nullptr ? folder : best->device + "/";
+}
+
+// The driver that draws. virtio's own devices are only the transport of the one below them, whose
+// nodes they have all the same (virtio_gpu_probe in drivers/gpu/drm/virtio/virtgpu_drv.c).
+std::string DrawingDriver(const std::string& device)
+{
+    const std::string driver = ModuleOf(device);
+    if (driver.compare(0, 7, "virtio_") == 0 || driver.compare(0, 7, "virtio-") == 0) {
+        for (const std::string& name : QGF::ListSystemFolder(device)) {
+            const std::string carried =
+                name.compare(0, 6, "virtio") == 0 ? ModuleOf(device + name + "/") : std::string();
+            if (!carried.empty()) {
+                return carried;
+            }
+        }
     }
+    return driver;
+}
+
+void ReadDriver(const std::string& folder, const Nodes& nodes, DrmAdapter& adapter)
+{
+    adapter.driver = DrawingDriver(DeviceOfNodes(folder, adapter.place, nodes));
     if (adapter.driver.empty()) {
         return;
     }
@@ -163,8 +210,8 @@ bool ReadConnector(const std::string& folder, DrmConnector& connector)
 void ReadConnectors(const std::vector<std::string>& classNames, const Nodes& nodes,
                     DrmAdapter& adapter)
 {
-    for (const std::string& card : nodes.cards) {
-        const std::string prefix = card + "-";
+    for (const QGF::DrmNode& node : nodes) {
+        const std::string prefix = node.name + "-";
         for (const std::string& name : classNames) {
             if (name.compare(0, prefix.size(), prefix) != 0) {
                 continue;
@@ -181,9 +228,9 @@ void ReadConnectors(const std::vector<std::string>& classNames, const Nodes& nod
 void ReadRenderer(const Nodes& nodes, const std::vector<std::string>& nvidiaCards,
                   DrmAdapter& adapter)
 {
-    adapter.renderName = nodes.render;
+    adapter.renderName = RenderNodeOf(nodes);
     if (adapter.renderName.empty() &&
-        std::find(nvidiaCards.begin(), nvidiaCards.end(), adapter.address) != nvidiaCards.end()) {
+        std::find(nvidiaCards.begin(), nvidiaCards.end(), adapter.place) != nvidiaCards.end()) {
         adapter.renderName = "nvidia";
     }
     adapter.renders = !adapter.renderName.empty();
@@ -194,24 +241,35 @@ void ReadRenderer(const Nodes& nodes, const std::vector<std::string>& nvidiaCard
 std::vector<DrmAdapter> ReadDrmAdapters()
 {
     std::vector<DrmAdapter> adapters;
-    const std::map<std::string, Nodes> nodesByAddress = NodesByAddress();
+    const std::map<std::string, Nodes> nodesByPlace = NodesByPlace();
     const std::vector<std::string> classNames = QGF::ListSystemFolder(kDrmClass);
     const std::vector<std::string> nvidiaCards = QGF::ListSystemFolder("/proc/driver/nvidia/gpus");
-    for (const std::string& address : QGF::DisplayAdapters()) {
-        const std::string folder = "/sys/bus/pci/devices/" + address + "/";
-        const auto found = nodesByAddress.find(address);
-        const Nodes nodes = found == nodesByAddress.end() ? Nodes() : found->second;
+    for (const std::string& place : QGF::DisplayAdapters()) {
+        const std::string folder = QGF::AdapterFolder(place);
+        const auto found = nodesByPlace.find(place);
+        const Nodes nodes = found == nodesByPlace.end() ? Nodes() : found->second;
         DrmAdapter adapter;
-        adapter.address = address;
-        adapter.name = QGF::AdapterName(address);
+        adapter.place = place;
+        adapter.name = QGF::AdapterName(place);
         ReadIds(folder, adapter);
-        ReadMemory(folder, nodes, adapter);
         ReadDriver(folder, nodes, adapter);
+        ReadMemory(folder, nodes, adapter);
         ReadConnectors(classNames, nodes, adapter);
         ReadRenderer(nodes, nvidiaCards, adapter);
         adapters.push_back(std::move(adapter));
     }
     return adapters;
+}
+
+std::shared_ptr<const std::vector<DrmAdapter>> KnownDrmAdapters()
+{
+    static std::shared_ptr<const std::vector<DrmAdapter>> gKnown;
+    static unsigned gRootCount = 0;
+    if (!gKnown || gRootCount != QGF::SystemRootCount()) {
+        gRootCount = QGF::SystemRootCount();
+        gKnown = std::make_shared<const std::vector<DrmAdapter>>(ReadDrmAdapters());
+    }
+    return gKnown;
 }
 
 bool ParseModeSize(const std::string& mode, std::uint32_t& width, std::uint32_t& height)

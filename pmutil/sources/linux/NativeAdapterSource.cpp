@@ -123,15 +123,15 @@ public:
     ResultCode Next(std::unique_ptr<AdapterRow>& row) override
     {
         row.reset();
-        if (fNext != fAdapters.size()) {
-            row = std::make_unique<LinuxRow>(fAdapters[fNext]);
+        if (fNext != fAdapters->size()) {
+            row = std::make_unique<LinuxRow>((*fAdapters)[fNext]);
             ++fNext;
         }
         return 0;
     }
 
 private:
-    const std::vector<DrmAdapter> fAdapters = ReadDrmAdapters();
+    const std::shared_ptr<const std::vector<DrmAdapter>> fAdapters = KnownDrmAdapters();
     std::size_t fNext = 0;
 };
 
@@ -176,9 +176,12 @@ class LinuxAdapter : public Adapter {
 public:
     explicit LinuxAdapter(DrmAdapter adapter) : fAdapter(std::move(adapter))
     {
-        // A card made for computing has no connector to attach a display to, and yet is a device
-        // like any other: what it renders with stands in for an attached output.
-        if (fAdapter.connectors.empty() && fAdapter.renders) {
+        // A card without a monitor, or made for computing and without connectors, is a device like
+        // any other: what it renders with stands in for an attached output.
+        const bool attached =
+            std::any_of(fAdapter.connectors.begin(), fAdapter.connectors.end(),
+                        [](const DrmConnector& connector) { return connector.connected == true; });
+        if (!attached && fAdapter.renders) {
             DrmConnector standIn;
             standIn.name = fAdapter.renderName;
             standIn.connected = true;
@@ -229,15 +232,15 @@ class LinuxFactory : public AdapterFactory {
 public:
     ResultCode EnumAdapters(std::uint32_t index, std::unique_ptr<Adapter>& adapter) override
     {
-        if (index >= fAdapters.size()) {
+        if (index >= fAdapters->size()) {
             return kNotFound;
         }
-        adapter = std::make_unique<LinuxAdapter>(fAdapters[index]);
+        adapter = std::make_unique<LinuxAdapter>((*fAdapters)[index]);
         return 0;
     }
 
 private:
-    const std::vector<DrmAdapter> fAdapters = ReadDrmAdapters();
+    const std::shared_ptr<const std::vector<DrmAdapter>> fAdapters = KnownDrmAdapters();
 };
 
 class LinuxSource : public AdapterSource {
