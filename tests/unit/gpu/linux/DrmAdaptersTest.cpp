@@ -1,5 +1,7 @@
 #include "linux/DrmAdapters.h"
 
+#include <filesystem>
+
 #include <gtest/gtest.h>
 
 #include "support/AdapterTree.h"
@@ -41,7 +43,7 @@ TEST(DrmAdaptersTest, ADiscreteCardWithEverything)
 {
     const AdapterTree tree("amd-discrete");
     const DrmAdapter adapter = OnlyAdapter();
-    EXPECT_EQ(adapter.address, "0000:03:00.0");
+    EXPECT_EQ(adapter.place, "0000:03:00.0");
     EXPECT_EQ(adapter.vendor, 0x1002U);
     EXPECT_EQ(adapter.device, 0x744CU);
     EXPECT_EQ(adapter.subsystem, 0x471E1DA2U);
@@ -49,7 +51,7 @@ TEST(DrmAdaptersTest, ADiscreteCardWithEverything)
     EXPECT_EQ(adapter.dedicatedBytes, 25753026560U);
     EXPECT_EQ(adapter.sharedBytes, 16767705088U);
     EXPECT_EQ(adapter.driver, "amdgpu");
-    EXPECT_EQ(adapter.driverVersion, "6.8.0-45-generic");
+    EXPECT_EQ(adapter.driverVersion, "6.12.117+deb12-amd64");
     EXPECT_EQ(adapter.driverDate, "");
     EXPECT_TRUE(adapter.renders);
     EXPECT_EQ(adapter.renderName, "renderD128");
@@ -77,7 +79,7 @@ TEST(DrmAdaptersTest, ADriverBuiltIntoTheKernelHasItsOwnName)
     const AdapterTree tree("amd-discrete");
     tree.remove("/sys/bus/pci/drivers/amdgpu/module");
     EXPECT_EQ(OnlyAdapter().driver, "amdgpu");
-    EXPECT_EQ(OnlyAdapter().driverVersion, "6.8.0-45-generic");
+    EXPECT_EQ(OnlyAdapter().driverVersion, "6.12.117+deb12-amd64");
 }
 
 TEST(DrmAdaptersTest, ACardWithoutADriverHasNoDriverStrings)
@@ -107,38 +109,118 @@ TEST(DrmAdaptersTest, TheNvidiaDriversEntryStandsInForARenderNode)
     EXPECT_FALSE(OnlyAdapter().renders);
 }
 
-TEST(DrmAdaptersTest, AVirtualCardsDriverIsTheNodesNotTheTransports)
+TEST(DrmAdaptersTest, ATransportsDriverIsNotTheCards)
 {
     const AdapterTree tree("virtio-gpu");
     EXPECT_EQ(OnlyAdapter().driver, "virtio_gpu");
+    tree.remove("/sys/devices/pci0000:00/0000:00:01.0/virtio0");
+    EXPECT_EQ(OnlyAdapter().driver, "virtio_pci");
 }
 
-TEST(DrmAdaptersTest, LocalMemoryOfI915)
+// As a driver has it that makes its nodes for the virtio device itself.
+TEST(DrmAdaptersTest, NorIsItWhereTheNodesBelongToTheDeviceBelow)
 {
-    const AdapterTree tree("intel-discrete-i915");
+    const AdapterTree tree("virtio-gpu");
+    for (const std::string node : {"card0", "renderD128"}) {
+        const std::string link = tree.root() + "/sys/class/drm/" + node;
+        std::filesystem::remove(link);
+        std::filesystem::create_symlink("../../devices/pci0000:00/0000:00:01.0/virtio0/drm/" + node,
+                                        link);
+    }
+    tree.refresh();
+    EXPECT_EQ(OnlyAdapter().place, "0000:00:01.0");
+    EXPECT_EQ(OnlyAdapter().driver, "virtio_gpu");
+}
+
+TEST(DrmAdaptersTest, AFirmwareFramebuffersDriverIsNotTheCards)
+{
+    for (const char* name : {"nvidia-firmware", "nvidia-firmware-drm"}) {
+        const AdapterTree tree(name);
+        EXPECT_EQ(OnlyAdapter().driver, "nvidia") << name;
+        EXPECT_EQ(OnlyAdapter().driverVersion, "550.54.15") << name;
+        EXPECT_EQ(OnlyAdapter().connectors.at(0).name, "Unknown-1") << name;
+    }
+    const AdapterTree tree("firmware-only");
+    EXPECT_EQ(OnlyAdapter().driver, "");
+}
+
+const char kArc[] = "/sys/bus/pci/devices/0000:03:00.0/";
+
+TEST(DrmAdaptersTest, TheDriverTellsAnIntelCardsMemory)
+{
+    const AdapterTree tree("intel-arc-i915");
     EXPECT_EQ(OnlyAdapter().dedicatedBytes, 17062428672U);
 }
 
-TEST(DrmAdaptersTest, LocalMemoryOfXeIsTheSumOfItsTiles)
+TEST(DrmAdaptersTest, WithoutItsAnswerTheBarDoes)
 {
-    const AdapterTree tree("intel-discrete-xe");
-    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{12} << 30);
+    const AdapterTree tree("intel-arc-i915");
+    tree.remove("/dev/dri/renderD128.i915");
+    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{16} << 30);
+    tree.remove(std::string(kArc) + "resource");
+    EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
 }
 
-TEST(DrmAdaptersTest, TilesThat64BitsDontHoldAreLeftOut)
+TEST(DrmAdaptersTest, ASleepingCardsAnswerIsNotTaken)
 {
-    const AdapterTree tree("intel-discrete-xe");
-    tree.write("/sys/devices/pci0000:00/0000:00:01.0/0000:01:00.0/0000:02:01.0/0000:03:00.0/tile1/"
-               "physical_vram_size_bytes",
-               "18446744073709551615\n");
-    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{6} << 30);
+    const AdapterTree tree("intel-arc-i915");
+    tree.write(std::string(kArc) + "power/runtime_status", "suspended\n");
+    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{16} << 30);
 }
 
-TEST(DrmAdaptersTest, NoFileOfASizeIsNoSize)
+TEST(DrmAdaptersTest, AnAnswerOfNoMemoryIsTakenAtItsWord)
+{
+    const AdapterTree tree("intel-integrated");
+    EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
+    tree.remove("/dev/dri/renderD128.i915");
+    EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
+}
+
+// A virtual machine may have a card where processors have their graphics.
+TEST(DrmAdaptersTest, SensorsTellACardWhereGraphicsOfAProcessorWouldBe)
+{
+    const AdapterTree tree("intel-integrated");
+    tree.remove("/dev/dri/renderD128.i915");
+    tree.write("/sys/devices/pci0000:00/0000:00:02.0/hwmon/hwmon1/name", "i915\n");
+    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{256} << 20);
+}
+
+TEST(DrmAdaptersTest, IntelsElsewhereAreCards)
+{
+    const AdapterTree tree("intel-arc-closed");
+    tree.remove(std::string(kArc) + "hwmon");
+    EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{256} << 20);
+}
+
+TEST(DrmAdaptersTest, TheBarIsNoMeasureOfOtherMakersCards)
 {
     const AdapterTree tree("nouveau");
+    tree.remove("/dev/dri/renderD128.nouveau");
+    tree.write("/sys/devices/pci0000:00/0000:00:01.0/0000:01:00.0/resource",
+               "0x0000000000000000 0x000000000fffffff 0x000000000014220c\n");
     EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
     EXPECT_FALSE(OnlyAdapter().sharedBytes);
+}
+
+TEST(DrmAdaptersTest, ABoardsOwnRendererIsAnAdapterWithoutIds)
+{
+    const AdapterTree tree("soc-panfrost");
+    const std::vector<DrmAdapter> adapters = ReadDrmAdapters();
+    ASSERT_EQ(adapters.size(), 2U);
+    EXPECT_EQ(adapters[1].place, "platform/ff9a0000.gpu");
+    EXPECT_EQ(adapters[1].name, "rockchip,rk3399-mali");
+    EXPECT_EQ(adapters[1].vendor, 0U);
+    EXPECT_EQ(adapters[1].driver, "panfrost");
+    EXPECT_EQ(adapters[1].renderName, "renderD128");
+}
+
+TEST(DrmAdaptersTest, WhatIsKnownIsReadOnce)
+{
+    const AdapterTree tree("amd-discrete");
+    const auto known = KnownDrmAdapters();
+    EXPECT_EQ(KnownDrmAdapters(), known);
+    tree.refresh();
+    EXPECT_NE(KnownDrmAdapters(), known);
 }
 
 TEST(DrmAdaptersTest, BrokenFilesCostTheirFieldsOnly)

@@ -50,7 +50,7 @@ TEST(NativeAdapterSourceTest, ARowHasThePropertiesThatAreRead)
     EXPECT_EQ(Property(u"Caption").text, name);
     EXPECT_EQ(Property(u"InstalledDisplayDrivers").text, u"amdgpu");
     EXPECT_EQ(Property(u"VideoModeDescription").text, u"2560 x 1440");
-    EXPECT_EQ(Property(u"DriverVersion").text, u"6.8.0-45-generic");
+    EXPECT_EQ(Property(u"DriverVersion").text, u"6.12.117+deb12-amd64");
     EXPECT_EQ(Property(u"DriverDate").type, PropertyValue::kString);
     EXPECT_EQ(Property(u"DriverDate").text, u"");
     EXPECT_EQ(Property(u"Status").text, u"OK");
@@ -156,7 +156,7 @@ TEST(NativeAdapterSourceTest, ElseAnIntegratedPartSharesHalfOfTheMachinesMemory)
 
 TEST(NativeAdapterSourceTest, OtherCardsShareNothing)
 {
-    for (const char* name : {"intel-discrete-i915", "nvidia-drm", "virtio-gpu"}) {
+    for (const char* name : {"intel-arc-i915", "nvidia-drm", "virtio-gpu"}) {
         const AdapterTree tree(name);
         EXPECT_EQ(FirstDescriptor().SharedSystemMemory, 0U) << name;
     }
@@ -225,11 +225,31 @@ TEST(NativeAdapterSourceTest, TheNvidiaDriversEntryIsSuchAnOutputToo)
     EXPECT_EQ(Outputs(0), "");
 }
 
-TEST(NativeAdapterSourceTest, ACardWithConnectorsButNoDisplayDrivesNone)
+TEST(NativeAdapterSourceTest, ACardThatRendersWithoutADisplayHasOneMoreOutput)
 {
     const AdapterTree tree("hybrid-laptop");
+    EXPECT_EQ(Outputs(1), "HDMI-A-1 renderD129* ");
+    EXPECT_EQ(DXGIData::GetAllDevices().size(), 2U);
+    tree.remove("/sys/class/drm/renderD129");
+    tree.remove("/proc/driver/nvidia/gpus");
     EXPECT_EQ(Outputs(1), "HDMI-A-1 ");
-    ASSERT_EQ(DXGIData::GetAllDevices().size(), 1U);
+    EXPECT_EQ(DXGIData::GetAllDevices().size(), 1U);
+}
+
+TEST(NativeAdapterSourceTest, WithADisplayItHasNone)
+{
+    const AdapterTree tree("amd-discrete");
+    EXPECT_EQ(Outputs(0), "DP-1* DP-2 HDMI-A-1* ");
+}
+
+TEST(NativeAdapterSourceTest, ACardOfAVirtualMachineHasARowButNoOutput)
+{
+    const AdapterTree tree("vfio");
+    const std::vector<WMIData> rows = WMIData::GetAllDevices();
+    ASSERT_EQ(rows.size(), 2U);
+    EXPECT_EQ(rows[1].GetInstalledDisplayDrivers(), "vfio_pci");
+    EXPECT_EQ(Outputs(1), "");
+    EXPECT_EQ(DXGIData::GetAllDevices().size(), 1U);
 }
 
 TEST(NativeAdapterSourceTest, AConnectorThatDoesntTellIsAnOutputThatFails)

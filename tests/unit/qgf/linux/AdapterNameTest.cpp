@@ -135,38 +135,40 @@ TEST(AdapterNameTest, AnAdapterKeepsItsNameThroughTheRun)
     EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA Corporation GA102 [GeForce RTX 3090]");
 }
 
-TEST(AdapterNameTest, ANodesAdapterIsTheOneItBelongsTo)
+TEST(AdapterNameTest, OutsidePciTheDeviceTreeNames)
 {
-    const AdapterTree tree("server-bmc");
-    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "0000:02:00.0");
-    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card2"), "0000:81:00.0");
-    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/renderD128"), "0000:41:00.0");
+    const AdapterTree tree("soc-v3d");
+    EXPECT_THAT(DisplayAdapters(), ElementsAre("platform/gpu", "platform/v3dbus/fec00000.gpu"));
+    EXPECT_EQ(AdapterName("platform/gpu"), "brcm,bcm2711-vc5");
+    EXPECT_EQ(AdapterName("platform/v3dbus/fec00000.gpu"), "brcm,2711-v3d");
 }
 
-TEST(AdapterNameTest, AVirtualCardsNodeBelongsToThePciFunctionAboveIt)
+TEST(AdapterNameTest, ElseTheDriverDoes)
 {
-    const AdapterTree tree("virtio-gpu");
-    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "0000:00:02.0");
+    const AdapterTree tree("soc-v3d");
+    tree.remove("/sys/devices/platform/gpu/uevent");
+    EXPECT_EQ(AdapterName("platform/gpu"), "vc4-drm");
 }
 
-TEST(AdapterNameTest, WhatIsNoNodeHasNoAdapter)
+TEST(AdapterNameTest, EqualNamesOutsidePciAreNumbered)
 {
-    const AdapterTree tree("amd-discrete");
-    for (const char* file : {"", "/dev/dri/", "/dev/dri/card9", "/dev/dri/card", "/dev/dri/version",
-                             "/dev/dri/card0-DP-1", "/dev/dri/../../etc/passwd", "/dev/nvidia0"}) {
-        EXPECT_EQ(AdapterOfDrmNode(file), "") << file;
-    }
+    const AdapterTree tree("soc-v3d");
+    tree.write("/sys/devices/platform/gpu/uevent", "DRIVER=x\nOF_COMPATIBLE_0=brcm,2711-v3d\n");
+    EXPECT_EQ(AdapterName("platform/gpu"), "brcm,2711-v3d (1)");
+    EXPECT_EQ(AdapterName("platform/v3dbus/fec00000.gpu"), "brcm,2711-v3d (2)");
 }
 
-TEST(AdapterNameTest, NodesOutsidePciAreNoAdapters)
+TEST(AdapterNameTest, PciAdaptersComeFirst)
 {
-    const AdapterTree tree("empty");
-    std::filesystem::create_directories(tree.root() + "/sys/class/drm");
-    std::filesystem::create_symlink("../../devices/platform/vkms/drm/card0",
-                                    tree.root() + "/sys/class/drm/card0");
-    EXPECT_THAT(DrmNodes(), IsEmpty());
-    EXPECT_THAT(DisplayAdapters(), IsEmpty());
-    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "");
+    const AdapterTree tree("soc-beside-pci");
+    EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:01:00.0", "platform/ff9a0000.gpu"));
+}
+
+TEST(AdapterNameTest, AUsbDisplayIsAnAdapterButItsControllerIsNone)
+{
+    const AdapterTree tree("usb-display");
+    EXPECT_THAT(DisplayAdapters(),
+                ElementsAre("0000:00:02.0", "pci0000:00/0000:00:14.0/usb1/1-2/1-2:1.0"));
 }
 
 TEST(AdapterNameTest, AnNvidiaDeviceWithoutANodeIsTheDriversCard)
