@@ -4,11 +4,13 @@
 #include <string>
 
 #include "linux/DrmAdapters.h"
+#include "linux/DrmMemory.h"
 #include "linux/NvidiaVersion.h"
 #include "linux/SystemNumbers.h"
 #include "qgf/qgf_core/linux/NvidiaProc.h"
 #include "qgf/qgf_core/linux/PciAddress.h"
 #include "qgf/qgf_core/linux/PciIds.h"
+#include "qgf/qgf_core/linux/Uevent.h"
 
 namespace {
 
@@ -33,6 +35,16 @@ void CheckNames(const std::string& text)
     Require(model.empty() || (model.front() != ' ' && model.back() != ' '));
     const std::string address = QGF::LastPciAddress(text);
     Require(address.empty() || (QGF::IsPciAddress(address) && text.find(address) != text.npos));
+}
+
+void CheckMemory(const std::string& text)
+{
+    for (const char* driver : {"i915", "xe", "radeon", "nouveau", "amdgpu"}) {
+        // Each answer needs 16 bytes at least, and each of its figures has a place of its own.
+        Require(!pmutil::MemoryInAnswer(driver, text) || text.size() >= 16);
+    }
+    Require(pmutil::LargestPrefetchableBar(text) != 1);
+    Require(pmutil::LargestPrefetchableBar("0x0 0xfffffff 0x220c\n" + text) >= 0x10000000);
 }
 
 void CheckNumbers(const std::string& text)
@@ -62,6 +74,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     CheckNames(text);
     CheckNames("1002  A\n\t744c  " + text);
     CheckNames("Model: " + text);
+    CheckMemory(text);
+    Require(IsOneLine(QGF::UeventValue(text, "OF_COMPATIBLE_0")));
     CheckNumbers(text);
     CheckNumbers("MemTotal: " + text);
     for (const std::string& version : {text, "NVRM version: 1.2 " + text}) {

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <cstdlib>
 #include <fstream>
+#include <iterator>
 #include <string>
 #include <vector>
 
@@ -20,30 +21,6 @@ void Require(bool holds)
     }
 }
 
-// Cuts the input into the contents of the files: each of them keeps its own where its first byte is
-// even, so that most of the machine stays sound.
-void Spread(const AdapterTree& tree, const std::vector<std::string>& originals,
-            const std::uint8_t* data, std::size_t size)
-{
-    static const std::vector<std::string> files = tree.files();
-    static std::vector<std::string> current = originals;
-    std::size_t at = 0;
-    for (std::size_t i = 0; i != files.size(); ++i) {
-        std::string text = originals[i];
-        if (at < size && data[at++] % 2 != 0) {
-            const std::size_t wanted = at < size ? data[at++] : 0;
-            const std::size_t length = std::min(wanted, size - at);
-            text.assign(data + at, data + at + length);
-            at += length;
-        }
-        if (text != current[i]) {
-            std::ofstream(files[i], std::ios::binary | std::ios::trunc) << text;
-            current[i] = text;
-        }
-    }
-    tree.refresh();
-}
-
 std::vector<std::string> ReadAll(const std::vector<std::string>& files)
 {
     std::vector<std::string> texts;
@@ -54,19 +31,58 @@ std::vector<std::string> ReadAll(const std::vector<std::string>& files)
     return texts;
 }
 
+// A machine's files: what they held at first, and what they hold now.
+struct Machine {
+    explicit Machine(const std::string& name)
+        : tree(name), files(tree.files()), originals(ReadAll(files)), current(originals)
+    {}
+
+    const AdapterTree tree;
+    const std::vector<std::string> files;
+    const std::vector<std::string> originals;
+    std::vector<std::string> current;
+};
+
+// Cuts the input into the contents of the files: each of them keeps its own where its first byte is
+// even, so that most of the machine stays sound.
+void Spread(Machine& machine, const std::uint8_t* data, std::size_t size)
+{
+    const std::vector<std::string>& files = machine.files;
+    std::size_t at = 0;
+    for (std::size_t i = 0; i != files.size(); ++i) {
+        std::string text = machine.originals[i];
+        if (at < size && data[at++] % 2 != 0) {
+            const std::size_t wanted = at < size ? data[at++] : 0;
+            const std::size_t length = std::min(wanted, size - at);
+            text.assign(data + at, data + at + length);
+            at += length;
+        }
+        if (text != machine.current[i]) {
+            std::ofstream(files[i], std::ios::binary | std::ios::trunc) << text;
+            machine.current[i] = text;
+        }
+    }
+    machine.tree.refresh();
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size)
 {
-    static const AdapterTree gTree("hybrid-laptop");
-    static const std::vector<std::string> gOriginals = ReadAll(gTree.files());
-    Spread(gTree, gOriginals, data, size);
+    // One with a sleeping card, and those with answers on nodes or devices outside PCI.
+    static Machine gMachines[] = {Machine("hybrid-laptop"),   Machine("intel-arc-asleep"),
+                                  Machine("intel-two-tiles"), Machine("radeon"),
+                                  Machine("nouveau"),         Machine("soc-beside-pci")};
+    if (size == 0) {
+        return 0;
+    }
+    Spread(gMachines[data[0] % std::size(gMachines)], data + 1, size - 1);
 
     pmutil::ContextsByDeviceString contexts;
-    for (const std::string& address : QGF::DisplayAdapters()) {
-        const std::string name = QGF::AdapterName(address);
+    for (const std::string& place : QGF::DisplayAdapters()) {
+        const std::string name = QGF::AdapterName(place);
         Require(!name.empty() && name.size() <= 127);
         Require(contexts.emplace(name, pmutil::DeviceContext()).second);
     }
