@@ -43,6 +43,17 @@ def test_machine(host, tmp_path, name):
     assert_devices(run, trees.expected(name))
 
 
+@pytest.mark.parametrize("framebuffer_first", [True, False])
+def test_the_firmwares_framebuffer_is_not_the_cards_driver(host, tmp_path, framebuffer_first):
+    """EGL lists both; the context is the NVIDIA driver's."""
+    root = trees.unpack("nvidia-firmware", tmp_path / "root")
+    devices = [device_on("card0") + 'string GL_RENDERER "software"\n' + NO_MEMORY_QUERY,
+               NVIDIA_WITHOUT_NODE + 'string GL_RENDERER "hardware"\n' + NO_MEMORY_QUERY]
+    run = host.run(script="".join(devices if framebuffer_first else reversed(devices)), root=root)
+    assert_devices(run, trees.expected("nvidia-firmware"))
+    assert run.facts["glgpu[0].GLRenderer"] == '"hardware"'
+
+
 def test_two_devices_of_a_machine_with_more(host, tmp_path):
     """The third adapter has no context and is left out."""
     root = trees.unpack("server-bmc", tmp_path / "root")

@@ -31,6 +31,10 @@ std::vector<DrmNode> DrmNodes();
 // knows no such node or it belongs to no adapter.
 std::string AdapterOfDrmNode(const std::string& file);
 
+// Whether such a file is that of a framebuffer that the firmware has set up. What renders there is
+// software, on the card's picture.
+bool IsFirmwareNode(const std::string& file);
+
 // The folder in which the kernel describes the adapter at that place, with a slash at the end.
 std::string AdapterFolder(const std::string& place);
 

@@ -68,6 +68,16 @@ TEST(DrmNodesTest, OnPciTheFunctionIsTheAdapter)
                                       "card2 0000:00:03.0 firmware"));
 }
 
+TEST(DrmNodesTest, AFirmwareFramebuffersNodeIsKnown)
+{
+    const AdapterTree tree("nvidia-firmware-drm");
+    EXPECT_TRUE(IsFirmwareNode("/dev/dri/card0"));
+    EXPECT_FALSE(IsFirmwareNode("/dev/dri/card1"));
+    EXPECT_FALSE(IsFirmwareNode("/dev/dri/card2"));
+    EXPECT_FALSE(IsFirmwareNode(""));
+    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), AdapterOfDrmNode("/dev/dri/card1"));
+}
+
 TEST(DrmNodesTest, OtherDevicesBelowOneAreAdaptersThemselves)
 {
     const AdapterTree tree("empty");

@@ -244,6 +244,7 @@ std::string AddressOfNode(const std::string& node)
 {
     const std::map<std::string, std::string> addresses = {{"/dev/dri/card0", "0000:01:00.0"},
                                                           {"/dev/dri/card1", "0000:02:00.0"},
+                                                          {"/dev/dri/card3", "0000:02:00.0"},
                                                           {"/dev/dri/renderD128", "0000:01:00.0"}};
     const auto found = addresses.find(node);
     return found != addresses.end() ? found->second : "";
@@ -257,6 +258,11 @@ std::vector<std::string> AddressesOfNvidia(const std::vector<std::string>& names
     for (const std::string& name : names)
         addresses.push_back(name == "Card 2" && taken.empty() ? "0000:02:00.0" : "");
     return addresses;
+}
+
+bool IsFirmwareNode(const std::string& node)
+{
+    return node == "/dev/dri/card3";
 }
 
 std::string NameOfAddress(const std::string& address)
@@ -280,7 +286,8 @@ protected:
             EGLTable table;
             FillEGLTable(table, GetProc, nullptr);
             fPlatform = std::make_unique<EGLPlatform>(
-                table, EGLPlatform::AdapterLookup{AddressOfNode, AddressesOfNvidia, NameOfAddress});
+                table, EGLPlatform::AdapterLookup{AddressOfNode, AddressesOfNvidia, NameOfAddress,
+                                                  IsFirmwareNode});
         }
         return *fPlatform;
     }
@@ -400,6 +407,25 @@ TEST_F(EGLPlatformTest, TakenAddressesAreTold)
         WithNode("/dev/dri/card1")};
     EXPECT_THAT(devices(),
                 ElementsAre("egl:0|egl:0|", "/dev/dri/card1|Second Adapter|0000:02:00.0"));
+}
+
+TEST_F(EGLPlatformTest, AnAdaptersDriverComesBeforeTheFirmwaresFramebuffer)
+{
+    script.devices = {WithNode("/dev/dri/card3"), WithNode("/dev/dri/card1"),
+                      WithNode("/dev/dri/card0")};
+    EXPECT_THAT(devices(), ElementsAre("/dev/dri/card1|Second Adapter|0000:02:00.0",
+                                       "/dev/dri/card0|First Adapter|0000:01:00.0"));
+    EXPECT_NE(create("/dev/dri/card1"), nullptr);
+    EXPECT_THAT(script.calls, Contains("eglInitialize 2"));
+    EXPECT_THAT(script.calls, Not(Contains("eglInitialize 1")));
+}
+
+TEST_F(EGLPlatformTest, TheFirmwaresFramebufferTakesNoCardFromItsDriver)
+{
+    script.devices = {
+        WithNode("/dev/dri/card3"),
+        {"EGL_NV_device_cuda EGL_EXT_device_query_name", {{EGL_RENDERER_EXT, "Card 2"}}}};
+    EXPECT_THAT(devices(), ElementsAre("egl:1|Second Adapter|0000:02:00.0"));
 }
 
 TEST_F(EGLPlatformTest, TwoDriversOfOneAdapterAreOneDevice)

@@ -98,6 +98,12 @@ std::string AdapterOfDrmNode(const std::string& file)
     return IsDrmNode(name) ? Locate(name).place : std::string();
 }
 
+bool IsFirmwareNode(const std::string& file)
+{
+    const std::string name = LastOfPath(file);
+    return IsDrmNode(name) && Locate(name).firmware;
+}
+
 std::string AdapterFolder(const std::string& place)
 {
     return (IsPciAddress(place) ? "/sys/bus/pci/devices/" : kDevices) + place + "/";

@@ -204,7 +204,8 @@ EGLPlatform::EGLDevice EGLPlatform::DescribeEGLDevice(EGLDeviceEXT handle, int p
                      HasWord(extensions, "EGL_NV_device_cuda"),
                      "",
                      "",
-                     ""};
+                     "",
+                     false};
     // A software renderer may borrow the node of an adapter, but it isn't that adapter.
     if (device.software)
         return device;
@@ -212,8 +213,10 @@ EGLPlatform::EGLDevice EGLPlatform::DescribeEGLDevice(EGLDeviceEXT handle, int p
         device.node = QueryDeviceString(handle, EGL_DRM_DEVICE_FILE_EXT);
     if (device.node.empty() && HasWord(extensions, "EGL_EXT_device_drm_render_node"))
         device.node = QueryDeviceString(handle, EGL_DRM_RENDER_NODE_FILE_EXT);
-    if (!device.node.empty())
+    if (!device.node.empty()) {
         device.address = fLookup.addressOfNode(device.node);
+        device.firmware = fLookup.isFirmwareNode(device.node);
+    }
     if (device.address.empty() && device.nvidia && HasWord(extensions, "EGL_EXT_device_query_name"))
         device.renderer = QueryDeviceString(handle, EGL_RENDERER_EXT);
     return device;
@@ -225,7 +228,7 @@ void EGLPlatform::FindNvidiaAddresses(std::vector<EGLDevice>& devices) const
     std::vector<std::string> names;
     std::vector<std::string> taken;
     for (EGLDevice& device : devices) {
-        if (!device.address.empty())
+        if (!device.address.empty() && !device.firmware)
             taken.push_back(device.address);
         if (device.address.empty() && device.nvidia && device.node.empty()) {
             unknown.push_back(&device);
@@ -243,8 +246,14 @@ void EGLPlatform::FindEGLDevices()
 {
     std::vector<EGLDevice> devices = ListEGLDevices();
     FindNvidiaAddresses(devices);
-    std::stable_partition(devices.begin(), devices.end(),
-                          [](const EGLDevice& device) { return !device.software; });
+    // Where the firmware's framebuffer is another way to an adapter, the adapter's driver comes
+    // first.
+    const auto rank = [](const EGLDevice& device) {
+        return device.software ? 2 : device.firmware ? 1 : 0;
+    };
+    std::stable_sort(
+        devices.begin(), devices.end(),
+        [&](const EGLDevice& left, const EGLDevice& right) { return rank(left) < rank(right); });
     for (const EGLDevice& device : devices)
         AddEGLDevice(device);
 }
@@ -395,7 +404,8 @@ std::unique_ptr<Platform> MakeNativePlatform()
         },
         library);
     return std::make_unique<EGLPlatform>(
-        egl, EGLPlatform::AdapterLookup{AdapterOfDrmNode, NvidiaAdapters, AdapterName});
+        egl,
+        EGLPlatform::AdapterLookup{AdapterOfDrmNode, NvidiaAdapters, AdapterName, IsFirmwareNode});
 }
 
 } // namespace OGL

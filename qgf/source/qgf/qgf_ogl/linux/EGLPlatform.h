@@ -29,6 +29,9 @@ public:
                                                       const std::vector<std::string>& taken);
         // The adapter's name by its place; "" if unknown.
         std::string (*nameOfAddress)(const std::string& address);
+        // Whether a DRM node is the firmware's framebuffer on an adapter, which no driver of the
+        // adapter renders to.
+        bool (*isFirmwareNode)(const std::string& node);
     };
 
     EGLPlatform(const EGLTable& egl, const AdapterLookup& lookup) : fEGL(egl), fLookup(lookup) {}
@@ -66,6 +69,7 @@ private:
         std::string node;     // "" if it has none
         std::string renderer; // "" if it doesn't say
         std::string address;  // the adapter's place; "" if unknown
+        bool firmware;        // it renders to the firmware's framebuffer
     };
 
     void FindDevices();
