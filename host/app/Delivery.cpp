@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "report/RunOutcome.h"
+#include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
 
 namespace assay_host {
@@ -16,6 +17,7 @@ constexpr std::chrono::milliseconds kPatience{1000};
 [[noreturn]] void GiveUp(WriterThread& writer)
 {
     writer.Abandon();
+    EndUnguarded();
     EndProcess(GetVerdictStatus(Verdict::kInterrupted));
 }
 
@@ -24,6 +26,11 @@ constexpr std::chrono::milliseconds kPatience{1000};
 Delivery::Delivery(std::shared_ptr<WriterThread> writer) : fWriter(std::move(writer))
 {
     fInterrupts = SetInterruptEnd([shared = fWriter] { GiveUp(*shared); });
+}
+
+Delivery::~Delivery()
+{
+    EndUnguarded();
 }
 
 void Delivery::Finish() const

@@ -11,6 +11,9 @@ namespace assay_host {
 class Delivery {
 public:
     explicit Delivery(std::shared_ptr<WriterThread> writer);
+    ~Delivery();
+    Delivery(const Delivery&) = delete;
+    Delivery& operator=(const Delivery&) = delete;
 
     // Waits for the readers, however slow they are, and finishes the output. After an interrupt it
     // waits only while they read, after more than one not at all, and ends the process if they

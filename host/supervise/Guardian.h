@@ -3,13 +3,15 @@
 
 namespace assay_host {
 
-// From now on whatever this process starts ends with it, however its own end comes: nothing that
-// ends it by force leaves more than a second's work behind. Called once in a process, at its start,
-// before there are threads.
+// From now on whatever this process starts ends with it, however its own end comes. Called once in
+// a process, at its start, before there are threads.
 //
 // On Linux the process that the user started stays as the guardian and doesn't come back from this
 // call: it waits, passes signals on, and ends as its worker does, once all is ended. The worker, a
 // copy of it in a process group of its own, returns. On Windows a job does it.
 void GuardProcess();
+
+// Before this process ends: where the guardian has ended already, ends what is still left.
+void EndUnguarded();
 
 } // namespace assay_host

@@ -14,7 +14,12 @@ namespace assay_host {
 
 namespace {
 
-constexpr double kTreeSeconds = 0.9;
+// After a worker that came to its own end, which has tried before.
+constexpr double kRestSeconds = 0.2;
+
+// After a sudden end. Mostly it takes some milliseconds, but a busy machine has time of its own,
+// and nobody comes after this.
+constexpr double kLastSeconds = 10;
 
 // Shells tell the end by a signal like this.
 constexpr int kSignalStatus = 128;
@@ -29,6 +34,9 @@ int GetDeathSignal()
 }
 
 ::pid_t gGuardian = 0;
+
+// All that the worker starts, whichever run it belongs to. Never deleted.
+ProcessTree* gStarted = nullptr;
 
 // Waits for its worker, and ends as it did.
 class Guardian {
@@ -50,7 +58,7 @@ public:
                 ::kill(fWorker, number); // a number that is its own until it is waited for
             }
         }
-        fTree.EndAll(kTreeSeconds);
+        fTree.EndAll(end.si_code == CLD_EXITED ? kRestSeconds : kLastSeconds);
         if (end.si_code != CLD_EXITED)
             EndBy(end.si_status);
         EndProcess(end.si_status);
@@ -71,7 +79,7 @@ private:
         sigset_t only;
         ::sigemptyset(&only);
         ::sigaddset(&only, number);
-        ::sigprocmask(SIG_UNBLOCK, &only, nullptr);
+        ::pthread_sigmask(SIG_UNBLOCK, &only, nullptr);
         ::kill(::getpid(), number);
         EndProcess(kSignalStatus + number);
     }
@@ -104,6 +112,7 @@ void BecomeWorker()
     ::prctl(PR_SET_PDEATHSIG, GetDeathSignal(), 0, 0, 0);
     if (!IsGuarded())
         EndProcess(kSignalStatus + SIGKILL); // it ended before this, and nothing is started yet
+    gStarted = new ProcessTree;
 }
 
 } // namespace
@@ -113,11 +122,17 @@ bool IsGuarded()
     return gGuardian == 0 || ::getppid() == gGuardian;
 }
 
+void EndUnguarded()
+{
+    if (gStarted != nullptr && !IsGuarded())
+        gStarted->EndAll(kLastSeconds);
+}
+
 void GuardProcess()
 {
     const sigset_t awaited = GetGuardianSignals();
     sigset_t before;
-    ::sigprocmask(SIG_SETMASK, &awaited, &before);
+    ::pthread_sigmask(SIG_SETMASK, &awaited, &before);
     ProcessTree tree;
     gGuardian = ::getpid();
     const ::pid_t worker = ::fork();
@@ -131,7 +146,7 @@ void GuardProcess()
     }
     // Where nothing more can be started, nothing is to be guarded.
     gGuardian = 0;
-    ::sigprocmask(SIG_SETMASK, &before, nullptr);
+    ::pthread_sigmask(SIG_SETMASK, &before, nullptr);
 }
 
 } // namespace assay_host
