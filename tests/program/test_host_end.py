@@ -257,13 +257,12 @@ def test_torture_is_interrupted(scene):
 
 def test_suspended_and_continued():
     """As by Ctrl-Z and fg: the whole run stands still, and goes on."""
-    with Watched("run", "--assay", CHILD, "--", "sleep", "400", "out", 'assayStart="x"', "out",
+    with Watched("run", "--assay", CHILD, "--", "sleep", "2000", "out", 'assayStart="x"', "out",
                  'assayEnd="y"') as watched:
         until(lambda: children_of(watched), "no child")
-        worker = watched.worker()
+        everybody = [watched.process.pid, watched.worker(), *children_of(watched)]
         watched.process.send_signal(signal.SIGTSTP)
-        until(lambda: state_of(watched.process.pid) == "T" and state_of(worker) == "T", "not stopped")
-        assert all(state_of(child) == "T" for child in children_of(watched))
+        until(lambda: all(state_of(each) == "T" for each in everybody), "not stopped")
         watched.process.send_signal(signal.SIGCONT)
         assert watched.finish().status == 0
 
