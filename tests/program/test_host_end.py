@@ -259,7 +259,7 @@ def test_suspended_and_continued():
     """As by Ctrl-Z and fg: the whole run stands still, and goes on."""
     with Watched("run", "--assay", CHILD, "--", "sleep", "2000", "out", 'assayStart="x"', "out",
                  'assayEnd="y"') as watched:
-        until(lambda: children_of(watched), "no child")
+        until(lambda: watched.worker() and children_of(watched), "no child")
         everybody = [watched.process.pid, watched.worker(), *children_of(watched)]
         watched.process.send_signal(signal.SIGTSTP)
         until(lambda: all(state_of(each) == "T" for each in everybody), "not stopped")
