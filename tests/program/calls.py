@@ -93,7 +93,8 @@ class FullMachine:
         """A host for one run, and what it finds: the machine with these lines in front of its
         scripts' own."""
         surface = 'display-string EGL_EXTENSIONS ""\n'
-        scripts = {"gl": self.gpu.script() + surface + gl_lines, "cl": cl_script_of(self.opencl) + cl_lines}
+        scripts = {"gl": self.gpu.script() + surface + gl_lines,
+                   "cl": cl_script_of(self.opencl) + cl_lines}
         files = {}
         for kind, text in scripts.items():
             files[kind] = self.folder / f"{kind}-{name}"

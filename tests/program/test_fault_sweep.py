@@ -62,7 +62,7 @@ def table():
 
 
 def values(lines):
-    return [tuple(line.split("=", 1)) for line in lines if "=" in line and line[0] != "#"]
+    return [tuple(line.split("=", 1)) for line in lines if "=" in line and not line.startswith("#")]
 
 
 def form(value):
@@ -76,7 +76,7 @@ def is_part(part, whole):
     return all(each in rest for each in part)
 
 
-def check_end(sweep, table, pair, run):
+def check_end(table, pair, run):
     """A run that the fault ended."""
     ends = pair.fault.ends
     if ends == "_exit":
@@ -152,7 +152,7 @@ def run_pair(sweep, table, pair):
     try:
         bare = sweep.bare(pair)
         if pair.fault.ends is not None:
-            check_end(sweep, table, pair, bare)
+            check_end(table, pair, bare)
         elif pair.by_loader and ended_by(bare, "SIGSEGV", "SIGABRT"):
             assert normal(without_calls(bare.lines)) == pair.before
         else:
@@ -167,7 +167,8 @@ def run_pair(sweep, table, pair):
 def test_the_undisturbed_run(sweep):
     """What all others are compared with is what such a machine must report."""
     machine = sweep.machine
-    check(Run(0, "".join(f"{line}\n" for line in sweep.whole if line[0] != "#").encode(), b""),
+    report = "".join(f"{line}\n" for line in sweep.whole if not line.startswith("#"))
+    check(Run(0, report.encode(), b""),
           predict([machine.gpu], opencl=cl_values_of(machine.opencl)))
 
 
