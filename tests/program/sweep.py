@@ -93,8 +93,9 @@ class Sweep:
                                         cl_lines=record["cl"] + cl_lines)
         environment = host.environment(**found)
         if pair.by_loader:
-            # An exception that passes the loader leaves it no chance to close its directory.
-            environment["ASAN_OPTIONS"] += ":detect_leaks=0"
+            # An exception that passes the loader leaves it no chance to close its directory, and it
+            # asks for as much memory as the driver claims that it needs.
+            environment["ASAN_OPTIONS"] += ":detect_leaks=0:allocator_may_return_null=1"
         return Watched(*arguments, program=program, environment=environment, stdout=out, stderr=err)
 
     def _wait_until_called(self, pair, record, process):
