@@ -1,10 +1,11 @@
 #include "supervise/Judge.h"
 
 #include <algorithm>
-#include <cstdint>
-#include <cstdlib>
 
 #include <fmt/format.h>
+
+#include "pmutil/Options.h"
+#include "supervise/ExitStatus.h"
 
 namespace assay_host {
 
@@ -35,13 +36,12 @@ std::string FindErrorLine(const RunOutcome& outcome, bool (*matches)(const std::
     return line == outcome.fErrorLines.end() ? std::string() : *line;
 }
 
-// The status that the system makes of the one asked for, or the code where it is too large to be
-// told from a crash.
-bool IsAskedFor(const Evidence& evidence, int asked)
+// A status that is too large to be told from a crash is known by its code.
+bool IsAskedFor(const Evidence& evidence, std::int64_t asked)
 {
     if (evidence.fEnd->fResult == pmutil::kEndedNormally)
-        return evidence.fEnd->fExitCode == (asked & 0xFF);
-    return evidence.fTermination == fmt::format("code 0x{:08X}", static_cast<std::uint32_t>(asked));
+        return evidence.fEnd->fExitCode == asked;
+    return evidence.fTermination == fmt::format("code 0x{:08X}", asked);
 }
 
 // Behind which line, and in which question.
@@ -79,10 +79,10 @@ bool IsComplete(const Evidence& evidence, const RunOutcome& outcome)
     if (!evidence.fReport.IsWhole())
         return false;
     const std::vector<std::string> options(outcome.fCommand.begin() + 1, outcome.fCommand.end());
-    const int asked = GetAskedStatus(options);
+    const std::int64_t asked = GetReportedStatus(GetAskedStatus(options));
     if (!IsAskedFor(evidence, asked))
         return false;
-    return (asked & 0xFF) != kFailedStatus || FindErrorLine(outcome, TellsFailure).empty();
+    return asked != kFailedStatus || FindErrorLine(outcome, TellsFailure).empty();
 }
 
 } // namespace
@@ -141,17 +141,13 @@ void Judge(const Evidence& evidence, RunOutcome& outcome)
     }
 }
 
-int GetAskedStatus(const std::vector<std::string>& options)
+std::int32_t GetAskedStatus(const std::vector<std::string>& options)
 {
-    constexpr char kExit[] = "-exit=";
-    int status = 0;
-    for (const std::string& option : options) {
-        if (!StartsWith(option, kExit))
-            continue;
-        std::string value = option.substr(sizeof kExit - 1);
-        if (value.size() >= 2 && value.front() == '"' && value.back() == '"')
-            value = value.substr(1, value.size() - 2);
-        status = static_cast<int>(std::strtol(value.c_str(), nullptr, 0));
+    std::int32_t status = 0;
+    for (const std::string& word : options) {
+        const std::optional<pmutil::Option> option = pmutil::SplitOption(word);
+        if (option && option->fName == "exit")
+            status = pmutil::ParseInteger(option->fValue);
     }
     return status;
 }

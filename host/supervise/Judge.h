@@ -1,6 +1,7 @@
 // The verdict on a run, from what was seen of it.
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <vector>
@@ -49,7 +50,7 @@ struct Evidence {
 // options and the error lines from the outcome.
 void Judge(const Evidence& evidence, RunOutcome& outcome);
 
-// The exit status that the options ask for with -exit=; the last one counts.
-int GetAskedStatus(const std::vector<std::string>& options);
+// What the options make the child's main return with -exit=; the last one counts.
+std::int32_t GetAskedStatus(const std::vector<std::string>& options);
 
 } // namespace assay_host

@@ -16,6 +16,7 @@ from harness import PROGRAM, PROGRAM_AT_ROOT, STAMP, text_of
 from hosting import (GRACE, HOST, SLACK, TROUBLE, Watched, decode, host_run, read_to_the_end,
                      report_bytes, run_assay, texts)
 from model import KEYS, Gpu, predict
+from test_command_line import STATUSES as EXITS
 from test_opencl import Machine
 
 FORMATS = ["text", "json", "jsonl"]
@@ -42,9 +43,9 @@ def test_complete(host):
     assert run.err == b""
 
 
-@pytest.mark.parametrize("status", [7, 2, 3, 255])
-def test_complete_with_the_status_asked_for(host, status):
-    run = run_assay(host, "--format", "json", child=[f"-exit={status}"], machine=scripted())
+@pytest.mark.parametrize("value, status", [("2", 2), ("3", 3), *EXITS])
+def test_complete_with_the_status_asked_for(host, value, status):
+    run = run_assay(host, "--format", "json", child=[f"-exit={value}"], machine=scripted())
     document = run.document()
     assert document["outcome"]["verdict"] == "complete"
     assert document["outcome"]["exitStatus"] == status

@@ -1,9 +1,13 @@
 #include "supervise/Judge.h"
 
+#include <cstdio>
+#include <limits>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include "Reports.h"
+#include "supervise/ExitStatus.h"
 
 namespace assay_host {
 namespace {
@@ -49,7 +53,7 @@ TEST(Judge, CallsAWholeReportWithTheStatusAskedForComplete)
 {
     EXPECT_EQ((Case{kWhole, {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kComplete);
     EXPECT_EQ((Case{kWhole, {}, {"-exit=7"}, Ended(7)}.Judge().fVerdict), Verdict::kComplete);
-    EXPECT_EQ((Case{kWhole, {}, {"-exit=0x107"}, Ended(7)}.Judge().fVerdict), Verdict::kComplete);
+    EXPECT_EQ((Case{kWhole, {}, {"-exit=0x7"}, Ended(7)}.Judge().fVerdict), Verdict::kComplete);
     EXPECT_EQ((Case{kWhole, {}, {"-exit=7", "-exit=\"3\""}, Ended(3)}.Judge().fVerdict),
               Verdict::kComplete);
     EXPECT_EQ((Case{kWhole, {"a driver's words"}, {"-exit=2"}, Ended(2)}.Judge().fVerdict),
@@ -59,7 +63,9 @@ TEST(Judge, CallsAWholeReportWithTheStatusAskedForComplete)
 TEST(Judge, KnowsALargeStatusThatWasAskedFor)
 {
     Case large{kWhole, {}, {"-exit=300"}, ChildEnd{pmutil::kEndedByCrash, 0}};
-    large.fTermination = "code 0x0000012C";
+    char code[sizeof "code 0x00000000"];
+    std::snprintf(code, sizeof code, "code 0x%08X", static_cast<unsigned>(GetReportedStatus(300)));
+    large.fTermination = code;
     EXPECT_EQ(large.Judge().fVerdict, Verdict::kComplete);
     large.fTermination = "code 0xC0000005";
     EXPECT_EQ(large.Judge().fVerdict, Verdict::kCrashed);
@@ -142,6 +148,14 @@ TEST(GetAskedStatus, ReadsAsTheChildDoes)
     EXPECT_EQ(GetAskedStatus({"-exit=7x"}), 7);
     EXPECT_EQ(GetAskedStatus({"-exit="}), 0);
     EXPECT_EQ(GetAskedStatus({"exit=7", "-exit"}), 0);
+    EXPECT_EQ(GetAskedStatus({"-exit=7", "-exitt=8", "-Exit=9"}), 7);
+    EXPECT_EQ(GetAskedStatus({"-exit=\"9\""}), 9);
+    using Limits = std::numeric_limits<std::int32_t>;
+    for (const char* text :
+         {"2147483648", "4294967296", "99999999999", "0x100000000", "99999999999999999999999"})
+        EXPECT_EQ(GetAskedStatus({std::string("-exit=") + text}), Limits::max()) << text;
+    for (const char* text : {"-2147483649", "-4294967296", "-99999999999999999999999"})
+        EXPECT_EQ(GetAskedStatus({std::string("-exit=") + text}), Limits::min()) << text;
 }
 
 } // namespace

@@ -1,9 +1,8 @@
 // The application's options.
-#include <algorithm>
-#include <cstdlib>
-#include <limits>
+#include <optional>
 
 #include "GPUAssayApp.h"
+#include "pmutil/Options.h"
 
 namespace assay {
 
@@ -43,21 +42,11 @@ void GPUAssayApp::ParseArguments(Arguments& arguments)
 
 bool GPUAssayApp::ParseArgument(const std::string& argument, Arguments& /*rest*/)
 {
-    if (argument.empty() || argument.front() != '-')
-        return false;
-    std::string name = argument.substr(1);
-    const std::size_t equals = name.find('=');
-    if (equals == std::string::npos) {
-        static const std::string kHelp = "help";
-        if (name == kHelp)
-            throw UsageException();
-        return false;
-    }
-    std::string value = name.substr(equals + 1);
-    name.erase(equals);
-    if (value.size() >= 2 && value.front() == '"' && value.back() == '"')
-        value = value.substr(1, value.size() - 2);
-    return ParseOption(name, value);
+    static const std::string kHelp = "-help";
+    if (argument == kHelp)
+        throw UsageException();
+    const std::optional<pmutil::Option> option = pmutil::SplitOption(argument);
+    return option && ParseOption(option->fName, option->fValue);
 }
 
 bool GPUAssayApp::ParseOption(const std::string& name, const std::string& value)
@@ -92,15 +81,7 @@ bool GPUAssayApp::ParseOption(const std::string& name, const std::string& value)
 
 std::int32_t GPUAssayApp::ParseInteger(const std::string& text)
 {
-    // Read in 64 bits and clamped, so that the result doesn't depend on the width of a long here.
-    char* end = nullptr;
-    const long long value = std::strtoll(text.c_str(), &end, 0);
-    if (end != nullptr) {
-        using Limits = std::numeric_limits<std::int32_t>;
-        return static_cast<std::int32_t>(
-            std::clamp<long long>(value, Limits::min(), Limits::max()));
-    }
-    throw std::runtime_error("bad integer: \"" + text + '"');
+    return pmutil::ParseInteger(text);
 }
 
 } // namespace assay

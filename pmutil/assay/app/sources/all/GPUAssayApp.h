@@ -74,8 +74,7 @@ public:
     void SetAppName(const std::string& name) { fAppName = name; }
     const std::string& GetUsageName() const { return fUsageName; }
 
-    // The number at the start of the text, in C's notation: decimal, "0x" hexadecimal or "0" octal.
-    // Clamped to 32 bits; 0 if there is none.
+    // pmutil::ParseInteger, with which all numbers among the options are read.
     static std::int32_t ParseInteger(const std::string& text);
 
     // Starts and ends what a run needs. Term isn't called after a failure.

@@ -1,0 +1,11 @@
+#include "supervise/ExitStatus.h"
+
+namespace assay_host {
+
+// The low byte.
+std::int64_t GetReportedStatus(std::int32_t returned)
+{
+    return returned & 0xFF;
+}
+
+} // namespace assay_host

@@ -1,0 +1,11 @@
+#include "supervise/ExitStatus.h"
+
+namespace assay_host {
+
+// All of it, as an unsigned number.
+std::int64_t GetReportedStatus(std::int32_t returned)
+{
+    return static_cast<std::uint32_t>(returned);
+}
+
+} // namespace assay_host
