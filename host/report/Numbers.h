@@ -9,10 +9,11 @@
 
 namespace assay_host {
 
-using Number = std::variant<std::int64_t, std::uint64_t, double>;
+using Number = std::variant<std::int64_t, double>;
 
-// The whole text as a number: an integer where one holds it, else floating point; nothing if the
-// text is anything else, or not finite.
+// The whole text as a number that each reader of JSON keeps as it is: an integer up to 2^53 either
+// way, or a fraction or a power of ten of which floating point loses no digit. Nothing if the text
+// is anything else.
 std::optional<Number> ReadNumber(std::string_view text);
 
 // "[8, 4]" as numbers; nothing if the text has another form, or holds something else.
