@@ -71,7 +71,8 @@ public:
 private:
     void CollectDevices(DeviceKind kind);
     DeviceAnswers CollectDevice(DeviceKind kind, std::uint32_t index, const Device* device);
-    void JudgeMissing(DeviceAnswers& device, const std::optional<Position>& last) const;
+    static void JudgeMissing(DeviceAnswers& device, const std::optional<Position>& last,
+                             bool isBehind);
     void CollectReportKeys();
     Missing JudgeMissingReportKey(std::size_t key) const;
 
@@ -100,7 +101,7 @@ bool Collector::IsBehind(DeviceKind kind) const
 {
     const bool behindOpenGL = kind == DeviceKind::kOpenGL &&
                               (fReport.Find("NumCLGPUs") || HasDevice(DeviceKind::kOpenCL));
-    return behindOpenGL || fReport.Find("assayEnd");
+    return behindOpenGL || fReport.HasEnd();
 }
 
 void Collector::CollectDevices(DeviceKind kind)
@@ -134,8 +135,10 @@ void Collector::CollectDevices(DeviceKind kind)
                 last = position;
         }
     }
+    const bool isBehind = IsBehind(kind);
     for (DeviceAnswers& device : found) {
-        JudgeMissing(device, last);
+        device.fFailed = fTerminated.count(device.fTag) > 0;
+        JudgeMissing(device, last, isBehind);
         fAnswers.fDevices.push_back(std::move(device));
     }
 }
@@ -160,10 +163,9 @@ DeviceAnswers Collector::CollectDevice(DeviceKind kind, std::uint32_t index, con
     return answers;
 }
 
-void Collector::JudgeMissing(DeviceAnswers& device, const std::optional<Position>& last) const
+void Collector::JudgeMissing(DeviceAnswers& device, const std::optional<Position>& last,
+                             bool isBehind)
 {
-    const bool isBehind = IsBehind(device.fKind);
-    device.fFailed = fTerminated.count(device.fTag) > 0;
     const std::size_t keys = GetDeviceKeys(device.fKind).size();
     std::size_t answered = 0; // behind the last key that is there
     for (std::size_t key = 0; key < keys; ++key) {
@@ -215,7 +217,7 @@ Missing Collector::JudgeMissingReportKey(std::size_t key) const
         HasDevice(DeviceKind::kOpenCL) || (!isOpenCL && HasDevice(DeviceKind::kOpenGL));
     if (name != "assayEnd" && hasDevice)
         return Missing::kUnreadable;
-    if (isOpenCL && fReport.Find("assayEnd"))
+    if (isOpenCL && fReport.HasEnd())
         return Missing::kNoOpenCL;
     for (std::size_t later = key + 1; later < keys.size(); ++later) {
         if (fReport.Find(keys[later]))
@@ -226,7 +228,7 @@ Missing Collector::JudgeMissingReportKey(std::size_t key) const
 
 std::string Collector::FindNext() const
 {
-    if (fReport.Find("assayEnd"))
+    if (fReport.HasEnd())
         return {};
     const Table<const char*> keys = GetReportKeys();
     const std::vector<ReportLine>& lines = fReport.GetLines();

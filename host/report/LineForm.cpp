@@ -77,6 +77,11 @@ ReportLine ReadLine(std::string text, std::string lineEnd, bool cut)
     return line;
 }
 
+bool IsWholeValue(const ReportLine& line)
+{
+    return line.fKind == LineKind::kValue && !line.fCut && !line.fLineEnd.empty();
+}
+
 bool LeavesQuoteOpen(std::string_view text)
 {
     if (StartsWith(text, "#"))

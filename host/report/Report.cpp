@@ -6,6 +6,15 @@
 
 namespace assay_host {
 
+namespace {
+
+bool IsStamp(const ReportLine* line)
+{
+    return line && line->fQuoted && IsWholeValue(*line);
+}
+
+} // namespace
+
 void Report::Add(ReportLine line)
 {
     const std::size_t index = fLines.size();
@@ -54,7 +63,12 @@ const ReportLine* Report::Find(const Device& device, const std::string& key) con
 
 bool Report::IsWhole() const
 {
-    return Find("assayStart") && Find("assayEnd");
+    return IsStamp(Find("assayStart")) && HasEnd();
+}
+
+bool Report::HasEnd() const
+{
+    return IsStamp(Find("assayEnd"));
 }
 
 std::string Report::ToText() const

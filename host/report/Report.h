@@ -35,6 +35,9 @@ public:
     // It has its start stamp and its end stamp.
     bool IsWhole() const;
 
+    // It has its end stamp, quotes, line end and all.
+    bool HasEnd() const;
+
     // All lines as they came, line ends and all.
     std::string ToText() const;
 

@@ -9,6 +9,7 @@
 #include <fmt/format.h>
 
 #include "report/Bytes.h"
+#include "report/LineForm.h"
 #include "report/Numbers.h"
 
 namespace assay_host {
@@ -149,7 +150,7 @@ std::string GetValueText(const Answer& answer)
         text = kNotKnown;
     if (!text)
         text = ShowBytes(TrimEnd(value));
-    if (answer.fLine->fCut)
+    if (!IsWholeValue(*answer.fLine))
         *text += "... (cut)";
     return *text;
 }

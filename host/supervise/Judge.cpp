@@ -5,6 +5,7 @@
 #include <fmt/format.h>
 
 #include "pmutil/Options.h"
+#include "report/LineForm.h"
 #include "supervise/ExitStatus.h"
 
 namespace assay_host {
@@ -96,8 +97,9 @@ void ReportProgress::Add(const ReportLine& line)
     if (line.fKind == LineKind::kRaw)
         return;
     fHasValues = true;
-    fHasStart = fHasStart || line.fKey == "assayStart";
-    fHasEnd = fHasEnd || line.fKey == "assayEnd";
+    const bool isStamp = line.fQuoted && IsWholeValue(line);
+    fHasStart = fHasStart || (isStamp && line.fKey == "assayStart");
+    fHasEnd = fHasEnd || (isStamp && line.fKey == "assayEnd");
     fLastReportLine = line.fText;
     fLastKey = line.fKey;
     fLastLogLine.clear();

@@ -74,7 +74,7 @@ Watched RunTestChild(std::vector<std::string> args, double timeout = 30, int sto
     return run;
 }
 
-const std::vector<std::string> kWhole = {"out", "assayStart=x", "out", "assayEnd=y"};
+const std::vector<std::string> kWhole = {"out", "assayStart=\"x\"", "out", "assayEnd=\"y\""};
 
 std::vector<std::string> operator+(std::vector<std::string> left,
                                    const std::vector<std::string>& right)
@@ -88,12 +88,12 @@ TEST(ChildRun, BringsTheLinesOfAWholeReport)
     const Watched run = RunTestChild(kWhole + std::vector<std::string>{"err", "words"});
     EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kComplete) << run.fOutcome.fReason;
     EXPECT_EQ(run.fOutcome.fExitStatus, 0);
-    EXPECT_THAT(run.fRecorder.fLines, ElementsAre("assayStart=x", "assayEnd=y"));
+    EXPECT_THAT(run.fRecorder.fLines, ElementsAre("assayStart=\"x\"", "assayEnd=\"y\""));
     EXPECT_THAT(run.fRecorder.fErrorLines, ElementsAre("words"));
     EXPECT_THAT(run.fOutcome.fErrorLines, ElementsAre("words"));
     EXPECT_EQ(run.fOutcome.fCommand.front(), TEST_CHILD);
     EXPECT_EQ(run.fOutcome.fCommand.size(), 7U);
-    EXPECT_EQ(run.fOutcome.fLastReportLine, "assayEnd=y");
+    EXPECT_EQ(run.fOutcome.fLastReportLine, "assayEnd=\"y\"");
     EXPECT_EQ(run.fOutcome.fTimeoutSeconds, 30);
     EXPECT_EQ(run.fRecorder.fStarts, 1);
     EXPECT_FALSE(run.fOutcome.fLeftBehind);
@@ -110,7 +110,7 @@ TEST(ChildRun, GivesTheChildTheEndOfItsInput)
 
 TEST(ChildRun, TellsAChildThatEndsTooEarly)
 {
-    const Watched run = RunTestChild({"out", "assayStart=x", "exit", "7"});
+    const Watched run = RunTestChild({"out", "assayStart=\"x\"", "exit", "7"});
     EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kFailedTests);
     EXPECT_EQ(run.fOutcome.fExitStatus, 7);
     EXPECT_THAT(run.fOutcome.fReason, HasSubstr("status 7"));

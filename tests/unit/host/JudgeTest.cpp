@@ -86,6 +86,16 @@ TEST(Judge, CallsAnyOtherEndFailed)
     EXPECT_THAT((Case{"", {}, {}, Ended(0)}.Judge().fReason), HasSubstr("before its first line"));
 }
 
+TEST(Judge, CallsAReportWithHalfAStampBrokenOff)
+{
+    for (const char* end : {"", "=", "=\n", "=\"2026-11", "=\"x\""}) {
+        const RunOutcome outcome =
+            Case{"assayStart=\"x\"\nassayEnd" + std::string(end), {}, {}, Ended(0)}.Judge();
+        EXPECT_EQ(outcome.fVerdict, Verdict::kFailedTests) << end;
+        EXPECT_THAT(outcome.fReason, HasSubstr("broke off")) << end;
+    }
+}
+
 TEST(Judge, KnowsAUsageErrorByStatusAndText)
 {
     const std::vector<std::string> usage = {"Usage exception: usage", "usage: "};
