@@ -8,6 +8,8 @@
 #include <CLI/CLI.hpp>
 #include <fmt/format.h>
 
+#include "report/Bytes.h"
+
 namespace assay_host {
 
 namespace {
@@ -57,15 +59,26 @@ std::string CheckNumber(const std::string& text)
 {
     double value = 0;
     if (!CLI::detail::lexical_cast(text, value) || !std::isfinite(value) || value < 0)
-        return text + " is no number from 0 on";
+        return '"' + text + "\" is no number from 0 on";
     return {};
+}
+
+std::string CheckGiven(const std::string& text)
+{
+    return text.empty() ? "must not be empty" : "";
+}
+
+CLI::Validator MakeGivenCheck(const char* what)
+{
+    return {CheckGiven, what};
 }
 
 void AddChildOptions(CLI::App& command, ChildChoice& child)
 {
     command
         .add_option("--assay", child.fProgram, "the program [beside assay-host, or on the PATH]")
-        ->option_text("PATH");
+        ->option_text("PATH")
+        ->check(MakeGivenCheck("PATH"));
     command.add_option("--timeout", child.fTimeoutSeconds, "kill it then, 0: never [60]")
         ->option_text("SECONDS")
         ->check(CLI::Validator(CheckNumber, "SECONDS"));
@@ -107,7 +120,8 @@ public:
 private:
     static std::string GetText(const CLI::ParseError& error)
     {
-        return fmt::format("assay-host: {}\nassay-host --help tells more.\n", error.what());
+        return fmt::format("assay-host: {}\nassay-host --help tells more.\n",
+                           ShowBytes(error.what()));
     }
 
     CLI::App* AddCommand(const char* name, const char* what, const char* usage, const char* footer)
@@ -133,7 +147,8 @@ private:
         fRunCommand->add_flag("--raw", fRun.fRaw,
                               "the child's own lines first, as they come; with text");
         fRunCommand->add_option("--output", fRun.fOutput, "write there [standard output]")
-            ->option_text("FILE");
+            ->option_text("FILE")
+            ->check(MakeGivenCheck("FILE"));
     }
 
     void AddTorture()
@@ -156,8 +171,12 @@ private:
                        "exit status: 0 same, 1 different, 2 trouble");
         fDiffCommand->add_option("A", fDiff.fBefore, "a report: json, jsonl, or as assay prints it")
             ->required()
-            ->option_text(" ");
-        fDiffCommand->add_option("B", fDiff.fAfter, "the other one")->required()->option_text(" ");
+            ->option_text(" ")
+            ->check(MakeGivenCheck("FILE"));
+        fDiffCommand->add_option("B", fDiff.fAfter, "the other one")
+            ->required()
+            ->option_text(" ")
+            ->check(MakeGivenCheck("FILE"));
         fDiffCommand
             ->add_option("--tolerance", fDiff.fTolerance, "for measured numbers, as a part [0.1]")
             ->option_text("PART")

@@ -10,6 +10,7 @@
 #include "app/FindAssay.h"
 #include "app/Output.h"
 #include "app/WriterThread.h"
+#include "report/Bytes.h"
 #include "report/Report.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Guardian.h"
@@ -35,7 +36,7 @@ std::string ShowCommand(const RunOutcome& outcome)
 {
     std::string text = "  command:";
     for (const std::string& word : outcome.fCommand)
-        text += " " + word;
+        text += " " + ShowBytes(word);
     return text + "\n";
 }
 
@@ -52,7 +53,7 @@ public:
         const RunOutcome outcome = RunChild(fOptions, undisturbed, fStop);
         if (outcome.fVerdict == Verdict::kNeverStarted ||
             outcome.fVerdict == Verdict::kInterrupted) {
-            Say(outcome.fReason + "\n");
+            Say(ShowBytes(outcome.fReason) + "\n");
             return GetVerdictStatus(outcome.fVerdict);
         }
         try {

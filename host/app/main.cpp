@@ -11,6 +11,7 @@
 #include "app/Output.h"
 #include "pmutil/System.h"
 #include "pmutil/UTF8Console.h"
+#include "report/Bytes.h"
 #include "report/RunOutcome.h"
 #include "supervise/ErrorDialogs.h"
 #include "supervise/Interrupt.h"
@@ -59,7 +60,7 @@ int main(int argc, char** argv)
         return RunMain(std::vector<std::string>(argv + 1, argv + argc));
     } catch (const std::exception& exc) {
         SetInterruptEnd([] { EndProcess(GetVerdictStatus(Verdict::kInterrupted)); });
-        std::fprintf(stderr, "assay-host: %s\n", exc.what());
+        std::fprintf(stderr, "assay-host: %s\n", ShowBytes(exc.what()).c_str());
         const bool isDiff = argc > 1 && std::string(argv[1]) == "diff";
         return isDiff ? kDiffTroubleStatus : kTroubleStatus;
     }

@@ -57,8 +57,10 @@ void TextTable::Print(std::ostream& out, std::size_t width) const
 std::vector<std::string> WrapText(std::string_view text, std::size_t width)
 {
     std::vector<std::string> lines;
-    while (CountColumns(text) > width) {
+    while (true) {
         const std::size_t most = CountBytes(text, width);
+        if (most == text.size())
+            break;
         std::size_t end = text.rfind(' ', most);
         if (end == std::string_view::npos || end == 0)
             end = most;

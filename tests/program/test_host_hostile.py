@@ -15,7 +15,7 @@ TIMEOUT = 1.5
 MEBIBYTE = 1 << 20
 
 # What assay-host may need for any child, limits reached and all.
-MOST_KIB = 192 * 1024
+MOST_KIB = 64 * 1024
 REPORT = 'echo \'assayStart="x"\'; echo \'assayEnd="y"\''
 
 
@@ -303,6 +303,63 @@ def test_output_file_is_replaced_in_one_piece(tmp_path):
     assert file.stat().st_mode & 0o777 == 0o640
     assert link.is_symlink()
     assert sorted(each.name for each in tmp_path.iterdir()) == ["link", "result"]
+
+
+def test_output_through_a_link_that_leads_nowhere(tmp_path):
+    """The file is made where the link leads, as a shell's redirection does; the link stays."""
+    (tmp_path / "folder").mkdir()
+    (tmp_path / "folder" / "next").symlink_to("../end")
+    (tmp_path / "link").symlink_to("folder/next")
+    run_child(CHILD, "--output", tmp_path / "link", child=["out", "a=1"])
+    assert (tmp_path / "link").is_symlink()
+    assert (tmp_path / "folder" / "next").is_symlink()
+    assert b'"a=1"' in (tmp_path / "end").read_bytes()
+    assert sorted(each.name for each in tmp_path.iterdir()) == ["end", "folder", "link"]
+
+
+def test_output_on_links_in_a_circle(tmp_path):
+    (tmp_path / "a").symlink_to("b")
+    (tmp_path / "b").symlink_to("a")
+    run = host_run("run", "--assay", CHILD, "--output", tmp_path / "a", "--", "out", "a=1")
+    assert run.status == TROUBLE
+    assert b"Too many levels of symbolic links" in run.err
+    assert (tmp_path / "a").is_symlink()
+    assert sorted(each.name for each in tmp_path.iterdir()) == ["a", "b"]
+
+
+def test_output_on_standard_output_by_its_name():
+    run = host_run("run", "--assay", CHILD, "--output", "/dev/stdout", "--format", "json", "--",
+                   "out", "a=1")
+    assert b'"a=1"' in run.out
+
+
+@pytest.mark.parametrize("arguments, name", [
+    (["run", "--output", ""], "--output"),
+    (["run", "--assay", ""], "--assay"), (["torture", "--assay", ""], "--assay"),
+    (["diff", "", "b"], "A"), (["diff", "a", ""], "B")])
+def test_empty_names_are_usage_errors(arguments, name):
+    run = host_run(*arguments)
+    assert run.status == (2 if arguments[0] == "diff" else TROUBLE)
+    assert text_of(run.err).startswith(f"assay-host: {name}: must not be empty")
+    assert run.out == b""
+
+
+RAW = "\x1b[31m\x07\n\u202e\udcff"
+SHOWN = "\\x1B[31m\\x07\\n\\u{202E}\\xFF"
+
+
+@pytest.mark.parametrize("arguments", [
+    ["run", RAW], ["run", f"--{RAW}"], ["run", "--timeout", RAW], ["run", "--format", RAW],
+    ["diff", RAW, RAW], ["diff", "a", "b", "--tolerance", RAW],
+    ["run", "--output", f"/{RAW}/x"], ["torture", "--kind", RAW],
+    ["torture", "--", f"-crashAfter={RAW}"], ["torture", "--assay", f"/{RAW}"],
+    ["run", "--assay", f"/{RAW}", "--", RAW]])
+def test_control_bytes_of_arguments_are_shown_escaped(arguments):
+    run = host_run(*arguments)
+    assert run.status not in (0, 1)
+    said = run.out + run.err
+    assert SHOWN.encode() in said
+    assert not re.search(rb"[\x00-\x09\x0b-\x1f\x7f\xff]|\xe2\x80\xae", said)
 
 
 @pytest.mark.parametrize("path, text", [

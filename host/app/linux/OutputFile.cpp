@@ -8,6 +8,7 @@
 
 #include <boost/filesystem/operations.hpp>
 
+#include "app/Links.h"
 #include "app/Output.h"
 #include "app/linux/WriteAll.h"
 
@@ -23,6 +24,8 @@ public:
     {
         struct stat found = {};
         const bool exists = ::stat(fPath.c_str(), &found) == 0;
+        if (!exists && errno != ENOENT)
+            Fail(errno);
         if (exists && !S_ISREG(found.st_mode))
             return;
         fTemporary = fPath + boost::filesystem::unique_path(".%%%%%%%%.tmp").native();
@@ -68,10 +71,13 @@ public:
     }
 
 private:
-    // A link stays one: the file that it leads to is replaced.
+    // A link stays one: the file that it leads to is replaced, or made. What the system itself has
+    // for open files, as /dev/stdout, are links that only the system can follow.
     static std::string Resolve(const std::string& path)
     {
         boost::system::error_code error;
+        if (boost::filesystem::status(path, error).type() == boost::filesystem::file_not_found)
+            return FollowLinks(path).native();
         const boost::filesystem::path resolved = boost::filesystem::canonical(path, error);
         return error ? path : resolved.native();
     }

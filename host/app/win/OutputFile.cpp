@@ -6,6 +6,7 @@
 
 #include <boost/filesystem/operations.hpp>
 
+#include "app/Links.h"
 #include "app/Output.h"
 #include "app/win/WriteAll.h"
 #include "supervise/Paths.h"
@@ -16,7 +17,7 @@ namespace {
 
 class OutputFile : public Output {
 public:
-    explicit OutputFile(const std::string& path) : fName(path), fPath(ToPath(path))
+    explicit OutputFile(const std::string& path) : fName(path), fPath(FollowLinks(ToPath(path)))
     {
         boost::system::error_code error;
         const boost::filesystem::file_type type = boost::filesystem::status(fPath, error).type();
