@@ -1,7 +1,8 @@
-#include <sstream>
+#include <ostream>
 
 #include "app/Commands.h"
 #include "app/Output.h"
+#include "app/SinkBuffer.h"
 #include "report/Diff.h"
 #include "report/ReportFile.h"
 
@@ -13,10 +14,12 @@ int Diff(const DiffChoice& choice)
     const Report after = LoadReport(choice.fAfter);
     DiffOptions options;
     options.fTolerance = choice.fTolerance;
-    std::ostringstream text;
-    const bool differs = PrintDiff(text, before, after, options);
     const std::unique_ptr<Output> output = OpenStandardOutput();
-    output->Write(text.str());
+    SinkBuffer buffer([&output](std::string_view block) { output->Write(block); });
+    std::ostream text(&buffer);
+    text.exceptions(std::ios::badbit);
+    const bool differs = PrintDiff(text, before, after, options);
+    text.flush();
     return differs ? kDifferentStatus : 0;
 }
 

@@ -1,5 +1,5 @@
 #include <memory>
-#include <sstream>
+#include <ostream>
 #include <utility>
 
 #include <fmt/format.h>
@@ -90,20 +90,27 @@ public:
             WriteEvent([outcome] { return MakeEndEvent(outcome); });
             break;
         case Format::kJson:
-            fWriter.Write(MakeDocument(fReport, outcome).dump(2) + "\n");
+            fWriter.WriteLarge([report = TakeReport(), outcome](std::ostream& out) {
+                WriteDocument(out, *report, outcome);
+            });
             break;
-        case Format::kText: {
-            std::ostringstream text;
+        case Format::kText:
             if (fChoice.fRaw)
-                text << "\n";
-            PrintText(text, fReport, outcome,
-                      fChoice.fOutput.empty() ? GetOutputWidth() : kFileWidth);
-            fWriter.Write(text.str());
-        }
+                fWriter.Write("\n");
+            const int width = fChoice.fOutput.empty() ? GetOutputWidth() : kFileWidth;
+            fWriter.WriteLarge([report = TakeReport(), outcome, width](std::ostream& out) {
+                PrintText(out, *report, outcome, width);
+            });
         }
     }
 
 private:
+    // The writer may outlive this object.
+    std::shared_ptr<const Report> TakeReport()
+    {
+        return std::make_shared<const Report>(std::move(fReport));
+    }
+
     template <class MakeEvent>
     void WriteEvent(MakeEvent makeEvent)
     {

@@ -12,6 +12,7 @@
 #include <utility>
 
 #include "app/ProgressLine.h"
+#include "app/SinkBuffer.h"
 #include "app/Stream.h"
 
 namespace assay_host {
@@ -24,7 +25,8 @@ constexpr std::size_t kPieceBytes = 4096;
 struct Item {
     StandardStream fStream = StandardStream::kOutput;
     std::string fText;
-    WriterThread::MakeText fMakeText; // if there is one, instead of the text
+    WriterThread::MakeText fMakeText;               // if there is one, instead of the text
+    std::function<void(std::ostream&)> fWriteLarge; // the same
 };
 
 } // namespace
@@ -87,7 +89,8 @@ private:
     // Short texts wait together: each item costs memory beyond its text.
     bool CanJoin(const Item& item) const
     {
-        return !fItems.empty() && !fItems.back().fMakeText && !item.fMakeText &&
+        const auto isMade = [](const Item& each) { return each.fMakeText || each.fWriteLarge; };
+        return !fItems.empty() && !isMade(fItems.back()) && !isMade(item) &&
                fItems.back().fStream == item.fStream &&
                fItems.back().fText.size() + item.fText.size() <= kPieceBytes;
     }
@@ -124,14 +127,25 @@ private:
 
     void WriteItem(const Item& item)
     {
-        const std::string made = item.fMakeText ? item.fMakeText() : std::string();
-        std::string_view left = item.fMakeText ? made : item.fText;
+        if (item.fWriteLarge) {
+            SinkBuffer buffer([&](std::string_view block) { WritePieces(item.fStream, block); });
+            std::ostream out(&buffer);
+            out.exceptions(std::ios::badbit);
+            item.fWriteLarge(out);
+            out.flush();
+        } else {
+            WritePieces(item.fStream, item.fMakeText ? item.fMakeText() : item.fText);
+        }
+    }
+
+    void WritePieces(StandardStream stream, std::string_view left)
+    {
         while (!left.empty()) {
             const std::string_view piece = left.substr(0, kPieceBytes);
             left.remove_prefix(piece.size());
-            if (item.fStream == StandardStream::kOutput)
+            if (stream == StandardStream::kOutput)
                 fOutput->Write(piece);
-            else if (WriteStream(item.fStream, piece))
+            else if (WriteStream(stream, piece))
                 return;
             ++fPieces;
         }
@@ -165,17 +179,22 @@ WriterThread::~WriterThread()
 
 void WriterThread::Write(std::string text)
 {
-    fState->Add({StandardStream::kOutput, std::move(text), {}});
+    fState->Add({StandardStream::kOutput, std::move(text), {}, {}});
 }
 
 void WriterThread::Write(MakeText makeText)
 {
-    fState->Add({StandardStream::kOutput, {}, std::move(makeText)});
+    fState->Add({StandardStream::kOutput, {}, std::move(makeText), {}});
+}
+
+void WriterThread::WriteLarge(std::function<void(std::ostream&)> write)
+{
+    fState->Add({StandardStream::kOutput, {}, {}, std::move(write)});
 }
 
 void WriterThread::WriteError(std::string text)
 {
-    fState->Add({StandardStream::kError, std::move(text), {}});
+    fState->Add({StandardStream::kError, std::move(text), {}, {}});
 }
 
 void WriterThread::ShowProgress(std::string text)

@@ -5,6 +5,7 @@
 #include <functional>
 #include <memory>
 #include <optional>
+#include <ostream>
 #include <string>
 
 #include "app/Output.h"
@@ -32,6 +33,10 @@ public:
     // To the output. What grows when it is put into its form is better made when it is written.
     void Write(std::string text);
     void Write(MakeText makeText);
+
+    // The same for a text that is never held whole: `write` is called once, on the writer's thread,
+    // when its turn has come.
+    void WriteLarge(std::function<void(std::ostream&)> write);
 
     // To standard error. If that fails, the text is lost.
     void WriteError(std::string text);

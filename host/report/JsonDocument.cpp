@@ -2,7 +2,11 @@
 
 #include <algorithm>
 #include <cmath>
+#include <functional>
+#include <iterator>
 #include <stdexcept>
+#include <streambuf>
+#include <string_view>
 #include <utility>
 
 #include <fmt/format.h>
@@ -10,8 +14,10 @@
 
 #include "report/Answers.h"
 #include "report/Bytes.h"
+#include "report/JsonWriter.h"
 #include "report/LineForm.h"
 #include "report/Numbers.h"
+#include "report/ReportReader.h"
 
 namespace assay_host {
 
@@ -25,6 +31,8 @@ bool IsByteCharacter(char32_t code)
 {
     return code >= kByteBase + 0x80 && code <= kByteBase + 0xFF;
 }
+
+const std::string kDocument = "the document";
 
 constexpr const char* kLineKinds[] = {"value", "comment", "raw"};
 
@@ -68,7 +76,7 @@ Json MakeAnswer(const Answer& answer)
         return {{"value", nullptr}, {"reason", GetMissingText(answer.fMissing)}};
     const ReportLine& line = *answer.fLine;
     Json json = {{"value", MakeText(line.fValue)}};
-    if (line.fQuoted)
+    if (line.fQuoted || !IsWholeValue(line))
         return json;
     if (const auto number = ReadNumber(line.fValue))
         json["number"] = MakeNumber(*number);
@@ -80,24 +88,24 @@ Json MakeAnswer(const Answer& answer)
     return json;
 }
 
-// An object is searched from its start for each key that is set, so a flood of keys is put together
-// the other way.
-Json MakeAnswers(const std::vector<Answer>& answers)
+void WriteAnswers(JsonWriter& json, const std::vector<Answer>& answers)
 {
-    Json::object_t object;
-    object.reserve(answers.size());
+    json.Open('{', "keys");
     for (const Answer& answer : answers)
-        object.Container::emplace_back(answer.fKey, MakeAnswer(answer));
-    return object;
+        json.Write(answer.fKey, MakeAnswer(answer));
+    json.Close('}');
 }
 
-Json MakeDevice(const DeviceAnswers& device)
+void WriteDevice(JsonWriter& json, const DeviceAnswers& device)
 {
-    return {
-        {"tag", device.fTag},       {"kind", GetKindName(device.fKind)},
-        {"index", device.fIndex},   {"complete", device.fComplete},
-        {"failed", device.fFailed}, {"keys", MakeAnswers(device.fAnswers)},
-    };
+    json.Open('{');
+    json.Write("tag", device.fTag);
+    json.Write("kind", GetKindName(device.fKind));
+    json.Write("index", device.fIndex);
+    json.Write("complete", device.fComplete);
+    json.Write("failed", device.fFailed);
+    WriteAnswers(json, device.fAnswers);
+    json.Close('}');
 }
 
 Json MakeLine(const ReportLine& line)
@@ -176,29 +184,179 @@ void CheckSchema(const Json& json, const std::string& where)
                                              schema.dump(), kSchemaVersion));
 }
 
+// What the parser says of a text, without its own number for it.
+class JsonFailure : public std::runtime_error {
+    using std::runtime_error::runtime_error;
+};
+
+template <typename Action>
+Json Parse(Action action)
+{
+    const auto getText = [](const Json::exception& failure) {
+        constexpr std::size_t kMostText = 200;
+        const std::string_view text = failure.what();
+        const std::size_t mark = text.find("] ");
+        return ShowBytes(text.substr(mark == std::string_view::npos ? 0 : mark + 2, kMostText));
+    };
+    try {
+        return action();
+    } catch (const Json::parse_error& failure) {
+        throw JsonFailure("not valid JSON: " + getText(failure));
+    } catch (const Json::exception& failure) {
+        throw JsonFailure(getText(failure)); // valid, but a number that nothing here can hold
+    }
+}
+
+// Takes lines in, no more than a report can have.
+class LineTaker {
+public:
+    void Take(const Json& json, const std::string& where)
+    {
+        ReportLine line = ReadJsonLine(json, where);
+        fBytes += line.fText.size() + line.fLineEnd.size();
+        if (++fCount > fLimits.fMaxLines || fBytes > fLimits.fMaxBytes)
+            throw std::runtime_error("too large for a report");
+        fReport.Add(std::move(line));
+    }
+
+    std::size_t GetCount() const { return fCount; }
+    Report TakeReport() { return std::move(fReport); }
+
+private:
+    const ReportReader::Limits fLimits;
+    Report fReport;
+    std::size_t fCount = 0;
+    std::uint64_t fBytes = 0;
+};
+
+bool IsLineMember(const Json& name)
+{
+    return name == "kind" || name == "text" || name == "end" || name == "cut";
+}
+
+// Takes the lines out of a document while it is parsed, and leaves out what isn't asked for.
+class DocumentFilter {
+public:
+    bool operator()(int depth, Json::parse_event_t event, Json& parsed)
+    {
+        constexpr int kMember = 1;
+        constexpr int kLine = 2;
+        switch (event) {
+        case Json::parse_event_t::key:
+            if (depth == kMember)
+                fMember = parsed.get<std::string>();
+            return depth == kMember ? fMember == "schema" || fMember == "lines"
+                                    : fIsInLines && IsLineMember(parsed);
+        case Json::parse_event_t::array_start:
+            if (depth == kMember && fMember == "lines")
+                fIsInLines = true;
+            [[fallthrough]];
+        case Json::parse_event_t::object_start:
+            return depth < kMember || (fMember == "lines" && depth <= kLine);
+        case Json::parse_event_t::array_end:
+            if (depth == kMember)
+                fIsInLines = false;
+            [[fallthrough]];
+        case Json::parse_event_t::object_end:
+        case Json::parse_event_t::value:
+            break;
+        }
+        if (depth == kMember && fMember == "schema")
+            CheckSchema({{"schema", parsed}}, kDocument);
+        if (!fIsInLines || depth != kLine)
+            return true;
+        fLines.Take(parsed, fmt::format("lines[{}]", fLines.GetCount()));
+        return false;
+    }
+
+    Report TakeReport() { return fLines.TakeReport(); }
+
+private:
+    std::string fMember;
+    bool fIsInLines = false;
+    LineTaker fLines;
+};
+
+// The same for an event.
+bool KeepEventMembers(int depth, Json::parse_event_t event, Json& parsed)
+{
+    switch (event) {
+    case Json::parse_event_t::key:
+        return parsed == "event" || parsed == "schema" || IsLineMember(parsed);
+    case Json::parse_event_t::object_start:
+    case Json::parse_event_t::array_start:
+        return depth == 0;
+    default:
+        return true;
+    }
+}
+
+// The bytes up to the next line end, for a parser.
+class LineIterator {
+public:
+    using iterator_category = std::input_iterator_tag;
+    using value_type = char;
+    using difference_type = std::ptrdiff_t;
+    using pointer = const char*;
+    using reference = char;
+
+    LineIterator() = default;
+    explicit LineIterator(std::streambuf& bytes) : fBytes(&bytes) {}
+
+    char operator*() const { return std::char_traits<char>::to_char_type(fBytes->sgetc()); }
+    LineIterator& operator++()
+    {
+        fBytes->sbumpc();
+        return *this;
+    }
+    bool operator==(const LineIterator& other) const { return IsAtEnd() == other.IsAtEnd(); }
+    bool operator!=(const LineIterator& other) const { return !(*this == other); }
+
+private:
+    bool IsAtEnd() const
+    {
+        const auto next = fBytes ? fBytes->sgetc() : std::char_traits<char>::eof();
+        return next == std::char_traits<char>::eof() || next == '\n';
+    }
+
+    std::streambuf* fBytes = nullptr;
+};
+
+// False if the line has no end.
+bool SkipLine(std::streambuf& bytes)
+{
+    auto next = bytes.sbumpc();
+    while (next != std::char_traits<char>::eof() && next != '\n')
+        next = bytes.sbumpc();
+    return next == '\n';
+}
+
 } // namespace
 
-nlohmann::ordered_json MakeDocument(const Report& report, const RunOutcome& outcome)
+void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome)
 {
     const Answers answers = GetAnswers(report);
-    Json devices = Json::array();
+    JsonWriter json(out);
+    json.Open('{');
+    json.Write("schema", kSchemaVersion);
+    json.Write("command", MakeTexts(outcome.fCommand));
+    json.Write("outcome", MakeOutcome(outcome));
+    json.Open('{', "report");
+    json.Write("whole", report.IsWhole());
+    json.Write("next", MakeTextOrNull(answers.fNext));
+    WriteAnswers(json, answers.fReport);
+    json.Close('}');
+    json.Open('[', "devices");
     for (const DeviceAnswers& device : answers.fDevices)
-        devices.push_back(MakeDevice(device));
-    Json lines = Json::array();
+        WriteDevice(json, device);
+    json.Close(']');
+    json.Write("devicesLeftOut", answers.fDevicesLeftOut);
+    json.Open('[', "lines");
     for (const ReportLine& line : report.GetLines())
-        lines.push_back(MakeLine(line));
-    return {
-        {"schema", kSchemaVersion},
-        {"command", MakeTexts(outcome.fCommand)},
-        {"outcome", MakeOutcome(outcome)},
-        {"report",
-         {{"whole", report.IsWhole()},
-          {"next", MakeTextOrNull(answers.fNext)},
-          {"keys", MakeAnswers(answers.fReport)}}},
-        {"devices", std::move(devices)},
-        {"devicesLeftOut", answers.fDevicesLeftOut},
-        {"lines", std::move(lines)},
-    };
+        json.Write(MakeLine(line));
+    json.Close(']');
+    json.Close('}');
+    out << '\n';
 }
 
 nlohmann::ordered_json MakeStartEvent(const std::vector<std::string>& command)
@@ -236,32 +394,34 @@ nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome)
     };
 }
 
-Report ReadDocument(const nlohmann::ordered_json& document)
+Report ReadDocument(std::istream& text)
 {
-    const std::string where = "the document";
+    DocumentFilter filter;
+    const Json document = Parse([&] { return Json::parse(text, std::ref(filter)); });
     if (!document.is_object())
-        throw std::runtime_error(where + " is not an object");
-    CheckSchema(document, where);
-    Report report;
-    std::size_t index = 0;
-    for (const Json& line : Get(document, where, "lines", &Json::is_array, "an array"))
-        report.Add(ReadJsonLine(line, fmt::format("lines[{}]", index++)));
-    return report;
+        throw std::runtime_error(kDocument + " is not an object");
+    CheckSchema(document, kDocument);
+    Get(document, kDocument, "lines", &Json::is_array, "an array");
+    return filter.TakeReport();
 }
 
-Report ReadEvents(std::string_view text)
+Report ReadEvents(std::istream& text)
 {
-    Report report;
-    std::size_t number = 0;
-    while (!text.empty()) {
-        const std::size_t end = text.find('\n');
-        const std::string_view line = text.substr(0, end);
-        const bool isBroken = end == std::string_view::npos;
-        text.remove_prefix(isBroken ? text.size() : end + 1);
-        const std::string where = fmt::format("line {}", ++number);
-        const Json event = Json::parse(line, nullptr, false);
-        if (event.is_discarded() && isBroken && number > 1)
-            break;
+    std::streambuf& bytes = *text.rdbuf();
+    const auto end = std::char_traits<char>::eof();
+    LineTaker lines;
+    for (std::size_t number = 1; bytes.sgetc() != end; ++number) {
+        const std::string where = fmt::format("line {}", number);
+        Json event;
+        try {
+            event = Parse(
+                [&] { return Json::parse(LineIterator(bytes), LineIterator(), KeepEventMembers); });
+        } catch (const JsonFailure& failure) {
+            if (!SkipLine(bytes) && number > 1)
+                break;
+            throw std::runtime_error(fmt::format("{}: {}", where, failure.what()));
+        }
+        SkipLine(bytes);
         if (!event.is_object())
             throw std::runtime_error(where + " is not a JSON object");
         const std::string name = GetString(event, where, "event");
@@ -271,9 +431,15 @@ Report ReadEvents(std::string_view text)
         if (name == "start")
             CheckSchema(event, where);
         if (name == "line")
-            report.Add(ReadJsonLine(event, where));
+            lines.Take(event, where);
     }
-    return report;
+    return lines.TakeReport();
+}
+
+bool IsEvent(const std::string& line)
+{
+    const Json json = Json::parse(line, KeepEventMembers, false);
+    return json.is_object() && json.contains("event");
 }
 
 std::string EncodeBytes(const std::string& bytes)

@@ -5,8 +5,9 @@
 // range is written the same way, byte by byte, so the way back is exact.
 #pragma once
 
+#include <istream>
+#include <ostream>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include <nlohmann/json_fwd.hpp>
@@ -19,7 +20,8 @@ namespace assay_host {
 // Raised when the document's form changes in a way that a reader must know of.
 constexpr int kSchemaVersion = 1;
 
-nlohmann::ordered_json MakeDocument(const Report& report, const RunOutcome& outcome);
+// Writes the document piece by piece, with a line end behind it.
+void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome);
 
 // Events; each has "event" and "seconds" (since the launch).
 nlohmann::ordered_json MakeStartEvent(const std::vector<std::string>& command);
@@ -27,13 +29,16 @@ nlohmann::ordered_json MakeLineEvent(const ReportLine& line, double seconds);
 nlohmann::ordered_json MakeErrorLineEvent(const std::string& line, double seconds);
 nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome);
 
-// The report back from its document. Throws std::runtime_error with what is wrong with the
-// document.
-Report ReadDocument(const nlohmann::ordered_json& document);
+// The report back from its document. Holds no more of it than the report. Throws
+// std::runtime_error with what is wrong with the document.
+Report ReadDocument(std::istream& text);
 
 // The report back from the lines of the JSON Lines form. A last line that breaks off, as a host
 // that died leaves it, is left out. Throws std::runtime_error with what is wrong with the events.
-Report ReadEvents(std::string_view text);
+Report ReadEvents(std::istream& text);
+
+// Whether the line is an event of the JSON Lines form, well-formed or not.
+bool IsEvent(const std::string& line);
 
 // Any bytes as a valid JSON string, and back.
 std::string EncodeBytes(const std::string& bytes);

@@ -23,9 +23,9 @@ public:
         // A line that is longer is cut there; the rest of it is lost and counted.
         std::size_t fMaxLineBytes = std::size_t{1} << 16;
         // What comes behind so many bytes is lost and counted.
-        std::uint64_t fMaxBytes = std::uint64_t{16} << 20;
+        std::uint64_t fMaxBytes = std::uint64_t{4} << 20;
         // What comes behind so many lines is lost and counted: each costs memory, however short.
-        std::size_t fMaxLines = std::size_t{1} << 16;
+        std::size_t fMaxLines = std::size_t{24} << 10;
     };
 
     ReportReader() = default;

@@ -145,6 +145,46 @@ TEST(JsonDocument, GivesNoNumberForWhatIsNone)
     EXPECT_EQ(keys["devices"][1]["keys"]["Extra"], Json::parse(R"({"value": "[1, x]"})"));
 }
 
+TEST(JsonDocument, GivesNoNumberThatAReaderWouldChange)
+{
+    const Json keys = Document("clgpu[0].A=9007199254740993\nclgpu[0].B=18446744073709551615\n"
+                               "clgpu[0].C=[1, 9007199254740993]\nclgpu[0].D=9007199254740992\n"
+                               "clgpu[0].E=40")["devices"][0]["keys"];
+    EXPECT_EQ(keys["A"], Json::parse(R"({"value": "9007199254740993"})"));
+    EXPECT_EQ(keys["B"], Json::parse(R"({"value": "18446744073709551615"})"));
+    EXPECT_EQ(keys["C"], Json::parse(R"({"value": "[1, 9007199254740993]"})"));
+    EXPECT_EQ(keys["D"],
+              Json::parse(R"({"value": "9007199254740992", "number": 9007199254740992})"));
+    EXPECT_EQ(keys["E"], Json::parse(R"({"value": "40"})")); // its line has no end
+}
+
+TEST(JsonDocument, IsWrittenAsIfItWasDumpedWhole)
+{
+    for (const std::string& text : {std::string(), Sample(1, 1).GetText(), std::string("x\n# y")}) {
+        const std::string document = GetDocumentText(ReadReport(text), GoodOutcome());
+        EXPECT_EQ(document, Json::parse(document).dump(2) + "\n");
+    }
+}
+
+TEST(JsonDocument, IsReadInAnyOrderOfMembers)
+{
+    EXPECT_EQ(
+        ReadDocument(Json::parse(R"({"x": [{"lines": [{}]}, [[]]], "lines": [{"z": {"kind": 1},
+        "end": "\n", "text": "a=1", "kind": "value", "y": [[]]}], "devices": {}, "schema": 1})"))
+            .ToText(),
+        "a=1\n");
+}
+
+TEST(JsonDocument, HoldsNoMoreLinesThanAReport)
+{
+    const Json line = Json::parse(R"({"kind": "raw", "text": "", "end": "\n"})");
+    Json document = {{"schema", 1}, {"lines", Json::array()}};
+    document["lines"].get_ref<Json::array_t&>().assign(ReportReader::Limits().fMaxLines, line);
+    EXPECT_EQ(ReadDocument(document).GetLines().size(), ReportReader::Limits().fMaxLines);
+    document["lines"].push_back(line);
+    EXPECT_THROW(ReadDocument(document), std::runtime_error);
+}
+
 TEST(JsonDocument, SaysWhyAValueIsMissing)
 {
     const auto reason = [](const char* text) { return Json{{"value", nullptr}, {"reason", text}}; };
@@ -207,14 +247,14 @@ TEST(JsonDocument, GivesCutLinesBack)
 TEST(JsonDocument, TakesAFloodOfKeysAndDevices)
 {
     std::string text = "NumGLGPUs=4000000000\n";
-    for (int line = 0; line < 20000; ++line) {
+    for (int line = 0; line < 8000; ++line) {
         text += "K" + std::to_string(line) + "=1\nglgpu[0].K" + std::to_string(line) +
                 "=1\nclgpu[" + std::to_string(line) + "].K=1\n";
     }
     const Report report = ReadReport(text);
     const Json document = MakeDocument(report, GoodOutcome());
     EXPECT_EQ(document["devices"].size(), 512U);
-    EXPECT_EQ(document["devicesLeftOut"], 20000 - 256);
+    EXPECT_EQ(document["devicesLeftOut"], 8000 - 256);
     EXPECT_EQ(ReadDocument(document).ToText(), text);
 }
 
@@ -321,22 +361,32 @@ TEST(JsonEvents, RefuseWhatIsNoEvent)
     const Row rows[] = {
         {"{}", "line 1: \"event\" is missing"},
         {"[]\n", "line 1 is not a JSON object"},
-        {"{", "line 1 is not a JSON object"},
+        {"{", "line 1: not valid JSON: "},
+        {start + "1e999\n", "line 2: number overflow parsing '1e999'"},
+        {start + "{\"event\": \"line\", \"seconds\": -1e999}\n",
+         "line 2: number overflow parsing '-1e999'"},
+        {start + "1\n", "line 2 is not a JSON object"},
+        {start + "{\"event\": \"line\", \"kind\": \"value\", \"text\": [\"a=1\"]}\n",
+         "line 2: \"text\" is not a string"},
         {R"({"event": 1})", "line 1: \"event\" is not a string"},
         {R"({"event": "end"})", "line 1 is not the event \"start\""},
         {R"({"event": "start"})", "line 1: \"schema\" is missing"},
         {R"({"event": "start", "schema": 7})", "line 1: \"schema\" is 7, and only 1 can be read"},
         {start + start, "line 2 is a second event \"start\""},
-        {start + "\n" + start, "line 2 is not a JSON object"},
+        {start + "\n" + start, "line 2: not valid JSON: "},
         {start + "{\"event\": \"line\"}\n", "line 2: \"kind\" is missing"},
-        {start + "{\"event\": \"li\n", "line 2 is not a JSON object"},
+        {start + "{\"event\": \"li\n", "line 2: not valid JSON: "},
     };
     for (const Row& row : rows) {
         try {
             ReadEvents(row.fText);
             ADD_FAILURE() << row.fText;
         } catch (const std::runtime_error& failure) {
-            EXPECT_STREQ(failure.what(), row.fMessage);
+            const std::string message = row.fMessage;
+            const bool isStart = message.substr(message.size() - 2) == ": ";
+            EXPECT_EQ(
+                std::string(failure.what()).substr(0, isStart ? message.size() : std::string::npos),
+                message);
         }
     }
 }

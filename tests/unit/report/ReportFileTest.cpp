@@ -99,6 +99,27 @@ TEST(ReportFile, SaysWhatIsWrongWithAFile)
     EXPECT_EQ(LoadFailure("{} {}").substr(0, 16), "not valid JSON: ");
 }
 
+TEST(ReportFile, RefusesWhatIsTooLargeBeforeItIsHeld)
+{
+    const std::string large(std::size_t{5} << 20, 'x');
+    EXPECT_EQ(LoadFailure("{\"a\": \"" + large + "\"}"), "too large for a report");
+    EXPECT_EQ(LoadFailure("{\n\"a\": " + std::string(large.size(), '1') + "}"),
+              "too large for a report");
+    EXPECT_EQ(LoadFailure(MakeStartEvent({}).dump() + "\n{\"event\": \"" + large + "\"}\n"),
+              "too large for a report");
+    EXPECT_EQ(LoadFailure(std::string(large.size(), '\n')),
+              "lines too long, or too many, for a report");
+    EXPECT_EQ(LoadFailure(std::string(std::size_t{65} << 20, ' ') + "{}"),
+              "lines too long, or too many, for a report");
+    EXPECT_EQ(LoadFailure("{" + std::string(std::size_t{65} << 20, ' ') + "}"),
+              "too large for a report");
+}
+
+TEST(ReportFile, SaysWhatANumberIsThatNothingHolds)
+{
+    EXPECT_EQ(LoadFailure("{\"schema\": 1, \"x\": 1e999}"), "number overflow parsing '1e999'");
+}
+
 TEST(ReportFile, SaysThatAFileCannotBeRead)
 {
     const std::string path = testing::TempDir() + "assay-no-such-file";

@@ -337,7 +337,7 @@ TEST(ReportReader, HoldsNoMoreThanItsLimitsOfAFlood)
     std::size_t count = 0;
     for (int round = 0; round < 4; ++round)
         count += second.Feed(ends).size();
-    EXPECT_EQ(count, std::size_t{1} << 16);
+    EXPECT_EQ(count, ReportReader::Limits().fMaxLines);
 }
 
 TEST(ReportReader, LooksAtTheLinesOfManyOpenQuotesOnce)

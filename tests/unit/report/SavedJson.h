@@ -4,10 +4,13 @@
 
 #include <cstdlib>
 #include <fstream>
+#include <sstream>
 #include <string>
 
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
+
+#include "report/JsonDocument.h"
 
 namespace assay_host {
 
@@ -26,6 +29,31 @@ inline void SaveText(const std::string& text, const char* ending)
     file << text;
     file.close();
     EXPECT_TRUE(file) << path;
+}
+
+// What the program writes and reads as streams, for tests that look at whole documents.
+inline std::string GetDocumentText(const Report& report, const RunOutcome& outcome)
+{
+    std::ostringstream out;
+    WriteDocument(out, report, outcome);
+    return out.str();
+}
+
+inline Json MakeDocument(const Report& report, const RunOutcome& outcome)
+{
+    return Json::parse(GetDocumentText(report, outcome));
+}
+
+inline Report ReadDocument(const Json& document)
+{
+    std::istringstream in(document.dump());
+    return ReadDocument(in);
+}
+
+inline Report ReadEvents(const std::string& text)
+{
+    std::istringstream in(text);
+    return ReadEvents(in);
 }
 
 // The JSON as its reader gets it.

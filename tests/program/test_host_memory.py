@@ -1,0 +1,117 @@
+"""What assay-host needs at most for a child that prints whatever it likes, and for a file that is no
+report."""
+
+import os
+import subprocess
+import threading
+
+import pytest
+
+from harness import SANITIZED_BY
+from hosting import HOST, script_child
+
+pytestmark = pytest.mark.skipif(bool(SANITIZED_BY), reason="a sanitizer has memory of its own")
+
+MOST_KIB = 64 * 1024
+SIZE = 6 << 20 # beyond what is kept
+COUNT = 60000  # also
+
+
+def numbered(form):
+    return b"".join(form % number for number in range(COUNT))
+
+
+FLOODS = {
+    "nothing": lambda: b"",
+    "empty lines": lambda: b"\n" * SIZE,
+    "tiny lines": lambda: b"a=1\n" * (SIZE // 4),
+    "one line": lambda: b"x" * SIZE,
+    "long lines": lambda: (b"K=" + b"x" * 65000 + b"\n") * 100,
+    "open quotes": lambda: b'K="\n' * (SIZE // 4),
+    "keys": lambda: numbered(b"Key%d" + b"y" * 100 + b"=1\n"),
+    "short keys": lambda: numbered(b"K%d=1\n"),
+    "devices": lambda: numbered(b"glgpu[%d]." + b"y" * 100 + b"=1\n"),
+    "keys of devices": lambda: b"NumGLGPUs=256\nNumCLGPUs=256\n" + b"".join(
+        b"clgpu[%d].K%d%s=1\n" % (number % 256, number, b"y" * 100) for number in range(COUNT)),
+    "one device": lambda: numbered(b'glgpu[0].K%d="' + b"\x01" * 100 + b'"\n'),
+    "controls": lambda: b"".join(
+        b'K%d="%s"\n' % (number, b"\x01" * 60000) for number in range(100)),
+    "controls without a key": lambda: (b"\x01" * 60000 + b"\n") * 100,
+    "bytes": lambda: b"".join(b'K%d="%s"\n' % (number, b"\xff" * 60000) for number in range(100)),
+    "lists": lambda: b"".join(
+        b"K%d=[%s1]\n" % (number, b"1, " * 20000) for number in range(100)),
+}
+
+
+def peak_of(output, *arguments, standard_error=subprocess.DEVNULL):
+    """The status of assay-host and the most memory that it, or a child that it waited for, had."""
+    with subprocess.Popen([HOST, *map(str, arguments)], stdin=subprocess.DEVNULL, stdout=output,
+                          stderr=standard_error) as process:
+        _, status, usage = os.wait4(process.pid, 0)
+        process.returncode = os.waitstatus_to_exitcode(status)
+    return process.returncode, usage.ru_maxrss
+
+
+@pytest.mark.parametrize("name, stream", [
+    *((name, "") for name in FLOODS), ("tiny lines", ">&2"), ("controls", ">&2")])
+def test_flood(tmp_path, name, stream):
+    (tmp_path / "flood").write_bytes(FLOODS[name]())
+    child = script_child(tmp_path, f"exec cat {tmp_path}/flood {stream}")
+    peaks = {}
+    for form in (["json"], ["jsonl"], ["text"], ["text", "--raw"]):
+        result = tmp_path / form[-1]
+        with result.open("wb") as output:
+            status, peaks[form[-1]] = peak_of(output, "run", "--assay", child, "--timeout", "60",
+                                              "--format", *form)
+        assert status == 1
+        if form[0] != "text":
+            status, peaks[f"diff of {form[0]}"] = peak_of(subprocess.DEVNULL, "diff", result, result)
+            assert status == 0
+    assert max(peaks.values()) <= MOST_KIB, peaks
+
+
+@pytest.fixture(name="report")
+def fixture_report(tmp_path):
+    (tmp_path / "report").write_text("a=1\n")
+    return tmp_path / "report"
+
+
+@pytest.mark.parametrize("path, text", [
+    ("/dev/zero", b"lines too long, or too many, for a report"),
+    ("/dev/null", b"neither a JSON document nor a report"), ("/", b"can't read: Is a directory")])
+def test_difference_to_what_is_no_file(report, tmp_path, path, text):
+    with (tmp_path / "said").open("wb") as said:
+        status, peak = peak_of(subprocess.DEVNULL, "diff", report, path, standard_error=said)
+    assert status == 2
+    assert peak <= MOST_KIB
+    assert (tmp_path / "said").read_bytes() == b"assay-host: " + path.encode() + b": " + text + b"\n"
+
+
+@pytest.mark.parametrize("piece", [b"a=1\n", b"\0", b"{\n", b'{"a": "', b" ", b'{"a":1,'])
+def test_endless_pipe(report, tmp_path, piece):
+    """No more is read than a report can have."""
+    os.mkfifo(tmp_path / "pipe")
+    written = []
+
+    def write():
+        block = piece * (65536 // len(piece))
+        with open(tmp_path / "pipe", "wb", buffering=0) as pipe:
+            try:
+                while True:
+                    written.append(pipe.write(block))
+            except BrokenPipeError:
+                pass
+
+    writer = threading.Thread(target=write)
+    writer.start()
+    try:
+        with (tmp_path / "said").open("wb") as said:
+            status, peak = peak_of(subprocess.DEVNULL, "diff", report, tmp_path / "pipe",
+                                   standard_error=said)
+    finally:
+        writer.join()
+    assert status == 2
+    assert b"for a report" in (tmp_path / "said").read_bytes() or b"not valid JSON" in (
+        tmp_path / "said").read_bytes()
+    assert sum(written) <= 65 << 20
+    assert peak <= MOST_KIB
