@@ -147,6 +147,21 @@ TEST_F(WriterThreadTest, MakesATextWhenItsTurnHasCome)
     EXPECT_TRUE(made);
 }
 
+TEST_F(WriterThreadTest, HoldsNoLargeTextWhole)
+{
+    fReader->Stop();
+    std::atomic<int> lines{0};
+    fWriter.WriteLarge([&lines](std::ostream& out) {
+        for (; lines < 1000; ++lines)
+            out << std::string(1000, 'x');
+    });
+    fReader->AwaitAsked(1);
+    EXPECT_LT(lines, 1000);
+    fReader->GoOn();
+    EXPECT_TRUE(fWriter.Finish(std::nullopt));
+    EXPECT_EQ(fReader->GetAllTaken(), std::string(1000000, 'x'));
+}
+
 TEST_F(WriterThreadTest, WritesALongTextInPieces)
 {
     const std::string text(10000, 'x');
