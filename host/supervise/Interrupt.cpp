@@ -4,6 +4,7 @@
 #include <mutex>
 #include <utility>
 
+#include "pmutil/UTF8Console.h"
 #include "supervise/InterruptNotes.h"
 
 namespace assay_host {
@@ -53,6 +54,7 @@ int SetInterruptEnd(std::function<void()> end)
 
 void EndProcess(int status)
 {
+    pmutil::UTF8Console::PutBack();
     std::_Exit(status);
 }
 

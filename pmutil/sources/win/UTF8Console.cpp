@@ -3,6 +3,7 @@
 #include <windows.h>
 
 #include <atomic>
+#include <cstdio>
 
 namespace pmutil {
 
@@ -16,16 +17,10 @@ bool IsConsole(DWORD stream)
     return GetConsoleMode(GetStdHandle(stream), &mode) != 0;
 }
 
-void PutBack()
-{
-    if (const UINT codePage = gCodePageBefore.exchange(0))
-        SetConsoleOutputCP(codePage);
-}
-
 // Comes after the handlers that were added later, and only if none of them goes on with the run.
 BOOL WINAPI PutBackBeforeTheEnd(DWORD /*event*/)
 {
-    PutBack();
+    UTF8Console::PutBack();
     return FALSE;
 }
 
@@ -33,6 +28,9 @@ BOOL WINAPI PutBackBeforeTheEnd(DWORD /*event*/)
 
 UTF8Console::UTF8Console()
 {
+    // The console shows what comes in one write; a character that comes byte by byte is none to it.
+    if (IsConsole(STD_OUTPUT_HANDLE))
+        std::setvbuf(stdout, nullptr, _IOFBF, BUFSIZ);
     if (!IsConsole(STD_OUTPUT_HANDLE) && !IsConsole(STD_ERROR_HANDLE))
         return;
     const UINT before = GetConsoleOutputCP();
@@ -46,6 +44,12 @@ UTF8Console::~UTF8Console()
 {
     SetConsoleCtrlHandler(PutBackBeforeTheEnd, FALSE);
     PutBack();
+}
+
+void UTF8Console::PutBack()
+{
+    if (const UINT codePage = gCodePageBefore.exchange(0))
+        SetConsoleOutputCP(codePage);
 }
 
 } // namespace pmutil
