@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 #include <vector>
 
+#include "TestChild.h"
+
 namespace assay_host {
 namespace {
 

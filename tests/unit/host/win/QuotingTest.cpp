@@ -11,6 +11,7 @@
 
 #include <boost/nowide/convert.hpp>
 
+#include "TestChild.h"
 #include "pmutil/LauncherWin.h"
 #include "supervise/ChildCommand.h"
 
@@ -153,7 +154,7 @@ TEST(Quoting, TheShellReadsBackEveryText)
     Batch batch(CheckWithTheShell);
     const auto add = [&](const std::wstring& text) { batch.Add(text); };
     ForEachText(kKinds, 8, add);
-    ForEachText(kHard, 5, add);
+    ForEachText(kHard, 6, add);
     ForRandomTexts(20'000, 200, add);
 }
 

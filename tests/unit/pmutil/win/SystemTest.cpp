@@ -4,6 +4,7 @@
 
 #include <cassert>
 #include <cstdlib>
+#include <cxxabi.h>
 #include <exception>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -17,24 +18,6 @@ namespace {
 // As in Windows' own header of result codes, which are unsigned there.
 constexpr int kAborted = static_cast<int>(0xC0000409);
 constexpr int kAccessViolation = static_cast<int>(0xC0000005);
-
-struct Interface {
-    virtual ~Interface() = default;
-    Interface() { CallIt(); }
-    virtual void Missing() = 0;
-
-private:
-    void CallIt();
-};
-
-struct Implementation : Interface {
-    void Missing() override {}
-};
-
-void Interface::CallIt()
-{
-    Missing();
-}
 
 TEST(PathCodecvt, PathThatTheCodePageCannotSayFails)
 {
@@ -62,7 +45,7 @@ TEST(PrepareConsoleProcessDeathTest, AbortIsACrash)
     EXPECT_EXIT(run([] { std::terminate(); }), testing::ExitedWithCode(kAborted), "");
     EXPECT_EXIT(run([] { assert(std::getenv("no such variable") != nullptr); }),
                 testing::ExitedWithCode(kAborted), "no such variable");
-    EXPECT_EXIT(run([] { Implementation pureCall; }), testing::ExitedWithCode(kAborted), "pure");
+    EXPECT_EXIT(run([] { abi::__cxa_pure_virtual(); }), testing::ExitedWithCode(kAborted), "pure");
 }
 
 TEST(PrepareConsoleProcessDeathTest, AccessViolationIsACrash)
