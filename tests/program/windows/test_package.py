@@ -1,12 +1,27 @@
 """The zip for people who don't build."""
 
+import os
 import re
+import shutil
 import subprocess
 import zipfile
 
+import pefile
 import pytest
 
 from conftest import BUILD, NO_OPENCL_PLATFORM, TREE, run_under_wine
+from harness import text_of
+
+
+def pack(tmp_path, **variables):
+    """Packs, and unpacks the programs; what the script said comes with the folder."""
+    done = subprocess.run([TREE / "scripts" / "package", "windows", "--as-built"],
+                          stderr=subprocess.PIPE, text=True, check=True,
+                          env={**os.environ, **variables})
+    with zipfile.ZipFile(TREE / done.stderr.splitlines()[-1]) as packed:
+        packed.extractall(tmp_path)
+    [inside] = tmp_path.iterdir()
+    return inside, done.stderr
 
 
 @pytest.fixture(scope="module")
@@ -14,13 +29,7 @@ def package(tmp_path_factory):
     """The unpacked zip's one folder."""
     if BUILD != TREE / "build" / "windows":
         pytest.skip("the zip is made of build/windows")
-    done = subprocess.run([TREE / "scripts" / "package", "windows", "--as-built"],
-                          stderr=subprocess.PIPE, text=True, check=True)
-    folder = tmp_path_factory.mktemp("unpacked")
-    with zipfile.ZipFile(TREE / done.stderr.splitlines()[-1]) as packed:
-        packed.extractall(folder)
-    [inside] = folder.iterdir()
-    return inside
+    return pack(tmp_path_factory.mktemp("unpacked"))[0]
 
 
 def test_name_tells_version_and_machine(package):
@@ -29,7 +38,8 @@ def test_name_tells_version_and_machine(package):
 
 def test_holds_programs_and_what_to_read(package):
     assert {path.name for path in package.iterdir()} == {
-        "assay.exe", "assay-host.exe", "README.md", "docs", "schema", "licences"}
+        "assay.exe", "assay-host.exe", "README.md", "docs", "schema", "licences", "check.cmd",
+        "check"}
     assert (package / "docs" / "report-format.md").stat().st_size > 0
     for name in ["Boost", "GCC-runtime", "MinGW-w64", "CLI11", "fmt", "nlohmann-json"]:
         assert (package / "licences" / f"{name}.txt").stat().st_size > 0
@@ -42,11 +52,63 @@ def test_runs_in_an_empty_prefix(package, tmp_path):
     assert run.lines[-1] == 'assayEnd="STAMP"'
 
 
-@pytest.mark.parametrize("program", ["assay.exe", "assay-host.exe"])
-def test_imports_system_libraries_only(package, program):
-    dump = subprocess.run(["x86_64-w64-mingw32-objdump", "-p", package / program],
-                          stdout=subprocess.PIPE, check=True, text=True).stdout
-    names = {name.lower() for name in re.findall(r"DLL Name: (\S+)", dump)}
-    assert names
-    assert not names & {"opengl32.dll", "opencl.dll"}
-    assert not [name for name in names if name.startswith(("libgcc", "libstdc++", "libwinpthread"))]
+def test_holds_no_symbols_and_debug_sections(package):
+    programs = sorted(package.rglob("*.exe"))
+    assert len(programs) > 2
+    for program in programs:
+        image = pefile.PE(str(program), fast_load=True)
+        # A name of more than 8 characters, as ".debug_info", stands elsewhere: "/4".
+        names = [section.Name.rstrip(b"\0") for section in image.sections]
+        assert b".text" in names
+        assert not [name for name in names if name.startswith((b"/", b".debug"))]
+        assert image.FILE_HEADER.NumberOfSymbols == 0
+
+
+def test_check_script(package):
+    """The part that needs no minutes; the unit tests that the whole one runs are there too."""
+    run = run_under_wine("/c", "check.cmd", "quick", program="cmd.exe", cwd=package,
+                         **NO_OPENCL_PLATFORM)
+    assert run.status == 0, text_of(run.out)
+    assert run.lines[-1] == "All checks passed."
+    assert len(run.lines) == 10
+    assert all(line.startswith("ok    ") for line in run.lines[:-1])
+    script = (package / "check.cmd").read_bytes()
+    assert b"\n" not in script.replace(b"\r\n", b""), "Windows' own line ends"
+    [units] = re.findall(rb"for %%t in \((.*)\) do call :unit", script)
+    assert {f"{unit}_tests.exe" for unit in units.decode().split()} | {"test_child.exe"} == {
+        path.name for path in (package / "check").iterdir()}
+
+
+def test_check_script_tells_what_fails(package, tmp_path):
+    broken = tmp_path / "broken"
+    shutil.copytree(package, broken)
+    shutil.copy(broken / "check" / "test_child.exe", broken / "assay.exe")
+    run = run_under_wine("/c", "check.cmd", "quick", program="cmd.exe", cwd=broken,
+                         **NO_OPENCL_PLATFORM)
+    assert run.status == 1
+    assert "FAIL  assay prints a whole report: status 1 in place of 0" in run.lines
+    assert "ok    assay-host starts" in run.lines
+
+
+def test_signature(package, tmp_path_factory):
+    """With a certificate each program is signed with it, without one the script says so."""
+    folder = tmp_path_factory.mktemp("certificate")
+    key, certificate, both, password = [folder / name for name in
+                                        ("key.pem", "certificate.pem", "both.p12", "password")]
+    password.write_text("secret")
+    subprocess.run(["openssl", "req", "-x509", "-newkey", "rsa:2048", "-nodes", "-days", "2",
+                    "-subj", "/CN=test", "-addext", "extendedKeyUsage=codeSigning", "-keyout", key,
+                    "-out", certificate], stderr=subprocess.DEVNULL, check=True)
+    subprocess.run(["openssl", "pkcs12", "-export", "-inkey", key, "-in", certificate, "-out", both,
+                    "-passout", f"file:{password}"], check=True)
+    signed, said = pack(tmp_path_factory.mktemp("signed"), ASSAY_SIGN_CERTIFICATE=str(both),
+                        ASSAY_SIGN_PASSWORD_FILE=str(password))
+    assert "Not signed" not in said
+    for program in signed.rglob("*.exe"):
+        subprocess.run(["osslsigncode", "verify", "-CAfile", certificate, "-in", program],
+                       stdout=subprocess.DEVNULL, check=True)
+    _, said = pack(tmp_path_factory.mktemp("unsigned"))
+    assert "Not signed: ASSAY_SIGN_CERTIFICATE names no certificate" in said
+    unsigned = subprocess.run(["osslsigncode", "verify", "-in", package / "assay.exe"],
+                              stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL, check=False)
+    assert unsigned.returncode != 0

@@ -149,7 +149,9 @@ TEST(LauncherWin, PathWithBlanksMustComeQuoted)
     const TempFolder folder;
     const auto copy = folder.Path() / "with blank" / "child copy.exe";
     boost::filesystem::create_directory(copy.parent_path());
-    boost::filesystem::copy_file(boost::filesystem::path(std::wstring(TEST_CHILD)), copy);
+    wchar_t child[MAX_PATH] = {};
+    ASSERT_NE(::SearchPathW(nullptr, TEST_CHILD, nullptr, MAX_PATH, child, nullptr), 0U);
+    boost::filesystem::copy_file(child, copy);
     EXPECT_EQ(RunChild({"exit", "7"}, L"\"" + copy.wstring() + L"\"").exitCode, 7);
 }
 

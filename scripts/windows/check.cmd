@@ -1,0 +1,61 @@
+@echo off
+rem Tries the programs on this machine: one line for each check, "ok" or "FAIL". Nothing is installed
+rem or changed, and no window should come up.
+rem
+rem usage: check.cmd [quick]
+rem   quick  leaves out the unit tests and the failures at every step, which take minutes
+setlocal
+set here=%~dp0
+set host="%here%assay-host.exe"
+set child="%here%check\test_child.exe"
+set log="%TEMP%\assay-check.log"
+set failed=0
+echo assay-check >%log%
+
+set command=%host% --version
+call :check 0 "assay-host starts"
+set command=%host% run
+call :check 0 "assay prints a whole report"
+set command=%host% run -- -bogus
+call :check 2 "a usage error is told as one"
+set command=%host% run -- "-stdout=a b\" -exit=5 "-comment=c"
+call :check 0 "options reach assay as they are"
+
+for %%h in (access-violation fast-fail stack-overflow) do call :crash %%h
+set command=%host% run --assay %child% --timeout 5 -- die hang
+call :check 4 "a child that hangs is ended, and told as one"
+set command=%host% run --assay %child% --timeout 60 -- die exit
+call :check 1 "a child that ends early is told as one"
+
+if "%1"=="quick" goto end
+set command=%host% torture
+call :check 0 "a failure at every step is as predicted"
+for %%t in (pmutil qgf gpu app report host) do call :unit %%t
+
+:end
+if %failed%==0 (echo All checks passed.) else (echo Some checks failed; %log% tells more.)
+exit /b %failed%
+
+:crash
+set command=%host% run --assay %child% --timeout 60 -- die %1
+call :check 3 "a crash is told as one: %1"
+goto :eof
+
+:unit
+set command="%here%check\%1_tests.exe" --gtest_brief=1
+call :check 0 "unit tests of %1"
+goto :eof
+
+rem Runs the command; its status must be the first argument, the second says what is checked.
+:check
+echo == %~2 >>%log%
+%command% >>%log% 2>&1 <nul
+set status=%errorlevel%
+echo status %status% >>%log%
+if %status%==%1 (
+    echo ok    %~2
+) else (
+    echo FAIL  %~2: status %status% in place of %1
+    set failed=1
+)
+goto :eof
