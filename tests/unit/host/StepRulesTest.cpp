@@ -254,5 +254,14 @@ TEST(ShowDifference, ShowsEachKind)
               "  exit status: predicted 0, found none: The child died of it.\n");
 }
 
+TEST(ExpectedLine, TakesNoValueTooLongForAnyNumber)
+{
+    const ExpectedLine line{"a=1", Match::kInteger};
+    EXPECT_TRUE(line.Matches("a=23"));
+    EXPECT_FALSE(line.Matches("a=" + std::string(std::size_t{1} << 16, '1')));
+    EXPECT_FALSE(line.Matches("a"));
+    EXPECT_FALSE(line.Matches(""));
+}
+
 } // namespace
 } // namespace assay_host
