@@ -126,7 +126,7 @@ def test_the_log_tells_the_adapters(host, tmp_path):
     assert any(line.endswith("adapter[0] displays: 1") for line in log)
     assert any("adapter[1]{ VendorID=4098 DeviceId=29631 " in line for line in log)
     assert not any("adapter[1] displays: " in line for line in log)
-    assert any("output[0]{ DesktopCoordinates={ left=0 top=0 right=1920 bottom=1080}"
+    assert any("output[1]{ DesktopCoordinates={ left=0 top=0 right=1920 bottom=1080}"
                in line for line in log)
     assert any(line.endswith("wmiNumDevices=2") for line in log)
     assert any(line.endswith("dxgiNumDevices=1") for line in log)
