@@ -158,10 +158,10 @@ std::string DeviceOfNodes(const std::string& folder, const std::string& place, c
 // nodes they have all the same (virtio_gpu_probe in drivers/gpu/drm/virtio/virtgpu_drv.c).
 std::string DrawingDriver(const std::string& device)
 {
-    const std::string driver = ModuleOf(device);
+    std::string driver = ModuleOf(device);
     if (driver.compare(0, 7, "virtio_") == 0 || driver.compare(0, 7, "virtio-") == 0) {
         for (const std::string& name : QGF::ListSystemFolder(device)) {
-            const std::string carried =
+            std::string carried =
                 name.compare(0, 6, "virtio") == 0 ? ModuleOf(device + name + "/") : std::string();
             if (!carried.empty()) {
                 return carried;
