@@ -63,6 +63,15 @@ private:
     std::FILE* fStream;
 };
 
+// The program as the launcher takes it. On Windows it is put on the command line as it stands,
+// where a path with blanks needs quotation marks.
+static std::wstring GetProgram(const char* path)
+{
+    constexpr bool isWindows = boost::filesystem::path::preferred_separator == '\\';
+    const std::wstring program = boost::filesystem::path(path).wstring();
+    return isWindows ? L'"' + program + L'"' : program;
+}
+
 int main(int argc, char** argv)
 try {
     if (argc < 3)
@@ -70,9 +79,9 @@ try {
     const auto app = boost::make_shared<App>();
     pmutil::ConsoleAppLauncher launcher;
     launcher.SetConsoleApp(app);
-    launcher.SetLaunchParams(pmutil::LaunchParams(
-        boost::make_shared<LinePrinter>(app, stdout), boost::make_shared<LinePrinter>(app, stderr),
-        {argv + 3, argv + argc}, boost::filesystem::path(argv[1]).wstring()));
+    launcher.SetLaunchParams(pmutil::LaunchParams(boost::make_shared<LinePrinter>(app, stdout),
+                                                  boost::make_shared<LinePrinter>(app, stderr),
+                                                  {argv + 3, argv + argc}, GetProgram(argv[1])));
     int exitCode = 0;
     pmutil::State end = launcher.LaunchAndWait(&exitCode, std::atof(argv[2]));
     if (end == pmutil::State::kTimeout) {

@@ -41,8 +41,9 @@ void DiscardUnwritten(std::FILE* stream);
 //   unprivileged process's reach: a crash reporter that core_pattern names still sees it then.
 // - A write to a pipe whose reader has gone, or beyond the file-size limit, fails and doesn't end
 //   the process; one to the terminal of another job succeeds and doesn't stop it.
-// - On Linux no signal is blocked, and those that tell of a crash or of a child's end aren't
-// ignored.
+// - On Windows an abort ends the process with the code 0xC0000409 in place of the status 3, an
+//   unhandled exception does with its own, and no library comes from the current directory.
+// - On Linux no signal is blocked, and those that tell of a crash or a child's end aren't ignored.
 //   Others keep what they were given: SIGHUP stays ignored under nohup, SIGXCPU ends the process at
 //   its CPU limit, SIGTTIN and SIGTSTP stop it as the user's shell means them to.
 // - A standard stream that is closed stays one that fails: no file opened later takes its place.
