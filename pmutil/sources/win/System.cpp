@@ -201,6 +201,8 @@ void PrepareConsoleProcess()
                        nullptr);
     HideErrorReports();
     gFilterBefore = SetUnhandledExceptionFilter(EndAtException);
+    ULONG stackForIt = 64 * 1024; // which a stack overflow on this thread leaves to the filter
+    SetThreadStackGuarantee(&stackForIt);
     _set_error_mode(_OUT_TO_STDERR);
     std::signal(SIGABRT, EndAsCrash);
     SetDllDirectoryW(L""); // no library comes from the current directory

@@ -47,6 +47,8 @@ LONG WINAPI EndAtException(EXCEPTION_POINTERS* /*pointers*/)
 void PrepareStreams()
 {
     ::SetUnhandledExceptionFilter(EndAtException);
+    ULONG stackForIt = 64 * 1024; // which a stack overflow leaves to it
+    ::SetThreadStackGuarantee(&stackForIt);
     ::SetErrorMode(SEM_FAILCRITICALERRORS | SEM_NOGPFAULTERRORBOX);
     ::_setmode(0, _O_BINARY);
     ::_setmode(1, _O_BINARY);

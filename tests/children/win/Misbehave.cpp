@@ -16,12 +16,15 @@ void FastFail()
 }
 
 // Fills the stack. Each call looks at the array of the one above, so that none can stand for all.
+// The array is large, so that the overflow is met with room left for what handles it: Wine needs
+// some.
 int Descend(const volatile char* above) // NOLINT(misc-no-recursion): on purpose
 {
-    volatile char space[4096] = {};
+    volatile char space[1 << 18];
+    space[0] = *above;
     if (*above != 0)
         return 0;
-    return Descend(space) + space[1];
+    return Descend(space) + space[0];
 }
 
 } // namespace
