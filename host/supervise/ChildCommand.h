@@ -1,9 +1,13 @@
-// What a launch takes, so that the child gets exactly the arguments that were asked for.
+// What a launch takes: the child gets exactly the arguments that were asked for.
 #pragma once
 
 #include <deque>
 #include <string>
 #include <vector>
+
+#include <boost/shared_ptr.hpp>
+
+#include "pmutil/Launcher.h"
 
 namespace assay_host {
 
@@ -16,5 +20,9 @@ struct ChildCommand {
 // `program` is a path, all texts are UTF-8. On Windows the whole command line stands in fProgram:
 // the launcher takes it as it is, while its own way with arguments loses some of them.
 ChildCommand MakeChildCommand(const std::string& program, const std::vector<std::string>& args);
+
+// The launcher of this platform. On Linux its child is in a process group of its own, so that a
+// signal that the child sends to its group doesn't reach this process.
+boost::shared_ptr<pmutil::Launcher> MakeChildLauncher();
 
 } // namespace assay_host

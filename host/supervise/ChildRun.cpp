@@ -302,7 +302,7 @@ private:
 
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop)
 {
-    return RunChild(options, observer, stop, pmutil::MakeLauncher());
+    return RunChild(options, observer, stop, MakeChildLauncher());
 }
 
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop,

@@ -256,10 +256,10 @@ def test_torture_is_interrupted(scene):
 
 
 def test_suspended_and_continued():
-    """As by Ctrl-Z and fg: the whole run stands still, and goes on."""
-    with Watched("run", "--assay", CHILD, "--", "sleep", "2000", "out", 'assayStart="x"', "out",
-                 'assayEnd="y"') as watched:
-        until(lambda: watched.worker() and children_of(watched), "no child")
+    """As by Ctrl-Z and fg: the whole run stands still, and goes on; so do grandchildren."""
+    with Watched("run", "--assay", CHILD, "--", "spawn", "60000", "sleep", "2000", "out",
+                 'assayStart="x"', "out", 'assayEnd="y"') as watched:
+        until(lambda: watched.worker() and len(children_of(watched)) == 2, "no grandchild")
         everybody = [watched.process.pid, watched.worker(), *children_of(watched)]
         watched.process.send_signal(signal.SIGTSTP)
         until(lambda: all(state_of(each) == "T" for each in everybody), "not stopped")

@@ -3,6 +3,7 @@ clearly what it saw, keeps its memory bounded, and leaves no process behind."""
 
 import os
 import re
+import signal
 import struct
 import time
 
@@ -219,12 +220,19 @@ def test_stopped_child(tmp_path):
     assert verdict_of(run_child(script_child(tmp_path, "kill -STOP $$"))) == "hung"
 
 
-def test_child_that_kills_its_group(tmp_path):
-    """A host of its own group survives no such thing; as a shell's job it is in one of its own."""
-    child = script_child(tmp_path, "kill -KILL $$")
-    document = run_child(child).document()
+@pytest.mark.parametrize("name", ["KILL", "TERM", "HUP", "INT", "QUIT", "ABRT", "USR1"])
+def test_child_that_kills_its_group(tmp_path, name):
+    document = run_child(script_child(tmp_path, f"sleep 1000 & kill -{name} 0; sleep 1000")).document()
     assert document["outcome"]["verdict"] == "crashed"
-    assert document["outcome"]["termination"].startswith("signal 9 ")
+    number = signal.Signals["SIG" + name].value
+    assert document["outcome"]["termination"].startswith(f"signal {number} ")
+
+
+@pytest.mark.parametrize("name", ["STOP", "TSTP", "TTIN"])
+def test_child_that_stops_its_group(tmp_path, name):
+    run = run_child(script_child(tmp_path, f"sleep 1000 & kill -{name} 0; sleep 1000"))
+    assert verdict_of(run) == "hung"
+    assert run.seconds >= TIMEOUT
 
 
 def test_arguments_reach_the_child_as_they_are():
@@ -387,7 +395,6 @@ def test_output_on_a_device():
 def test_output_on_a_full_disk(tmp_path):
     """The limit on a file's size stands for the disk."""
     import resource
-    import signal
 
     def limit():
         signal.signal(signal.SIGXFSZ, signal.SIG_IGN)

@@ -8,6 +8,7 @@
 
 #include "supervise/Interrupt.h"
 #include "supervise/ProcessTree.h"
+#include "supervise/linux/Children.h"
 #include "supervise/linux/Guarded.h"
 
 namespace assay_host {
@@ -46,14 +47,12 @@ public:
     [[noreturn]] void Watch(const sigset_t& awaited)
     {
         siginfo_t end = {};
-        for (;;) {
+        while (end.si_pid == 0) {
             const int number = ::sigwaitinfo(&awaited, nullptr);
             if (number == SIGCHLD) {
-                if (::waitid(P_PID, static_cast<id_t>(fWorker), &end, WEXITED | WNOHANG) == 0 &&
-                    end.si_pid != 0)
-                    break;
+                end = TakeChange();
             } else if (number == SIGTSTP) {
-                Suspend();
+                ::kill(fWorker, SIGSTOP); // Suspend follows once it has stopped
             } else if (number > 0) {
                 ::kill(fWorker, number); // a number that is its own until it is waited for
             }
@@ -65,12 +64,34 @@ public:
     }
 
 private:
-    // The worker's group isn't the terminal's, and so isn't reached by Ctrl-Z.
+    // The worker's end; zeros if it hasn't ended.
+    siginfo_t TakeChange() const
+    {
+        siginfo_t change = {};
+        ::waitid(P_PID, static_cast<id_t>(fWorker), &change, WEXITED | WSTOPPED | WNOHANG);
+        if (change.si_code != CLD_STOPPED)
+            return change;
+        Suspend();
+        return {};
+    }
+
+    // Ctrl-Z reaches this process alone: the worker's group and the child's aren't the terminal's.
+    // The worker has stopped, so that it starts no child and no child's number becomes another's.
     void Suspend() const
     {
-        ::kill(-fWorker, SIGSTOP);
+        SignalChildren(SIGSTOP);
         ::kill(::getpid(), SIGSTOP);
-        ::kill(-fWorker, SIGCONT);
+        SignalChildren(SIGCONT);
+        ::kill(fWorker, SIGCONT);
+    }
+
+    // With what they started, as far as that is in the groups that they lead.
+    void SignalChildren(int number) const
+    {
+        for (const auto& [child, state] : ListChildren(fWorker)) {
+            ::kill(child, number);
+            ::kill(-child, number);
+        }
     }
 
     [[noreturn]] static void EndBy(int number)

@@ -16,4 +16,9 @@ ChildCommand MakeChildCommand(const std::string& program, const std::vector<std:
     return command;
 }
 
+boost::shared_ptr<pmutil::Launcher> MakeChildLauncher()
+{
+    return pmutil::MakeLauncher();
+}
+
 } // namespace assay_host

@@ -15,7 +15,11 @@ class ChildProcess;
 
 class LauncherPosix : public Launcher {
 public:
-    LauncherPosix();
+    // The process group of a child. A signal that a process sends to its own group (kill(0, ...))
+    // reaches the host too where the child has the host's group, as by default.
+    enum class Group { kOfHost, kOwn };
+
+    explicit LauncherPosix(Group group = Group::kOfHost);
     ~LauncherPosix() override;
 
     // `program` is used in UTF-8, without a search; arguments are passed byte by byte. A failed
@@ -39,6 +43,7 @@ private:
 
     boost::shared_ptr<ChildProcess> GetChild() const;
 
+    const Group fGroup;
     mutable boost::mutex fMutex;
     boost::shared_ptr<ChildProcess> fChild; // that of the latest launch
 };

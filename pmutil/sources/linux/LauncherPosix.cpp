@@ -71,7 +71,7 @@ private:
     }
 };
 
-// What posix_spawn is told about the child's descriptors and signals.
+// What posix_spawn is told about the child's descriptors, signals and process group.
 class SpawnOptions {
 public:
     SpawnOptions()
@@ -107,9 +107,10 @@ public:
         ::sigemptyset(&none);
         Check(::posix_spawnattr_setsigdefault(&fAttributes, &all));
         Check(::posix_spawnattr_setsigmask(&fAttributes, &none));
-        Check(::posix_spawnattr_setflags(&fAttributes,
-                                         POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSIGMASK));
+        AddFlags(POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSIGMASK);
     }
+
+    void MakeGroup() { AddFlags(POSIX_SPAWN_SETPGROUP); } // numbered as the child, by default
 
     const posix_spawn_file_actions_t* GetActions() const { return &fActions; }
     const posix_spawnattr_t* GetAttributes() const { return &fAttributes; }
@@ -121,6 +122,13 @@ private:
             throw CallFailure{"posix_spawn", error};
     }
 
+    void AddFlags(int flags)
+    {
+        fFlags = static_cast<short>(fFlags | flags);
+        Check(::posix_spawnattr_setflags(&fAttributes, fFlags));
+    }
+
+    short fFlags = 0;
     posix_spawn_file_actions_t fActions{};
     posix_spawnattr_t fAttributes{};
 };
@@ -159,7 +167,7 @@ void LogPipe(const char* stream, const ChildPipe& pipe)
 
 } // namespace
 
-LauncherPosix::LauncherPosix() = default;
+LauncherPosix::LauncherPosix(Group group) : fGroup(group) {}
 LauncherPosix::~LauncherPosix() = default;
 
 boost::shared_ptr<ChildProcess> LauncherPosix::GetChild() const
@@ -204,6 +212,8 @@ LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std:
     options.SetStream(STDERR_FILENO, *error.writer);
     options.CloseOthers();
     options.ResetSignals();
+    if (fGroup == Group::kOwn)
+        options.MakeGroup();
 
     // Made first, so that no failure can come between the process and its owner.
     const auto child = boost::make_shared<ChildProcess>();

@@ -10,6 +10,7 @@
 #include <gmock/gmock.h>
 #include <memory>
 #include <spawn.h>
+#include <sstream>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -54,6 +55,20 @@ struct Outcome {
     std::string out;
 };
 
+// The number of the process group of a shell, and of the shell.
+std::vector<::pid_t> LaunchForGroup(LauncherPosix&& launcher)
+{
+    LaunchResult ends = launcher.Launch(
+        L"/bin/sh", {"-c", "read -r pid name state parent group rest </proc/self/stat\n"
+                           "echo $group $pid"});
+    std::istringstream text(ReadRest(*ends.fAppOutput[1]));
+    int exitCode = 0;
+    launcher.Wait(&exitCode);
+    std::vector<::pid_t> numbers(2);
+    text >> numbers[0] >> numbers[1];
+    return numbers;
+}
+
 Outcome RunChild(const std::deque<std::string>& args)
 {
     LauncherPosix launcher;
@@ -63,6 +78,16 @@ Outcome RunChild(const std::deque<std::string>& args)
     run.out = ReadRest(*ends.fAppOutput[1]);
     run.result = launcher.Wait(&run.exitCode);
     return run;
+}
+
+TEST(LauncherPosix, TheChildHasTheHostsGroupOrItsOwn)
+{
+    const std::vector<::pid_t> shared = LaunchForGroup(LauncherPosix());
+    EXPECT_EQ(shared[0], ::getpgrp());
+    EXPECT_NE(shared[0], shared[1]);
+    const std::vector<::pid_t> own = LaunchForGroup(LauncherPosix(LauncherPosix::Group::kOwn));
+    EXPECT_GT(own[0], 0);
+    EXPECT_EQ(own[0], own[1]);
 }
 
 TEST(LauncherPosix, ArgumentsArriveByteByByte)
