@@ -21,11 +21,6 @@ const QGF::OCL::FunctionTable& Table()
     return QGF::OCL::ExtensionManager::instance().table();
 }
 
-std::string CutAtZero(const std::string& text)
-{
-    return text.substr(0, text.find('\0'));
-}
-
 std::string WithoutVersionPrefix(const std::string& text)
 {
     return text.compare(0, kVersionPrefix.size(), kVersionPrefix) == 0
@@ -49,7 +44,7 @@ void SplitVersion(const QGF::OCL::Device& device, std::string& platformVersion,
     constexpr std::string_view kCUDA = " CUDA ";
     platformVersion.clear();
     cudaVersion.clear();
-    std::string text = WithoutVersionPrefix(CutAtZero(device.platform().version()));
+    std::string text = WithoutVersionPrefix(device.platform().version());
     const std::size_t match = text.find(kCUDA);
     if (match != std::string::npos) {
         cudaVersion = text.substr(match + kCUDA.size());
@@ -90,12 +85,12 @@ std::uint32_t GPUImplHardware::DoGetCLMemoryMB()
 
 std::string GPUImplHardware::DoGetCLName()
 {
-    return CutAtZero(device.name());
+    return device.name();
 }
 
 std::string GPUImplHardware::DoGetCLVendor()
 {
-    return CutAtZero(device.vendor());
+    return device.vendor();
 }
 
 std::uint32_t GPUImplHardware::DoGetCLVendorID()

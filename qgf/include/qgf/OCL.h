@@ -112,8 +112,8 @@ public:
     explicit Device(cl_device_id device) : OpenCLObjectWrapper(device) {}
 
     Platform platform() const;
-    // The device's own texts, zero bytes included, less those at the end. Throw std::bad_alloc if
-    // there is no room for what the driver claims.
+    // The device's own texts, up to their first zero byte. Throw std::bad_alloc if there is no room
+    // for what the driver claims.
     std::string name() const;
     std::string vendor() const;
 
@@ -142,7 +142,8 @@ public:
 
     // The devices of that type in the platform's order; empty if it says "device not found".
     std::vector<Device> devices(cl_device_type type) const;
-    // Throws std::bad_alloc if there is no room for what the driver claims.
+    // Up to its first zero byte. Throws std::bad_alloc if there is no room for what the driver
+    // claims.
     std::string version() const;
 };
 

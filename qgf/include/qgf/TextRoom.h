@@ -17,11 +17,9 @@ public:
     // length + 1 bytes to write to; the last one doesn't count as text.
     char* data() { return fBytes.get(); }
 
-    // The text up to its first zero byte.
+    // The text up to its first zero byte. What follows isn't looked at: reading it would cost as
+    // much as the driver claims.
     std::string beforeFirstZero() const;
-
-    // The text without the zero bytes at its end.
-    std::string withoutLastZeros() const;
 
 private:
     struct Free {

@@ -16,7 +16,7 @@ void TextRoom::Free::operator()(char* bytes) const noexcept
 
 TextRoom::TextRoom(std::size_t length) : fLength(length)
 {
-    // No object is larger, and the byte behind the text must not make the size wrap around.
+    // No object is larger, and the byte after the text must not make the size wrap around.
     if (length < static_cast<std::size_t>(std::numeric_limits<std::ptrdiff_t>::max()))
         fBytes.reset(static_cast<char*>(std::calloc(length + 1, 1)));
     if (!fBytes)
@@ -27,14 +27,6 @@ std::string TextRoom::beforeFirstZero() const
 {
     const char* const begin = fBytes.get();
     return {begin, std::find(begin, begin + fLength, '\0')};
-}
-
-std::string TextRoom::withoutLastZeros() const
-{
-    std::size_t length = fLength;
-    while (length > 0 && fBytes.get()[length - 1] == '\0')
-        --length;
-    return std::string(fBytes.get(), length);
 }
 
 } // namespace Core

@@ -14,9 +14,9 @@ namespace OCL {
 // What a driver may claim before it isn't believed any more.
 inline constexpr cl_uint kMaxListEntries = 4096;
 
-// The text that `query(size, value, actualSize)` gives, zero bytes included, less those at its end.
-// Throws LogicalException with the call's name if the driver refuses, and std::bad_alloc if there
-// is no room for what it claims.
+// The text that `query(size, value, actualSize)` gives, up to its first zero byte. Throws
+// LogicalException with the call's name if the driver refuses, and std::bad_alloc if there is no
+// room for what it claims.
 template <typename Query>
 std::string ReadText(const char* call, const Query& query)
 {
@@ -26,7 +26,7 @@ std::string ReadText(const char* call, const Query& query)
         return {};
     Core::TextRoom room(size);
     CheckStatus(call, query(size, room.data(), nullptr));
-    return room.withoutLastZeros();
+    return room.beforeFirstZero();
 }
 
 // The handles that `query(count, handles, actualCount)` gives; none if it answers `emptyStatus`.
