@@ -156,7 +156,9 @@ void Reader::DoClose()
 void Reader::DropPushback()
 {
     fPushback.reset();
-    fPreviewIsStale = fPreviewer != nullptr;
+    // Within a preview's own read there is no previewer, and what was stale stays it.
+    if (fPreviewer != nullptr)
+        fPreviewIsStale = true;
 }
 
 } // namespace pmutil

@@ -55,6 +55,55 @@ TEST(Previewer, PutsNothingBackAcrossASeek)
     EXPECT_EQ(ReadSomeText(source, 9), "bc");
 }
 
+// Goes on with a second buffer where the first one ends.
+class Chain : public pmutil::RandomAccess {
+public:
+    Chain(Buffer& first, Buffer& second) : RandomAccess(&first), fSecond(second) {}
+
+private:
+    std::uint64_t BinioReadSome(void* bytes, std::uint64_t nbytes) override
+    {
+        const std::uint64_t count = RandomAccess::BinioReadSome(bytes, nbytes);
+        if (count > 0)
+            return count;
+        SetRandomAccess(&fSecond, false);
+        return RandomAccess::BinioReadSome(bytes, nbytes);
+    }
+
+    Buffer& fSecond;
+};
+
+TEST(Previewer, PutsBackWhatASourceReadsAcrossATargetThatItChangesItself)
+{
+    char one[] = "ab";
+    char two[] = "cd";
+    Buffer first(one, 2);
+    Buffer second(two, 2);
+    Chain chain(first, second);
+    {
+        Previewer preview(chain);
+        EXPECT_EQ(ReadSomeText(preview, 9), "ab");
+        EXPECT_EQ(ReadSomeText(preview, 9), "cd");
+    }
+    EXPECT_EQ(ReadSomeText(chain, 9), "abcd");
+}
+
+TEST(Previewer, PutsNothingBackAcrossASeekEvenIfTheSourceThenChangesItsTarget)
+{
+    char one[] = "ab";
+    char two[] = "cd";
+    Buffer first(one, 2);
+    Buffer second(two, 2);
+    Chain chain(first, second);
+    {
+        Previewer preview(chain);
+        EXPECT_EQ(ReadSomeText(preview, 2), "ab");
+        chain.SeekEnd();
+        EXPECT_EQ(ReadSomeText(preview, 1), "c");
+    }
+    EXPECT_EQ(ReadSomeText(chain, 9), "d");
+}
+
 TEST(Previewer, EndsWithItsScope)
 {
     FakeChannel source;
