@@ -33,8 +33,9 @@ private:
 };
 
 // Writes to standard output in the form of a comment of the report: each line begins with "# ". A
-// line goes out in one piece when it is flushed; one that standard output takes in part only leaves
-// the next line, of the log or of the report, on a line of its own (PutLine).
+// line goes out in one piece when it is flushed, at the latest when the logger is destroyed. If
+// standard output takes only a part of it, the next line, of the log or of the report, begins on a
+// line of its own (PutLine).
 class AssayLogger : public PMStdioLogger {
 public:
     AssayLogger();

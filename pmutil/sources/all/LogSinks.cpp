@@ -98,7 +98,14 @@ void PMStdioLogger::Write(const char* data, std::size_t size)
 
 AssayLogger::AssayLogger() : PMStdioLogger(stdout) {}
 
-AssayLogger::~AssayLogger() = default;
+AssayLogger::~AssayLogger()
+{
+    try {
+        AssayLogger::Flush();
+    } catch (...) {
+        // What was left is lost, as on a stream that fails.
+    }
+}
 
 std::string AssayLogger::GetPrefix(const char* file, int line)
 {

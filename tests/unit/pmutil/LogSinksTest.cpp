@@ -113,6 +113,17 @@ TEST_F(LogSinksTest, AssayLoggerWritesReportCommentsToStandardOutput)
     EXPECT_THAT(text, EndsWith("] two\n"));
 }
 
+TEST_F(LogSinksTest, AssayLoggerLosesNothingThatWasNotFlushed)
+{
+    testing::internal::CaptureStdout();
+    {
+        AssayLogger logger;
+        logger.WriteText("one ", 4);
+        logger.WriteText("two", 3);
+    }
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "one two");
+}
+
 class PMFileLoggerTest : public LogSinksTest {
 protected:
     std::wstring WideFolder() const { return fFolder.Path().wstring(GetPathCodecvt()); }
