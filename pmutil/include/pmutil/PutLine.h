@@ -10,13 +10,13 @@
 
 namespace pmutil {
 
-// Writes `line`, which ends in a line end, by one call of put(text), which gives how many of the
-// text's bytes `stream` took. False if it didn't take all: the line is lost then. If it took a
-// part, the next line begins with a line end, so that it stands on a line of its own. Until then
-// the stream's error indicator stays set, by which everybody who writes lines to the stream knows.
+// Writes `line`, which ends in a line end, by one call of put(text), which returns how many of the
+// text's bytes `stream` took. Returns false if it didn't take all; the line is lost then. If it
+// took a part, the next line begins with a line end, so that it stands on a line of its own. The
+// stream's error indicator stays set until then, so that all writers of lines share that state.
 //
-// Only an unbuffered stream tells how much it took; one that is buffered says so of the line, and
-// fails when it is flushed.
+// The stream must be unbuffered for that: a buffered one takes any line whole, and fails when it is
+// flushed.
 template <typename Put>
 bool PutLine(std::FILE* stream, std::string line, const Put& put)
 {

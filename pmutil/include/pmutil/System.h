@@ -33,7 +33,7 @@ std::wstring GetCurrentDirectoryPath();
 std::FILE* OpenSharedAppend(const std::string& path);
 
 // Throws away what `stream` holds unwritten after a failed write, so that a later line is tried
-// afresh and the lost one never turns up behind it.
+// afresh and the lost one never turns up after it.
 void DiscardUnwritten(std::FILE* stream);
 
 // Makes the process independent of how it was started. Call it first in main, before any thread.

@@ -85,7 +85,7 @@ PMLogger::PMLogger(const std::string& name) : fName(name)
         if (PMLogger* const previous = Below(this))
             previous->LogPrintf(__FILE__, __LINE__, "Activating new logger %s", fName.c_str());
     } catch (...) {
-        // The previous logger's trouble is none of this one's.
+        // This logger is made all the same.
     }
 }
 

@@ -19,7 +19,7 @@ namespace pmutil {
 
 namespace {
 
-// How long Kill waits to see off a child that nobody waits for.
+// How long Kill waits for the end of a child that nobody waits for, to reap it.
 constexpr int kReapMilliseconds = 1000;
 
 // The C library's own are missing from older ones, and not meant for C++ in others.
@@ -33,7 +33,7 @@ int SendSignal(int pidfd, int number)
     return static_cast<int>(::syscall(SYS_pidfd_send_signal, pidfd, number, nullptr, 0));
 }
 
-// True once the process behind `pidfd` has ended, waiting up to `milliseconds`, or without a limit
+// True once the process of `pidfd` has ended, waiting up to `milliseconds`, or without a limit
 // for -1.
 bool PollEnd(int pidfd, int milliseconds)
 {

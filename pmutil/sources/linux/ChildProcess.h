@@ -18,8 +18,7 @@ class ChildProcess {
 public:
     ChildProcess();
 
-    // A child that wasn't waited for is left to itself, and its end seen off by a later
-    // ReapOrphans.
+    // A child that wasn't waited for is left to itself, and reaped by a later ReapOrphans.
     ~ChildProcess();
     ChildProcess(const ChildProcess&) = delete;
     ChildProcess& operator=(const ChildProcess&) = delete;
@@ -48,7 +47,7 @@ private:
     siginfo_t fEnd{};
 };
 
-// Sees off the children that nobody waited for and that have ended since.
+// Reaps the children that nobody waited for and that have ended since.
 void ReapOrphans();
 
 } // namespace pmutil

@@ -36,7 +36,7 @@ Bytes Sum(Bytes total, std::uint64_t bytes)
                : std::nullopt;
 }
 
-// A head, and as many regions behind it as it says. An answer that is cut short is none.
+// A head, followed by as many regions as it says. An answer that is cut short is none.
 template <typename Region, typename Local>
 Bytes LocalMemory(const std::string& answer, std::size_t headSize, std::size_t count, Local local)
 {

@@ -78,8 +78,8 @@ std::string GetNarrowDesktopFolder()
     return named.empty() ? home + "/Desktop" : named;
 }
 
-// A soft limit of 1 is the kernel's word for "no core dump", to a file or to the program that
-// core_pattern names, which is how desktops raise their crash dialogs. 0 keeps away files only.
+// At a soft limit of 1 the kernel dumps no core, neither to a file nor to the program that
+// core_pattern names, which is how desktops raise their crash dialogs. 0 prevents files only.
 void PreventCoreDump()
 {
     rlimit limit{};

@@ -99,8 +99,8 @@ LONG WINAPI EndAtException(EXCEPTION_POINTERS* pointers)
     return answer == EXCEPTION_CONTINUE_EXECUTION ? answer : EXCEPTION_EXECUTE_HANDLER;
 }
 
-// What error reporting shows for crashes that the error mode doesn't cover, where the system can be
-// told.
+// Keeps error reporting from showing crashes that the error mode doesn't cover, on systems that
+// have the calls for it.
 void HideErrorReports()
 {
     constexpr DWORD kNoUI = 0x20; // WER_FAULT_REPORTING_NO_UI

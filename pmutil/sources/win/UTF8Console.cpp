@@ -17,7 +17,7 @@ bool IsConsole(DWORD stream)
     return GetConsoleMode(GetStdHandle(stream), &mode) != 0;
 }
 
-// Comes after the handlers that were added later, and only if none of them goes on with the run.
+// Called after the handlers that were added later, and only if none of them handled the event.
 BOOL WINAPI PutBackBeforeTheEnd(DWORD /*event*/)
 {
     UTF8Console::PutBack();

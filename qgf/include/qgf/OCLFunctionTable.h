@@ -16,7 +16,7 @@ namespace QGF {
 namespace OCL {
 
 // An entry point that nothing here calls, so that a library may lack it: the pointer is null then.
-// Whoever begins to call one makes it a plain function pointer first, and by that required.
+// To call one, make it a plain function pointer; it is required from then on.
 template <typename Function>
 struct Uncalled {
     Function address;

@@ -87,7 +87,7 @@ TEST_F(PutLineTest, ALineEndThatGotOutAloneMendsTheCut)
     EXPECT_THAT(fTaken, ElementsAre("cu", "\n", "two\n"));
 }
 
-TEST_F(PutLineTest, ALineThatIsCutBehindAMendedCutIsOneAgain)
+TEST_F(PutLineTest, ALineThatIsCutAfterAMendedCutIsOneAgain)
 {
     EXPECT_FALSE(Put("cut\n", 2));
     EXPECT_FALSE(Put("again\n", 3));

@@ -5,7 +5,7 @@ namespace OCL {
 
 namespace {
 
-// Each tells whether the table can do with what it was given.
+// Each returns whether the entry point is there or isn't needed.
 template <typename Function>
 bool Fill(Function& member, Core::Proc proc)
 {

@@ -1,4 +1,4 @@
-// Only links are read here, which no driver hears of. Where they come from: the nodes from
+// Only links are read here, which calls no driver. Where they come from: the nodes from
 // drm_sysfs_minor_alloc (drivers/gpu/drm/drm_sysfs.c), the framebuffers' parents from
 // sysfb_create_simplefb (drivers/firmware/sysfb_simplefb.c), virtio devices below PCI functions
 // from virtio_pci_probe (drivers/virtio/virtio_pci_common.c), all of Linux 6.12.
