@@ -33,8 +33,7 @@ void CheckNames(const std::string& text)
     const std::string model = QGF::NvidiaField(text, "Model");
     Require(IsOneLine(model));
     Require(model.empty() || (model.front() != ' ' && model.back() != ' '));
-    const std::string address = QGF::LastPciAddress(text);
-    Require(address.empty() || (QGF::IsPciAddress(address) && text.find(address) != text.npos));
+    Require(!QGF::IsPciAddress(text) || (text.size() >= 12 && IsOneLine(text)));
 }
 
 void CheckMemory(const std::string& text)

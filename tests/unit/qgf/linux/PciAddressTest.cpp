@@ -21,22 +21,5 @@ TEST(PciAddressTest, RefusesEverythingElse)
     }
 }
 
-TEST(PciAddressTest, TheLastAddressOfAPathIsTheDevices)
-{
-    EXPECT_EQ(LastPciAddress("../../devices/pci0000:00/0000:00:01.0/0000:01:00.0/drm/card0"),
-              "0000:01:00.0");
-    EXPECT_EQ(LastPciAddress("../../devices/pci0000:00/0000:00:02.0/virtio0/drm/card0"),
-              "0000:00:02.0");
-    EXPECT_EQ(LastPciAddress("0000:00:02.0"), "0000:00:02.0");
-    EXPECT_EQ(LastPciAddress("/0000:00:02.0/"), "0000:00:02.0");
-}
-
-TEST(PciAddressTest, APathWithoutAnAddressHasNone)
-{
-    EXPECT_EQ(LastPciAddress("../../devices/platform/vkms/drm/card0"), "");
-    EXPECT_EQ(LastPciAddress(""), "");
-    EXPECT_EQ(LastPciAddress("///"), "");
-}
-
 } // namespace
 } // namespace QGF

@@ -1,7 +1,5 @@
 #include "qgf/qgf_core/linux/PciAddress.h"
 
-#include <algorithm>
-
 namespace QGF {
 namespace {
 
@@ -28,23 +26,6 @@ bool IsPciAddress(const std::string& text)
         }
     }
     return text.back() <= '7';
-}
-
-std::string LastPciAddress(const std::string& path)
-{
-    std::size_t end = path.size();
-    for (;;) {
-        const std::size_t slash = end == 0 ? std::string::npos : path.rfind('/', end - 1);
-        const std::size_t begin = slash == std::string::npos ? 0 : slash + 1;
-        std::string part = path.substr(begin, end - begin);
-        if (IsPciAddress(part)) {
-            return part;
-        }
-        if (slash == std::string::npos) {
-            return std::string();
-        }
-        end = slash;
-    }
 }
 
 } // namespace QGF
