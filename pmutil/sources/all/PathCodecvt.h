@@ -6,7 +6,8 @@
 namespace pmutil {
 
 // The platform's conversion between wide and narrow path characters. It asks no environment
-// variable for a locale, which Boost's own default does.
+// variable for a locale, which Boost's own default does. On Windows a path that the code page of
+// the narrow calls can't represent is an error, and not another path.
 const boost::filesystem::path::codecvt_type& GetPathCodecvt();
 
 } // namespace pmutil
