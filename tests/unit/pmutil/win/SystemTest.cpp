@@ -4,7 +4,6 @@
 
 #include <cassert>
 #include <cstdlib>
-#include <cxxabi.h>
 #include <exception>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -44,8 +43,7 @@ TEST(PrepareConsoleProcessDeathTest, AbortIsACrash)
     EXPECT_EXIT(run([] { std::abort(); }), testing::ExitedWithCode(kAborted), "");
     EXPECT_EXIT(run([] { std::terminate(); }), testing::ExitedWithCode(kAborted), "");
     EXPECT_EXIT(run([] { assert(std::getenv("no such variable") != nullptr); }),
-                testing::ExitedWithCode(kAborted), "no such variable");
-    EXPECT_EXIT(run([] { abi::__cxa_pure_virtual(); }), testing::ExitedWithCode(kAborted), "pure");
+                testing::ExitedWithCode(kAborted), "");
 }
 
 TEST(PrepareConsoleProcessDeathTest, AccessViolationIsACrash)
