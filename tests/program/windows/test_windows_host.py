@@ -83,6 +83,15 @@ def test_ends_of_assay(options, verdict):
     assert document["outcome"]["verdict"] == verdict
 
 
+def test_options_reach_assay_as_they_are():
+    texts = ["a\\", 'a"b', "\u00e9\u65e5\U0001F600", "%PATH%^", " ", "tab\tand \\\" both\\\\"]
+    document = document_of(host_run("run", "--format", "json", "--", "-exit=5",
+                                    *[f"-stdout={text}" for text in texts]))
+    assert document["outcome"]["verdict"] == "complete"
+    assert document["outcome"]["exitStatus"] == 5
+    assert [line["text"] for line in document["lines"][:len(texts)]] == texts
+
+
 def test_crash():
     document = run_child("out", "QGFOGLInitialized=1", "abort")
     assert document["outcome"]["verdict"] == "crashed"
