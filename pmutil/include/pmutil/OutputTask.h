@@ -38,8 +38,8 @@ public:
     // consoleapp::Exception "no output task" if the task was readied for another, or discarded.
     void Run(const consoleapp::ExecutionData* launch = nullptr);
 
-    // Closes the reader if the task was readied for this launch and isn't in Run; a Run for this
-    // launch that comes later is refused.
+    // Closes the reader if the task was readied for this launch and Run wasn't called since; a Run
+    // for this launch that comes later is refused.
     void Discard(const consoleapp::ExecutionData* launch) noexcept;
 
     // Whether the task runs. Waits up to `maxWaitSeconds` for one that doesn't.
@@ -62,7 +62,8 @@ private:
 
     boost::shared_ptr<Reader> fReader;
     bool fIsRunning = false;
-    bool fIsInRun = false; // from the begin of Run until it returns
+    bool fIsReadied = false; // from Prepare until Run
+    bool fIsInRun = false;   // from the begin of Run until it returns
 };
 
 } // namespace pmutil

@@ -59,15 +59,17 @@ void OutputTask::Prepare(OutputChannel channel, boost::shared_ptr<ExecutionData>
     fTaskID = id;
     fExecutionData.swap(data);
     fReader.swap(reader);
+    fIsReadied = true;
 }
 
 void OutputTask::Run(const ExecutionData* launch)
 {
-    PM_LOG(gConsoleAppLog, "OutputTask::Run " << fTaskID);
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
+        PM_LOG(gConsoleAppLog, "OutputTask::Run " << fTaskID);
         if (launch != nullptr && launch != fExecutionData.get())
             throw consoleapp::Exception(fTaskID, "no output task");
+        fIsReadied = false;
         fIsInRun = true;
     }
     try {
@@ -102,7 +104,7 @@ void OutputTask::Discard(const ExecutionData* launch) noexcept
 {
     try {
         Lock lock(fMutex);
-        if (fIsInRun || launch == nullptr || launch != fExecutionData.get())
+        if (!fIsReadied || launch == nullptr || launch != fExecutionData.get())
             return;
         fExecutionData.reset();
         CloseReader(lock);

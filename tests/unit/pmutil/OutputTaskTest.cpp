@@ -210,4 +210,15 @@ TEST(OutputTask, DiscardEndsALaunchBeforeItsRun)
     EXPECT_FALSE(next->fOpen);
 }
 
+TEST(OutputTask, DiscardLeavesATaskThatHasRunAlone)
+{
+    const auto data = MakeData();
+    RecordingTask task;
+    task.Prepare(OutputChannel::kStdout, data, boost::make_shared<FakeChannel>());
+    task.Run(data.get());
+    task.Discard(data.get());
+    EXPECT_THAT(task.fCalls, ElementsAre("begin locked", "run", "end locked", "close locked"));
+    EXPECT_EQ(task.GetExecutionData(), data);
+}
+
 } // namespace
