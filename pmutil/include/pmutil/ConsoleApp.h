@@ -161,6 +161,7 @@ private:
     State WaitForEnd(LaunchNumber launch, int& exitCode, double deadline);
     bool JoinAfterEnd(LaunchNumber launch, double deadline);
     bool IsOver(LaunchNumber launch);
+    bool HoldsThread(LaunchNumber launch);
     bool AwaitThreadEnd(LaunchNumber launch, double seconds);
     bool JoinEndedThread(LaunchNumber launch);
     bool TimedJoin(LaunchNumber launch, double seconds);

@@ -46,6 +46,16 @@ bool IsLinked(const ExecutionData* launch)
     return launch == nullptr || launch->HasConsoleApp();
 }
 
+// The threads of the launch reach neither the application nor the tasks any more.
+void Unlink(const boost::shared_ptr<ExecutionData>& data)
+{
+    if (data == nullptr)
+        return;
+    data->ClearConsoleApp();
+    data->SetOutputTask(OutputChannel::kStdout, {});
+    data->SetOutputTask(OutputChannel::kStderr, {});
+}
+
 bool HasEnded(State state)
 {
     return state == State::kFinished || state == State::kCrashed || state == State::kKilled;
@@ -193,15 +203,23 @@ bool ConsoleApp::JoinAfterEnd(LaunchNumber launch, double deadline)
     PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread.TimedJoin(" << joinWait << ")");
     const bool ended = AwaitThreadEnd(launch, joinWait);
     const JoinLock joinLock(fJoinMutex);
-    if (IsOver(launch))
-        return true;
-    if (!ended || !JoinEndedThread(launch)) {
+    // If another thread joined it or gave it up, the end that was seen counts all the same.
+    if (HoldsThread(launch) && (!ended || !JoinEndedThread(launch))) {
         PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread never finished");
         GiveThreadUp();
         return false;
     }
-    SetState(State::kIdle);
+    if (!IsOver(launch))
+        SetState(State::kIdle);
     return true;
+}
+
+// Whether the launcher's thread of this launch was neither joined nor given up. With fJoinMutex
+// held, true stays true.
+bool ConsoleApp::HoldsThread(LaunchNumber launch)
+{
+    const Lock lock(fMutex);
+    return fLaunchNumber == launch && fThreadEnd != nullptr;
 }
 
 // Whether another thread has brought the launch to its end, so that nothing is left of it.
@@ -227,11 +245,8 @@ bool ConsoleApp::AwaitThreadEnd(LaunchNumber launch, double seconds)
 // With fJoinMutex held, after AwaitThreadEnd. False if the thread isn't held any more.
 bool ConsoleApp::JoinEndedThread(LaunchNumber launch)
 {
-    {
-        const Lock lock(fMutex);
-        if (fLaunchNumber != launch)
-            return false;
-    }
+    if (!HoldsThread(launch))
+        return false;
     const boost::this_thread::disable_interruption uninterrupted;
     if (!fLauncherThread.TimedJoin(kThreadExitSeconds))
         return false;
@@ -303,7 +318,7 @@ void ConsoleApp::HandleWaitException(Lock& lock, const std::exception* exc, doub
     lock.unlock();
     if (!mayJoin || !TimedJoin(launch, waitSeconds)) {
         const JoinLock joinLock(fJoinMutex);
-        if (!IsOver(launch) && fLauncherThread.HoldsThread()) {
+        if (HoldsThread(launch)) {
             PM_LOG(gConsoleAppLog, "abandon fLauncherThread");
             GiveThreadUp();
         }
@@ -391,11 +406,7 @@ void ConsoleApp::ResetLaunch(LaunchNumber launch)
         if (fLaunchNumber == launch)
             data = fExecutionData;
     }
-    if (data != nullptr) {
-        data->ClearConsoleApp();
-        data->SetOutputTask(OutputChannel::kStdout, {});
-        data->SetOutputTask(OutputChannel::kStderr, {});
-    }
+    Unlink(data);
     const bool ended = AwaitThreadEnd(launch, GetShortWaitSeconds());
     const JoinLock joinLock(fJoinMutex);
     Lock lock(fMutex);

@@ -45,6 +45,11 @@ protected:
             const NoShortWait noWait;
             fApp->Reset();
         }
+        ReplaceTasks();
+    }
+
+    void ReplaceTasks()
+    {
         fOldTasks = {fStdout, fStderr};
         fStdout = boost::make_shared<PatientTask>();
         fStderr = boost::make_shared<PatientTask>();
@@ -72,6 +77,12 @@ protected:
         });
     }
 
+    void ForgetLines()
+    {
+        const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
+        fLogger.lines.clear();
+    }
+
     static long CountIdleThreads()
     {
         boost::thread([] {}).join(); // a sanitizer adds one of its own to the first
@@ -82,7 +93,7 @@ protected:
     // A short wait that nothing comes to the end of.
     const DebugValueSetter fLongShortWait{"ConsoleAppShortWaitSecondsMinusOne", 599};
     const DebugValueSetter fLog{"ConsoleAppLog", 1};
-    const RecordingLogger fLogger;
+    RecordingLogger fLogger;
     boost::shared_ptr<FakeLauncher> fSecond = boost::make_shared<FakeLauncher>();
     std::atomic<int> fMade{0};
     std::vector<boost::shared_ptr<PatientTask>> fOldTasks;
@@ -265,6 +276,32 @@ TEST_F(GivenUpLaunch, AWaiterThatSawTheEndKeepsTheCode)
     waiter.join();
     EXPECT_EQ(end, State::kFinished);
     EXPECT_EQ(exitCode, 7);
+}
+
+TEST_F(GivenUpLaunch, AWaiterThatSawTheEndKeepsTheCodeWhenTheWaitOfAnotherFails)
+{
+    HoldIn("OnFinished 7");
+    for (int round = 0; round < 50; ++round) { // either may be the one who joins
+        fGate->Close();
+        ForgetLines();
+        Launch();
+        State end = State::kUndefined;
+        int exitCode = -1;
+        boost::thread waiter([&] { end = fApp->Wait(&exitCode, 10 * kLong); });
+        End(kEndedNormally, 7);
+        EXPECT_TRUE(AwaitLine(kJoinsAfterEnd));
+        fApp->NotifyFailure(Exception(TaskID::kClient, "ouch"));
+        boost::thread other([&] {
+            EXPECT_TRUE(ThrowsFailure("Client: ouch", [&] { fApp->Wait(nullptr, 10 * kLong); }));
+        });
+        EXPECT_TRUE(AwaitLine("TimedJoin("));
+        fGate->Open();
+        waiter.join();
+        other.join();
+        ASSERT_EQ(end, State::kFinished);
+        ASSERT_EQ(exitCode, 7);
+        ASSERT_EQ(Peek(), State::kIdle);
+    }
 }
 
 TEST_F(GivenUpLaunch, AWaiterOfItLeavesTheNextAlone)
