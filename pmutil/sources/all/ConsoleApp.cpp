@@ -105,6 +105,9 @@ void ConsoleApp::Launch(const boost::shared_ptr<ExecutionData>& data, const Laun
     const LaunchNumber launch = ++fLaunchNumber;
     try {
         SetStateLocked(lock, State::kLaunching);
+        // A pump of the last launch may go on though its launcher's thread was joined.
+        if (fExecutionData != data)
+            Unlink(fExecutionData);
         fExecutionData = data;
         fLaunchParams = params;
         {

@@ -205,6 +205,38 @@ TEST_F(GivenUpLaunch, HasNoSayInTheNext)
     EXPECT_TRUE(ThrowsFailure("Launcher: mine", [&] { Peek(); }));
 }
 
+TEST_F(GivenUpLaunch, ItsPumpHasNoSayInTheNextEvenIfItsEndWasSeen)
+{
+    LaunchUntilItWaits();
+    {
+        const NoShortWait noWait;
+        fLauncher->End(kEndedNormally, 7);
+        for (int pump = 0; pump < 2; ++pump) // each gives its failure to a GetState
+            EXPECT_TRUE(Eventually([&] {
+                try {
+                    Peek();
+                    return false;
+                } catch (const Exception&) {
+                    return true;
+                }
+            }));
+    }
+    int exitCode = -1;
+    EXPECT_EQ(fApp->Wait(&exitCode, kLong), State::kFinished);
+    EXPECT_EQ(exitCode, 7);
+    ReplaceTasks();
+    Launch();
+    for (auto& task : fOldTasks) {
+        const boost::weak_ptr<OutputTask> old = task;
+        task->fGate.Open();
+        task.reset();
+        EXPECT_TRUE(Eventually([&] { return old.expired(); }));
+    }
+    fOldTasks.clear();
+    EXPECT_EQ(fApp->CountEvents("end stdout") + fApp->CountEvents("end stderr"), 0);
+    EXPECT_EQ(Peek(), State::kRunning);
+}
+
 TEST_F(GivenUpLaunch, KeepsItsTasks)
 {
     LaunchUntilItWaits();
