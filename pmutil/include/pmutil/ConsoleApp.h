@@ -8,12 +8,12 @@
 // Clients derive from it if they want the notifications, and drive it through ConsoleAppLauncher.
 // Hold it by boost::shared_ptr.
 //
-// One Launcher serves all launches in turn, as long as the thread of each ends. The thread of a
-// launch that was given up keeps the launcher that it has, so that it reaches its own child and no
-// other; the next launch gets a new one from then on, if that thread still runs.
+// One Launcher serves all launches in turn, as long as the thread of each ends. If the thread of a
+// launch that was given up still runs at the next launch, it keeps the launcher that it has, so
+// that it reaches only its own child, and the next launch gets a new one.
 //
-// A boost::thread interruption ends a wait of a client as any failure does. Reset isn't
-// interrupted, and leaves an interruption for later.
+// A boost::thread interruption ends Launch, Wait, Kill and GetState as a failure does. Reset can't
+// be interrupted: the request stays pending.
 #pragma once
 
 #include <atomic>
@@ -77,8 +77,7 @@ public:
     State Wait(int* exitCode, double maxWaitSeconds);
 
     // Asks for the child's end if it is Running or the last wait ran out; doesn't wait for it.
-    // Waits up to the short wait for a stable state before, and for a WriteAppStdin that blocks
-    // without a limit. Throws the oldest stored failure.
+    // Waits up to the short wait for a stable state before. Throws the oldest stored failure.
     //
     // While the start lasts longer than the short wait there may be no child to kill yet: the call
     // is lost then, the launch goes on, and the client must call again.
@@ -88,8 +87,8 @@ public:
     // stored failure.
     State GetState(double maxWaitSeconds);
 
-    // Back to Idle whatever it was doing; gives the launcher's thread the short wait to end, none
-    // if the caller is that thread. The child isn't killed.
+    // Back to Idle whatever it was doing. Waits up to the short wait for the launcher's thread to
+    // end, and not at all if the caller is that thread. The child isn't killed.
     void Reset();
 
     // A bit for each thread of the launch that runs, at the place of its TaskID. Needs a launch,
@@ -97,7 +96,8 @@ public:
     unsigned GetTasksRunning();
 
     // The child's standard input; only with LaunchParams::fKeepStdin, from Running on. A write
-    // blocks while the pipe is full. Throw std::runtime_error "pmutil::Channel not open" and what
+    // blocks while the pipe is full, and so do all other operations meanwhile, without a limit:
+    // Wait, Kill and Reset too. Throw std::runtime_error "pmutil::Channel not open" and what
     // the channel throws; a null text throws std::invalid_argument
     // "ConsoleApp::WritelnAppStdin str=nullptr".
     void CloseAppStdin();
@@ -111,8 +111,8 @@ public:
     static double GetDefaultStateWaitSeconds();
 
     // For the threads of a launch, through ConsoleAppAccessor. `launch` is the one that the caller
-    // belongs to, null for that of the moment. One that was given up is refused with
-    // consoleapp::Exception "no console app", and has no failure or fault to throw.
+    // belongs to; null stands for the present one. The notifications of a launch that was given up
+    // throw consoleapp::Exception "no console app"; no failure or fault is thrown to its threads.
 
     void NotifyLaunching(TaskID who, const consoleapp::ExecutionData* launch = nullptr);
     void NotifyLaunched(TaskID who, const consoleapp::ExecutionData* launch = nullptr);
@@ -196,9 +196,9 @@ private:
     boost::shared_ptr<ThreadEnd> fThreadEnd;     // of fLauncherThread, while that holds a thread
     boost::shared_ptr<ThreadEnd> fGivenUpThread; // of the latest thread that was given up
 
-    // Held to join fLauncherThread once it has ended, or to let go of it; never while it goes on.
-    // Taken before fMutex. Only Launch, with fMutex and while Idle, when nobody joins, sets it
-    // without.
+    // Held to join fLauncherThread once it has ended, or to give it up; never to wait for its end.
+    // Taken before fMutex. Launch alone sets fLauncherThread without it, but with fMutex, while
+    // the state is Idle: no other thread uses it then.
     boost::mutex fJoinMutex;
 };
 

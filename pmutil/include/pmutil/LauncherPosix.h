@@ -29,8 +29,8 @@ public:
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override;
 
     // Throws std::runtime_error "waitid failed: No child processes" where something else in the
-    // host has taken the child's end, such as a handler that waits for any child, however early. A
-    // Kill signals nobody from then on: the child's number may be another process's.
+    // host has reaped the child, such as a handler that waits for any child, however early. A Kill
+    // signals nothing from then on: the child's number may be another process's.
     WaitResult Wait(int* exitCode) override;
     void Kill() override;
 

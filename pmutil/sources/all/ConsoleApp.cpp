@@ -30,7 +30,7 @@ DebugValue gShortWaitSecondsMinusOne{"ConsoleAppShortWaitSecondsMinusOne", 0};
 DebugValue gDefaultStateWaitSecondsTimesTenMinus1{"ConsoleAppDefaultStateWaitSecondsTimesTenMinus1",
                                                   0};
 
-// A thread that has told its end needs no more than this to end, on a machine that works.
+// More than a thread needs to exit after its ThreadEnd was set.
 constexpr double kThreadExitSeconds = 10.0;
 
 constexpr char kNotOpen[] = "pmutil::Channel not open";
@@ -40,7 +40,7 @@ const char* GetText(const std::exception* exc)
     return exc != nullptr ? exc->what() : "?";
 }
 
-// Whether a launch, null for that of the moment, wasn't given up.
+// Whether a launch wasn't given up; null stands for the present one.
 bool IsLinked(const ExecutionData* launch)
 {
     return launch == nullptr || launch->HasConsoleApp();
@@ -133,7 +133,7 @@ void ConsoleApp::Launch(const boost::shared_ptr<ExecutionData>& data, const Laun
     }
 }
 
-// Sees to it that fLauncher serves no other launch.
+// Makes a new fLauncher if a launch that was given up still uses the present one.
 void ConsoleApp::ReadyLauncherLocked()
 {
     if (fGivenUpThread != nullptr && !fGivenUpThread->HasEnded()) {
@@ -225,14 +225,14 @@ bool ConsoleApp::HoldsThread(LaunchNumber launch)
     return fLaunchNumber == launch && fThreadEnd != nullptr;
 }
 
-// Whether another thread has brought the launch to its end, so that nothing is left of it.
+// Whether another thread has joined or reset the launch already.
 bool ConsoleApp::IsOver(LaunchNumber launch)
 {
     const Lock lock(fMutex);
     return fLaunchNumber != launch || fState == State::kIdle;
 }
 
-// Waits until the launcher's thread of this launch comes to its end; false if it doesn't, or isn't
+// Waits for the end of the launcher's thread of this launch; false if it doesn't end, or isn't
 // held. No lock is held meanwhile, so that any number of threads may wait.
 bool ConsoleApp::AwaitThreadEnd(LaunchNumber launch, double seconds)
 {
@@ -258,7 +258,8 @@ bool ConsoleApp::JoinEndedThread(LaunchNumber launch)
     return true;
 }
 
-// With fJoinMutex held: the launcher's thread goes on with its launcher, and nobody waits for it.
+// With fJoinMutex held: the launcher's thread goes on with its launcher, and no thread waits for
+// it.
 void ConsoleApp::GiveThreadUp()
 {
     fLauncherThread.Abandon();
@@ -477,8 +478,8 @@ void ConsoleApp::WritelnAppStdin(const std::string& str)
     WriteAppStdin(reinterpret_cast<const unsigned char*>(line.data()), line.size());
 }
 
-// Reset unlinks a launch before it takes the mutex, and says what the state is after that: what
-// passes here before is a part of the launch still, and what comes later is refused.
+// Reset unlinks a launch before it takes the mutex to set the state: what passes here before that
+// still belongs to the launch, and Reset overwrites it; what comes later is refused.
 void ConsoleApp::RequireLinkedLocked(const Lock& /*lock*/, TaskID who,
                                      const ExecutionData* launch) const
 {

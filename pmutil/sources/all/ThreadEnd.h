@@ -1,5 +1,5 @@
-// The end of a thread, for any number of threads that wait for it, and threads that leave nothing
-// behind but their object.
+// The end of a thread, which any number of threads may wait for, and threads that release their
+// task when they end.
 #pragma once
 
 #include <memory>
@@ -13,7 +13,7 @@
 
 namespace pmutil {
 
-// A join, other than this, is for one thread at a time.
+// Unlike a join, which is for one thread at a time.
 class ThreadEnd {
 public:
     // For the thread: its first and its last statement.
@@ -26,7 +26,7 @@ public:
     // and as soon as the thread is given up.
     bool Await(double seconds) const;
 
-    // Nobody is to wait any longer.
+    // Ends all waits, now and later.
     void GiveUp();
 
 private:
@@ -37,8 +37,8 @@ private:
     bool fGivenUp = false;
 };
 
-// Starts a thread on a copy of `task`, which is destroyed when it has run: the thread's object may
-// stay registered for good. `end`, unless empty, learns of the end after that.
+// Starts a thread on a copy of `task`, which is destroyed when it has run, as the thread's object
+// may stay registered for ever. `end`, unless empty, is set after that.
 template <typename Task>
 std::unique_ptr<boost::thread> StartThread(const Task& task,
                                            const boost::shared_ptr<ThreadEnd>& end = nullptr)

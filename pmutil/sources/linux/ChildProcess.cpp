@@ -47,15 +47,15 @@ bool PollEnd(int pidfd, int milliseconds)
     return result > 0;
 }
 
-// Whether it is a child of this process that nobody has waited for.
+// Whether it is a child of this process that wasn't reaped yet.
 bool IsOwnChild(idtype_t type, int id)
 {
     siginfo_t info = {};
     return ::waitid(type, static_cast<id_t>(id), &info, WEXITED | WNOHANG | WNOWAIT) == 0;
 }
 
-// Children that nobody waits for any more. Each is looked after at times, so that it doesn't stay a
-// zombie for long once it has ended.
+// Children that no thread waits for any more. They are reaped at times, so that none stays a zombie
+// for long.
 class Orphans {
 public:
     static Orphans& Get()

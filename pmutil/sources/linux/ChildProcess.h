@@ -23,10 +23,10 @@ public:
     ChildProcess(const ChildProcess&) = delete;
     ChildProcess& operator=(const ChildProcess&) = delete;
 
-    // Called once, with a process just started. Where something else in this process has taken the
-    // child's end already, the number may be another process's by now: the child is lost then,
-    // which Wait tells, and nothing is signalled. Throws CallFailure if the child can't be
-    // followed, and ends it before.
+    // Called once, with a process just started. Where something else in this process has reaped the
+    // child already, the number may be another process's by now: the child is lost then, which Wait
+    // reports, and nothing is signalled. Throws CallFailure if the child can't be followed, and
+    // ends it before.
     void Adopt(::pid_t pid);
 
     // Throws std::runtime_error, "waitid failed: No child processes" for a lost child.
