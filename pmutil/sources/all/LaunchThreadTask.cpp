@@ -33,6 +33,14 @@ State GetEndState(int result)
     }
 }
 
+// The outputs first: when the child sees the end of its input, those without a task are closed.
+void ReleaseEnds(LaunchResult& result)
+{
+    for (boost::shared_ptr<Reader>& reader : result.fAppOutput)
+        reader.reset();
+    result.fAppInput.reset();
+}
+
 } // namespace
 
 LaunchThreadTask::LaunchThreadTask(boost::shared_ptr<ExecutionData> data,
@@ -100,7 +108,7 @@ void LaunchThreadTask::RunLaunch(bool& mustKill, LaunchResult& result, Threads& 
 
     // This thread keeps no end of a pipe: the child sees the end of its input when the client's
     // writer goes, and a reader's owner decides alone when it is closed.
-    result = LaunchResult();
+    ReleaseEnds(result);
 
     ThrowIfInjected(Fault::kLauncherWait, "LauncherWait");
     PM_LOG(gConsoleAppLog, "calling fLauncher->Wait");
@@ -151,7 +159,7 @@ void LaunchThreadTask::CleanupLaunchThreadTask(bool mustKill, LaunchResult& resu
                                  fExecutionData.get());
         PM_LOG(gConsoleAppLog, "CleanupLaunchThreadTask: calling fLauncher->Kill()");
         fLauncher->Kill();
-        result = LaunchResult();
+        ReleaseEnds(result);
     }
     for (const OutputChannel channel : kChannels) {
         ManagedThread& thread = threads[GetOutputIndex(channel)];

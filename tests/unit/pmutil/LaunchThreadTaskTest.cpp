@@ -182,6 +182,40 @@ TEST_F(LauncherThread, SeesALaunchFromStartToEnd)
     EXPECT_EQ(fLauncher->fOutput[2].use_count(), 1);
 }
 
+// Records in which order the ends of the pipes are released.
+class WatchedEnds : public FakeLauncher {
+public:
+    LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override
+    {
+        LaunchResult result = FakeLauncher::Launch(program, args);
+        Watch(result.fAppInput, "stdin");
+        Watch(result.fAppOutput[1], "stdout");
+        Watch(result.fAppOutput[2], "stderr");
+        return result;
+    }
+
+    std::vector<std::string> fReleased;
+
+private:
+    template <typename End>
+    void Watch(boost::shared_ptr<End>& end, const char* name)
+    {
+        end.reset(end.get(), [this, name, kept = end](End*) { fReleased.emplace_back(name); });
+    }
+};
+
+TEST_F(LauncherThread, ReleasesTheOutputsBeforeTheInput)
+{
+    const auto launcher = boost::make_shared<WatchedEnds>();
+    launcher->fOnLaunch = [&] { launcher->fEnded = true; };
+    for (const Fault fault : {Fault::kNoFault, Fault::kNotifyLaunched}) {
+        launcher->fReleased.clear();
+        fApp->SetInjectedFault(fault);
+        boost::thread(LaunchThreadTask(fData, launcher, fParams)).join();
+        EXPECT_THAT(launcher->fReleased, ElementsAre("stdout", "stderr", "stdin")) << fault;
+    }
+}
+
 TEST_F(LauncherThread, MapsTheResultsToStates)
 {
     const struct {
