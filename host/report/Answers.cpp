@@ -14,9 +14,6 @@ namespace assay_host {
 
 namespace {
 
-// More devices than any machine has; a child that makes up more costs no more memory.
-constexpr std::size_t kMostDevices = 256;
-
 constexpr DeviceKind kKinds[] = {DeviceKind::kOpenGL, DeviceKind::kOpenCL};
 
 std::optional<std::size_t> FindKnown(DeviceKind kind, std::string_view key)
@@ -117,15 +114,15 @@ void Collector::CollectDevices(DeviceKind kind)
     }
     if (const ReportLine* const line = fReport.Find(GetCountKey(kind))) {
         const std::uint64_t count = ReadUnsigned(line->fValue).value_or(0);
-        for (std::uint32_t index = 0; index < std::min<std::uint64_t>(count, kMostDevices); ++index)
+        for (std::uint32_t index = 0; index < std::min<std::uint64_t>(count, kMaxDevices); ++index)
             devices.emplace(index, nullptr);
     }
 
     std::vector<DeviceAnswers> found;
     std::optional<Position> last;
     for (const auto& [index, device] : devices) {
-        if (found.size() == kMostDevices) {
-            fAnswers.fDevicesLeftOut += devices.size() - kMostDevices;
+        if (found.size() == kMaxDevices) {
+            fAnswers.fDevicesLeftOut += devices.size() - kMaxDevices;
             break;
         }
         found.push_back(CollectDevice(kind, index, device));
@@ -146,7 +143,7 @@ void Collector::CollectDevices(DeviceKind kind)
 DeviceAnswers Collector::CollectDevice(DeviceKind kind, std::uint32_t index, const Device* device)
 {
     DeviceAnswers answers{};
-    answers.fTag = GetTagWord(kind) + std::string("[") + std::to_string(index) + "]";
+    answers.fTag = MakeTag(kind, index);
     answers.fKind = kind;
     answers.fIndex = index;
     for (const KnownKey& known : GetDeviceKeys(kind)) {
@@ -176,10 +173,10 @@ void Collector::JudgeMissing(DeviceAnswers& device, const std::optional<Position
         Answer& answer = device.fAnswers[key];
         if (answer.fLine)
             continue;
-        const bool isOptional = answer.fKey == kOptionalKey;
+        const bool isOptional = answer.fKnown->MayBeSilent();
         if (key < answered) {
             answer.fMissing = isOptional ? Missing::kNotPrinted : Missing::kUnreadable;
-        } else if (isOptional && device.GetValue("CUDASupported") == "0") {
+        } else if (isOptional && device.GetValue(answer.fKnown->fSilentWithout) == "0") {
             answer.fMissing = Missing::kNotPrinted;
         } else if (device.fFailed || isBehind || (last && Position{key, device.fIndex} < *last)) {
             answer.fMissing = Missing::kDeviceFailed;
@@ -192,13 +189,14 @@ void Collector::JudgeMissing(DeviceAnswers& device, const std::optional<Position
 
 void Collector::CollectReportKeys()
 {
-    const Table<const char*> keys = GetReportKeys();
+    const std::vector<const KnownKey*>& keys = GetReportKeys();
     std::unordered_set<std::string> known;
     for (std::size_t key = 0; key < keys.size(); ++key) {
-        const ReportLine* const line = fReport.Find(keys[key]);
+        const std::string& name = keys[key]->fKey;
+        const ReportLine* const line = fReport.Find(name);
         fAnswers.fReport.push_back(
-            {keys[key], nullptr, line, line ? Missing::kNot : JudgeMissingReportKey(key)});
-        known.insert(keys[key]);
+            {name, keys[key], line, line ? Missing::kNot : JudgeMissingReportKey(key)});
+        known.insert(name);
     }
     for (const ReportLine& line : fReport.GetLines()) {
         if (line.fKind == LineKind::kValue && !GetDeviceTag(line.fKey) &&
@@ -210,8 +208,8 @@ void Collector::CollectReportKeys()
 
 Missing Collector::JudgeMissingReportKey(std::size_t key) const
 {
-    const Table<const char*> keys = GetReportKeys();
-    const std::string_view name = keys[key];
+    const std::vector<const KnownKey*>& keys = GetReportKeys();
+    const std::string& name = keys[key]->fKey;
     const bool isOpenCL = name == "NumCLGPUs";
     const bool hasDevice =
         HasDevice(DeviceKind::kOpenCL) || (!isOpenCL && HasDevice(DeviceKind::kOpenGL));
@@ -220,7 +218,7 @@ Missing Collector::JudgeMissingReportKey(std::size_t key) const
     if (isOpenCL && fReport.HasEnd())
         return Missing::kNoOpenCL;
     for (std::size_t later = key + 1; later < keys.size(); ++later) {
-        if (fReport.Find(keys[later]))
+        if (fReport.Find(keys[later]->fKey))
             return Missing::kUnreadable;
     }
     return Missing::kRunEnded;
@@ -230,7 +228,7 @@ std::string Collector::FindNext() const
 {
     if (fReport.HasEnd())
         return {};
-    const Table<const char*> keys = GetReportKeys();
+    const std::vector<const KnownKey*>& keys = GetReportKeys();
     const std::vector<ReportLine>& lines = fReport.GetLines();
     for (auto line = lines.rbegin(); line != lines.rend(); ++line) {
         if (line->fKind != LineKind::kValue)
@@ -247,11 +245,11 @@ std::string Collector::FindNext() const
             if (line->fKey == GetCountKey(kind))
                 return FindFirstOfDevices(kind);
         }
-        const auto* const key = std::find(keys.begin(), keys.end(), line->fKey);
-        if (key != keys.end())
-            return key[1];
+        const auto key = std::find(keys.begin(), keys.end(), FindReportKey(line->fKey));
+        if (key != keys.end()) // an end stamp that isn't whole is still to come
+            return (key + 1 == keys.end() ? *key : key[1])->fKey;
     }
-    return keys[0];
+    return keys.front()->fKey;
 }
 
 std::string Collector::FindFirstOfDevices(DeviceKind kind) const

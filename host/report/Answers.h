@@ -27,7 +27,7 @@ const char* GetMissingText(Missing missing);
 
 struct Answer {
     std::string fKey;        // behind the tag and its point
-    const KnownKey* fKnown;  // null of a key that the report adds
+    const KnownKey* fKnown;  // null of a key that the report has besides
     const ReportLine* fLine; // null if missing
     Missing fMissing = Missing::kNot;
 };

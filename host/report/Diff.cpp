@@ -23,13 +23,10 @@ namespace assay_host {
 
 namespace {
 
-constexpr std::string_view kMeasured[] = {"CLBandwidth", "CLCompute"};
-constexpr std::string_view kStamps[] = {"assayStart", "assayEnd"};
-
-template <typename Range>
-bool Contains(const Range& range, std::string_view text)
+bool IsComparedBy(Match match, const Answer* before, const Answer* after)
 {
-    return std::find(std::begin(range), std::end(range), text) != std::end(range);
+    const Answer& answer = before ? *before : *after;
+    return answer.fKnown && answer.fKnown->fMatch == match;
 }
 
 std::string ShowAnswer(const Answer* answer)
@@ -72,10 +69,10 @@ private:
     void CompareDevices(const Answers& before, const Answers& after);
     void CompareAnswers(const std::string& prefix, const std::vector<Answer>& before,
                         const std::vector<Answer>& after);
-    bool IsSame(std::string_view key, const Answer* before, const Answer* after) const;
+    bool IsSame(const Answer* before, const Answer* after) const;
     void CompareRawLines(const Report& before, const Report& after);
 
-    static std::vector<Pair> Match(Devices& before, Devices& after);
+    static std::vector<Pair> PairUp(Devices& before, Devices& after);
 
     std::ostream& fOut;
     const DiffOptions& fOptions;
@@ -104,7 +101,7 @@ void Comparer::CompareEnds(const Report& before, const Report& after)
 }
 
 // By name, the same place first; then by place what is left. What has no partner then stays.
-std::vector<Comparer::Pair> Comparer::Match(Devices& before, Devices& after)
+std::vector<Comparer::Pair> Comparer::PairUp(Devices& before, Devices& after)
 {
     std::vector<Pair> pairs;
     const auto pair = [&](auto key, bool isNamed) {
@@ -148,7 +145,7 @@ void Comparer::CompareDevices(const Answers& before, const Answers& after)
         left.push_back(&device);
     for (const DeviceAnswers& device : after.fDevices)
         right.push_back(&device);
-    std::vector<Pair> pairs = Match(left, right);
+    std::vector<Pair> pairs = PairUp(left, right);
     std::sort(pairs.begin(), pairs.end(),
               [](const Pair& a, const Pair& b) { return a.fBefore < b.fBefore; });
     for (const DeviceAnswers* device : left)
@@ -169,7 +166,7 @@ void Comparer::CompareAnswers(const std::string& prefix, const std::vector<Answe
     for (const Answer& answer : after)
         partners.emplace(answer.fKey, &answer);
     const auto compare = [&](const std::string& key, const Answer* left, const Answer* right) {
-        if (!Contains(kStamps, key) && !IsSame(key, left, right))
+        if (!IsComparedBy(Match::kStamp, left, right) && !IsSame(left, right))
             Print(fmt::format("{}{}: {} -> {}", prefix, ShowBytes(key), ShowAnswer(left),
                               ShowAnswer(right)));
     };
@@ -185,7 +182,7 @@ void Comparer::CompareAnswers(const std::string& prefix, const std::vector<Answe
     }
 }
 
-bool Comparer::IsSame(std::string_view key, const Answer* before, const Answer* after) const
+bool Comparer::IsSame(const Answer* before, const Answer* after) const
 {
     const ReportLine* const left = before ? before->fLine : nullptr;
     const ReportLine* const right = after ? after->fLine : nullptr;
@@ -194,7 +191,7 @@ bool Comparer::IsSame(std::string_view key, const Answer* before, const Answer* 
         return left == right;
     if (left->fQuoted == right->fQuoted && left->fValue == right->fValue)
         return true;
-    if (!Contains(kMeasured, key))
+    if (!IsComparedBy(Match::kNumber, before, after))
         return false;
     const std::optional<double> a = ReadDouble(left->fValue);
     const std::optional<double> b = ReadDouble(right->fValue);

@@ -1,9 +1,12 @@
-// The keys that a whole report has, in the order in which it prints them.
+// The lines that a whole report has, in the order in which it prints them: the one table of what
+// docs/report-format.md describes. Who reads, shows, compares or predicts a report goes by it.
 #pragma once
 
 #include <cstddef>
+#include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace assay_host {
 
@@ -15,8 +18,14 @@ const char* GetKindName(DeviceKind kind);
 // The word of a tag: "glgpu", "clgpu".
 const char* GetTagWord(DeviceKind kind);
 
+// A device's tag: "glgpu[0]", "clgpu[1]".
+std::string MakeTag(DeviceKind kind, std::size_t index);
+
 // The report's key with their number: "NumGLGPUs", "NumCLGPUs".
 const char* GetCountKey(DeviceKind kind);
+
+// More devices of a kind than any machine has; a child that makes up more costs no more memory.
+constexpr std::size_t kMaxDevices = 256;
 
 // What a value is, which is to say how a person likes to read it.
 enum class ValueForm {
@@ -34,14 +43,45 @@ enum class ValueForm {
 
 enum class KeyGroup { kMain, kLimit, kExtension };
 
-struct KnownKey {
-    const char* fKey;   // behind the tag and its point
-    const char* fLabel; // for people
-    ValueForm fForm;
-    KeyGroup fGroup;
+// What two runs of one machine have in common of the value.
+enum class Match {
+    kExact,   // all of it
+    kStamp,   // a time between quotes
+    kInteger, // a memory size, while other programs come and go
+    kNumber   // a measurement
 };
 
-// A constant array, as a range.
+struct KnownKey {
+    std::optional<DeviceKind> fKind; // of the devices that have it; none for the report's own
+    std::string fKey;                // after the tag and its point
+
+    // For people, of a device's key: its label, its form, and in the group kMain its row among
+    // them.
+    std::string fLabel;
+    ValueForm fForm = ValueForm::kText;
+    KeyGroup fGroup = KeyGroup::kMain;
+    int fRow = 0;
+
+    Match fMatch = Match::kExact;
+
+    // The gputag lines in front of the answer; fTagsFirst: they come before the driver is asked,
+    // and so even if that fails.
+    std::vector<std::string> fTagLines{};
+    bool fTagsFirst = false;
+
+    // A device takes the step without a line where it has no value, and always where its key of
+    // this name is 0; empty for a key that each device prints.
+    std::string fSilentWithout{};
+
+    bool fTakesStep = true;
+
+    bool MayBeSilent() const { return !fSilentWithout.empty(); }
+
+    // What stands before the '=' for the device of that tag; the key alone for an empty tag.
+    std::string GetKey(const std::string& tag) const;
+};
+
+// A part of a constant array, as a range.
 template <typename T>
 struct Table {
     const T* fBegin;
@@ -53,13 +93,14 @@ struct Table {
     const T& operator[](std::size_t index) const { return fBegin[index]; }
 };
 
+// All of them: a device's key stands for the lines of all devices of its kind, one after the other.
+const std::vector<KnownKey>& GetKnownKeys();
+
+// Those of them that each device of the kind has.
 Table<KnownKey> GetDeviceKeys(DeviceKind kind);
 
-// The keys of the report itself, without the devices' ones. NumCLGPUs and what follows it comes
-// behind the OpenGL devices.
-Table<const char*> GetReportKeys();
-
-// A device that goes through its tests without this key has none to print.
-constexpr std::string_view kOptionalKey = "CUDAVersion";
+// Those of them that belong to no device; null of another key.
+const std::vector<const KnownKey*>& GetReportKeys();
+const KnownKey* FindReportKey(std::string_view key);
 
 } // namespace assay_host

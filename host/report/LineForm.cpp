@@ -95,8 +95,7 @@ bool BeginsLikeReportLine(std::string_view text)
     if (StartsWith(text, "#") || StartsWith(text, "gputag.") || GetDeviceTag(text))
         return true;
     const std::string_view word = text.substr(0, text.find('='));
-    const Table<const char*> keys = GetReportKeys();
-    return word.size() < text.size() && std::find(keys.begin(), keys.end(), word) != keys.end();
+    return word.size() < text.size() && FindReportKey(word) != nullptr;
 }
 
 std::optional<std::string_view> GetDeviceTag(std::string_view key)

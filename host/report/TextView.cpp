@@ -2,9 +2,8 @@
 
 #include <algorithm>
 #include <cstddef>
-#include <iterator>
+#include <map>
 #include <string>
-#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -20,31 +19,6 @@ namespace assay_host {
 
 namespace {
 
-// Rows in the order in which a person asks for them.
-constexpr std::string_view kOpenGLRows[] = {
-    "GLName",
-    "GLRenderer",
-    "GLVendor",
-    "GLVendorID",
-    "GLRendererID",
-    "IsIntegratedGLGPU",
-    "GLMemoryMB",
-    "GLVersion",
-    "glGetString[GL_SHADING_LANGUAGE_VERSION]",
-    "GLDriver",
-    "GLDriverVersion",
-    "GLDriverDate",
-    "CanCompileProgramGLSL",
-    "GLFrameBufferOK",
-    "HasGLNPOTSupport",
-    "GLRectTextureSize",
-};
-constexpr std::string_view kOpenCLRows[] = {
-    "CLName",      "CLVendor",        "CLVendorID",        "IsIntegratedCLGPU",
-    "CLMemoryMB",  "CLDeviceVersion", "CLPlatformVersion", "CLDriverVersion",
-    "CLBandwidth", "CLCompute",       "CUDASupported",     "CUDAVersion",
-};
-
 // What a terminal can take in at once of standard error, or of lines that are no report's.
 constexpr std::size_t kMostOtherLines = 10;
 
@@ -52,13 +26,6 @@ std::size_t GetWidth(int width)
 {
     constexpr int kLeastWidth = 40;
     return static_cast<std::size_t>(std::max(width, kLeastWidth));
-}
-
-Table<std::string_view> GetRows(DeviceKind kind)
-{
-    if (kind == DeviceKind::kOpenGL)
-        return {kOpenGLRows, std::size(kOpenGLRows)};
-    return {kOpenCLRows, std::size(kOpenCLRows)};
 }
 
 // A key that isn't known is its own label.
@@ -103,12 +70,13 @@ public:
 private:
     void AddMain()
     {
-        for (const std::string_view key : GetRows(fDevice.fKind)) {
-            const auto answer = std::find_if(fDevice.fAnswers.begin(), fDevice.fAnswers.end(),
-                                             [key](const Answer& row) { return row.fKey == key; });
-            if (!IsLost(*answer))
-                fTable.Add(GetLabel(*answer), GetValueText(*answer));
+        std::multimap<int, const Answer*> rows;
+        for (const Answer& answer : fDevice.fAnswers) {
+            if (answer.fKnown && answer.fKnown->fGroup == KeyGroup::kMain && !IsLost(answer))
+                rows.emplace(answer.fKnown->fRow, &answer);
         }
+        for (const auto& [row, answer] : rows)
+            fTable.Add(GetLabel(*answer), GetValueText(*answer));
     }
 
     template <typename Action>

@@ -3,14 +3,9 @@
 #include <algorithm>
 #include <cstdlib>
 
-#include "supervise/TestSequence.h"
-
 namespace assay_host {
 
 namespace {
-
-// More than any machine has; a forged line must not cost memory.
-constexpr std::size_t kMaxDevices = 256;
 
 std::size_t ReadCount(const std::string& text)
 {
@@ -27,23 +22,25 @@ Position::Position()
 void Position::Build()
 {
     fEntries.clear();
-    for (const GlobalKey& key : GetFirstKeys())
-        fEntries.push_back({{}, key.fName, true, false});
-    AddTests(false, fGLCount);
-    fEntries.push_back({{}, kCLCountKey, true, true});
-    AddTests(true, fCLCount);
-    fEntries.push_back({{}, kLastKey, true, false});
+    for (const KnownKey* const key : GetReportKeys()) {
+        const bool isCLCount = key->fKey == GetCountKey(DeviceKind::kOpenCL);
+        fEntries.push_back({{}, key->fKey, true, isCLCount});
+        if (isCLCount)
+            AddDevices(DeviceKind::kOpenCL, fCLCount);
+        else if (key->fKey == GetCountKey(DeviceKind::kOpenGL))
+            AddDevices(DeviceKind::kOpenGL, fGLCount);
+    }
     fPlaces.clear();
     for (std::size_t index = 0; index < fEntries.size(); ++index)
         fPlaces[fEntries[index].fKey] = index;
 }
 
-void Position::AddTests(bool openCL, std::size_t count)
+void Position::AddDevices(DeviceKind kind, std::size_t count)
 {
-    for (const Test& test : openCL ? GetCLTests() : GetGLTests()) {
+    for (const KnownKey& key : GetDeviceKeys(kind)) {
         for (std::size_t index = 0; index < count; ++index) {
-            const std::string tag = openCL ? MakeCLTag(index) : MakeGLTag(index);
-            fEntries.push_back({tag, test.GetKey(tag), test.TakesStep(), test.fMayBeSilent});
+            const std::string tag = MakeTag(kind, index);
+            fEntries.push_back({tag, key.GetKey(tag), key.fTakesStep, key.MayBeSilent()});
         }
     }
 }
@@ -70,9 +67,9 @@ void Position::Add(const ReportLine& line)
     if (entry.fKey == entry.fTag + ".CUDASupported" && line.fValue == "0")
         fSilent.insert(entry.fTag);
     ++fNext;
-    if (line.fKey == kGLCountKey)
+    if (line.fKey == GetCountKey(DeviceKind::kOpenGL))
         fGLCount = ReadCount(line.fValue);
-    else if (line.fKey == kCLCountKey)
+    else if (line.fKey == GetCountKey(DeviceKind::kOpenCL))
         fCLCount = ReadCount(line.fValue);
     else
         return;

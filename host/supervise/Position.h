@@ -7,6 +7,7 @@
 #include <unordered_map>
 #include <vector>
 
+#include "report/KnownKeys.h"
 #include "report/ReportLine.h"
 
 namespace assay_host {
@@ -33,7 +34,7 @@ private:
     };
 
     void Build();
-    void AddTests(bool openCL, std::size_t count);
+    void AddDevices(DeviceKind kind, std::size_t count);
 
     std::size_t fGLCount = 0;
     std::size_t fCLCount = 0;

@@ -16,7 +16,6 @@ namespace assay_host {
 namespace {
 
 constexpr int kFailedStatus = 2;
-constexpr std::size_t kMaxDevices = 256;
 
 constexpr char kCrashText[] = "exception: programmed failure";
 constexpr char kThrowText[] = "exception: Programmed throw";
@@ -92,26 +91,25 @@ const ReportLine& Require(const Report& report, const std::string& key)
     return *line;
 }
 
-std::vector<std::string> ListTags(const Report& report, const std::string& key,
-                                  std::string (*makeTag)(std::size_t))
+std::vector<std::string> ListTags(const Report& report, DeviceKind kind)
 {
-    const std::size_t count = std::strtoul(Require(report, key).fValue.c_str(), nullptr, 10);
+    const std::string& value = Require(report, GetCountKey(kind)).fValue;
+    const std::size_t count = std::strtoul(value.c_str(), nullptr, 10);
     if (count > kMaxDevices)
         throw std::runtime_error(fmt::format("the report tells of {} devices", count));
     std::vector<std::string> tags;
     for (std::size_t index = 0; index < count; ++index)
-        tags.push_back(makeTag(index));
+        tags.push_back(MakeTag(kind, index));
     return tags;
 }
 
 // The test that the device didn't survive, to go by its last line; behind the last test if it did.
-std::size_t FindFailingTest(const Report& report, const std::vector<Test>& tests,
-                            const std::string& tag)
+std::size_t FindFailingTest(const Report& report, Table<KnownKey> keys, const std::string& tag)
 {
-    std::size_t next = tests.size();
-    while (next > 0 && report.Find(tests[next - 1].GetKey(tag)) == nullptr)
+    std::size_t next = keys.size();
+    while (next > 0 && report.Find(keys[next - 1].GetKey(tag)) == nullptr)
         --next;
-    return next < tests.size() && tests[next].fMayBeSilent ? next + 1 : next;
+    return next < keys.size() && keys[next].MayBeSilent() ? next + 1 : next;
 }
 
 const std::regex& GetShape(Match match)
@@ -184,20 +182,20 @@ StepRules::StepRules(const Report& report, const RunOutcome& outcome)
         start.fLines.push_back({line, Match::kExact});
     }
     fOperations.push_back(start);
-    for (const GlobalKey& key : GetFirstKeys())
-        AddGlobal(report, key.fName, key.fMatch);
-    fOperations.back().fErrors = ListEnumerationTexts(outcome.fErrorLines);
-    const std::vector<std::string> glTags = ListTags(report, kGLCountKey, MakeGLTag);
-    fGLCount = glTags.size();
-    AddTests(report, GetGLTests(), glTags);
-    fHasOpenCL = report.Find(kCLCountKey) != nullptr;
-    if (fHasOpenCL) {
-        AddGlobal(report, kCLCountKey, Match::kExact);
-        const std::vector<std::string> clTags = ListTags(report, kCLCountKey, MakeCLTag);
-        fCLCount = clTags.size();
-        AddTests(report, GetCLTests(), clTags);
+    for (const KnownKey* const key : GetReportKeys()) {
+        if (key->fKey == GetCountKey(DeviceKind::kOpenCL)) {
+            fHasOpenCL = report.Find(key->fKey) != nullptr;
+            if (!fHasOpenCL)
+                continue;
+        }
+        AddReportKey(report, *key);
+        if (key->fKey == GetCountKey(DeviceKind::kOpenGL)) {
+            fOperations.back().fErrors = ListEnumerationTexts(outcome.fErrorLines);
+            fGLCount = AddDevices(report, DeviceKind::kOpenGL);
+        } else if (key->fKey == GetCountKey(DeviceKind::kOpenCL)) {
+            fCLCount = AddDevices(report, DeviceKind::kOpenCL);
+        }
     }
-    AddGlobal(report, kLastKey, Match::kStamp);
     fOperations.push_back(Operation());
 
     AddFailureTexts(outcome);
@@ -211,40 +209,42 @@ StepRules::StepRules(const Report& report, const RunOutcome& outcome)
         throw std::runtime_error("the undisturbed run is not what the rules say:\n" + difference);
 }
 
-void StepRules::AddGlobal(const Report& report, const std::string& key, Match match)
+void StepRules::AddReportKey(const Report& report, const KnownKey& key)
 {
     Operation operation;
-    operation.fLines.push_back({Require(report, key).fText, match});
+    operation.fLines.push_back({Require(report, key.fKey).fText, key.fMatch});
     fOperations.push_back(operation);
 }
 
-void StepRules::AddTests(const Report& report, const std::vector<Test>& tests,
-                         const std::vector<std::string>& tags)
+std::size_t StepRules::AddDevices(const Report& report, DeviceKind kind)
 {
+    const Table<KnownKey> keys = GetDeviceKeys(kind);
+    const std::vector<std::string> tags = ListTags(report, kind);
     std::vector<std::size_t> failing; // by device, the test that has cost it the rest
     failing.reserve(tags.size());
     for (const std::string& tag : tags)
-        failing.push_back(FindFailingTest(report, tests, tag));
+        failing.push_back(FindFailingTest(report, keys, tag));
 
-    for (std::size_t index = 0; index < tests.size(); ++index) {
-        const Test& test = tests[index];
+    for (std::size_t index = 0; index < keys.size(); ++index) {
+        const KnownKey& known = keys[index];
         for (std::size_t device = 0; device < tags.size(); ++device) {
             if (index > failing[device])
                 continue;
             Operation operation;
             operation.fTag = tags[device];
-            operation.fTakesStep = test.TakesStep();
+            operation.fTakesStep = known.fTakesStep;
             operation.fFails = index == failing[device];
-            if (!operation.fFails || test.ShowsTagsFirst()) {
-                for (const std::string& line : test.GetTagLines())
+            if (!operation.fFails || known.fTagsFirst) {
+                for (const std::string& line : known.fTagLines)
                     operation.fLines.push_back({line, Match::kExact});
             }
-            const std::string key = test.GetKey(tags[device]);
-            if (!operation.fFails && (!test.fMayBeSilent || report.Find(key) != nullptr))
-                operation.fLines.push_back({Require(report, key).fText, test.fMatch});
+            const std::string key = known.GetKey(tags[device]);
+            if (!operation.fFails && (!known.MayBeSilent() || report.Find(key) != nullptr))
+                operation.fLines.push_back({Require(report, key).fText, known.fMatch});
             fOperations.push_back(operation);
         }
     }
+    return tags.size();
 }
 
 void StepRules::AddFailureTexts(const RunOutcome& outcome)

@@ -7,9 +7,9 @@
 #include <string>
 #include <vector>
 
+#include "report/KnownKeys.h"
 #include "report/Report.h"
 #include "report/RunOutcome.h"
-#include "supervise/TestSequence.h"
 
 namespace assay_host {
 
@@ -60,9 +60,8 @@ private:
         bool fFails = false; // by itself
     };
 
-    void AddGlobal(const Report& report, const std::string& key, Match match);
-    void AddTests(const Report& report, const std::vector<Test>& tests,
-                  const std::vector<std::string>& tags);
+    void AddReportKey(const Report& report, const KnownKey& key);
+    std::size_t AddDevices(const Report& report, DeviceKind kind);
     void AddFailureTexts(const RunOutcome& outcome);
 
     std::vector<Operation> fOperations;

@@ -39,11 +39,11 @@ TEST(KnownKeys, AreThoseOfAWholeReportInItsOrder)
     const Table<KnownKey> gl = GetDeviceKeys(DeviceKind::kOpenGL);
     ASSERT_EQ(gl.size(), std::size(kSampleGL));
     for (std::size_t key = 0; key < gl.size(); ++key)
-        EXPECT_STREQ(gl[key].fKey, kSampleGL[key].fKey);
+        EXPECT_EQ(gl[key].fKey, kSampleGL[key].fKey);
     const Table<KnownKey> cl = GetDeviceKeys(DeviceKind::kOpenCL);
     ASSERT_EQ(cl.size(), std::size(kSampleCL));
     for (std::size_t key = 0; key < cl.size(); ++key)
-        EXPECT_STREQ(cl[key].fKey, kSampleCL[key].fKey);
+        EXPECT_EQ(cl[key].fKey, kSampleCL[key].fKey);
     EXPECT_EQ(GetReportKeys().size(), 8U);
 }
 
