@@ -22,25 +22,16 @@ namespace assay_host {
 
 namespace {
 
-using Clock = std::chrono::steady_clock;
-using Seconds = std::chrono::duration<double>;
+using Clock = RunTimes::Clock;
+using Seconds = RunTimes::Seconds;
 using std::chrono::milliseconds;
-
-constexpr milliseconds kTick{100};
-
-// What follows the timeout has to fit into two seconds, of which pmutil takes one if its launch has
-// to be given up.
-constexpr Seconds kKillGrace{0.7};       // for a killed child to go
-constexpr Seconds kStreamGrace{0.2};     // for the streams to end behind the child
-constexpr Seconds kLastStreamGrace{0.2}; // the same once its descendants were ended
-constexpr double kTreeSeconds = 0.2;
-constexpr double kJoinSeconds = 0.3;
 
 class Supervision {
 public:
     Supervision(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
-                boost::shared_ptr<pmutil::Launcher> launcher)
-        : fOptions(options),
+                boost::shared_ptr<pmutil::Launcher> launcher, const RunTimes& times)
+        : fTimes(times),
+          fOptions(options),
           fObserver(observer),
           fStop(stop),
           fPlatformLauncher(std::move(launcher)),
@@ -95,7 +86,7 @@ private:
             NoteStartFailure(exc.what());
             if (fLauncher->HasLaunched())
                 KillDirectly(); // the launch failed behind it
-            fLeftBehind = !fTree.EndAll(kTreeSeconds);
+            fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
             return false;
         }
         return true;
@@ -119,10 +110,10 @@ private:
     void Follow()
     {
         while (fEvidence.fStartFailure.empty() && !IsOver()) {
-            const Clock::time_point before = Clock::now();
+            const Clock::time_point before = fTimes.fNow();
             const std::optional<Event> event = fQueue->Pop(GetPatience());
             if (fEnded)
-                fIdle += Clock::now() - before;
+                fIdle += fTimes.fNow() - before;
             if (event)
                 Take(*event);
             Tick();
@@ -134,12 +125,12 @@ private:
         if (fEnded && fOpenStreams == 0)
             return true;
         if (!fEnded)
-            return fKilled && Clock::now() - fKillTime >= kKillGrace;
+            return fKilled && fTimes.fNow() - fKillTime >= fTimes.fKillGrace;
         if (fTreeEnded)
-            return fIdle >= kLastStreamGrace + kStreamGrace;
-        if (fIdle >= kStreamGrace) {
+            return fIdle >= fTimes.fLastStreamGrace + fTimes.fStreamGrace;
+        if (fIdle >= fTimes.fStreamGrace) {
             fTreeEnded = true;
-            fLeftBehind = !fTree.EndAll(kTreeSeconds);
+            fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
         }
         return false;
     }
@@ -147,9 +138,9 @@ private:
     // How long to wait for the next event: to the next thing that has its time.
     milliseconds GetPatience() const
     {
-        Seconds patience = kTick;
+        Seconds patience = fTimes.fTick;
         if (fEnded)
-            patience = std::min<Seconds>(patience, kStreamGrace / 4);
+            patience = std::min<Seconds>(patience, fTimes.fStreamGrace / 4);
         else if (!fKilled && fOptions.fTimeoutSeconds > 0)
             patience = std::min(patience, Seconds(fOptions.fTimeoutSeconds - GetSeconds()));
         return std::max(milliseconds(1), std::chrono::duration_cast<milliseconds>(patience));
@@ -191,8 +182,8 @@ private:
 
     void Tick()
     {
-        const Clock::time_point now = Clock::now();
-        if (now - fLastTick >= kTick) {
+        const Clock::time_point now = fTimes.fNow();
+        if (now - fLastTick >= fTimes.fTick) {
             fLastTick = now;
             fObserver.OnTick(GetSeconds());
             if (!fKilled && !fEnded)
@@ -221,7 +212,7 @@ private:
     void Kill(KillReason reason)
     {
         fKilled = true;
-        fKillTime = Clock::now();
+        fKillTime = fTimes.fNow();
         fEvidence.fKillReason = reason;
         try {
             fLaunch.Kill();
@@ -253,7 +244,7 @@ private:
             fOutcome.fSeconds = GetSeconds();
         try {
             int exitCode = 0;
-            fLaunch.Wait(&exitCode, fEnded ? kJoinSeconds : 0.0);
+            fLaunch.Wait(&exitCode, fEnded ? fTimes.fJoinSeconds : 0.0);
         } catch (const std::exception&) {
             // How the child ended is known without it.
         }
@@ -261,15 +252,16 @@ private:
         if (fEvidence.fEnd && fEvidence.fEnd->fResult != pmutil::kEndedNormally)
             fEvidence.fTermination = pmutil::GetTerminationText(*fPlatformLauncher);
         if (!fTreeEnded)
-            fLeftBehind = !fTree.EndAll(kTreeSeconds);
+            fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
         fLeftBehind = fLeftBehind || (!fEnded && fEvidence.fStartFailure.empty()) ||
                       (fEnded && fOpenStreams > 0);
         fOutcome.fLostOutputBytes = fReader.GetLostByteCount() + fOutTask->GetDroppedByteCount();
         fOutcome.fLostErrorBytes = fErrorLines.GetLostByteCount() + fErrTask->GetDroppedByteCount();
     }
 
-    double GetSeconds() const { return Seconds(Clock::now() - fStart).count(); }
+    double GetSeconds() const { return Seconds(fTimes.fNow() - fStart).count(); }
 
+    const RunTimes fTimes;
     const ChildOptions& fOptions;
     RunObserver& fObserver;
     StopRequest& fStop;
@@ -287,7 +279,7 @@ private:
     Evidence fEvidence;
     RunOutcome fOutcome;
 
-    const Clock::time_point fStart = Clock::now();
+    const Clock::time_point fStart = fTimes.fNow();
     Clock::time_point fLastTick = fStart;
     Clock::time_point fKillTime;
     Seconds fIdle{0}; // waited for output since the child's end
@@ -306,9 +298,9 @@ RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequ
 }
 
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
-                    const boost::shared_ptr<pmutil::Launcher>& launcher)
+                    const boost::shared_ptr<pmutil::Launcher>& launcher, const RunTimes& times)
 {
-    return Supervision(options, observer, stop, launcher).Run();
+    return Supervision(options, observer, stop, launcher, times).Run();
 }
 
 } // namespace assay_host
