@@ -1,4 +1,4 @@
-// The last part of a command: its child has ended, and its readers get what is still to be written.
+// The last part of a command: its child has ended, and the rest of the output is written.
 #pragma once
 
 #include <memory>
@@ -7,7 +7,7 @@
 
 namespace assay_host {
 
-// From its construction on an interrupt ends the process, with the status of an interrupted run.
+// From its construction on an interrupt ends the process with the status of an interrupted run.
 class Delivery {
 public:
     explicit Delivery(std::shared_ptr<WriterThread> writer);
@@ -15,14 +15,14 @@ public:
     Delivery(const Delivery&) = delete;
     Delivery& operator=(const Delivery&) = delete;
 
-    // Waits for the readers, however slow they are, and finishes the output. After an interrupt it
-    // waits only while they read, after more than one not at all, and ends the process if they
-    // don't. Throws what the output throws.
+    // Waits without limit for the readers and finishes the output. After one interrupt it waits
+    // only while they read, after more interrupts not at all; ends the process if the output isn't
+    // written then. Throws what the output throws.
     void Finish() const;
 
 private:
     const std::shared_ptr<WriterThread> fWriter;
-    int fInterrupts = 0; // that came before
+    int fInterrupts = 0; // before the construction
 };
 
 } // namespace assay_host

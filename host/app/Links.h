@@ -1,12 +1,12 @@
-// Symbolic links, also those that lead nowhere.
+// Symbolic links, also dangling ones.
 #pragma once
 
 #include <boost/filesystem/path.hpp>
 
 namespace assay_host {
 
-// Where a link leads in the end, whether that exists or not; the path itself if it is no link. Of
-// links in a circle it is one of them.
+// The final target of a link, whether it exists or not; the path itself if it is no link. For a
+// loop of links, one of the links.
 boost::filesystem::path FollowLinks(boost::filesystem::path path);
 
 } // namespace assay_host

@@ -14,8 +14,7 @@ public:
     Output(const Output&) = delete;
     Output& operator=(const Output&) = delete;
 
-    // Before anything else: what may have to wait for a reader, as the opening of a pipe with a
-    // name.
+    // Called first. May wait for a reader, for example when it opens a named pipe.
     virtual void Open() {}
 
     // Has reached the system when it returns.
@@ -24,8 +23,8 @@ public:
     // Nothing more comes. A file gets its name here.
     virtual void Finish() = 0;
 
-    // No result will come: deletes a temporary file. May be called from another thread, while one
-    // of the others is under way or stuck.
+    // Deletes a temporary file, as no result will come. Another thread may call it while one of the
+    // other functions runs or blocks.
     virtual void Abandon() {}
 
 protected:

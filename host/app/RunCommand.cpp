@@ -26,7 +26,8 @@ namespace {
 
 constexpr int kFileWidth = 100;
 
-// A line that waits to be written keeps each of its bytes once.
+// The line without its key and value, which RestoreLine takes from the text again: less memory
+// while it waits to be written.
 ReportLine ShortenLine(const ReportLine& line)
 {
     ReportLine kept;
@@ -44,7 +45,7 @@ ReportLine RestoreLine(const ReportLine& kept)
     return ReadLine(kept.fText, kept.fLineEnd, kept.fCut);
 }
 
-// Takes the report in, and has said at once what is to be said at once.
+// Collects the report, and writes at once what doesn't wait for the verdict.
 class Session : public RunObserver {
 public:
     Session(const RunChoice& choice, WriterThread& writer) : fChoice(choice), fWriter(writer) {}

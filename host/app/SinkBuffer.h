@@ -1,4 +1,5 @@
-// A stream's buffer that hands what is written on in blocks, so that no text is held whole.
+// A stream buffer that passes what is written to a function in blocks, so that no text is held
+// whole.
 #pragma once
 
 #include <functional>
@@ -33,7 +34,7 @@ protected:
         return size;
     }
 
-    // What the sink throws leaves through the stream, if it lets exceptions through.
+    // The sink's exceptions reach the writer if the stream's exception mask has badbit.
     int sync() override
     {
         const std::string block = std::exchange(fBlock, {});

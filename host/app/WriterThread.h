@@ -1,4 +1,4 @@
-// Writes what a run says, on a thread of its own: nobody but that thread waits for a reader.
+// Writes the output of a run on a thread of its own: only that thread waits for a reader.
 #pragma once
 
 #include <chrono>
@@ -12,25 +12,26 @@
 
 namespace assay_host {
 
-// What waits is kept until it is written. Who hands it over bounds it: of a child that is what the
-// limits of its reader let through.
+// Keeps each text until it is written, without a limit of its own: the limits of the report's
+// reader bound what comes from a child.
 //
-// Any thread may call, but Finish is called once and is the last of all but Abandon.
+// Any thread may call. Call Finish once; only Abandon may follow.
 class WriterThread {
 public:
     // Called once, on the writer's thread, when its turn has come.
     using MakeText = std::function<std::string()>;
 
-    // `failed` is called on the writer's thread if the output fails before Finish. What comes after
-    // a failure is dropped.
+    // `failed` is called on the writer's thread if the output fails before Finish. Texts after a
+    // failure are dropped.
     WriterThread(std::unique_ptr<Output> output, std::function<void()> failed);
 
-    // Doesn't wait: what isn't written by now is abandoned.
+    // Abandons what isn't written, without waiting.
     ~WriterThread();
     WriterThread(const WriterThread&) = delete;
     WriterThread& operator=(const WriterThread&) = delete;
 
-    // To the output. What grows when it is put into its form is better made when it is written.
+    // To the output. Pass a MakeText for a text that is larger than what it is made of: it is held
+    // only while it is written.
     void Write(std::string text);
     void Write(MakeText makeText);
 
@@ -41,13 +42,12 @@ public:
     // To standard error. If that fails, the text is lost.
     void WriteError(std::string text);
 
-    // Shows one line of progress, where standard error is a terminal, as soon as nothing else is to
-    // be written; the next one takes its place.
+    // If standard error is a terminal, shows one line of progress as soon as nothing else is to be
+    // written. The next line replaces it.
     void ShowProgress(std::string text);
 
-    // Waits until all is written and the output is finished, and throws the failure of the output
-    // if it had one. With a patience it is given up once nothing could be written for so long;
-    // false then.
+    // Waits until all is written and the output is finished. Throws the failure of the output if it
+    // had one. With a patience, returns false once nothing could be written for so long.
     bool Finish(std::optional<std::chrono::milliseconds> patience);
 
     // Gives up what isn't written. A thread that waits for a reader goes on until the process ends.

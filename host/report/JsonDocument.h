@@ -20,7 +20,7 @@ namespace assay_host {
 // Raised when the document's form changes in a way that a reader must know of.
 constexpr int kSchemaVersion = 1;
 
-// Writes the document piece by piece, with a line end behind it.
+// Writes the document piece by piece, and a line end after it.
 void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome);
 
 // Events; each has "event" and "seconds" (since the launch).
@@ -29,7 +29,7 @@ nlohmann::ordered_json MakeLineEvent(const ReportLine& line, double seconds);
 nlohmann::ordered_json MakeErrorLineEvent(const std::string& line, double seconds);
 nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome);
 
-// The report back from its document. Holds no more of it than the report. Throws
+// Reads the report from its document, and holds only the report's part of it. Throws
 // std::runtime_error with what is wrong with the document.
 Report ReadDocument(std::istream& text);
 

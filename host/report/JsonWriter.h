@@ -1,5 +1,5 @@
-// Writes a JSON document piece by piece, indented as if it was dumped whole: a large one costs no
-// more memory than its largest piece.
+// Writes a JSON document piece by piece, indented like a whole dump. Needs memory only for the
+// largest piece.
 #pragma once
 
 #include <ostream>
@@ -10,7 +10,7 @@
 
 namespace assay_host {
 
-// Failures of the stream are its own business.
+// Doesn't check the stream for failures.
 class JsonWriter {
 public:
     explicit JsonWriter(std::ostream& out) : fOut(out) {}

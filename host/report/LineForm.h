@@ -13,8 +13,7 @@ namespace assay_host {
 // quote may lack its partner.
 ReportLine ReadLine(std::string text, std::string lineEnd, bool cut);
 
-// Whether the line is a value of which nothing can be missing: it has its line end, and nothing was
-// cut from it.
+// Whether the line is a complete value: it has its line end, and nothing was cut from it.
 bool IsWholeValue(const ReportLine& line);
 
 // Whether the line is key=value with a quote that isn't closed.

@@ -24,7 +24,7 @@ std::optional<T> Read(std::string_view text)
 }
 
 // A decimal number without its sign: its digits from the first to the last that isn't 0, and the
-// power of ten behind them.
+// power of ten after them.
 struct Decimal {
     std::string fDigits;
     long fExponent = 0;
@@ -61,7 +61,7 @@ Decimal ReadDecimal(std::string_view text)
     return result;
 }
 
-// Whether the shortest text that stands for the value says the same number.
+// Whether the shortest text for the value is the same decimal number.
 bool KeepsDigits(std::string_view text, double value)
 {
     char shortest[32];

@@ -11,9 +11,9 @@ namespace assay_host {
 
 using Number = std::variant<std::int64_t, double>;
 
-// The whole text as a number that each reader of JSON keeps as it is: an integer up to 2^53 either
-// way, or a fraction or a power of ten of which floating point loses no digit. Nothing if the text
-// is anything else.
+// The whole text as a number that every JSON reader keeps exactly: an integer from -2^53 to 2^53,
+// or a number with a fraction or an exponent of which a double loses no digit. Nothing for any
+// other text.
 std::optional<Number> ReadNumber(std::string_view text);
 
 // "[8, 4]" as numbers; nothing if the text has another form, or holds something else.

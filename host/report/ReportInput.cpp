@@ -35,8 +35,8 @@ ReportInput::ReportInput(const std::string& path, const Limits& limits)
 std::string ReportInput::PeekJsonLine(std::size_t maxBytes)
 {
     constexpr std::string_view kBlanks = " \t\r\n";
-    std::size_t first = 0; // behind the blanks so far
-    std::size_t end = 0;   // behind what holds no line end of the line
+    std::size_t first = 0; // after the blanks so far
+    std::size_t end = 0;   // the line's end, as far as it was looked for
     while (fBlock.size() < maxBytes && ReadBlock()) {
         const std::string_view text(fBlock.data(), fBlock.size());
         first = std::min(text.find_first_not_of(kBlanks, first), text.size());

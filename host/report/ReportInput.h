@@ -1,5 +1,4 @@
-// The bytes of a file that is to be a report, read only as far as they are asked for, and no
-// further than a report can go.
+// The bytes of a report's file, read on demand and within limits.
 #pragma once
 
 #include <cstddef>
@@ -23,12 +22,12 @@ public:
     explicit ReportInput(const std::string& path);
     ReportInput(const std::string& path, const Limits& limits);
 
-    // The first line that isn't blank if it begins with '{', as far as the limit goes; empty if it
-    // begins otherwise. What was looked at is read again. To be called first.
+    // The first line that isn't blank, up to `maxBytes`, if it begins with '{'; else empty. The
+    // bytes are read again later. Call first.
     std::string PeekJsonLine(std::size_t maxBytes);
 
-    // The bytes are JSON: a string or a number that is too long is refused before its parser would
-    // hold it. To be called before anything is read.
+    // Treats the bytes as JSON: refuses a string or a number that is too long before a parser holds
+    // it. Call before anything is read.
     void ExpectJson();
 
 protected:

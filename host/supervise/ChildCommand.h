@@ -17,8 +17,8 @@ struct ChildCommand {
     std::deque<std::string> fArgs;
 };
 
-// `program` is a path, all texts are UTF-8. On Windows the whole command line stands in fProgram:
-// the launcher takes it as it is, while its own way with arguments loses some of them.
+// `program` is a path; all texts are UTF-8. On Windows fProgram holds the whole command line, which
+// the launcher passes on unchanged; its own quoting of arguments can't express all of them.
 ChildCommand MakeChildCommand(const std::string& program, const std::vector<std::string>& args);
 
 // The launcher of this platform. On Linux its child is in a process group of its own, so that a

@@ -22,9 +22,8 @@ struct ChildOptions {
     ReportReader::Limits fLimits;
 };
 
-// Told what comes while the child runs. All calls come from the thread that called RunChild, which
-// can't look after the child meanwhile: no call may wait for anything. What a call throws ends the
-// child and leaves RunChild.
+// Called while the child runs, on the thread that called RunChild. That thread supervises the
+// child, so no call may block. An exception of a call ends the child and leaves RunChild.
 class RunObserver {
 public:
     virtual ~RunObserver() = default;
@@ -54,8 +53,8 @@ struct RunTimes {
 // whatever the child does. Never throws for what the child or the system does; that is in the
 // outcome.
 //
-// A stop that is raised kills the child at once, and the verdict is interrupted; if it was raised
-// before, there is no child. The stop's listener is this function's while it runs.
+// Raising `stop` kills the child at once, with the verdict interrupted; if it was raised before, no
+// child is started. This function uses the listener of `stop` while it runs.
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop);
 
 // The same with another launcher, used for this run alone, and with other times.

@@ -1,10 +1,10 @@
-// What would ask a user who isn't there.
+// The system's error dialogs.
 #pragma once
 
 namespace assay_host {
 
-// On Windows neither this process nor a child that starts later waits in a dialog of the system's:
-// after a crash, where a library is missing, before a drive without a disk. Children inherit that.
+// Turns off the dialogs of Windows for a crash, a missing library or an empty drive, in this
+// process and in children that start later. Does nothing on Linux.
 void KeepDialogsAway();
 
 } // namespace assay_host

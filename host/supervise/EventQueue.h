@@ -33,11 +33,11 @@ public:
     // Waits while too many bytes are held. After Close it drops the event.
     void Push(Event event);
 
-    // The oldest event; nothing if none came within the time, whatever the system's clock is set to
-    // meanwhile, or before a Wake.
+    // The oldest event; nothing if none came within the limit (of the steady clock) or before a
+    // Wake.
     std::optional<Event> Pop(std::chrono::milliseconds limit);
 
-    // The Pop under way, or else the next one, doesn't wait.
+    // Ends the wait of the current Pop, else of the next one.
     void Wake();
 
     // Nobody will take events any more.

@@ -1,11 +1,11 @@
-// What a system makes of the number that a program's main returns.
+// How the system reports the number that a program's main returns.
 #pragma once
 
 #include <cstdint>
 
 namespace assay_host {
 
-// The status that whoever waits for the program is given.
+// The exit status that a waiting process gets.
 std::int64_t GetReportedStatus(std::int32_t returned);
 
 } // namespace assay_host

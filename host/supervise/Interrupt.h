@@ -1,5 +1,5 @@
-// The user's or the system's wish that this process comes to its end: Ctrl-C, a closed terminal,
-// SIGTERM, and each other signal whose default is to end a process, as far as a process can see it.
+// Interrupts: Ctrl-C, a closed terminal, SIGTERM, and each other signal that ends a process by
+// default and that a process can catch.
 #pragma once
 
 #include <functional>
@@ -9,20 +9,20 @@
 
 namespace assay_host {
 
-// At the start of the process: what it inherited doesn't decide which signals it sees, that the end
-// of a child can be waited for, and that a failing write fails instead of ending it.
+// Call at the start of the process. Undoes inherited signal settings, so that signals arrive and
+// children can be waited for, and lets a failing write fail instead of ending the process.
 void PrepareSignals();
 
-// From now on such a wish ends this process only as the functions here say; one that was ignored
-// when the process began, as SIGHUP under nohup, stays so. Each wish raises `stop`, at once, on a
-// thread of its own. Called once in a process.
+// From now on an interrupt doesn't end this process but raises `stop` at once, on a thread of its
+// own. A signal that was ignored when the process began, such as SIGHUP under nohup, stays ignored.
+// Call once in a process.
 void WatchForInterrupt(std::shared_ptr<StopRequest> stop);
 
-// From now on the next wish calls `end` instead, on that thread. Gives how many wishes came before.
+// From now on an interrupt calls `end` instead, on that thread. Returns the number of interrupts so
+// far.
 int SetInterruptEnd(std::function<void()> end);
 
-// Ends the process with the status, now: nothing is waited for, and no thread that is stuck can
-// keep it.
+// Ends the process with the status at once, without waiting for any thread.
 [[noreturn]] void EndProcess(int status);
 
 } // namespace assay_host

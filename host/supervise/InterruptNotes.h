@@ -1,4 +1,4 @@
-// What the platform's part of watching for interrupts hands to the neutral one.
+// What the platform's code reports to the neutral code about interrupts.
 #pragma once
 
 #include <memory>
@@ -7,10 +7,10 @@
 
 namespace assay_host {
 
-// Which request a wish raises.
+// The request that an interrupt raises.
 void SetInterruptStop(std::shared_ptr<StopRequest> stop);
 
-// A wish was seen. Any thread may call, but no signal handler.
+// Reports an interrupt. Any thread may call, but no signal handler.
 void NoteInterrupt();
 
 } // namespace assay_host

@@ -15,7 +15,7 @@ public:
     ProcessTree& operator=(const ProcessTree&) = delete;
 
     // Ends by force whatever descends from the children since, which themselves have ended. False
-    // if something is left after so many seconds, or may be as the system doesn't tell.
+    // if something is left after so many seconds, or the system doesn't report it.
     bool EndAll(double seconds);
 
 private:

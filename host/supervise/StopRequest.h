@@ -1,4 +1,4 @@
-// The wish that a run comes to its end.
+// A request to end a run.
 #pragma once
 
 #include <functional>
@@ -9,14 +9,13 @@ namespace assay_host {
 // Any thread may call.
 class StopRequest {
 public:
-    // For good: a request isn't taken back.
+    // A request can't be withdrawn.
     void Raise();
 
     bool IsRaised() const;
 
-    // `heard` is called when the request is raised, on the thread that raises it. It takes the
-    // place of the one before, which isn't called any more once this returns; an empty one only
-    // does that.
+    // `heard` is called when the request is raised, on the thread that raises it. Replaces the
+    // previous listener, which isn't called any more once this returns. May be empty.
     void SetListener(std::function<void()> heard);
 
 private:

@@ -71,8 +71,8 @@ public:
     }
 
 private:
-    // A link stays one: the file that it leads to is replaced, or made. What the system itself has
-    // for open files, as /dev/stdout, are links that only the system can follow.
+    // A link stays: the file that it leads to is replaced or created. Links to open files, such as
+    // /dev/stdout, can be followed only by the system.
     static std::string Resolve(const std::string& path)
     {
         boost::system::error_code error;
@@ -97,7 +97,7 @@ private:
 
     const std::string fName;
     const std::string fPath;
-    std::string fTemporary; // empty if what is there is written to directly; set by the constructor
+    std::string fTemporary; // empty if fPath is written directly; set by the constructor
     std::atomic<bool> fHasTemporary{false};
     int fFile = -1;
 };

@@ -1,4 +1,4 @@
-// A write that isn't done before all is written.
+// Writes a whole text.
 #pragma once
 
 #include <string_view>
@@ -6,7 +6,7 @@
 
 namespace assay_host {
 
-// Waits where the descriptor would have the caller wait, also if it is one that doesn't block.
+// Waits until all is written, also on a non-blocking descriptor. Returns the error.
 std::error_code WriteAll(int descriptor, std::string_view text);
 
 } // namespace assay_host

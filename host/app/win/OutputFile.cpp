@@ -94,7 +94,7 @@ private:
 
     const std::string fName;
     const boost::filesystem::path fPath;
-    boost::filesystem::path fTemporary; // empty if what is there is written to directly
+    boost::filesystem::path fTemporary; // empty if fPath is written directly
     std::atomic<bool> fHasTemporary{false};
     HANDLE fFile = INVALID_HANDLE_VALUE;
 };

@@ -1,4 +1,4 @@
-// A write that isn't done before all is written.
+// Writes a whole text.
 #pragma once
 
 #include <windows.h>

@@ -15,20 +15,20 @@ namespace assay_host {
 
 namespace {
 
-// After a worker that came to its own end, which has tried before.
+// After a worker that exited: it has tried to end its descendants itself.
 constexpr double kRestSeconds = 0.2;
 
-// After a sudden end. Mostly it takes some milliseconds, but a busy machine has time of its own,
-// and nobody comes after this.
+// After a sudden end. It mostly takes some milliseconds, but longer on a busy machine, and no other
+// process tries again.
 constexpr double kLastSeconds = 10;
 
-// Shells tell the end by a signal like this.
+// A shell reports an end by a signal as this plus the signal's number.
 constexpr int kSignalStatus = 128;
 
-// A name of its own keeps the worker from what is meant for all processes of the program's name.
+// Another name than the program's, so that killall doesn't end the worker with the guardian.
 constexpr char kWorkerName[] = "assay-worker";
 
-// Tells the worker that its guardian has ended. Nobody else's, as a rule.
+// The kernel sends it to the worker when the guardian has ended. Hardly used otherwise.
 int GetDeathSignal()
 {
     return SIGRTMAX;
@@ -36,7 +36,7 @@ int GetDeathSignal()
 
 ::pid_t gGuardian = 0;
 
-// All that the worker starts, whichever run it belongs to. Never deleted.
+// All that the worker starts, in any run. Never deleted.
 ProcessTree* gStarted = nullptr;
 
 // Waits for its worker, and ends as it did.
@@ -54,7 +54,7 @@ public:
             } else if (number == SIGTSTP) {
                 ::kill(fWorker, SIGSTOP); // Suspend follows once it has stopped
             } else if (number > 0) {
-                ::kill(fWorker, number); // a number that is its own until it is waited for
+                ::kill(fWorker, number); // not waited for yet, so no other process's number
             }
         }
         fTree.EndAll(end.si_code == CLD_EXITED ? kRestSeconds : kLastSeconds);
@@ -109,8 +109,8 @@ private:
     ProcessTree& fTree;
 };
 
-// All signals but those that are ignored, since even these would come where they are blocked, and
-// those that are to do what they always do.
+// All signals but those that are ignored, which would be delivered if they were blocked, and those
+// that keep their default.
 sigset_t GetGuardianSignals()
 {
     sigset_t result;
@@ -129,10 +129,11 @@ void BecomeWorker()
 {
     ::setpgid(0, 0);
     ::prctl(PR_SET_NAME, kWorkerName, 0, 0, 0);
-    std::signal(GetDeathSignal(), SIG_DFL); // a parent may have ignored it
+    std::signal(GetDeathSignal(), SIG_DFL); // the parent may have ignored it
     ::prctl(PR_SET_PDEATHSIG, GetDeathSignal(), 0, 0, 0);
     if (!IsGuarded())
-        EndProcess(kSignalStatus + SIGKILL); // it ended before this, and nothing is started yet
+        EndProcess(kSignalStatus +
+                   SIGKILL); // the guardian has ended already; nothing is started yet
     gStarted = new ProcessTree;
 }
 
@@ -162,10 +163,10 @@ void GuardProcess()
         return;
     }
     if (worker > 0) {
-        ::setpgid(worker, worker); // whichever of the two is first
+        ::setpgid(worker, worker); // here too, in case the worker has not run yet
         Guardian(worker, tree).Watch(awaited);
     }
-    // Where nothing more can be started, nothing is to be guarded.
+    // No process can be started, so there is nothing to guard.
     gGuardian = 0;
     ::pthread_sigmask(SIG_SETMASK, &before, nullptr);
 }

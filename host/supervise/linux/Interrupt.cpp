@@ -29,7 +29,7 @@ void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
     std::signal(SIGTTIN, SIG_IGN);
     std::signal(SIGTTOU, SIG_IGN);
     const sigset_t awaited = GetEndSignals();
-    // Of all threads, since all come from this one.
+    // Blocked in all threads: they inherit this mask.
     ::pthread_sigmask(SIG_SETMASK, &awaited, nullptr);
     std::thread([awaited] {
         for (;;) {
@@ -37,8 +37,7 @@ void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
                 continue;
             NoteInterrupt();
             if (!IsGuarded())
-                NoteInterrupt(); // the user ended what the user can see: there is nothing to wait
-                                 // for
+                NoteInterrupt(); // the guardian is dead: don't wait for readers
         }
     }).detach();
 }

@@ -46,8 +46,8 @@ public:
         ::prctl(PR_SET_CHILD_SUBREAPER, 1, 0, 0, 0);
     }
 
-    // Only children are killed, and none but this process sees them off, so that a number always
-    // means the same process. When one goes, its own children take its place.
+    // Kills only children, which only this process reaps: a number always means the same process.
+    // The children of one that ends become children of this process.
     bool EndAll(double seconds)
     {
         const auto deadline =

@@ -1,12 +1,12 @@
-// Which signals stand for the wish that this process ends.
+// The signals that ask this process to end.
 #pragma once
 
 #include <csignal>
 
 namespace assay_host {
 
-// All whose default is to end a process, without SIGKILL, those of a fault of its own (which end it
-// whatever it does), those of a failing write, and what is ignored now.
+// All signals that end a process by default, except SIGKILL, those of a fault of the process, those
+// of a failing write, and those that are ignored now.
 sigset_t GetEndSignals();
 
 } // namespace assay_host

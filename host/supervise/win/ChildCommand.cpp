@@ -8,7 +8,7 @@ namespace assay_host {
 
 ChildCommand MakeChildCommand(const std::string& program, const std::vector<std::string>& args)
 {
-    // Of the program's path every character counts as it is, and a quotation mark can't be in it.
+    // Nothing is escaped in a program's path, which can't hold a quotation mark.
     ChildCommand command;
     command.fProgram = L'"' + boost::nowide::widen(program) + L'"';
     for (const std::string& arg : args)

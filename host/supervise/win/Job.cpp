@@ -27,8 +27,7 @@ HANDLE MakeOwnJob()
     return nullptr;
 }
 
-// While the handle is open, the number stays that process's; whether it is in the job is asked
-// then.
+// While the handle is open, no other process gets the number, so membership is tested then.
 void End(HANDLE job, DWORD process)
 {
     const HANDLE handle =
