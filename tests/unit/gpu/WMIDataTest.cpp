@@ -16,6 +16,7 @@ using namespace assay_test;
 using pmutil::PropertyValue;
 using pmutil::WMIData;
 using testing::ElementsAre;
+using testing::ElementsAreArray;
 using testing::IsEmpty;
 using testing::IsSupersetOf;
 
@@ -125,6 +126,47 @@ TEST_F(WMIDataTest, GetIntPropertyLeavesItsOutputAloneWhenItRefuses)
     EXPECT_THAT(fLog.Lines(), ElementsAre("WIData::GetProperty L\"AdapterRAM\": hr=0, type=8"));
 }
 
+// Neighbours of the two accepted types, and these as arrays, vectors and references.
+TEST_F(WMIDataTest, NoOtherTypeIsTaken)
+{
+    constexpr std::uint16_t kVector = 0x1000;
+    constexpr std::uint16_t kArray = 0x2000;
+    constexpr std::uint16_t kByRef = 0x4000;
+    for (const std::uint16_t accepted : {PropertyValue::kInt32, PropertyValue::kString}) {
+        for (const int type : {0,
+                               1,
+                               2,
+                               4,
+                               7,
+                               9,
+                               11,
+                               16,
+                               17,
+                               18,
+                               19,
+                               20,
+                               21,
+                               22,
+                               23,
+                               30,
+                               31,
+                               accepted | kVector,
+                               accepted | kArray,
+                               accepted | kByRef}) {
+            PropertyValue value = ValueOfType(static_cast<std::uint16_t>(type));
+            value.integer = 4096;
+            value.text = u"text";
+            const auto row = OnlyRow({{u"AdapterRAM", {value}}, {u"Name", {value}}});
+            std::uint32_t integer = 77;
+            EXPECT_FALSE(pmutil::GetIntProperty(*row, integer)) << type;
+            EXPECT_EQ(integer, 77U) << type;
+            std::string text = "as it was";
+            EXPECT_FALSE(WMIData::GetStrProperty(*row, u"Name", text)) << type;
+            EXPECT_EQ(text, "as it was") << type;
+        }
+    }
+}
+
 TEST_F(WMIDataTest, GetStrPropertyLeavesItsOutputAloneWhenItRefuses)
 {
     ScriptedRow properties;
@@ -138,6 +180,16 @@ TEST_F(WMIDataTest, GetStrPropertyLeavesItsOutputAloneWhenItRefuses)
     EXPECT_THAT(fLog.Lines(),
                 ElementsAre("WIData::GetProperty L\"Name\": hr=0, type=3",
                             "WIData::GetProperty L\"Caption\": hr=-2147467259, type=8"));
+}
+
+TEST_F(WMIDataTest, TheDeviceNameIsAskedThroughTheInterface)
+{
+    class Renamed : public WMIData {
+    public:
+        std::string GetDescription() const override { return "another"; }
+    };
+    const Renamed data;
+    EXPECT_EQ(static_cast<const pmutil::GPUData&>(data).GetDeviceName(), "another");
 }
 
 TEST_F(WMIDataTest, APropertyReadWithAnotherKindOfSuccessCounts)
@@ -174,16 +226,70 @@ TEST_F(WMIDataTest, NarrowPropertyKeepsPrintableASCIIAndNothingElse)
     EXPECT_EQ(pmutil::NarrowProperty(std::u16string(u"ab\0cd", 5)), "ab");
 }
 
-TEST_F(WMIDataTest, ThePropertyNamesAre59InAlphabeticalOrder)
+TEST_F(WMIDataTest, ThePropertyNamesAreThoseOfTheClass)
 {
-    std::vector<std::u16string> names;
+    std::vector<std::string> names;
     for (const char16_t* const* name = pmutil::kWMIPropertyNames; *name != nullptr; ++name)
-        names.emplace_back(*name);
-    EXPECT_EQ(names.size(), 59U);
-    EXPECT_TRUE(std::is_sorted(names.begin(), names.end()));
-    EXPECT_TRUE(std::adjacent_find(names.begin(), names.end()) == names.end());
-    EXPECT_EQ(names.front(), u"AcceleratorCapabilities");
-    EXPECT_EQ(names.back(), u"VideoProcessor");
+        names.push_back(pmutil::NarrowProperty(*name));
+    EXPECT_THAT(names, ElementsAreArray({"AcceleratorCapabilities",
+                                         "AdapterCompatibility",
+                                         "AdapterDACType",
+                                         "AdapterRAM",
+                                         "Availability",
+                                         "CapabilityDescriptions",
+                                         "Caption",
+                                         "ColorTableEntries",
+                                         "ConfigManagerErrorCode",
+                                         "ConfigManagerUserConfig",
+                                         "CreationClassName",
+                                         "CurrentBitsPerPixel",
+                                         "CurrentHorizontalResolution",
+                                         "CurrentNumberOfColors",
+                                         "CurrentNumberOfColumns",
+                                         "CurrentNumberOfRows",
+                                         "CurrentRefreshRate",
+                                         "CurrentScanMode",
+                                         "CurrentVerticalResolution",
+                                         "Description",
+                                         "DeviceID",
+                                         "DeviceSpecificPens",
+                                         "DitherType",
+                                         "DriverDate",
+                                         "DriverVersion",
+                                         "ErrorCleared",
+                                         "ErrorDescription",
+                                         "ICMIntent",
+                                         "ICMMethod",
+                                         "InfFilename",
+                                         "InfSection",
+                                         "InstallDate",
+                                         "InstalledDisplayDrivers",
+                                         "LastErrorCode",
+                                         "MaxMemorySupported",
+                                         "MaxNumberControlled",
+                                         "MaxRefreshRate",
+                                         "MinRefreshRate",
+                                         "Monochrome",
+                                         "Name",
+                                         "NumberOfColorPlanes",
+                                         "NumberOfVideoPages",
+                                         "PNPDeviceID",
+                                         "PowerManagementCapabilities",
+                                         "PowerManagementSupported",
+                                         "ProtocolSupported",
+                                         "ReservedSystemPaletteEntries",
+                                         "SpecificationVersion",
+                                         "Status",
+                                         "StatusInfo",
+                                         "SystemCreationClassName",
+                                         "SystemName",
+                                         "SystemPaletteEntries",
+                                         "TimeOfLastReset",
+                                         "VideoArchitecture",
+                                         "VideoMemoryType",
+                                         "VideoMode",
+                                         "VideoModeDescription",
+                                         "VideoProcessor"}));
 }
 
 TEST_F(WMIDataTest, AllPropertiesRunTogetherWithoutAGap)
@@ -346,18 +452,18 @@ TEST_F(WMIDataTest, AQueryWithoutAnEnumeratorSkipsTheLoopAndCleansUp)
 
 TEST_F(WMIDataTest, ARowWithAnOddStatusIsKeptAndLogged)
 {
-    for (const char16_t* const status : {u"Degraded", u"ok", u"error", u"ERROR", u"OK "}) {
+    const std::string odd[] = {"Degraded", "ok",     "error",    "ERROR", "OK ",    "OKAY",     "O",
+                               " OK",      "Errors", "Error OK", "Erro",  " Error", "Pred Fail"};
+    std::vector<std::string> lines;
+    for (const std::string& status : odd) {
         ScriptedRow row = MakeRow(u"Card");
-        row[u"Status"] = {TextValue(status)};
+        row[u"Status"] = {TextValue(std::u16string(status.begin(), status.end()))};
         fScript.rows.push_back(row);
+        lines.push_back("WMIData::GetStrProperty(*pclsObj, L\"Status\") returns \"" + status +
+                        "\"");
     }
-    EXPECT_EQ(GetAllDevices().size(), 5U);
-    EXPECT_THAT(fLog.Lines(),
-                ElementsAre("WMIData::GetStrProperty(*pclsObj, L\"Status\") returns \"Degraded\"",
-                            "WMIData::GetStrProperty(*pclsObj, L\"Status\") returns \"ok\"",
-                            "WMIData::GetStrProperty(*pclsObj, L\"Status\") returns \"error\"",
-                            "WMIData::GetStrProperty(*pclsObj, L\"Status\") returns \"ERROR\"",
-                            "WMIData::GetStrProperty(*pclsObj, L\"Status\") returns \"OK \""));
+    EXPECT_EQ(GetAllDevices().size(), std::size(odd));
+    EXPECT_EQ(fLog.Lines(), lines);
 }
 
 TEST_F(WMIDataTest, ARowWithStatusErrorIsDropped)
