@@ -95,7 +95,22 @@ TEST_F(DXGIDataTest, NamesAreEscaped)
 
 TEST_F(DXGIDataTest, ADescriptionThatFillsItsArrayNeedsNoTerminator)
 {
-    EXPECT_EQ(Described(std::u16string(200, u'x')).GetDeviceName(), std::string(128, 'x'));
+    const pmutil::AdapterDescriptor descriptor =
+        MakeAdapter(std::u16string(128, u'x'), 0x8086, 0).descriptor;
+    const DXGIData data(descriptor);
+    EXPECT_EQ(data.GetDeviceName(), std::string(128, 'x'));
+    EXPECT_EQ(data.GetDescription(), std::string(128, 'x'));
+    EXPECT_THAT(Printed(descriptor),
+                testing::EndsWith("Description=" + std::string(128, 'x') + "}"));
+}
+
+TEST_F(DXGIDataTest, ADescriptionEndsAtItsTerminator)
+{
+    EXPECT_EQ(Described(std::u16string(127, u'x')).GetDeviceName(), std::string(127, 'x'));
+    const DXGIData data = Described(std::u16string(u"ab\0cd", 5));
+    EXPECT_EQ(data.GetDeviceName(), "ab");
+    EXPECT_EQ(data.GetDescription(), "ab");
+    EXPECT_THAT(Printed(data.fAdapterDesc), testing::EndsWith("Description=ab}"));
 }
 
 TEST_F(DXGIDataTest, TheAdapterTextIsClosed)
@@ -190,6 +205,56 @@ TEST_F(DXGIDataTest, AnAdapterWithoutOutputsIsLeftOut)
     fScript.adapters[0].outputs.clear();
     EXPECT_THAT(GetAllDevices(), IsEmpty());
     EXPECT_THAT(fLog.Lines(), ElementsAre(testing::StartsWith("adapter[0]{ ")));
+}
+
+TEST_F(DXGIDataTest, EveryValueButZeroIsAttached)
+{
+    fScript.adapters = {MakeAdapter(u"One", 1, 10)};
+    std::vector<ScriptedOutput>& outputs = fScript.adapters[0].outputs;
+    outputs.clear();
+    for (const std::int32_t attached : {-1, 0, 1, 2, 0x100, INT32_MIN}) {
+        outputs.push_back(MakeOutput(true));
+        outputs.back().descriptor.AttachedToDesktop = attached;
+    }
+    EXPECT_EQ(GetAllDevices().size(), 1U);
+    EXPECT_EQ(fLog.Lines().back(), "adapter[0] displays: 5");
+}
+
+TEST_F(DXGIDataTest, AnOutputThatAFailedCallGivesDoesNotCount)
+{
+    fScript.adapters = {MakeAdapter(u"One", 1, 10)};
+    fScript.results["EnumOutputs 0 0"] = kFail;
+    fScript.contrary = {"EnumOutputs 0 0"};
+    EXPECT_THAT(GetAllDevices(), IsEmpty());
+    EXPECT_EQ(fScript.CountCalls("GetDesc 0 0"), 0U);
+    EXPECT_EQ(fScript.CountCalls("~output 0 0"), 1U);
+}
+
+TEST_F(DXGIDataTest, ASuccessWithoutAnOutputEndsTheOutputs)
+{
+    fScript.adapters = {MakeAdapter(u"One", 1, 10)};
+    fScript.adapters[0].outputs = {MakeOutput(true), MakeOutput(true), MakeOutput(true)};
+    fScript.contrary = {"EnumOutputs 0 1"};
+    EXPECT_EQ(GetAllDevices().size(), 1U);
+    EXPECT_EQ(fLog.Lines().back(), "adapter[0] displays: 1");
+    EXPECT_EQ(fScript.CountCalls("EnumOutputs 0 2"), 0U);
+}
+
+TEST_F(DXGIDataTest, AnAdapterThatAFailedCallGivesIsNotListed)
+{
+    fScript.adapters = {MakeAdapter(u"One", 1, 10), MakeAdapter(u"Two", 2, 20)};
+    fScript.results["EnumAdapters 1"] = kFail;
+    fScript.contrary = {"EnumAdapters 1"};
+    EXPECT_EQ(GetAllDevices().size(), 1U);
+    EXPECT_EQ(fScript.CountCalls("GetDesc 1"), 0U);
+}
+
+TEST_F(DXGIDataTest, ASuccessWithoutAnAdapterEndsTheAdapters)
+{
+    fScript.adapters = {MakeAdapter(u"One", 1, 10), MakeAdapter(u"Two", 2, 20)};
+    fScript.contrary = {"EnumAdapters 0"};
+    EXPECT_THAT(GetAllDevices(), IsEmpty());
+    EXPECT_EQ(fScript.CountCalls("EnumAdapters 1"), 0U);
 }
 
 TEST_F(DXGIDataTest, AnOutputWhoseGetDescFailsDoesNotStopLaterOnes)
@@ -351,6 +416,14 @@ TEST_F(DXGIDataTest, TheSmallerOfSharedAndUsableMemoryIsAdded)
     EXPECT_EQ(Sized(0x1002, 64 * kMB, 0, 100 * kMB).GetMemoryMB(), 164U);
 }
 
+TEST_F(DXGIDataTest, BothDedicatedSizesCountBesideTheSharedOne)
+{
+    fScript.physicalMemory = 16 * kGB;
+    EXPECT_EQ(Sized(0x8086, 64 * kMB, 32 * kMB, 100 * kMB).GetMemoryMB(), 196U);
+    EXPECT_EQ(Sized(0x8086, 0, 32 * kMB, 100 * kMB).GetMemoryMB(), 132U);
+    EXPECT_EQ(Sized(0x10DE, 64 * kMB, 32 * kMB, 100 * kMB).GetMemoryMB(), 96U);
+}
+
 TEST_F(DXGIDataTest, ADiscreteCardAsksForNoPhysicalMemory)
 {
     fScript.knowsPhysicalMemory = false;
@@ -392,15 +465,17 @@ TEST_F(DXGIDataTest, ASmallDiscreteCardIsClassifiedAndTakesNoSharedMemory)
     EXPECT_THAT(fScript.calls, IsEmpty());
 }
 
-TEST_F(DXGIDataTest, UnknownPhysicalMemoryThrows)
+TEST_F(DXGIDataTest, UnknownPhysicalMemoryThrowsWithoutALineOfItsOwn)
 {
     fScript.knowsPhysicalMemory = false;
+    testing::internal::CaptureStderr();
     try {
         Sized(0x8086, 64 * kMB, 0, 4 * kGB).GetMemoryMB();
-        FAIL() << "nothing was thrown";
+        ADD_FAILURE() << "nothing was thrown";
     } catch (const std::runtime_error& error) {
         EXPECT_STREQ(error.what(), "GlobalMemoryStatusEx failed");
     }
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
 } // namespace

@@ -1,11 +1,13 @@
 #include "pmutil_gpu/GPUImplWin.h"
 
+#include <array>
 #include <stdexcept>
 
 #include <boost/make_shared.hpp>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "Allocations.h"
 #include "pmutil_gpu/GPU.h"
 #include "support/CapturedLog.h"
 #include "support/FakeOpenGL.h"
@@ -509,6 +511,73 @@ TEST_F(GPUImplWinTest, AnExceptionOfTheEnumerationIsToldWithLoggingOffToo)
     EXPECT_EQ(fLog.Text(), "");
 }
 
+// What GetGPUs gives and says when one of its allocations fails, for each of them.
+struct Shortage {
+    std::vector<std::string> names;
+    std::string told;
+    bool hasContext; // one was made before
+};
+
+class ShortageTest : public GPUImplWinTest {
+protected:
+    ShortageTest()
+    {
+        fLog.SetOn(false);
+        // The fakes record releases in destructors, which mustn't fail.
+        fScript.calls.reserve(1000);
+        fGL.calls.reserve(1000);
+    }
+
+    std::vector<Shortage> EveryShortage()
+    {
+        std::vector<Shortage> shortages;
+        for (std::size_t number = 0;; ++number) {
+            fScript.calls.clear();
+            fGL.reset();
+            fGL.calls.clear();
+            GPUImplWin factory;
+            testing::internal::CaptureStderr();
+            bool hasFailed = false;
+            GPUImpl::GLGPUs gpus;
+            {
+                const FailingAllocation failing(number);
+                gpus = factory.GetGPUs();
+                hasFailed = failing.HasFailed();
+            }
+            Shortage shortage{
+                {}, testing::internal::GetCapturedStderr(), !fGL.callsOf("create").empty()};
+            if (!hasFailed)
+                return shortages;
+            for (const auto& gpu : gpus)
+                shortage.names.push_back(gpu->GetName());
+            shortages.push_back(shortage);
+        }
+    }
+};
+
+TEST_F(ShortageTest, AFailureInTheMidstOfTheListKeepsWhatIsListed)
+{
+    SetDevices({"A", "B"});
+    SetAdapters({u"A", u"B"});
+    std::size_t kept = 0;
+    for (const Shortage& shortage : EveryShortage()) {
+        if (shortage.told != "DoGetGPUs fails with exception\n" || !shortage.hasContext)
+            continue;
+        ASSERT_EQ(shortage.names.size(), 1U);
+        kept += shortage.names[0] == "A" ? 1U : 0U;
+    }
+    EXPECT_GT(kept, 0U);
+}
+
+TEST_F(ShortageTest, AFailureOfTheLastResortIsSilent)
+{
+    SetDevices({"Software"});
+    std::size_t silent = 0;
+    for (const Shortage& shortage : EveryShortage())
+        silent += shortage.hasContext && shortage.names.empty() && shortage.told.empty() ? 1U : 0U;
+    EXPECT_GT(silent, 0U);
+}
+
 TEST_F(GPUImplWinTest, AMachineWithoutOpenGLHasNoDevices)
 {
     fGL.onDisplayDevices = [] { throw QGF::LogicalException("no binding"); };
@@ -580,6 +649,52 @@ TEST_F(GLMemoryTest, AQueryBelowTheWMIFigureChangesNothing)
     EXPECT_EQ(GetMemoryMB(), 4095U);
 }
 
+TEST_F(GLMemoryTest, TheVendorIsDXGIsAlone)
+{
+    SetDXGI(pmutil::kVendorIntel, 200);
+    fImpl.fWMI.fVendorID = pmutil::kVendorNVIDIA;
+    EXPECT_EQ(GetMemoryMB(), 200U);
+    EXPECT_THAT(fGL.callsOf("gl"), IsEmpty());
+    SetDXGI(pmutil::kVendorNVIDIA, 0);
+    fImpl.fWMI.fVendorID = pmutil::kVendorAMD;
+    fGL.devices[0].integers[kNVIDIAQuery] = {1024 * 1024};
+    EXPECT_EQ(GetMemoryMB(), 1024U);
+    EXPECT_THAT(fGL.callsOf("glGetIntegerv"), ElementsAre("glGetIntegerv(0x9047)"));
+}
+
+// Keeps the block that a query is handed, and fills all of it.
+class BlockKeeper : public GPUImplWin {
+public:
+    std::array<std::int32_t, 4> block{};
+
+private:
+    void DoGLGetIntegerv(std::uint32_t /*name*/, std::int32_t* result) override
+    {
+        std::copy_n(result, block.size(), block.begin());
+        std::fill_n(result, block.size(), 2048);
+    }
+};
+
+// Leaves other values than zeroes where the next call's variables lie.
+__attribute__((noinline)) void DirtyStack()
+{
+    volatile unsigned char block[8192];
+    for (volatile unsigned char& byte : block)
+        byte = 0xA5;
+}
+
+TEST_F(GLMemoryTest, AVendorsQueryFillsABlockOfFourZeroes)
+{
+    for (const std::uint32_t vendorID : {pmutil::kVendorAMD, pmutil::kVendorNVIDIA}) {
+        BlockKeeper impl;
+        impl.block.fill(-1);
+        impl.fDXGI.fAdapterDesc.VendorId = vendorID;
+        DirtyStack();
+        EXPECT_EQ(impl.GetGLMemoryMB(), 2U);
+        EXPECT_THAT(impl.block, ElementsAre(0, 0, 0, 0));
+    }
+}
+
 TEST_F(GLMemoryTest, TheLargerOfBothFiguresWins)
 {
     SetDXGI(0x1234, 3000);
@@ -634,12 +749,14 @@ TEST_F(GLMemoryTest, UnknownPhysicalMemoryLeavesTheOperation)
     SetDXGI(pmutil::kVendorIntel, 64);
     fImpl.fDXGI.fAdapterDesc.SharedSystemMemory = 1024 * kMB;
     fScript.knowsPhysicalMemory = false;
+    testing::internal::CaptureStderr();
     try {
         fImpl.GetGLMemoryMB();
-        FAIL() << "nothing was thrown";
+        ADD_FAILURE() << "nothing was thrown";
     } catch (const std::runtime_error& error) {
         EXPECT_STREQ(error.what(), "GlobalMemoryStatusEx failed");
     }
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
 TEST_F(GLMemoryTest, ADeviceWithoutAnyRecordHasTheWMIFigureAlone)

@@ -6,6 +6,7 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <set>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -121,6 +122,9 @@ public:
     bool knowsPhysicalMemory = true;
     bool givesFactory = true; // else CreateFactory succeeds with none
     bool givesRows = true;    // else QueryAdapters succeeds with none
+    // Calls, by such a text, that give their object against their result: none with success, one
+    // with a failure.
+    std::set<std::string> contrary;
     std::map<std::string, pmutil::ResultCode> results;
     std::map<std::string, std::function<void()>> throws;
 
@@ -163,6 +167,12 @@ public:
                 return found->second;
         }
         return natural;
+    }
+
+    // Whether the call hands its object out.
+    bool Gives(const std::string& call, pmutil::ResultCode result) const
+    {
+        return pmutil::Failed(result) == (contrary.count(call) != 0);
     }
 
 private:
@@ -282,8 +292,8 @@ private:
             const bool exists = index < fAdapter.outputs.size();
             const pmutil::ResultCode result =
                 script.Record("EnumOutputs " + place, exists ? 0 : kNoMore);
-            if (!pmutil::Failed(result))
-                output = std::make_unique<Output>(script, place, fAdapter.outputs.at(index));
+            if (script.Gives("EnumOutputs " + place, result) && exists)
+                output = std::make_unique<Output>(script, place, fAdapter.outputs[index]);
             return result;
         }
 
@@ -304,8 +314,8 @@ private:
             const bool exists = index < script.adapters.size();
             const pmutil::ResultCode result =
                 script.Record("EnumAdapters " + place, exists ? 0 : kNoMore);
-            if (!pmutil::Failed(result))
-                adapter = std::make_unique<ListedAdapter>(script, place, script.adapters.at(index));
+            if (script.Gives("EnumAdapters " + place, result) && exists)
+                adapter = std::make_unique<ListedAdapter>(script, place, script.adapters[index]);
             return result;
         }
 

@@ -143,6 +143,7 @@ TEST(NativeAdapterSourceTest, WhatThePartMayMapIsShared)
 {
     const AdapterTree tree("amd-integrated");
     EXPECT_EQ(FirstDescriptor().SharedSystemMemory, std::uint64_t{7680} << 20);
+    EXPECT_EQ(FirstDescriptor().DedicatedVideoMemory, std::uint64_t{64} << 20);
 }
 
 TEST(NativeAdapterSourceTest, ElseAnIntegratedPartSharesHalfOfTheMachinesMemory)

@@ -33,6 +33,22 @@ TEST(NvidiaVersionTest, AnOldModulesZoneIsAnOffsetInMinutes)
               "20180114185041.000000-480");
 }
 
+TEST(NvidiaVersionTest, EveryMonthHasItsNumber)
+{
+    int number = 1;
+    for (const std::string month :
+         {"Jan", "Feb", "Mar", "Apr", "May", "Jun", "Jul", "Aug", "Sep", "Oct", "Nov", "Dec"}) {
+        char date[] = "20230019011515.000000+000";
+        date[4] = static_cast<char>('0' + number / 10);
+        date[5] = static_cast<char>('0' + number % 10);
+        EXPECT_EQ(
+            ParseNvidiaVersion("NVRM version: x  1.2  Sat " + month + " 19 01:15:15 UTC 2023\n")
+                .date,
+            date);
+        ++number;
+    }
+}
+
 TEST(NvidiaVersionTest, AnUnknownZoneIsNoDate)
 {
     const NvidiaVersion found =

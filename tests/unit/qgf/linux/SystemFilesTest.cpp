@@ -69,6 +69,15 @@ TEST_F(SystemFilesTest, ALinkToAFileIsFollowed)
     EXPECT_EQ(fText, "text");
 }
 
+// A process's memory opens as a regular file, and has nothing at address 0.
+TEST_F(SystemFilesTest, AFileThatOpensAndCannotBeReadIsAbsent)
+{
+    std::filesystem::create_symlink("/proc/self/mem", fTree.root() + "/a");
+    EXPECT_FALSE(ReadSystemFile("/a", fText));
+    EXPECT_EQ(fText, "");
+    EXPECT_EQ(ReadSystemLine("/a"), "");
+}
+
 // Would hang if it opened the pipe.
 TEST_F(SystemFilesTest, APipeIsNoFileAndBlocksNothing)
 {
