@@ -3,6 +3,7 @@
 #include <exception>
 #include <stdexcept>
 
+#include "NewestGLVersion.h"
 #include "ScopedGLCurrent.h"
 #include "TestShaders.h"
 #include "pmutil/PMLogging.h"
@@ -26,21 +27,6 @@ constexpr std::uint32_t kGLRenderer = 0x1F01;
 constexpr std::uint32_t kGLMaxRectangleTextureSize = 0x84F8;
 constexpr std::uint32_t kGLColorBufferBit = 0x4000;
 
-struct VersionText {
-    OpenGLExtension version;
-    const char* text;
-};
-
-// Newest first. The imaging subset of 1.2 is optional and says nothing of the version.
-constexpr VersionText kVersions[] = {
-    {QGF::OGL::GL_VERSION_4_1, "4.1"}, {QGF::OGL::GL_VERSION_4_0, "4.0"},
-    {QGF::OGL::GL_VERSION_3_3, "3.3"}, {QGF::OGL::GL_VERSION_3_2, "3.2"},
-    {QGF::OGL::GL_VERSION_3_1, "3.1"}, {QGF::OGL::GL_VERSION_3_0, "3.0"},
-    {QGF::OGL::GL_VERSION_2_1, "2.1"}, {QGF::OGL::GL_VERSION_2_0, "2.0"},
-    {QGF::OGL::GL_VERSION_1_5, "1.5"}, {QGF::OGL::GL_VERSION_1_4, "1.4"},
-    {QGF::OGL::GL_VERSION_1_3, "1.3"}, {QGF::OGL::GL_VERSION_1_2, "1.2"},
-};
-
 void RequireNoGLError(std::uint32_t status)
 {
     if (status != kGLNoError)
@@ -57,11 +43,11 @@ std::string GPUImplHardware::DoGetGLVersion()
 {
     const ScopedGLCurrentExtensions current(*context);
     const QGF::OGL::ExtensionManager& extensions = RequireExtensions(current.Extensions());
-    for (const VersionText& version : kVersions) {
-        if (extensions.isSupported(version.version))
-            return version.text;
-    }
-    throw std::runtime_error("Cannot determine OGL version");
+    const char* const version = NewestGLVersion(
+        [&extensions](OpenGLExtension asked) { return extensions.isSupported(asked); });
+    if (version == nullptr)
+        throw std::runtime_error("Cannot determine OGL version");
+    return version;
 }
 
 std::string GPUImplHardware::DoGetGLName()

@@ -150,6 +150,7 @@ void ShaderSource(std::uint32_t shader, std::int32_t count, const char* const* s
 {
     FakeDevice& device = Enter("glShaderSource", {Dec(shader), Dec(count)});
     device.shaderSource.clear();
+    device.shaderLengthsGiven = lengths != nullptr;
     for (std::int32_t i = 0; i < count; ++i) {
         const bool counted = lengths != nullptr && lengths[i] >= 0;
         device.shaderSource.emplace_back(strings[i], counted ? static_cast<std::size_t>(lengths[i])

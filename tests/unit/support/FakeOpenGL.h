@@ -78,6 +78,7 @@ struct FakeDevice {
 
     // What the last glShaderSource handed over, each entry by itself.
     std::vector<std::string> shaderSource;
+    bool shaderLengthsGiven = false;
     // Contexts and OpenGL objects that exist now.
     int contexts = 0;
     int objects = 0;
