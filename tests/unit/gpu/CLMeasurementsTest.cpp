@@ -1,10 +1,12 @@
 // The two measurements: every OpenCL call they make, what they log and what they give.
 #include <cstdlib>
+#include <initializer_list>
 #include <memory>
 #include <stdexcept>
 
 #include <gmock/gmock.h>
 
+#include "Allocations.h"
 #include "pmutil_gpu/GPUImplWin.h"
 #include "support/CapturedFailures.h"
 #include "support/CapturedLog.h"
@@ -196,7 +198,9 @@ TEST_F(CLMeasurementsTest, BandwidthMakesTheSameCallsWithLoggingOn)
 
 TEST_F(CLMeasurementsTest, BandwidthStopsOrGoesOnAtEachFailingCallAsItShould)
 {
-    for (const bool logging : {false, true}) {
+    const std::pair<bool, cl_int> cases[] = {
+        {false, CL_OUT_OF_RESOURCES}, {true, CL_OUT_OF_RESOURCES}, {false, 1}};
+    for (const auto& [logging, status] : cases) {
         std::unique_ptr<CapturedLog> log;
         if (logging)
             log = std::make_unique<CapturedLog>(pmutil::gGPUAssay);
@@ -206,7 +210,7 @@ TEST_F(CLMeasurementsTest, BandwidthStopsOrGoesOnAtEachFailingCallAsItShould)
             cl.calls.clear();
             cl.created.clear();
             cl.counters = BatchesOf(1000000000);
-            cl.failing = {{index, CL_OUT_OF_RESOURCES}};
+            cl.failing = {{index, status}};
             const After after = AfterBandwidthFailure(index);
             if (index <= 2) {
                 EXPECT_THROW(impl.GetCLBandwidth(), QGF::LogicalException);
@@ -351,6 +355,140 @@ Lines WithoutDurations(Lines lines)
     return lines;
 }
 
+// A log whose lines stand among the calls, so that the order of both shows.
+class JournalLog : public CapturedLog {
+public:
+    explicit JournalLog(FakeOpenCL& cl) : CapturedLog(pmutil::gGPUAssay), fCL(cl) {}
+    void Write(const char* data, std::size_t size) override
+    {
+        CapturedLog::Write(data, size);
+        if (Text().back() == '\n')
+            fCL.calls.push_back(WithoutDurations(Lines()).back());
+    }
+
+private:
+    FakeOpenCL& fCL;
+};
+
+Lines Joined(std::initializer_list<Lines> parts)
+{
+    Lines whole;
+    for (const Lines& part : parts)
+        whole.insert(whole.end(), part.begin(), part.end());
+    return whole;
+}
+
+// The calls of `whole` from index `first` up to `last`.
+Lines Calls(const Lines& whole, std::ptrdiff_t first, std::ptrdiff_t last)
+{
+    return {whole.begin() + first, whole.begin() + last + 1};
+}
+
+TEST_F(CLMeasurementsTest, TheJournalOfABandwidthMeasurement)
+{
+    const std::string whole = "GPUImplHardware::DoGetCLBandwidth";
+    const std::string check = "GPUImplHardware::checkBandwidthCL";
+    const Lines& calls = kBandwidthCalls;
+    cl.counters = BatchesOf(1000000000);
+    const JournalLog log(cl);
+    impl.GetCLBandwidth();
+    EXPECT_THAT(
+        cl.calls,
+        ElementsAreArray(Joined({
+            {"BEGIN " + whole},
+            Calls(calls, 0, 0),
+            {whole + ": QGF::OCL::Context context(properties, *iDev);"},
+            Calls(calls, 1, 1),
+            {whole + ": QGF::OCL::CommandQueue cq(context, *iDev, false, true);"},
+            Calls(calls, 2, 2),
+            {"BEGIN " + check, check + ": clCreateBuffer d_idata nbytes=16777216"},
+            Calls(calls, 3, 3),
+            {check + ": clCreateBuffer d_odata nbytes=16777216"},
+            Calls(calls, 4, 4),
+            {check + ": clFinish"},
+            Calls(calls, 5, 5),
+            {check + ": copy 100 iterations", check + ": 0 of 100, totalSeconds=0"},
+            Calls(calls, 6, 36),
+            {"GPUImplHardware::timeBandwidthCL: totalSeconds=1", check + ": seconds=1",
+             check + ": totalSeconds=1, BW=3.35544e+08, maxBW=3.35544e+08", check + ": clFinish"},
+            Calls(calls, 37, 47),
+            {check + ": releasing"},
+            Calls(calls, 48, 49),
+            {check + ": result=3.35544e+08", "END " + check, "bytesPerSecond=3.35544e+08",
+             whole + ": result=3.35544e+08"},
+            Calls(calls, 50, 51),
+            {"END " + whole},
+        })));
+}
+
+TEST_F(CLMeasurementsTest, TheJournalOfAComputeMeasurement)
+{
+    const std::string whole = "GPUImplHardware::DoGetCLCompute";
+    const std::string measure = "GPUImplHardware::MeasureCLCompute";
+    const Lines& calls = kComputeCalls;
+    cl.counters = [](int) { return std::pair<cl_ulong, cl_ulong>{1000, 250001000}; };
+    const JournalLog log(cl);
+    impl.GetCLCompute();
+    EXPECT_THAT(cl.calls, ElementsAreArray(Joined({
+                              {"BEGIN " + whole},
+                              Calls(calls, 0, 0),
+                              {whole + ": QGF::OCL::Context context(properties, *iDev);"},
+                              Calls(calls, 1, 1),
+                              {whole + ": QGF::OCL::CommandQueue cq(context, *iDev, false, true);"},
+                              Calls(calls, 2, 2),
+                              {"BEGIN " + measure},
+                              Calls(calls, 3, 12),
+                              {measure + ": clFinish"},
+                              Calls(calls, 13, 14),
+                              {measure + ": result=0.25", "END " + measure,
+                               "timeForKernelExecution=32", whole + ": result=32"},
+                              Calls(calls, 15, 16),
+                              {"END " + whole},
+                          })));
+}
+
+TEST_F(CLMeasurementsTest, EachOfTenBatchesLogsItsFirstCopy)
+{
+    const CapturedLog log(pmutil::gGPUAssay);
+    cl.counters = BatchesOf(50000000);
+    impl.GetCLBandwidth();
+    Lines counted;
+    for (const std::string& line : log.Lines())
+        if (line.find(" of 100, ") != std::string::npos)
+            counted.push_back(line.substr(line.find(": ") + 2));
+    EXPECT_THAT(counted, testing::ElementsAre(
+                             "0 of 100, totalSeconds=0", "10 of 100, totalSeconds=0.05",
+                             "20 of 100, totalSeconds=0.1", "30 of 100, totalSeconds=0.15",
+                             "40 of 100, totalSeconds=0.2", "50 of 100, totalSeconds=0.25",
+                             "60 of 100, totalSeconds=0.3", "70 of 100, totalSeconds=0.35",
+                             "80 of 100, totalSeconds=0.4", "90 of 100, totalSeconds=0.45"));
+}
+
+TEST_F(CLMeasurementsTest, TheLastOfTenBatchesMayBeTheBest)
+{
+    cl.counters = [](int event) {
+        return std::pair<cl_ulong, cl_ulong>{0, event == 91       ? 62500000
+                                                : event % 10 == 1 ? 100000000
+                                                                  : 0};
+    };
+    EXPECT_EQ(impl.GetCLBandwidth(), 335544320.0 / 0.0625);
+    EXPECT_EQ(CountCalls("clEnqueueCopyBuffer"), 100);
+}
+
+TEST_F(CLMeasurementsTest, ComputeKeepsNoNumbersBehind)
+{
+    const std::size_t before = assay_test::LargeBlocks();
+    impl.GetCLCompute();
+    cl.content = std::vector<float>();
+    EXPECT_EQ(assay_test::LargeBlocks(), before);
+    for (const char* const call : {"clCreateProgramWithSource", "clWaitForEvents"}) {
+        cl.throwing = {call};
+        EXPECT_THROW(impl.GetCLCompute(), std::runtime_error);
+        cl.content = std::vector<float>();
+        EXPECT_EQ(assay_test::LargeBlocks(), before) << call;
+    }
+}
+
 TEST_F(CLMeasurementsTest, BandwidthLogsEachStepBeforeItIsTaken)
 {
     const CapturedLog log(pmutil::gGPUAssay);
@@ -441,7 +579,9 @@ TEST_F(CLMeasurementsTest, ComputeMakesTheSameCallsWithLoggingOn)
 
 TEST_F(CLMeasurementsTest, ComputeStopsOrGoesOnAtEachFailingCallAsItShould)
 {
-    for (const bool logging : {false, true}) {
+    const std::pair<bool, cl_int> cases[] = {
+        {false, CL_INVALID_WORK_GROUP_SIZE}, {true, CL_INVALID_WORK_GROUP_SIZE}, {false, 1}};
+    for (const auto& [logging, status] : cases) {
         std::unique_ptr<CapturedLog> log;
         if (logging)
             log = std::make_unique<CapturedLog>(pmutil::gGPUAssay);
@@ -450,7 +590,7 @@ TEST_F(CLMeasurementsTest, ComputeStopsOrGoesOnAtEachFailingCallAsItShould)
             const assay_test::CapturedFailures reported;
             cl.calls.clear();
             cl.created.clear();
-            cl.failing = {{index, CL_INVALID_WORK_GROUP_SIZE}};
+            cl.failing = {{index, status}};
             const After after = AfterComputeFailure(index);
             if (index <= 2) {
                 EXPECT_THROW(impl.GetCLCompute(), QGF::LogicalException);

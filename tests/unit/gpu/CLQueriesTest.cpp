@@ -3,12 +3,14 @@
 #include <stdexcept>
 #include <utility>
 
+#include <boost/make_shared.hpp>
 #include <gmock/gmock.h>
 
 #include "pmutil_gpu/GPU.h"
 #include "pmutil_gpu/GPUImplWin.h"
 #include "support/CapturedFailures.h"
 #include "support/FakeOpenCL.h"
+#include "support/FakeOpenGL.h"
 
 namespace {
 
@@ -326,7 +328,32 @@ TEST_F(CLQueriesTest, AFailingIntegratedQueryIsFalseAndNotReported)
 {
     answers()[CL_DEVICE_HOST_UNIFIED_MEMORY] = Failing();
     EXPECT_FALSE(impl.IsIntegratedCLGPU());
+    for (const cl_int status : {CL_INVALID_VALUE, 1}) {
+        answers()[CL_DEVICE_HOST_UNIFIED_MEMORY] =
+            CLValue(cl_bool{CL_TRUE}); // written all the same
+        answers()[CL_DEVICE_HOST_UNIFIED_MEMORY].valueStatus = status;
+        EXPECT_FALSE(impl.IsIntegratedCLGPU()) << status;
+    }
     EXPECT_THAT(failures.texts(), IsEmpty());
+}
+
+// No status but 0 is a success: nothing says that failures are negative.
+TEST_F(CLQueriesTest, APositiveStatusIsAFailureToo)
+{
+    for (const bool ofSize : {true, false}) {
+        for (auto& [property, answer] : answers())
+            (ofSize ? answer.sizeStatus : answer.valueStatus) = 1;
+        EXPECT_EQ(ErrorOf([&] { impl.GetCLDriverVersion(); }), "clGetDeviceInfo failed");
+        EXPECT_EQ(ErrorOf([&] { impl.GetCLDeviceVersion(); }),
+                  "Failed requirement: status == CL_SUCCESS");
+        EXPECT_THROW(impl.GetCLName(), QGF::LogicalException);
+        EXPECT_THROW(impl.GetCLVendor(), QGF::LogicalException);
+        for (auto& [property, answer] : answers())
+            answer.sizeStatus = CL_SUCCESS;
+    }
+    EXPECT_THROW(impl.GetCLMemoryMB(), QGF::LogicalException);
+    EXPECT_THROW(impl.GetCLVendorID(), QGF::LogicalException);
+    EXPECT_THROW(impl.GetCLPlatformVersion(), QGF::LogicalException);
 }
 
 TEST_F(CLQueriesTest, TheReservedValueIsZero)
@@ -405,6 +432,21 @@ TEST_F(CLEnumerationTest, RecordsHaveNoAdapterData)
     EXPECT_EQ(gpus[0]->impl->GetGLDriver(), "");
     EXPECT_EQ(gpus[0]->impl->GetGLDriverDate(), "");
     EXPECT_EQ(gpus[0]->impl->GetGLDriverExtra(), "");
+}
+
+// Even where the object that lists them has a context.
+TEST(CLEnumerationDeathTest, ARecordAskedAnOpenGLQuestionTripsTheAssertion)
+{
+    FakeOpenCL cl;
+    cl.platforms = {{1, {}, {{1, CL_DEVICE_TYPE_GPU, {}}}, CL_SUCCESS, {}}};
+    const assay_test::FakeOpenGL gl;
+    GPUImplWin factory;
+    factory.context = boost::make_shared<QGF::OGL::ContextOffscreen>(gl.devices[0].key);
+    const pmutil::GPUImpl::CLGPUs gpus = factory.GetCLGPUs();
+    ASSERT_EQ(gpus.size(), 1U);
+    EXPECT_DEATH(gpus[0]->impl->GetGLVersion(), "px != 0");
+    EXPECT_DEATH(gpus[0]->impl->GetGLVendor(), "px != 0");
+    EXPECT_DEATH(gpus[0]->impl->HasGLNPOTSupport(), "px != 0");
 }
 
 TEST_F(CLEnumerationTest, TheFactoryItselfGetsNoDevice)

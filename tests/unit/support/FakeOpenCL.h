@@ -191,12 +191,13 @@ private:
             return CL_INVALID_VALUE;
         const CLAnswer& answer = found->second;
         const cl_int status = value != nullptr ? answer.valueStatus : answer.sizeStatus;
+        // A driver may have written before it fails.
+        if (value != nullptr)
+            std::memcpy(value, answer.bytes.data(), std::min(size, answer.bytes.size()));
         if (status != CL_SUCCESS)
             return status;
         if (actualSize != nullptr)
             *actualSize = answer.claimed.value_or(answer.bytes.size());
-        if (value != nullptr)
-            std::memcpy(value, answer.bytes.data(), std::min(size, answer.bytes.size()));
         return CL_SUCCESS;
     }
 
