@@ -4,6 +4,7 @@
 
 #include "Output.h"
 #include "PixmereAssay.h"
+#include "RunToStatus.h"
 #include "pmutil/System.h"
 #include "qgf/AdapterName.h"
 
@@ -13,6 +14,8 @@ int main(int argc, char** argv)
     assay::PrepareOutput();
     if (const char* root = std::getenv("ASSAY_TEST_ROOT"))
         QGF::SetSystemRoot(root);
-    assay::PixmereAssay::Arguments arguments(argv, argv + argc);
-    return assay::PixmereAssay::Instance().Run(arguments);
+    return assay::RunToStatus([&] {
+        assay::PixmereAssay::Arguments arguments(argv, argv + argc);
+        return assay::PixmereAssay::Instance().Run(arguments);
+    });
 }

@@ -8,6 +8,7 @@
 #include <gmock/gmock.h>
 
 #include "PixmereAssay.h"
+#include "RunToStatus.h"
 #include "app/AppFixtures.h"
 #include "pmutil/LogSinks.h"
 #include "pmutil/PMLogging.h"
@@ -420,6 +421,74 @@ TEST(App, MakesAnAssayLoggerOnce)
     ASSERT_TRUE(logger);
     EXPECT_EQ(typeid(*logger), typeid(pmutil::AssayLogger));
     EXPECT_EQ(app.GetLogger(), logger);
+}
+
+// Puts its end on record.
+template <typename Base>
+class Ending : public Base {
+public:
+    template <typename... Arguments>
+    Ending(Lines& ends, std::string name, Arguments&&... arguments)
+        : Base(std::forward<Arguments>(arguments)...), fEnds(ends), fName(std::move(name))
+    {}
+    ~Ending() override { fEnds.push_back(fName); }
+
+private:
+    Lines& fEnds;
+    std::string fName;
+};
+
+TEST(App, TheTesterGoesBeforeTheLogger)
+{
+    class EndingApp : public TestApp {
+    public:
+        explicit EndingApp(Lines& ends) : fEnds(ends) {}
+        pmutil::PMLogger* CreateLogger() override
+        {
+            return new Ending<pmutil::AssayLogger>(fEnds, "logger");
+        }
+
+    private:
+        Lines& fEnds;
+    };
+    Lines ends;
+    {
+        EndingApp app(ends);
+        app.makeTester = [&ends](GPUAssayApp* owner) {
+            return new Ending<GPUAssayTester>(ends, "tester", owner);
+        };
+        app.GetTester();
+        app.GetLogger();
+    }
+    EXPECT_THAT(ends, ElementsAre("tester", "logger"));
+}
+
+TEST(App, TheTestersOpenCLDevicesGoBeforeTheOthers)
+{
+    Lines ends;
+    {
+        TestApp app;
+        GPUAssayTester tester(&app);
+        tester.fGLGPUs.push_back(
+            {"gl", MakeGL(boost::make_shared<Ending<FakeGPUImpl>>(ends, "gl"))});
+        tester.fCLGPUs.push_back(
+            {"cl", MakeCL(boost::make_shared<Ending<FakeGPUImpl>>(ends, "cl"))});
+    }
+    EXPECT_THAT(ends, ElementsAre("cl", "gl"));
+}
+
+TEST(App, AnExceptionThatEscapesTheRunIsStatus4)
+{
+    EXPECT_EQ(RunToStatus([] { return 7; }), 7);
+    CapturedStderr err;
+    EXPECT_EQ(RunToStatus([]() -> int { throw std::bad_alloc(); }), 4);
+    EXPECT_EQ(RunToStatus([]() -> int { throw 1; }), 4);
+    // A usage text that can't be made, on the way to status 3.
+    class Speechless : public TestApp {
+        void Usage(Arguments& /*lines*/) override { throw std::runtime_error("speechless"); }
+    };
+    EXPECT_EQ(RunToStatus([] { return Speechless().RunWith({"-help"}); }), 4);
+    EXPECT_THAT(err.Take(), ElementsAre("Usage exception: usage"));
 }
 
 TEST(App, TheRootHasNothingButADestructor)

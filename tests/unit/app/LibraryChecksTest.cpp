@@ -3,6 +3,7 @@
 
 #include <gmock/gmock.h>
 
+#include "StartOpenCL.h"
 #include "app/AppFixtures.h"
 #include "pmutil_gpu/GPUImplHardware.h"
 #include "qgf/OCL.h"
@@ -136,6 +137,37 @@ TEST_F(LibraryChecks, EveryOneFailingLeavesTheSequenceRunning)
     EXPECT_THAT(err.Take(), IsEmpty());
 }
 
+TEST_F(LibraryChecks, EveryOneFailingDoesNotKeepTheDevicesAway)
+{
+    FakeOpenGL gl(2);
+    QGF::Core::ReplaceLoaderCheck([] { throw QGF::LogicalException("no loader"); });
+    int asked = 0;
+    gl.onDisplayDevices = [&asked] { // fails the start of OpenGL and the trial context
+        if (++asked <= 2)
+            throw QGF::LogicalException("not yet");
+    };
+    assay_test::ScriptedAdapters adapters;
+    adapters.adapters = {assay_test::MakeAdapter(u"Fake GPU 0", 0x10DE, 1),
+                         assay_test::MakeAdapter(u"Fake GPU 1", 0x10DE, 2)};
+    class Tester : public GPUAssayTester {
+    public:
+        using GPUAssayTester::GPUAssayTester;
+        void DoRunQGFOCLInitialize() override {}
+        std::string GetTimestamp() override { return "now"; }
+    };
+    {
+        TestApp app;
+        app.makeTester = [](GPUAssayApp* owner) { return new Tester(owner); };
+        EXPECT_EQ(app.RunWith({}), 0);
+        ASSERT_EQ(app.out.size(), 5U + 2U * 15U + 1U);
+        EXPECT_EQ(Lines(app.out.begin(), app.out.begin() + 7),
+                  (Lines{"assayStart=\"now\"", "QGFCoreInitialized=0", "QGFOGLInitialized=0",
+                         "OGLContextCreated=0", "NumGLGPUs=2", "glgpu[0].GLVersion=\"4.1\"",
+                         "glgpu[1].GLVersion=\"4.1\""}));
+    }
+    EXPECT_THAT(err.Take(), IsEmpty());
+}
+
 TEST_F(LibraryChecks, OCLPrintsNothingAndTakesNoStep)
 {
     TestApp app;
@@ -148,6 +180,47 @@ TEST_F(LibraryChecks, OCLPrintsNothingAndTakesNoStep)
     EXPECT_EQ(log.Lines(), tester.fOCLAvailable
                                ? Lines{"DoRunQGFOCLInitialize: QGF::OCL::Library::initialize();"}
                                : Lines{});
+}
+
+TEST_F(LibraryChecks, OCLStaysAvailableIfItsStartFails)
+{
+    TestApp app;
+    CapturedLog log(pmutil::gGPUAssay);
+    bool available = false;
+    StartOpenCL(
+        available, [] { return true; }, [] { throw QGF::LogicalException("no start"); });
+    EXPECT_TRUE(available);
+    available = false;
+    StartOpenCL(
+        available, [] { return true; }, [] { throw 1; });
+    EXPECT_TRUE(available);
+    const std::string line = "DoRunQGFOCLInitialize: QGF::OCL::Library::initialize();";
+    EXPECT_THAT(log.Lines(), ElementsAre(line, line));
+    EXPECT_THAT(err.Take(), IsEmpty());
+}
+
+TEST_F(LibraryChecks, OCLIsStartedWhereItIsAvailableOnly)
+{
+    CapturedLog log(pmutil::gGPUAssay);
+    int starts = 0;
+    const auto start = [&starts] { ++starts; };
+    bool available = false;
+    StartOpenCL(
+        available, []() -> bool { throw QGF::LogicalException("no answer"); }, start);
+    EXPECT_FALSE(available);
+    StartOpenCL(
+        available, []() -> bool { throw 1; }, start);
+    EXPECT_FALSE(available);
+    StartOpenCL(
+        available, [] { return false; }, start);
+    EXPECT_FALSE(available);
+    EXPECT_EQ(starts, 0);
+    EXPECT_THAT(log.Lines(), IsEmpty());
+    StartOpenCL(
+        available, [] { return true; }, start);
+    EXPECT_TRUE(available);
+    EXPECT_EQ(starts, 1);
+    EXPECT_THAT(err.Take(), IsEmpty());
 }
 
 TEST(GLEnumeration, FindsEachDeviceOfTheMachine)

@@ -43,6 +43,30 @@ protected:
     int_type overflow(int_type) override { throw std::runtime_error("broken"); }
 };
 
+// Keeps each write apart, and counts the flushes.
+class WritesBuffer : public std::streambuf {
+public:
+    Lines writes;
+    int flushes = 0;
+
+protected:
+    std::streamsize xsputn(const char* text, std::streamsize size) override
+    {
+        writes.emplace_back(text, static_cast<std::size_t>(size));
+        return size;
+    }
+    int_type overflow(int_type character) override
+    {
+        writes.emplace_back(1, traits_type::to_char_type(character));
+        return character;
+    }
+    int sync() override
+    {
+        ++flushes;
+        return 0;
+    }
+};
+
 // An application on the real standard output stream.
 class PlainApp : public GPUAssayApp {};
 
@@ -63,6 +87,26 @@ TEST(Output, StdoutWritesTheTextAndALineEnd)
         app.Comment("text");
     }
     EXPECT_EQ(buffer.str(), "key=\"a\"b\"\n\n# text\n");
+}
+
+// What dies between two writes must not leave half a line.
+TEST(Output, ALineIsOneWriteAndOneFlush)
+{
+    PlainApp app;
+    WritesBuffer out;
+    WritesBuffer err;
+    {
+        const RedirectStream redirectOut(std::cout, &out);
+        const RedirectStream redirectErr(std::cerr, &err);
+        app.Stdout("key=1");
+        app.Comment("text");
+        app.Stdout("");
+        app.Stderr("failure");
+    }
+    EXPECT_THAT(out.writes, ElementsAre("key=1\n", "# text\n", "\n"));
+    EXPECT_EQ(out.flushes, 3);
+    EXPECT_THAT(err.writes, ElementsAre("failure\n"));
+    EXPECT_EQ(err.flushes, 1);
 }
 
 TEST(Output, ALineMayHoldAnyByte)

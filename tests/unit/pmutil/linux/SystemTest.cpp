@@ -131,6 +131,13 @@ void BlockAllSignals()
 TEST(PrepareConsoleProcessDeathTest, LeavesNoCoreDump)
 {
     ExpectInFreshProcess([] {
+        // Whoever starts the tests may have forbidden core dumps already: allow them first.
+        const rlimit unlimited{RLIM_INFINITY, RLIM_INFINITY};
+        if (setrlimit(RLIMIT_CORE, &unlimited) != 0) {
+            const rlim_t most = GetLimit(RLIMIT_CORE).rlim_max;
+            const rlimit allowed{most, most};
+            REQUIRE_SO(setrlimit(RLIMIT_CORE, &allowed) == 0);
+        }
         const rlim_t hardBefore = GetLimit(RLIMIT_CORE).rlim_max;
         PrepareConsoleProcess();
         REQUIRE_SO(GetLimit(RLIMIT_CORE).rlim_cur == 1);

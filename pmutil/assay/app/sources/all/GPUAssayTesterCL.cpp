@@ -8,6 +8,7 @@
 #include "GPUTest.h"
 #include "ListDevices.h"
 #include "ReportLine.h"
+#include "StartOpenCL.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/System.h"
 #include "pmutil_gpu/GPUImplWin.h"
@@ -32,15 +33,9 @@ void SpinSeconds(double seconds)
 
 void GPUAssayTester::DoRunQGFOCLInitialize()
 {
-    try {
-        fOCLAvailable = QGF::OCL::Library::IsOpenCLAvailable("");
-        if (fOCLAvailable) {
-            PM_LOG(pmutil::gGPUAssay, "DoRunQGFOCLInitialize: QGF::OCL::Library::initialize();");
-            QGF::OCL::Library::Initialize();
-        }
-    } catch (...) {
-        // A library that doesn't start shows by what the OpenCL half finds.
-    }
+    StartOpenCL(
+        fOCLAvailable, [] { return QGF::OCL::Library::IsOpenCLAvailable(""); },
+        [] { QGF::OCL::Library::Initialize(); });
 }
 
 void GPUAssayTester::DoRunCLEnumerate()
