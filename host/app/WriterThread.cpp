@@ -46,6 +46,7 @@ struct WriterThread::State {
             if (!IsAbandoned())
                 fOutput->Finish();
         } catch (...) {
+            fOutput->Abandon(); // once this thread is done, the process may end before ~Output
             Fail(std::current_exception());
         }
         fProgress.Clear();

@@ -180,6 +180,7 @@ TEST_F(WriterThreadTest, TellsAFailureOnceAndThrowsItAtTheEnd)
     fWriter.Write("two");
     EXPECT_THROW(fWriter.Finish(std::nullopt), std::runtime_error);
     EXPECT_EQ(*fFailures, 1);
+    EXPECT_TRUE(fReader->fAbandoned); // the process may end now, and end the thread
     EXPECT_THAT(fReader->GetTaken(), IsEmpty());
     EXPECT_FALSE(fReader->fFinished);
 }
