@@ -252,6 +252,26 @@ def test_every_line_is_flushed_on_its_own(one):
     assert child.returncode == -9
 
 
+def test_every_line_is_one_write(one):
+    """A packet pipe keeps writes apart: what dies between two of them leaves no half line."""
+    reader, writer = os.pipe2(os.O_DIRECT)
+    fcntl.fcntl(writer, fcntl.F_SETPIPE_SZ, 1 << 20)  # a page for each packet
+    try:
+        run = one.run("-stdout=one", "-comment=two", "-stderr=three", "-verbose=1",
+                      stdout=writer, stderr=writer, **one.found)
+        os.close(writer)
+        writer = None
+        packets = list(iter(lambda: os.read(reader, 1 << 16), b""))
+    finally:
+        os.close(reader)
+        if writer is not None:
+            os.close(writer)
+    assert run.status == 0
+    assert {b"one\n", b"# two\n", b"three\n"} <= set(packets)
+    assert [packet for packet in packets if packet.count(b"\n") != 1 or packet[-1:] != b"\n"] == []
+    assert len(packets) > len(predict([one.gpu]).lines)  # log lines too
+
+
 def test_file_size_limit(one):
     """What fits is there to the byte; each line beyond it is told as lost."""
     limit = 500
@@ -320,7 +340,9 @@ def test_signals_blocked_and_ignored_on_entry(one):
 
 def test_core_limit(one):
     """The limit that the kernel takes for "no dump", also to a crash reporter."""
-    child = one.start(script=one.gpu.script() + "at glGetString(GL_VENDOR) hang\n")
+    most = resource.getrlimit(resource.RLIMIT_CORE)[1]
+    child = one.start(script=one.gpu.script() + "at glGetString(GL_VENDOR) hang\n",
+                      before=lambda: resource.setrlimit(resource.RLIMIT_CORE, (most, most)))
     try:
         assert child.stdout.readline()
         limits = Path(f"/proc/{child.pid}/limits").read_text(encoding="ascii")

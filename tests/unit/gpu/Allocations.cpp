@@ -1,6 +1,7 @@
 #include "Allocations.h"
 
 #include <atomic>
+#include <cstdint>
 #include <cstdlib>
 #include <new>
 
