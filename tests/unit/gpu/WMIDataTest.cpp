@@ -552,6 +552,20 @@ TEST_F(WMIDataTest, TheResultOfTheRawAdaptersGetDescIsNotTested)
     EXPECT_EQ(devices[0].GetDeviceID(), 10U);
 }
 
+TEST_F(WMIDataTest, IdsComeFromACallThatSucceedsAndGivesAnAdapter)
+{
+    fScript.rows = {MakeRow(u"One"), MakeRow(u"Two"), MakeRow(u"Three")};
+    fScript.adapters = {MakeAdapter(u"One", 1, 10), MakeAdapter(u"Two", 2, 20),
+                        MakeAdapter(u"Three", 3, 30)};
+    fScript.results["EnumAdapters 0"] = kFail;
+    fScript.contrary = {"EnumAdapters 0", "EnumAdapters 1"};
+    const auto devices = GetAllDevices();
+    ASSERT_EQ(devices.size(), 3U);
+    EXPECT_EQ(devices[0].GetVendorID(), 0U);
+    EXPECT_EQ(devices[1].GetVendorID(), 0U);
+    EXPECT_EQ(devices[2].GetVendorID(), 3U);
+}
+
 TEST_F(WMIDataTest, WithoutAFactoryTheIdsStayZero)
 {
     fScript.givesFactory = false;
