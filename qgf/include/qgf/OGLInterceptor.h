@@ -3,90 +3,82 @@
 #pragma once
 
 #include <cstdint>
-#include <memory>
 #include <string>
 #include <vector>
 
-#include "qgf/Core.h"
+#include "qgf/OGLEntryPoint.h"
 
 namespace QGF {
 namespace OGL {
 
-// The entry points that the library uses, as a loader filled them; null where the driver has none.
-// The types are OpenGL's own, spelled out, so that no OpenGL header is needed here.
-struct OpenGLTable;
-
 // The call table of one context. Each call takes the caller's source file and line, then OpenGL's
 // arguments. A call whose entry point the driver lacks throws LogicalException "NAME is not offered
-// by this OpenGL driver (called from FILE:LINE)".
+// by this OpenGL driver (called from FILE:LINE)"; glGetStringi gives null then.
 class OpenGLInterceptor {
+    // Comes first: each entry point is looked up as it is constructed, and never again.
+    const EntryPointLookup fLookup;
+
 public:
     // Looks the entry points up with `getProc`; `getProc(context, name)` may return null.
-    using GetProc = Core::Proc (*)(void* context, const char* name);
+    using GetProc = decltype(EntryPointLookup::getProc);
     OpenGLInterceptor(GetProc getProc, void* context);
-    ~OpenGLInterceptor();
     OpenGLInterceptor(const OpenGLInterceptor&) = delete;
     OpenGLInterceptor& operator=(const OpenGLInterceptor&) = delete;
 
     // The table of the context that is current on this thread. Throws if there is none.
     static const OpenGLInterceptor& Instance();
 
-    const std::uint8_t* glGetString(const char* file, int line, std::uint32_t name) const;
-    // Null instead of an exception where the driver doesn't know indexed strings.
-    const std::uint8_t* glGetStringi(const char* file, int line, std::uint32_t name,
-                                     std::uint32_t index) const;
-    std::uint32_t glGetError(const char* file, int line) const;
-    void glGetIntegerv(const char* file, int line, std::uint32_t name, std::int32_t* result) const;
-    void glGetProgramivARB(const char* file, int line, std::uint32_t target, std::uint32_t code,
-                           std::int32_t* result) const;
-    void glClearColor(const char* file, int line, float red, float green, float blue,
-                      float alpha) const;
-    void glClear(const char* file, int line, std::uint32_t mask) const;
+// The entry points: the name and the type of each. _OR_EXT takes the name with "EXT" at its end, of
+// the extension that the function came from, where the driver lacks the core one.
+#define QGF_OGL_FUNCTION(name, type) const EntryPoint<type> name = {fLookup, #name}
+#define QGF_OGL_FUNCTION_OR_EXT(name, type)                                                        \
+    const EntryPoint<type> name = {fLookup, #name, #name "EXT"}
+#define QGF_OGL_FUNCTION_OR_NULL(name, type) const OptionalEntryPoint<type> name = {fLookup, #name}
 
-    std::uint32_t glCreateShader(const char* file, int line, std::uint32_t kind) const;
-    void glShaderSource(const char* file, int line, std::uint32_t shader, std::int32_t count,
-                        const char* const* strings, const std::int32_t* lengths) const;
-    void glCompileShader(const char* file, int line, std::uint32_t shader) const;
-    void glGetShaderiv(const char* file, int line, std::uint32_t shader, std::uint32_t name,
-                       std::int32_t* result) const;
-    void glGetShaderInfoLog(const char* file, int line, std::uint32_t shader, std::int32_t size,
-                            std::int32_t* length, char* text) const;
-    void glDeleteShader(const char* file, int line, std::uint32_t shader) const;
-    std::uint32_t glCreateProgram(const char* file, int line) const;
-    void glAttachShader(const char* file, int line, std::uint32_t program,
-                        std::uint32_t shader) const;
-    void glLinkProgram(const char* file, int line, std::uint32_t program) const;
-    void glGetProgramiv(const char* file, int line, std::uint32_t program, std::uint32_t name,
-                        std::int32_t* result) const;
-    void glGetProgramInfoLog(const char* file, int line, std::uint32_t program, std::int32_t size,
-                             std::int32_t* length, char* text) const;
-    void glDeleteProgram(const char* file, int line, std::uint32_t program) const;
+    QGF_OGL_FUNCTION(glGetString, const GLubyte*(GLenum name));
+    QGF_OGL_FUNCTION_OR_NULL(glGetStringi, const GLubyte*(GLenum name, GLuint index));
+    QGF_OGL_FUNCTION(glGetError, GLenum());
+    QGF_OGL_FUNCTION(glGetIntegerv, void(GLenum name, GLint* result));
+    QGF_OGL_FUNCTION(glGetProgramivARB, void(GLenum target, GLenum code, GLint* result));
+    QGF_OGL_FUNCTION(glClearColor, void(GLfloat red, GLfloat green, GLfloat blue, GLfloat alpha));
+    QGF_OGL_FUNCTION(glClear, void(GLbitfield mask));
 
-    void glGenTextures(const char* file, int line, std::int32_t count, std::uint32_t* ids) const;
-    void glBindTexture(const char* file, int line, std::uint32_t target, std::uint32_t id) const;
-    void glTexParameteri(const char* file, int line, std::uint32_t target, std::uint32_t name,
-                         std::int32_t value) const;
-    void glTexImage2D(const char* file, int line, std::uint32_t target, std::int32_t level,
-                      std::int32_t internalFormat, std::int32_t width, std::int32_t height,
-                      std::int32_t border, std::uint32_t format, std::uint32_t type,
-                      const void* data) const;
-    void glGenerateMipmap(const char* file, int line, std::uint32_t target) const;
-    void glDeleteTextures(const char* file, int line, std::int32_t count,
-                          const std::uint32_t* ids) const;
+    QGF_OGL_FUNCTION(glCreateShader, GLuint(GLenum kind));
+    QGF_OGL_FUNCTION(glShaderSource, void(GLuint shader, GLsizei count,
+                                          const GLchar* const* strings, const GLint* lengths));
+    QGF_OGL_FUNCTION(glCompileShader, void(GLuint shader));
+    QGF_OGL_FUNCTION(glGetShaderiv, void(GLuint shader, GLenum name, GLint* result));
+    QGF_OGL_FUNCTION(glGetShaderInfoLog,
+                     void(GLuint shader, GLsizei size, GLsizei* length, GLchar* text));
+    QGF_OGL_FUNCTION(glDeleteShader, void(GLuint shader));
+    QGF_OGL_FUNCTION(glCreateProgram, GLuint());
+    QGF_OGL_FUNCTION(glAttachShader, void(GLuint program, GLuint shader));
+    QGF_OGL_FUNCTION(glLinkProgram, void(GLuint program));
+    QGF_OGL_FUNCTION(glGetProgramiv, void(GLuint program, GLenum name, GLint* result));
+    QGF_OGL_FUNCTION(glGetProgramInfoLog,
+                     void(GLuint program, GLsizei size, GLsizei* length, GLchar* text));
+    QGF_OGL_FUNCTION(glDeleteProgram, void(GLuint program));
 
-    void glGenFramebuffers(const char* file, int line, std::int32_t count,
-                           std::uint32_t* ids) const;
-    void glBindFramebuffer(const char* file, int line, std::uint32_t target,
-                           std::uint32_t id) const;
-    void glFramebufferTexture2D(const char* file, int line, std::uint32_t target,
-                                std::uint32_t attachment, std::uint32_t textureTarget,
-                                std::uint32_t texture, std::int32_t level) const;
-    std::uint32_t glCheckFramebufferStatus(const char* file, int line, std::uint32_t target) const;
-    void glDeleteFramebuffers(const char* file, int line, std::int32_t count,
-                              const std::uint32_t* ids) const;
+    QGF_OGL_FUNCTION(glGenTextures, void(GLsizei count, GLuint* ids));
+    QGF_OGL_FUNCTION(glBindTexture, void(GLenum target, GLuint id));
+    QGF_OGL_FUNCTION(glTexParameteri, void(GLenum target, GLenum name, GLint value));
+    QGF_OGL_FUNCTION(glTexImage2D, void(GLenum target, GLint level, GLint internalFormat,
+                                        GLsizei width, GLsizei height, GLint border, GLenum format,
+                                        GLenum type, const void* data));
+    QGF_OGL_FUNCTION_OR_EXT(glGenerateMipmap, void(GLenum target));
+    QGF_OGL_FUNCTION(glDeleteTextures, void(GLsizei count, const GLuint* ids));
 
-private:
-    std::unique_ptr<OpenGLTable> fTable;
+    QGF_OGL_FUNCTION_OR_EXT(glGenFramebuffers, void(GLsizei count, GLuint* ids));
+    QGF_OGL_FUNCTION_OR_EXT(glBindFramebuffer, void(GLenum target, GLuint id));
+    QGF_OGL_FUNCTION_OR_EXT(glFramebufferTexture2D,
+                            void(GLenum target, GLenum attachment, GLenum textureTarget,
+                                 GLuint texture, GLint level));
+    QGF_OGL_FUNCTION_OR_EXT(glCheckFramebufferStatus, GLenum(GLenum target));
+    QGF_OGL_FUNCTION_OR_EXT(glDeleteFramebuffers, void(GLsizei count, const GLuint* ids));
+
+#undef QGF_OGL_FUNCTION
+#undef QGF_OGL_FUNCTION_OR_EXT
+#undef QGF_OGL_FUNCTION_OR_NULL
 };
 
 // Core versions and extensions, by the library's own numbers.
