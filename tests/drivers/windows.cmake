@@ -1,11 +1,13 @@
 # Drivers for Windows. OpenCL.dll misbehaves as ASSAY_MISBEHAVE says as soon as it is asked for
 # platforms; it has each entry point that the program looks for. planted.dll tells on standard error
 # that it was loaded, under whatever name it lies there.
-file(STRINGS ${CMAKE_SOURCE_DIR}/qgf/source/qgf/qgf_ocl/FunctionTable.cpp lines
-  REGEX "^ +QGF_OCL_FILL\\(")
+set(table ${CMAKE_SOURCE_DIR}/qgf/include/qgf/OCLFunctionTable.h)
+set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${table})
+file(READ ${table} text)
+string(REGEX MATCHALL "CALLED\\(cl[A-Za-z0-9]+\\)" entries "${text}")
 set(exports "EXPORTS\n")
-foreach(line ${lines})
-  string(REGEX REPLACE "^ +QGF_OCL_FILL\\(([A-Za-z0-9]+)\\).*$" "\\1" name ${line})
+foreach(entry ${entries})
+  string(REGEX REPLACE "^CALLED\\((.+)\\)$" "\\1" name ${entry})
   string(APPEND exports "${name} = Misbehaving\n")
 endforeach()
 file(GENERATE OUTPUT ${CMAKE_CURRENT_BINARY_DIR}/OpenCL.def CONTENT "${exports}")

@@ -12,83 +12,93 @@
 
 #include "qgf/Core.h"
 
+// OpenCL's entry points, one a line, in the order in which the OpenCL 1.0 header declares them. The
+// two parameters are macros that take a name: CALLED for the entry points that are called, which a
+// library must have, UNCALLED for the others. To call one of those, make it CALLED; it is required
+// from then on.
+#define QGF_OCL_ENTRY_POINTS(CALLED, UNCALLED)                                                     \
+    CALLED(clGetPlatformIDs)                                                                       \
+    CALLED(clGetPlatformInfo)                                                                      \
+    CALLED(clGetDeviceIDs)                                                                         \
+    CALLED(clGetDeviceInfo)                                                                        \
+    CALLED(clCreateContext)                                                                        \
+    UNCALLED(clCreateContextFromType)                                                              \
+    UNCALLED(clRetainContext)                                                                      \
+    CALLED(clReleaseContext)                                                                       \
+    UNCALLED(clGetContextInfo)                                                                     \
+    CALLED(clCreateCommandQueue)                                                                   \
+    UNCALLED(clRetainCommandQueue)                                                                 \
+    CALLED(clReleaseCommandQueue)                                                                  \
+    UNCALLED(clGetCommandQueueInfo)                                                                \
+    UNCALLED(clSetCommandQueueProperty)                                                            \
+    CALLED(clCreateBuffer)                                                                         \
+    UNCALLED(clCreateImage2D)                                                                      \
+    UNCALLED(clCreateImage3D)                                                                      \
+    UNCALLED(clRetainMemObject)                                                                    \
+    CALLED(clReleaseMemObject)                                                                     \
+    UNCALLED(clGetSupportedImageFormats)                                                           \
+    UNCALLED(clGetMemObjectInfo)                                                                   \
+    UNCALLED(clGetImageInfo)                                                                       \
+    UNCALLED(clCreateSampler)                                                                      \
+    UNCALLED(clRetainSampler)                                                                      \
+    UNCALLED(clReleaseSampler)                                                                     \
+    UNCALLED(clGetSamplerInfo)                                                                     \
+    CALLED(clCreateProgramWithSource)                                                              \
+    UNCALLED(clCreateProgramWithBinary)                                                            \
+    UNCALLED(clRetainProgram)                                                                      \
+    UNCALLED(clReleaseProgram)                                                                     \
+    CALLED(clBuildProgram)                                                                         \
+    UNCALLED(clUnloadCompiler)                                                                     \
+    UNCALLED(clGetProgramInfo)                                                                     \
+    UNCALLED(clGetProgramBuildInfo)                                                                \
+    CALLED(clCreateKernel)                                                                         \
+    UNCALLED(clCreateKernelsInProgram)                                                             \
+    UNCALLED(clRetainKernel)                                                                       \
+    UNCALLED(clReleaseKernel)                                                                      \
+    CALLED(clSetKernelArg)                                                                         \
+    UNCALLED(clGetKernelInfo)                                                                      \
+    UNCALLED(clGetKernelWorkGroupInfo)                                                             \
+    CALLED(clWaitForEvents)                                                                        \
+    UNCALLED(clGetEventInfo)                                                                       \
+    UNCALLED(clRetainEvent)                                                                        \
+    CALLED(clReleaseEvent)                                                                         \
+    CALLED(clGetEventProfilingInfo)                                                                \
+    UNCALLED(clFlush)                                                                              \
+    CALLED(clFinish)                                                                               \
+    UNCALLED(clEnqueueReadBuffer)                                                                  \
+    UNCALLED(clEnqueueWriteBuffer)                                                                 \
+    CALLED(clEnqueueCopyBuffer)                                                                    \
+    UNCALLED(clEnqueueReadImage)                                                                   \
+    UNCALLED(clEnqueueWriteImage)                                                                  \
+    UNCALLED(clEnqueueCopyImage)                                                                   \
+    UNCALLED(clEnqueueCopyImageToBuffer)                                                           \
+    UNCALLED(clEnqueueCopyBufferToImage)                                                           \
+    UNCALLED(clEnqueueMapBuffer)                                                                   \
+    UNCALLED(clEnqueueMapImage)                                                                    \
+    UNCALLED(clEnqueueUnmapMemObject)                                                              \
+    CALLED(clEnqueueNDRangeKernel)                                                                 \
+    UNCALLED(clEnqueueTask)                                                                        \
+    UNCALLED(clEnqueueNativeKernel)                                                                \
+    UNCALLED(clEnqueueMarker)                                                                      \
+    UNCALLED(clEnqueueWaitForEvents)                                                               \
+    UNCALLED(clEnqueueBarrier)                                                                     \
+    UNCALLED(clGetExtensionFunctionAddress)
+
 namespace QGF {
 namespace OCL {
 
 // An entry point that nothing here calls, so that a library may lack it: the pointer is null then.
-// To call one, make it a plain function pointer; it is required from then on.
 template <typename Function>
 struct Uncalled {
     Function address;
 };
 
 struct FunctionTable {
-    decltype(&::clGetPlatformIDs) clGetPlatformIDs;
-    decltype(&::clGetPlatformInfo) clGetPlatformInfo;
-    decltype(&::clGetDeviceIDs) clGetDeviceIDs;
-    decltype(&::clGetDeviceInfo) clGetDeviceInfo;
-    decltype(&::clCreateContext) clCreateContext;
-    Uncalled<decltype(&::clCreateContextFromType)> clCreateContextFromType;
-    Uncalled<decltype(&::clRetainContext)> clRetainContext;
-    decltype(&::clReleaseContext) clReleaseContext;
-    Uncalled<decltype(&::clGetContextInfo)> clGetContextInfo;
-    decltype(&::clCreateCommandQueue) clCreateCommandQueue;
-    Uncalled<decltype(&::clRetainCommandQueue)> clRetainCommandQueue;
-    decltype(&::clReleaseCommandQueue) clReleaseCommandQueue;
-    Uncalled<decltype(&::clGetCommandQueueInfo)> clGetCommandQueueInfo;
-    Uncalled<decltype(&::clSetCommandQueueProperty)> clSetCommandQueueProperty;
-    decltype(&::clCreateBuffer) clCreateBuffer;
-    Uncalled<decltype(&::clCreateImage2D)> clCreateImage2D;
-    Uncalled<decltype(&::clCreateImage3D)> clCreateImage3D;
-    Uncalled<decltype(&::clRetainMemObject)> clRetainMemObject;
-    decltype(&::clReleaseMemObject) clReleaseMemObject;
-    Uncalled<decltype(&::clGetSupportedImageFormats)> clGetSupportedImageFormats;
-    Uncalled<decltype(&::clGetMemObjectInfo)> clGetMemObjectInfo;
-    Uncalled<decltype(&::clGetImageInfo)> clGetImageInfo;
-    Uncalled<decltype(&::clCreateSampler)> clCreateSampler;
-    Uncalled<decltype(&::clRetainSampler)> clRetainSampler;
-    Uncalled<decltype(&::clReleaseSampler)> clReleaseSampler;
-    Uncalled<decltype(&::clGetSamplerInfo)> clGetSamplerInfo;
-    decltype(&::clCreateProgramWithSource) clCreateProgramWithSource;
-    Uncalled<decltype(&::clCreateProgramWithBinary)> clCreateProgramWithBinary;
-    Uncalled<decltype(&::clRetainProgram)> clRetainProgram;
-    Uncalled<decltype(&::clReleaseProgram)> clReleaseProgram;
-    decltype(&::clBuildProgram) clBuildProgram;
-    Uncalled<decltype(&::clUnloadCompiler)> clUnloadCompiler;
-    Uncalled<decltype(&::clGetProgramInfo)> clGetProgramInfo;
-    Uncalled<decltype(&::clGetProgramBuildInfo)> clGetProgramBuildInfo;
-    decltype(&::clCreateKernel) clCreateKernel;
-    Uncalled<decltype(&::clCreateKernelsInProgram)> clCreateKernelsInProgram;
-    Uncalled<decltype(&::clRetainKernel)> clRetainKernel;
-    Uncalled<decltype(&::clReleaseKernel)> clReleaseKernel;
-    decltype(&::clSetKernelArg) clSetKernelArg;
-    Uncalled<decltype(&::clGetKernelInfo)> clGetKernelInfo;
-    Uncalled<decltype(&::clGetKernelWorkGroupInfo)> clGetKernelWorkGroupInfo;
-    decltype(&::clWaitForEvents) clWaitForEvents;
-    Uncalled<decltype(&::clGetEventInfo)> clGetEventInfo;
-    Uncalled<decltype(&::clRetainEvent)> clRetainEvent;
-    decltype(&::clReleaseEvent) clReleaseEvent;
-    decltype(&::clGetEventProfilingInfo) clGetEventProfilingInfo;
-    Uncalled<decltype(&::clFlush)> clFlush;
-    decltype(&::clFinish) clFinish;
-    Uncalled<decltype(&::clEnqueueReadBuffer)> clEnqueueReadBuffer;
-    Uncalled<decltype(&::clEnqueueWriteBuffer)> clEnqueueWriteBuffer;
-    decltype(&::clEnqueueCopyBuffer) clEnqueueCopyBuffer;
-    Uncalled<decltype(&::clEnqueueReadImage)> clEnqueueReadImage;
-    Uncalled<decltype(&::clEnqueueWriteImage)> clEnqueueWriteImage;
-    Uncalled<decltype(&::clEnqueueCopyImage)> clEnqueueCopyImage;
-    Uncalled<decltype(&::clEnqueueCopyImageToBuffer)> clEnqueueCopyImageToBuffer;
-    Uncalled<decltype(&::clEnqueueCopyBufferToImage)> clEnqueueCopyBufferToImage;
-    Uncalled<decltype(&::clEnqueueMapBuffer)> clEnqueueMapBuffer;
-    Uncalled<decltype(&::clEnqueueMapImage)> clEnqueueMapImage;
-    Uncalled<decltype(&::clEnqueueUnmapMemObject)> clEnqueueUnmapMemObject;
-    decltype(&::clEnqueueNDRangeKernel) clEnqueueNDRangeKernel;
-    Uncalled<decltype(&::clEnqueueTask)> clEnqueueTask;
-    Uncalled<decltype(&::clEnqueueNativeKernel)> clEnqueueNativeKernel;
-    Uncalled<decltype(&::clEnqueueMarker)> clEnqueueMarker;
-    Uncalled<decltype(&::clEnqueueWaitForEvents)> clEnqueueWaitForEvents;
-    Uncalled<decltype(&::clEnqueueBarrier)> clEnqueueBarrier;
-    Uncalled<decltype(&::clGetExtensionFunctionAddress)> clGetExtensionFunctionAddress;
+#define QGF_OCL_CALLED(name) decltype(&::name) name;
+#define QGF_OCL_UNCALLED(name) Uncalled<decltype(&::name)> name;
+    QGF_OCL_ENTRY_POINTS(QGF_OCL_CALLED, QGF_OCL_UNCALLED)
+#undef QGF_OCL_CALLED
+#undef QGF_OCL_UNCALLED
 };
 
 // Fills the table with what `getProc(context, name)` gives. False if an entry point that is called

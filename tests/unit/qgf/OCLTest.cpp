@@ -1,8 +1,13 @@
 #include "qgf/OCL.h"
 
+#include <cstdint>
+#include <cstring>
 #include <new>
+#include <numeric>
 #include <set>
 #include <stdexcept>
+#include <string>
+#include <vector>
 
 #include <gmock/gmock.h>
 
@@ -457,6 +462,23 @@ TEST(OCLFunctionTableTest, IsCompleteWithEveryEntryPointOfTheFirstHeader)
     QGF::OCL::FunctionTable table{};
     EXPECT_TRUE(QGF::OCL::FillFunctionTable(table, GetShortProc, &library));
     EXPECT_EQ(library.asked.size(), sizeof table / sizeof(QGF::Core::Proc));
+}
+
+QGF::Core::Proc GetNumberedProc(void* context, const char*)
+{
+    return reinterpret_cast<QGF::Core::Proc>(++*static_cast<std::uintptr_t*>(context));
+}
+
+TEST(OCLFunctionTableTest, AsksForItsMembersInTheirOrder)
+{
+    std::uintptr_t asked = 0;
+    QGF::OCL::FunctionTable table{};
+    QGF::OCL::FillFunctionTable(table, GetNumberedProc, &asked);
+    std::vector<std::uintptr_t> members(sizeof table / sizeof(std::uintptr_t));
+    std::memcpy(members.data(), &table, sizeof table);
+    std::vector<std::uintptr_t> inOrder(asked);
+    std::iota(inOrder.begin(), inOrder.end(), 1);
+    EXPECT_EQ(members, inOrder);
 }
 
 // The entry points that the program calls.
