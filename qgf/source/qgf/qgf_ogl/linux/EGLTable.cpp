@@ -20,22 +20,11 @@ void FillEGLTable(EGLTable& table, Core::Proc (*getProc)(void* context, const ch
             table.eglGetProcAddress(name));
     };
 
-    fill(table.eglGetError, "eglGetError");
-    fill(table.eglQueryString, "eglQueryString");
-    fill(table.eglGetDisplay, "eglGetDisplay");
-    fill(table.eglInitialize, "eglInitialize");
-    fill(table.eglBindAPI, "eglBindAPI");
-    fill(table.eglChooseConfig, "eglChooseConfig");
-    fill(table.eglCreateContext, "eglCreateContext");
-    fill(table.eglDestroyContext, "eglDestroyContext");
-    fill(table.eglCreatePbufferSurface, "eglCreatePbufferSurface");
-    fill(table.eglDestroySurface, "eglDestroySurface");
-    fill(table.eglMakeCurrent, "eglMakeCurrent");
-    fill(table.eglGetProcAddress, "eglGetProcAddress");
-
-    fillExtension(table.eglGetPlatformDisplayEXT, "eglGetPlatformDisplayEXT");
-    fillExtension(table.eglQueryDevicesEXT, "eglQueryDevicesEXT");
-    fillExtension(table.eglQueryDeviceStringEXT, "eglQueryDeviceStringEXT");
+#define QGF_EGL_FILL(name) fill(table.name, #name);
+#define QGF_EGL_FILL_EXTENSION(name) fillExtension(table.name, #name);
+    QGF_EGL_ENTRY_POINTS(QGF_EGL_FILL, QGF_EGL_FILL_EXTENSION)
+#undef QGF_EGL_FILL
+#undef QGF_EGL_FILL_EXTENSION
 }
 
 } // namespace OGL

@@ -3,32 +3,39 @@
 
 // EGL's own types are enough; the window system's headers stay out.
 #define EGL_NO_PLATFORM_SPECIFIC_TYPES
+#define EGL_EGLEXT_PROTOTYPES
 #include <EGL/egl.h>
 #include <EGL/eglext.h>
 
 #include "qgf/Core.h"
 
+// EGL's entry points, one a line. The two parameters are macros that take a name: CORE for those
+// that each EGL library has, EXTENSION for those of extensions, null where the library lacks them.
+// The latter come after eglGetProcAddress, which finds them.
+#define QGF_EGL_ENTRY_POINTS(CORE, EXTENSION)                                                      \
+    CORE(eglGetError)                                                                              \
+    CORE(eglQueryString)                                                                           \
+    CORE(eglGetDisplay)                                                                            \
+    CORE(eglInitialize)                                                                            \
+    CORE(eglBindAPI)                                                                               \
+    CORE(eglChooseConfig)                                                                          \
+    CORE(eglCreateContext)                                                                         \
+    CORE(eglDestroyContext)                                                                        \
+    CORE(eglCreatePbufferSurface)                                                                  \
+    CORE(eglDestroySurface)                                                                        \
+    CORE(eglMakeCurrent)                                                                           \
+    CORE(eglGetProcAddress)                                                                        \
+    EXTENSION(eglGetPlatformDisplayEXT)                                                            \
+    EXTENSION(eglQueryDevicesEXT)                                                                  \
+    EXTENSION(eglQueryDeviceStringEXT)
+
 namespace QGF {
 namespace OGL {
 
 struct EGLTable {
-    EGLint (*eglGetError)() = nullptr;
-    const char* (*eglQueryString)(EGLDisplay, EGLint) = nullptr;
-    EGLDisplay (*eglGetDisplay)(EGLNativeDisplayType) = nullptr;
-    EGLBoolean (*eglInitialize)(EGLDisplay, EGLint*, EGLint*) = nullptr;
-    EGLBoolean (*eglBindAPI)(EGLenum) = nullptr;
-    EGLBoolean (*eglChooseConfig)(EGLDisplay, const EGLint*, EGLConfig*, EGLint, EGLint*) = nullptr;
-    EGLContext (*eglCreateContext)(EGLDisplay, EGLConfig, EGLContext, const EGLint*) = nullptr;
-    EGLBoolean (*eglDestroyContext)(EGLDisplay, EGLContext) = nullptr;
-    EGLSurface (*eglCreatePbufferSurface)(EGLDisplay, EGLConfig, const EGLint*) = nullptr;
-    EGLBoolean (*eglDestroySurface)(EGLDisplay, EGLSurface) = nullptr;
-    EGLBoolean (*eglMakeCurrent)(EGLDisplay, EGLSurface, EGLSurface, EGLContext) = nullptr;
-    Core::Proc (*eglGetProcAddress)(const char*) = nullptr;
-
-    // Null where the EGL library doesn't offer the extension.
-    EGLDisplay (*eglGetPlatformDisplayEXT)(EGLenum, void*, const EGLint*) = nullptr;
-    EGLBoolean (*eglQueryDevicesEXT)(EGLint, EGLDeviceEXT*, EGLint*) = nullptr;
-    const char* (*eglQueryDeviceStringEXT)(EGLDeviceEXT, EGLint) = nullptr;
+#define QGF_EGL_MEMBER(name) decltype(&::name) name = nullptr;
+    QGF_EGL_ENTRY_POINTS(QGF_EGL_MEMBER, QGF_EGL_MEMBER)
+#undef QGF_EGL_MEMBER
 };
 
 // Fills the table with what `getProc(context, name)` gives: EGL's core functions from there, those
