@@ -14,11 +14,11 @@
 #include "report/JsonDocument.h"
 #include "report/LineForm.h"
 #include "report/Report.h"
+#include "report/SequenceReader.h"
 #include "report/TextView.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
-#include "supervise/Position.h"
 
 namespace assay_host {
 
@@ -58,7 +58,7 @@ public:
 
     void OnLine(const ReportLine& line, double seconds) override
     {
-        fPosition.Add(line);
+        fSequence.Add(line);
         if (fChoice.fFormat == Format::kJsonLines)
             WriteEvent([kept = ShortenLine(line), seconds] {
                 return MakeLineEvent(RestoreLine(kept), seconds);
@@ -79,8 +79,8 @@ public:
 
     void OnTick(double seconds) override
     {
-        const std::string next = fPosition.GetNextKey();
-        fWriter.ShowProgress(fmt::format("{:.1f} s, {} steps, {}", seconds, fPosition.GetSteps(),
+        const std::string next = fSequence.GetNextKey();
+        fWriter.ShowProgress(fmt::format("{:.1f} s, {} steps, {}", seconds, fSequence.GetSteps(),
                                          next.empty() ? "at the end" : "at " + next));
     }
 
@@ -121,7 +121,7 @@ private:
     const RunChoice& fChoice;
     WriterThread& fWriter;
     Report fReport;
-    Position fPosition;
+    SequenceReader fSequence;
 };
 
 } // namespace

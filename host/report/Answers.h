@@ -47,10 +47,9 @@ struct DeviceAnswers {
 struct Answers {
     std::vector<Answer> fReport;         // the report's own keys, then the others without a tag
     std::vector<DeviceAnswers> fDevices; // OpenGL first, then by index
-    // Devices beyond the most that are told apart, which no machine has.
+    // Devices of an index from kMaxDevices on, which no machine has.
     std::size_t fDevicesLeftOut;
-    // The key of the next line in the report's order, tag and all: what the child was at when a
-    // report broke off. Empty of a whole report.
+    // As SequenceReader::GetNextKey() says of the whole report.
     std::string fNext;
 };
 

@@ -1,6 +1,7 @@
 #include "report/KnownKeys.h"
 
 #include <algorithm>
+#include <unordered_map>
 #include <utility>
 
 #include <fmt/format.h>
@@ -212,12 +213,16 @@ const std::vector<const KnownKey*>& GetReportKeys()
     return keys;
 }
 
-const KnownKey* FindReportKey(std::string_view key)
+const KnownKey* FindKnownKey(std::optional<DeviceKind> kind, std::string_view name)
 {
-    const std::vector<const KnownKey*>& keys = GetReportKeys();
-    const auto found = std::find_if(keys.begin(), keys.end(),
-                                    [key](const KnownKey* known) { return known->fKey == key; });
-    return found == keys.end() ? nullptr : *found;
+    static const auto places = [] {
+        std::unordered_map<std::string_view, const KnownKey*> found;
+        for (const KnownKey& key : GetKnownKeys())
+            found.emplace(key.fKey, &key);
+        return found;
+    }();
+    const auto place = places.find(name);
+    return place != places.end() && place->second->fKind == kind ? place->second : nullptr;
 }
 
 } // namespace assay_host

@@ -99,8 +99,10 @@ const std::vector<KnownKey>& GetKnownKeys();
 // Those of them that each device of the kind has.
 Table<KnownKey> GetDeviceKeys(DeviceKind kind);
 
-// Those of them that belong to no device; null of another key.
+// Those of them that belong to no device.
 const std::vector<const KnownKey*>& GetReportKeys();
-const KnownKey* FindReportKey(std::string_view key);
+
+// The key of that name that devices of the kind have, or the report itself; null if there is none.
+const KnownKey* FindKnownKey(std::optional<DeviceKind> kind, std::string_view name);
 
 } // namespace assay_host

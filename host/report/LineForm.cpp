@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <utility>
 
-#include "report/KnownKeys.h"
+#include "report/Numbers.h"
 
 namespace assay_host {
 
@@ -82,6 +82,11 @@ bool IsWholeValue(const ReportLine& line)
     return line.fKind == LineKind::kValue && !line.fCut && !line.fLineEnd.empty();
 }
 
+bool IsStamp(const ReportLine& line)
+{
+    return line.fQuoted && IsWholeValue(line);
+}
+
 bool LeavesQuoteOpen(std::string_view text)
 {
     if (StartsWith(text, "#"))
@@ -95,7 +100,7 @@ bool BeginsLikeReportLine(std::string_view text)
     if (StartsWith(text, "#") || StartsWith(text, "gputag.") || GetDeviceTag(text))
         return true;
     const std::string_view word = text.substr(0, text.find('='));
-    return word.size() < text.size() && FindReportKey(word) != nullptr;
+    return word.size() < text.size() && FindKnownKey(std::nullopt, word) != nullptr;
 }
 
 std::optional<std::string_view> GetDeviceTag(std::string_view key)
@@ -112,6 +117,18 @@ std::optional<std::string_view> GetDeviceTag(std::string_view key)
     if (!isIndex || key.substr(end, 2) != "].")
         return std::nullopt;
     return key.substr(0, end + 1);
+}
+
+std::optional<DeviceTag> ReadDeviceTag(std::string_view tag)
+{
+    if (GetDeviceTag(std::string(tag) + ".") == std::nullopt)
+        return std::nullopt;
+    const std::size_t open = tag.find('[');
+    const DeviceKind kind = tag.substr(0, open) == GetTagWord(DeviceKind::kOpenGL)
+                                ? DeviceKind::kOpenGL
+                                : DeviceKind::kOpenCL;
+    const auto index = ReadUnsigned(tag.substr(open + 1, tag.size() - open - 2));
+    return DeviceTag{kind, static_cast<std::size_t>(*index)};
 }
 
 } // namespace assay_host

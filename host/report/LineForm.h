@@ -1,10 +1,12 @@
 // The forms that a line of a report has.
 #pragma once
 
+#include <cstddef>
 #include <optional>
 #include <string>
 #include <string_view>
 
+#include "report/KnownKeys.h"
 #include "report/ReportLine.h"
 
 namespace assay_host {
@@ -16,6 +18,9 @@ ReportLine ReadLine(std::string text, std::string lineEnd, bool cut);
 // Whether the line is a complete value: it has its line end, and nothing was cut from it.
 bool IsWholeValue(const ReportLine& line);
 
+// Whether the line is a time stamp, quotes, line end and all.
+bool IsStamp(const ReportLine& line);
+
 // Whether the line is key=value with a quote that isn't closed.
 bool LeavesQuoteOpen(std::string_view text);
 
@@ -25,5 +30,12 @@ bool BeginsLikeReportLine(std::string_view text);
 
 // "glgpu[0]" of "glgpu[0].GLName"; nothing of a key without a device's tag.
 std::optional<std::string_view> GetDeviceTag(std::string_view key);
+
+// What a device's tag says; nothing of another text.
+struct DeviceTag {
+    DeviceKind fKind;
+    std::size_t fIndex;
+};
+std::optional<DeviceTag> ReadDeviceTag(std::string_view tag);
 
 } // namespace assay_host

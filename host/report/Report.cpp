@@ -6,15 +6,6 @@
 
 namespace assay_host {
 
-namespace {
-
-bool IsStamp(const ReportLine* line)
-{
-    return line && line->fQuoted && IsWholeValue(*line);
-}
-
-} // namespace
-
 void Report::Add(ReportLine line)
 {
     const std::size_t index = fLines.size();
@@ -63,12 +54,14 @@ const ReportLine* Report::Find(const Device& device, const std::string& key) con
 
 bool Report::IsWhole() const
 {
-    return IsStamp(Find("assayStart")) && HasEnd();
+    const ReportLine* const start = Find("assayStart");
+    return start && IsStamp(*start) && HasEnd();
 }
 
 bool Report::HasEnd() const
 {
-    return IsStamp(Find("assayEnd"));
+    const ReportLine* const end = Find("assayEnd");
+    return end && IsStamp(*end);
 }
 
 std::string Report::ToText() const

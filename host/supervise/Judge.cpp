@@ -50,7 +50,7 @@ std::string Where(const ReportProgress& report)
 {
     if (!report.HasValues())
         return " before its first line";
-    const std::string next = report.GetPosition().GetNextKey();
+    const std::string next = report.GetSequence().GetNextKey();
     return fmt::format(" behind {}{}", report.GetLastKey(), next.empty() ? "" : ", at " + next);
 }
 
@@ -90,6 +90,7 @@ bool IsComplete(const Evidence& evidence, const RunOutcome& outcome)
 
 void ReportProgress::Add(const ReportLine& line)
 {
+    fSequence.Add(line);
     if (line.fKind == LineKind::kComment) {
         fLastLogLine = line.fText;
         return;
@@ -97,13 +98,11 @@ void ReportProgress::Add(const ReportLine& line)
     if (line.fKind == LineKind::kRaw)
         return;
     fHasValues = true;
-    const bool isStamp = line.fQuoted && IsWholeValue(line);
-    fHasStart = fHasStart || (isStamp && line.fKey == "assayStart");
-    fHasEnd = fHasEnd || (isStamp && line.fKey == "assayEnd");
+    fHasStart = fHasStart || (IsStamp(line) && line.fKey == "assayStart");
+    fHasEnd = fHasEnd || (IsStamp(line) && line.fKey == "assayEnd");
     fLastReportLine = line.fText;
     fLastKey = line.fKey;
     fLastLogLine.clear();
-    fPosition.Add(line);
 }
 
 void Judge(const Evidence& evidence, RunOutcome& outcome)

@@ -8,7 +8,7 @@
 
 #include "report/ReportLine.h"
 #include "report/RunOutcome.h"
-#include "supervise/Position.h"
+#include "report/SequenceReader.h"
 #include "supervise/WatchedLauncher.h"
 
 namespace assay_host {
@@ -23,7 +23,7 @@ public:
     const std::string& GetLastReportLine() const { return fLastReportLine; }
     const std::string& GetLastKey() const { return fLastKey; }
     const std::string& GetLastLogLine() const { return fLastLogLine; }
-    const Position& GetPosition() const { return fPosition; }
+    const SequenceReader& GetSequence() const { return fSequence; }
 
 private:
     bool fHasValues = false;
@@ -32,7 +32,7 @@ private:
     std::string fLastReportLine;
     std::string fLastKey;
     std::string fLastLogLine;
-    Position fPosition;
+    SequenceReader fSequence;
 };
 
 // Why the host ended the child.

@@ -103,12 +103,11 @@ std::vector<std::string> ListTags(const Report& report, DeviceKind kind)
     return tags;
 }
 
-// The test that the device didn't survive, to go by its last line; behind the last test if it did.
-std::size_t FindFailingTest(const Report& report, Table<KnownKey> keys, const std::string& tag)
+// The test that the device didn't survive, to go by its last line; the number of tests if it did.
+std::size_t FindFailingTest(const SequenceReader& sequence, const DeviceTag& tag)
 {
-    std::size_t next = keys.size();
-    while (next > 0 && report.Find(keys[next - 1].GetKey(tag)) == nullptr)
-        --next;
+    const Table<KnownKey> keys = GetDeviceKeys(tag.fKind);
+    const std::size_t next = sequence.CountAnswered(tag);
     return next < keys.size() && keys[next].MayBeSilent() ? next + 1 : next;
 }
 
@@ -182,6 +181,9 @@ StepRules::StepRules(const Report& report, const RunOutcome& outcome)
         start.fLines.push_back({line, Match::kExact});
     }
     fOperations.push_back(start);
+    SequenceReader sequence;
+    for (const ReportLine& line : report.GetLines())
+        sequence.Add(line);
     for (const KnownKey* const key : GetReportKeys()) {
         if (key->fKey == GetCountKey(DeviceKind::kOpenCL)) {
             fHasOpenCL = report.Find(key->fKey) != nullptr;
@@ -191,9 +193,9 @@ StepRules::StepRules(const Report& report, const RunOutcome& outcome)
         AddReportKey(report, *key);
         if (key->fKey == GetCountKey(DeviceKind::kOpenGL)) {
             fOperations.back().fErrors = ListEnumerationTexts(outcome.fErrorLines);
-            fGLCount = AddDevices(report, DeviceKind::kOpenGL);
+            fGLCount = AddDevices(report, sequence, DeviceKind::kOpenGL);
         } else if (key->fKey == GetCountKey(DeviceKind::kOpenCL)) {
-            fCLCount = AddDevices(report, DeviceKind::kOpenCL);
+            fCLCount = AddDevices(report, sequence, DeviceKind::kOpenCL);
         }
     }
     fOperations.push_back(Operation());
@@ -216,14 +218,15 @@ void StepRules::AddReportKey(const Report& report, const KnownKey& key)
     fOperations.push_back(operation);
 }
 
-std::size_t StepRules::AddDevices(const Report& report, DeviceKind kind)
+std::size_t StepRules::AddDevices(const Report& report, const SequenceReader& sequence,
+                                  DeviceKind kind)
 {
     const Table<KnownKey> keys = GetDeviceKeys(kind);
     const std::vector<std::string> tags = ListTags(report, kind);
     std::vector<std::size_t> failing; // by device, the test that has cost it the rest
     failing.reserve(tags.size());
-    for (const std::string& tag : tags)
-        failing.push_back(FindFailingTest(report, keys, tag));
+    for (std::size_t device = 0; device < tags.size(); ++device)
+        failing.push_back(FindFailingTest(sequence, {kind, device}));
 
     for (std::size_t index = 0; index < keys.size(); ++index) {
         const KnownKey& known = keys[index];

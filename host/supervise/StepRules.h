@@ -10,6 +10,7 @@
 #include "report/KnownKeys.h"
 #include "report/Report.h"
 #include "report/RunOutcome.h"
+#include "report/SequenceReader.h"
 
 namespace assay_host {
 
@@ -61,7 +62,7 @@ private:
     };
 
     void AddReportKey(const Report& report, const KnownKey& key);
-    std::size_t AddDevices(const Report& report, DeviceKind kind);
+    std::size_t AddDevices(const Report& report, const SequenceReader& sequence, DeviceKind kind);
     void AddFailureTexts(const RunOutcome& outcome);
 
     std::vector<Operation> fOperations;

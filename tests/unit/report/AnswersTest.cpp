@@ -205,8 +205,7 @@ TEST(Answers, TellTheNextLine)
     EXPECT_EQ(ended("OGLContextCreated"), "NumGLGPUs");
     EXPECT_EQ(ended("NumGLGPUs"), "glgpu[0].GLVersion");
     EXPECT_EQ(ended("glgpu[0].GLFrameBufferOK"), "glgpu[1].GLFrameBufferOK");
-    EXPECT_EQ(ended("glgpu[1].GLFrameBufferOK"),
-              "glgpu[0].glGetString[GL_SHADING_LANGUAGE_VERSION]");
+    EXPECT_EQ(ended("glgpu[1].GLFrameBufferOK"), "gputag.GL_SHADING_LANGUAGE_VERSION");
     EXPECT_EQ(ended("glgpu[1].extension[QGF::OGL::GL_ARB_SHADER_TEXTURE_LOD]"), "NumCLGPUs");
     EXPECT_EQ(ended("NumCLGPUs"), "clgpu[0].CLPlatformVersion");
     EXPECT_EQ(ended("clgpu[1].CLCompute"), "assayEnd");

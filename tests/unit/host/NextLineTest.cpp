@@ -1,0 +1,166 @@
+// What comes next in a report that broke off: each output names it, and they name the same.
+#include <random>
+#include <regex>
+#include <sstream>
+
+#include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+
+#include "Reports.h"
+#include "report/Answers.h"
+#include "report/JsonDocument.h"
+#include "report/TextView.h"
+#include "supervise/Judge.h"
+
+namespace assay_host {
+namespace {
+
+using Lines = std::vector<std::string>;
+
+// A run in which the device fails at the test that the line answers; `logs`: and the log says so.
+Lines MakeFailingRun(int glCount, int clCount, const std::string& tag, const std::string& key,
+                     bool logs)
+{
+    Lines lines;
+    bool isLost = false;
+    for (const Lines& group : MakeWholeRun(glCount, clCount)) {
+        const std::string answer = group.empty() ? "" : group.back();
+        const bool isOfDevice = answer.rfind(tag + ".", 0) == 0;
+        if (!isLost && answer.rfind(tag + "." + key, 0) == 0) {
+            isLost = true;
+            lines.insert(lines.end(), group.begin(), group.end() - 1);
+            if (logs)
+                lines.push_back("# 00009.2026.11.21_10:49:36 Testing terminated for " + tag);
+        } else if (!isLost || !isOfDevice) {
+            lines.insert(lines.end(), group.begin(), group.end());
+        }
+    }
+    return lines;
+}
+
+std::vector<Lines> MakeFailingRuns(bool logs)
+{
+    return {
+        MakeFailingRun(2, 1, "glgpu[0]", "GLName", logs),
+        MakeFailingRun(2, 1, "glgpu[1]", "glGetString", logs),
+        MakeFailingRun(2, 1, "glgpu[0]", "glGetProgramivARB", logs),
+        MakeFailingRun(3, 0, "glgpu[1]", "extension[QGF::OGL::GL_ARB_TEX", logs),
+        MakeFailingRun(1, 2, "clgpu[0]", "CLBandwidth", logs),
+        MakeFailingRun(1, 2, "clgpu[1]", "CLCompute", logs),
+    };
+}
+
+std::vector<Lines> MakeWholeRuns()
+{
+    std::vector<Lines> runs;
+    for (int glCount = 0; glCount <= 3; ++glCount) {
+        for (int clCount = 0; clCount <= 2; ++clCount)
+            runs.push_back(Join(MakeWholeRun(glCount, clCount)));
+    }
+    return runs;
+}
+
+RunOutcome JudgeCrash(const ReportProgress& progress)
+{
+    Evidence evidence;
+    evidence.fReport = progress;
+    evidence.fEnd = ChildEnd{pmutil::kEndedByCrash, 0};
+    evidence.fTermination = "signal 11";
+    RunOutcome outcome;
+    outcome.fCommand = {"assay"};
+    Judge(evidence, outcome);
+    return outcome;
+}
+
+// "glgpu[0].GLName" of "... behind glgpu[0].GLMemoryMB, at glgpu[0].GLName."; empty without one.
+std::string GetKeyOfReason(const std::string& reason)
+{
+    constexpr char kText[] = ", at ";
+    const std::size_t at = reason.rfind(kText);
+    if (at == std::string::npos)
+        return {};
+    const std::size_t first = at + sizeof kText - 1;
+    return reason.substr(first, reason.size() - first - 1);
+}
+
+void ExpectOneKeyInAllOutputs(const Report& report, const RunOutcome& outcome,
+                              const std::string& key)
+{
+    std::ostringstream json;
+    WriteDocument(json, report, outcome);
+    const auto next = nlohmann::json::parse(json.str())["report"]["next"];
+    EXPECT_EQ(next.is_null() ? "" : next.get<std::string>(), key);
+
+    std::ostringstream text;
+    PrintText(text, report, outcome, 400);
+    std::smatch found;
+    const std::string shown = text.str();
+    std::regex_search(shown, found, std::regex("Next to report +(\\S+)"));
+    EXPECT_EQ(found.str(1), key);
+}
+
+TEST(NextLine, IsTheSameInAllOutputsOfCutReports)
+{
+    constexpr int kReports = 20000;
+    constexpr int kShownInFull = 100; // each of so many
+    std::vector<Report> runs = {ReadReport(Join(MakeWholeRun(1, -1)))};
+    for (const auto& some : {MakeWholeRuns(), MakeFailingRuns(false), MakeFailingRuns(true)}) {
+        for (const Lines& lines : some)
+            runs.push_back(ReadReport(lines));
+    }
+    std::mt19937 random(20261121);
+    int differing = 0;
+    for (int number = 0; number < kReports; ++number) {
+        const std::vector<ReportLine>& lines = runs[random() % runs.size()].GetLines();
+        const std::size_t end = random() % (lines.size() + 1);
+        Report report;
+        ReportProgress progress;
+        for (std::size_t line = 0; line < end; ++line) {
+            const bool isDropped = random() % 20 == 0;
+            if (isDropped)
+                continue;
+            report.Add(lines[line]);
+            progress.Add(lines[line]);
+        }
+        const RunOutcome outcome = JudgeCrash(progress);
+        const std::string next = GetAnswers(report).fNext;
+        if (progress.HasValues() && GetKeyOfReason(outcome.fReason) != next)
+            ++differing;
+        if (progress.HasValues() && number % kShownInFull == 0 && !report.IsWhole())
+            ExpectOneKeyInAllOutputs(report, outcome, next);
+    }
+    EXPECT_EQ(differing, 0);
+}
+
+// Wherever a report ends: also in front of a gputag line, and after a failure that the log tells.
+TEST(NextLine, IsTheOneThatTheChildPrintsNext)
+{
+    std::vector<Lines> runs = MakeWholeRuns();
+    for (const Lines& failing : MakeFailingRuns(true))
+        runs.push_back(failing);
+    for (const Lines& run : runs) {
+        const Report whole = ReadReport(run);
+        ReportProgress progress;
+        Report report;
+        for (const ReportLine& line : whole.GetLines()) {
+            if (line.fKind == LineKind::kValue && progress.HasValues()) {
+                EXPECT_EQ(GetAnswers(report).fNext, line.fKey);
+                EXPECT_EQ(GetKeyOfReason(JudgeCrash(progress).fReason), line.fKey);
+            }
+            report.Add(line);
+            progress.Add(line);
+        }
+        EXPECT_EQ(GetAnswers(report).fNext, "");
+    }
+}
+
+TEST(NextLine, IsTheEndStampUntilThatIsWhole)
+{
+    for (const char* end : {"assayEnd=", "assayEnd=x\n", "assayEnd=\"2026-11-21_10:49:36\""}) {
+        const Report report = ReadReport("Tester=\"Pixmere\"\nNumGLGPUs=0\n" + std::string(end));
+        EXPECT_EQ(GetAnswers(report).fNext, "assayEnd") << end;
+    }
+}
+
+} // namespace
+} // namespace assay_host
