@@ -45,6 +45,14 @@ constexpr auto kCore = &GPUAssayTester::DoRunQGFCoreInitialize;
 constexpr auto kOGL = &GPUAssayTester::DoRunQGFOGLInitialize;
 constexpr auto kContext = &GPUAssayTester::DoRunOGLContextCreate;
 
+// The OpenGL half of the sequence alone.
+class OGLTester : public GPUAssayTester {
+public:
+    using GPUAssayTester::GPUAssayTester;
+    void DoRunQGFOCLInitialize() override {}
+    std::string GetTimestamp() override { return "now"; }
+};
+
 class NullMessage : public QGF::LogicalException {
 public:
     NullMessage() : QGF::LogicalException("") {}
@@ -122,14 +130,8 @@ TEST_F(LibraryChecks, EveryOneFailingLeavesTheSequenceRunning)
     FakeOpenGL gl(0);
     QGF::Core::ReplaceLoaderCheck([] { throw QGF::LogicalException("no loader"); });
     const assay_test::ScriptedAdapters adapters;
-    class Tester : public GPUAssayTester {
-    public:
-        using GPUAssayTester::GPUAssayTester;
-        void DoRunQGFOCLInitialize() override {}
-        std::string GetTimestamp() override { return "now"; }
-    };
     TestApp app;
-    app.makeTester = [](GPUAssayApp* owner) { return new Tester(owner); };
+    app.makeTester = [](GPUAssayApp* owner) { return new OGLTester(owner); };
     EXPECT_EQ(app.RunWith({}), 0);
     EXPECT_THAT(app.out,
                 ElementsAre("assayStart=\"now\"", "QGFCoreInitialized=0", "QGFOGLInitialized=0",
@@ -149,15 +151,9 @@ TEST_F(LibraryChecks, EveryOneFailingDoesNotKeepTheDevicesAway)
     assay_test::ScriptedAdapters adapters;
     adapters.adapters = {assay_test::MakeAdapter(u"Fake GPU 0", 0x10DE, 1),
                          assay_test::MakeAdapter(u"Fake GPU 1", 0x10DE, 2)};
-    class Tester : public GPUAssayTester {
-    public:
-        using GPUAssayTester::GPUAssayTester;
-        void DoRunQGFOCLInitialize() override {}
-        std::string GetTimestamp() override { return "now"; }
-    };
     {
         TestApp app;
-        app.makeTester = [](GPUAssayApp* owner) { return new Tester(owner); };
+        app.makeTester = [](GPUAssayApp* owner) { return new OGLTester(owner); };
         EXPECT_EQ(app.RunWith({}), 0);
         ASSERT_EQ(app.out.size(), 5U + 2U * 15U + 1U);
         EXPECT_EQ(Lines(app.out.begin(), app.out.begin() + 7),
