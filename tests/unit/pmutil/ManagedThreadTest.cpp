@@ -143,6 +143,23 @@ TEST(ManagedThread, JoinedThreadThatSomebodySharesStaysRegistered)
     EXPECT_EQ(Count(), before + 1);
 }
 
+TEST(ManagedThread, OnlyTheJoinedThreadLeavesTheRegistry)
+{
+    Gate gate;
+    Gate otherGate;
+    ManagedThread thread("label");
+    ManagedThread other("other");
+    thread.Assign(gate.NewThread());
+    other.Assign(otherGate.NewThread());
+    const boost::weak_ptr<boost::thread> abandoned = thread.GetThread();
+    const boost::weak_ptr<boost::thread> joined = other.GetThread();
+    thread.Abandon();
+    otherGate.Open();
+    EXPECT_TRUE(other.TimedJoin(10.0));
+    EXPECT_TRUE(joined.expired());
+    EXPECT_FALSE(abandoned.expired());
+}
+
 TEST(ManagedThread, AssignAbandonsWhatIsHeld)
 {
     const std::size_t before = Count();
