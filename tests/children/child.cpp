@@ -1,6 +1,7 @@
 // The child of the supervision tests: does what its arguments say, one after the other.
 //
 //   out TEXT, err TEXT     writes a line
+//   part TEXT              writes to standard error without the end of a line
 //   exit CODE              ends with the code
 //   sleep MILLISECONDS
 //   echo                   copies standard input to standard output until it ends
@@ -72,6 +73,8 @@ int main(int argc, char** argv)
             std::fflush(stdout);
         } else if (word == "err") {
             std::fprintf(stderr, "%s\n", next());
+        } else if (word == "part") {
+            std::fprintf(stderr, "%s", next());
         } else if (word == "exit") {
             ExitNow(std::atoi(next()));
         } else if (word == "sleep") {

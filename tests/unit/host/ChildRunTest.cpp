@@ -148,6 +148,14 @@ TEST(ChildRun, BringsTheLinesOfAWholeReport)
     EXPECT_GT(run.fOutcome.fSeconds, 0);
 }
 
+TEST(ChildRun, BringsALastErrorLineThatLacksItsEnd)
+{
+    const Watched run =
+        RunTestChild(kWhole + std::vector<std::string>{"err", "first", "part", "last words"});
+    EXPECT_THAT(run.fRecorder.fErrorLines, ElementsAre("first", "last words"));
+    EXPECT_THAT(run.fOutcome.fErrorLines, ElementsAre("first", "last words"));
+}
+
 TEST(ChildRun, GivesTheChildTheEndOfItsInput)
 {
     EXPECT_EQ(RunTestChild(std::vector<std::string>{"echo"} + kWhole).fOutcome.fVerdict,
