@@ -70,6 +70,37 @@ TEST(EscapeTest, HighBytesFollowTheLocalesIsgraph)
     EXPECT_EQ(Escaped(200, '"', 2), "\\x00c8");
 }
 
+// A locale of the C library for as long as it lives; the first that there is.
+class Latin1 {
+public:
+    Latin1()
+    {
+        for (const char* const name : {"en_US.ISO-8859-1", "de_DE.ISO-8859-1", ".1252"})
+            fIsSet = fIsSet || std::setlocale(LC_CTYPE, name) != nullptr;
+    }
+    ~Latin1() { std::setlocale(LC_CTYPE, fBefore.c_str()); }
+    Latin1(const Latin1&) = delete;
+    Latin1& operator=(const Latin1&) = delete;
+
+    bool IsSet() const { return fIsSet; }
+
+private:
+    const std::string fBefore = std::setlocale(LC_CTYPE, nullptr);
+    bool fIsSet = false;
+};
+
+TEST(EscapeTest, HighBytesThatALocaleTakesForGraphicStandForThemselves)
+{
+    const Latin1 locale;
+    if (!locale.IsSet())
+        GTEST_SKIP() << "this machine has no locale of 8-bit characters";
+    ASSERT_NE(std::isgraph(0xE9), 0);
+    EXPECT_EQ(Escaped(0xE9, '"', 1), "\xE9");
+    EXPECT_EQ(Escaped(0xE9, '"', 2), "\xE9");
+    EXPECT_EQ(Escaped(0x1E9, '"', 2), "\\x01e9");
+    EXPECT_EQ(Escaped(0x85, '"', 1), std::isgraph(0x85) != 0 ? "\x85" : "\\x85");
+}
+
 TEST(EscapeDeathTest, SizeOtherThan1Or2IsAProgrammingError)
 {
     testing::GTEST_FLAG(death_test_style) = "threadsafe";

@@ -13,6 +13,7 @@
 #include <string>
 #include <vector>
 
+#include "OpenThings.h"
 #include "RecordingLogger.h"
 #include "Waits.h"
 
@@ -25,6 +26,13 @@ public:
     using Entries = std::vector<std::string>;
 
     Journal() : PMLogger("journal") { fParties[boost::this_thread::get_id()] = "Client"; }
+
+    // For any other thread, before its first entry: ids come again when threads have ended.
+    void Enter(const std::string& party)
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fParties[boost::this_thread::get_id()] = party;
+    }
 
     void Write(const char* data, std::size_t size) override { fLine.append(data, size); }
 
@@ -106,6 +114,26 @@ private:
     std::map<boost::thread::id, std::string> fParties;
     std::map<std::string, Entries> fEntries;
     std::map<std::string, std::size_t> fTaken;
+};
+
+// Threads that are given up log until they end, and nobody joins them: this waits for that when it
+// goes.
+class ThreadsEnd {
+public:
+    ~ThreadsEnd()
+    {
+        EXPECT_TRUE(Eventually([&] { return CountThreads() <= fThreads; }));
+        const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
+    }
+
+private:
+    static long CountIdle()
+    {
+        boost::thread([] {}).join(); // a sanitizer adds one of its own to the first
+        return CountThreads();
+    }
+
+    const long fThreads = CountIdle();
 };
 
 } // namespace pmutil

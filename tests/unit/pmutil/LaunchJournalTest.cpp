@@ -4,7 +4,6 @@
 
 #include "FakeLauncher.h"
 #include "Journal.h"
-#include "OpenThings.h"
 #include "Throws.h"
 
 using namespace pmutil;
@@ -114,14 +113,6 @@ protected:
     {
         fJournal.Add(kReleased);
         fLauncher->End(kEndedNormally);
-        EXPECT_TRUE(Eventually([&] { return CountThreads() <= fThreads; })) << "given up, or not";
-        const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
-    }
-
-    static long CountIdleThreads()
-    {
-        boost::thread([] {}).join(); // a sanitizer adds one of its own to the first
-        return CountThreads();
     }
 
     struct Held {
@@ -204,12 +195,10 @@ protected:
         return {"LaunchThreadTask::CleanupLaunchThreadTask mustKill=" + mustKill};
     }
 
-    // In the end it sees to it that no reader of the tasks is left open.
     static Entries LauncherJoins()
     {
         return {"CleanupLaunchThreadTask: joining output task thread for stdout maxWait=600",
-                "CleanupLaunchThreadTask: joining output task thread for stderr maxWait=600",
-                "CloseReader locked", "CloseReader locked"};
+                "CleanupLaunchThreadTask: joining output task thread for stderr maxWait=600"};
     }
 
     static Entries LauncherGivesUp(const std::string& channel)
@@ -275,7 +264,6 @@ protected:
     // Keeps the thread there until the test lets it go, whatever it would wait for else.
     void HoldUntilReleased(const std::string& event) { fHolds[event] = {{"Client", kReleased, 1}}; }
 
-    const long fThreads = CountIdleThreads();
     const DebugValueSetter fLog{"ConsoleAppLog", 1};
     // A short wait that nothing comes to the end of.
     const DebugValueSetter fLongShortWait{"ConsoleAppShortWaitSecondsMinusOne", 599};
@@ -287,6 +275,7 @@ protected:
     boost::shared_ptr<JournalTask> fStderr = boost::make_shared<JournalTask>(*this, "stderr");
     boost::shared_ptr<consoleapp::ExecutionData> fData;
     LaunchParams fParams;
+    const ThreadsEnd fThreadsEnd;
 };
 
 // How a child ends, and what all parties make of it.
@@ -451,7 +440,8 @@ TEST_F(LaunchJournal, OfAWaitThatGivesALaunchUp)
              "TimedJoin(0)", "fLauncherThread.TimedJoin timeout=0", "abandon fLauncherThread",
              "thread Launcher was abandoned", "SetStateLocked state=Idle"}));
     fLauncher->End(kEndedNormally);
-    fJournal.Await("Launcher", "CloseReader locked", 2);
+    fJournal.Await("Launcher", LauncherJoins().back());
+    fJournal.Await("stderr", MissesTheApp("stderr").back());
     EXPECT_THAT(
         fJournal.Take("Launcher"),
         ElementsAreArray(Entries{"fLauncher->Wait returns 0 exitCode=0",

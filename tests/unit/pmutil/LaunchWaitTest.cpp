@@ -13,12 +13,19 @@ using consoleapp::Exception;
 namespace {
 
 constexpr double kEndless = 1000 * kLong;
-constexpr char kOther[] = ""; // the party of a thread that belongs to no launch
+constexpr char kOther[] = "other"; // the party of a thread that belongs to no launch
 
 class LaunchWait : public ConsoleAppFixture {
 protected:
+    ~LaunchWait() override
+    {
+        fGate->Open();
+        End(kEndedNormally);
+    }
+
     const DebugValueSetter fLog{"ConsoleAppLog", 1};
     Journal fJournal;
+    const ThreadsEnd fThreadsEnd;
 };
 
 TEST_F(LaunchWait, AFailureWakesASleepingWait)
@@ -26,6 +33,8 @@ TEST_F(LaunchWait, AFailureWakesASleepingWait)
     LaunchUntilItWaits();
     std::string failure;
     boost::thread waiter([&] {
+        fJournal.Enter(kOther);
+
         try {
             fApp->Wait(nullptr, kEndless);
         } catch (const Exception& exc) {
@@ -44,7 +53,10 @@ TEST_F(LaunchWait, GetStateSleepsUntilAStableState)
 {
     fApp->SetState(State::kLaunched);
     State state = State::kUndefined;
-    boost::thread waiter([&] { state = fApp->GetState(kEndless); });
+    boost::thread waiter([&] {
+        fJournal.Enter(kOther);
+        state = fApp->GetState(kEndless);
+    });
     fJournal.Await(kOther, "ConsoleApp::GetStateLocked nloops=0 fState=Launched");
     fApp->SetState(State::kRunning);
     waiter.join();
@@ -63,6 +75,8 @@ TEST_F(LaunchWait, KillWaitsNoLongerThanTheShortWait)
     const DebugValueSetter stateWait("ConsoleAppDefaultStateWaitSecondsTimesTenMinus1", 1'000'000);
     fApp->SetState(State::kLaunched);
     boost::thread killer([&] {
+        fJournal.Enter(kOther);
+
         const NoShortWait noWait;
         fApp->Kill();
     });
@@ -86,7 +100,10 @@ TEST_F(LaunchWait, TheJoinMustFitIntoTheTimeLeft)
     End(kEndedNormally, 3);
     fJournal.Await("Launcher", "SetStateLocked state=Finished");
     State end = State::kUndefined;
-    boost::thread waiter([&] { end = fApp->Wait(nullptr, 0.0); });
+    boost::thread waiter([&] {
+        fJournal.Enter(kOther);
+        end = fApp->Wait(nullptr, 0.0);
+    });
     fJournal.Await(kOther, "ConsoleApp::Wait fLauncherThread.TimedJoin(0)");
     fJournal.Await(kOther, "ConsoleApp::Wait fLauncherThread never finished");
     fGate->Open();
@@ -103,7 +120,10 @@ TEST_F(LaunchWait, ResetForgetsTheExitCode)
     LaunchUntilItWaits();
     fApp->SetState(State::kFinished); // nobody told a code yet
     int exitCode = -1;
-    boost::thread waiter([&] { fApp->Wait(&exitCode, kLong); });
+    boost::thread waiter([&] {
+        fJournal.Enter(kOther);
+        fApp->Wait(&exitCode, kLong);
+    });
     fJournal.Await(kOther, "ConsoleApp::Wait fLauncherThread.TimedJoin(");
     End(kEndedNormally, 9);
     waiter.join();
@@ -119,6 +139,84 @@ TEST_F(LaunchWait, AnAccessorMissesTheAppAfterItsReset)
     EXPECT_EQ(accessor.GetConsoleApp(), fApp);
     fApp->Reset();
     EXPECT_TRUE(ThrowsFailure("Client: no console app", [&] { accessor.GetConsoleApp(); }));
+}
+
+// Waits of this length run out while the test holds what the waiter needs to go on.
+constexpr double kBrief = 0.2;
+
+void OutlastABriefWait()
+{
+    const double end = GetWaitClock() + 2 * kBrief;
+    while (GetWaitClock() < end)
+        boost::this_thread::yield();
+}
+
+TEST_F(LaunchWait, AStateThatComesWhenTheTimeHasJustRunOutIsSeen)
+{
+    const std::string looks = "ConsoleApp::GetStateLocked nloops=0 fState=Launched";
+    boost::mutex own;
+    // Again if the test was too slow to stop the waiter.
+    for (int attempt = 1, seen = 0; seen == 0; ++attempt) {
+        fApp->SetState(State::kLaunched);
+        State state = State::kUndefined;
+        boost::thread waiter([&] {
+            fJournal.Enter(kOther);
+
+            boost::unique_lock<boost::mutex> lock(own);
+            state = fApp->GetStateLocked(lock, kBrief);
+        });
+        fJournal.Await(kOther, looks, attempt);
+        {
+            const boost::lock_guard<boost::mutex> hold(own);
+            const auto entries = fJournal.Take(kOther);
+            seen = entries.size() == 2 ? 1 : 0;
+            OutlastABriefWait();
+            fApp->SetState(State::kRunning);
+        }
+        waiter.join();
+        if (seen != 0) {
+            EXPECT_EQ(state, State::kRunning);
+        }
+    }
+    fApp->Reset();
+}
+
+TEST_F(LaunchWait, AnEndThatComesWhenTheTimeHasJustRunOutIsSeen)
+{
+    struct Ending : RecordingApp {
+        using RecordingApp::RecordingApp;
+        void EndLocked() { SetStateLocked({}, State::kFinished); }
+    };
+    const auto app = boost::make_shared<Ending>(fLauncher);
+    fApp = app;
+    const std::string sleeps = "ConsoleApp::Wait fState=Running fCond.timed_wait";
+    for (int attempt = 1, seen = 0; seen == 0; ++attempt) {
+        LaunchUntilItWaits();
+        fLauncher->fOnKill = [&] {
+            // The application's mutex is held.
+            seen = testing::Value(fJournal.Take(kOther),
+                                  testing::Contains("ConsoleApp::Wait Wait timed out"))
+                       ? 0
+                       : 1;
+            OutlastABriefWait();
+            app->EndLocked();
+            OpenTasks();
+        };
+        boost::thread waiter([&] {
+            fJournal.Enter(kOther);
+            fApp->Wait(nullptr, kBrief);
+        });
+        fJournal.Await(kOther, sleeps, attempt);
+        fApp->Kill();
+        waiter.join();
+        if (seen != 0) {
+            EXPECT_THAT(fJournal.Take(kOther),
+                        testing::Not(testing::Contains("ConsoleApp::Wait Wait timed out")));
+        }
+        fApp->Reset();
+    }
+    fLauncher->fOnKill = nullptr;
+    fApp.reset();
 }
 
 TEST(WaitTime, IsRoundedToWholeMilliseconds)

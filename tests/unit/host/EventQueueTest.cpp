@@ -1,0 +1,49 @@
+#include "supervise/EventQueue.h"
+
+#include <gtest/gtest.h>
+
+#include <boost/make_shared.hpp>
+#include <boost/thread/thread.hpp>
+
+namespace assay_host {
+namespace {
+
+using std::chrono::milliseconds;
+
+Event Bytes(std::string bytes)
+{
+    return {Event::Kind::kBytes, pmutil::OutputChannel::kStdout, std::move(bytes)};
+}
+
+TEST(EventQueue, GivesEventsInTheirOrder)
+{
+    EventQueue queue;
+    queue.Push(Bytes("a"));
+    queue.Push(Bytes("b"));
+    EXPECT_EQ(queue.Pop(milliseconds(0))->fBytes, "a");
+    EXPECT_EQ(queue.Pop(milliseconds(0))->fBytes, "b");
+    EXPECT_FALSE(queue.Pop(milliseconds(0)));
+}
+
+TEST(EventQueue, CloseDropsWhatItHoldsAndWhatComes)
+{
+    EventQueue queue;
+    queue.Push(Bytes("held"));
+    queue.Close();
+    EXPECT_FALSE(queue.Pop(milliseconds(0)));
+    queue.Push(Bytes("late"));
+    EXPECT_FALSE(queue.Pop(milliseconds(0)));
+}
+
+TEST(EventQueue, CloseLetsAPushGoThatWaitsForRoom)
+{
+    const auto queue = boost::make_shared<EventQueue>();
+    queue->Push(Bytes(std::string(std::size_t{1} << 18, 'x')));
+    boost::thread pusher([queue] { queue->Push(Bytes("y")); });
+    EXPECT_FALSE(pusher.timed_join(boost::posix_time::milliseconds(50))) << "there is no room";
+    queue->Close();
+    EXPECT_TRUE(pusher.timed_join(boost::posix_time::seconds(60)));
+}
+
+} // namespace
+} // namespace assay_host
