@@ -94,8 +94,8 @@ struct Uncalled {
 };
 
 struct FunctionTable {
-#define QGF_OCL_CALLED(name) decltype(&::name) name;
-#define QGF_OCL_UNCALLED(name) Uncalled<decltype(&::name)> name;
+#define QGF_OCL_CALLED(name) decltype(&::name) name;             // NOLINT(*-macro-parentheses)
+#define QGF_OCL_UNCALLED(name) Uncalled<decltype(&::name)> name; // NOLINT(*-macro-parentheses)
     QGF_OCL_ENTRY_POINTS(QGF_OCL_CALLED, QGF_OCL_UNCALLED)
 #undef QGF_OCL_CALLED
 #undef QGF_OCL_UNCALLED

@@ -33,7 +33,7 @@ namespace QGF {
 namespace OGL {
 
 struct EGLTable {
-#define QGF_EGL_MEMBER(name) decltype(&::name) name = nullptr;
+#define QGF_EGL_MEMBER(name) decltype(&::name) name = nullptr; // NOLINT(*-macro-parentheses)
     QGF_EGL_ENTRY_POINTS(QGF_EGL_MEMBER, QGF_EGL_MEMBER)
 #undef QGF_EGL_MEMBER
 };
