@@ -181,42 +181,68 @@ TEST_F(LaunchWait, AStateThatComesWhenTheTimeHasJustRunOutIsSeen)
     fApp->Reset();
 }
 
+// Hands out a standard input that does something in each write, with the application's mutex held.
+class InputLauncher : public FakeLauncher {
+public:
+    class Input : public FakeChannel {
+    public:
+        explicit Input(std::function<void()> onWrite) : fOnWrite(std::move(onWrite)) {}
+
+    protected:
+        std::uint64_t BinioWriteSome(const void* /*bytes*/, std::uint64_t nbytes) override
+        {
+            fOnWrite();
+            return nbytes;
+        }
+
+    private:
+        const std::function<void()> fOnWrite;
+    };
+
+    LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override
+    {
+        LaunchResult result = FakeLauncher::Launch(program, args);
+        result.fAppInput = boost::make_shared<Input>([this] { fOnWrite(); });
+        return result;
+    }
+
+    std::function<void()> fOnWrite;
+};
+
 TEST_F(LaunchWait, AnEndThatComesWhenTheTimeHasJustRunOutIsSeen)
 {
     struct Ending : RecordingApp {
         using RecordingApp::RecordingApp;
         void EndLocked() { SetStateLocked({}, State::kFinished); }
     };
-    const auto app = boost::make_shared<Ending>(fLauncher);
+    const auto launcher = boost::make_shared<InputLauncher>();
+    fLauncher = launcher;
+    const auto app = boost::make_shared<Ending>(launcher);
     fApp = app;
+    fParams.fKeepStdin = true;
+    const auto timesOut = testing::Contains("ConsoleApp::Wait Wait timed out");
     const std::string sleeps = "ConsoleApp::Wait fState=Running fCond.timed_wait";
     for (int attempt = 1, seen = 0; seen == 0; ++attempt) {
         LaunchUntilItWaits();
-        fLauncher->fOnKill = [&] {
-            // The application's mutex is held.
-            seen = testing::Value(fJournal.Take(kOther),
-                                  testing::Contains("ConsoleApp::Wait Wait timed out"))
-                       ? 0
-                       : 1;
+        launcher->fOnWrite = [&] {
+            seen = testing::Value(fJournal.Take(kOther), timesOut) ? 0 : 1;
             OutlastABriefWait();
             app->EndLocked();
-            OpenTasks();
         };
         boost::thread waiter([&] {
             fJournal.Enter(kOther);
             fApp->Wait(nullptr, kBrief);
         });
         fJournal.Await(kOther, sleeps, attempt);
-        fApp->Kill();
+        const unsigned char byte = 'x';
+        fApp->WriteAppStdin(&byte, 1);
         waiter.join();
         if (seen != 0) {
-            EXPECT_THAT(fJournal.Take(kOther),
-                        testing::Not(testing::Contains("ConsoleApp::Wait Wait timed out")));
+            EXPECT_THAT(fJournal.Take(kOther), testing::Not(timesOut));
         }
+        End(kEndedNormally);
         fApp->Reset();
     }
-    fLauncher->fOnKill = nullptr;
-    fApp.reset();
 }
 
 TEST(WaitTime, IsRoundedToWholeMilliseconds)
