@@ -87,7 +87,7 @@ NO_TEXT = _but("gives no text", "nothing", "success", "status", "handle", "numbe
 NOTHING_NULL = (_but("gives nothing that could be null", "nothing")
                 + _but("its 0 is success", "status"))
 FOREIGN_BYTES = "\udcff\udcfe\udc80\udcc3(\udced\udca0\udc80\udcf4\udc90\udc80\udc80"
-FLOOD_LINES = 70_000  # more than a host keeps
+FLOOD_LINES = 30_000  # more than a host keeps
 
 FAULTS = {fault.name: fault for fault in [
     Fault("SIGSEGV", "crash", ends="SIGSEGV"),
