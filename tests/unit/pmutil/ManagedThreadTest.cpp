@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <boost/make_shared.hpp>
+#include <boost/weak_ptr.hpp>
 #include <chrono>
 #include <gtest/gtest.h>
 #include <limits>
