@@ -106,8 +106,10 @@ void WriteCommandLine()
 
 int CountPipes()
 {
+    // An inherited handle has its parent's number, which grows with the launches of a process.
+    constexpr ULONG_PTR kMaxHandle = 1 << 15;
     int count = 0;
-    for (ULONG_PTR handle = 4; handle < 4096; handle += 4)
+    for (ULONG_PTR handle = 4; handle < kMaxHandle; handle += 4)
         count += ::GetFileType(reinterpret_cast<HANDLE>(handle)) == FILE_TYPE_PIPE;
     return count;
 }
