@@ -22,7 +22,7 @@ from validate import report_bytes, validate_document, validate_events  # noqa: E
 
 HOST = BUILD / "bin" / "assay-host.exe"
 CHILD = BUILD / "bin" / "test_child.exe"
-REPORT = ["out", "assayStart=x", "out", "assayEnd=y"]
+REPORT = ["out", 'assayStart="x"', "out", 'assayEnd="y"']
 # Wine's own start is in it.
 SLACK = 4.0
 TIMEOUT = 2.0
