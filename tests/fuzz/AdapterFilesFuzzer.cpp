@@ -3,10 +3,10 @@
 #include <cstdlib>
 #include <string>
 
-#include "linux/DrmAdapters.h"
-#include "linux/DrmMemory.h"
-#include "linux/NvidiaVersion.h"
-#include "linux/SystemNumbers.h"
+#include "linux/gpu/DrmAdapters.h"
+#include "linux/gpu/DrmMemory.h"
+#include "linux/gpu/NvidiaVersion.h"
+#include "linux/gpu/SystemNumbers.h"
 #include "qgf/qgf_core/linux/NvidiaProc.h"
 #include "qgf/qgf_core/linux/PciAddress.h"
 #include "qgf/qgf_core/linux/PciIds.h"

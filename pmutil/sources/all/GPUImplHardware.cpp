@@ -3,9 +3,9 @@
 #include <exception>
 #include <stdexcept>
 
-#include "NewestGLVersion.h"
-#include "ScopedGLCurrent.h"
-#include "TestShaders.h"
+#include "all/gpu/NewestGLVersion.h"
+#include "all/gpu/ScopedGLCurrent.h"
+#include "all/gpu/TestShaders.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/Requirement.h"
 

@@ -3,9 +3,9 @@
 #include <optional>
 #include <vector>
 
-#include "CheckCLError.h"
-#include "OnProfilingQueue.h"
-#include "ProfilingDuration.h"
+#include "all/gpu/CheckCLError.h"
+#include "all/gpu/OnProfilingQueue.h"
+#include "all/gpu/ProfilingDuration.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil_gpu/GPUImplHardware.h"
 

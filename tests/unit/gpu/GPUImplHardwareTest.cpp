@@ -11,9 +11,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "NewestGLVersion.h"
-#include "ScopedGLCurrent.h"
-#include "TestShaders.h"
+#include "all/gpu/NewestGLVersion.h"
+#include "all/gpu/ScopedGLCurrent.h"
+#include "all/gpu/TestShaders.h"
 #include "pmutil_gpu/GPUImplWin.h"
 #include "support/CapturedLog.h"
 #include "support/FakeOpenGL.h"

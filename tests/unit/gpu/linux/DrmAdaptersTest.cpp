@@ -1,4 +1,4 @@
-#include "linux/DrmAdapters.h"
+#include "linux/gpu/DrmAdapters.h"
 
 #include <filesystem>
 

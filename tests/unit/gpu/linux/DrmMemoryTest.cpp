@@ -1,4 +1,4 @@
-#include "linux/DrmMemory.h"
+#include "linux/gpu/DrmMemory.h"
 
 #include <cstring>
 
@@ -7,7 +7,7 @@
 #include <i915_drm.h>
 #include <radeon_drm.h>
 
-#include "linux/DriverStructures.h"
+#include "linux/gpu/DriverStructures.h"
 
 namespace pmutil {
 namespace {

@@ -1,5 +1,5 @@
 // The questions, put to a kernel that answers as the real drivers do.
-#include "linux/DrmQuery.h"
+#include "linux/gpu/DrmQuery.h"
 
 #include <cerrno>
 #include <cstring>
@@ -10,7 +10,7 @@
 #include <i915_drm.h>
 #include <radeon_drm.h>
 
-#include "linux/DriverStructures.h"
+#include "linux/gpu/DriverStructures.h"
 #include "support/AdapterTree.h"
 
 namespace pmutil {

@@ -1,4 +1,4 @@
-#include "linux/NvidiaVersion.h"
+#include "linux/gpu/NvidiaVersion.h"
 
 #include <gtest/gtest.h>
 

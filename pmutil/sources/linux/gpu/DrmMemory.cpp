@@ -1,4 +1,4 @@
-#include "linux/DrmMemory.h"
+#include "linux/gpu/DrmMemory.h"
 
 #include <algorithm>
 #include <cstring>
@@ -10,8 +10,8 @@
 #include <i915_drm.h>
 #include <radeon_drm.h>
 
-#include "linux/DriverStructures.h"
-#include "linux/SystemNumbers.h"
+#include "linux/gpu/DriverStructures.h"
+#include "linux/gpu/SystemNumbers.h"
 
 namespace pmutil {
 namespace {

@@ -1,4 +1,4 @@
-#include "NewestGLVersion.h"
+#include "all/gpu/NewestGLVersion.h"
 
 namespace pmutil {
 

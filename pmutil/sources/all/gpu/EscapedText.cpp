@@ -1,4 +1,4 @@
-#include "EscapedText.h"
+#include "all/gpu/EscapedText.h"
 
 #include "pmutil/Escape.h"
 

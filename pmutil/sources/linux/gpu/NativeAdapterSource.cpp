@@ -6,8 +6,8 @@
 
 #include <boost/nowide/utf/convert.hpp>
 
-#include "linux/DrmAdapters.h"
-#include "linux/SystemNumbers.h"
+#include "linux/gpu/DrmAdapters.h"
+#include "linux/gpu/SystemNumbers.h"
 #include "pmutil/System.h"
 #include "pmutil_gpu/AdapterSource.h"
 #include "pmutil_gpu/DXGIData.h"

@@ -1,4 +1,4 @@
-#include "linux/NvidiaVersion.h"
+#include "linux/gpu/NvidiaVersion.h"
 
 #include <cstdio>
 #include <sstream>

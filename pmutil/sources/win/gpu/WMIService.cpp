@@ -1,6 +1,6 @@
-#include "win/WMIService.h"
+#include "win/gpu/WMIService.h"
 
-#include "win/ComTypes.h"
+#include "win/gpu/ComTypes.h"
 
 #include <wbemidl.h>
 

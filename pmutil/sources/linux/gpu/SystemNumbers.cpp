@@ -1,4 +1,4 @@
-#include "linux/SystemNumbers.h"
+#include "linux/gpu/SystemNumbers.h"
 
 #include <charconv>
 #include <limits>

@@ -5,7 +5,7 @@
 // every ioctl, and i915_gem_open sets up page tables, on a discrete card in its own memory.
 //
 // libdrm gives the structures at compile time. Its drmIoctl would only repeat an interrupted call.
-#include "linux/DrmQuery.h"
+#include "linux/gpu/DrmQuery.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -19,7 +19,7 @@
 #include <sys/ioctl.h>
 #include <unistd.h>
 
-#include "linux/DriverStructures.h"
+#include "linux/gpu/DriverStructures.h"
 #include "qgf/SystemFiles.h"
 
 namespace pmutil {

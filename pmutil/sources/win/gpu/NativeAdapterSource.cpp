@@ -2,8 +2,8 @@
 
 #include "pmutil/System.h"
 #include "pmutil_gpu/AdapterSource.h"
-#include "win/DXGIAdapters.h"
-#include "win/WMIService.h"
+#include "win/gpu/DXGIAdapters.h"
+#include "win/gpu/WMIService.h"
 
 namespace pmutil {
 

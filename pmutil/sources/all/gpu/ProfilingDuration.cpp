@@ -1,4 +1,4 @@
-#include "ProfilingDuration.h"
+#include "all/gpu/ProfilingDuration.h"
 
 #include "qgf/OCL.h"
 

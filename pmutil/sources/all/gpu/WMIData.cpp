@@ -3,7 +3,7 @@
 #include <exception>
 #include <memory>
 
-#include "EscapedText.h"
+#include "all/gpu/EscapedText.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/Requirement.h"
 #include "pmutil_gpu/GPUImplHardware.h"

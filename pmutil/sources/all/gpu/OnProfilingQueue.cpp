@@ -1,4 +1,4 @@
-#include "OnProfilingQueue.h"
+#include "all/gpu/OnProfilingQueue.h"
 
 #include <optional>
 

@@ -1,9 +1,9 @@
-#include "win/DXGIAdapters.h"
+#include "win/gpu/DXGIAdapters.h"
 
 #include <algorithm>
 
 #include "qgf/Core.h"
-#include "win/ComTypes.h"
+#include "win/gpu/ComTypes.h"
 
 #include <dxgi.h>
 

@@ -1,4 +1,4 @@
-#include "TestShaders.h"
+#include "all/gpu/TestShaders.h"
 
 namespace pmutil {
 

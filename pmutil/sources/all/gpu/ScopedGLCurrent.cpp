@@ -1,4 +1,4 @@
-#include "ScopedGLCurrent.h"
+#include "all/gpu/ScopedGLCurrent.h"
 
 #include <boost/make_shared.hpp>
 

@@ -18,16 +18,16 @@
 //   device (Documentation/ABI/stable/sysfs-module).
 // - /proc/driver/nvidia/version belongs to the module as well, and listing the folder of its cards
 //   asks no card. NvidiaProc.cpp tells of the one file there that does.
-#include "linux/DrmAdapters.h"
+#include "linux/gpu/DrmAdapters.h"
 
 #include <algorithm>
 #include <charconv>
 #include <map>
 
-#include "linux/DrmMemory.h"
-#include "linux/DrmQuery.h"
-#include "linux/NvidiaVersion.h"
-#include "linux/SystemNumbers.h"
+#include "linux/gpu/DrmMemory.h"
+#include "linux/gpu/DrmQuery.h"
+#include "linux/gpu/NvidiaVersion.h"
+#include "linux/gpu/SystemNumbers.h"
 #include "pmutil_gpu/DXGIData.h"
 #include "qgf/AdapterName.h"
 #include "qgf/DrmNodes.h"

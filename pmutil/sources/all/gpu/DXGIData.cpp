@@ -6,7 +6,7 @@
 #include <stdexcept>
 #include <string_view>
 
-#include "EscapedText.h"
+#include "all/gpu/EscapedText.h"
 #include "pmutil/Escape.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/Requirement.h"
