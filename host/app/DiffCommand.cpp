@@ -1,8 +1,8 @@
 #include <ostream>
 
 #include "app/Commands.h"
-#include "app/Output.h"
-#include "app/SinkBuffer.h"
+#include "output/Output.h"
+#include "output/SinkBuffer.h"
 #include "report/Diff.h"
 #include "report/ReportFile.h"
 

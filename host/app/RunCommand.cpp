@@ -6,11 +6,11 @@
 #include <nlohmann/json.hpp>
 
 #include "app/Commands.h"
-#include "app/Delivery.h"
 #include "app/FindAssay.h"
-#include "app/Output.h"
-#include "app/Terminal.h"
-#include "app/WriterThread.h"
+#include "output/Delivery.h"
+#include "output/Output.h"
+#include "output/Terminal.h"
+#include "output/WriterThread.h"
 #include "report/JsonDocument.h"
 #include "report/LineForm.h"
 #include "report/Report.h"

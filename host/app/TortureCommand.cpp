@@ -6,10 +6,10 @@
 #include <fmt/format.h>
 
 #include "app/Commands.h"
-#include "app/Delivery.h"
 #include "app/FindAssay.h"
-#include "app/Output.h"
-#include "app/WriterThread.h"
+#include "output/Delivery.h"
+#include "output/Output.h"
+#include "output/WriterThread.h"
 #include "report/Bytes.h"
 #include "report/Report.h"
 #include "supervise/ChildRun.h"

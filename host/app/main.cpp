@@ -8,7 +8,7 @@
 
 #include "app/CommandLine.h"
 #include "app/Commands.h"
-#include "app/Output.h"
+#include "output/Output.h"
 #include "pmutil/System.h"
 #include "pmutil/UTF8Console.h"
 #include "report/Bytes.h"

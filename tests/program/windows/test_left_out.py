@@ -25,7 +25,7 @@ LEFT_OUT = {
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
-        "unit/host", "unit/pmutil"},
+        "unit/pmutil", "unit/supervise"},
     "the peak memory of a host is measured by getrusage": {"program/test_host_memory"},
 }
 

@@ -6,9 +6,9 @@
 
 #include <boost/filesystem/operations.hpp>
 
-#include "app/Links.h"
-#include "app/Output.h"
-#include "app/win/WriteAll.h"
+#include "output/Links.h"
+#include "output/Output.h"
+#include "output/win/WriteAll.h"
 #include "supervise/Paths.h"
 
 namespace assay_host {

@@ -1,10 +1,10 @@
-#include "app/Stream.h"
+#include "output/Stream.h"
 
 #include <cerrno>
 #include <poll.h>
 #include <unistd.h>
 
-#include "app/linux/WriteAll.h"
+#include "output/linux/WriteAll.h"
 
 namespace assay_host {
 

@@ -5,7 +5,7 @@
 
 #include <functional>
 
-#include "Reports.h"
+#include "support/Reports.h"
 
 namespace assay_host {
 namespace {

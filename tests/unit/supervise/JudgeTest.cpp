@@ -6,8 +6,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "Reports.h"
 #include "supervise/ExitStatus.h"
+#include "support/Reports.h"
 
 namespace assay_host {
 namespace {

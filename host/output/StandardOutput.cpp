@@ -1,7 +1,7 @@
 #include <stdexcept>
 
-#include "app/Output.h"
-#include "app/Stream.h"
+#include "output/Output.h"
+#include "output/Stream.h"
 
 namespace assay_host {
 

@@ -3,7 +3,7 @@
 
 #include <memory>
 
-#include "app/WriterThread.h"
+#include "output/WriterThread.h"
 
 namespace assay_host {
 

@@ -1,9 +1,9 @@
-#include "app/ProgressLine.h"
+#include "output/ProgressLine.h"
 
 #include <algorithm>
 
-#include "app/Stream.h"
-#include "app/Terminal.h"
+#include "output/Stream.h"
+#include "output/Terminal.h"
 
 namespace assay_host {
 

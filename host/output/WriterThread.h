@@ -8,7 +8,7 @@
 #include <ostream>
 #include <string>
 
-#include "app/Output.h"
+#include "output/Output.h"
 
 namespace assay_host {
 

@@ -6,11 +6,11 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
-#include "Reports.h"
 #include "report/Answers.h"
 #include "report/JsonDocument.h"
 #include "report/TextView.h"
 #include "supervise/Judge.h"
+#include "support/Reports.h"
 
 namespace assay_host {
 namespace {

@@ -1,4 +1,4 @@
-#include "app/Delivery.h"
+#include "output/Delivery.h"
 
 #include <chrono>
 #include <optional>

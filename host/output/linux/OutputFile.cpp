@@ -8,9 +8,9 @@
 
 #include <boost/filesystem/operations.hpp>
 
-#include "app/Links.h"
-#include "app/Output.h"
-#include "app/linux/WriteAll.h"
+#include "output/Links.h"
+#include "output/Output.h"
+#include "output/linux/WriteAll.h"
 
 namespace assay_host {
 

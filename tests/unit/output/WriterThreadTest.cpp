@@ -1,4 +1,4 @@
-#include "app/WriterThread.h"
+#include "output/WriterThread.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>

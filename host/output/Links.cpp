@@ -1,4 +1,4 @@
-#include "app/Links.h"
+#include "output/Links.h"
 
 #include <boost/filesystem/operations.hpp>
 

@@ -1,8 +1,8 @@
-#include "app/Stream.h"
+#include "output/Stream.h"
 
 #include <algorithm>
 
-#include "app/win/WriteAll.h"
+#include "output/win/WriteAll.h"
 
 namespace assay_host {
 

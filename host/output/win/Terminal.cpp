@@ -1,4 +1,4 @@
-#include "app/Terminal.h"
+#include "output/Terminal.h"
 
 #include <windows.h>
 

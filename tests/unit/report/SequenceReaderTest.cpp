@@ -2,7 +2,7 @@
 
 #include <gtest/gtest.h>
 
-#include "Reports.h"
+#include "support/Reports.h"
 
 namespace assay_host {
 namespace {

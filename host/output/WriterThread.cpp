@@ -1,4 +1,4 @@
-#include "app/WriterThread.h"
+#include "output/WriterThread.h"
 
 #include <algorithm>
 #include <atomic>
@@ -11,9 +11,9 @@
 #include <thread>
 #include <utility>
 
-#include "app/ProgressLine.h"
-#include "app/SinkBuffer.h"
-#include "app/Stream.h"
+#include "output/ProgressLine.h"
+#include "output/SinkBuffer.h"
+#include "output/Stream.h"
 
 namespace assay_host {
 
