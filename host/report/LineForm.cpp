@@ -17,9 +17,12 @@ bool StartsWith(std::string_view text, std::string_view start)
     return text.substr(0, start.size()) == start;
 }
 
-bool IsDigit(char character)
+// Whether the text is an index as the child prints it: decimal, without leading zeros.
+bool IsIndex(std::string_view text)
 {
-    return character >= '0' && character <= '9';
+    return !text.empty() && text.size() <= kMaxIndexDigits &&
+           (text.size() == 1 || text.front() != '0') &&
+           text.find_first_not_of("0123456789") == std::string_view::npos;
 }
 
 // Keys are words of visible ASCII; a blank or a byte of binary data before the '=' makes the line
@@ -103,32 +106,29 @@ bool BeginsLikeReportLine(std::string_view text)
     return word.size() < text.size() && FindKnownKey(std::nullopt, word) != nullptr;
 }
 
-std::optional<std::string_view> GetDeviceTag(std::string_view key)
+std::optional<DeviceTag> ReadDeviceTag(std::string_view text)
 {
-    if (!StartsWith(key, "glgpu[") && !StartsWith(key, "clgpu["))
-        return std::nullopt;
-    const std::size_t first = key.find('[') + 1;
-    std::size_t end = first;
-    while (end < key.size() && IsDigit(key[end]))
-        ++end;
-    const std::size_t digits = end - first;
-    const bool isIndex =
-        digits > 0 && digits <= kMaxIndexDigits && (digits == 1 || key[first] != '0');
-    if (!isIndex || key.substr(end, 2) != "].")
-        return std::nullopt;
-    return key.substr(0, end + 1);
+    for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL}) {
+        const std::string_view word = GetTagWord(kind);
+        if (!StartsWith(text, word))
+            continue;
+        const std::string_view brackets = text.substr(word.size());
+        if (brackets.size() < 3 || brackets.front() != '[' || brackets.back() != ']')
+            return std::nullopt;
+        const std::string_view index = brackets.substr(1, brackets.size() - 2);
+        if (!IsIndex(index))
+            return std::nullopt;
+        return DeviceTag{kind, static_cast<std::size_t>(ReadUnsigned(index).value())};
+    }
+    return std::nullopt;
 }
 
-std::optional<DeviceTag> ReadDeviceTag(std::string_view tag)
+std::optional<std::string_view> GetDeviceTag(std::string_view key)
 {
-    if (GetDeviceTag(std::string(tag) + ".") == std::nullopt)
+    const std::size_t point = key.find('.');
+    if (point == std::string_view::npos || !ReadDeviceTag(key.substr(0, point)))
         return std::nullopt;
-    const std::size_t open = tag.find('[');
-    const DeviceKind kind = tag.substr(0, open) == GetTagWord(DeviceKind::kOpenGL)
-                                ? DeviceKind::kOpenGL
-                                : DeviceKind::kOpenCL;
-    const auto index = ReadUnsigned(tag.substr(open + 1, tag.size() - open - 2));
-    return DeviceTag{kind, static_cast<std::size_t>(*index)};
+    return key.substr(0, point);
 }
 
 } // namespace assay_host

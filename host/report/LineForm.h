@@ -28,14 +28,16 @@ bool LeavesQuoteOpen(std::string_view text);
 // do: a comment, a tagged key, a code of a constant, or one of the report's own keys.
 bool BeginsLikeReportLine(std::string_view text);
 
-// "glgpu[0]" of "glgpu[0].GLName"; nothing of a key without a device's tag.
-std::optional<std::string_view> GetDeviceTag(std::string_view key);
-
-// What a device's tag says; nothing of another text.
+// What a device's tag says.
 struct DeviceTag {
     DeviceKind fKind;
     std::size_t fIndex;
 };
-std::optional<DeviceTag> ReadDeviceTag(std::string_view tag);
+
+// Reads "glgpu[0]". Returns nothing if the text is anything else, or more than a tag.
+std::optional<DeviceTag> ReadDeviceTag(std::string_view text);
+
+// Returns "glgpu[0]" for "glgpu[0].GLName", and nothing for a key without a device's tag.
+std::optional<std::string_view> GetDeviceTag(std::string_view key);
 
 } // namespace assay_host

@@ -54,6 +54,16 @@ TEST(SequenceReader, BelievesTheLogThatADeviceDroppedOut)
     EXPECT_EQ(reader.GetNextKey(), "glgpu[1].IsIntegratedGLGPU");
 }
 
+TEST(SequenceReader, IgnoresALogLineThatNamesMoreThanADevice)
+{
+    SequenceReader reader;
+    Feed(reader, {"NumGLGPUs=2", "# Testing terminated for glgpu[0].GLName",
+                  "# Testing terminated for glgpu[1].", "# Testing terminated for "});
+    EXPECT_FALSE(reader.HasFailed({DeviceKind::kOpenGL, 0}));
+    EXPECT_FALSE(reader.HasFailed({DeviceKind::kOpenGL, 1}));
+    EXPECT_EQ(reader.GetNextKey(), "glgpu[0].GLVersion");
+}
+
 TEST(SequenceReader, TakesADeviceBackWhoseLineAloneWasLost)
 {
     SequenceReader reader;
