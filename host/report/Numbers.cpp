@@ -23,41 +23,45 @@ std::optional<T> Read(std::string_view text)
     return value;
 }
 
-// A decimal number without its sign: its digits from the first to the last that isn't 0, and the
-// power of ten after them.
+// The magnitude of a decimal number: its digits from the first to the last that isn't 0, and the
+// power of ten after them. Zero has no digits and the exponent 0.
 struct Decimal {
     std::string fDigits;
-    long fExponent = 0;
+    std::int64_t fExponent = 0;
 
     bool operator==(const Decimal& other) const
     {
-        return fDigits == other.fDigits && (fDigits.empty() || fExponent == other.fExponent);
+        return fDigits == other.fDigits && fExponent == other.fExponent;
     }
 };
 
-// Of a text that from_chars takes.
+// The exponent of a number that is finite and not zero, so that it is small.
+std::int64_t ReadExponent(std::string_view text)
+{
+    if (text[0] == '+')
+        text.remove_prefix(1);
+    return Read<std::int64_t>(text).value();
+}
+
+// The text must be one that ReadDouble accepts.
 Decimal ReadDecimal(std::string_view text)
 {
     Decimal result;
     const std::size_t mark = text.find_first_of("eE");
-    std::string_view number = text.substr(0, mark);
-    if (number[0] == '-')
-        number.remove_prefix(1);
-    if (mark != std::string_view::npos) {
-        std::string_view exponent = text.substr(mark + 1);
-        if (exponent[0] == '+')
-            exponent.remove_prefix(1);
-        result.fExponent = Read<long>(exponent).value_or(0);
-    }
-    const std::size_t point = number.find('.');
-    if (point != std::string_view::npos)
-        result.fExponent -= static_cast<long>(number.size() - point - 1);
+    const std::string_view number = text.substr(0, mark);
     std::copy_if(number.begin(), number.end(), std::back_inserter(result.fDigits),
                  [](char character) { return character >= '0' && character <= '9'; });
-    const std::size_t last = result.fDigits.find_last_not_of('0') + 1;
-    result.fExponent += static_cast<long>(result.fDigits.size() - last);
-    result.fDigits.erase(last);
-    result.fDigits.erase(0, std::min(result.fDigits.find_first_not_of('0'), last));
+    const std::size_t first = result.fDigits.find_first_not_of('0');
+    if (first == std::string::npos)
+        return {}; // whatever its exponent is, which may be too large for any integer
+    const std::size_t end = result.fDigits.find_last_not_of('0') + 1;
+    if (mark != std::string_view::npos)
+        result.fExponent = ReadExponent(text.substr(mark + 1));
+    const std::size_t point = number.find('.');
+    if (point != std::string_view::npos)
+        result.fExponent -= static_cast<std::int64_t>(number.size() - point - 1);
+    result.fExponent += static_cast<std::int64_t>(result.fDigits.size() - end);
+    result.fDigits = result.fDigits.substr(first, end - first);
     return result;
 }
 
@@ -73,10 +77,10 @@ bool KeepsDigits(std::string_view text, double value)
 
 std::optional<Number> ReadNumber(std::string_view text)
 {
-    constexpr std::int64_t kMostExact = std::int64_t{1} << 53;
+    constexpr std::int64_t kMaxExact = std::int64_t{1} << 53;
     if (text.find_first_not_of("-0123456789") == std::string_view::npos) {
         const auto value = Read<std::int64_t>(text);
-        if (value && *value >= -kMostExact && *value <= kMostExact)
+        if (value && *value >= -kMaxExact && *value <= kMaxExact)
             return Number(*value);
         return std::nullopt;
     }

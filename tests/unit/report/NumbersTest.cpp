@@ -39,6 +39,8 @@ TEST(Numbers, KeepTheirDigitsInAnyNotation)
     EXPECT_EQ(ReadNumber("5e-324"), Number(5e-324));
     EXPECT_EQ(ReadNumber("0.000"), Number(0.0));
     EXPECT_EQ(ReadNumber("0e9"), Number(0.0));
+    EXPECT_EQ(ReadNumber("0.0e-9223372036854775808"), Number(0.0));
+    EXPECT_EQ(ReadNumber("0.0e-2147483648"), Number(0.0));
     EXPECT_EQ(ReadUnsigned("18446744073709551615"), 18446744073709551615U);
 }
 
