@@ -102,14 +102,14 @@ DeviceAnswers Collector::CollectDevice(const DeviceTag& tag, const Device* devic
 Missing Collector::JudgeMissing(const DeviceAnswers& device, std::size_t key) const
 {
     const KnownKey& known = *device.fAnswers[key].fKnown;
-    const bool isAnswered = key < fSequence.CountAnswered({device.fKind, device.fIndex});
-    if (isAnswered && !known.MayBeSilent())
-        return Missing::kUnreadable;
-    if (isAnswered || (known.MayBeSilent() && device.GetValue(known.fSilentWithout) == "0"))
+    const Missing passed = known.MayBeSilent() ? Missing::kNotPrinted : Missing::kUnreadable;
+    if (key < fSequence.CountAnswered({device.fKind, device.fIndex}))
+        return passed;
+    if (known.MayBeSilent() && device.GetValue(known.fSilentWithout) == "0")
         return Missing::kNotPrinted;
     if (device.fFailed)
         return Missing::kDeviceFailed;
-    return fSequence.HasPassed(known, device.fIndex) ? Missing::kNotPrinted : Missing::kRunEnded;
+    return fSequence.HasPassed(known, device.fIndex) ? passed : Missing::kRunEnded;
 }
 
 void Collector::CollectReportKeys()

@@ -139,6 +139,14 @@ TEST(Answers, NameDevicesThatTheReportOnlyCounts)
     EXPECT_EQ(Tell(GetAnswers(failed), "glgpu[0]", "GLVersion"), "- device failed before");
 }
 
+TEST(Answers, FindNoLinesOfADeviceThatIsCountedTooLate)
+{
+    const Report report =
+        ReadReport("glgpu[0].GLVersion=\"4.1\"\nNumGLGPUs=2\nglgpu[0].IsIntegratedGLGPU=0\n");
+    EXPECT_EQ(Tell(GetAnswers(report), "glgpu[1]", "GLVersion"), "- no readable line");
+    EXPECT_EQ(Tell(GetAnswers(report), "glgpu[1]", "GLName"), "- run ended before");
+}
+
 TEST(Answers, TellThatThereIsNoOpenCL)
 {
     const Report report = ReadReport(Sample(1, -1).GetText());
