@@ -144,15 +144,13 @@ std::string GetValueText(const Answer& answer)
     std::optional<std::string> text;
     if (answer.fKnown)
         text = GetFormText(answer.fKnown->fForm, value);
-    if (!text && answer.fLine->fQuoted && value.empty())
-        text = "(empty)";
     if (!text && answer.fLine->fQuoted && value == "?")
         text = kNotKnown;
     if (!text)
         text = ShowBytes(TrimEnd(value));
     if (!IsWholeValue(*answer.fLine))
         *text += "... (cut)";
-    return *text;
+    return text->empty() ? "(empty)" : *text;
 }
 
 std::string GetDeviceName(const DeviceAnswers& device)

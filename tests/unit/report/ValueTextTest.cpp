@@ -56,6 +56,8 @@ TEST(ValueText, HasWordsForFlagsAndForWhatIsNotKnown)
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=0"), "no");
     EXPECT_EQ(Show("glgpu[0].GLDriver=\"?\""), "not known");
     EXPECT_EQ(Show("glgpu[0].GLDriver=\"\""), "(empty)");
+    EXPECT_EQ(Show("glgpu[0].GLDriver=\"  \""), "(empty)");
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB="), "(empty)");
     EXPECT_EQ(Show("glgpu[0].GLName=\"\""), "none of the system's");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"?\""), "not known");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"20210315000000.000000-000\""), "2021-03-15");
@@ -68,7 +70,7 @@ TEST(ValueText, ShowsWhatHasAnotherFormAsItCame)
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=-1"), "-1");
     EXPECT_EQ(Show("glgpu[0].GLVendorID=0x10DE"), "0x10DE");
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=2"), "2");
-    EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK="), "");
+    EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK="), "(empty)");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=inf"), "inf");
     EXPECT_EQ(Show("glgpu[0].GLRectTextureSize=big"), "big");
     EXPECT_EQ(Show("glgpu[0].Extra=\"a\tb\x80\""), "a\\tb\\x80");
