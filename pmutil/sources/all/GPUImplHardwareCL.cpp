@@ -8,7 +8,7 @@
 #include "pmutil_gpu/GPU.h"
 #include "pmutil_gpu/GPUImplHardware.h"
 #include "pmutil_gpu/GPUImplWin.h"
-#include "qgf/TextRoom.h"
+#include "qgf/TextBuffer.h"
 
 namespace pmutil {
 
@@ -109,7 +109,7 @@ std::string GPUImplHardware::DoGetCLDriverVersion()
     require(clGetDeviceInfo(device.id(), CL_DRIVER_VERSION, 0, nullptr, &size) == CL_SUCCESS);
     if (size == 0)
         return {};
-    QGF::Core::TextRoom text(size);
+    QGF::Core::TextBuffer text(size);
     require(clGetDeviceInfo(device.id(), CL_DRIVER_VERSION, size, text.data(), nullptr) ==
             CL_SUCCESS);
     return text.beforeFirstZero();
@@ -147,7 +147,7 @@ std::string GPUImplHardware::DoGetCLDeviceVersion()
     require(clGetDeviceInfo(device.id(), CL_DEVICE_VERSION, 0, nullptr, &size) == CL_SUCCESS);
     // The driver's terminator falls on the room's own. For a size of 0, which hasn't even that, the
     // length wraps around, and there is no such room.
-    QGF::Core::TextRoom text(size - 1);
+    QGF::Core::TextBuffer text(size - 1);
     require(clGetDeviceInfo(device.id(), CL_DEVICE_VERSION, size, text.data(), nullptr) ==
             CL_SUCCESS);
     return WithoutVersionPrefix(text.beforeFirstZero());

@@ -1,5 +1,5 @@
-// QGF::Core: what the other halves of the graphics foundation library stand on: its exceptions,
-// its start and the loading of dynamic libraries.
+// QGF::Core: the base of the graphics foundation library: its exceptions, its initialization and
+// the loading of dynamic libraries.
 #pragma once
 
 #include <exception>
@@ -8,34 +8,34 @@
 
 namespace QGF {
 
-// Root of what the library throws. what() and message() give the same text.
+// Base class of the library's exceptions. what() and message() return the same text.
 class ExceptionBase : public std::exception {
 public:
     explicit ExceptionBase(std::string message) : fMessage(std::move(message)) {}
     const char* what() const noexcept override { return fMessage.c_str(); }
 
-    // What failed and why, in one line; " | " stands between the lines of a shader log. Never null;
-    // virtual so that a derived exception may give none.
+    // What failed and why, on one line; the lines of a shader log are joined by " | ". Never null
+    // here; virtual so that a derived class may return null.
     virtual const char* message() const noexcept { return fMessage.c_str(); }
 
 private:
     std::string fMessage;
 };
 
-// A request that this machine, driver or state can't fulfil.
+// A request that fails on this machine, with this driver or in the present state.
 class LogicalException : public ExceptionBase {
 public:
     using ExceptionBase::ExceptionBase;
 };
 
-// A violated expectation of the library's own: "file(line): text".
+// An internal error, a violated condition of the library: "file(line): text".
 class InternalException : public ExceptionBase {
 public:
     InternalException(const char* file, int line, const char* text);
 
     const char* file() const noexcept { return fFile; }
     int line() const noexcept { return fLine; }
-    // The violated expectation alone.
+    // The violated condition without file and line.
     const char* text() const noexcept { return fText; }
 
 private:
@@ -49,30 +49,31 @@ namespace Core {
 // An entry point of a dynamic library, to be cast to its real type.
 using Proc = void (*)();
 
-// A dynamic library held open. Not copyable; closed by the destructor.
+// An open dynamic library. The destructor closes it.
 class DynamicLibrary {
 public:
     virtual ~DynamicLibrary() = default;
-    // Null if the library has no such entry point.
+    // Returns the entry point, null if the library has none of that name.
     virtual Proc getProc(const char* name) const = 0;
 };
 
-// Opens the first library of a null-terminated list of file names that the platform's loader finds,
-// on Windows in the system's folder. Throws LogicalException naming each with the loader's reason.
+// Opens the first library of a null-terminated list of file names that the platform's loader can
+// open; on Windows only the system folder is searched. If none can be opened, throws
+// LogicalException with each name and the loader's reason.
 std::unique_ptr<DynamicLibrary> OpenLibrary(const char* const* names);
 
 class Library {
 public:
-    // Starts the library: makes sure that the platform's dynamic loader answers. Repeating it does
-    // nothing. Throws LogicalException.
+    // Initializes the library: checks that the platform's dynamic loader works. After a success,
+    // further calls do nothing. Throws LogicalException.
     static void Initialize();
 };
 
-// Asks the platform's dynamic loader for a sign of life. Throws LogicalException if it gives none.
+// Checks that the platform's dynamic loader works. Throws LogicalException if it doesn't.
 using LoaderCheck = void (*)();
 
-// Puts `check` in the place of the platform's own and forgets an earlier start; null brings the
-// platform's own back. For tests.
+// Replaces the platform's check by `check` and makes the library uninitialized; null restores the
+// platform's check. For tests.
 void ReplaceLoaderCheck(LoaderCheck check);
 
 } // namespace Core

@@ -1,6 +1,6 @@
 // QGF::OCL: OpenCL platforms, devices, contexts and queues, over an OpenCL loader library that is
-// opened at run time. Everything here throws QGF::LogicalException with the call and its status,
-// unless told otherwise.
+// opened at run time. Unless stated otherwise, a failed call throws QGF::LogicalException with the
+// call's name and its status.
 #pragma once
 
 #include <cstddef>
@@ -18,32 +18,33 @@ namespace OCL {
 
 class Library {
 public:
-    // Whether an OpenCL loader library opens and has every entry point that is called; it may lack
-    // the others of the FunctionTable. `path` names a library file to open; an empty one stands for
-    // the platform's usual names.
+    // Returns whether an OpenCL loader library can be opened and has every CALLED entry point of
+    // OCLFunctionTable.h. `path` is the library's file; if empty, the platform's default names are
+    // tried. Doesn't throw for a missing library.
     static bool IsOpenCLAvailable(const std::string& path);
 
-    // Opens the library for good. Throws if it isn't available. Repeating it does nothing.
+    // Opens the library for the rest of the process. Further calls do nothing. Throws if it isn't
+    // available.
     static void Initialize();
 };
 
 // The OpenCL entry points of the process.
 class ExtensionManager {
 public:
-    // Opens the library if that hasn't happened. Throws if it isn't available.
+    // Opens the library by the first call. Throws if it isn't available.
     static ExtensionManager& instance();
 
     const FunctionTable& table() const { return fTable; }
 
-    // Replaces the table. For tests; null brings the library's own back.
+    // Replaces the table by a copy of `table`; null restores the library's table. For tests.
     static void ReplaceTable(const FunctionTable* table);
 
 private:
     FunctionTable fTable;
 };
 
-// Releases one kind of OpenCL object; device and platform ids have nothing to release. Whatever the
-// driver makes of it is ignored: its status, and an exception that it throws.
+// Releases one kind of OpenCL object; device and platform ids need no release. The driver's status
+// and an exception thrown by it are ignored.
 template <typename Handle>
 struct HandleTraits;
 template <>
@@ -71,7 +72,7 @@ struct HandleTraits<cl_event> {
     static void Release(cl_event event) noexcept;
 };
 
-// A raw OpenCL handle in a C++ object.
+// Base of the classes that hold an OpenCL handle.
 template <typename Handle>
 class OpenCLObjectWrapper {
 public:
@@ -85,17 +86,16 @@ protected:
     Handle fHandle;
 };
 
-// Names of device properties, by OpenCL's own numbers.
+// Device properties, with OpenCL's values.
 enum class DeviceProperty : cl_device_info {
     VendorID = 0x1001,
     GlobalMemSize = 0x101F,
 };
 
 namespace Enum {
-// The name of the C type in which OpenCL answers a property, such as "cl_uint"; "" for one that the
-// library doesn't know.
+// Returns the name of the property's C type, such as "cl_uint"; "" for an unknown property.
 const char* GetPropertyTypeName(DeviceProperty property);
-// The names that GetPropertyTypeName uses, for the types that can be asked for.
+// Returns the same name for a type that getInfo can read.
 template <typename T>
 const char* TypeName();
 template <>
@@ -106,24 +106,24 @@ const char* TypeName<cl_ulong>();
 
 class Platform;
 
-// A value wrapper around a device id.
+// A device id. Copyable; owns nothing.
 class Device : public OpenCLObjectWrapper<cl_device_id> {
 public:
     explicit Device(cl_device_id device) : OpenCLObjectWrapper(device) {}
 
     Platform platform() const;
-    // The device's own texts, up to their first zero byte. Throw std::bad_alloc if there is no room
-    // for what the driver claims.
+    // CL_DEVICE_NAME and CL_DEVICE_VENDOR, up to their first zero byte. Throw std::bad_alloc if
+    // memory for the size that the driver reports can't be allocated.
     std::string name() const;
     std::string vendor() const;
 
     // Reads a property of exactly `size` bytes into `value`; `actualSize` may be null. Throws if
-    // the driver refuses or answers another size.
+    // the driver's call fails or the driver returns another size.
     void getInfoImpl(DeviceProperty property, std::size_t size, void* value,
                      std::size_t* actualSize) const;
 
-    // The typed read: throws InternalException "property_typename == type_name" if T is not the
-    // property's type.
+    // Reads a property of type T. Throws InternalException "property_typename == type_name" if T
+    // is not the property's type.
     template <typename T>
     T getInfo(DeviceProperty property) const
     {
@@ -136,21 +136,23 @@ public:
     }
 };
 
+// A platform id. Copyable; owns nothing.
 class Platform : public OpenCLObjectWrapper<cl_platform_id> {
 public:
     explicit Platform(cl_platform_id platform) : OpenCLObjectWrapper(platform) {}
 
-    // The devices of that type in the platform's order; empty if it says "device not found".
+    // The devices of that type in the platform's order; empty if the platform returns
+    // CL_DEVICE_NOT_FOUND.
     std::vector<Device> devices(cl_device_type type) const;
-    // Up to its first zero byte. Throws std::bad_alloc if there is no room for what the driver
-    // claims.
+    // CL_PLATFORM_VERSION up to its first zero byte. Throws std::bad_alloc if memory for the size
+    // that the driver reports can't be allocated.
     std::string version() const;
 };
 
 // The platforms in the loader's order; empty if there is none.
 std::vector<Platform> platforms();
 
-// The properties that put a context on one platform.
+// The context properties that select a platform.
 class ContextProperties {
 public:
     explicit ContextProperties(const Platform& platform);
@@ -160,13 +162,13 @@ private:
     std::vector<cl_context_properties> fProperties;
 };
 
-// A function that the driver calls with its own messages, and the data it is called with.
+// The driver calls `function` with a message and with `user`, possibly on a thread of its own.
 struct ContextCallback {
     void(CL_CALLBACK* function)(const char* text, const void* data, std::size_t size, void* user);
     void* user;
 };
 
-// A context on one device, released by the destructor.
+// A context on one device. The destructor releases it.
 class Context : public OpenCLObjectWrapper<cl_context> {
 public:
     Context(const ContextProperties& properties, const Device& device,
@@ -176,7 +178,7 @@ public:
     Context& operator=(const Context&) = delete;
 };
 
-// A command queue, released by the destructor.
+// A command queue. The destructor releases it.
 class CommandQueue : public OpenCLObjectWrapper<cl_command_queue> {
 public:
     CommandQueue(const Context& context, const Device& device, bool outOfOrder, bool profiling);

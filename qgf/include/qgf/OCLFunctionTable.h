@@ -1,6 +1,4 @@
-// OpenCL's entry points as one plain struct, in the order in which the OpenCL 1.0 header declares
-// them. Those that are called are plain pointers to functions, never null in the library's own
-// table.
+// The OpenCL entry points as a struct of function pointers.
 #pragma once
 
 #ifndef CL_TARGET_OPENCL_VERSION
@@ -12,10 +10,9 @@
 
 #include "qgf/Core.h"
 
-// OpenCL's entry points, one a line, in the order in which the OpenCL 1.0 header declares them. The
-// two parameters are macros that take a name: CALLED for the entry points that are called, which a
-// library must have, UNCALLED for the others. To call one of those, make it CALLED; it is required
-// from then on.
+// The entry points in the order of the OpenCL 1.0 header. The two parameters are macros that take a
+// name: CALLED for the entry points that are called and that a library must have, UNCALLED for the
+// others. To call one of the others, make it CALLED; it is then required.
 #define QGF_OCL_ENTRY_POINTS(CALLED, UNCALLED)                                                     \
     CALLED(clGetPlatformIDs)                                                                       \
     CALLED(clGetPlatformInfo)                                                                      \
@@ -87,12 +84,13 @@
 namespace QGF {
 namespace OCL {
 
-// An entry point that nothing here calls, so that a library may lack it: the pointer is null then.
+// An entry point that nothing here calls. Null if the library lacks it.
 template <typename Function>
 struct Uncalled {
     Function address;
 };
 
+// CALLED members are plain function pointers, never null in the library's own table.
 struct FunctionTable {
 #define QGF_OCL_CALLED(name) decltype(&::name) name;             // NOLINT(*-macro-parentheses)
 #define QGF_OCL_UNCALLED(name) Uncalled<decltype(&::name)> name; // NOLINT(*-macro-parentheses)
@@ -101,8 +99,8 @@ struct FunctionTable {
 #undef QGF_OCL_UNCALLED
 };
 
-// Fills the table with what `getProc(context, name)` gives. False if an entry point that is called
-// is missing; its member is null then, and the others are filled all the same.
+// Fills the table from `getProc(context, name)`. Returns false if a CALLED entry point is missing;
+// its member is then null, and the other members are filled.
 bool FillFunctionTable(FunctionTable& table, Core::Proc (*getProc)(void* context, const char* name),
                        void* context);
 

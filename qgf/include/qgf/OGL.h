@@ -1,7 +1,7 @@
-// QGF::OGL: OpenGL devices, offscreen contexts and the few objects made in them. OpenGL itself is
-// loaded at run time. A context is current per thread; the library takes no lock.
+// QGF::OGL: OpenGL devices, offscreen contexts, shader programs, textures and framebuffers. OpenGL
+// is loaded at run time. A context is current per thread; the library takes no lock.
 //
-// Everything here throws QGF::LogicalException with a text that says what failed and why.
+// A failed operation throws QGF::LogicalException with a text that says what failed and why.
 #pragma once
 
 #include <cstdint>
@@ -21,13 +21,14 @@ class Library {
 public:
     struct InitOptions {};
 
-    // Loads the platform's OpenGL binding and looks up its display devices. Throws if there is no
-    // binding or no display device. Repeating it tries again only after a failure.
+    // Loads the platform's OpenGL binding and lists its display devices. Throws if there is no
+    // binding or no display device. After a success, further calls do nothing.
     static void Initialize(const InitOptions& options);
 };
 
-// A device that can display or render, by three texts: the system's name of the device, the text
-// that a person knows it by, and the place where it sits.
+// Identifies a device that can display or render. On Windows: the device's name, the adapter's
+// description and the device id. On Linux: the DRM node or "egl:N", the adapter's name, and its
+// place (qgf/DrmNodes.h) or "".
 class DisplayDeviceKey {
 public:
     DisplayDeviceKey() = default;
@@ -47,36 +48,35 @@ private:
     std::string fDisplayID;
 };
 
-// An OpenGL context and its entry points. Destroy it on the thread that uses it; a context that is
-// current then is released first.
+// An OpenGL context and its entry points. Use and destroy it on one thread. The destructor releases
+// the context first if it is current.
 class Context {
 public:
     virtual ~Context();
     Context(const Context&) = delete;
     Context& operator=(const Context&) = delete;
 
-    // The device that new contexts go to by default: the first one. Throws if there is none.
+    // Returns the first device that has a name. Throws if there is none.
     static DisplayDeviceKey PrimaryDisplayDevice();
 
-    // How many display devices there are; 0 if the binding can't be loaded.
+    // Returns the number of display devices; 0 if the binding can't be loaded.
     static int NumDisplayDevice();
 
-    // Fills the key of device `index` and tells whether there is such a device. False also for a
-    // device without a name: the system counts it, but no context can be made on it.
+    // Sets `key` to that of device `index` and returns true. Returns false if there is no such
+    // device or it has no name: the system lists such a device, but no context can be made on it.
     static bool DisplayDevice(int index, DisplayDeviceKey& key);
 
-    // Makes this context current on the calling thread. After an exception the context that was
-    // current before still is.
+    // Makes this context current on the calling thread. If it throws, the current context is
+    // unchanged.
     void makeCurrent();
 
-    // The context that the library made current on the calling thread; null if there is none.
+    // Returns the context that the library made current on the calling thread; null for none.
     static Context* Current();
 
-    // The entry points, looked up when the context becomes current for the first time. Throws
-    // before that.
+    // Returns the entry points, which the first makeCurrent looks up. Throws before that.
     const OpenGLInterceptor& interceptor() const;
 
-    // Read at the first question, which must come while this context is current.
+    // Returns the context's extensions. The first call reads them; the context must be current.
     ExtensionManager& extensionManager();
 
 protected:
@@ -89,21 +89,22 @@ private:
     std::unique_ptr<PlatformContext> fContext;
     std::unique_ptr<OpenGLInterceptor> fInterceptor;
     std::unique_ptr<ExtensionManager> fExtensionManager;
-    // Owns nothing; others hold weak pointers to it to see whether this context still lives.
+    // Owns nothing. A ScopedContextWrapper holds a weak pointer to it, which expires with this
+    // context.
     std::shared_ptr<Context> fSelf;
 };
 
-// A context with no window: a compatibility context, so that the fixed-function names exist.
+// A context without a window. It has the compatibility profile, whose fixed-function queries the
+// tests use.
 class ContextOffscreen : public Context {
 public:
-    // Makes a context on the device of that key.
     explicit ContextOffscreen(const DisplayDeviceKey& key);
     ~ContextOffscreen() override;
 };
 
-// Remembers which context is current on this thread, and with `restore` set makes that one current
-// again, or none, at the end of the scope. None also if that context is gone or can't be made
-// current again: the end of the scope never throws.
+// Saves the context that is current on this thread. If `restore` is true, the destructor makes it
+// current again. If there was none, or it has been destroyed or can't be made current, no context
+// is current afterwards; the destructor never throws.
 class ScopedContextWrapper {
 public:
     explicit ScopedContextWrapper(bool restore);
@@ -124,13 +125,14 @@ public:
     Program(const Program&) = delete;
     Program& operator=(const Program&) = delete;
 
-    // Compiles one shader from `count` strings, zero-terminated where `lengths` is null, and adds
-    // it to the program. Throws with the driver's log.
+    // Compiles a shader from `count` strings and attaches it to the program. `lengths` are the
+    // strings' lengths; null means that the strings are zero-terminated. Throws with the driver's
+    // log.
     void loadVertexShader(int count, const char* const* strings, const std::int32_t* lengths);
     void loadFragmentShader(int count, const char* const* strings, const std::int32_t* lengths);
 
-    // Links what was loaded. With `requireShaders` set a program that lacks one of its two shaders
-    // is refused before the driver is asked. Throws with the driver's log.
+    // Links the loaded shaders. Throws with the driver's log. If `requireShaders` is true, throws
+    // without calling the driver if one of the two shaders is missing.
     void link(bool requireShaders);
 
 private:
@@ -142,17 +144,17 @@ private:
     bool fHasFragmentShader = false;
 };
 
-// The texture formats that the library knows, by its own numbers.
+// The texture formats that the library supports. The values are the library's own.
 enum class InternalFormat : std::int32_t { RGBA8 = 34 };
 
-// The type of the data handed over; Default is the format's natural one.
+// The type of the pixel data. Default is the usual type of the format.
 enum class Type : std::int32_t { Default = -1 };
 
 // A two-dimensional texture. Needs a current context from construction to destruction. An OpenGL
-// error raised on the way stays in OpenGL's queue for the caller's own question.
+// error that its calls raise stays in OpenGL's queue for the caller's glGetError.
 class Texture2D {
 public:
-    // `data` may be null: the content is undefined then. `mipmaps` asks for a full set of levels.
+    // If `data` is null, the content is undefined. If `mipmaps` is true, all levels are made.
     // Leaves no texture bound.
     Texture2D(InternalFormat format, std::int32_t width, std::int32_t height, bool mipmaps,
               const void* data, Type type);
@@ -180,8 +182,8 @@ public:
     void unbind();
 
     // Attaches a level of the texture as the colour attachment of that index. The framebuffer must
-    // be bound. Throws if the driver then doesn't call the framebuffer complete; the first OpenGL
-    // error in the queue, most often that of the texture, goes into the text.
+    // be bound. Throws if the framebuffer is then not complete; the text has the first OpenGL error
+    // of the queue, which most often comes from the texture.
     void attach(const Texture2D& texture, std::uint32_t attachment, std::uint32_t level);
 
 private:

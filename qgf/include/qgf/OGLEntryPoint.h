@@ -1,5 +1,5 @@
-// An OpenGL entry point as an object that is called like the function, with the place of the caller
-// in front. On the 64-bit platforms there is one calling convention.
+// An OpenGL entry point as an object that is called like the function, with the caller's source
+// file and line as first arguments. 64-bit platforms have one calling convention.
 #pragma once
 
 #include <cstdint>
@@ -19,17 +19,17 @@ using GLfloat = float;
 using GLubyte = std::uint8_t;
 using GLchar = char;
 
-// How entry points are looked up: `getProc(context, name)` gives null where the driver lacks one.
+// Looks entry points up: `getProc(context, name)` returns null if the driver has none of that name.
 struct EntryPointLookup {
     Core::Proc (*getProc)(void* context, const char* name);
     void* context;
 
-    // Where the driver lacks `name`, `extensionName` is looked up, unless it is null.
+    // Looks `name` up; if the driver lacks it and `extensionName` isn't null, looks that up.
     Core::Proc find(const char* name, const char* extensionName) const;
 };
 
-// Throws LogicalException "NAME is not offered by this OpenGL driver (called from FILE:LINE)", with
-// "?" in the place of a null `file`.
+// Throws LogicalException "NAME is not offered by this OpenGL driver (called from FILE:LINE)"; a
+// null `file` prints as "?".
 [[noreturn]] void ThrowNotOffered(const char* name, const char* file, int line);
 
 template <typename Signature>
@@ -38,8 +38,8 @@ class EntryPoint;
 template <typename Result, typename... Parameters>
 class EntryPoint<Result(Parameters...)> {
 public:
-    // `name` is kept. `extensionName` is the name in the extension that the function came from, for
-    // a driver that lacks the core one.
+    // `name` must outlive this object. `extensionName`, or null, is the function's name in its
+    // extension, for a driver that lacks the core function.
     EntryPoint(const EntryPointLookup& lookup, const char* name,
                const char* extensionName = nullptr)
         : fName(name), fFunction(reinterpret_cast<Function>(lookup.find(name, extensionName)))
@@ -48,7 +48,7 @@ public:
     bool isOffered() const { return fFunction != nullptr; }
 
     // Takes the caller's source file and line, then OpenGL's arguments. Throws as ThrowNotOffered
-    // does where the driver lacks the function.
+    // does if the driver lacks the function.
     Result operator()(const char* file, int line, Parameters... parameters) const
     {
         if (!isOffered())
@@ -63,7 +63,7 @@ private:
     Function fFunction;
 };
 
-// An entry point whose call gives null, and doesn't throw, where the driver lacks the function.
+// An entry point whose call returns null if the driver lacks the function.
 template <typename Signature>
 class OptionalEntryPoint;
 

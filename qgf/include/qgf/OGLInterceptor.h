@@ -1,5 +1,4 @@
-// The OpenGL calls of the library, each with the place of the caller in front, and the extensions
-// that a context offers.
+// The call table and the extensions of an OpenGL context.
 #pragma once
 
 #include <cstdint>
@@ -13,9 +12,9 @@ namespace OGL {
 
 // The call table of one context. Each call takes the caller's source file and line, then OpenGL's
 // arguments. A call whose entry point the driver lacks throws LogicalException "NAME is not offered
-// by this OpenGL driver (called from FILE:LINE)"; glGetStringi gives null then.
+// by this OpenGL driver (called from FILE:LINE)"; glGetStringi returns null instead.
 class OpenGLInterceptor {
-    // Comes first: each entry point is looked up as it is constructed, and never again.
+    // The first member: the constructors of the entry points use it.
     const EntryPointLookup fLookup;
 
 public:
@@ -28,8 +27,8 @@ public:
     // The table of the context that is current on this thread. Throws if there is none.
     static const OpenGLInterceptor& Instance();
 
-// The entry points: the name and the type of each. _OR_EXT takes the name with "EXT" at its end, of
-// the extension that the function came from, where the driver lacks the core one.
+// The entry points: name and type. _OR_EXT falls back to the extension's name, which ends in "EXT",
+// if the driver lacks the core function; _OR_NULL makes an OptionalEntryPoint.
 #define QGF_OGL_FUNCTION(name, type) const EntryPoint<type> name = {fLookup, #name}
 #define QGF_OGL_FUNCTION_OR_EXT(name, type)                                                        \
     const EntryPoint<type> name = {fLookup, #name, #name "EXT"}
@@ -81,7 +80,7 @@ public:
 #undef QGF_OGL_FUNCTION_OR_NULL
 };
 
-// Core versions and extensions, by the library's own numbers.
+// Core versions and extensions. The values are the library's own.
 enum OpenGLExtension : std::int32_t {
     GL_VERSION_1_2 = 0,
     GL_IMAGING_1_2 = 1, // the optional imaging subset
@@ -109,17 +108,17 @@ enum OpenGLExtension : std::int32_t {
     GL_EXT_FRAMEBUFFER_OBJECT = 81,
 };
 
-// What one context offers.
+// The version and extensions of one context.
 class ExtensionManager {
 public:
     // The manager of the context that is current on this thread; null if there is none.
     static ExtensionManager* Instance();
 
-    // Reads version and extension names through the interceptor of a context that is current.
+    // Reads version and extension names with the calls of the current context.
     explicit ExtensionManager(const OpenGLInterceptor& gl);
 
-    // True if the context offers this core version (or a later one) or this extension. An id that
-    // the library doesn't know is not supported.
+    // Returns whether the context has this core version or a later one, or this extension. Returns
+    // false for an unknown value.
     bool isSupported(OpenGLExtension extension) const;
 
 private:

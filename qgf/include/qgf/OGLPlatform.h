@@ -1,5 +1,5 @@
-// The seam below QGF::OGL: display devices, offscreen contexts and entry-point look-up, as a
-// platform supplies them. Tests put a fake one in its place.
+// The platform interface below QGF::OGL: display devices, offscreen contexts and entry-point
+// look-up. Tests replace it by a fake.
 #pragma once
 
 #include <memory>
@@ -10,7 +10,7 @@
 namespace QGF {
 namespace OGL {
 
-// One native context. Destroying it releases it, and what was made for it.
+// One native context. The destructor destroys it and its window or surface.
 class PlatformContext {
 public:
     virtual ~PlatformContext() = default;
@@ -18,7 +18,8 @@ public:
     virtual void makeCurrent() = 0;
     // Leaves no context current on the calling thread. Never throws.
     virtual void release() noexcept = 0;
-    // Null if the driver has no such entry point. Called while this context is current.
+    // Returns the entry point, null if the driver has none of that name. Called while this context
+    // is current.
     virtual Core::Proc getProc(const char* name) = 0;
 };
 
@@ -26,20 +27,20 @@ class Platform {
 public:
     virtual ~Platform() = default;
 
-    // The display devices in their order: hardware before software. The first one is the primary.
-    // Asked once, at the first question about devices.
+    // Lists the display devices, hardware before software. The first is the primary device. The
+    // list is cached after the first successful call.
     virtual std::vector<DisplayDeviceKey> displayDevices() = 0;
 
-    // A compatibility context on one of those devices. Throws LogicalException.
+    // Makes a compatibility context on one of those devices. Throws LogicalException.
     virtual std::unique_ptr<PlatformContext> createOffscreen(const DisplayDeviceKey& key) = 0;
 };
 
-// Makes the platform's own binding. Throws LogicalException if there is none. One twin source per
-// platform implements it.
+// Makes the native platform. Throws LogicalException if the system has no OpenGL binding. Each
+// platform has its own source file for it.
 std::unique_ptr<Platform> MakeNativePlatform();
 
-// Puts `platform` in the place of the native one and forgets what was known of devices; null
-// brings the native one back. For tests; no context may be alive.
+// Replaces the native platform and drops the cached list of devices; null restores the native
+// platform. For tests; no context may be alive.
 void ReplacePlatform(std::unique_ptr<Platform> platform);
 
 } // namespace OGL

@@ -1,7 +1,6 @@
-// The files in which a Unix-like system describes itself (/sys, /proc and the PCI id database),
-// under a root that a test can replace. Nothing here writes, opens a device or waits for one, and
-// nothing throws but std::bad_alloc: what can't be read is absent. For the platforms that have such
-// files.
+// Reads the files in which a Unix-like system describes itself (/sys, /proc and the PCI id
+// database), under a root that a test can replace. Nothing is written, and no device is opened or
+// waited for. A file that can't be read counts as absent; only std::bad_alloc is thrown.
 #pragma once
 
 #include <cstddef>
@@ -10,35 +9,36 @@
 
 namespace QGF {
 
-// A folder that stands for the root of the file system wherever adapters are looked up; empty for
-// the real one. Set it before anything else is asked; setting it forgets what was known of
-// adapters. For tests and recorded machines: links inside that folder must be relative. Main thread
-// only.
+// Sets the folder that replaces the root of the file system wherever adapters are looked up; empty
+// for the real root. Cached adapter data becomes stale. For tests and recorded machines: symbolic
+// links inside the folder must be relative. Main thread only.
 void SetSystemRoot(const std::string& root);
 const std::string& SystemRoot();
 
-// How often the root has been set: what was found at another count is stale.
+// Returns the number of calls of SetSystemRoot. Data cached at another number is stale.
 unsigned SystemRootCount();
 
-// No file of /sys holds more than a page, and those of /proc that are read here are as short.
-inline constexpr std::size_t kSystemFileLimit = 4096;
+// Bytes. A file of /sys has at most one page, and the files of /proc that are read are as short.
+inline constexpr std::size_t kMaxSystemFileSize = 4096;
 
-// Reads the file at an absolute path under the root, at most its first `limit` bytes. False, with
-// `text` empty, if it is not a regular file or can't be read to the end or the limit.
+// Reads the first `maxSize` bytes of the file at an absolute path under the root. Returns false,
+// with `text` empty, if it is not a regular file or a read fails.
 bool ReadSystemFile(const std::string& path, std::string& text,
-                    std::size_t limit = kSystemFileLimit);
+                    std::size_t maxSize = kMaxSystemFileSize);
 
-// The first line of such a file without the blanks around it; empty if there is none.
+// Returns the first line of such a file without leading and trailing blanks; empty if the file
+// can't be read.
 std::string ReadSystemLine(const std::string& path);
 
-// The names in the folder at an absolute path under the root, sorted; empty if it can't be read.
-// At most the first 4096 that the system lists.
+// Returns the names in the folder at an absolute path under the root, sorted; empty if it can't be
+// read. Names that begin with a dot are left out. At most 4096 entries are read.
 std::vector<std::string> ListSystemFolder(const std::string& path);
 
-// The text that the symbolic link at an absolute path under the root holds; empty if there is none.
+// Returns the target of the symbolic link at an absolute path under the root; empty if there is
+// none.
 std::string ReadSystemLink(const std::string& path);
 
-// The part of a path behind its last slash.
+// Returns the part of a path after its last slash.
 std::string LastOfPath(const std::string& path);
 
 } // namespace QGF

@@ -25,7 +25,7 @@
 namespace pmutil {
 namespace {
 
-constexpr std::size_t kAnswerLimit = QGF::kSystemFileLimit; // bytes; room for 46 regions
+constexpr std::size_t kAnswerLimit = QGF::kMaxSystemFileSize; // bytes; room for 46 regions
 constexpr int kMaxTries = 16;
 
 class Node {

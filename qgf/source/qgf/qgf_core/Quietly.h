@@ -1,11 +1,11 @@
-// For driver calls on the way out.
+// Driver calls in destructors.
 #pragma once
 
 namespace QGF {
 namespace Core {
 
-// Makes the call and ignores what it throws: a driver written in C++ may throw through its C
-// interface, and that must not end the process here.
+// Calls `call` and ignores exceptions. A driver written in C++ may throw through its C interface;
+// from a destructor that would terminate the process.
 template <typename Call>
 void Quietly(Call call) noexcept
 {

@@ -1,22 +1,22 @@
-// Reading the texts and lists that an OpenCL driver answers in two calls: how much, then what.
+// Reads texts and lists from an OpenCL driver in two calls: the size, then the content.
 #pragma once
 
 #include <cstddef>
 #include <string>
 #include <vector>
 
-#include "qgf/TextRoom.h"
+#include "qgf/TextBuffer.h"
 #include "qgf/qgf_ocl/Status.h"
 
 namespace QGF {
 namespace OCL {
 
-// What a driver may claim before it isn't believed any more.
+// A driver that reports a longer list is taken as broken.
 inline constexpr cl_uint kMaxListEntries = 4096;
 
-// The text that `query(size, value, actualSize)` gives, up to its first zero byte. Throws
-// LogicalException with the call's name if the driver refuses, and std::bad_alloc if there is no
-// room for what it claims.
+// Returns the text that `query(size, value, actualSize)` reads, up to its first zero byte. Throws
+// LogicalException with the call's name if a query fails, and std::bad_alloc if memory for the
+// reported size can't be allocated.
 template <typename Query>
 std::string ReadText(const char* call, const Query& query)
 {
@@ -24,14 +24,14 @@ std::string ReadText(const char* call, const Query& query)
     CheckStatus(call, query(std::size_t{0}, nullptr, &size));
     if (size == 0)
         return {};
-    Core::TextRoom room(size);
-    CheckStatus(call, query(size, room.data(), nullptr));
-    return room.beforeFirstZero();
+    Core::TextBuffer text(size);
+    CheckStatus(call, query(size, text.data(), nullptr));
+    return text.beforeFirstZero();
 }
 
-// The handles that `query(count, handles, actualCount)` gives; none if it answers `emptyStatus`.
-// Throws LogicalException with the call's name if the driver refuses otherwise or claims more than
-// kMaxListEntries.
+// Returns the handles that `query(count, handles, actualCount)` reads; none if the query's status
+// is `emptyStatus`. Throws LogicalException with the call's name if a query fails otherwise or the
+// driver reports more than kMaxListEntries.
 template <typename Handle, typename Query>
 std::vector<Handle> ReadList(const char* call, cl_int emptyStatus, const Query& query)
 {
@@ -41,14 +41,14 @@ std::vector<Handle> ReadList(const char* call, cl_int emptyStatus, const Query& 
         return {};
     CheckStatus(call, status);
     if (count > kMaxListEntries)
-        RefuseAnswer(call, "the driver claims a list of " + std::to_string(count) + " entries");
+        ThrowBadAnswer(call, "the driver reports a list of " + std::to_string(count) + " entries");
     std::vector<Handle> handles(count, nullptr);
     if (count == 0)
         return handles;
-    cl_uint given = count;
-    CheckStatus(call, query(count, handles.data(), &given));
-    if (given < count)
-        handles.resize(given);
+    cl_uint actualCount = count;
+    CheckStatus(call, query(count, handles.data(), &actualCount));
+    if (actualCount < count)
+        handles.resize(actualCount);
     return handles;
 }
 

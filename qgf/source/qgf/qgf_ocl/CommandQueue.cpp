@@ -16,7 +16,7 @@ cl_command_queue Create(cl_context context, cl_device_id device, bool outOfOrder
         context, device, properties, &status);
     CheckStatus("clCreateCommandQueue", status);
     if (queue == nullptr)
-        RefuseAnswer("clCreateCommandQueue", "the driver gives no queue");
+        ThrowBadAnswer("clCreateCommandQueue", "the driver returns no queue");
     return queue;
 }
 

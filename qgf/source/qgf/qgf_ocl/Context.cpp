@@ -14,7 +14,7 @@ cl_context Create(const ContextProperties& properties, cl_device_id device,
         properties.data(), 1, &device, callback.function, callback.user, &status);
     CheckStatus("clCreateContext", status);
     if (context == nullptr)
-        RefuseAnswer("clCreateContext", "the driver gives no context");
+        ThrowBadAnswer("clCreateContext", "the driver returns no context");
     return context;
 }
 

@@ -14,18 +14,18 @@ std::string GetInfoText(cl_device_id device, cl_device_info property, const char
     });
 }
 
-// Reads a value whose size is known beforehand.
+// Reads a value of a known size.
 void GetInfoValue(cl_device_id device, cl_device_info property, const char* call, std::size_t size,
                   void* value, std::size_t* actualSize)
 {
-    std::size_t answered = size;
+    std::size_t returned = size;
     CheckStatus(call, ExtensionManager::instance().table().clGetDeviceInfo(device, property, size,
-                                                                           value, &answered));
+                                                                           value, &returned));
     if (actualSize != nullptr)
-        *actualSize = answered;
-    if (answered != size)
-        RefuseAnswer(call, "the driver answers " + std::to_string(answered) + " bytes where " +
-                               std::to_string(size) + " are due");
+        *actualSize = returned;
+    if (returned != size)
+        ThrowBadAnswer(call, "the driver returns " + std::to_string(returned) +
+                                 " bytes instead of " + std::to_string(size));
 }
 
 } // namespace
@@ -35,9 +35,9 @@ Platform Device::platform() const
     constexpr char kCall[] = "clGetDeviceInfo(CL_DEVICE_PLATFORM)";
     cl_platform_id platform = nullptr;
     GetInfoValue(fHandle, CL_DEVICE_PLATFORM, kCall, sizeof(cl_platform_id), &platform, nullptr);
-    // Null would mean "whichever" to most of OpenCL.
+    // To most OpenCL functions a null platform means any platform.
     if (platform == nullptr)
-        RefuseAnswer(kCall, "the driver gives no platform");
+        ThrowBadAnswer(kCall, "the driver returns no platform");
     return Platform(platform);
 }
 

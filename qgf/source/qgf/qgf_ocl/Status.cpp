@@ -97,9 +97,9 @@ void CheckStatus(const char* call, cl_int status)
                                std::to_string(status) + ")");
 }
 
-void RefuseAnswer(const char* call, const std::string& complaint)
+void ThrowBadAnswer(const char* call, const std::string& reason)
 {
-    throw LogicalException(std::string(call) + ": " + complaint);
+    throw LogicalException(std::string(call) + ": " + reason);
 }
 
 } // namespace OCL

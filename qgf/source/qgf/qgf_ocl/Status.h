@@ -1,4 +1,4 @@
-// OpenCL's status codes as failures of the library.
+// Turns OpenCL status codes into exceptions.
 #pragma once
 
 #include <string>
@@ -8,14 +8,14 @@
 namespace QGF {
 namespace OCL {
 
-// The code's name in the OpenCL header; "unknown status" for one that it doesn't have.
+// Returns the code's name in the OpenCL header; "unknown status" for any other code.
 const char* StatusName(cl_int status);
 
 // Throws LogicalException "CALL failed: NAME (CODE)" unless the status is CL_SUCCESS.
 void CheckStatus(const char* call, cl_int status);
 
-// Throws LogicalException "CALL: COMPLAINT", for an answer that can't be used.
-[[noreturn]] void RefuseAnswer(const char* call, const std::string& complaint);
+// Throws LogicalException "CALL: REASON". For a call that succeeds with an unusable result.
+[[noreturn]] void ThrowBadAnswer(const char* call, const std::string& reason);
 
 } // namespace OCL
 } // namespace QGF

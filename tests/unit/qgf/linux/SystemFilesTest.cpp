@@ -35,12 +35,12 @@ TEST_F(SystemFilesTest, AnOversizedFileIsReadUpToTheLimit)
 {
     fTree.write("/sys/a", std::string(100000, 'x'));
     EXPECT_TRUE(ReadSystemFile("/sys/a", fText));
-    EXPECT_EQ(fText, std::string(kSystemFileLimit, 'x'));
+    EXPECT_EQ(fText, std::string(kMaxSystemFileSize, 'x'));
     EXPECT_TRUE(ReadSystemFile("/sys/a", fText, 10));
     EXPECT_EQ(fText, std::string(10, 'x'));
 }
 
-TEST_F(SystemFilesTest, ABinaryFileComesUnchanged)
+TEST_F(SystemFilesTest, ABinaryFileIsReadUnchanged)
 {
     const std::string bytes("\0\xff\n\x01", 4);
     fTree.write("/sys/a", bytes);
@@ -48,13 +48,13 @@ TEST_F(SystemFilesTest, ABinaryFileComesUnchanged)
     EXPECT_EQ(fText, bytes);
 }
 
-TEST_F(SystemFilesTest, AFolderIsNoFile)
+TEST_F(SystemFilesTest, AFolderIsAbsent)
 {
     std::filesystem::create_directories(fTree.root() + "/sys/a");
     EXPECT_FALSE(ReadSystemFile("/sys/a", fText));
 }
 
-TEST_F(SystemFilesTest, ADanglingLinkIsNoFile)
+TEST_F(SystemFilesTest, ADanglingLinkIsAbsent)
 {
     fTree.write("/sys/b", "");
     std::filesystem::create_symlink("gone", fTree.root() + "/sys/a");
@@ -69,8 +69,8 @@ TEST_F(SystemFilesTest, ALinkToAFileIsFollowed)
     EXPECT_EQ(fText, "text");
 }
 
-// A process's memory opens as a regular file, and has nothing at address 0.
-TEST_F(SystemFilesTest, AFileThatOpensAndCannotBeReadIsAbsent)
+// /proc/self/mem is a regular file that can be opened; reading at address 0 fails.
+TEST_F(SystemFilesTest, AFileThatOpensButCannotBeReadIsAbsent)
 {
     std::filesystem::create_symlink("/proc/self/mem", fTree.root() + "/a");
     EXPECT_FALSE(ReadSystemFile("/a", fText));
@@ -78,21 +78,21 @@ TEST_F(SystemFilesTest, AFileThatOpensAndCannotBeReadIsAbsent)
     EXPECT_EQ(ReadSystemLine("/a"), "");
 }
 
-// Would hang if it opened the pipe.
-TEST_F(SystemFilesTest, APipeIsNoFileAndBlocksNothing)
+// Opening the pipe would block.
+TEST_F(SystemFilesTest, APipeIsAbsentAndNotOpened)
 {
     ASSERT_EQ(mkfifo((fTree.root() + "/pipe").c_str(), 0600), 0);
     EXPECT_FALSE(ReadSystemFile("/pipe", fText));
 }
 
-// Would never end if it read the device.
-TEST_F(SystemFilesTest, ADeviceIsNoFile)
+// Reading the device would never end.
+TEST_F(SystemFilesTest, ADeviceIsAbsent)
 {
     std::filesystem::create_symlink("/dev/zero", fTree.root() + "/zero");
     EXPECT_FALSE(ReadSystemFile("/zero", fText, static_cast<std::size_t>(-1)));
 }
 
-TEST_F(SystemFilesTest, TheLineIsTheFirstWithoutBlanks)
+TEST_F(SystemFilesTest, TheFirstLineIsTrimmed)
 {
     fTree.write("/a", " \tNVIDIA H100  \r\nnext\n");
     EXPECT_EQ(ReadSystemLine("/a"), "NVIDIA H100");
@@ -113,14 +113,14 @@ TEST_F(SystemFilesTest, AFolderListsItsNamesSorted)
     EXPECT_EQ(ListSystemFolder("/d"), (std::vector<std::string>{"a", "b", "c"}));
 }
 
-TEST_F(SystemFilesTest, WhatIsNoFolderListsNothing)
+TEST_F(SystemFilesTest, AFileOrMissingFolderListsNothing)
 {
     fTree.write("/a", "");
     EXPECT_TRUE(ListSystemFolder("/a").empty());
     EXPECT_TRUE(ListSystemFolder("/none").empty());
 }
 
-TEST_F(SystemFilesTest, ALinksTextIsReadThoughItsTargetIsGone)
+TEST_F(SystemFilesTest, ALinkIsReadEvenIfItsTargetIsMissing)
 {
     std::filesystem::create_symlink("../gone/nvidia", fTree.root() + "/driver");
     EXPECT_EQ(ReadSystemLink("/driver"), "../gone/nvidia");

@@ -1,11 +1,10 @@
-// Which files are read, and why none of them wakes a card. "class", "vendor" and "device" of a PCI
+// The files that are read here don't wake a suspended card. "class", "vendor" and "device" of a PCI
 // device print fields of the kernel's struct pci_dev (drivers/pci/pci-sysfs.c, pci_config_attr;
 // Documentation/ABI/testing/sysfs-bus-pci), unlike "config" and the link speeds, which resume the
-// device to read it. amdgpu's "product_name" prints what the driver read when it started
-// (drivers/gpu/drm/amd/amdgpu/amdgpu_fru_eeprom.c), for the server cards that have such a text.
-// "uevent" of a device without PCI prints what the device tree says (drivers/of/device.c,
-// of_device_uevent) and asks no driver. NvidiaProc.cpp tells of the one file that does wake its
-// card.
+// device. amdgpu's "product_name" prints a text that the driver has read at its start
+// (drivers/gpu/drm/amd/amdgpu/amdgpu_fru_eeprom.c); only server cards have it. "uevent" of a device
+// that isn't on PCI prints the device tree's entry (drivers/of/device.c, of_device_uevent) and
+// calls no driver. The one file that does wake its card is read in NvidiaProc.cpp.
 #include "qgf/AdapterName.h"
 
 #include <algorithm>
@@ -28,8 +27,8 @@ const char kPciDevices[] = "/sys/bus/pci/devices";
 constexpr unsigned kDisplayClass = 0x03;
 constexpr std::uint16_t kNvidia = 0x10DE;
 
-// An adapter description holds 127 characters; the longest " (PCI address)" takes 19 of them.
-constexpr std::size_t kNameLimit = 127 - 19;
+// An adapter description has 127 characters; the longest " (PCI address)" needs 19 of them.
+constexpr std::size_t kMaxNameLength = 127 - 19;
 
 struct Adapters {
     unsigned rootCount = 0;
@@ -42,7 +41,7 @@ std::string AttributeOf(const std::string& place, const char* attribute)
     return ReadSystemLine(AdapterFolder(place) + attribute);
 }
 
-// A number as the kernel prints ids, "0x10de"; 0 for anything else.
+// An id as the kernel prints it, "0x10de"; 0 for any other text.
 unsigned long IdOf(const std::string& address, const char* attribute)
 {
     const std::string text = AttributeOf(address, attribute);
@@ -57,7 +56,7 @@ std::uint16_t ShortIdOf(const std::string& address, const char* attribute)
     return static_cast<std::uint16_t>(id <= 0xFFFF ? id : 0);
 }
 
-// PCI addresses first, then the places of the others.
+// PCI addresses first, then the other places.
 std::vector<std::string> FindAdapters()
 {
     std::set<std::string> onPci;
@@ -83,22 +82,23 @@ std::string HexName(std::uint16_t vendor, std::uint16_t device)
     return text;
 }
 
-// Cuts a name down to what every adapter list gives back unchanged.
+// Replaces the characters that the adapter lists would escape, and truncates the name.
 std::string Plain(const std::string& name)
 {
     std::string plain;
     for (const char c : name) {
         if (static_cast<unsigned char>(c) >= 0x80 && static_cast<unsigned char>(c) < 0xC0) {
-            continue; // the rest of a character that already has its '?'
+            continue; // a UTF-8 continuation byte: the lead byte has become '?'
         }
-        const char* const kept = c == '"' ? "'" : c == '\\' ? "/" : nullptr;
-        if (kept) {
-            plain += kept;
+        if (c == '"') {
+            plain += '\'';
+        } else if (c == '\\') {
+            plain += '/';
         } else {
             plain += c >= ' ' && c <= '~' ? c : '?';
         }
     }
-    plain.resize(std::min(plain.size(), kNameLimit));
+    plain.resize(std::min(plain.size(), kMaxNameLength));
     return plain;
 }
 
@@ -119,7 +119,7 @@ std::string PciNameOf(const std::string& address, PciIds& ids)
     return name.empty() ? HexName(vendor, device) : name;
 }
 
-// What the device tree calls it, else its driver: nothing better is known of such a device.
+// The device tree's "compatible" text, else the driver's name, else the device's folder.
 std::string DeviceNameOf(const std::string& place)
 {
     std::string uevent;
@@ -161,8 +161,9 @@ const Adapters& GetAdapters()
     return *gKnown;
 }
 
-void Take(std::vector<std::string>& cards, std::vector<std::string>::iterator card,
-          std::string& address)
+// Moves a card's address from the list of free cards to a device.
+void Assign(std::vector<std::string>& cards, std::vector<std::string>::iterator card,
+            std::string& address)
 {
     address = *card;
     cards.erase(card);
@@ -210,20 +211,20 @@ std::vector<std::string> NvidiaAdapters(const std::vector<std::string>& names,
     for (const std::string& card : cards) {
         models[card] = NvidiaModel(card);
     }
-    std::vector<std::string*> open;
+    std::vector<std::string*> unassigned;
     for (std::size_t i = 0; i != names.size(); ++i) {
         const auto card = std::find_if(cards.begin(), cards.end(), [&](const std::string& address) {
             return !names[i].empty() && models[address] == names[i];
         });
         if (card == cards.end()) {
-            open.push_back(&addresses[i]);
+            unassigned.push_back(&addresses[i]);
         } else {
-            Take(cards, card, addresses[i]);
+            Assign(cards, card, addresses[i]);
         }
     }
-    if (open.size() == cards.size()) {
-        for (std::string* address : open) {
-            Take(cards, cards.begin(), *address);
+    if (unassigned.size() == cards.size()) {
+        for (std::string* address : unassigned) {
+            Assign(cards, cards.begin(), *address);
         }
     }
     return addresses;

@@ -1,11 +1,11 @@
-// Only links are read here, which calls no driver. Where they come from: the nodes from
-// drm_sysfs_minor_alloc (drivers/gpu/drm/drm_sysfs.c), the framebuffers' parents from
-// sysfb_create_simplefb (drivers/firmware/sysfb_simplefb.c), virtio devices below PCI functions
-// from virtio_pci_probe (drivers/virtio/virtio_pci_common.c), all of Linux 6.12.
+// Only symbolic links are read, which calls no driver. The kernel (Linux 6.12) makes them in
+// drm_sysfs_minor_alloc (nodes, drivers/gpu/drm/drm_sysfs.c), sysfb_create_simplefb (parents of
+// framebuffers, drivers/firmware/sysfb_simplefb.c) and virtio_pci_probe (virtio devices below PCI
+// functions, drivers/virtio/virtio_pci_common.c).
 //
-// libdrm's drmGetDevices2 lists nodes too, but it can't be pointed at a replaced root, lists no
-// card without a node, and gives a framebuffer's platform device instead of the card below it. A
-// test holds the two to the same answer where a machine has nodes.
+// libdrm's drmGetDevices2 isn't used: it can't read a replaced root, lists no card without a node,
+// and returns a framebuffer's platform device instead of the card. A test compares the two on
+// machines that have nodes.
 #include "qgf/DrmNodes.h"
 
 #include <algorithm>
@@ -20,7 +20,7 @@ namespace {
 const char kDrmClass[] = "/sys/class/drm";
 const char kDevices[] = "/sys/devices/";
 
-// simpledrm and ofdrm, by the drivers' names.
+// The driver names of simpledrm and ofdrm.
 const char* const kFirmwareDrivers[] = {"simple-framebuffer", "of-display"};
 
 bool IsNumbered(const std::string& name, const std::string& prefix)
@@ -34,7 +34,7 @@ bool IsDrmNode(const std::string& name)
     return IsNumbered(name, "card") || IsNumbered(name, "renderD");
 }
 
-// The path below /sys/devices of a node's device; empty if the kernel knows no such node.
+// The path below /sys/devices of a node's device; empty if the kernel has no such node.
 std::string DeviceOfNode(const std::string& name)
 {
     const std::string link = ReadSystemLink(std::string(kDrmClass) + "/" + name);

@@ -32,10 +32,10 @@ std::string NvidiaField(const std::string& information, const std::string& key)
 
 std::string NvidiaModel(const std::string& pciAddress)
 {
-    // The driver powers a card up before it prints this file (rm_ref_dynamic_power in
-    // nv_procfs_read_gpu_info of its published kernel module), so a sleeping card isn't asked. The
-    // power state itself is the kernel's own variable:
-    // Documentation/ABI/testing/sysfs-devices-power.
+    // The driver powers the card up before it prints this file (rm_ref_dynamic_power in
+    // nv_procfs_read_gpu_info of its published kernel module), so the file of a suspended card
+    // isn't read. Reading the power state wakes nothing: the kernel prints a variable of its own
+    // (Documentation/ABI/testing/sysfs-devices-power).
     const std::string power =
         ReadSystemLine("/sys/bus/pci/devices/" + pciAddress + "/power/runtime_status");
     if (power == "suspended" || power == "suspending") {

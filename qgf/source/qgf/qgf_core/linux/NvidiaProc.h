@@ -1,4 +1,4 @@
-// What the NVIDIA driver tells of its cards under /proc/driver/nvidia/gpus.
+// The NVIDIA driver's entries under /proc/driver/nvidia/gpus.
 #pragma once
 
 #include <string>
@@ -6,15 +6,15 @@
 
 namespace QGF {
 
-// The value of a line "key: value" in the text of an "information" file, without the blanks around
-// it; empty if there is no such line.
+// Returns the value of a line "key: value" in the text of an "information" file, without leading
+// and trailing blanks; empty if there is no such line.
 std::string NvidiaField(const std::string& information, const std::string& key);
 
-// The driver's model text of the card at that address; empty if it isn't this driver's, has none,
-// or is suspended.
+// Returns the driver's model text of the card at that address; empty if the driver doesn't list the
+// card, has no text for it, or the card is suspended.
 std::string NvidiaModel(const std::string& pciAddress);
 
-// The addresses of the driver's cards in ascending order.
+// Returns the addresses of the driver's cards in ascending order.
 std::vector<std::string> NvidiaCards();
 
 } // namespace QGF

@@ -12,7 +12,7 @@ bool IsHexDigit(char c)
 
 bool IsPciAddress(const std::string& text)
 {
-    // Matched from the end, since only the domain's length varies.
+    // Match from the end, since only the domain's length varies (4 to 8 digits).
     static const char kTail[] = ":xx:xx.x";
     constexpr std::size_t kTailLength = sizeof kTail - 1;
     if (text.size() < kTailLength + 4 || text.size() > kTailLength + 8) {

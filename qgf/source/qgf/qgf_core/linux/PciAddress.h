@@ -1,4 +1,4 @@
-// PCI addresses as the kernel writes them: "0000:01:00.0", with a longer domain where it needs one.
+// PCI addresses as the kernel prints them: "0000:01:00.0"; the domain has up to 8 digits.
 #pragma once
 
 #include <string>

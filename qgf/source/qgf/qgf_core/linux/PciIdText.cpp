@@ -5,7 +5,7 @@
 namespace QGF {
 namespace {
 
-// "xxxx  name" at the start of a line: the name, or nothing if the id is another.
+// The name in a line "xxxx  name"; empty if the line's id isn't `id`.
 std::string_view NameOf(std::string_view line, const char (&id)[5])
 {
     if (line.substr(0, 4) != std::string_view(id, 4) || line.size() < 6 || line[4] != ' ') {
@@ -32,8 +32,8 @@ void WriteId(std::uint16_t id, char (&text)[5])
 
 } // namespace
 
-// A vendor's line starts at the margin, its devices' lines with one tab and their subsystems' with
-// two; the device classes at the end start with "C ".
+// In the database a vendor's line has no indent, a device's line one tab and a subsystem's line
+// two; the lines of the device classes, at the end, start with "C ".
 std::string FindPciName(const std::string& database, std::uint16_t vendor, std::uint16_t device)
 {
     char vendorId[5];

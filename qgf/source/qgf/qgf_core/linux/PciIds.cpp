@@ -1,9 +1,8 @@
-// Why two ways. libpciaccess is asked first: it knows where this system keeps its database. Looking
-// a name up in it needs no pci_system_init, so that the bus is never scanned and no configuration
-// space, whose reading would wake a suspended card, is touched. It is loaded at run time, because a
-// machine without it should lose names at most, not the program. But the place of its database is
-// compiled into it: it can't be pointed at a replaced root. So the database's text is also read
-// directly, which then serves where the library is missing as well.
+// libpciaccess is tried first, since it knows the path of the system's database. A look-up needs no
+// pci_system_init, so the bus isn't scanned and no configuration space is read, which would wake a
+// suspended card. The library is loaded at run time, so that the program runs without it. The
+// database is parsed here if the library is missing or has no name, and for a replaced root, since
+// the library's path can't be changed.
 #include "qgf/qgf_core/linux/PciIds.h"
 
 #include <memory>
@@ -16,7 +15,8 @@
 namespace QGF {
 namespace {
 
-constexpr std::size_t kDatabaseLimit = std::size_t{16} << 20; // bytes; ten times today's
+// Bytes; ten times the size of the database in 2024.
+constexpr std::size_t kMaxDatabaseSize = std::size_t{16} << 20;
 
 const char* const kDatabases[] = {"/usr/share/hwdata/pci.ids", "/usr/share/misc/pci.ids"};
 
@@ -26,7 +26,7 @@ GetStrings LoadGetStrings()
 {
     static const char* const kNames[] = {"libpciaccess.so.0", nullptr};
     try {
-        // Never closed: the library keeps the strings that it has given.
+        // Never closed: the library owns the strings that it returns.
         static const Core::DynamicLibrary* const gLibrary = Core::OpenLibrary(kNames).release();
         return reinterpret_cast<GetStrings>(gLibrary->getProc("pci_get_strings"));
     } catch (const LogicalException&) {
@@ -34,7 +34,7 @@ GetStrings LoadGetStrings()
     }
 }
 
-std::string AskLibrary(std::uint16_t vendor, std::uint16_t device)
+std::string LibraryName(std::uint16_t vendor, std::uint16_t device)
 {
     static const GetStrings gGetStrings = LoadGetStrings();
     if (!gGetStrings) {
@@ -59,7 +59,7 @@ std::string AskLibrary(std::uint16_t vendor, std::uint16_t device)
 std::string PciIds::name(std::uint16_t vendor, std::uint16_t device)
 {
     if (SystemRoot().empty()) {
-        std::string name = AskLibrary(vendor, device);
+        std::string name = LibraryName(vendor, device);
         if (!name.empty()) {
             return name;
         }
@@ -67,7 +67,7 @@ std::string PciIds::name(std::uint16_t vendor, std::uint16_t device)
     if (!fRead) {
         fRead = true;
         for (const char* path : kDatabases) {
-            if (ReadSystemFile(path, fDatabase, kDatabaseLimit)) {
+            if (ReadSystemFile(path, fDatabase, kMaxDatabaseSize)) {
                 break;
             }
         }

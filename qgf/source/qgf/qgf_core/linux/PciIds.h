@@ -6,14 +6,15 @@
 
 namespace QGF {
 
-// The names that the text of a database, as the file pci.ids holds it, has for a device: "vendor
-// device". Empty if it lacks either.
+// Looks a device's name up in a database, the text of a file pci.ids. Returns "vendor device", with
+// the two names; empty if the database lacks either.
 std::string FindPciName(const std::string& database, std::uint16_t vendor, std::uint16_t device);
 
-// Looks names up, with the libraries and files of this machine.
+// Looks names up in this machine's database.
 class PciIds {
 public:
-    // The name of a device, "vendor device"; empty if no database has it.
+    // Returns the names "vendor device"; empty if the database lacks either. The first call that
+    // needs the database's file reads it.
     std::string name(std::uint16_t vendor, std::uint16_t device);
 
 private:

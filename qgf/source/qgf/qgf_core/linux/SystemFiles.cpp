@@ -12,7 +12,7 @@
 namespace QGF {
 namespace {
 
-constexpr std::size_t kFolderLimit = 4096;
+constexpr std::size_t kMaxFolderEntries = 4096;
 
 class Descriptor {
 public:
@@ -31,11 +31,11 @@ private:
     int fFd;
 };
 
-bool ReadAll(int fd, std::string& text, std::size_t limit)
+bool ReadAll(int fd, std::string& text, std::size_t maxSize)
 {
     char block[4096];
-    while (text.size() < limit) {
-        const ssize_t count = read(fd, block, std::min(sizeof block, limit - text.size()));
+    while (text.size() < maxSize) {
+        const ssize_t count = read(fd, block, std::min(sizeof block, maxSize - text.size()));
         if (count < 0) {
             if (errno == EINTR) {
                 continue;
@@ -52,12 +52,12 @@ bool ReadAll(int fd, std::string& text, std::size_t limit)
 
 } // namespace
 
-bool ReadSystemFile(const std::string& path, std::string& text, std::size_t limit)
+bool ReadSystemFile(const std::string& path, std::string& text, std::size_t maxSize)
 {
     text.clear();
     const std::string full = SystemRoot() + path;
-    // Opening is already too much for a pipe, which waits for its other end, and for a device node,
-    // which may act on it; so the kind is asked first, and again of what was opened.
+    // Check the type before the open: opening a pipe would block, and opening a device node may
+    // have an effect. Check again after it, since the file may have been replaced.
     struct stat status {};
     if (stat(full.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
         return false;
@@ -66,7 +66,7 @@ bool ReadSystemFile(const std::string& path, std::string& text, std::size_t limi
     if (file.get() < 0 || fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode)) {
         return false;
     }
-    if (!ReadAll(file.get(), text, limit)) {
+    if (!ReadAll(file.get(), text, maxSize)) {
         text.clear();
         return false;
     }
@@ -94,8 +94,8 @@ std::vector<std::string> ListSystemFolder(const std::string& path)
     if (!folder) {
         return names;
     }
-    while (names.size() < kFolderLimit) {
-        // NOLINTNEXTLINE(concurrency-mt-unsafe): the stream is this call's own.
+    while (names.size() < kMaxFolderEntries) {
+        // NOLINTNEXTLINE(concurrency-mt-unsafe): the stream is local to this call.
         const dirent* const entry = readdir(folder.get());
         if (!entry) {
             break;

@@ -1,11 +1,12 @@
-// The lines of a device's "uevent" file.
+// Parses a device's "uevent" file.
 #pragma once
 
 #include <string>
 
 namespace QGF {
 
-// The value of the first line "key=value" in the text of such a file; empty if there is none.
+// Returns the value of the first line "key=value" in the text of such a file; empty if there is
+// none.
 std::string UeventValue(const std::string& uevent, const std::string& key);
 
 } // namespace QGF

@@ -2,7 +2,7 @@
 
 namespace QGF {
 
-// The system names its adapters itself, the same way to everyone who asks.
+// On Windows the system names the adapters, and every interface returns the same name.
 std::string AdapterName(const std::string& /*place*/)
 {
     return {};

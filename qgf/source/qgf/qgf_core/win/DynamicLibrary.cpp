@@ -33,8 +33,8 @@ std::unique_ptr<DynamicLibrary> OpenLibrary(const char* const* names)
 {
     std::string reasons;
     for (; *names != nullptr; ++names) {
-        // The system's folder alone, for the library and for what it needs: a file of that name in
-        // the program's folder, the current directory or on the PATH is never loaded.
+        // Search the system folder only, also for the library's dependencies: a file of that name
+        // in the program's folder, the current directory or on the PATH must not be loaded.
         if (const HMODULE handle = LoadLibraryExA(*names, nullptr, LOAD_LIBRARY_SEARCH_SYSTEM32))
             return std::make_unique<Module>(handle);
         const DWORD error = GetLastError();

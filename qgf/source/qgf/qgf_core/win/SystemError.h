@@ -1,4 +1,4 @@
-// What the operating system says of a failed call.
+// Texts of Windows errors.
 #pragma once
 
 #include <string>
@@ -6,11 +6,11 @@
 namespace QGF {
 namespace Core {
 
-// The system's text of a Windows error code and the code itself, in UTF-8: "Access is denied
-// (error 5)".
+// Returns the system's text of a Windows error code and the code, in UTF-8: "Access is denied
+// (error 5)"; "error N" if the system has no text.
 std::string SystemErrorText(unsigned long error);
 
-// A wide text of the system in UTF-8.
+// Converts a zero-terminated UTF-16 text to UTF-8.
 std::string ToUTF8(const wchar_t* text);
 
 } // namespace Core
