@@ -299,11 +299,11 @@ FAILING_CALLS = [
     ("at 1 clCreateContext on 1 error CL_OUT_OF_RESOURCES", "CLBandwidth",
      "QGF::LogicalException: clCreateContext failed: CL_OUT_OF_RESOURCES (-5)"),
     ("at 1 clCreateContext on 1 return 0", "CLBandwidth",
-     "QGF::LogicalException: clCreateContext: the driver gives no context"),
+     "QGF::LogicalException: clCreateContext: the driver returns no context"),
     ("at 1 clCreateCommandQueue on 1 error CL_OUT_OF_RESOURCES", "CLBandwidth",
      "QGF::LogicalException: clCreateCommandQueue failed: CL_OUT_OF_RESOURCES (-5)"),
     ("at 1 clCreateCommandQueue on 1 return 0", "CLBandwidth",
-     "QGF::LogicalException: clCreateCommandQueue: the driver gives no queue"),
+     "QGF::LogicalException: clCreateCommandQueue: the driver returns no queue"),
     ("at 1 clCreateBuffer on 1 error CL_MEM_OBJECT_ALLOCATION_FAILURE", "CLBandwidth",
      REQUIREMENT),
     ("at 2 clCreateBuffer on 1 error CL_MEM_OBJECT_ALLOCATION_FAILURE", "CLBandwidth",
@@ -370,13 +370,13 @@ BAD_ANSWERS = [
     # Not even the terminating zero byte.
     ("claim CL_DEVICE_VERSION 0", "CLDeviceVersion", NO_ROOM),
     ("bytes CL_DEVICE_GLOBAL_MEM_SIZE \"abc\"", "CLMemoryMB",
-     "QGF::LogicalException: clGetDeviceInfo(CL_DEVICE_GLOBAL_MEM_SIZE): the driver answers 3 "
-     "bytes where 8 are due"),
+     "QGF::LogicalException: clGetDeviceInfo(CL_DEVICE_GLOBAL_MEM_SIZE): the driver returns 3 "
+     "bytes instead of 8"),
     ("claim CL_DEVICE_VENDOR_ID 0x10000000000", "CLVendorID",
-     "QGF::LogicalException: clGetDeviceInfo(CL_DEVICE_VENDOR_ID): the driver answers "
-     "1099511627776 bytes where 4 are due"),
+     "QGF::LogicalException: clGetDeviceInfo(CL_DEVICE_VENDOR_ID): the driver returns "
+     "1099511627776 bytes instead of 4"),
     ("ulong CL_DEVICE_PLATFORM 0", "CLPlatformVersion",
-     "QGF::LogicalException: clGetDeviceInfo(CL_DEVICE_PLATFORM): the driver gives no platform"),
+     "QGF::LogicalException: clGetDeviceInfo(CL_DEVICE_PLATFORM): the driver returns no platform"),
 ]
 
 
@@ -434,7 +434,7 @@ def test_platform_that_fails_ends_the_run(one):
 
 def test_devices_beyond_reason_end_the_run(one):
     run = one.run(extra="claim-devices 0xFFFFFFFF\n")
-    assert run.errors == ["QGF::LogicalException: clGetDeviceIDs: the driver claims a list of "
+    assert run.errors == ["QGF::LogicalException: clGetDeviceIDs: the driver reports a list of "
                           "4294967295 entries"]
     assert run.status == 2
 

@@ -25,12 +25,12 @@ using QGF::OCL::Platform;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// More than any object may have.
-constexpr std::size_t kHalfOfAll = std::size_t{1} << 63U;
+// Bytes; larger than any object.
+constexpr std::size_t kHalfOfAddressSpace = std::size_t{1} << 63U;
 
 // The text of the LogicalException that `action` throws; empty if it throws none.
 template <typename Action>
-std::string RefusalOf(const Action& action)
+std::string FailureOf(const Action& action)
 {
     try {
         action();
@@ -89,29 +89,29 @@ TEST_F(OCLTest, ACountOfZeroPlatformsIsAnEmptyList)
     EXPECT_THAT(QGF::OCL::platforms(), IsEmpty());
 }
 
-TEST_F(OCLTest, AnotherFailureOfTheLoaderIsAFailure)
+TEST_F(OCLTest, OtherStatusOfTheLoaderThrows)
 {
     cl.platformsStatus = CL_OUT_OF_HOST_MEMORY;
-    EXPECT_EQ(RefusalOf([] { QGF::OCL::platforms(); }),
+    EXPECT_EQ(FailureOf([] { QGF::OCL::platforms(); }),
               "clGetPlatformIDs failed: CL_OUT_OF_HOST_MEMORY (-6)");
 }
 
-TEST_F(OCLTest, AFailureOfTheSecondPlatformCallIsAFailure)
+TEST_F(OCLTest, FailureOfTheSecondPlatformCallThrows)
 {
     cl.failing[1] = -1001;
-    EXPECT_EQ(RefusalOf([] { QGF::OCL::platforms(); }),
+    EXPECT_EQ(FailureOf([] { QGF::OCL::platforms(); }),
               "clGetPlatformIDs failed: CL_PLATFORM_NOT_FOUND_KHR (-1001)");
 }
 
-TEST_F(OCLTest, PlatformsBeyondReasonAreRefused)
+TEST_F(OCLTest, TooManyPlatformsThrow)
 {
     cl.claimedPlatforms = 4097;
-    EXPECT_EQ(RefusalOf([] { QGF::OCL::platforms(); }),
-              "clGetPlatformIDs: the driver claims a list of 4097 entries");
+    EXPECT_EQ(FailureOf([] { QGF::OCL::platforms(); }),
+              "clGetPlatformIDs: the driver reports a list of 4097 entries");
     EXPECT_THAT(cl.calls, ElementsAre("clGetPlatformIDs(0)"));
 }
 
-TEST_F(OCLTest, PlatformsThatAreClaimedButNotGivenAreLeftOut)
+TEST_F(OCLTest, PlatformsReportedButNotReturnedAreLeftOut)
 {
     cl.claimedPlatforms = 4096;
     EXPECT_EQ(QGF::OCL::platforms().size(), 2U);
@@ -132,23 +132,23 @@ TEST_F(OCLTest, DeviceNotFoundIsAnEmptyList)
     EXPECT_THAT(QGF::OCL::platforms()[1].devices(CL_DEVICE_TYPE_GPU), IsEmpty());
 }
 
-TEST_F(OCLTest, AnotherFailureOfAPlatformIsAFailure)
+TEST_F(OCLTest, OtherStatusOfAPlatformThrows)
 {
     cl.platforms[0].devicesStatus = CL_INVALID_PLATFORM;
-    EXPECT_EQ(RefusalOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
+    EXPECT_EQ(FailureOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
               "clGetDeviceIDs failed: CL_INVALID_PLATFORM (-32)");
 }
 
-TEST_F(OCLTest, AStatusWithoutANameIsToldByItsNumber)
+TEST_F(OCLTest, UnknownStatusIsReportedByItsNumber)
 {
     for (const cl_int status : {-9999, -20, -29, -73, -1000, -1002, 1, 5}) {
         cl.platforms[0].devicesStatus = status;
-        EXPECT_EQ(RefusalOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
+        EXPECT_EQ(FailureOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
                   "clGetDeviceIDs failed: unknown status (" + std::to_string(status) + ")");
     }
 }
 
-TEST_F(OCLTest, EveryOtherStatusIsToldByItsName)
+TEST_F(OCLTest, KnownStatusIsReportedByItsName)
 {
     const std::pair<cl_int, const char*> rows[] = {
         {-1, "CL_DEVICE_NOT_FOUND"},
@@ -216,26 +216,26 @@ TEST_F(OCLTest, EveryOtherStatusIsToldByItsName)
         {-1001, "CL_PLATFORM_NOT_FOUND_KHR"},
     };
     for (const auto& [status, name] : rows) {
-        if (status == CL_DEVICE_NOT_FOUND) // no failure of a list of devices
+        if (status == CL_DEVICE_NOT_FOUND) // an empty list, not a failure
             continue;
         cl.platforms[0].devicesStatus = status;
-        EXPECT_EQ(RefusalOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
+        EXPECT_EQ(FailureOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
                   std::string("clGetDeviceIDs failed: ") + name + " (" + std::to_string(status) +
                       ")");
     }
     answers()[CL_DEVICE_NAME].sizeStatus = CL_DEVICE_NOT_FOUND;
-    EXPECT_EQ(RefusalOf([&] { device.name(); }),
+    EXPECT_EQ(FailureOf([&] { device.name(); }),
               "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_DEVICE_NOT_FOUND (-1)");
 }
 
-TEST_F(OCLTest, DevicesBeyondReasonAreRefused)
+TEST_F(OCLTest, TooManyDevicesThrow)
 {
     cl.platforms[0].claimedDevices = 0xFFFFFFFFU;
-    EXPECT_EQ(RefusalOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
-              "clGetDeviceIDs: the driver claims a list of 4294967295 entries");
+    EXPECT_EQ(FailureOf([&] { platform.devices(CL_DEVICE_TYPE_GPU); }),
+              "clGetDeviceIDs: the driver reports a list of 4294967295 entries");
 }
 
-TEST_F(OCLTest, DevicesThatAreClaimedButNotGivenAreLeftOut)
+TEST_F(OCLTest, DevicesReportedButNotReturnedAreLeftOut)
 {
     cl.platforms[0].claimedDevices = 9;
     EXPECT_EQ(platform.devices(CL_DEVICE_TYPE_GPU).size(), 2U);
@@ -246,7 +246,7 @@ TEST_F(OCLTest, ANullDeviceIdFailsItsOwnQueriesOnly)
     cl.platforms[0].devices[0].id = 0;
     const std::vector<Device> found = platform.devices(CL_DEVICE_TYPE_GPU);
     ASSERT_EQ(found.size(), 2U);
-    EXPECT_EQ(RefusalOf([&] { (void)found[0].name(); }),
+    EXPECT_EQ(FailureOf([&] { (void)found[0].name(); }),
               "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_INVALID_DEVICE (-33)");
 }
 
@@ -255,9 +255,9 @@ TEST_F(OCLTest, PlatformVersionIsTheDriversText)
     EXPECT_EQ(platform.version(), "OpenCL 1.2 First");
 }
 
-TEST_F(OCLTest, PlatformVersionThatFailsIsAFailure)
+TEST_F(OCLTest, FailedPlatformVersionThrows)
 {
-    EXPECT_EQ(RefusalOf([] { (void)QGF::OCL::platforms()[1].version(); }),
+    EXPECT_EQ(FailureOf([] { (void)QGF::OCL::platforms()[1].version(); }),
               "clGetPlatformInfo(CL_PLATFORM_VERSION) failed: CL_INVALID_VALUE (-30)");
 }
 
@@ -277,7 +277,7 @@ TEST_F(OCLTest, ATextEndsAtItsFirstZeroByte)
     EXPECT_EQ(device.name(), "a");
 }
 
-TEST_F(OCLTest, AnUnterminatedTextEndsWhereTheDriverSays)
+TEST_F(OCLTest, AnUnterminatedTextHasTheReportedSize)
 {
     answers()[CL_DEVICE_NAME] = CLAnswer{"abc", {}, CL_SUCCESS, CL_SUCCESS};
     EXPECT_EQ(device.name(), "abc");
@@ -296,15 +296,15 @@ TEST_F(OCLTest, ALongTextIsReadWhole)
     EXPECT_EQ(device.name().size(), 3U * 1024 * 1024);
 }
 
-TEST_F(OCLTest, ATextThatEndsBeforeItsClaimIsNoLonger)
+TEST_F(OCLTest, ATextShorterThanItsReportedSizeEndsAtItsZeroByte)
 {
     answers()[CL_DEVICE_NAME] = CLAnswer{"abc", 1024 * 1024, CL_SUCCESS, CL_SUCCESS};
     EXPECT_EQ(device.name(), "abc");
 }
 
-TEST_F(OCLTest, ATextForWhichThereIsNoRoomIsTheAllocationsFailure)
+TEST_F(OCLTest, ATextTooLongToAllocateThrowsBadAlloc)
 {
-    for (const std::size_t claim : {kHalfOfAll, ~std::size_t{0}}) {
+    for (const std::size_t claim : {kHalfOfAddressSpace, ~std::size_t{0}}) {
         cl.calls.clear();
         answers()[CL_DEVICE_VENDOR] = CLAnswer{"x", claim, CL_SUCCESS, CL_SUCCESS};
         EXPECT_THROW((void)device.vendor(), std::bad_alloc) << claim;
@@ -312,14 +312,14 @@ TEST_F(OCLTest, ATextForWhichThereIsNoRoomIsTheAllocationsFailure)
     }
 }
 
-TEST_F(OCLTest, ATextThatFailsOnEitherCallIsAFailure)
+TEST_F(OCLTest, AFailureOfEitherCallForATextThrows)
 {
     answers()[CL_DEVICE_NAME].sizeStatus = CL_OUT_OF_RESOURCES;
-    EXPECT_EQ(RefusalOf([&] { (void)device.name(); }),
+    EXPECT_EQ(FailureOf([&] { (void)device.name(); }),
               "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_OUT_OF_RESOURCES (-5)");
     answers()[CL_DEVICE_NAME].sizeStatus = CL_SUCCESS;
     answers()[CL_DEVICE_NAME].valueStatus = CL_OUT_OF_RESOURCES;
-    EXPECT_EQ(RefusalOf([&] { (void)device.name(); }),
+    EXPECT_EQ(FailureOf([&] { (void)device.name(); }),
               "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_OUT_OF_RESOURCES (-5)");
 }
 
@@ -329,11 +329,11 @@ TEST_F(OCLTest, ADeviceKnowsItsPlatform)
     EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceInfo(device 101, 4145, 8)"));
 }
 
-TEST_F(OCLTest, ANullPlatformOfADeviceIsRefused)
+TEST_F(OCLTest, ANullPlatformOfADeviceThrows)
 {
     answers()[CL_DEVICE_PLATFORM] = CLValue(std::uintptr_t{0});
-    EXPECT_EQ(RefusalOf([&] { (void)device.platform(); }),
-              "clGetDeviceInfo(CL_DEVICE_PLATFORM): the driver gives no platform");
+    EXPECT_EQ(FailureOf([&] { (void)device.platform(); }),
+              "clGetDeviceInfo(CL_DEVICE_PLATFORM): the driver returns no platform");
 }
 
 TEST_F(OCLTest, PropertyTypesHaveTheNamesOfTheirCTypes)
@@ -343,7 +343,7 @@ TEST_F(OCLTest, PropertyTypesHaveTheNamesOfTheirCTypes)
     EXPECT_STREQ(QGF::OCL::Enum::GetPropertyTypeName(static_cast<DeviceProperty>(0x1000)), "");
 }
 
-TEST_F(OCLTest, TypedReadGivesTheValue)
+TEST_F(OCLTest, TypedReadReturnsTheValue)
 {
     EXPECT_EQ(device.getInfo<cl_uint>(DeviceProperty::VendorID), 0x10DEU);
     EXPECT_EQ(device.getInfo<cl_ulong>(DeviceProperty::GlobalMemSize), 3221225472U);
@@ -351,7 +351,7 @@ TEST_F(OCLTest, TypedReadGivesTheValue)
                                       "clGetDeviceInfo(device 101, 4127, 8)"));
 }
 
-TEST_F(OCLTest, TypedReadOfAnotherTypeIsAMistakeOfTheCaller)
+TEST_F(OCLTest, TypedReadOfAnotherTypeThrowsInternalException)
 {
     try {
         (void)device.getInfo<cl_ulong>(DeviceProperty::VendorID);
@@ -364,14 +364,14 @@ TEST_F(OCLTest, TypedReadOfAnotherTypeIsAMistakeOfTheCaller)
     EXPECT_THAT(cl.calls, IsEmpty());
 }
 
-TEST_F(OCLTest, AValueOfAnotherSizeIsRefused)
+TEST_F(OCLTest, AValueOfAnotherSizeThrows)
 {
     answers()[CL_DEVICE_VENDOR_ID] = CLValue(cl_ulong{1});
-    EXPECT_EQ(RefusalOf([&] { (void)device.getInfo<cl_uint>(DeviceProperty::VendorID); }),
-              "clGetDeviceInfo(CL_DEVICE_VENDOR_ID): the driver answers 8 bytes where 4 are due");
+    EXPECT_EQ(FailureOf([&] { (void)device.getInfo<cl_uint>(DeviceProperty::VendorID); }),
+              "clGetDeviceInfo(CL_DEVICE_VENDOR_ID): the driver returns 8 bytes instead of 4");
 }
 
-TEST_F(OCLTest, GetInfoImplTellsTheSizeItGot)
+TEST_F(OCLTest, GetInfoImplReturnsTheActualSize)
 {
     cl_uint vendor = 0;
     std::size_t actual = 0;
@@ -380,14 +380,14 @@ TEST_F(OCLTest, GetInfoImplTellsTheSizeItGot)
     EXPECT_EQ(vendor, 0x10DEU);
 }
 
-TEST_F(OCLTest, AFailingValueIsAFailure)
+TEST_F(OCLTest, AFailedValueThrows)
 {
     answers()[CL_DEVICE_GLOBAL_MEM_SIZE].valueStatus = CL_INVALID_DEVICE;
-    EXPECT_EQ(RefusalOf([&] { (void)device.getInfo<cl_ulong>(DeviceProperty::GlobalMemSize); }),
+    EXPECT_EQ(FailureOf([&] { (void)device.getInfo<cl_ulong>(DeviceProperty::GlobalMemSize); }),
               "clGetDeviceInfo(CL_DEVICE_GLOBAL_MEM_SIZE) failed: CL_INVALID_DEVICE (-33)");
 }
 
-TEST_F(OCLTest, ContextAndQueueReleaseThemselvesInReverseOrder)
+TEST_F(OCLTest, ContextAndQueueAreReleasedInReverseOrder)
 {
     {
         const QGF::OCL::ContextProperties properties(platform);
@@ -400,19 +400,19 @@ TEST_F(OCLTest, ContextAndQueueReleaseThemselvesInReverseOrder)
                             "clReleaseCommandQueue(queue 1)", "clReleaseContext(context 1)"));
 }
 
-TEST_F(OCLTest, AContextThatCantBeMadeIsAFailureAndReleasesNothing)
+TEST_F(OCLTest, AFailedContextThrowsAndReleasesNothing)
 {
     cl.failing[0] = CL_DEVICE_NOT_AVAILABLE;
     const QGF::OCL::ContextProperties properties(platform);
-    EXPECT_EQ(RefusalOf([&] { const QGF::OCL::Context context(properties, device, {}); }),
+    EXPECT_EQ(FailureOf([&] { const QGF::OCL::Context context(properties, device, {}); }),
               "clCreateContext failed: CL_DEVICE_NOT_AVAILABLE (-2)");
     EXPECT_EQ(cl.calls.size(), 1U);
 }
 
-TEST_F(OCLTest, AQueueThatCantBeMadeIsAFailureAndReleasesTheContext)
+TEST_F(OCLTest, AFailedQueueThrowsAndReleasesTheContext)
 {
     cl.failing[1] = CL_INVALID_QUEUE_PROPERTIES;
-    EXPECT_EQ(RefusalOf([&] {
+    EXPECT_EQ(FailureOf([&] {
                   const QGF::OCL::ContextProperties properties(platform);
                   const QGF::OCL::Context context(properties, device, {});
                   const QGF::OCL::CommandQueue queue(context, device, true, false);
@@ -423,7 +423,7 @@ TEST_F(OCLTest, AQueueThatCantBeMadeIsAFailureAndReleasesTheContext)
                                       "clReleaseContext(context 1)"));
 }
 
-TEST_F(OCLTest, AnExceptionOutOfAReleaseIsSwallowed)
+TEST_F(OCLTest, AnExceptionOfAReleaseIsIgnored)
 {
     cl.throwing = {"clReleaseCommandQueue", "clReleaseContext", "clReleaseEvent",
                    "clReleaseMemObject"};
@@ -442,26 +442,26 @@ TEST_F(OCLTest, AnExceptionOutOfAReleaseIsSwallowed)
 }
 
 // A library that has every entry point but one.
-struct ShortLibrary {
+struct IncompleteLibrary {
     std::string missing;
-    std::set<std::string> asked;
+    std::set<std::string> requested;
 };
 
 void Nothing() {}
 
-QGF::Core::Proc GetShortProc(void* context, const char* name)
+QGF::Core::Proc GetIncompleteProc(void* context, const char* name)
 {
-    ShortLibrary& library = *static_cast<ShortLibrary*>(context);
-    library.asked.insert(name);
+    IncompleteLibrary& library = *static_cast<IncompleteLibrary*>(context);
+    library.requested.insert(name);
     return library.missing == name ? nullptr : Nothing;
 }
 
-TEST(OCLFunctionTableTest, IsCompleteWithEveryEntryPointOfTheFirstHeader)
+TEST(OCLFunctionTableTest, IsCompleteWithAllEntryPoints)
 {
-    ShortLibrary library;
+    IncompleteLibrary library;
     QGF::OCL::FunctionTable table{};
-    EXPECT_TRUE(QGF::OCL::FillFunctionTable(table, GetShortProc, &library));
-    EXPECT_EQ(library.asked.size(), sizeof table / sizeof(QGF::Core::Proc));
+    EXPECT_TRUE(QGF::OCL::FillFunctionTable(table, GetIncompleteProc, &library));
+    EXPECT_EQ(library.requested.size(), sizeof table / sizeof(QGF::Core::Proc));
 }
 
 QGF::Core::Proc GetNumberedProc(void* context, const char*)
@@ -469,14 +469,14 @@ QGF::Core::Proc GetNumberedProc(void* context, const char*)
     return reinterpret_cast<QGF::Core::Proc>(++*static_cast<std::uintptr_t*>(context));
 }
 
-TEST(OCLFunctionTableTest, AsksForItsMembersInTheirOrder)
+TEST(OCLFunctionTableTest, RequestsItsMembersInTheirOrder)
 {
-    std::uintptr_t asked = 0;
+    std::uintptr_t requested = 0;
     QGF::OCL::FunctionTable table{};
-    QGF::OCL::FillFunctionTable(table, GetNumberedProc, &asked);
+    QGF::OCL::FillFunctionTable(table, GetNumberedProc, &requested);
     std::vector<std::uintptr_t> members(sizeof table / sizeof(std::uintptr_t));
     std::memcpy(members.data(), &table, sizeof table);
-    std::vector<std::uintptr_t> inOrder(asked);
+    std::vector<std::uintptr_t> inOrder(requested);
     std::iota(inOrder.begin(), inOrder.end(), 1);
     EXPECT_EQ(members, inOrder);
 }
@@ -492,14 +492,14 @@ const std::set<std::string> kCalled = {
     "clSetKernelArg",      "clWaitForEvents",
 };
 
-TEST(OCLFunctionTableTest, IsIncompleteWithoutAnyOneThatIsCalled)
+TEST(OCLFunctionTableTest, IsIncompleteWithoutAnyCalledEntryPoint)
 {
-    ShortLibrary all;
+    IncompleteLibrary all;
     QGF::OCL::FunctionTable table{};
-    QGF::OCL::FillFunctionTable(table, GetShortProc, &all);
-    for (const std::string& name : all.asked) {
-        ShortLibrary library{name, {}};
-        EXPECT_EQ(QGF::OCL::FillFunctionTable(table, GetShortProc, &library),
+    QGF::OCL::FillFunctionTable(table, GetIncompleteProc, &all);
+    for (const std::string& name : all.requested) {
+        IncompleteLibrary library{name, {}};
+        EXPECT_EQ(QGF::OCL::FillFunctionTable(table, GetIncompleteProc, &library),
                   kCalled.count(name) == 0)
             << name;
     }
@@ -507,15 +507,15 @@ TEST(OCLFunctionTableTest, IsIncompleteWithoutAnyOneThatIsCalled)
 
 TEST(OCLFunctionTableTest, FillsTheOthersWhenOneIsMissing)
 {
-    ShortLibrary library{"clGetPlatformIDs", {}};
+    IncompleteLibrary library{"clGetPlatformIDs", {}};
     QGF::OCL::FunctionTable table{};
-    QGF::OCL::FillFunctionTable(table, GetShortProc, &library);
+    QGF::OCL::FillFunctionTable(table, GetIncompleteProc, &library);
     EXPECT_EQ(table.clGetPlatformIDs, nullptr);
     EXPECT_NE(table.clFinish, nullptr);
     EXPECT_NE(table.clGetExtensionFunctionAddress.address, nullptr);
 }
 
-TEST(OCLLibraryTest, AFileThatIsNoLibraryIsNotAvailable)
+TEST(OCLLibraryTest, AMissingFileIsNotAvailable)
 {
     EXPECT_FALSE(QGF::OCL::Library::IsOpenCLAvailable("no-such-library-anywhere"));
 }

@@ -72,7 +72,7 @@ TEST_F(OpenGLObjects, ProgramCompilesAttachesAndLinks)
     EXPECT_EQ(device().objects, 0);
 }
 
-TEST_F(OpenGLObjects, GivenLengthsAreUsed)
+TEST_F(OpenGLObjects, LengthsAreUsed)
 {
     const std::int32_t lengths[] = {2, 0, -1};
     Program program;
@@ -80,7 +80,7 @@ TEST_F(OpenGLObjects, GivenLengthsAreUsed)
     EXPECT_THAT(device().shaderSource, ElementsAre("on", "", "two "));
 }
 
-TEST_F(OpenGLObjects, VertexShaderFailureGivesTheLog)
+TEST_F(OpenGLObjects, VertexShaderFailureHasTheLog)
 {
     device().vertexCompiles = false;
     device().log = "0:1: error\n0:2: error\n";
@@ -89,7 +89,7 @@ TEST_F(OpenGLObjects, VertexShaderFailureGivesTheLog)
     EXPECT_EQ(device().objects, 0);
 }
 
-TEST_F(OpenGLObjects, FragmentShaderFailureGivesTheLog)
+TEST_F(OpenGLObjects, FragmentShaderFailureHasTheLog)
 {
     device().fragmentCompiles = false;
     EXPECT_EQ(compileFailure(), "The fragment shader doesn't compile: fake log");
@@ -97,7 +97,7 @@ TEST_F(OpenGLObjects, FragmentShaderFailureGivesTheLog)
     EXPECT_THAT(gl.callsOf("glAttachShader"), SizeIs(0));
 }
 
-TEST_F(OpenGLObjects, LinkFailureGivesTheLog)
+TEST_F(OpenGLObjects, LinkFailureHasTheLog)
 {
     device().links = false;
     EXPECT_EQ(FailureOf([] {
@@ -110,7 +110,7 @@ TEST_F(OpenGLObjects, LinkFailureGivesTheLog)
     EXPECT_EQ(device().objects, 0);
 }
 
-TEST_F(OpenGLObjects, IncompleteProgramIsRefusedBeforeTheDriverIsAsked)
+TEST_F(OpenGLObjects, IncompleteProgramThrowsWithoutADriverCall)
 {
     EXPECT_EQ(FailureOf([] { Program().link(true); }), "The program has no vertex shader to link");
     EXPECT_EQ(FailureOf([] {
@@ -124,10 +124,10 @@ TEST_F(OpenGLObjects, IncompleteProgramIsRefusedBeforeTheDriverIsAsked)
     EXPECT_THAT(gl.callsOf("glLinkProgram"), SizeIs(1));
 }
 
-TEST_F(OpenGLObjects, EmptyOrSenselessLogIsSaidToBeNone)
+TEST_F(OpenGLObjects, EmptyOrInvalidLogIsReportedAsNone)
 {
     device().fragmentCompiles = false;
-    const std::string none = "The fragment shader doesn't compile: the driver gives no log";
+    const std::string none = "The fragment shader doesn't compile: the driver returns no log";
     for (const std::int32_t length : {0, 1, -1, -2147483647}) {
         device().logLength = length;
         EXPECT_EQ(compileFailure(), none) << length;
@@ -141,7 +141,7 @@ TEST_F(OpenGLObjects, EmptyOrSenselessLogIsSaidToBeNone)
     EXPECT_EQ(compileFailure(), none);
 }
 
-TEST_F(OpenGLObjects, HugeLogIsBounded)
+TEST_F(OpenGLObjects, HugeLogIsTruncated)
 {
     device().fragmentCompiles = false;
     device().logLength = 2147483647;
@@ -154,21 +154,21 @@ TEST_F(OpenGLObjects, HugeLogIsBounded)
     EXPECT_GT(compileFailure().size(), 65000U);
 }
 
-TEST_F(OpenGLObjects, ObjectsThatAreNotMadeAreFailures)
+TEST_F(OpenGLObjects, ObjectsThatAreNotCreatedThrow)
 {
     Program program;
     Texture2D texture(InternalFormat::RGBA8, 1, 1, false, nullptr, Type::Default);
     device().makesObjects = false;
-    EXPECT_EQ(FailureOf([] { Program(); }), "glCreateProgram made no program");
+    EXPECT_EQ(FailureOf([] { Program(); }), "glCreateProgram returned no program");
     EXPECT_EQ(FailureOf([&] { program.loadVertexShader(3, kSource, nullptr); }),
-              "glCreateShader made no vertex shader");
+              "glCreateShader returned no vertex shader");
     EXPECT_EQ(
         FailureOf([] { Texture2D(InternalFormat::RGBA8, 1, 1, false, nullptr, Type::Default); }),
-        "glGenTextures made no texture");
-    EXPECT_EQ(FailureOf([] { Framebuffer(); }), "glGenFramebuffers made no framebuffer");
+        "glGenTextures returned no texture");
+    EXPECT_EQ(FailureOf([] { Framebuffer(); }), "glGenFramebuffers returned no framebuffer");
 }
 
-TEST_F(OpenGLObjects, TextureIsMadeOfOneLevel)
+TEST_F(OpenGLObjects, TextureHasOneLevel)
 {
     {
         const Texture2D texture(InternalFormat::RGBA8, 32, 16, false, nullptr, Type::Default);
@@ -187,22 +187,22 @@ TEST_F(OpenGLObjects, MipmapsAreGeneratedOnDemand)
     EXPECT_THAT(gl.callsOf("glTexParameteri"), ElementsAre("glTexParameteri(0xDE1,0x2801,0x2703)"));
 }
 
-TEST_F(OpenGLObjects, UnknownTextureRequestsAreRefused)
+TEST_F(OpenGLObjects, InvalidTextureArgumentsThrow)
 {
     EXPECT_EQ(FailureOf([] {
                   Texture2D(static_cast<InternalFormat>(35), 1, 1, false, nullptr, Type::Default);
               }),
-              "Texture format 35 is not known");
+              "Unknown texture format 35");
     EXPECT_EQ(FailureOf([] {
                   Texture2D(InternalFormat::RGBA8, 1, 1, false, nullptr, static_cast<Type>(0));
               }),
-              "Texture data type 0 is not known");
+              "Unknown texture data type 0");
     EXPECT_EQ(
         FailureOf([] { Texture2D(InternalFormat::RGBA8, 0, 4, false, nullptr, Type::Default); }),
-        "A texture can't be 0 x 4 texels large");
+        "Bad texture size 0 x 4");
     EXPECT_EQ(
         FailureOf([] { Texture2D(InternalFormat::RGBA8, 4, -1, false, nullptr, Type::Default); }),
-        "A texture can't be 4 x -1 texels large");
+        "Bad texture size 4 x -1");
     EXPECT_EQ(device().objects, 0);
 }
 
@@ -249,7 +249,7 @@ TEST_F(OpenGLObjects, IncompleteFramebufferIsNamed)
               "The framebuffer is not complete: 0x0000");
 }
 
-TEST_F(OpenGLObjects, TextureThatTheDriverRefusesIsToldByTheFramebuffer)
+TEST_F(OpenGLObjects, ErrorOfATextureIsReportedByTheFramebuffer)
 {
     device().onCall["glTexImage2D"] = [this] {
         device().errors = {0x505};
@@ -266,7 +266,7 @@ TEST_F(OpenGLObjects, TextureThatTheDriverRefusesIsToldByTheFramebuffer)
     EXPECT_THAT(device().errors, SizeIs(0));
 }
 
-TEST_F(OpenGLObjects, SenselessAttachmentsAreRefused)
+TEST_F(OpenGLObjects, InvalidAttachmentsThrow)
 {
     const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);
     Framebuffer framebuffer;
@@ -292,7 +292,7 @@ TEST_F(OpenGLObjects, DestructorsNeverThrow)
     });
 }
 
-TEST(OpenGLObjectsWithoutContext, CannotBeMade)
+TEST(OpenGLObjectsWithoutContext, CannotBeCreated)
 {
     EXPECT_EQ(FailureOf([] { Program(); }), "No OpenGL context is current on this thread");
     EXPECT_EQ(FailureOf([] { Framebuffer(); }), "No OpenGL context is current on this thread");

@@ -409,7 +409,7 @@ public:
                 device.onCreate();
             return std::make_unique<FakeContext>(fFake, device);
         }
-        throw QGF::LogicalException("There is no display device \"" + key.deviceName() + "\"");
+        throw QGF::LogicalException("Unknown display device \"" + key.deviceName() + "\"");
     }
 
 private:

@@ -5,7 +5,7 @@ namespace OCL {
 
 namespace {
 
-// Each returns whether the entry point is there or isn't needed.
+// Both return false if a required entry point is missing.
 template <typename Function>
 bool Fill(Function& member, Core::Proc proc)
 {

@@ -23,18 +23,18 @@ LoadedLibrary Load(const char* const* names)
 {
     LoadedLibrary loaded{Core::OpenLibrary(names), {}};
     if (!FillFunctionTable(loaded.table, GetProcOf, loaded.loader.get()))
-        throw LogicalException("The OpenCL library lacks entry points that are needed");
+        throw LogicalException("The OpenCL library lacks required entry points");
     return loaded;
 }
 
-// Never closed: a driver may have threads of its own that outlive every object of ours.
-const LoadedLibrary& LoadForGood()
+// Never closed: threads of a driver may outlive all objects of this library.
+const LoadedLibrary& GetLoadedLibrary()
 {
     static const LoadedLibrary* const loaded = new LoadedLibrary(Load(kLibraryNames));
     return *loaded;
 }
 
-// What stands in for the library's own table.
+// Set by ReplaceTable.
 std::optional<FunctionTable>& Replacement()
 {
     static std::optional<FunctionTable> replacement;
@@ -47,7 +47,7 @@ bool Library::IsOpenCLAvailable(const std::string& path)
 {
     try {
         if (path.empty()) {
-            LoadForGood();
+            GetLoadedLibrary();
         } else {
             const char* const names[] = {path.c_str(), nullptr};
             Load(names);
@@ -66,7 +66,7 @@ void Library::Initialize()
 ExtensionManager& ExtensionManager::instance()
 {
     static ExtensionManager manager;
-    manager.fTable = Replacement() ? *Replacement() : LoadForGood().table;
+    manager.fTable = Replacement() ? *Replacement() : GetLoadedLibrary().table;
     return manager;
 }
 

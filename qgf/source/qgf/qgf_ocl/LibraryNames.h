@@ -1,10 +1,10 @@
-// Where an OpenCL loader library is to be found when nobody names one.
+// The platform's default names of the OpenCL loader library.
 #pragma once
 
 namespace QGF {
 namespace OCL {
 
-// File names in the order of trying; ends with a null pointer.
+// File names in the order in which they are tried; the last entry is null.
 extern const char* const kLibraryNames[];
 
 } // namespace OCL

@@ -6,7 +6,7 @@ namespace OCL {
 
 namespace {
 
-// The installable-driver loader's own code for "no platform", from CL/cl_ext.h.
+// CL_PLATFORM_NOT_FOUND_KHR of CL/cl_ext.h: the installable-driver loader found no platform.
 constexpr cl_int kPlatformNotFound = -1001;
 
 } // namespace

@@ -93,7 +93,7 @@ ScopedContextWrapper::~ScopedContextWrapper()
             previous->makeCurrent();
             return;
         } catch (...) {
-            // Rather no context than the wrong one.
+            // Leave no context current instead of a wrong one.
         }
     }
     Context::ReleaseCurrent();

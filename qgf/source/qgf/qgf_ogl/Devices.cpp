@@ -13,9 +13,9 @@ struct State {
     bool devicesKnown = false;
 };
 
-// Never destroyed: drivers tear themselves down at process exit in an order of their own, and
-// nothing may call into them after that.
-State& TheState()
+// Never destroyed: at process exit drivers shut down in an unknown order, and must not be called
+// afterwards.
+State& GetState()
 {
     static auto* const state = new State;
     return *state;
@@ -25,7 +25,7 @@ State& TheState()
 
 Platform& CurrentPlatform()
 {
-    State& state = TheState();
+    State& state = GetState();
     if (!state.platform)
         state.platform = MakeNativePlatform();
     return *state.platform;
@@ -33,7 +33,7 @@ Platform& CurrentPlatform()
 
 const std::vector<DisplayDeviceKey>& DisplayDevices()
 {
-    State& state = TheState();
+    State& state = GetState();
     if (!state.devicesKnown) {
         state.devices = CurrentPlatform().displayDevices();
         state.devicesKnown = true;
@@ -43,7 +43,7 @@ const std::vector<DisplayDeviceKey>& DisplayDevices()
 
 void ReplacePlatform(std::unique_ptr<Platform> platform)
 {
-    State& state = TheState();
+    State& state = GetState();
     state.devices.clear();
     state.devicesKnown = false;
     state.platform = std::move(platform);

@@ -1,4 +1,4 @@
-// The platform binding of the process and the display devices that it knows.
+// The current platform and its display devices.
 #pragma once
 
 #include <vector>
@@ -8,10 +8,12 @@
 namespace QGF {
 namespace OGL {
 
-// The replaced platform, else the native one, made at the first call. Throws if there is none.
+// Returns the platform set by ReplacePlatform, else the native one, which the first call makes.
+// Throws LogicalException if there is none.
 Platform& CurrentPlatform();
 
-// Asked of the platform once; again only after a failure. Throws what the platform throws.
+// Returns the platform's display devices. The list is cached after the first success. Throws what
+// the platform throws.
 const std::vector<DisplayDeviceKey>& DisplayDevices();
 
 } // namespace OGL

@@ -12,12 +12,12 @@ namespace {
 
 constexpr char kSourceFile[] = "qgf/source/qgf/qgf_ogl/ExtensionManager";
 
-// No driver has a tenth of that; an answer beyond is no count of extensions.
+// No driver has a tenth as many. A larger number isn't a count of extensions.
 constexpr std::int32_t kMaxExtensions = 65536;
 
 constexpr int kMaxVersionNumber = 9999;
 
-// Where a feature comes from: a core version (0.0 for none), or any of the extensions.
+// A feature is supported from a core version on (0.0 for none), or if any of the extensions is.
 struct Source {
     OpenGLExtension extension;
     int major;
@@ -39,17 +39,17 @@ constexpr Source kSources[] = {
     {GL_VERSION_3_3, 3, 3, {}},
     {GL_VERSION_4_0, 4, 0, {}},
     {GL_VERSION_4_1, 4, 1, {}},
-    // Assembly programs never became core.
+    // Assembly programs are in no core version.
     {GL_ARB_FRAGMENT_PROGRAM, 0, 0, {"GL_ARB_fragment_program"}},
     {GL_ARB_FRAGMENT_SHADER, 2, 0, {"GL_ARB_fragment_shader"}},
     {GL_ARB_OCCLUSION_QUERY, 1, 5, {"GL_ARB_occlusion_query"}},
-    // GLSL 1.30 has the same functions under other names only.
+    // GLSL 1.30 has these functions under other names.
     {GL_ARB_SHADER_TEXTURE_LOD, 0, 0, {"GL_ARB_shader_texture_lod"}},
-    // Version 3.0 took over the RGB and RGBA formats, but not luminance, alpha and intensity; the
-    // older extension has all of them, with the same numbers.
+    // Core 3.0 has the RGB and RGBA formats but not luminance, alpha and intensity. The ATI
+    // extension has all of them, with the same values.
     {GL_ARB_TEXTURE_FLOAT, 0, 0, {"GL_ARB_texture_float", "GL_ATI_texture_float"}},
     {GL_ARB_TEXTURE_NON_POWER_OF_TWO, 2, 0, {"GL_ARB_texture_non_power_of_two"}},
-    // Three names for one target with one set of numbers; core since 3.1.
+    // The three extensions have the same target and the same values. Core since 3.1.
     {GL_ARB_TEXTURE_RECTANGLE,
      3,
      1,
@@ -57,7 +57,7 @@ constexpr Source kSources[] = {
     {GL_ARB_VERTEX_BUFFER_OBJECT, 1, 5, {"GL_ARB_vertex_buffer_object"}},
     {GL_ARB_VERTEX_PROGRAM, 0, 0, {"GL_ARB_vertex_program"}},
     {GL_ARB_VERTEX_SHADER, 2, 0, {"GL_ARB_vertex_shader"}},
-    // Version 3.0 and its ARB extension are supersets of this one.
+    // Core 3.0 and the ARB extension are supersets of the EXT extension.
     {GL_EXT_FRAMEBUFFER_OBJECT, 3, 0, {"GL_EXT_framebuffer_object", "GL_ARB_framebuffer_object"}},
 };
 
@@ -74,8 +74,8 @@ int ParseNumber(const char*& text)
     return number;
 }
 
-// "MAJOR.MINOR" and whatever follows. OpenGL ES begins with letters and so stays 0.0: it is none
-// of the versions asked for.
+// Parses "MAJOR.MINOR"; what follows is ignored. The text of OpenGL ES begins with letters, which
+// leaves 0.0.
 void ParseVersion(const char* text, int& major, int& minor)
 {
     const int first = ParseNumber(text);
@@ -86,7 +86,7 @@ void ParseVersion(const char* text, int& major, int& minor)
     minor = ParseNumber(text);
 }
 
-// False if the driver didn't give its names one by one.
+// Reads the names one by one, as OpenGL 3.0 and later offer them. Returns false on failure.
 bool ReadIndexedNames(const OpenGLInterceptor& gl, std::vector<std::string>& names)
 {
     std::int32_t count = -1;
@@ -103,6 +103,7 @@ bool ReadIndexedNames(const OpenGLInterceptor& gl, std::vector<std::string>& nam
     return true;
 }
 
+// Reads the names from one text, separated by blanks. Returns false on failure.
 bool ReadNameList(const OpenGLInterceptor& gl, std::vector<std::string>& names)
 {
     const std::uint8_t* const list = gl.glGetString(kSourceFile, __LINE__, kGLExtensions);
@@ -119,9 +120,9 @@ bool ReadNameList(const OpenGLInterceptor& gl, std::vector<std::string>& names)
     }
 }
 
-// Only after a question that a working driver answers: whoever asks for the next error must not be
-// told of this one. Bounded, since a driver that fails may do so for ever.
-void DropErrors(const OpenGLInterceptor& gl)
+// Removes the errors of a failed query from OpenGL's queue, so that the caller's next glGetError
+// doesn't return them. The number is limited, since a broken driver may return errors forever.
+void ClearErrors(const OpenGLInterceptor& gl)
 {
     constexpr int kMaxErrors = 16;
     for (int i = 0; i < kMaxErrors && gl.glGetError(kSourceFile, __LINE__) != kGLNoError; ++i) {
@@ -139,17 +140,17 @@ ExtensionManager* ExtensionManager::Instance()
 ExtensionManager::ExtensionManager(const OpenGLInterceptor& gl)
 {
     const std::uint8_t* const version = gl.glGetString(kSourceFile, __LINE__, kGLVersion);
-    bool answered = version != nullptr;
-    if (answered)
+    bool ok = version != nullptr;
+    if (ok)
         ParseVersion(AsText(version), fMajor, fMinor);
-    // Each question is one that this version allows, so that none of them raises an error.
+    // Make only queries that this version allows, so that a working driver raises no error.
     const bool indexed = fMajor >= 3 && ReadIndexedNames(gl, fNames);
     if (!indexed) {
-        answered = answered && fMajor < 3;
-        answered = ReadNameList(gl, fNames) && answered;
+        ok = ok && fMajor < 3;
+        ok = ReadNameList(gl, fNames) && ok;
     }
-    if (!answered)
-        DropErrors(gl);
+    if (!ok)
+        ClearErrors(gl);
     std::sort(fNames.begin(), fNames.end());
 }
 

@@ -13,7 +13,7 @@ namespace {
 
 constexpr char kSourceFile[] = "qgf/source/qgf/qgf_ogl/Framebuffer";
 
-// OpenGL has numbers for that many.
+// OpenGL defines GL_COLOR_ATTACHMENT0 to GL_COLOR_ATTACHMENT31.
 constexpr std::uint32_t kMaxColorAttachments = 32;
 
 struct StatusName {
@@ -48,9 +48,8 @@ std::string StatusText(std::uint32_t status)
     return row != std::end(kStatusNames) ? row->name : HexText(status);
 }
 
-// Most often the texture's own: making it asks for no error, since whoever works with it does so
-// once, at the end. Here there is no such end, and the error must not be left for the next
-// question.
+// Reads one error from OpenGL's queue, so that the caller's next glGetError doesn't return it. Most
+// often the texture raised it: Texture2D doesn't call glGetError.
 std::string ErrorText(const OpenGLInterceptor& gl)
 {
     const std::uint32_t error = gl.glGetError(kSourceFile, __LINE__);
@@ -63,7 +62,7 @@ Framebuffer::Framebuffer()
 {
     OpenGLInterceptor::Instance().glGenFramebuffers(kSourceFile, __LINE__, 1, &fFramebuffer);
     if (fFramebuffer == 0)
-        throw LogicalException("glGenFramebuffers made no framebuffer");
+        throw LogicalException("glGenFramebuffers returned no framebuffer");
 }
 
 Framebuffer::~Framebuffer()
@@ -71,7 +70,7 @@ Framebuffer::~Framebuffer()
     try {
         OpenGLInterceptor::Instance().glDeleteFramebuffers(kSourceFile, __LINE__, 1, &fFramebuffer);
     } catch (...) {
-        // The context takes its objects with it.
+        // The framebuffer is freed with its context.
     }
 }
 

@@ -1,5 +1,5 @@
-// OpenGL's own numbers, as far as the library uses them. Khronos' headers can't serve: they define
-// macros with the names of OpenGLExtension's members.
+// The OpenGL constants that the library uses. The Khronos headers aren't included, because they
+// define macros with the names of OpenGLExtension's members.
 #pragma once
 
 #include <cstdint>

@@ -11,11 +11,11 @@ namespace {
 
 constexpr char kSourceFile[] = "qgf/source/qgf/qgf_ogl/Program";
 
-// Beyond what a person reads, and short enough for a driver that gives a senseless length.
+// Bytes. Guards against a driver that reports a huge length.
 constexpr std::int32_t kMaxLogLength = 64 * 1024;
 
-// A driver's log as part of a failure text: log lines and standard error take one line each.
-std::string InOneLine(const std::string& log)
+// Joins the lines of a driver's log by " | ", since a failure text is one line.
+std::string JoinLines(const std::string& log)
 {
     std::string line;
     bool pending = false;
@@ -32,13 +32,14 @@ std::string InOneLine(const std::string& log)
     return line;
 }
 
-// `getLog(size, &written, text)` is the driver's own function, which may write anything.
+// `getLog(size, &written, text)` calls the driver. `written` isn't used: a driver may set it to any
+// value.
 template <typename GetLog>
 std::string DriverLog(std::int32_t length, GetLog getLog)
 {
     if (length > 1) {
         const std::int32_t size = std::min(length, kMaxLogLength);
-        // The last byte stays zero whatever the driver writes.
+        // One byte more than the driver is allowed to write, so that the text is zero-terminated.
         std::string log(static_cast<std::size_t>(size) + 1, '\0');
         std::int32_t written = 0;
         getLog(size, &written, log.data());
@@ -46,12 +47,13 @@ std::string DriverLog(std::int32_t length, GetLog getLog)
         const std::size_t end = log.find_last_not_of("\r\n\t ");
         log.resize(end == std::string::npos ? 0 : end + 1);
         if (!log.empty())
-            return InOneLine(log);
+            return JoinLines(log);
     }
-    return "the driver gives no log";
+    return "the driver returns no log";
 }
 
-// Deletes a shader at the end of the scope. OpenGL keeps an attached one for its program.
+// Deletes a shader at the end of the scope. OpenGL keeps an attached shader until its program is
+// deleted.
 class ScopedShader {
 public:
     ScopedShader(const OpenGLInterceptor& gl, std::uint32_t id) : fGL(gl), fID(id) {}
@@ -60,7 +62,7 @@ public:
         try {
             fGL.glDeleteShader(kSourceFile, __LINE__, fID);
         } catch (...) {
-            // The context takes its objects with it.
+            // The shader is freed with its context.
         }
     }
     ScopedShader(const ScopedShader&) = delete;
@@ -76,7 +78,7 @@ private:
 Program::Program() : fProgram(OpenGLInterceptor::Instance().glCreateProgram(kSourceFile, __LINE__))
 {
     if (fProgram == 0)
-        throw LogicalException("glCreateProgram made no program");
+        throw LogicalException("glCreateProgram returned no program");
 }
 
 Program::~Program()
@@ -84,7 +86,7 @@ Program::~Program()
     try {
         OpenGLInterceptor::Instance().glDeleteProgram(kSourceFile, __LINE__, fProgram);
     } catch (...) {
-        // The context takes its objects with it.
+        // The program is freed with its context.
     }
 }
 
@@ -106,7 +108,7 @@ void Program::LoadShader(std::uint32_t kind, const char* kindName, int count,
     const OpenGLInterceptor& gl = OpenGLInterceptor::Instance();
     const std::uint32_t shader = gl.glCreateShader(kSourceFile, __LINE__, kind);
     if (shader == 0)
-        throw LogicalException(std::string("glCreateShader made no ") + kindName + " shader");
+        throw LogicalException(std::string("glCreateShader returned no ") + kindName + " shader");
     const ScopedShader scope(gl, shader);
 
     gl.glShaderSource(kSourceFile, __LINE__, shader, count, strings, lengths);

@@ -28,8 +28,8 @@ const FormatRow& FindFormat(InternalFormat format)
         std::find_if(std::begin(kFormats), std::end(kFormats),
                      [format](const FormatRow& candidate) { return candidate.format == format; });
     if (row == std::end(kFormats))
-        throw LogicalException("Texture format " +
-                               std::to_string(static_cast<std::int32_t>(format)) + " is not known");
+        throw LogicalException("Unknown texture format " +
+                               std::to_string(static_cast<std::int32_t>(format)));
     return *row;
 }
 
@@ -39,7 +39,7 @@ Texture2D::Texture2D()
 {
     OpenGLInterceptor::Instance().glGenTextures(kSourceFile, __LINE__, 1, &fTexture);
     if (fTexture == 0)
-        throw LogicalException("glGenTextures made no texture");
+        throw LogicalException("glGenTextures returned no texture");
 }
 
 Texture2D::Texture2D(InternalFormat format, std::int32_t width, std::int32_t height, bool mipmaps,
@@ -48,15 +48,15 @@ Texture2D::Texture2D(InternalFormat format, std::int32_t width, std::int32_t hei
 {
     const FormatRow& row = FindFormat(format);
     if (type != Type::Default)
-        throw LogicalException("Texture data type " +
-                               std::to_string(static_cast<std::int32_t>(type)) + " is not known");
+        throw LogicalException("Unknown texture data type " +
+                               std::to_string(static_cast<std::int32_t>(type)));
     if (width <= 0 || height <= 0)
-        throw LogicalException("A texture can't be " + std::to_string(width) + " x " +
-                               std::to_string(height) + " texels large");
+        throw LogicalException("Bad texture size " + std::to_string(width) + " x " +
+                               std::to_string(height));
 
     const OpenGLInterceptor& gl = OpenGLInterceptor::Instance();
     gl.glBindTexture(kSourceFile, __LINE__, kGLTexture2D, fTexture);
-    // OpenGL's default wants all levels, and calls a texture with one level incomplete.
+    // OpenGL's default filter needs all levels: a texture with one level would be incomplete.
     gl.glTexParameteri(kSourceFile, __LINE__, kGLTexture2D, kGLTextureMinFilter,
                        mipmaps ? kGLLinearMipmapLinear : kGLLinear);
     gl.glTexImage2D(kSourceFile, __LINE__, kGLTexture2D, 0, row.internalFormat, width, height, 0,
@@ -71,7 +71,7 @@ Texture2D::~Texture2D()
     try {
         OpenGLInterceptor::Instance().glDeleteTextures(kSourceFile, __LINE__, 1, &fTexture);
     } catch (...) {
-        // The context takes its objects with it.
+        // The texture is freed with its context.
     }
 }
 

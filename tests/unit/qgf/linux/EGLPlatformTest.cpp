@@ -1,4 +1,4 @@
-// How display devices and contexts come out of EGL, on a scripted EGL table.
+// EGLPlatform on a scripted EGL table.
 #include <algorithm>
 #include <cstdint>
 #include <functional>
@@ -32,7 +32,7 @@ struct ScriptedDevice {
     std::map<EGLint, std::optional<std::string>> strings;
 };
 
-// What the functions below answer from. Handles are positions counted from 1.
+// The state that the functions below return. A device's handle is its position, counted from 1.
 struct Script {
     std::optional<std::string> clientExtensions = kAllClientExtensions;
     std::vector<ScriptedDevice> devices = {{"", {}}};
@@ -41,8 +41,8 @@ struct Script {
     EGLint major = 1;
     EGLint minor = 5;
     std::optional<EGLint> claimedDevices;
-    int configs = 1;                // that eglChooseConfig finds
-    bool preferred = true;          // whether it finds one with 8 bits a colour
+    int configs = 1;                // the number that eglChooseConfig finds
+    bool preferred = true;          // whether one of them has 8 bits per colour
     std::set<std::string> throwing; // calls that throw through the C interface
     std::set<std::string> failing;  // calls that fail, by name or by name and first argument
     EGLint error = EGL_BAD_ALLOC;
@@ -63,7 +63,7 @@ std::string Number(const void* handle)
     return std::to_string(reinterpret_cast<std::size_t>(handle));
 }
 
-// Records the call and tells whether it works.
+// Records the call and returns whether it succeeds.
 bool Enter(const std::string& name, const std::string& arguments = "")
 {
     const std::string call = arguments.empty() ? name : name + " " + arguments;
@@ -194,7 +194,7 @@ const char* QueryDeviceString(EGLDeviceEXT device, EGLint name)
         return Text(script.extensions);
     const auto found = script.strings.find(name);
     if (found == script.strings.end()) {
-        ADD_FAILURE() << "asked for device string " << name << " that isn't offered";
+        ADD_FAILURE() << "query of device string " << name << ", which the device lacks";
         return nullptr;
     }
     return Text(found->second);
@@ -352,7 +352,7 @@ TEST_F(EGLPlatformTest, DeviceWithNodeGetsAddressAndName)
                                        "/dev/dri/card1|Second Adapter|0000:02:00.0"));
 }
 
-TEST_F(EGLPlatformTest, RenderNodeServesWhereThereIsNoOther)
+TEST_F(EGLPlatformTest, RenderNodeIsUsedIfThereIsNoOther)
 {
     script.devices = {{"EGL_EXT_device_drm EGL_EXT_device_drm_render_node",
                        {{EGL_DRM_DEVICE_FILE_EXT, std::nullopt},
@@ -360,7 +360,7 @@ TEST_F(EGLPlatformTest, RenderNodeServesWhereThereIsNoOther)
     EXPECT_THAT(devices(), ElementsAre("/dev/dri/renderD128|First Adapter|0000:01:00.0"));
 }
 
-TEST_F(EGLPlatformTest, NodeOfNoKnownAdapterNamesTheDevice)
+TEST_F(EGLPlatformTest, NodeOfAnUnknownAdapterNamesTheDevice)
 {
     script.devices = {WithNode("/dev/dri/card7"), WithNode("")};
     EXPECT_THAT(devices(), ElementsAre("/dev/dri/card7|/dev/dri/card7|", "egl:1|egl:1|"));
@@ -400,7 +400,7 @@ TEST_F(EGLPlatformTest, NvidiaDeviceWithoutNodeIsFoundByItsOwnName)
     EXPECT_THAT(devices(), ElementsAre("egl:0|Second Adapter|0000:02:00.0", "egl:1|egl:1|"));
 }
 
-TEST_F(EGLPlatformTest, TakenAddressesAreTold)
+TEST_F(EGLPlatformTest, TakenAddressesArePassedToTheLookup)
 {
     script.devices = {
         {"EGL_NV_device_cuda EGL_EXT_device_query_name", {{EGL_RENDERER_EXT, "Card 2"}}},
@@ -420,7 +420,7 @@ TEST_F(EGLPlatformTest, AnAdaptersDriverComesBeforeTheFirmwaresFramebuffer)
     EXPECT_THAT(script.calls, Not(Contains("eglInitialize 1")));
 }
 
-TEST_F(EGLPlatformTest, TheFirmwaresFramebufferTakesNoCardFromItsDriver)
+TEST_F(EGLPlatformTest, TheFirmwaresFramebufferTakesNoAddressFromItsDriver)
 {
     script.devices = {
         WithNode("/dev/dri/card3"),
@@ -442,7 +442,7 @@ TEST_F(EGLPlatformTest, TwoDriversOfOneAdapterAreOneDevice)
     EXPECT_THAT(script.calls, Not(Contains("eglInitialize 3")));
 }
 
-TEST_F(EGLPlatformTest, EveryFailureOfADeviceIsTold)
+TEST_F(EGLPlatformTest, AllFailuresOfADeviceAreReported)
 {
     script.devices = {WithNode("/dev/dri/card0"), WithNode("/dev/dri/card0")};
     script.failing = {"eglInitialize"};
@@ -457,16 +457,16 @@ TEST_F(EGLPlatformTest, EmptyListOfDevicesIsEmpty)
     EXPECT_THAT(devices(), IsEmpty());
 }
 
-TEST_F(EGLPlatformTest, SenselessCountIsRefused)
+TEST_F(EGLPlatformTest, CountOutOfRangeThrows)
 {
     for (const EGLint count : {-1, 4097, 2147483647}) {
         script.claimedDevices = count;
         EXPECT_EQ(FailureOf([this] { devices(); }),
-                  "eglQueryDevicesEXT claims " + std::to_string(count) + " devices");
+                  "eglQueryDevicesEXT reports " + std::to_string(count) + " devices");
     }
 }
 
-TEST_F(EGLPlatformTest, DevicesThatWereOnlyClaimedAreNone)
+TEST_F(EGLPlatformTest, DevicesReportedButNotReturnedAreLeftOut)
 {
     script.claimedDevices = 4096;
     EXPECT_THAT(devices(), ElementsAre("egl:0|egl:0|"));
@@ -481,7 +481,7 @@ TEST_F(EGLPlatformTest, FailedEnumerationIsNamed)
     }
 }
 
-TEST_F(EGLPlatformTest, OlderNamesOfTheEnumerationCount)
+TEST_F(EGLPlatformTest, OlderNamesOfTheExtensionsAreAccepted)
 {
     script.clientExtensions =
         "EGL_EXT_device_enumeration EGL_EXT_device_query EGL_EXT_platform_device";
@@ -510,7 +510,7 @@ TEST_F(EGLPlatformTest, AbsentFunctionsCountAsAbsentExtensions)
     EXPECT_THAT(script.calls, Contains("eglGetPlatformDisplayEXT surfaceless"));
 }
 
-TEST_F(EGLPlatformTest, DefaultDisplayIsTheLastResort)
+TEST_F(EGLPlatformTest, DefaultDisplayIsTheLastFallback)
 {
     script.clientExtensions = std::nullopt;
     EXPECT_THAT(devices(), ElementsAre("egl:0|egl:0|"));
@@ -519,13 +519,13 @@ TEST_F(EGLPlatformTest, DefaultDisplayIsTheLastResort)
     EXPECT_THAT(script.calls, Contains("eglInitialize 100"));
 }
 
-TEST_F(EGLPlatformTest, UnknownDeviceIsRefused)
+TEST_F(EGLPlatformTest, UnknownDeviceThrows)
 {
-    EXPECT_EQ(FailureOf([this] { create("egl:1"); }), "There is no display device \"egl:1\"");
-    EXPECT_EQ(FailureOf([this] { create(""); }), "There is no display device \"\"");
+    EXPECT_EQ(FailureOf([this] { create("egl:1"); }), "Unknown display device \"egl:1\"");
+    EXPECT_EQ(FailureOf([this] { create(""); }), "Unknown display device \"\"");
 }
 
-TEST_F(EGLPlatformTest, ContextNeedsNeitherConfigNorSurfaceWhereThatIsOffered)
+TEST_F(EGLPlatformTest, ContextUsesNeitherConfigNorSurfaceIfSupported)
 {
     devices();
     script.calls.clear();
@@ -547,7 +547,7 @@ TEST_F(EGLPlatformTest, DisplayIsInitialisedOnce)
     EXPECT_EQ(std::count(script.calls.begin(), script.calls.end(), "eglInitialize 1"), 1);
 }
 
-TEST_F(EGLPlatformTest, FailedDisplayIsTriedAgain)
+TEST_F(EGLPlatformTest, FailedDisplayIsRetried)
 {
     script.failing = {"eglInitialize"};
     EXPECT_EQ(FailureOf([this] { create(); }),
@@ -556,7 +556,7 @@ TEST_F(EGLPlatformTest, FailedDisplayIsTriedAgain)
     EXPECT_NE(create(), nullptr);
 }
 
-TEST_F(EGLPlatformTest, WithoutSurfacelessContextsAPbufferServes)
+TEST_F(EGLPlatformTest, WithoutSurfacelessContextsAPbufferIsUsed)
 {
     script.displayExtensions = "EGL_KHR_no_config_context";
     devices();
@@ -580,7 +580,7 @@ TEST_F(EGLPlatformTest, NullDisplayExtensionsAreNone)
     EXPECT_THAT(script.calls, Contains("eglCreatePbufferSurface config8"));
 }
 
-TEST_F(EGLPlatformTest, FailedPbufferTakesTheContextWithIt)
+TEST_F(EGLPlatformTest, FailedPbufferDestroysTheContext)
 {
     script.displayExtensions = "";
     script.failing = {"eglCreatePbufferSurface"};
@@ -598,7 +598,7 @@ TEST_F(EGLPlatformTest, WithoutConfiglessContextsAConfigIsChosen)
     EXPECT_THAT(script.calls, Not(Contains(StartsWith("eglCreatePbufferSurface"))));
 }
 
-TEST_F(EGLPlatformTest, AnyOpenGLConfigServesWhereThePreferredIsMissing)
+TEST_F(EGLPlatformTest, AnyOpenGLConfigIsUsedIfThePreferredIsMissing)
 {
     script.displayExtensions = "EGL_KHR_surfaceless_context";
     script.preferred = false;
@@ -606,7 +606,7 @@ TEST_F(EGLPlatformTest, AnyOpenGLConfigServesWhereThePreferredIsMissing)
     EXPECT_THAT(script.calls, Contains("eglCreateContext plain config9"));
 }
 
-TEST_F(EGLPlatformTest, NoConfigAtAllIsAFailure)
+TEST_F(EGLPlatformTest, NoConfigThrows)
 {
     script.displayExtensions = "";
     script.configs = 0;
@@ -614,14 +614,14 @@ TEST_F(EGLPlatformTest, NoConfigAtAllIsAFailure)
               "eglChooseConfig finds no OpenGL configuration for display device egl:0");
 }
 
-TEST_F(EGLPlatformTest, CompatibilityContextIsAskedForWhereThePlainOneFails)
+TEST_F(EGLPlatformTest, CompatibilityContextIsTriedIfThePlainOneFails)
 {
     script.failing = {"eglCreateContext plain config0"};
     const auto context = create();
     EXPECT_EQ(script.calls.back(), "eglCreateContext compatibility config0");
 }
 
-TEST_F(EGLPlatformTest, OldEGLIsNotAskedForProfiles)
+TEST_F(EGLPlatformTest, OldEGLGetsNoProfileAttributes)
 {
     script.displayExtensions = "EGL_KHR_surfaceless_context EGL_KHR_no_config_context";
     script.minor = 4;
@@ -630,7 +630,7 @@ TEST_F(EGLPlatformTest, OldEGLIsNotAskedForProfiles)
     EXPECT_THAT(script.calls, Not(Contains(StartsWith("eglCreateContext compatibility"))));
 }
 
-TEST_F(EGLPlatformTest, ContextWithAConfigIsTriedWhereTheOneWithoutFails)
+TEST_F(EGLPlatformTest, ContextWithAConfigIsTriedIfTheOneWithoutFails)
 {
     script.failing = {"eglCreateContext plain config0", "eglCreateContext compatibility config0"};
     const auto context = create();
@@ -667,7 +667,7 @@ TEST_F(EGLPlatformTest, ErrorsAreNamedWithCallAndDevice)
     }
 }
 
-TEST_F(EGLPlatformTest, EachFailingCallOfACreationIsNamed)
+TEST_F(EGLPlatformTest, FailedCallOfACreationIsNamed)
 {
     for (const char* const call : {"eglGetPlatformDisplayEXT", "eglBindAPI"}) {
         script.failing = {call};
@@ -703,7 +703,7 @@ TEST_F(EGLPlatformTest, FailedMakeCurrentIsNamed)
     context->release();
 }
 
-TEST_F(EGLPlatformTest, DriverThatThrowsOnTheWayOutIsSurvived)
+TEST_F(EGLPlatformTest, ExceptionsInDestructorsAreIgnored)
 {
     script.displayExtensions = "";
     auto context = create();

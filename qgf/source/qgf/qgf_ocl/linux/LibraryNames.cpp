@@ -3,7 +3,7 @@
 namespace QGF {
 namespace OCL {
 
-// The bare name comes with development files only.
+// Only development packages have the second name.
 const char* const kLibraryNames[] = {"libOpenCL.so.1", "libOpenCL.so", nullptr};
 
 } // namespace OCL

@@ -15,10 +15,10 @@ namespace OGL {
 
 namespace {
 
-// No machine has a tenth of that; an answer beyond is no count of devices.
+// No machine has a tenth as many. A larger number isn't a count of devices.
 constexpr EGLint kMaxDevices = 4096;
 
-// Nothing is drawn on it.
+// Pixels. Nothing is drawn on the surface.
 constexpr EGLint kPbufferSize = 32;
 
 struct ErrorName {
@@ -55,7 +55,7 @@ std::string ErrorText(EGLint error)
     return row != std::end(kErrorNames) ? std::string(row->name) + " (" + number + ")" : number;
 }
 
-// Asks for EGL's error, so it must follow the call that failed at once. `device` may be empty.
+// Calls eglGetError, so it must directly follow the failed call. `device` may be empty.
 [[noreturn]] void ThrowFailed(const EGLTable& egl, const char* call, const std::string& device)
 {
     throw LogicalException(std::string(call) + " failed" +
@@ -107,7 +107,7 @@ public:
 
     void makeCurrent() override
     {
-        // The API is bound per thread, and this may be another than the context was made on.
+        // The API is bound per thread, and this may be another thread than that of the constructor.
         if (fEGL.eglBindAPI(EGL_OPENGL_API) == EGL_FALSE)
             ThrowFailed(fEGL, "eglBindAPI", fDevice);
         if (fEGL.eglMakeCurrent(fDisplay, fSurface, fSurface, fContext) == EGL_FALSE)
@@ -151,7 +151,7 @@ std::vector<DisplayDeviceKey> EGLPlatform::displayDevices()
 void EGLPlatform::FindDevices()
 {
     fDevices.clear();
-    // Without client extensions EGL answers null and raises an error, which nobody asks for.
+    // Without client extensions EGL returns null and raises an error, which is ignored.
     const std::string extensions = Text(fEGL.eglQueryString(EGL_NO_DISPLAY, EGL_EXTENSIONS));
     const bool base = HasWord(extensions, "EGL_EXT_device_base");
     const bool enumeration = base || HasWord(extensions, "EGL_EXT_device_enumeration");
@@ -178,7 +178,7 @@ std::vector<EGLPlatform::EGLDevice> EGLPlatform::ListEGLDevices() const
     if (fEGL.eglQueryDevicesEXT(0, nullptr, &count) == EGL_FALSE)
         ThrowFailed(fEGL, "eglQueryDevicesEXT", "");
     if (count < 0 || count > kMaxDevices)
-        throw LogicalException("eglQueryDevicesEXT claims " + std::to_string(count) + " devices");
+        throw LogicalException("eglQueryDevicesEXT reports " + std::to_string(count) + " devices");
     if (count == 0)
         return {};
     std::vector<EGLDeviceEXT> handles(static_cast<std::size_t>(count), EGL_NO_DEVICE_EXT);
@@ -206,7 +206,7 @@ EGLPlatform::EGLDevice EGLPlatform::DescribeEGLDevice(EGLDeviceEXT handle, int p
                      "",
                      "",
                      false};
-    // A software renderer may borrow the node of an adapter, but it isn't that adapter.
+    // A software renderer may report an adapter's node, but it isn't that adapter.
     if (device.software)
         return device;
     if (HasWord(extensions, "EGL_EXT_device_drm"))
@@ -246,8 +246,7 @@ void EGLPlatform::FindEGLDevices()
 {
     std::vector<EGLDevice> devices = ListEGLDevices();
     FindNvidiaAddresses(devices);
-    // Where the firmware's framebuffer is another way to an adapter, the adapter's driver comes
-    // first.
+    // If an adapter can also be reached by the firmware's framebuffer, its driver comes first.
     const auto rank = [](const EGLDevice& device) {
         return device.software ? 2 : device.firmware ? 1 : 0;
     };
@@ -307,15 +306,15 @@ const EGLPlatform::Display& EGLPlatform::OpenDisplay(const Route& route, const s
 
 EGLConfig EGLPlatform::ChooseConfig(const Display& display, const std::string& name) const
 {
-    // From what suits best down to anything that OpenGL can use.
+    // The preferred configuration, else any that OpenGL can use.
     const EGLint surface = display.surfaceless ? 0 : EGL_PBUFFER_BIT;
     const EGLint preferred[] = {EGL_SURFACE_TYPE, surface, EGL_RENDERABLE_TYPE, EGL_OPENGL_BIT,
                                 EGL_RED_SIZE,     8,       EGL_GREEN_SIZE,      8,
                                 EGL_BLUE_SIZE,    8,       EGL_ALPHA_SIZE,      8,
                                 EGL_NONE};
-    const EGLint least[] = {EGL_SURFACE_TYPE, surface, EGL_RENDERABLE_TYPE, EGL_OPENGL_BIT,
-                            EGL_NONE};
-    for (const EGLint* const attributes : {preferred, least}) {
+    const EGLint minimal[] = {EGL_SURFACE_TYPE, surface, EGL_RENDERABLE_TYPE, EGL_OPENGL_BIT,
+                              EGL_NONE};
+    for (const EGLint* const attributes : {preferred, minimal}) {
         EGLConfig config = nullptr;
         EGLint count = 0;
         if (fEGL.eglChooseConfig(display.handle, attributes, &config, 1, &count) == EGL_FALSE)
@@ -333,8 +332,8 @@ std::unique_ptr<PlatformContext> EGLPlatform::CreateContext(const Display& displ
     if (fEGL.eglBindAPI(EGL_OPENGL_API) == EGL_FALSE)
         ThrowFailed(fEGL, "eglBindAPI", name);
 
-    // Without attributes EGL gives the newest version that is compatible with 1.0, which is a
-    // compatibility context. Some implementations want to be told.
+    // Without attributes EGL makes a context of the newest version that is compatible with 1.0,
+    // which is a compatibility context. Some implementations require the attributes.
     const EGLint plain[] = {EGL_NONE};
     const EGLint compatible[] = {EGL_CONTEXT_MAJOR_VERSION_KHR,
                                  3,
@@ -376,7 +375,7 @@ std::unique_ptr<PlatformContext> EGLPlatform::createOffscreen(const DisplayDevic
         return other.key.deviceName() == name;
     });
     if (device == fDevices.end())
-        throw LogicalException("There is no display device \"" + name + "\"");
+        throw LogicalException("Unknown display device \"" + name + "\"");
 
     std::string reasons;
     for (const Route& route : device->routes) {
@@ -393,7 +392,7 @@ std::unique_ptr<PlatformContext> EGLPlatform::createOffscreen(const DisplayDevic
 
 std::unique_ptr<Platform> MakeNativePlatform()
 {
-    // Never closed: drivers keep threads and exit handlers of their own.
+    // Never closed: drivers have threads and exit handlers.
     static const char* const names[] = {"libEGL.so.1", "libEGL.so", nullptr};
     static Core::DynamicLibrary* const library = Core::OpenLibrary(names).release();
     EGLTable egl;

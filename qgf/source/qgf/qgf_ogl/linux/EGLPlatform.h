@@ -1,7 +1,7 @@
-// Display devices and offscreen contexts by EGL.
+// Display devices and offscreen contexts on EGL.
 //
-// Devices come from EGL's device enumeration; without that, the surfaceless platform, else the
-// default display, is the only device.
+// The devices are those of EGL's device enumeration. Without that extension there is one device:
+// the surfaceless platform if EGL has it, else the default display.
 #pragma once
 
 #include <map>
@@ -16,21 +16,16 @@ namespace OGL {
 
 class EGLPlatform : public Platform {
 public:
-    // How the addresses of adapters are found; replaceable for tests.
+    // The functions that look adapters up; tests replace them.
     struct AdapterLookup {
-        // The place (qgf/DrmNodes.h) of the adapter behind a DRM node such as "/dev/dri/card0"; ""
-        // if unknown.
+        // AdapterOfDrmNode of qgf/DrmNodes.h.
         std::string (*addressOfNode)(const std::string& node);
-        // The PCI addresses of NVIDIA devices that no DRM node leads to, in their order; "" where
-        // unknown.
-        // `names` are the names that the devices give themselves, "" for none, `taken` the
-        // addresses that other devices have.
+        // NvidiaAdapters of qgf/AdapterName.h.
         std::vector<std::string> (*addressesOfNvidia)(const std::vector<std::string>& names,
                                                       const std::vector<std::string>& taken);
-        // The adapter's name by its place; "" if unknown.
+        // AdapterName of qgf/AdapterName.h.
         std::string (*nameOfAddress)(const std::string& address);
-        // Whether a DRM node is the firmware's framebuffer on an adapter, which no driver of the
-        // adapter renders to.
+        // IsFirmwareNode of qgf/DrmNodes.h.
         bool (*isFirmwareNode)(const std::string& node);
     };
 
@@ -40,7 +35,7 @@ public:
     std::unique_ptr<PlatformContext> createOffscreen(const DisplayDeviceKey& key) override;
 
 private:
-    // An initialised display and what it offers.
+    // An initialised display and its extensions.
     struct Display {
         EGLDisplay handle;
         bool surfaceless;
@@ -54,20 +49,20 @@ private:
         EGLDeviceEXT device;
     };
 
-    // The EGL devices of one display device: two drivers may offer the same adapter.
+    // A display device and its EGL devices: two drivers may list the same adapter.
     struct Device {
         DisplayDeviceKey key;
         std::vector<Route> routes;
     };
 
-    // What EGL says about a device of its list.
+    // A device of EGL's list.
     struct EGLDevice {
         EGLDeviceEXT handle;
         int position;
         bool software;
         bool nvidia;
         std::string node;     // "" if it has none
-        std::string renderer; // "" if it doesn't say
+        std::string renderer; // EGL_RENDERER_EXT; "" if it has none
         std::string address;  // the adapter's place; "" if unknown
         bool firmware;        // it renders to the firmware's framebuffer
     };
@@ -87,7 +82,7 @@ private:
     const EGLTable fEGL;
     const AdapterLookup fLookup;
     std::vector<Device> fDevices;
-    // Displays stay initialised to the end of the process: EGL ends all contexts of one at once.
+    // Displays stay initialised until the process ends: terminating one destroys all its contexts.
     std::map<std::pair<EGLenum, EGLDeviceEXT>, Display> fDisplays;
 };
 

@@ -1,7 +1,7 @@
 // The EGL entry points that the library uses.
 #pragma once
 
-// EGL's own types are enough; the window system's headers stay out.
+// Don't include the window system's headers.
 #define EGL_NO_PLATFORM_SPECIFIC_TYPES
 #define EGL_EGLEXT_PROTOTYPES
 #include <EGL/egl.h>
@@ -9,9 +9,9 @@
 
 #include "qgf/Core.h"
 
-// EGL's entry points, one a line. The two parameters are macros that take a name: CORE for those
-// that each EGL library has, EXTENSION for those of extensions, null where the library lacks them.
-// The latter come after eglGetProcAddress, which finds them.
+// The entry points. The two parameters are macros that take a name: CORE for functions that every
+// EGL library has, EXTENSION for functions of extensions, null if the library lacks them. Those
+// come after eglGetProcAddress, which looks them up.
 #define QGF_EGL_ENTRY_POINTS(CORE, EXTENSION)                                                      \
     CORE(eglGetError)                                                                              \
     CORE(eglQueryString)                                                                           \
@@ -38,9 +38,9 @@ struct EGLTable {
 #undef QGF_EGL_MEMBER
 };
 
-// Fills the table with what `getProc(context, name)` gives: EGL's core functions from there, those
-// of extensions by eglGetProcAddress. Throws LogicalException naming the core function that is
-// missing.
+// Fills the table: core functions by `getProc(context, name)`, functions of extensions by
+// eglGetProcAddress. Throws LogicalException "NAME is not offered by this EGL library" if a core
+// function is missing.
 void FillEGLTable(EGLTable& table, Core::Proc (*getProc)(void* context, const char* name),
                   void* context);
 

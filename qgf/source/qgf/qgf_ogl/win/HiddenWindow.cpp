@@ -11,7 +11,7 @@ namespace OGL {
 namespace {
 
 constexpr wchar_t kClassName[] = L"QGFHiddenWindow";
-constexpr int kSize = 32; // nothing is drawn on it
+constexpr int kSize = 32; // pixels; nothing is drawn on the window
 
 [[noreturn]] void ThrowFailed(const char* call, const std::string& deviceName)
 {
@@ -20,19 +20,19 @@ constexpr int kSize = 32; // nothing is drawn on it
                            Core::SystemErrorText(error));
 }
 
-// Whoever asks all programs to close gets no window of a running measurement.
-LRESULT CALLBACK TakeMessage(HWND window, UINT message, WPARAM wide, LPARAM extra)
+// Ignores WM_CLOSE: a request to close all windows must not end a running measurement.
+LRESULT CALLBACK HandleMessage(HWND window, UINT message, WPARAM wide, LPARAM extra)
 {
     return message == WM_CLOSE ? 0 : DefWindowProcW(window, message, wide, extra);
 }
 
-// Registered once per process; the system drops it at the end.
+// The class is registered once per process; the system unregisters it when the process ends.
 void RegisterWindowClass(const std::string& deviceName)
 {
     WNDCLASSEXW windowClass{};
     windowClass.cbSize = sizeof windowClass;
     windowClass.style = CS_OWNDC;
-    windowClass.lpfnWndProc = TakeMessage;
+    windowClass.lpfnWndProc = HandleMessage;
     windowClass.hInstance = GetModuleHandleW(nullptr);
     windowClass.lpszClassName = kClassName;
     if (RegisterClassExW(&windowClass) == 0 && GetLastError() != ERROR_CLASS_ALREADY_EXISTS)
@@ -60,7 +60,7 @@ HWND MakeWindow(const std::string& deviceName)
     return window;
 }
 
-// Makes the window, hands it over and takes its messages until this thread is told to quit.
+// Makes the window, passes it to `made` and dispatches its messages until WM_QUIT.
 void RunWindow(const std::string& deviceName, std::promise<HWND> made)
 {
     HWND window = nullptr;
@@ -79,7 +79,7 @@ void RunWindow(const std::string& deviceName, std::promise<HWND> made)
 
 } // namespace
 
-// Only the window is the other thread's: drivers are called on the maker's.
+// Only the window belongs to the other thread. Drivers are called on the constructor's thread.
 HiddenWindow::HiddenWindow(const std::string& deviceName)
 {
     std::promise<HWND> promise;

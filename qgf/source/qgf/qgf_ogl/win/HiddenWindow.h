@@ -1,4 +1,4 @@
-// A window that is never shown, as a place for an OpenGL context.
+// A window that is never shown, for an OpenGL context.
 #pragma once
 
 #include <string>
@@ -9,14 +9,14 @@
 namespace QGF {
 namespace OGL {
 
-// Has a pixel format that OpenGL can use. A thread of its own takes the window's messages, so that
-// another program's broadcast is answered at once, whatever the maker's thread is busy with. Not
-// copyable; destroyed on the thread that made it.
+// The window has a pixel format that OpenGL can use. A thread of its own dispatches the window's
+// messages, so that another program's broadcast doesn't wait while the constructor's thread is
+// busy. Destroy it on the thread that made it.
 class HiddenWindow {
 public:
-    // Lies on the part of the desktop that `deviceName` shows, so that a driver that serves one
-    // device alone takes it. Throws LogicalException with the call that failed and the system's
-    // reason.
+    // Makes the window on the part of the desktop that `deviceName` shows, so that a driver that
+    // supports only one device accepts it. Throws LogicalException with the failed call and the
+    // system's reason.
     explicit HiddenWindow(const std::string& deviceName);
     ~HiddenWindow();
     HiddenWindow(const HiddenWindow&) = delete;

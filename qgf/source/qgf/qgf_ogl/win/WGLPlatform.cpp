@@ -50,12 +50,12 @@ public:
 
     Core::Proc getProc(const char* name) override
     {
-        // The driver's own answer where there is one; some drivers answer with small numbers in
-        // place of null. What came with OpenGL 1.1 stands in the library itself.
-        constexpr std::intptr_t kSmallest = 3;
+        // Some drivers return -1, 1, 2 or 3 instead of null. The functions of OpenGL 1.1 are
+        // exported by the library, and wglGetProcAddress returns null for them.
+        constexpr std::intptr_t kMaxErrorValue = 3;
         const auto proc = reinterpret_cast<Core::Proc>(fWGL.wglGetProcAddress(name));
         const auto value = reinterpret_cast<std::intptr_t>(proc);
-        return value > kSmallest || value < -1 ? proc : fLibrary.getProc(name);
+        return value > kMaxErrorValue || value < -1 ? proc : fLibrary.getProc(name);
     }
 
 private:
@@ -91,7 +91,8 @@ std::vector<DisplayDeviceKey> WGLPlatform::displayDevices()
     DISPLAY_DEVICEW device{};
     device.cb = sizeof device;
     for (DWORD index = 0; EnumDisplayDevicesW(nullptr, index, &device, 0) != 0; ++index) {
-        // A context needs a window, and a window a desktop; a mirroring driver is no device.
+        // A context needs a window, and a window needs a desktop. A mirroring driver isn't a
+        // display device.
         if ((device.StateFlags & DISPLAY_DEVICE_ATTACHED_TO_DESKTOP) == 0 ||
             (device.StateFlags & DISPLAY_DEVICE_MIRRORING_DRIVER) != 0)
             continue;

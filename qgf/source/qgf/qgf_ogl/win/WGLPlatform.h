@@ -1,4 +1,4 @@
-// QGF::OGL on WGL: the display devices of the desktop, and contexts on hidden windows.
+// Display devices and offscreen contexts on WGL. A context has a hidden window.
 #pragma once
 
 #include <memory>
@@ -11,7 +11,7 @@
 namespace QGF {
 namespace OGL {
 
-// The entry points of opengl32.dll that the binding uses.
+// The entry points of opengl32.dll that are used here.
 struct WGLTable {
     decltype(&::wglCreateContext) wglCreateContext;
     decltype(&::wglDeleteContext) wglDeleteContext;
@@ -21,11 +21,11 @@ struct WGLTable {
 
 class WGLPlatform : public Platform {
 public:
-    // Throws LogicalException if the library lacks an entry point. Keeps the library open.
+    // Owns the library and keeps it open. Throws LogicalException "opengl32.dll has no NAME" if it
+    // lacks an entry point.
     explicit WGLPlatform(std::unique_ptr<Core::DynamicLibrary> library);
 
-    // The devices that show a part of the desktop, the primary one first. A key's device string is
-    // the adapter's description, its display id the device's own id.
+    // Lists the devices that show a part of the desktop, the primary one first.
     std::vector<DisplayDeviceKey> displayDevices() override;
     std::unique_ptr<PlatformContext> createOffscreen(const DisplayDeviceKey& key) override;
 
