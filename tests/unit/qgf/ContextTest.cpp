@@ -41,7 +41,7 @@ TEST(Devices, FirstIsThePrimary)
     EXPECT_EQ(Context::PrimaryDisplayDevice().deviceName(), "fake0");
 }
 
-TEST(Devices, PositionOutsideTheListIsNone)
+TEST(Devices, IndexOutOfRangeReturnsFalse)
 {
     const FakeOpenGL gl(1);
     DisplayDeviceKey key("before", "", "");
@@ -50,7 +50,7 @@ TEST(Devices, PositionOutsideTheListIsNone)
     EXPECT_EQ(key.deviceName(), "before");
 }
 
-TEST(Devices, NamelessOneIsCountedOnly)
+TEST(Devices, NamelessDeviceCountsButHasNoKey)
 {
     FakeOpenGL gl(2);
     gl.devices[0].key = DisplayDeviceKey();
@@ -61,7 +61,7 @@ TEST(Devices, NamelessOneIsCountedOnly)
     EXPECT_EQ(Context::PrimaryDisplayDevice().deviceName(), "fake1");
 }
 
-TEST(Devices, ArePlatformsAnswerToOneQuestion)
+TEST(Devices, AreListedByThePlatformOnce)
 {
     const FakeOpenGL gl(1);
     Library::Initialize(Library::InitOptions());
@@ -71,7 +71,7 @@ TEST(Devices, ArePlatformsAnswerToOneQuestion)
     EXPECT_THAT(gl.calls, ElementsAre("displayDevices"));
 }
 
-TEST(Devices, NoneFailsTheStart)
+TEST(Devices, InitializeThrowsWithoutOne)
 {
     const FakeOpenGL gl(0);
     EXPECT_THROW(Library::Initialize(Library::InitOptions()), QGF::LogicalException);
@@ -79,7 +79,7 @@ TEST(Devices, NoneFailsTheStart)
     EXPECT_EQ(Context::NumDisplayDevice(), 0);
 }
 
-TEST(Devices, FailureOfThePlatformIsTriedAgain)
+TEST(Devices, FailedListingIsRetried)
 {
     FakeOpenGL gl(1);
     gl.onDisplayDevices = [] { throw QGF::LogicalException("no binding"); };
@@ -92,7 +92,7 @@ TEST(Devices, FailureOfThePlatformIsTriedAgain)
     EXPECT_EQ(Context::NumDisplayDevice(), 1);
 }
 
-TEST(ContextOffscreen, IsMadeOnTheDeviceOfItsKeyAndLeavesCurrentnessAlone)
+TEST(ContextOffscreen, IsMadeOnItsDeviceAndNotMadeCurrent)
 {
     const FakeOpenGL gl(2);
     const DisplayDeviceKey key = Key(1);
@@ -105,13 +105,13 @@ TEST(ContextOffscreen, IsMadeOnTheDeviceOfItsKeyAndLeavesCurrentnessAlone)
     EXPECT_THAT(gl.calls, ElementsAre("displayDevices", "create fake1", "destroy fake1"));
 }
 
-TEST(ContextOffscreen, UnknownKeyIsRefused)
+TEST(ContextOffscreen, UnknownKeyThrows)
 {
     const FakeOpenGL gl(1);
     EXPECT_THROW(ContextOffscreen{DisplayDeviceKey{}}, QGF::LogicalException);
 }
 
-TEST(ContextOffscreen, AnyExceptionOfThePlatformPasses)
+TEST(ContextOffscreen, ExceptionOfThePlatformPropagates)
 {
     FakeOpenGL gl(1);
     const DisplayDeviceKey key = Key(0);
@@ -133,7 +133,7 @@ public:
     }
 };
 
-TEST(ContextOffscreen, PlatformThatMakesNothingIsAFailure)
+TEST(ContextOffscreen, NullContextOfThePlatformThrows)
 {
     ReplacePlatform(std::make_unique<NullPlatform>());
     EXPECT_THROW(ContextOffscreen{Context::PrimaryDisplayDevice()}, QGF::LogicalException);
@@ -160,7 +160,7 @@ TEST_F(TwoContexts, MakeCurrentMakesCurrent)
     EXPECT_THAT(gl.calls, ElementsAre("makeCurrent fake0", "makeCurrent fake1"));
 }
 
-TEST_F(TwoContexts, FailedMakeCurrentKeepsThePreviousOne)
+TEST_F(TwoContexts, FailedMakeCurrentKeepsThePreviousContext)
 {
     a->makeCurrent();
     gl.devices[1].onMakeCurrent = [] { throw QGF::LogicalException("lost"); };
@@ -168,7 +168,7 @@ TEST_F(TwoContexts, FailedMakeCurrentKeepsThePreviousOne)
     EXPECT_EQ(Context::Current(), a.get());
 }
 
-TEST_F(TwoContexts, CurrentOneIsReleasedBeforeItEnds)
+TEST_F(TwoContexts, DestructorReleasesTheCurrentContext)
 {
     a->makeCurrent();
     a.reset();
@@ -176,7 +176,7 @@ TEST_F(TwoContexts, CurrentOneIsReleasedBeforeItEnds)
     EXPECT_THAT(gl.calls, ElementsAre("makeCurrent fake0", "release fake0", "destroy fake0"));
 }
 
-TEST_F(TwoContexts, OtherOneEndsWithoutARelease)
+TEST_F(TwoContexts, DestructorOfANonCurrentContextReleasesNothing)
 {
     a->makeCurrent();
     b.reset();
@@ -184,7 +184,7 @@ TEST_F(TwoContexts, OtherOneEndsWithoutARelease)
     EXPECT_THAT(gl.calls, ElementsAre("makeCurrent fake0", "destroy fake1"));
 }
 
-TEST_F(TwoContexts, CurrentnessIsPerThread)
+TEST_F(TwoContexts, CurrentContextIsPerThread)
 {
     a->makeCurrent();
     Context* elsewhere = a.get();
@@ -193,7 +193,7 @@ TEST_F(TwoContexts, CurrentnessIsPerThread)
     EXPECT_EQ(Context::Current(), a.get());
 }
 
-TEST_F(TwoContexts, WrapperLeavesNoneWhereNoneWas)
+TEST_F(TwoContexts, WrapperRestoresNone)
 {
     {
         const ScopedContextWrapper scope(true);
@@ -203,7 +203,7 @@ TEST_F(TwoContexts, WrapperLeavesNoneWhereNoneWas)
     EXPECT_THAT(gl.calls, ElementsAre("makeCurrent fake0", "release fake0"));
 }
 
-TEST_F(TwoContexts, WrapperBringsThePreviousOneBack)
+TEST_F(TwoContexts, WrapperRestoresThePreviousContext)
 {
     a->makeCurrent();
     {
@@ -221,7 +221,7 @@ TEST_F(TwoContexts, WrapperRestoresWhenAnExceptionLeavesTheScope)
         {
             const ScopedContextWrapper scope(true);
             b->makeCurrent();
-            throw std::runtime_error("on the way");
+            throw std::runtime_error("test");
         },
         std::runtime_error);
     EXPECT_EQ(Context::Current(), a.get());
@@ -246,7 +246,7 @@ TEST_F(TwoContexts, WrapperWithNothingToUndoCallsNothing)
     EXPECT_THAT(gl.calls, IsEmpty());
 }
 
-TEST_F(TwoContexts, WrapperLeavesNoneIfThePreviousOneIsGone)
+TEST_F(TwoContexts, WrapperRestoresNoneIfThePreviousContextIsDestroyed)
 {
     a->makeCurrent();
     {
@@ -298,7 +298,7 @@ TEST_F(TwoContexts, EachHasItsOwnTableAndManager)
     EXPECT_EQ(ExtensionManager::Instance(), managerOfA);
 }
 
-TEST_F(TwoContexts, TableIsThereOnceTheContextWasCurrent)
+TEST_F(TwoContexts, TableExistsAfterTheFirstMakeCurrent)
 {
     EXPECT_THROW(a->interceptor(), QGF::LogicalException);
     EXPECT_THROW(a->extensionManager(), QGF::LogicalException);

@@ -7,21 +7,21 @@ namespace {
 
 using testing::HasSubstr;
 
-TEST(Exceptions, MessageAndWhatAreOneText)
+TEST(Exceptions, MessageAndWhatAreEqual)
 {
     const QGF::LogicalException exception("no such thing");
     EXPECT_STREQ(exception.what(), "no such thing");
     EXPECT_STREQ(exception.message(), "no such thing");
 }
 
-TEST(Exceptions, LogicalAndInternalShareTheRoot)
+TEST(Exceptions, LogicalAndInternalShareABase)
 {
     EXPECT_THROW(throw QGF::LogicalException(""), QGF::ExceptionBase);
     EXPECT_THROW(throw QGF::InternalException("f", 1, "t"), QGF::ExceptionBase);
     EXPECT_THROW(throw QGF::LogicalException(""), std::exception);
 }
 
-TEST(Exceptions, InternalExceptionNamesThePlace)
+TEST(Exceptions, InternalExceptionHasFileAndLine)
 {
     const QGF::InternalException exception("some/file", 122, "a == b");
     EXPECT_STREQ(exception.what(), "some/file(122): a == b");
@@ -54,14 +54,14 @@ public:
     CoreLibrary& operator=(const CoreLibrary&) = delete;
 };
 
-TEST_F(CoreLibrary, RepeatedStartAsksOnce)
+TEST_F(CoreLibrary, InitializeChecksOnce)
 {
     QGF::Core::Library::Initialize();
     QGF::Core::Library::Initialize();
     EXPECT_EQ(gChecks, 1);
 }
 
-TEST_F(CoreLibrary, FailedStartIsTriedAgain)
+TEST_F(CoreLibrary, FailedInitializeIsRetried)
 {
     gCheckFails = true;
     EXPECT_THROW(QGF::Core::Library::Initialize(), QGF::LogicalException);
@@ -71,7 +71,7 @@ TEST_F(CoreLibrary, FailedStartIsTriedAgain)
     EXPECT_EQ(gChecks, 3);
 }
 
-TEST_F(CoreLibrary, NativeLoaderAnswers)
+TEST_F(CoreLibrary, NativeCheckSucceeds)
 {
     QGF::Core::ReplaceLoaderCheck(nullptr);
     EXPECT_NO_THROW(QGF::Core::Library::Initialize());
@@ -90,7 +90,7 @@ TEST(OpenLibrary, FailureNamesEveryLibrary)
     }
 }
 
-TEST(OpenLibrary, EmptyListIsRefused)
+TEST(OpenLibrary, EmptyListThrows)
 {
     const char* const names[] = {nullptr};
     EXPECT_THROW(QGF::Core::OpenLibrary(names), QGF::LogicalException);

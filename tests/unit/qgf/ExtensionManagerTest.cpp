@@ -84,7 +84,7 @@ const std::vector<Row> kRows = {
 
 class ExtensionRow : public testing::TestWithParam<Row> {};
 
-TEST_P(ExtensionRow, CountsByItsVersionAndByEachOfItsNames)
+TEST_P(ExtensionRow, IsSupportedByItsVersionAndByEachOfItsNames)
 {
     const Row& row = GetParam();
     EXPECT_FALSE(Driver(row.versionBefore).supports(row.id));
@@ -114,7 +114,7 @@ TEST(ExtensionManager, UnknownIdIsNotSupported)
     EXPECT_FALSE(driver.supports(2147483647));
 }
 
-TEST(ExtensionManager, ImagingAloneIsNoVersion)
+TEST(ExtensionManager, ImagingIsNotAVersion)
 {
     const Driver driver("1.1", {"GL_ARB_imaging"});
     EXPECT_TRUE(driver.supports(1));
@@ -129,7 +129,7 @@ struct VersionText {
 
 class VersionTexts : public testing::TestWithParam<VersionText> {};
 
-TEST_P(VersionTexts, AreRead)
+TEST_P(VersionTexts, AreParsed)
 {
     const Driver driver(GetParam().text);
     EXPECT_EQ(driver.supports(GL_VERSION_2_1), GetParam().is21);
@@ -188,10 +188,10 @@ TEST(ExtensionManager, NullTextsSupportNothing)
     EXPECT_FALSE(driver.supports(1));
 }
 
-TEST(ExtensionManager, RefusedQuestionsLeaveNoErrorBehind)
+TEST(ExtensionManager, FailedQueriesLeaveNoError)
 {
     Driver driver("1.1");
-    driver.device().strings.erase(kGLVersion); // answers null and raises an error
+    driver.device().strings.erase(kGLVersion); // glGetString returns null and raises an error
     EXPECT_FALSE(driver.supports(0));
     EXPECT_THAT(driver.device().errors, IsEmpty());
 }
@@ -205,7 +205,7 @@ TEST(ExtensionManager, CallersErrorsStay)
     EXPECT_THAT(driver.gl.callsOf("glGetError"), IsEmpty());
 }
 
-TEST(ExtensionManager, DriverThatAlwaysFailsIsAskedABoundedNumberOfTimes)
+TEST(ExtensionManager, ErrorsOfABrokenDriverAreReadAtMost16Times)
 {
     Driver driver("1.1");
     driver.device().strings.erase(kGLVersion);
@@ -214,7 +214,7 @@ TEST(ExtensionManager, DriverThatAlwaysFailsIsAskedABoundedNumberOfTimes)
     EXPECT_LE(driver.gl.callsOf("glGetError").size(), 16U);
 }
 
-TEST(ExtensionManager, SenselessCountIsNotBelieved)
+TEST(ExtensionManager, CountOutOfRangeFallsBackToTheList)
 {
     for (const std::int32_t count : {-1, -2147483647, 65537, 2147483647}) {
         Driver driver("3.0", {"GL_ARB_imaging"});

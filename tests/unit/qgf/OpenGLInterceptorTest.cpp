@@ -17,7 +17,7 @@ using namespace QGF::OGL;
 struct CallCase {
     const char* name;
     std::function<void(const OpenGLInterceptor&)> call;
-    const char* recorded; // by the fake driver
+    const char* recorded; // the call as the fake driver records it
 };
 
 std::int32_t gInteger = 0;
@@ -95,7 +95,7 @@ TEST_P(InterceptorCall, ReachesTheDriverWithItsArguments)
     EXPECT_EQ(gl.calls.back(), GetParam().recorded);
 }
 
-TEST_P(InterceptorCall, MissingEntryPointNamesItselfAndTheCaller)
+TEST_P(InterceptorCall, MissingEntryPointThrowsItsNameAndTheCaller)
 {
     assay_test::FakeOpenGL gl;
     gl.devices[0].missing = {GetParam().name};
@@ -116,7 +116,7 @@ INSTANTIATE_TEST_SUITE_P(All, InterceptorCall, testing::ValuesIn(kCalls),
                              return std::string(test.param.name);
                          });
 
-TEST(OpenGLInterceptor, ResultsComeBack)
+TEST(OpenGLInterceptor, ResultsAreReturned)
 {
     assay_test::FakeOpenGL gl;
     gl.devices[0].errors = {1282};
@@ -137,7 +137,7 @@ TEST(OpenGLInterceptor, MissingIndexedStringsAreNull)
     EXPECT_EQ(table.glGetStringi("", 0, 0x1F03, 0), nullptr);
 }
 
-TEST(OpenGLInterceptor, UnknownCallerIsNoCrash)
+TEST(OpenGLInterceptor, NullFileNameIsAccepted)
 {
     const OpenGLInterceptor table([](void*, const char*) -> QGF::Core::Proc { return nullptr; },
                                   nullptr);
@@ -149,13 +149,13 @@ void GenerateMipmapEXT(std::uint32_t target)
     gID = target;
 }
 
-TEST(OpenGLInterceptor, ExtensionNameStandsInForTheCoreName)
+TEST(OpenGLInterceptor, MissingCoreFunctionFallsBackToTheExtension)
 {
-    static std::set<std::string> asked;
-    asked.clear();
+    static std::set<std::string> requested;
+    requested.clear();
     const OpenGLInterceptor table(
         [](void*, const char* name) -> QGF::Core::Proc {
-            asked.insert(name);
+            requested.insert(name);
             return std::string(name) == "glGenerateMipmapEXT"
                        ? reinterpret_cast<QGF::Core::Proc>(GenerateMipmapEXT)
                        : nullptr;
@@ -166,7 +166,7 @@ TEST(OpenGLInterceptor, ExtensionNameStandsInForTheCoreName)
     for (const char* const name :
          {"glGenerateMipmapEXT", "glGenFramebuffersEXT", "glBindFramebufferEXT",
           "glFramebufferTexture2DEXT", "glCheckFramebufferStatusEXT", "glDeleteFramebuffersEXT"})
-        EXPECT_EQ(asked.count(name), 1U) << name;
+        EXPECT_EQ(requested.count(name), 1U) << name;
 }
 
 } // namespace

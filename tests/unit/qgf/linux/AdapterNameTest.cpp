@@ -28,7 +28,7 @@ TEST(AdapterNameTest, AdaptersAreDisplayDevicesInOrder)
     EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:02:00.0", "0000:41:00.0", "0000:81:00.0"));
 }
 
-TEST(AdapterNameTest, OtherFunctionsOfACardAreNoAdapters)
+TEST(AdapterNameTest, OtherFunctionsOfACardAreNotAdapters)
 {
     const AdapterTree tree("amd-discrete");
     EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:03:00.0"));
@@ -41,47 +41,47 @@ TEST(AdapterNameTest, ADeviceOfAnotherClassWithADrmNodeIsAnAdapter)
     EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:03:00.0"));
 }
 
-TEST(AdapterNameTest, TheNvidiaDriversModelComesFirst)
+TEST(AdapterNameTest, NvidiaModelIsTheFirstSource)
 {
     const AdapterTree tree("nvidia-drm");
     EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA GeForce RTX 3090");
 }
 
-TEST(AdapterNameTest, ThenAmdgpusProductName)
+TEST(AdapterNameTest, ProductNameIsTheSecondSource)
 {
     const AdapterTree tree("amd-discrete");
     tree.write(std::string(kRadeon) + "/product_name", "AMD Radeon PRO W7900\n");
     EXPECT_EQ(AdapterName("0000:03:00.0"), "AMD Radeon PRO W7900");
 }
 
-TEST(AdapterNameTest, ThenTheDatabase)
+TEST(AdapterNameTest, DatabaseIsTheThirdSource)
 {
     const AdapterTree tree("amd-discrete");
     tree.write(std::string(kRadeon) + "/product_name", "\n");
     EXPECT_EQ(AdapterName("0000:03:00.0"), kRadeonName);
 }
 
-TEST(AdapterNameTest, ThenTheIdsInHexadecimal)
+TEST(AdapterNameTest, HexadecimalIdsAreTheLastSource)
 {
     const AdapterTree tree("amd-discrete");
     tree.remove("/usr");
     EXPECT_EQ(AdapterName("0000:03:00.0"), "1002:744c");
 }
 
-TEST(AdapterNameTest, ADeviceThatTheDatabaseLacksIsItsIds)
+TEST(AdapterNameTest, ADeviceMissingInTheDatabaseIsNamedByItsIds)
 {
     const AdapterTree tree("unnamed");
     EXPECT_EQ(AdapterName("0000:2d:00.0"), "1002:fffe");
 }
 
-TEST(AdapterNameTest, NoAdapterHasNoName)
+TEST(AdapterNameTest, AnUnknownPlaceHasNoName)
 {
     const AdapterTree tree("amd-discrete");
     EXPECT_EQ(AdapterName("0000:03:00.1"), "");
     EXPECT_EQ(AdapterName(""), "");
 }
 
-TEST(AdapterNameTest, EqualNamesGetTheirAddresses)
+TEST(AdapterNameTest, AddressesAreAppendedToEqualNames)
 {
     const AdapterTree tree("server-bmc");
     EXPECT_EQ(AdapterName("0000:41:00.0"), "AMD Instinct MI210 (0000:41:00.0)");
@@ -100,21 +100,21 @@ TEST(AdapterNameTest, EightIdenticalCardsHaveEightNames)
     EXPECT_EQ(names.size(), 8U);
 }
 
-TEST(AdapterNameTest, WhatTheAdapterListsEscapeIsReplaced)
+TEST(AdapterNameTest, CharactersThatWouldBeEscapedAreReplaced)
 {
     const AdapterTree tree("amd-discrete");
     tree.write(std::string(kRadeon) + "/product_name", "A\"\\\xC2\xAE\xE2\x84\xA2\xFF\x01 z\n");
     EXPECT_EQ(AdapterName("0000:03:00.0"), "A'/???? z");
 }
 
-TEST(AdapterNameTest, ANameOfWhichNothingIsLeftIsNone)
+TEST(AdapterNameTest, AnEmptyNameFallsBackToTheNextSource)
 {
     const AdapterTree tree("amd-discrete");
     tree.write(std::string(kRadeon) + "/product_name", "\x80\xBF\n");
     EXPECT_EQ(AdapterName("0000:03:00.0"), kRadeonName);
 }
 
-TEST(AdapterNameTest, ALongNameFitsADescriptionWithItsAddress)
+TEST(AdapterNameTest, ALongNameIsTruncatedToFitItsAddress)
 {
     const AdapterTree tree("server-bmc");
     for (const char* device : {"40/0000:40:01.1/0000:41:00.0", "80/0000:80:01.1/0000:81:00.0"}) {
@@ -125,7 +125,7 @@ TEST(AdapterNameTest, ALongNameFitsADescriptionWithItsAddress)
     EXPECT_LE(AdapterName("0000:41:00.0").size(), 127U);
 }
 
-TEST(AdapterNameTest, AnAdapterKeepsItsNameThroughTheRun)
+TEST(AdapterNameTest, NamesAreCachedUntilTheRootChanges)
 {
     const AdapterTree tree("nvidia-drm");
     EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA GeForce RTX 3090");
@@ -135,7 +135,7 @@ TEST(AdapterNameTest, AnAdapterKeepsItsNameThroughTheRun)
     EXPECT_EQ(AdapterName("0000:01:00.0"), "NVIDIA Corporation GA102 [GeForce RTX 3090]");
 }
 
-TEST(AdapterNameTest, OutsidePciTheDeviceTreeNames)
+TEST(AdapterNameTest, OutsidePciTheDeviceTreeIsTheFirstSource)
 {
     const AdapterTree tree("soc-v3d");
     EXPECT_THAT(DisplayAdapters(), ElementsAre("platform/gpu", "platform/v3dbus/fec00000.gpu"));
@@ -143,7 +143,7 @@ TEST(AdapterNameTest, OutsidePciTheDeviceTreeNames)
     EXPECT_EQ(AdapterName("platform/v3dbus/fec00000.gpu"), "brcm,2711-v3d");
 }
 
-TEST(AdapterNameTest, ElseTheDriverDoes)
+TEST(AdapterNameTest, OutsidePciTheDriverIsTheSecondSource)
 {
     const AdapterTree tree("soc-v3d");
     tree.remove("/sys/devices/platform/gpu/uevent");
@@ -164,21 +164,21 @@ TEST(AdapterNameTest, PciAdaptersComeFirst)
     EXPECT_THAT(DisplayAdapters(), ElementsAre("0000:01:00.0", "platform/ff9a0000.gpu"));
 }
 
-TEST(AdapterNameTest, AUsbDisplayIsAnAdapterButItsControllerIsNone)
+TEST(AdapterNameTest, AUsbDisplayIsAnAdapterAndItsControllerIsNot)
 {
     const AdapterTree tree("usb-display");
     EXPECT_THAT(DisplayAdapters(),
                 ElementsAre("0000:00:02.0", "pci0000:00/0000:00:14.0/usb1/1-2/1-2:1.0"));
 }
 
-TEST(AdapterNameTest, AnNvidiaDeviceWithoutANodeIsTheDriversCard)
+TEST(AdapterNameTest, AnNvidiaDeviceWithoutANodeIsAssignedToTheDriversCard)
 {
     const AdapterTree tree("nvidia-no-drm");
     EXPECT_THAT(NvidiaAdapters({""}, {}), ElementsAre("0000:65:00.0"));
     EXPECT_THAT(NvidiaAdapters({"NVIDIA A100 80GB PCIe"}, {}), ElementsAre("0000:65:00.0"));
 }
 
-TEST(AdapterNameTest, WithoutTheDriversListTheOnlyCardOfTheVendorIsTheDevice)
+TEST(AdapterNameTest, WithoutTheDriversListASingleDeviceIsAssignedToASingleCard)
 {
     const AdapterTree tree("nvidia-no-drm");
     tree.remove("/proc/driver");
@@ -186,28 +186,28 @@ TEST(AdapterNameTest, WithoutTheDriversListTheOnlyCardOfTheVendorIsTheDevice)
     EXPECT_THAT(NvidiaAdapters({"", ""}, {}), ElementsAre("", ""));
 }
 
-TEST(AdapterNameTest, WithoutTheDriversListOneOfManyCardsCantBeTold)
+TEST(AdapterNameTest, WithoutTheDriversListSeveralCardsAreAmbiguous)
 {
     const AdapterTree tree("nvidia-eight");
     tree.remove("/proc/driver");
     EXPECT_THAT(NvidiaAdapters({""}, {}), ElementsAre(""));
 }
 
-TEST(AdapterNameTest, OtherVendorsCardsAreNoNvidiaDevices)
+TEST(AdapterNameTest, CardsOfOtherVendorsAreNotAssigned)
 {
     const AdapterTree tree("amd-discrete");
     EXPECT_THAT(NvidiaAdapters({""}, {}), ElementsAre(""));
     EXPECT_THAT(NvidiaAdapters({}, {}), IsEmpty());
 }
 
-TEST(AdapterNameTest, AsManyDevicesAsCardsGoToThemInOrder)
+TEST(AdapterNameTest, AsManyDevicesAsCardsAreAssignedInOrder)
 {
     const AdapterTree tree("nvidia-eight");
     EXPECT_EQ(NvidiaAdapters(Texts(8), {}), DisplayAdapters());
     EXPECT_EQ(NvidiaAdapters(Texts(7), {}), Texts(7));
 }
 
-TEST(AdapterNameTest, CardsThatOtherDevicesHaveAreNotGivenAgain)
+TEST(AdapterNameTest, TakenCardsAreNotAssigned)
 {
     const AdapterTree tree("nvidia-eight");
     const std::vector<std::string> all = DisplayAdapters();
@@ -215,7 +215,7 @@ TEST(AdapterNameTest, CardsThatOtherDevicesHaveAreNotGivenAgain)
     EXPECT_EQ(NvidiaAdapters(Texts(1), all), Texts(1));
 }
 
-TEST(AdapterNameTest, DevicesGoToTheCardsOfTheirNames)
+TEST(AdapterNameTest, DevicesAreAssignedByName)
 {
     const AdapterTree tree("nvidia-eight");
     tree.write("/proc/driver/nvidia/gpus/0000:43:00.0/information", "Model: NVIDIA A100\n");

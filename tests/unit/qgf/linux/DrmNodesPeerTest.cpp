@@ -1,4 +1,5 @@
-// libdrm lists the DRM devices of this machine too. Its answer is compared where there are any.
+// Compares DrmNodes with libdrm's list of this machine's DRM devices. Skipped without libdrm or
+// without a DRM node on PCI.
 #include <map>
 #include <memory>
 #include <set>
@@ -13,7 +14,7 @@
 namespace QGF {
 namespace {
 
-// "0000:01:00.0" as libdrm has it.
+// libdrm's address as the text "0000:01:00.0".
 std::string AddressOf(const drmPciBusInfo& bus)
 {
     char text[32];

@@ -25,7 +25,7 @@ Texts Places()
     return texts;
 }
 
-// A node of a device that has that driver, "" for none.
+// Adds a node of a device. `driver` is the device's driver, "" for none.
 void AddNode(const AdapterTree& tree, const std::string& name, const std::string& device,
              const std::string& driver)
 {
@@ -41,7 +41,7 @@ void AddNode(const AdapterTree& tree, const std::string& name, const std::string
     tree.refresh();
 }
 
-TEST(DrmNodesTest, ANodesAdapterIsTheOneItBelongsTo)
+TEST(DrmNodesTest, ANodeBelongsToItsAdapter)
 {
     const AdapterTree tree("server-bmc");
     EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "0000:02:00.0");
@@ -49,7 +49,7 @@ TEST(DrmNodesTest, ANodesAdapterIsTheOneItBelongsTo)
     EXPECT_EQ(AdapterOfDrmNode("/dev/dri/renderD128"), "0000:41:00.0");
 }
 
-TEST(DrmNodesTest, WhatIsNoNodeHasNoAdapter)
+TEST(DrmNodesTest, OtherFilesHaveNoAdapter)
 {
     const AdapterTree tree("amd-discrete");
     for (const char* file : {"", "/dev/dri/", "/dev/dri/card9", "/dev/dri/card", "/dev/dri/version",
@@ -68,7 +68,7 @@ TEST(DrmNodesTest, OnPciTheFunctionIsTheAdapter)
                                       "card2 0000:00:03.0 firmware"));
 }
 
-TEST(DrmNodesTest, AFirmwareFramebuffersNodeIsKnown)
+TEST(DrmNodesTest, AFirmwareFramebufferIsRecognised)
 {
     const AdapterTree tree("nvidia-firmware-drm");
     EXPECT_TRUE(IsFirmwareNode("/dev/dri/card0"));
@@ -78,7 +78,7 @@ TEST(DrmNodesTest, AFirmwareFramebuffersNodeIsKnown)
     EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), AdapterOfDrmNode("/dev/dri/card1"));
 }
 
-TEST(DrmNodesTest, OtherDevicesBelowOneAreAdaptersThemselves)
+TEST(DrmNodesTest, OtherDevicesBelowAFunctionAreAdapters)
 {
     const AdapterTree tree("empty");
     AddNode(tree, "card0", "pci0000:00/0000:00:14.0/usb1/1-2/1-2:1.0", "udl");
@@ -87,7 +87,7 @@ TEST(DrmNodesTest, OtherDevicesBelowOneAreAdaptersThemselves)
                                       "card1 pci0000:00/0000:00:15.0/virtionet"));
 }
 
-TEST(DrmNodesTest, WithoutPciTheDeviceIs)
+TEST(DrmNodesTest, OutsidePciTheDeviceIsTheAdapter)
 {
     const AdapterTree tree("empty");
     AddNode(tree, "card0", "platform/soc/fec00000.v3d", "v3d");
@@ -98,7 +98,7 @@ TEST(DrmNodesTest, WithoutPciTheDeviceIs)
     EXPECT_EQ(DrmNodes().at(0).device, "/sys/devices/platform/soc/fec00000.v3d");
 }
 
-TEST(DrmNodesTest, ADeviceWithoutADriverAndAFramebufferWithoutACardAreNone)
+TEST(DrmNodesTest, DevicesWithoutADriverAndFramebuffersWithoutACardAreLeftOut)
 {
     const AdapterTree tree("empty");
     AddNode(tree, "card0", "platform/vkms", "");
@@ -109,7 +109,7 @@ TEST(DrmNodesTest, ADeviceWithoutADriverAndAFramebufferWithoutACardAreNone)
     EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "");
 }
 
-TEST(DrmNodesTest, LinksToOtherPlacesAreNoNodes)
+TEST(DrmNodesTest, LinksToOtherPathsAreIgnored)
 {
     for (const char* target : {"", "card0", "../../devices/drm/card0", "../../devices//drm/card0",
                                "../../devices/platform/gpu/drm/card1", "/nowhere/at/all"}) {
@@ -122,7 +122,7 @@ TEST(DrmNodesTest, LinksToOtherPlacesAreNoNodes)
     }
 }
 
-TEST(DrmNodesTest, AnAdaptersFolderGoesByItsPlace)
+TEST(DrmNodesTest, AnAdaptersFolderDependsOnItsPlace)
 {
     EXPECT_EQ(AdapterFolder("0000:01:00.0"), "/sys/bus/pci/devices/0000:01:00.0/");
     EXPECT_EQ(AdapterFolder("platform/gpu"), "/sys/devices/platform/gpu/");

@@ -4,7 +4,7 @@
 
 namespace {
 
-TEST(OpenLibrary, OpensTheFirstThatIsThere)
+TEST(OpenLibrary, OpensTheFirstThatExists)
 {
     const char* const names[] = {"no-such-library.so", "libm.so.6", nullptr};
     const auto library = QGF::Core::OpenLibrary(names);

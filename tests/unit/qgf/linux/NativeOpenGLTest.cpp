@@ -1,4 +1,4 @@
-// The library on whatever OpenGL the machine has.
+// The library on the machine's own OpenGL. Skipped if there is none.
 #include <algorithm>
 #include <memory>
 #include <vector>
@@ -39,7 +39,7 @@ TEST_F(NativeOpenGL, EveryDeviceHasAName)
     }
 }
 
-TEST_F(NativeOpenGL, ContextAnswersAndLeavesNoError)
+TEST_F(NativeOpenGL, QueriesOfAContextLeaveNoError)
 {
     const OpenGLInterceptor& gl = OpenGLInterceptor::Instance();
     EXPECT_NE(gl.glGetString("", 0, 0x1F01), nullptr);
@@ -48,7 +48,7 @@ TEST_F(NativeOpenGL, ContextAnswersAndLeavesNoError)
     EXPECT_EQ(gl.glGetError("", 0), 0U);
 }
 
-TEST_F(NativeOpenGL, ExtensionQuestionsLeaveTheCallersErrorInPlace)
+TEST_F(NativeOpenGL, ExtensionQueriesKeepTheCallersError)
 {
     const OpenGLInterceptor& gl = OpenGLInterceptor::Instance();
     std::int32_t value = 0;
@@ -71,7 +71,7 @@ TEST_F(NativeOpenGL, FixedFunctionShaderCompilesAndLinks)
     EXPECT_NO_THROW(program.link(true));
 }
 
-TEST_F(NativeOpenGL, BrokenShaderGivesTheDriversLog)
+TEST_F(NativeOpenGL, BrokenShaderHasTheDriversLog)
 {
     const char* const vertex[] = {"void main(void){nonsense_name = 1.0;}"};
     Program program;
@@ -101,7 +101,7 @@ TEST_F(NativeOpenGL, FramebufferIsClearedWithoutError)
     EXPECT_EQ(gl.glGetError("", 0), 0U);
 }
 
-TEST_F(NativeOpenGL, ContextsOfOneDeviceEndIndependently)
+TEST_F(NativeOpenGL, ContextsOfOneDeviceAreIndependent)
 {
     auto other = std::make_unique<ContextOffscreen>(Context::PrimaryDisplayDevice());
     other->makeCurrent();
@@ -112,7 +112,7 @@ TEST_F(NativeOpenGL, ContextsOfOneDeviceEndIndependently)
     EXPECT_NE(OpenGLInterceptor::Instance().glGetString("", 0, 0x1F01), nullptr);
 }
 
-TEST_F(NativeOpenGL, UnknownDeviceIsRefused)
+TEST_F(NativeOpenGL, UnknownDeviceThrows)
 {
     EXPECT_THROW(ContextOffscreen{DisplayDeviceKey("no such device", "", "")},
                  QGF::LogicalException);

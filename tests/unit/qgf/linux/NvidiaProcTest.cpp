@@ -7,7 +7,7 @@
 namespace QGF {
 namespace {
 
-TEST(NvidiaProcTest, AFieldsValueHasNoBlanksAround)
+TEST(NvidiaProcTest, AFieldsValueIsTrimmed)
 {
     const std::string text = "Model: \t\t NVIDIA H100 80GB HBM3 \nIRQ:   \t\t 120\nEmpty:\nLast: x";
     EXPECT_EQ(NvidiaField(text, "Model"), "NVIDIA H100 80GB HBM3");
@@ -28,14 +28,14 @@ TEST(NvidiaProcTest, TheModelIsTheDriversText)
     EXPECT_EQ(NvidiaModel("0000:02:00.0"), "");
 }
 
-TEST(NvidiaProcTest, AnUnknownModelIsNone)
+TEST(NvidiaProcTest, UnknownIsNotAModel)
 {
     const AdapterTree tree("nvidia-drm");
     tree.write("/proc/driver/nvidia/gpus/0000:01:00.0/information", "Model: \t\t Unknown\n");
     EXPECT_EQ(NvidiaModel("0000:01:00.0"), "");
 }
 
-TEST(NvidiaProcTest, ASleepingCardIsNotAsked)
+TEST(NvidiaProcTest, ASuspendedCardIsNotRead)
 {
     const AdapterTree tree("nvidia-drm");
     const std::string power =
@@ -50,7 +50,7 @@ TEST(NvidiaProcTest, ASleepingCardIsNotAsked)
     }
 }
 
-TEST(NvidiaProcTest, TheDriversCardsAreItsFolders)
+TEST(NvidiaProcTest, CardsAreTheFoldersOfTheDriver)
 {
     const AdapterTree tree("nvidia-eight");
     tree.write("/proc/driver/nvidia/gpus/other", "");

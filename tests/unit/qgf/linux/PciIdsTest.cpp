@@ -23,7 +23,7 @@ const char kText[] = "# comment\n"
                      "C 03  Display controller\n"
                      "\t00  VGA compatible controller\n";
 
-TEST(PciIdsTest, ADevicesNameIsItsVendorsAndItsOwn)
+TEST(PciIdsTest, ANameConsistsOfVendorAndDevice)
 {
     EXPECT_EQ(FindPciName(kText, 0x1002, 0x744C),
               "Advanced Micro Devices, Inc. [AMD/ATI] Navi 31 [Radeon RX 7900 XT/7900 XTX]");
@@ -46,7 +46,7 @@ TEST(PciIdsTest, DeviceClassesAreNoVendors)
     EXPECT_EQ(FindPciName("C 03  Display\n\t0000  VGA\n", 0xC003, 0), "");
 }
 
-TEST(PciIdsTest, LineEndsAndBlanksAreNoPartOfAName)
+TEST(PciIdsTest, LineEndsAndBlanksAreTrimmed)
 {
     EXPECT_EQ(FindPciName("1002  A \r\n\t744c  B \r\n", 0x1002, 0x744C), "A B");
     EXPECT_EQ(FindPciName("1002  A\n\t744c  B", 0x1002, 0x744C), "A B");
@@ -60,7 +60,7 @@ TEST(PciIdsTest, TruncatedTextsHaveNoName)
     }
 }
 
-TEST(PciIdsTest, AMachinesOwnDatabaseIsReadFromEitherPlace)
+TEST(PciIdsTest, TheDatabaseIsReadFromEitherPath)
 {
     const AdapterTree tree("empty");
     tree.remove("/usr");
@@ -71,7 +71,7 @@ TEST(PciIdsTest, AMachinesOwnDatabaseIsReadFromEitherPlace)
     EXPECT_EQ(PciIds().name(0x1002, 0x744C), "A B");
 }
 
-// Both ways to a name must lead to the same one.
+// libpciaccess and FindPciName must return the same names.
 TEST(PciIdsTest, TheLibraryAndTheTextAgree)
 {
     std::string database;

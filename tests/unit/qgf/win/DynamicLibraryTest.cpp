@@ -16,7 +16,7 @@ bool Opens(const char* name)
     }
 }
 
-TEST(OpenLibrary, OpensTheFirstThatIsThere)
+TEST(OpenLibrary, OpensTheFirstThatExists)
 {
     const char* const names[] = {"no-such-library", "version.dll", nullptr};
     const auto library = QGF::Core::OpenLibrary(names);
@@ -24,8 +24,8 @@ TEST(OpenLibrary, OpensTheFirstThatIsThere)
     EXPECT_EQ(library->getProc("NoSuchFunction"), nullptr);
 }
 
-// A library that only the folder of the program has, as a copy of one of the system's.
-TEST(OpenLibrary, TakesNothingFromTheProgramsFolder)
+// The library exists only in the program's folder; it is a copy of a system library.
+TEST(OpenLibrary, IgnoresTheProgramsFolder)
 {
     wchar_t system[MAX_PATH] = {};
     ASSERT_NE(GetSystemDirectoryW(system, MAX_PATH), 0U);
@@ -36,7 +36,7 @@ TEST(OpenLibrary, TakesNothingFromTheProgramsFolder)
     ASSERT_NE(CopyFileW((std::wstring(system) + L"\\version.dll").c_str(), copy.c_str(), FALSE), 0);
     EXPECT_FALSE(Opens("qgf-planted-test.dll"));
     const HMODULE found = LoadLibraryW(L"qgf-planted-test.dll");
-    EXPECT_NE(found, nullptr) << "it wasn't there to be found";
+    EXPECT_NE(found, nullptr) << "the copy can't be loaded at all";
     if (found != nullptr)
         FreeLibrary(found);
     DeleteFileW(copy.c_str());

@@ -10,20 +10,20 @@ namespace {
 constexpr char kDevice[] = "\\\\.\\DISPLAY1";
 constexpr wchar_t kClass[] = L"QGFHiddenWindow";
 
-// A message as another program's broadcast sends it, while this thread does nothing but wait.
+// Sends a message from another thread, as a broadcast does, while this thread only waits.
 bool IsAnswered(HWND window, UINT message)
 {
-    constexpr UINT kPatience = 10'000;
+    constexpr UINT kTimeoutMs = 10'000;
     return std::async(std::launch::async,
                       [&] {
                           DWORD_PTR answer = 0;
-                          return SendMessageTimeoutW(window, message, 0, 0, SMTO_NORMAL, kPatience,
+                          return SendMessageTimeoutW(window, message, 0, 0, SMTO_NORMAL, kTimeoutMs,
                                                      &answer) != 0;
                       })
         .get();
 }
 
-TEST(HiddenWindow, AnswersBroadcastsWhileItsMakerIsBusy)
+TEST(HiddenWindow, AnswersBroadcastsWhileItsThreadIsBusy)
 {
     const HiddenWindow window(kDevice);
     const HWND handle = WindowFromDC(window.dc());
@@ -32,7 +32,7 @@ TEST(HiddenWindow, AnswersBroadcastsWhileItsMakerIsBusy)
     EXPECT_TRUE(IsAnswered(handle, WM_QUERYENDSESSION));
 }
 
-TEST(HiddenWindow, StaysWhenProgramsAreAskedToClose)
+TEST(HiddenWindow, IgnoresClose)
 {
     const HiddenWindow window(kDevice);
     const HWND handle = WindowFromDC(window.dc());
@@ -41,7 +41,7 @@ TEST(HiddenWindow, StaysWhenProgramsAreAskedToClose)
     EXPECT_EQ(IsWindowVisible(handle), 0);
 }
 
-TEST(HiddenWindow, GoesWithItsObject)
+TEST(HiddenWindow, IsDestroyedWithItsObject)
 {
     {
         const HiddenWindow first(kDevice);
