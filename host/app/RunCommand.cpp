@@ -3,7 +3,6 @@
 #include <utility>
 
 #include <fmt/format.h>
-#include <nlohmann/json.hpp>
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
@@ -53,14 +52,14 @@ public:
     void Start(const std::vector<std::string>& command)
     {
         if (fChoice.fFormat == Format::kJsonLines)
-            WriteEvent([command] { return MakeStartEvent(command); });
+            fWriter.Write([command] { return MakeStartEvent(command); });
     }
 
     void OnLine(const ReportLine& line, double seconds) override
     {
         fSequence.Add(line);
         if (fChoice.fFormat == Format::kJsonLines)
-            WriteEvent([kept = ShortenLine(line), seconds] {
+            fWriter.Write([kept = ShortenLine(line), seconds] {
                 return MakeLineEvent(RestoreLine(kept), seconds);
             });
         else
@@ -72,7 +71,7 @@ public:
     void OnErrorLine(const std::string& line, double seconds) override
     {
         if (fChoice.fFormat == Format::kJsonLines)
-            WriteEvent([line, seconds] { return MakeErrorLineEvent(line, seconds); });
+            fWriter.Write([line, seconds] { return MakeErrorLineEvent(line, seconds); });
         if (fChoice.fRaw)
             fWriter.WriteError(line + "\n");
     }
@@ -88,7 +87,7 @@ public:
     {
         switch (fChoice.fFormat) {
         case Format::kJsonLines:
-            WriteEvent([outcome] { return MakeEndEvent(outcome); });
+            fWriter.Write([outcome] { return MakeEndEvent(outcome); });
             break;
         case Format::kJson:
             fWriter.WriteLarge([report = TakeReport(), outcome](std::ostream& out) {
@@ -110,12 +109,6 @@ private:
     std::shared_ptr<const Report> TakeReport()
     {
         return std::make_shared<const Report>(std::move(fReport));
-    }
-
-    template <class MakeEvent>
-    void WriteEvent(MakeEvent makeEvent)
-    {
-        fWriter.Write([makeEvent = std::move(makeEvent)] { return makeEvent().dump() + "\n"; });
     }
 
     const RunChoice& fChoice;

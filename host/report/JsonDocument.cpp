@@ -331,6 +331,11 @@ bool SkipLine(std::streambuf& bytes)
     return next == '\n';
 }
 
+std::string ToEvent(const Json& event)
+{
+    return event.dump() + "\n";
+}
+
 } // namespace
 
 void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome)
@@ -359,17 +364,17 @@ void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& ou
     out << '\n';
 }
 
-nlohmann::ordered_json MakeStartEvent(const std::vector<std::string>& command)
+std::string MakeStartEvent(const std::vector<std::string>& command)
 {
-    return {
+    return ToEvent({
         {"event", "start"},
         {"seconds", 0.0},
         {"schema", kSchemaVersion},
         {"command", MakeTexts(command)},
-    };
+    });
 }
 
-nlohmann::ordered_json MakeLineEvent(const ReportLine& line, double seconds)
+std::string MakeLineEvent(const ReportLine& line, double seconds)
 {
     Json event = {{"event", "line"}, {"seconds", MakeSeconds(seconds)}};
     event.update(MakeLine(line));
@@ -377,21 +382,22 @@ nlohmann::ordered_json MakeLineEvent(const ReportLine& line, double seconds)
         event["key"] = MakeText(line.fKey);
         event["value"] = MakeText(line.fValue);
     }
-    return event;
+    return ToEvent(event);
 }
 
-nlohmann::ordered_json MakeErrorLineEvent(const std::string& line, double seconds)
+std::string MakeErrorLineEvent(const std::string& line, double seconds)
 {
-    return {{"event", "error"}, {"seconds", MakeSeconds(seconds)}, {"text", MakeText(line)}};
+    return ToEvent(
+        {{"event", "error"}, {"seconds", MakeSeconds(seconds)}, {"text", MakeText(line)}});
 }
 
-nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome)
+std::string MakeEndEvent(const RunOutcome& outcome)
 {
-    return {
+    return ToEvent({
         {"event", "end"},
         {"seconds", MakeSeconds(outcome.fSeconds)},
         {"outcome", MakeOutcome(outcome)},
-    };
+    });
 }
 
 Report ReadDocument(std::istream& text)

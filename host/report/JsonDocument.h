@@ -10,8 +10,6 @@
 #include <string>
 #include <vector>
 
-#include <nlohmann/json_fwd.hpp>
-
 #include "report/Report.h"
 #include "report/RunOutcome.h"
 
@@ -23,11 +21,12 @@ constexpr int kSchemaVersion = 1;
 // Writes the document piece by piece, and a line end after it.
 void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome);
 
-// Events; each has "event" and "seconds" (since the launch).
-nlohmann::ordered_json MakeStartEvent(const std::vector<std::string>& command);
-nlohmann::ordered_json MakeLineEvent(const ReportLine& line, double seconds);
-nlohmann::ordered_json MakeErrorLineEvent(const std::string& line, double seconds);
-nlohmann::ordered_json MakeEndEvent(const RunOutcome& outcome);
+// Events, each an object on one line, with its line end. It has "event" and "seconds" (since the
+// launch).
+std::string MakeStartEvent(const std::vector<std::string>& command);
+std::string MakeLineEvent(const ReportLine& line, double seconds);
+std::string MakeErrorLineEvent(const std::string& line, double seconds);
+std::string MakeEndEvent(const RunOutcome& outcome);
 
 // Reads the report from its document, and holds only the report's part of it. Throws
 // std::runtime_error with what is wrong with the document.

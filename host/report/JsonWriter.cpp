@@ -1,5 +1,7 @@
 #include "report/JsonWriter.h"
 
+#include <nlohmann/json.hpp>
+
 namespace assay_host {
 
 namespace {

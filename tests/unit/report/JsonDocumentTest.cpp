@@ -328,16 +328,16 @@ TEST(JsonEvents, HaveTheirForms)
 
 std::string Events(const std::string& report)
 {
-    std::string text = MakeStartEvent({"assay"}).dump() + "\n";
+    std::string text = MakeStartEvent({"assay"});
     for (const ReportLine& line : ReadLines(report))
-        text += MakeLineEvent(line, 0.5).dump() + "\n";
-    return text + MakeErrorLineEvent("x", 1).dump() + "\n";
+        text += MakeLineEvent(line, 0.5);
+    return text + MakeErrorLineEvent("x", 1);
 }
 
 TEST(JsonEvents, GiveTheReportBack)
 {
     const std::string report = Sample(1, 1).GetText() + "a=\"\xFF\n\"\r\n# log\nraw";
-    const std::string text = Events(report) + MakeEndEvent(GoodOutcome()).dump() + "\n";
+    const std::string text = Events(report) + MakeEndEvent(GoodOutcome());
     SaveText(text, ".jsonl");
     EXPECT_EQ(ReadEvents(text).ToText(), report);
 }
@@ -357,7 +357,7 @@ TEST(JsonEvents, RefuseWhatIsNoEvent)
         std::string fText;
         const char* fMessage;
     };
-    const std::string start = MakeStartEvent({}).dump() + "\n";
+    const std::string start = MakeStartEvent({});
     const Row rows[] = {
         {"{}", "line 1: \"event\" is missing"},
         {"[]\n", "line 1 is not a JSON object"},

@@ -57,10 +57,10 @@ std::string Load(const std::string& text)
 
 std::string MakeEvents(const std::string& text)
 {
-    std::string events = MakeStartEvent({"assay"}).dump() + "\n";
+    std::string events = MakeStartEvent({"assay"});
     for (const ReportLine& line : ReadLines(text))
-        events += MakeLineEvent(line, 1).dump() + "\n";
-    return events + MakeEndEvent({}).dump() + "\n";
+        events += MakeLineEvent(line, 1);
+    return events + MakeEndEvent({});
 }
 
 TEST(ReportFile, GivesTheReportOfEachForm)
@@ -106,7 +106,7 @@ TEST(ReportFile, RefusesWhatIsTooLargeBeforeItIsHeld)
     EXPECT_EQ(LoadFailure("{\"a\": \"" + large + "\"}"), "too large for a report");
     EXPECT_EQ(LoadFailure("{\n\"a\": " + std::string(large.size(), '1') + "}"),
               "too large for a report");
-    EXPECT_EQ(LoadFailure(MakeStartEvent({}).dump() + "\n{\"event\": \"" + large + "\"}\n"),
+    EXPECT_EQ(LoadFailure(MakeStartEvent({}) + "{\"event\": \"" + large + "\"}\n"),
               "too large for a report");
     EXPECT_EQ(LoadFailure(std::string(large.size(), '\n')),
               "lines too long, or too many, for a report");

@@ -64,11 +64,10 @@ inline Json SaveDocument(const Json& document)
     return Json::parse(text);
 }
 
-inline Json SaveEvent(const Json& event)
+inline Json SaveEvent(const std::string& event)
 {
-    const std::string text = event.dump() + "\n";
-    SaveText(text, ".jsonl");
-    return Json::parse(text);
+    SaveText(event, ".jsonl");
+    return Json::parse(event);
 }
 
 } // namespace assay_host
