@@ -1,4 +1,4 @@
-#include "Script.h"
+#include "common/Script.h"
 
 #include <fcntl.h>
 #include <unistd.h>

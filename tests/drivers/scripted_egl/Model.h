@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-#include "../common/Script.h"
+#include "common/Script.h"
 
 namespace scripted {
 

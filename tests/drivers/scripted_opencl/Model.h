@@ -9,8 +9,8 @@
 #include <string>
 #include <vector>
 
-#include "../common/Script.h"
 #include "Handles.h"
+#include "common/Script.h"
 
 namespace scripted {
 

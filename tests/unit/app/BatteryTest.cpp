@@ -3,8 +3,8 @@
 
 #include <gmock/gmock.h>
 
+#include "AppFixtures.h"
 #include "GPUTest.h"
-#include "app/AppFixtures.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/System.h"
 #include "pmutil_gpu/GPUImplHardware.h"

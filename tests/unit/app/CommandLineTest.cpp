@@ -2,7 +2,7 @@
 
 #include <gmock/gmock.h>
 
-#include "app/AppFixtures.h"
+#include "AppFixtures.h"
 
 namespace assay {
 namespace {

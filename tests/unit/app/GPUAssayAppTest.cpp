@@ -7,9 +7,9 @@
 
 #include <gmock/gmock.h>
 
+#include "AppFixtures.h"
 #include "PixmereAssay.h"
 #include "RunToStatus.h"
-#include "app/AppFixtures.h"
 #include "pmutil/LogSinks.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil_gpu/GPUImplHardware.h"

@@ -7,9 +7,9 @@
 
 #include <gmock/gmock.h>
 
+#include "AppFixtures.h"
 #include "GPUTest.h"
 #include "Timestamp.h"
-#include "app/AppFixtures.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil_gpu/GPUImplHardware.h"
 

@@ -3,8 +3,8 @@
 
 #include <gmock/gmock.h>
 
+#include "AppFixtures.h"
 #include "StartOpenCL.h"
-#include "app/AppFixtures.h"
 #include "pmutil_gpu/GPUImplHardware.h"
 #include "qgf/OCL.h"
 #include "support/CapturedLog.h"

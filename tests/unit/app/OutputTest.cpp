@@ -4,7 +4,7 @@
 
 #include <gmock/gmock.h>
 
-#include "app/AppFixtures.h"
+#include "AppFixtures.h"
 
 namespace assay {
 namespace {

@@ -9,7 +9,7 @@
 #include <boost/thread/thread.hpp>
 #include <gmock/gmock.h>
 
-#include "pmutil/FreshProcess.h"
+#include "FreshProcess.h"
 #include "pmutil/PMLogging.h"
 
 namespace pmutil {

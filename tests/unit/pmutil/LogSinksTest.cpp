@@ -4,10 +4,10 @@
 
 #include <gmock/gmock.h>
 
+#include "RecordingLogger.h"
+#include "TempFolder.h"
 #include "all/PathCodecvt.h"
-#include "pmutil/RecordingLogger.h"
 #include "pmutil/System.h"
-#include "pmutil/TempFolder.h"
 
 namespace pmutil {
 namespace {

@@ -11,9 +11,9 @@
 #include <boost/thread/thread.hpp>
 #include <gmock/gmock.h>
 
-#include "pmutil/FreshProcess.h"
+#include "FreshProcess.h"
+#include "RecordingLogger.h"
 #include "pmutil/LogSinks.h"
-#include "pmutil/RecordingLogger.h"
 #include "pmutil/System.h"
 #include "pmutil/Threads.h"
 

@@ -4,7 +4,7 @@
 
 #include <gmock/gmock.h>
 
-#include "pmutil/TempFolder.h"
+#include "TempFolder.h"
 
 namespace pmutil {
 namespace {

@@ -5,7 +5,7 @@
 #include <boost/thread/thread.hpp>
 #include <gmock/gmock.h>
 
-#include "pmutil/RecordingLogger.h"
+#include "RecordingLogger.h"
 #include "pmutil/System.h"
 
 namespace pmutil {

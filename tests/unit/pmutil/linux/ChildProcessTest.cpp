@@ -7,8 +7,8 @@
 #include <sys/resource.h>
 #include <unistd.h>
 
-#include "../OpenThings.h"
-#include "../Throws.h"
+#include "OpenThings.h"
+#include "Throws.h"
 #include "linux/CallFailure.h"
 #include "pmutil/PosixHandle.h"
 

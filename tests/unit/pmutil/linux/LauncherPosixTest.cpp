@@ -17,10 +17,10 @@
 #include <thread>
 #include <unistd.h>
 
-#include "../OpenThings.h"
-#include "../Throws.h"
-#include "../Waits.h"
+#include "OpenThings.h"
 #include "TestChild.h"
+#include "Throws.h"
+#include "Waits.h"
 #include "pmutil/PosixHandle.h"
 
 using namespace pmutil;

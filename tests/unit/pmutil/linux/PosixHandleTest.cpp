@@ -14,7 +14,7 @@
 #include <thread>
 #include <unistd.h>
 
-#include "../HandleChannelTests.h"
+#include "HandleChannelTests.h"
 
 using namespace pmutil;
 

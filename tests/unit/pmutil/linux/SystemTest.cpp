@@ -15,9 +15,9 @@
 #include <boost/thread/thread.hpp>
 #include <gmock/gmock.h>
 
-#include "pmutil/FreshProcess.h"
+#include "FreshProcess.h"
+#include "TempFolder.h"
 #include "pmutil/LogSinks.h"
-#include "pmutil/TempFolder.h"
 #include "pmutil/Threads.h"
 
 namespace pmutil {

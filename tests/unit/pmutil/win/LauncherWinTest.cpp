@@ -8,10 +8,10 @@
 
 #include <boost/filesystem/operations.hpp>
 
-#include "../OpenThings.h"
-#include "../TempFolder.h"
-#include "../Throws.h"
+#include "OpenThings.h"
+#include "TempFolder.h"
 #include "TestChild.h"
+#include "Throws.h"
 #include "pmutil/WinHandle.h"
 
 using namespace pmutil;

@@ -1,4 +1,4 @@
-#include "../OpenThings.h"
+#include "OpenThings.h"
 
 #include <windows.h>
 

@@ -3,8 +3,8 @@
 #include <windows.h>
 #include <winioctl.h>
 
-#include "../HandleChannelTests.h"
-#include "../Throws.h"
+#include "HandleChannelTests.h"
+#include "Throws.h"
 #include "pmutil/Fmt.h"
 
 using namespace pmutil;
