@@ -7,7 +7,7 @@ import bisect
 import re
 
 PLATFORMS = {"linux", "win"}
-KEYS = ("program", "filter", "effect", "platform", "texts")
+KEYS = ("program", "filter", "effect", "platform", "texts", "each")
 
 TOKEN = re.compile(r"""
     (?P<text>(?:u8|[uUL])?(?:R"(?P<mark>[^()\\\s]*)\(.*?\)(?P=mark)"|"(?:\\.|[^"\\\n])*"))
@@ -78,13 +78,27 @@ class Tree:
 
 
 class Change:
-    """One change: its program, filter and so on, and `edit(tree)`, the new texts by path."""
+    """One change of a patch: its program, filter and so on, and `edit(tree)`, the new texts by path."""
 
-    def __init__(self, name, keys, edit):
-        self.name = name
+    all_at_once = None
+
+    def __init__(self, patch, name, keys, edit):
+        self.patch, self.name = patch, name
         self.program, self.filter, self.effect = (keys[key] for key in ("program", "filter", "effect"))
         self.platform = keys.get("platform", "linux")
         self.edit = edit
+
+
+class TextChange(Change):
+    """One letter more in one literal. All those of one patch have the same `all_at_once(tree)`: texts in
+    which the variable SWITCH chooses at run time, by `number`, which of them is made."""
+
+    SWITCH = "ASSAY_NAMED_TEXT"
+
+    def __init__(self, patch, name, keys, edit, number, all_at_once):
+        super().__init__(patch, name, keys, edit)
+        self.number = number
+        self.all_at_once = all_at_once
 
 
 def load(path, tree):
@@ -100,7 +114,11 @@ def load(path, tree):
     found = [hunk for file in re.split(r"^--- ", diff, flags=re.M) for hunk in hunks(file)]
     if not found:
         raise Misfit(f"{path.name}: changes nothing")
-    return [Change(path.stem, keys, lambda tree: apply_hunks(tree, found))]
+    if "each" in keys:
+        return [Change(path.stem, f"{path.stem} {number}", keys,
+                       lambda tree, hunk=hunk: apply_hunks(tree, [hunk]))
+                for number, hunk in enumerate(found, 1)]
+    return [Change(path.stem, path.stem, keys, lambda tree: apply_hunks(tree, found))]
 
 
 def hunks(file):
@@ -123,23 +141,76 @@ def apply_hunks(tree, found):
     return result
 
 
+def texts_behind(text, last):
+    """(literal, offset) of each up to the bracket that closes `last`, or to the end of the statement."""
+    in_bracket = last in "([{"
+    depth = 1
+    for token, offset, kind in tokens(text):
+        if token in ("(", "[", "{"):
+            depth += 1
+        elif token in (")", "]", "}"):
+            depth -= 1
+        if depth == 0 if in_bracket else token == ";":
+            return
+        if kind == "text":
+            yield token, offset
+
+
 def text_changes(name, keys, paths, tree):
-    """One change for each literal of each statement that begins as `texts` says: it gets a letter
-    more."""
+    """One change for each literal behind each place that matches `texts`."""
     found = []
     for path in map(tree.find, paths):
         text = tree.read(path)
         for start in re.finditer(keys["texts"], text):
-            for token, offset, kind in tokens(text[start.start():]):
-                if token == ";":
-                    break
-                if kind == "text":
-                    found.append((path, token, start.start() + offset))
+            found += [(path, start.end() + offset, token)
+                      for token, offset in texts_behind(text[start.end():], start[0][-1])]
     if not found:
         raise Misfit(f"{name}: no text")
-    for path, token, offset in found:
+
+    def all_at_once(tree):
+        return {path: switched(tree.read(path), {offset: number for number, (there, offset, _)
+                                                 in enumerate(found) if there == path})
+                for path, _, _ in found}
+
+    for number, (path, offset, token) in enumerate(found):
         base, line = path.rsplit("/", 1)[-1], tree.read(path).count("\n", 0, offset) + 1
-        at = offset + re.match(r'\w*?R"[^(]*\(|\w*"', token).end()
-        yield Change(f"{name} {base}:{line} {token}", keys,
-                     lambda tree, path=path, at=at: {
-                         path: tree.read(path)[:at] + "x" + tree.read(path)[at:]})
+
+        def edit(tree, path=path, offset=offset, token=token):
+            text = tree.read(path)
+            return {path: text[:offset] + lengthened(token) + text[offset + len(token):]}
+
+        yield TextChange(name, f"{name} {base}:{line} {token}", keys, edit, number, all_at_once)
+
+
+def lengthened(literal):
+    at = re.match(r'\w*?R"[^(]*\(|\w*"', literal).end()
+    return literal[:at] + "x" + literal[at:]
+
+
+def switched(text, numbers):
+    """The text in which each literal at one of the offsets can be lengthened at run time."""
+    runs = []  # of literals that the compiler joins, and macros behind them
+    in_run = False
+    for token in tokens(text):
+        if in_run and (token[2] == "text" or re.fullmatch(r"[A-Z]\w*", token[0])):
+            runs[-1].append(token)
+        else:
+            in_run = token[2] == "text"
+            if in_run:
+                runs.append([token])
+    for run in reversed(runs):
+        begin, end = run[0][1], run[-1][1] + len(run[-1][0])
+        choices = [(numbers[offset], " ".join(lengthened(token) if there == offset else token
+                                              for token, there, _ in run))
+                   for _, offset, _ in run if offset in numbers]
+        if choices:
+            text = (text[:begin] + "(" + "".join(f"::NamedText({number}) ? {choice} : "
+                                                 for number, choice in choices)
+                    + text[begin:end] + ")" + text[end:])
+    return f"""#include <cstdlib>
+static bool NamedText(int number)
+{{
+    static const char* const chosen = std::getenv("{TextChange.SWITCH}");
+    return chosen != nullptr && std::atoi(chosen) == number;
+}}
+{text}"""

@@ -92,13 +92,64 @@ def test_a_file_that_moved_is_found_by_its_name_and_platform(tmp_path):
 
 def test_each_text_is_a_change(tmp_path):
     (tmp_path / "host").mkdir()
-    (tmp_path / "host" / "f.cpp").write_text('LOG("a" << 1 << R"(b)");\nother("c");\nLOG(u"d");\n')
+    (tmp_path / "host" / "f.cpp").write_text('LOG("a" << g("b")).more(R"(c)");\nother("d");\nLOG(u"e");\n')
+
+    def new_lines(regex):
+        patch = tmp_path / "log.patch"
+        patch.write_text(f"# program: p\n# filter: f\n# effect: e\n# texts: {regex}\n--- a/host/f.cpp\n"
+                         "+++ b/host/f.cpp\n")
+        tree = Tree(tmp_path)
+        before = tree.read("host/f.cpp").splitlines()
+        for change in load(patch, tree):
+            after = change.edit(tree)["host/f.cpp"].splitlines()
+            yield from (line for line in after if line not in before)
+
+    assert list(new_lines(r"LOG\(")) == ['LOG("xa" << g("b")).more(R"(c)");',
+                                         'LOG("a" << g("xb")).more(R"(c)");', 'LOG(u"xe");']
+    assert list(new_lines("LOG")) == ['LOG("xa" << g("b")).more(R"(c)");',
+                                      'LOG("a" << g("xb")).more(R"(c)");',
+                                      'LOG("a" << g("b")).more(R"(xc)");', 'LOG(u"xe");']
+
+
+def test_texts_can_be_changed_at_run_time(tmp_path):
+    program = """\
+#include <iostream>
+#define NAME "n"
+void print(const char* text) { std::cout << text; }
+const char* const table[] = {"a", "b"};
+int main() { print("c" NAME "d"); print(table[0]); print(table[1]); }
+"""
+    (tmp_path / "host").mkdir()
+    (tmp_path / "host" / "f.cpp").write_text(program)
     patch = tmp_path / "log.patch"
-    patch.write_text("# program: p\n# filter: f\n# effect: e\n# texts: LOG\\(\n--- a/host/f.cpp\n"
-                     "+++ b/host/f.cpp\n")
+    patch.write_text("# program: p\n# filter: f\n# effect: e\n# texts: print\\(|table\\[\\] = \\{\n"
+                     "--- a/host/f.cpp\n+++ b/host/f.cpp\n")
     tree = Tree(tmp_path)
     changes = load(patch, tree)
-    assert [change.edit(tree)["host/f.cpp"].splitlines() for change in changes] == [
-        ['LOG("xa" << 1 << R"(b)");', 'other("c");', 'LOG(u"d");'],
-        ['LOG("a" << 1 << R"(xb)");', 'other("c");', 'LOG(u"d");'],
-        ['LOG("a" << 1 << R"(b)");', 'other("c");', 'LOG(u"xd");']]
+    (tmp_path / "all.cpp").write_text(changes[0].all_at_once(tree)["host/f.cpp"])
+    subprocess.run(["c++", "all.cpp", "-o", "all"], cwd=tmp_path, check=True)
+
+    def printed(**variables):
+        return subprocess.run([tmp_path / "all"], env=variables, capture_output=True, text=True,
+                              check=True).stdout
+
+    assert printed() == "cndab"
+    assert [printed(**{change.SWITCH: str(change.number)}) for change in changes] == [
+        "cndxab", "cndaxb", "xcndab", "cnxdab"]
+
+
+def test_each_hunk_can_be_a_change(tmp_path):
+    file = tmp_path / "pmutil" / "all" / "f.cpp"
+    file.parent.mkdir(parents=True)
+    file.write_text(TEXT)
+    patch = tmp_path / "both.patch"
+    diff = diff_of("-    return n + 1;", "+    return 1;", "@@", "-    return n + 2;", "+    return 2;")
+
+    def results(head):
+        patch.write_text(f"# program: p\n# filter: f\n# effect: e\n{head}{diff}")
+        return [change.edit(Tree(tmp_path))["pmutil/all/f.cpp"] for change in load(patch, Tree(tmp_path))]
+
+    one = TEXT.replace("n + 1; // one more", "1;")
+    two = TEXT.replace("n + 2", "2")
+    assert results("# each: hunk\n") == [one, two]
+    assert results("") == [one.replace("n + 2", "2")]
