@@ -1,0 +1,226 @@
+// The end of a run whose child's output goes on: what still waits in the queue is taken, and who
+// brings more is kept no longer.
+#include <gtest/gtest.h>
+
+#include <boost/make_shared.hpp>
+#include <boost/thread/condition_variable.hpp>
+#include <boost/thread/lock_guard.hpp>
+#include <boost/thread/mutex.hpp>
+#include <chrono>
+#include <deque>
+#include <functional>
+#include <stdexcept>
+#include <vector>
+
+#include "pmutil/Reader.h"
+#include "supervise/ChildRun.h"
+
+namespace assay_host {
+namespace {
+
+// A stream that brings what the test feeds, and waits for it.
+class FedReader : public pmutil::Reader {
+public:
+    ~FedReader() override = default;
+
+    void Feed(std::string piece)
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fPieces.push_back(std::move(piece));
+        fCond.notify_all();
+    }
+
+    void End()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fEnded = true;
+        fCond.notify_all();
+    }
+
+    int CountAsked()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        return fAsked;
+    }
+
+    // False if it isn't asked so many times within a minute.
+    bool AwaitAsked(int times)
+    {
+        boost::unique_lock<boost::mutex> lock(fMutex);
+        return fCond.timed_wait(lock, boost::posix_time::minutes(1),
+                                [&] { return fAsked >= times; });
+    }
+
+    bool AwaitClosed()
+    {
+        boost::unique_lock<boost::mutex> lock(fMutex);
+        return fCond.timed_wait(lock, boost::posix_time::minutes(1), [this] { return !fOpen; });
+    }
+
+protected:
+    void BinioClose() override
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fOpen = false;
+        fCond.notify_all();
+    }
+    bool BinioIsOpen() const override
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        return fOpen;
+    }
+    std::uint64_t BinioReadSome(void* bytes, std::uint64_t /*nbytes*/) override
+    {
+        boost::unique_lock<boost::mutex> lock(fMutex);
+        ++fAsked;
+        fCond.notify_all();
+        fCond.wait(lock, [this] { return fEnded || !fPieces.empty(); });
+        if (fPieces.empty())
+            return 0;
+        const std::string piece = fPieces.front();
+        fPieces.pop_front();
+        piece.copy(static_cast<char*>(bytes), piece.size());
+        return piece.size();
+    }
+
+private:
+    mutable boost::mutex fMutex;
+    boost::condition_variable fCond;
+    std::deque<std::string> fPieces;
+    bool fOpen = true;
+    bool fEnded = false;
+    int fAsked = 0;
+};
+
+// Its child lives until the test ends it, and a kill is only counted.
+class FedLauncher : public pmutil::Launcher {
+public:
+    pmutil::LaunchResult Launch(const std::wstring& /*program*/,
+                                const std::deque<std::string>& /*args*/) override
+    {
+        pmutil::LaunchResult result;
+        result.fAppOutput[1] = fOut;
+        result.fAppOutput[2] = fErr;
+        return result;
+    }
+    pmutil::WaitResult Wait(int* exitCode) override
+    {
+        boost::unique_lock<boost::mutex> lock(fMutex);
+        fCond.wait(lock, [this] { return fEnded; });
+        *exitCode = 0;
+        return pmutil::kEndedNormally;
+    }
+    void Kill() override
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        ++fKills;
+    }
+    void End()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fEnded = true;
+        fCond.notify_all();
+    }
+    int CountKills()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        return fKills;
+    }
+
+    const boost::shared_ptr<FedReader> fOut = boost::make_shared<FedReader>();
+    const boost::shared_ptr<FedReader> fErr = boost::make_shared<FedReader>();
+
+private:
+    boost::mutex fMutex;
+    boost::condition_variable fCond;
+    bool fEnded = false;
+    int fKills = 0;
+};
+
+class ChildRunQueue : public testing::Test, public RunObserver {
+protected:
+    ChildRunQueue()
+    {
+        fOptions.fProgram = "fed";
+        fOptions.fTimeoutSeconds = 30;
+        fTimes.fNow = [this] { return fNow; };
+        fTimes.fKillGrace = RunTimes::Seconds(0);
+    }
+
+    // The threads of the run must not outlive the test.
+    ~ChildRunQueue() override
+    {
+        fLauncher->End();
+        for (const auto& reader : {fLauncher->fOut, fLauncher->fErr}) {
+            reader->End();
+            EXPECT_TRUE(reader->AwaitClosed());
+        }
+    }
+
+    void OnLine(const ReportLine& line, double /*seconds*/) override
+    {
+        fLines.push_back(line.fText);
+        if (fOnLine)
+            fOnLine();
+    }
+
+    RunOutcome Run() { return RunChild(fOptions, *this, fStop, fLauncher, fTimes); }
+
+    void PassTheTimeout() { fNow += std::chrono::seconds(30); }
+
+    // Whether the child's output is still taken from it, more of it than the queue holds.
+    bool GoesOnReading()
+    {
+        constexpr int kPieces = 8;
+        const int asked = fLauncher->fOut->CountAsked();
+        for (int piece = 0; piece < kPieces; ++piece)
+            fLauncher->fOut->Feed(std::string(std::size_t{1} << 16, 'x'));
+        return fLauncher->fOut->AwaitAsked(asked + kPieces);
+    }
+
+    const boost::shared_ptr<FedLauncher> fLauncher = boost::make_shared<FedLauncher>();
+    ChildOptions fOptions;
+    StopRequest fStop;
+    RunTimes fTimes;
+    RunTimes::Clock::time_point fNow{std::chrono::seconds(1)};
+    std::function<void()> fOnLine;
+    std::vector<std::string> fLines;
+};
+
+TEST_F(ChildRunQueue, WhatItHoldsAtTheEndIsTaken)
+{
+    fLauncher->fOut->Feed("first=1\n");
+    fLauncher->fOut->Feed("second=2\n");
+    fOnLine = [this] {
+        EXPECT_TRUE(fLauncher->fOut->AwaitAsked(3)) << "the second line is in the queue";
+        PassTheTimeout();
+    };
+    EXPECT_EQ(Run().fVerdict, Verdict::kHung);
+    EXPECT_EQ(fLines, (std::vector<std::string>{"first=1", "second=2"}));
+    EXPECT_EQ(fLauncher->CountKills(), 1);
+}
+
+TEST_F(ChildRunQueue, ARunThatIsOverKeepsNobodyWaiting)
+{
+    fLauncher->fOut->Feed("first=1\n");
+    fOnLine = [this] { PassTheTimeout(); };
+    EXPECT_TRUE(Run().fLeftBehind);
+    EXPECT_TRUE(GoesOnReading());
+}
+
+TEST_F(ChildRunQueue, AnExceptionOfTheObserverEndsTheChildAndKeepsNobodyWaiting)
+{
+    fLauncher->fOut->Feed("first=1\n");
+    fOnLine = [] { throw std::runtime_error("no room"); };
+    try {
+        Run();
+        ADD_FAILURE() << "the exception is lost";
+    } catch (const std::runtime_error& exc) {
+        EXPECT_STREQ(exc.what(), "no room");
+    }
+    EXPECT_EQ(fLauncher->CountKills(), 1);
+    EXPECT_TRUE(GoesOnReading());
+}
+
+} // namespace
+} // namespace assay_host
