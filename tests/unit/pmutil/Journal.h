@@ -51,14 +51,21 @@ public:
     static constexpr int kLogLocks = 2;
     std::function<void(const std::string& line)> fOnLine;
 
-    // For fOnLine: as Await, and other threads may log meanwhile.
-    void AwaitWithoutLogMutex(const std::string& party, const std::string& begin)
+    // For fOnLine: other threads may log during the call.
+    template <typename Call>
+    static void WithoutLogMutex(Call call)
     {
         for (int lock = 0; lock < kLogLocks; ++lock)
             GetLogMutex().unlock();
-        Await(party, begin);
+        call();
         for (int lock = 0; lock < kLogLocks; ++lock)
             GetLogMutex().lock();
+    }
+
+    // The same, until the party has an entry that begins so.
+    void AwaitWithoutLogMutex(const std::string& party, const std::string& begin)
+    {
+        WithoutLogMutex([&] { Await(party, begin); });
     }
 
     // An entry of the calling thread. Measured times are left out.
