@@ -2,6 +2,7 @@
 
 #include <cctype>
 #include <clocale>
+#include <cstdlib>
 
 #include <gtest/gtest.h>
 
@@ -75,14 +76,26 @@ class Latin1 {
 public:
     Latin1()
     {
+#ifdef ASSAY_TEST_LOCALES // a folder with locales that the build has made
+        ::setenv("LOCPATH", ASSAY_TEST_LOCALES, 1);
+#endif
         for (const char* const name : {"en_US.ISO-8859-1", "de_DE.ISO-8859-1", ".1252"})
             fIsSet = fIsSet || std::setlocale(LC_CTYPE, name) != nullptr;
+#ifdef ASSAY_TEST_LOCALES
+        ::unsetenv("LOCPATH");
+#endif
     }
-    ~Latin1() { std::setlocale(LC_CTYPE, fBefore.c_str()); }
+    ~Latin1()
+    {
+        std::setlocale(LC_CTYPE, fBefore.c_str());
+    }
     Latin1(const Latin1&) = delete;
     Latin1& operator=(const Latin1&) = delete;
 
-    bool IsSet() const { return fIsSet; }
+    bool IsSet() const
+    {
+        return fIsSet;
+    }
 
 private:
     const std::string fBefore = std::setlocale(LC_CTYPE, nullptr);
@@ -93,7 +106,9 @@ TEST(EscapeTest, HighBytesThatALocaleTakesForGraphicStandForThemselves)
 {
     const Latin1 locale;
     if (!locale.IsSet())
-        GTEST_SKIP() << "this machine has no locale of 8-bit characters";
+        GTEST_SKIP()
+            << "this machine has no locale of 8-bit characters, and no localedef and charmaps "
+               "to make one";
     ASSERT_NE(std::isgraph(0xE9), 0);
     EXPECT_EQ(Escaped(0xE9, '"', 1), "\xE9");
     EXPECT_EQ(Escaped(0xE9, '"', 2), "\xE9");
