@@ -11,6 +11,7 @@
 
 #include <gmock/gmock.h>
 
+#include "qgf/qgf_ocl/Status.h"
 #include "support/FakeOpenCL.h"
 
 namespace {
@@ -226,6 +227,7 @@ TEST_F(OCLTest, KnownStatusIsReportedByItsName)
     answers()[CL_DEVICE_NAME].sizeStatus = CL_DEVICE_NOT_FOUND;
     EXPECT_EQ(FailureOf([&] { device.name(); }),
               "clGetDeviceInfo(CL_DEVICE_NAME) failed: CL_DEVICE_NOT_FOUND (-1)");
+    EXPECT_STREQ(QGF::OCL::StatusName(CL_SUCCESS), "CL_SUCCESS");
 }
 
 TEST_F(OCLTest, TooManyDevicesThrow)

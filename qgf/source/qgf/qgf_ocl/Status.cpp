@@ -13,11 +13,8 @@ struct Row {
 const Row kStatusNames[] = {
     {0, "CL_SUCCESS"},
     {-1, "CL_DEVICE_NOT_FOUND"},
-    {-1, "CL_BUILD_NONE"},
     {-2, "CL_DEVICE_NOT_AVAILABLE"},
-    {-2, "CL_BUILD_ERROR"},
     {-3, "CL_COMPILER_NOT_AVAILABLE"},
-    {-3, "CL_BUILD_IN_PROGRESS"},
     {-4, "CL_MEM_OBJECT_ALLOCATION_FAILURE"},
     {-5, "CL_OUT_OF_RESOURCES"},
     {-6, "CL_OUT_OF_HOST_MEMORY"},
