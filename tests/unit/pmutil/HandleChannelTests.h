@@ -1,6 +1,6 @@
 // The tests that every platform's handle channel passes: instantiate the suite with a type that has
 // `Channel`, the channel's class, and `Calls`, its platform; `MakePipe(read, write)`;
-// `Exists(path)`; and the texts of failed calls, `kOpenFailed` and so on.
+// `Exists(path)`; `PathOf(handle)`; and the texts of failed calls, `kOpenFailed` and so on.
 #pragma once
 
 #include <cstdint>
@@ -172,7 +172,7 @@ TYPED_TEST_P(HandleChannelTest, DeleteOnClose)
     EXPECT_FALSE(TypeParam::Exists(path));
 }
 
-TYPED_TEST_P(HandleChannelTest, TemporaryFileIsEmptyWritableAndGoneAfterwards)
+TYPED_TEST_P(HandleChannelTest, TemporaryFileIsEmptyAndWritable)
 {
     using Channel = typename TypeParam::Channel;
     auto file = Channel::MakeTemporaryFile(this->MakePath("tst"));
@@ -180,6 +180,19 @@ TYPED_TEST_P(HandleChannelTest, TemporaryFileIsEmptyWritableAndGoneAfterwards)
     file->WriteAll("hello", 5);
     file->Seek(1);
     EXPECT_EQ(this->ReadRest(*file), "ello");
+}
+
+TYPED_TEST_P(HandleChannelTest, TemporaryFileGoesWithItsLastReference)
+{
+    using Channel = typename TypeParam::Channel;
+    auto file = Channel::MakeTemporaryFile(this->MakePath("tst"));
+    const auto path = TypeParam::PathOf(file->GetHandle());
+    auto other = file;
+    file.reset();
+    EXPECT_TRUE(TypeParam::Exists(path));
+    other->WriteAll("x", 1);
+    other.reset();
+    EXPECT_FALSE(TypeParam::Exists(path));
 }
 
 TYPED_TEST_P(HandleChannelTest, TemporaryFileNamesAreDistinctFilesInTheDirectory)
@@ -405,16 +418,14 @@ TYPED_TEST_P(HandleChannelTest, StandardChannelsAreMadeOnce)
     Channel::GetStandardOutput().Flush();
 }
 
-REGISTER_TYPED_TEST_SUITE_P(HandleChannelTest, BadAccessFlagsTouchNothing,
-                            BadCreationFlagsTouchNothing, OpenExistingNeedsAFileAndKeepsIt,
-                            TruncateExistingNeedsAFileAndEmptiesIt, OpenAlwaysMakesTheFileOrKeepsIt,
-                            CreateAlwaysMakesTheFileOrEmptiesIt, AccessFlagsGiveTheRights,
-                            DeleteOnClose, TemporaryFileIsEmptyWritableAndGoneAfterwards,
-                            TemporaryFileNamesAreDistinctFilesInTheDirectory, SeeksFromThreeOrigins,
-                            SetEOFCutsAndExtends, SetEOFOfAFileOpenForReadingFails,
-                            SeeksBeyondFourGigabytesInASparseFile,
-                            PipeWhoseWriteEndIsClosedReadsAsEndOfData,
-                            WriteToAPipeWithoutReaderRaises, CloseOfAnUnownedHandleClosesItOnce,
-                            UnownedHandleOutlivesTheChannel, ResetRepointsAndClosesWhatItOwned,
-                            ResetForgetsWhatWasPutBack, ReadAllThatComesShortPutsBack,
-                            ResetLogsTheHandleItCloses, StandardChannelsAreMadeOnce);
+REGISTER_TYPED_TEST_SUITE_P(
+    HandleChannelTest, BadAccessFlagsTouchNothing, BadCreationFlagsTouchNothing,
+    OpenExistingNeedsAFileAndKeepsIt, TruncateExistingNeedsAFileAndEmptiesIt,
+    OpenAlwaysMakesTheFileOrKeepsIt, CreateAlwaysMakesTheFileOrEmptiesIt, AccessFlagsGiveTheRights,
+    DeleteOnClose, TemporaryFileIsEmptyAndWritable, TemporaryFileGoesWithItsLastReference,
+    TemporaryFileNamesAreDistinctFilesInTheDirectory, SeeksFromThreeOrigins, SetEOFCutsAndExtends,
+    SetEOFOfAFileOpenForReadingFails, SeeksBeyondFourGigabytesInASparseFile,
+    PipeWhoseWriteEndIsClosedReadsAsEndOfData, WriteToAPipeWithoutReaderRaises,
+    CloseOfAnUnownedHandleClosesItOnce, UnownedHandleOutlivesTheChannel,
+    ResetRepointsAndClosesWhatItOwned, ResetForgetsWhatWasPutBack, ReadAllThatComesShortPutsBack,
+    ResetLogsTheHandleItCloses, StandardChannelsAreMadeOnce);

@@ -3,6 +3,7 @@
 #include <atomic>
 #include <cerrno>
 #include <chrono>
+#include <climits>
 #include <csignal>
 #include <cstdlib>
 #include <dirent.h>
@@ -40,6 +41,13 @@ struct Posix {
     }
 
     static bool Exists(const std::string& path) { return ::access(path.c_str(), F_OK) == 0; }
+    static std::string PathOf(int handle)
+    {
+        char path[PATH_MAX] = {};
+        const std::string link = "/proc/self/fd/" + std::to_string(handle);
+        EXPECT_GT(::readlink(link.c_str(), path, sizeof path - 1), 0);
+        return path;
+    }
     static bool MakeSparse(PosixHandle&) { return true; }
     static std::string ClosingText(int handle)
     {

@@ -6,6 +6,7 @@
 #include "HandleChannelTests.h"
 #include "Throws.h"
 #include "pmutil/Fmt.h"
+#include "win/ReplacedImport.h"
 
 using namespace pmutil;
 
@@ -30,6 +31,13 @@ struct Win {
     static bool Exists(const std::wstring& path)
     {
         return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
+    }
+
+    static std::wstring PathOf(HANDLE handle)
+    {
+        wchar_t path[MAX_PATH] = {};
+        EXPECT_NE(::GetFinalPathNameByHandleW(handle, path, MAX_PATH, 0), 0U);
+        return path;
     }
 
     static bool MakeSparse(WinHandle& file)
@@ -69,6 +77,38 @@ TEST(WinHandle, TemporaryDirectoryThatIsTooLongFails)
     })) << "260 characters and the backslash after them";
     ::SetEnvironmentVariableW(L"TMP", variable);
     EXPECT_EQ(WinHandle::GetTemporaryDirectory(), usual);
+}
+
+// The most that the system takes in one call; the rest is a caller's next one.
+TEST(WinHandle, RequestsAboveFourGigabytesAskForAllThatACallTakes)
+{
+    static std::vector<DWORD> asked;
+    asked.clear();
+    WinHandle channel(::GetStdHandle(STD_OUTPUT_HANDLE), false);
+    constexpr std::uint64_t kMost = 0xFFFFFFFF;
+    char bytes[1] = {};
+    {
+        const ReplacedImport write(
+            __imp_WriteFile, +[](HANDLE, LPCVOID, DWORD size, LPDWORD count, LPOVERLAPPED) -> BOOL {
+                asked.push_back(size);
+                *count = size;
+                return TRUE;
+            });
+        EXPECT_EQ(channel.WriteSome(bytes, kMost + 6), kMost);
+        EXPECT_EQ(channel.WriteSome(bytes, kMost - 1), kMost - 1);
+        channel.WriteAll(bytes, 2 * kMost + 6);
+    }
+    {
+        const ReplacedImport read(
+            __imp_ReadFile, +[](HANDLE, LPVOID, DWORD size, LPDWORD count, LPOVERLAPPED) -> BOOL {
+                asked.push_back(size);
+                *count = size;
+                return TRUE;
+            });
+        EXPECT_EQ(channel.ReadSome(bytes, kMost + 6), kMost);
+    }
+    EXPECT_EQ(asked,
+              (std::vector<DWORD>{0xFFFFFFFF, 0xFFFFFFFE, 0xFFFFFFFF, 0xFFFFFFFF, 6, 0xFFFFFFFF}));
 }
 
 TEST(WinHandle, StandardChannelsStandOverTheProcessesHandles)
