@@ -148,6 +148,9 @@ protected:
     virtual void OnFinished(int exitCode);
     virtual void OnReserved();
 
+    // The link of the present or latest launch; empty before the first, and after Reset.
+    boost::shared_ptr<consoleapp::ExecutionData> GetExecutionData();
+
     State GetStateLocked(Lock& lock, double maxWaitSeconds);
     void SetState(State state);
     void SetStateLocked(const Lock& lock, State state);

@@ -12,6 +12,8 @@
 #include <boost/thread/mutex.hpp>
 #include <boost/weak_ptr.hpp>
 
+#include "pmutil/LaunchStart.h"
+
 namespace pmutil {
 
 class ConsoleApp;
@@ -119,7 +121,8 @@ public:
     ExecutionData(const ExecutionData&) = delete;
     ExecutionData& operator=(const ExecutionData&) = delete;
 
-    // Empty if the application is gone or was reset.
+    // Empty if the application is gone or was reset. Clearing it gives the launch up, and with it a
+    // start that is not over yet.
     boost::shared_ptr<ConsoleApp> GetConsoleApp() const;
     void ClearConsoleApp();
     bool HasConsoleApp() const;
@@ -128,10 +131,14 @@ public:
     boost::shared_ptr<OutputTask> GetOutputTask(OutputChannel channel) const;
     void SetOutputTask(OutputChannel channel, boost::weak_ptr<OutputTask> task);
 
+    // Ended by the launcher's thread.
+    LaunchStart& GetStart() { return fStart; }
+
 private:
     mutable boost::mutex fMutex;
     boost::weak_ptr<ConsoleApp> fConsoleApp;
     boost::weak_ptr<OutputTask> fOutputTasks[kOutputSlots];
+    LaunchStart fStart;
 };
 
 } // namespace consoleapp

@@ -3,9 +3,7 @@
 //
 // The launch looks for the task to be running before it goes on, and fails with "never started" if
 // DoRun has come and gone by then, which a child that ends at once may bring about. So a DoRun
-// waits, once it has read everything, for the application's OnRunning; but for less than the short
-// wait, since that never comes in a launch that fails, and a task that holds out longer is given
-// up.
+// calls AwaitStart once it has read everything.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -54,6 +52,10 @@ protected:
 
     // The parent's end of the pipe; empty before a launch and after it.
     boost::shared_ptr<Reader> GetReader();
+
+    // Returns when the start of the launch that the task serves is over: the child runs, or the
+    // launch has failed or was given up. At once without a launch.
+    void AwaitStart();
 
     bool IsRunningLocked(Lock& lock, double maxWaitSeconds);
 

@@ -353,6 +353,12 @@ void ConsoleApp::Kill()
     }
 }
 
+boost::shared_ptr<ExecutionData> ConsoleApp::GetExecutionData()
+{
+    const Lock lock(fMutex);
+    return fExecutionData;
+}
+
 State ConsoleApp::GetState(double maxWaitSeconds)
 {
     Lock lock(fMutex);

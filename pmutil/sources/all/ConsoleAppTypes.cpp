@@ -129,8 +129,11 @@ boost::shared_ptr<ConsoleApp> ExecutionData::GetConsoleApp() const
 
 void ExecutionData::ClearConsoleApp()
 {
-    const boost::lock_guard<boost::mutex> lock(fMutex);
-    fConsoleApp.reset();
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fConsoleApp.reset();
+    }
+    fStart.End(LaunchStart::Result::kFailed);
 }
 
 bool ExecutionData::HasConsoleApp() const

@@ -14,6 +14,7 @@ namespace pmutil {
 
 using consoleapp::Exception;
 using consoleapp::ExecutionData;
+using consoleapp::LaunchStart;
 
 namespace {
 
@@ -72,16 +73,25 @@ void LaunchThreadTask::operator()()
             PM_LOG(gConsoleAppLog, "LaunchThreadTask inner exception=?");
             NotifyFailure(Exception(fTaskID, "LaunchThreadTask failed"));
         }
+        EndStart();
         CleanupLaunchThreadTask(mustKill, result, threads);
     } catch (const std::exception& exc) {
         PM_LOG(gConsoleAppLog, "LaunchThreadTask outer exception=" << exc.what());
     } catch (...) {
         PM_LOG(gConsoleAppLog, "LaunchThreadTask outer exception=?");
     }
+    EndStart();
     for (const OutputChannel channel : kChannels) {
         if (const boost::shared_ptr<OutputTask> task = fLaunchParams.GetOutputTask(channel))
             task->Discard(fExecutionData.get());
     }
+}
+
+// A start that is not over by now has failed: the output tasks may end.
+void LaunchThreadTask::EndStart()
+{
+    if (fExecutionData != nullptr)
+        fExecutionData->GetStart().End(LaunchStart::Result::kFailed);
 }
 
 // `mustKill` tells whether the child was started and not yet seen to end. `result` outlives a
@@ -105,6 +115,7 @@ void LaunchThreadTask::RunLaunch(bool& mustKill, LaunchResult& result, Threads& 
         StartOutputTask(channel, data, result.fAppOutput[index], threads[index]);
     }
     NotifyRunning(result);
+    data->GetStart().End(LaunchStart::Result::kRunning);
 
     // This thread keeps no end of a pipe: the child sees the end of its input when the client's
     // writer goes, and a reader's owner decides alone when it is closed.

@@ -23,6 +23,7 @@ private:
     void StartOutputTask(OutputChannel channel,
                          const boost::shared_ptr<consoleapp::ExecutionData>& data,
                          const boost::shared_ptr<Reader>& reader, ManagedThread& thread);
+    void EndStart();
     void CleanupLaunchThreadTask(bool mustKill, LaunchResult& result, Threads& threads);
 
     boost::shared_ptr<Launcher> fLauncher;

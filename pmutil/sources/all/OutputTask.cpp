@@ -1,5 +1,6 @@
 #include "pmutil/OutputTask.h"
 
+#include <limits>
 #include <stdexcept>
 #include <utility>
 
@@ -129,6 +130,17 @@ boost::shared_ptr<Reader> OutputTask::GetReader()
 {
     const boost::lock_guard<boost::mutex> lock(fMutex);
     return fReader;
+}
+
+void OutputTask::AwaitStart()
+{
+    boost::shared_ptr<ExecutionData> launch;
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        launch = fExecutionData;
+    }
+    if (launch != nullptr)
+        launch->GetStart().Await(std::numeric_limits<double>::infinity());
 }
 
 bool OutputTask::IsRunning(double maxWaitSeconds)
