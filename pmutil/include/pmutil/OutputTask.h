@@ -3,7 +3,8 @@
 //
 // The launch looks for the task to be running before it goes on, and fails with "never started" if
 // DoRun has come and gone by then, which a child that ends at once may bring about. So a DoRun
-// calls AwaitStart once it has read everything.
+// calls AwaitStart once it has read everything. OutputPump does all this for a function that takes
+// the bytes.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
