@@ -1,5 +1,4 @@
-// What a report answers of what it is asked: each key of each device with its line, or with the
-// reason why there is none.
+// A report by device and key: for each key its line, or the reason why there is none.
 #pragma once
 
 #include <cstddef>
@@ -12,23 +11,24 @@
 
 namespace assay_host {
 
+// Why a key has no line.
 enum class Missing {
-    kNot,
-    kNotPrinted,   // the device has nothing to print
+    kNot,          // it has one
+    kNotPrinted,   // the device has no value to print
     kDeviceFailed, // a test of the device failed before
     kRunEnded,     // the run ended before
     kNoOpenCL,     // the machine has no OpenCL
-    kUnreadable    // later keys are there, so its line is lost or garbled
+    kUnreadable    // later lines are there, so its line is lost or garbled
 };
 
-// "not printed by this device", "device failed before", "run ended before", "no OpenCL",
-// "no readable line"; the empty text of kNot.
+// Returns "not printed by this device", "device failed before", "run ended before", "no OpenCL" or
+// "no readable line"; an empty text for kNot.
 const char* GetMissingText(Missing missing);
 
 struct Answer {
-    std::string fKey;        // behind the tag and its point
-    const KnownKey* fKnown;  // null of a key that the report has besides
-    const ReportLine* fLine; // null if missing
+    std::string fKey;        // without the tag and its point
+    const KnownKey* fKnown;  // null if the key isn't in the table
+    const ReportLine* fLine; // null if missing; owned by the report
     Missing fMissing = Missing::kNot;
 };
 
@@ -36,24 +36,26 @@ struct DeviceAnswers {
     std::string fTag;
     DeviceKind fKind;
     std::uint32_t fIndex;
-    bool fComplete;               // it went through all its tests
+    bool fComplete;               // it has the line of its last key
     bool fFailed;                 // one of its tests failed
-    std::vector<Answer> fAnswers; // the known keys in the report's order, then the others
+    std::vector<Answer> fAnswers; // the keys of the table in the report's order, then the others
 
+    // Returns the key's line; null if it is missing. The key is without the tag.
     const ReportLine* Find(std::string_view key) const;
-    std::string GetValue(std::string_view key) const; // empty if missing
+
+    // Returns the key's value; empty if it is missing.
+    std::string GetValue(std::string_view key) const;
 };
 
 struct Answers {
-    std::vector<Answer> fReport;         // the report's own keys, then the others without a tag
-    std::vector<DeviceAnswers> fDevices; // OpenGL first, then by index
-    // Devices of an index from kMaxDevices on, which no machine has.
-    std::size_t fDevicesLeftOut;
-    // As SequenceReader::GetNextKey() says of the whole report.
-    std::string fNext;
+    std::vector<Answer> fReport;         // keys without a tag: those of the table, then the others
+    std::vector<DeviceAnswers> fDevices; // OpenGL devices, then OpenCL devices, by index
+    std::size_t fDevicesLeftOut;         // devices of an index from kMaxDevices on
+    std::string fNext;                   // SequenceReader::GetNextKey() after the last line
 };
 
-// The answers point into the report. A device that the report counts but doesn't name is one too.
+// Collects the answers. They point into the report, which must outlive them. A device that the
+// report counts but never names is included.
 Answers GetAnswers(const Report& report);
 
 } // namespace assay_host

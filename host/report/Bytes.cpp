@@ -9,8 +9,8 @@ namespace assay_host {
 
 namespace {
 
-// Well-formed UTF-8: the range of the first byte and that of the second one; the others are 80 to
-// BF. The ranges of the second byte leave out overlong forms, surrogates and what is too large.
+// The well-formed byte sequences of UTF-8 (Unicode Standard, table 3-7): the ranges of the first
+// and the second byte. The other bytes are 80 to BF.
 struct Form {
     unsigned char fFirstLow;
     unsigned char fFirstHigh;
@@ -37,7 +37,7 @@ bool IsIn(unsigned char byte, unsigned char low, unsigned char high)
     return byte >= low && byte <= high;
 }
 
-// What a terminal obeys instead of showing it.
+// Control characters, and format characters that change the direction of writing or are invisible.
 bool IsControl(char32_t code)
 {
     struct Range {

@@ -1,4 +1,4 @@
-// Bytes of drivers that may be no text at all, as UTF-8 goes.
+// Handles bytes that need not be valid UTF-8, as drivers may return them. Any thread may call.
 #pragma once
 
 #include <cstddef>
@@ -7,22 +7,25 @@
 
 namespace assay_host {
 
-// The character that well-formed UTF-8 has at the start of the bytes. Its size is 0 where there is
-// none: an overlong form, a surrogate, a number above U+10FFFF, a character that breaks off.
 struct Character {
     char32_t fCode = 0;
-    std::size_t fSize = 0;
+    std::size_t fSize = 0; // in bytes; 0 if there is no well-formed character
 };
+
+// Reads the character at the start of the bytes. An overlong form, a surrogate, a code above
+// U+10FFFF and a truncated character are not well-formed.
 Character ReadCharacter(std::string_view bytes);
 
+// Appends the character as UTF-8. The code must be at most U+10FFFF.
 void AppendCharacter(std::string& text, char32_t code);
 
-// The bytes on one line for a terminal: a line end, a control character, one that turns the
-// direction of writing, or a byte that is no UTF-8 shows as "\n", "\u{202E}", "\xFF". With it no
-// driver steers the terminal.
+// Returns the bytes as one line that is safe to write to a terminal. A line end, a control
+// character, a character that changes the direction of writing and a byte that isn't UTF-8 are
+// escaped: "\n", "\x1B", "\u{202E}", "\xFF".
 std::string ShowBytes(std::string_view bytes);
 
-// How many columns a text of ShowBytes takes, a column a character.
+// Returns the number of characters of a text that ShowBytes returned. Wide and combining characters
+// count as one column too.
 std::size_t CountColumns(std::string_view text);
 
 } // namespace assay_host

@@ -100,7 +100,8 @@ void Comparer::CompareEnds(const Report& before, const Report& after)
     Print(fmt::format("report: {} -> {}", show(before), show(after)));
 }
 
-// By name, the same place first; then by place what is left. What has no partner then stays.
+// Pairs devices by name and index, then by name, then by index. Removes them from the two lists;
+// the devices without a partner stay there.
 std::vector<Comparer::Pair> Comparer::PairUp(Devices& before, Devices& after)
 {
     std::vector<Pair> pairs;
@@ -186,7 +187,7 @@ bool Comparer::IsSame(const Answer* before, const Answer* after) const
 {
     const ReportLine* const left = before ? before->fLine : nullptr;
     const ReportLine* const right = after ? after->fLine : nullptr;
-    // Why there is no answer says how the run went, not what the machine is.
+    // The reason for a missing line isn't compared: it describes the run, not the machine.
     if (!left || !right)
         return left == right;
     if (left->fQuoted == right->fQuoted && left->fValue == right->fValue)

@@ -1,4 +1,4 @@
-// What changed between two reports.
+// Compares two reports.
 #pragma once
 
 #include <ostream>
@@ -8,11 +8,13 @@
 namespace assay_host {
 
 struct DiffOptions {
-    double fTolerance = 0.1; // of measured numbers, as a part of the larger one
+    double fTolerance = 0.1; // of measurements, as a fraction of the larger value
 };
 
-// Prints one line a difference, and tells whether there was one. Stamps and log lines don't count;
-// devices are matched by name first, so that another order of the same devices is told as such.
+// Prints one line for each difference and returns whether there is one. Time stamps, log lines,
+// line ends and the outcome of the run are not compared. Devices are matched by name before index,
+// so that a different order of the same devices is reported as such. Doesn't check the stream for
+// failures.
 bool PrintDiff(std::ostream& out, const Report& before, const Report& after,
                const DiffOptions& options);
 

@@ -46,7 +46,7 @@ Json MakeNumber(const Number& number)
     return std::visit([](auto value) { return Json(value); }, number);
 }
 
-// JSON has no infinity.
+// Makes any number a valid JSON number of seconds: JSON has no infinity.
 double MakeSeconds(double seconds)
 {
     return std::isfinite(seconds) ? std::max(seconds, 0.0) : 0;
@@ -140,7 +140,7 @@ Json MakeOutcome(const RunOutcome& outcome)
     };
 }
 
-// The member of an object that a document must have, of the type that it must have.
+// Returns a required member of an object. Throws if it is missing or of another type.
 const Json& Get(const Json& object, const std::string& where, const char* name,
                 bool (Json::*isType)() const noexcept, const char* type)
 {
@@ -157,7 +157,7 @@ std::string GetString(const Json& object, const std::string& where, const char* 
     return Get(object, where, name, &Json::is_string, "a string").get<std::string>();
 }
 
-// A line of the document, or the same in an event.
+// Reads a line of a document or an event.
 ReportLine ReadJsonLine(const Json& json, const std::string& where)
 {
     if (!json.is_object())
@@ -184,33 +184,33 @@ void CheckSchema(const Json& json, const std::string& where)
                                              schema.dump(), kSchemaVersion));
 }
 
-// What the parser says of a text, without its own number for it.
 class JsonFailure : public std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
+// Runs the parser. Throws JsonFailure with the parser's text, without the error number before it.
 template <typename Action>
 Json Parse(Action action)
 {
     const auto getText = [](const Json::exception& failure) {
-        constexpr std::size_t kMostText = 200;
+        constexpr std::size_t kMaxBytes = 200;
         const std::string_view text = failure.what();
         const std::size_t mark = text.find("] ");
-        return ShowBytes(text.substr(mark == std::string_view::npos ? 0 : mark + 2, kMostText));
+        return ShowBytes(text.substr(mark == std::string_view::npos ? 0 : mark + 2, kMaxBytes));
     };
     try {
         return action();
     } catch (const Json::parse_error& failure) {
         throw JsonFailure("not valid JSON: " + getText(failure));
     } catch (const Json::exception& failure) {
-        throw JsonFailure(getText(failure)); // valid, but a number that nothing here can hold
+        throw JsonFailure(getText(failure)); // valid JSON with a number that is out of range
     }
 }
 
-// Takes lines in, no more than a report can have.
-class LineTaker {
+// Collects lines up to the limits of a report.
+class LineCollector {
 public:
-    void Take(const Json& json, const std::string& where)
+    void Add(const Json& json, const std::string& where)
     {
         ReportLine line = ReadJsonLine(json, where);
         fBytes += line.fText.size() + line.fLineEnd.size();
@@ -234,7 +234,8 @@ bool IsLineMember(const Json& name)
     return name == "kind" || name == "text" || name == "end" || name == "cut";
 }
 
-// Takes the lines out of a document while it is parsed, and leaves out what isn't asked for.
+// A parser callback that collects the lines of a document, checks its schema version, and discards
+// everything else.
 class DocumentFilter {
 public:
     bool operator()(int depth, Json::parse_event_t event, Json& parsed)
@@ -265,7 +266,7 @@ public:
             CheckSchema({{"schema", parsed}}, kDocument);
         if (!fIsInLines || depth != kLine)
             return true;
-        fLines.Take(parsed, fmt::format("lines[{}]", fLines.GetCount()));
+        fLines.Add(parsed, fmt::format("lines[{}]", fLines.GetCount()));
         return false;
     }
 
@@ -274,10 +275,10 @@ public:
 private:
     std::string fMember;
     bool fIsInLines = false;
-    LineTaker fLines;
+    LineCollector fLines;
 };
 
-// The same for an event.
+// A parser callback that keeps only the members of an event that ReadEvents needs.
 bool KeepEventMembers(int depth, Json::parse_event_t event, Json& parsed)
 {
     switch (event) {
@@ -291,7 +292,7 @@ bool KeepEventMembers(int depth, Json::parse_event_t event, Json& parsed)
     }
 }
 
-// The bytes up to the next line end, for a parser.
+// Iterates over the bytes up to the next line end.
 class LineIterator {
 public:
     using iterator_category = std::input_iterator_tag;
@@ -322,7 +323,7 @@ private:
     std::streambuf* fBytes = nullptr;
 };
 
-// False if the line has no end.
+// Skips the rest of the line and its end. Returns false if it has no end.
 bool SkipLine(std::streambuf& bytes)
 {
     auto next = bytes.sbumpc();
@@ -415,7 +416,7 @@ Report ReadEvents(std::istream& text)
 {
     std::streambuf& bytes = *text.rdbuf();
     const auto end = std::char_traits<char>::eof();
-    LineTaker lines;
+    LineCollector lines;
     for (std::size_t number = 1; bytes.sgetc() != end; ++number) {
         const std::string where = fmt::format("line {}", number);
         Json event;
@@ -437,7 +438,7 @@ Report ReadEvents(std::istream& text)
         if (name == "start")
             CheckSchema(event, where);
         if (name == "line")
-            lines.Take(event, where);
+            lines.Add(event, where);
     }
     return lines.TakeReport();
 }

@@ -1,8 +1,11 @@
-// The JSON form of a run: one stable document, and the events of the JSON Lines form.
+// The JSON forms of a run: the document, and the events of the JSON Lines form. host/schema has
+// their schemas.
 //
-// A JSON text is Unicode and a driver's bytes need not be. Bytes that aren't part of well-formed
-// UTF-8 stand as U+F780 to U+F7FF, a private range: 0xF700 plus the byte. A real character of that
-// range is written the same way, byte by byte, so the way back is exact.
+// JSON is Unicode, and a driver's bytes need not be. A byte that isn't part of well-formed UTF-8 is
+// written as the character 0xF700 plus the byte, in the private range U+F780 to U+F7FF. The bytes
+// of a real character of that range are written the same way, so that decoding is exact.
+//
+// Any thread may call.
 #pragma once
 
 #include <istream>
@@ -15,32 +18,40 @@
 
 namespace assay_host {
 
-// Raised when the document's form changes in a way that a reader must know of.
+// Incremented when the document changes in a way that breaks existing readers.
 constexpr int kSchemaVersion = 1;
 
-// Writes the document piece by piece, and a line end after it.
+// Writes the document and a line end, piece by piece. Doesn't check the stream for failures.
 void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome);
 
-// Events, each an object on one line, with its line end. It has "event" and "seconds" (since the
-// launch).
+// Makes the event "start" of a run, 0 seconds after its launch. Every event is a JSON object on one
+// line, with its line end.
 std::string MakeStartEvent(const std::vector<std::string>& command);
+
+// Makes the event "line", `seconds` after the launch.
 std::string MakeLineEvent(const ReportLine& line, double seconds);
+
+// Makes the event "error" of a line of standard error, `seconds` after the launch.
 std::string MakeErrorLineEvent(const std::string& line, double seconds);
+
+// Makes the event "end".
 std::string MakeEndEvent(const RunOutcome& outcome);
 
-// Reads the report from its document, and holds only the report's part of it. Throws
-// std::runtime_error with what is wrong with the document.
+// Reads the report of a document, without holding the other parts of it. Throws std::runtime_error
+// that names the first error in the document.
 Report ReadDocument(std::istream& text);
 
-// The report back from the lines of the JSON Lines form. A last line that breaks off, as a host
-// that died leaves it, is left out. Throws std::runtime_error with what is wrong with the events.
+// Reads the report of a run's events. Ignores a last line that is incomplete, as a killed host
+// leaves it. Throws std::runtime_error that names the first error, "line N: REASON".
 Report ReadEvents(std::istream& text);
 
-// Whether the line is an event of the JSON Lines form, well-formed or not.
+// Whether the line is a JSON object with the member "event".
 bool IsEvent(const std::string& line);
 
-// Any bytes as a valid JSON string, and back.
+// Encodes any bytes as UTF-8 for a JSON string.
 std::string EncodeBytes(const std::string& bytes);
+
+// Decodes a text of EncodeBytes.
 std::string DecodeBytes(const std::string& text);
 
 } // namespace assay_host

@@ -62,7 +62,7 @@ void JsonWriter::WriteName(std::string_view name)
     fOut << nlohmann::ordered_json(name).dump() << ": ";
 }
 
-// A line end in the text is between values: in strings line ends are escaped.
+// Every line end in the text is one of the layout: in strings line ends are escaped.
 void JsonWriter::WriteValue(const nlohmann::ordered_json& value)
 {
     const std::string text = value.dump(kIndent);

@@ -1,5 +1,5 @@
-// Writes a JSON document piece by piece, indented like a whole dump. Needs memory only for the
-// largest piece.
+// Writes a JSON document piece by piece, indented as nlohmann-json's dump. Holds only one piece in
+// memory.
 #pragma once
 
 #include <ostream>
@@ -15,14 +15,17 @@ class JsonWriter {
 public:
     explicit JsonWriter(std::ostream& out) : fOut(out) {}
 
-    // '{' or '['; the name inside an object, null inside an array and of the document itself.
+    // Begins an object with '{' or an array with '['. `name`: its name in the enclosing object;
+    // null in an array and for the document itself.
     void Open(char bracket, const char* name = nullptr);
 
-    // The bracket that closes what was opened last.
+    // Ends the innermost object or array with its closing bracket.
     void Close(char bracket);
 
-    // A whole value. The name is valid UTF-8.
+    // Writes a member of an object. The name must be valid UTF-8.
     void Write(std::string_view name, const nlohmann::ordered_json& value);
+
+    // Writes an element of an array.
     void Write(const nlohmann::ordered_json& value);
 
 private:
@@ -33,7 +36,7 @@ private:
 
     std::ostream& fOut;
     std::size_t fDepth = 0;
-    bool fIsEmpty = true; // what was opened last
+    bool fIsEmpty = true; // nothing is written yet in the innermost object or array
 };
 
 } // namespace assay_host

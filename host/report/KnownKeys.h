@@ -1,5 +1,7 @@
-// The lines that a whole report has, in the order in which it prints them: the one table of what
-// docs/report-format.md describes. Who reads, shows, compares or predicts a report goes by it.
+// The table of the report's keys, in the order in which a whole report prints them, as described in
+// docs/report-format.md. All code that reads, shows, compares or predicts a report uses it.
+//
+// All functions here may be called by any thread.
 #pragma once
 
 #include <cstddef>
@@ -12,22 +14,23 @@ namespace assay_host {
 
 enum class DeviceKind { kOpenGL, kOpenCL };
 
-// "OpenGL", "OpenCL".
+// Returns "OpenGL" or "OpenCL".
 const char* GetKindName(DeviceKind kind);
 
-// The word of a tag: "glgpu", "clgpu".
+// Returns the word that a device's tag begins with: "glgpu" or "clgpu".
 const char* GetTagWord(DeviceKind kind);
 
-// A device's tag: "glgpu[0]", "clgpu[1]".
+// Returns a device's tag: "glgpu[0]", "clgpu[1]".
 std::string MakeTag(DeviceKind kind, std::size_t index);
 
-// The report's key with their number: "NumGLGPUs", "NumCLGPUs".
+// Returns the key of the number of devices of the kind: "NumGLGPUs" or "NumCLGPUs".
 const char* GetCountKey(DeviceKind kind);
 
-// More devices of a kind than any machine has; a child that makes up more costs no more memory.
+// Devices of one kind that are read. No machine has as many; the limit bounds the memory that an
+// invented count can cost.
 constexpr std::size_t kMaxDevices = 256;
 
-// What a value is, which is to say how a person likes to read it.
+// How the text form shows a value.
 enum class ValueForm {
     kText,
     kAdapter,
@@ -43,20 +46,19 @@ enum class ValueForm {
 
 enum class KeyGroup { kMain, kLimit, kExtension };
 
-// What two runs of one machine have in common of the value.
+// How far the values of two runs on one machine must agree.
 enum class Match {
-    kExact,   // all of it
-    kStamp,   // a time between quotes
-    kInteger, // a memory size, while other programs come and go
-    kNumber   // a measurement
+    kExact,   // byte by byte
+    kStamp,   // both are quoted times
+    kInteger, // both are integers: a memory size depends on other programs
+    kNumber   // both are numbers: a measurement
 };
 
 struct KnownKey {
-    std::optional<DeviceKind> fKind; // of the devices that have it; none for the report's own
-    std::string fKey;                // after the tag and its point
+    std::optional<DeviceKind> fKind; // of the devices that have it; none for a key without a tag
+    std::string fKey;                // without the tag and its point
 
-    // For people, of a device's key: its label, its form, and in the group kMain its row among
-    // them.
+    // For the text form of a device's key. fRow orders the keys of the group kMain.
     std::string fLabel;
     ValueForm fForm = ValueForm::kText;
     KeyGroup fGroup = KeyGroup::kMain;
@@ -64,24 +66,24 @@ struct KnownKey {
 
     Match fMatch = Match::kExact;
 
-    // The gputag lines in front of the answer; fTagsFirst: they come before the driver is asked,
-    // and so even if that fails.
+    // The gputag lines that precede the key's line. With fTagsFirst they are printed before the
+    // driver is called, and so even if the call fails.
     std::vector<std::string> fTagLines{};
     bool fTagsFirst = false;
 
-    // A device takes the step without a line where it has no value, and always where its key of
-    // this name is 0; empty for a key that each device prints.
+    // Empty for a key that every device prints. Otherwise a device may take the step without
+    // printing a line, and always does if its key of this name is 0.
     std::string fSilentWithout{};
 
     bool fTakesStep = true;
 
     bool MayBeSilent() const { return !fSilentWithout.empty(); }
 
-    // What stands before the '=' for the device of that tag; the key alone for an empty tag.
+    // Returns "TAG.KEY", or the key alone if the tag is empty.
     std::string GetKey(const std::string& tag) const;
 };
 
-// A part of a constant array, as a range.
+// A range of a constant array.
 template <typename T>
 struct Table {
     const T* fBegin;
@@ -93,16 +95,17 @@ struct Table {
     const T& operator[](std::size_t index) const { return fBegin[index]; }
 };
 
-// All of them: a device's key stands for the lines of all devices of its kind, one after the other.
+// Returns all keys. A device's key is there once, for the lines of all devices of its kind.
 const std::vector<KnownKey>& GetKnownKeys();
 
-// Those of them that each device of the kind has.
+// Returns the keys of the devices of the kind: a range of GetKnownKeys().
 Table<KnownKey> GetDeviceKeys(DeviceKind kind);
 
-// Those of them that belong to no device.
+// Returns the keys without a tag: pointers into GetKnownKeys().
 const std::vector<const KnownKey*>& GetReportKeys();
 
-// The key of that name that devices of the kind have, or the report itself; null if there is none.
+// Finds a device's key by its name without the tag, or, without a kind, a key that has no tag.
+// Returns null if there is no such key.
 const KnownKey* FindKnownKey(std::optional<DeviceKind> kind, std::string_view name);
 
 } // namespace assay_host

@@ -9,7 +9,7 @@ namespace assay_host {
 
 namespace {
 
-// More digits than any machine has devices, and few enough for any integer.
+// Enough for any machine, and few enough for a 32-bit integer.
 constexpr std::size_t kMaxIndexDigits = 9;
 
 bool StartsWith(std::string_view text, std::string_view start)
@@ -25,8 +25,7 @@ bool IsIndex(std::string_view text)
            text.find_first_not_of("0123456789") == std::string_view::npos;
 }
 
-// Keys are words of visible ASCII; a blank or a byte of binary data before the '=' makes the line
-// something else.
+// A key is visible ASCII without quotes. Other bytes before the '=' make the line a raw one.
 bool IsKey(std::string_view text)
 {
     return !text.empty() && std::all_of(text.begin(), text.end(), [](char character) {

@@ -1,4 +1,4 @@
-// The forms that a line of a report has.
+// Reads single lines of a report by their form. Any thread may call.
 #pragma once
 
 #include <cstddef>
@@ -11,21 +11,21 @@
 
 namespace assay_host {
 
-// The line that these bytes are when they stand alone. `cut`: bytes were lost at its end, so that a
-// quote may lack its partner.
+// Reads a line by itself. `text`: the line without its end. `cut`: bytes were lost at its end, so
+// that a quoted value need not end with a quote.
 ReportLine ReadLine(std::string text, std::string lineEnd, bool cut);
 
-// Whether the line is a complete value: it has its line end, and nothing was cut from it.
+// Whether the line is a value that has its line end and lost no bytes.
 bool IsWholeValue(const ReportLine& line);
 
-// Whether the line is a time stamp, quotes, line end and all.
+// Whether the line is a quoted value that has its line end and lost no bytes, as a time stamp must.
 bool IsStamp(const ReportLine& line);
 
-// Whether the line is key=value with a quote that isn't closed.
+// Whether the line is key="value without its closing quote.
 bool LeavesQuoteOpen(std::string_view text);
 
-// Whether the line can't be the inside of a quoted value, because it begins as lines of the report
-// do: a comment, a tagged key, a code of a constant, or one of the report's own keys.
+// Whether the line begins like a line of the report, so that it isn't taken for part of a quoted
+// value: a comment, a key with a device's tag, a gputag line, or a known key without a tag.
 bool BeginsLikeReportLine(std::string_view text);
 
 // What a device's tag says.

@@ -65,7 +65,7 @@ Decimal ReadDecimal(std::string_view text)
     return result;
 }
 
-// Whether the shortest text for the value is the same decimal number.
+// Whether the value's shortest text is the same decimal number as `text`.
 bool KeepsDigits(std::string_view text, double value)
 {
     char shortest[32];

@@ -15,7 +15,7 @@ namespace assay_host {
 
 namespace {
 
-// The first event is smaller: it has the child's command line.
+// The longest first line of a file of events: the "start" event has the child's command line.
 constexpr std::size_t kMaxStartBytes = std::size_t{4} << 20;
 
 Report ReadJson(ReportInput& input, const std::string& line)

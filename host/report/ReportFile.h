@@ -1,4 +1,4 @@
-// A report from a file of any of its forms.
+// Loads a report from a file of any of its forms.
 #pragma once
 
 #include <string>
@@ -7,9 +7,11 @@
 
 namespace assay_host {
 
-// The file holds a JSON document, the events of the JSON Lines form, or the report's own lines. Its
-// first byte that is no blank tells: '{' is JSON. The path is UTF-8. Throws std::runtime_error,
-// with the path in its text, if the file can't be read or holds none of these.
+// Accepts a JSON document, the events of the JSON Lines form, and the report's own lines. A file
+// whose first byte after blanks is '{' is JSON. The path is UTF-8.
+//
+// Throws std::runtime_error with the text "PATH: REASON" if the file can't be read or is no report.
+// Any thread may call.
 Report LoadReport(const std::string& path);
 
 } // namespace assay_host

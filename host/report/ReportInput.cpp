@@ -35,8 +35,8 @@ ReportInput::ReportInput(const std::string& path, const Limits& limits)
 std::string ReportInput::PeekJsonLine(std::size_t maxBytes)
 {
     constexpr std::string_view kBlanks = " \t\r\n";
-    std::size_t first = 0; // after the blanks so far
-    std::size_t end = 0;   // the line's end, as far as it was looked for
+    std::size_t first = 0; // of the line: after the blanks
+    std::size_t end = 0;   // of the line, as far as it was searched
     while (fBlock.size() < maxBytes && ReadBlock()) {
         const std::string_view text(fBlock.data(), fBlock.size());
         first = std::min(text.find_first_not_of(kBlanks, first), text.size());
@@ -69,7 +69,6 @@ ReportInput::int_type ReportInput::underflow()
     return fBlock.empty() ? traits_type::eof() : traits_type::to_int_type(fBlock.front());
 }
 
-// Appends to the block; false at the end.
 bool ReportInput::ReadBlock()
 {
     const std::size_t before = fBlock.size();

@@ -1,4 +1,4 @@
-// The bytes of a report's file, read on demand and within limits.
+// A report's file as a stream buffer that enforces limits.
 #pragma once
 
 #include <cstddef>
@@ -9,33 +9,36 @@
 
 namespace assay_host {
 
+// One thread at a time.
 class ReportInput : public std::streambuf {
 public:
+    // Any document of a report that ReportReader accepts is within these.
     struct Limits {
-        // The largest document of a report that keeps to its reader's limits is smaller.
-        std::size_t fMaxBytes = std::size_t{64} << 20;
-        // So is the longest string of such a document.
-        std::size_t fMaxWordBytes = std::size_t{1} << 20;
+        std::size_t fMaxBytes = std::size_t{64} << 20;    // of the file
+        std::size_t fMaxWordBytes = std::size_t{1} << 20; // of a string or a number in JSON
     };
 
-    // The path is UTF-8. Throws std::runtime_error if it can't be opened.
+    // Opens the file; the path is UTF-8. Throws std::runtime_error with the text "can't open:
+    // REASON".
     explicit ReportInput(const std::string& path);
     ReportInput(const std::string& path, const Limits& limits);
 
-    // The first line that isn't blank, up to `maxBytes`, if it begins with '{'; else empty. The
-    // bytes are read again later. Call first.
+    // Returns the first line that isn't blank, or its first `maxBytes`, if it begins with '{';
+    // otherwise an empty text. Doesn't consume any bytes. Call before anything is read. Throws as
+    // underflow() does.
     std::string PeekJsonLine(std::size_t maxBytes);
 
-    // Treats the bytes as JSON: refuses a string or a number that is too long before a parser holds
-    // it. Call before anything is read.
+    // Applies fMaxWordBytes from now on, so that a parser never holds a longer string or number.
+    // Call before anything is read. Throws as underflow() does.
     void ExpectJson();
 
 protected:
-    // Throws std::runtime_error if the file can't be read, or goes beyond a limit.
+    // Throws std::runtime_error with the text "can't read: REASON", or "too large for a report" if
+    // a limit is exceeded.
     int_type underflow() override;
 
 private:
-    bool ReadBlock();
+    bool ReadBlock(); // appends to fBlock; false at the end of the file
     void CheckWords();
 
     const Limits fLimits;

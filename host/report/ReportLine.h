@@ -1,4 +1,4 @@
-// One line of a report, as its reader takes it apart. A value type.
+// One line of a report. A value type.
 #pragma once
 
 #include <string>
@@ -14,18 +14,17 @@ enum class LineKind {
 struct ReportLine {
     LineKind fKind = LineKind::kRaw;
 
-    // The line's bytes as they came, without the line end. A quoted value may hold line ends of its
-    // own; these are in here as they came.
+    // The line's bytes, unchanged, without the line end. A quoted value may contain line ends.
     std::string fText;
 
-    // How the line ended: "\n", "\r\n", or nothing where the report broke off.
+    // "\n", "\r\n", or empty if the report ended without one.
     std::string fLineEnd;
 
-    // Bytes behind fText were lost to the reader's limits.
+    // Bytes after fText were dropped by a limit of the reader.
     bool fCut = false;
 
-    // Of a kValue line: what stands before the first '=', and what stands behind it. A quoted value
-    // is without its two quotes, or without its first one if the line is cut.
+    // Only of a kValue line: the text before and after the first '='. fValue is without the quotes;
+    // a cut line has no closing quote to remove.
     std::string fKey;
     std::string fValue;
     bool fQuoted = false;

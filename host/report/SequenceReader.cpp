@@ -42,7 +42,7 @@ void SequenceReader::Add(const ReportLine& line)
         AddReportLine(line);
 }
 
-// "Testing terminated for glgpu[0]" at the end of a log line.
+// Reads "Testing terminated for glgpu[0]" at the end of a log line.
 void SequenceReader::AddTermination(const std::string& text)
 {
     constexpr std::string_view kText = "Testing terminated for ";
@@ -89,7 +89,7 @@ void SequenceReader::AddDeviceLine(const DeviceTag& tag, const ReportLine& line)
         Advance({GetRow(*known), tag.fIndex, known->fTagLines.size()});
 }
 
-// The line doesn't say whose it is: it is that of the first device that can have one here.
+// A gputag line names no device. It belongs to the first device that can print it now.
 void SequenceReader::AddTagLine(const std::string& key)
 {
     for (const KnownKey& known : GetKnownKeys()) {
@@ -155,7 +155,7 @@ std::size_t SequenceReader::GetSteps() const
 {
     if (!fLast)
         return 0;
-    std::size_t steps = 1; // that of the start
+    std::size_t steps = 1; // the one before the first line
     for (const KnownKey* const key : GetReportKeys()) {
         const bool isReached = GetRow(*key) <= fLast->fRow;
         const bool isCLCount = key->fKey == GetCountKey(DeviceKind::kOpenCL);
@@ -169,8 +169,7 @@ std::size_t SequenceReader::GetSteps() const
     return steps;
 }
 
-// A key that the device went by in silence counts too, as far as it is known to be in the run
-// still.
+// A step without a line counts once the report has gone past it, unless the device failed there.
 std::size_t SequenceReader::CountSteps(const DeviceTag& tag, const Device& device) const
 {
     const Table<KnownKey> keys = GetDeviceKeys(tag.fKind);
@@ -205,10 +204,11 @@ std::string SequenceReader::GetNextKey() const
                                                     : key.GetKey(MakeTag(*key.fKind, index));
         }
     }
-    return keys.back().fKey; // whose line has come, but isn't whole
+    return keys.back().fKey; // its line has come, but isn't whole
 }
 
-// The line that the device prints next of this row's ones; none if it prints none any more.
+// Returns which of the row's lines the device prints next, and nothing if it prints no more of
+// them.
 std::optional<std::size_t> SequenceReader::FindNextLine(std::size_t row, const DeviceTag& tag,
                                                         const Device& device) const
 {

@@ -1,5 +1,5 @@
-// Where in its sequence a child is, from the lines of its report so far. Whatever names what comes
-// next, or says that a device has failed, asks this.
+// Follows a report line by line through the child's sequence of tests. This is the only place that
+// decides which line comes next and whether a device has failed.
 #pragma once
 
 #include <cstddef>
@@ -14,48 +14,53 @@
 
 namespace assay_host {
 
-// Lines may be lost, foreign or forged: what a later line shows counts, and no line leads back.
+// Tolerates lines that are missing, unknown or forged: a later line is proof that the child went
+// past everything before it, and an earlier line never moves the reader back.
+//
+// One thread at a time.
 class SequenceReader {
 public:
+    // Reads the next line of the report. Any line is accepted.
     void Add(const ReportLine& line);
 
-    // Steps that are known to be taken.
+    // Returns the number of steps that the lines so far show to be taken.
     std::size_t GetSteps() const;
 
-    // What stands before the '=' of the line that comes next, and so what the child is at: one of
-    // the report's own keys, a device's key with its tag, or "gputag.NAME". Empty after a whole end
-    // stamp.
+    // Returns the key of the line that comes next, which is the child's current operation: a key
+    // without a tag, a device's key with its tag, or "gputag.NAME". Empty after a whole end stamp.
     std::string GetNextKey() const;
 
-    // Whether a line has come that follows the key's line, of that device if it is a device's.
+    // Whether a line has come that is printed after the key's line; for a device's key, after the
+    // line of that device.
     bool HasPassed(const KnownKey& key, std::size_t device = 0) const;
 
-    // Whether a test of the device failed: the log says so, or a line has come that follows one
-    // that the device would have printed, and none of its own.
+    // Whether a test of the device failed: the log says so, or the report has gone past a line that
+    // the device must print and has none from the device since.
     bool HasFailed(const DeviceTag& tag) const;
 
-    // How many of GetDeviceKeys() there are up to the last one that the device has a line for.
+    // Returns the number of keys of GetDeviceKeys() up to the last one that has a line of the
+    // device.
     std::size_t CountAnswered(const DeviceTag& tag) const;
 
 private:
-    // Of a line: its key, the device, and how many lines of the two stand in front of it.
+    // The position of a line, in the order of the report.
     struct Place {
         std::size_t fRow; // in GetKnownKeys()
         std::size_t fDevice;
-        std::size_t fLine;
+        std::size_t fLine; // among the key's gputag lines, which are followed by its own
     };
     friend bool operator<(const Place& a, const Place& b);
 
     struct Device {
-        std::size_t fAnswered = 0;
-        bool fTerminated = false;        // by the log
-        std::set<std::size_t> fSilent{}; // rows for which it has no line
+        std::size_t fAnswered = 0;       // as CountAnswered() returns it
+        bool fTerminated = false;        // the log says that a test failed
+        std::set<std::size_t> fSilent{}; // rows for which it prints no line
     };
     struct Kind {
         std::optional<std::size_t> fCount; // as the report says
         std::map<std::size_t, Device> fDevices;
 
-        // A device that the count leaves no room for leads nowhere.
+        // Lines of a device beyond the count don't advance the reader.
         bool Has(std::size_t index) const { return !fCount || index < *fCount; }
     };
 
@@ -72,8 +77,8 @@ private:
                                             const Device& device) const;
 
     std::map<DeviceKind, Kind> fKinds = {{DeviceKind::kOpenGL, {}}, {DeviceKind::kOpenCL, {}}};
-    std::optional<Place> fLast;
-    bool fEnded = false;
+    std::optional<Place> fLast; // the furthest line so far
+    bool fEnded = false;        // a whole end stamp has come
 };
 
 } // namespace assay_host

@@ -13,9 +13,9 @@ namespace {
 
 constexpr std::size_t kIndent = 2;
 constexpr std::size_t kGap = 2;
-constexpr std::size_t kLeastValueWidth = 20;
+constexpr std::size_t kMinValueWidth = 20;
 
-// How many bytes the first `width` characters take.
+// Returns the number of bytes of the first `width` characters.
 std::size_t CountBytes(std::string_view text, std::size_t width)
 {
     std::size_t bytes = 0;
@@ -39,7 +39,7 @@ void TextTable::Print(std::ostream& out, std::size_t width) const
             labels = std::max(labels, CountColumns(row.fLabel));
     }
     const std::size_t values = kIndent + labels + kGap;
-    const std::size_t room = std::max(kLeastValueWidth, width > values ? width - values : 0);
+    const std::size_t room = std::max(kMinValueWidth, width > values ? width - values : 0);
     for (const Row& row : fRows) {
         std::string label = std::string(kIndent, ' ') + row.fLabel;
         if (row.fValue.empty()) {
@@ -58,12 +58,12 @@ std::vector<std::string> WrapText(std::string_view text, std::size_t width)
 {
     std::vector<std::string> lines;
     while (true) {
-        const std::size_t most = CountBytes(text, width);
-        if (most == text.size())
+        const std::size_t max = CountBytes(text, width);
+        if (max == text.size())
             break;
-        std::size_t end = text.rfind(' ', most);
+        std::size_t end = text.rfind(' ', max);
         if (end == std::string_view::npos || end == 0)
-            end = most;
+            end = max;
         lines.emplace_back(text.substr(0, end));
         text.remove_prefix(end);
         if (!text.empty() && text.front() == ' ')

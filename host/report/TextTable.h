@@ -1,4 +1,4 @@
-// A table of two columns on a terminal: labels, and values that are wrapped.
+// A table of two columns on a terminal: labels and wrapped values.
 #pragma once
 
 #include <ostream>
@@ -10,13 +10,12 @@ namespace assay_host {
 
 class TextTable {
 public:
-    // Label and value must be ready for a terminal. An empty value makes the label a heading; an
-    // empty label goes on with the row before.
+    // Adds a row. Both texts must be safe to write to a terminal. A row with an empty value is a
+    // heading; a row with an empty label continues the row before.
     void Add(std::string label, std::string value);
 
-    bool IsEmpty() const { return fRows.empty(); }
-
-    // Lines are no longer than the width, as far as words, and the labels, allow.
+    // Prints the rows. Values are wrapped at the width, but get at least 20 columns. Doesn't check
+    // the stream for failures.
     void Print(std::ostream& out, std::size_t width) const;
 
 private:
@@ -27,8 +26,8 @@ private:
     std::vector<Row> fRows;
 };
 
-// The text in lines of at most `width` characters, broken at blanks where there are any. At least
-// one line.
+// Splits the text into lines of at most `width` characters, at blanks where possible. Returns at
+// least one line. `width` must not be 0.
 std::vector<std::string> WrapText(std::string_view text, std::size_t width);
 
 } // namespace assay_host

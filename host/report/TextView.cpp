@@ -19,16 +19,15 @@ namespace assay_host {
 
 namespace {
 
-// What a terminal can take in at once of standard error, or of lines that are no report's.
-constexpr std::size_t kMostOtherLines = 10;
+// The last lines of standard error, and of lines that aren't part of a report, that are shown.
+constexpr std::size_t kMaxOtherLines = 10;
 
 std::size_t GetWidth(int width)
 {
-    constexpr int kLeastWidth = 40;
-    return static_cast<std::size_t>(std::max(width, kLeastWidth));
+    constexpr int kMinWidth = 40;
+    return static_cast<std::size_t>(std::max(width, kMinWidth));
 }
 
-// A key that isn't known is its own label.
 std::string GetLabel(const Answer& answer)
 {
     return answer.fKnown ? answer.fKnown->fLabel : ShowBytes(answer.fKey);
@@ -116,7 +115,7 @@ private:
         if (!present.empty())
             fTable.Add("Extensions", present);
         if (!absent.empty())
-            fTable.Add("Extensions it lacks", absent);
+            fTable.Add("Extensions missing", absent);
         if (!unclear.empty())
             fTable.Add("Extensions, unclear", unclear);
     }
@@ -134,7 +133,7 @@ private:
         }
     }
 
-    // Thirty rows that say the same are no table: what is missing for one reason is one row.
+    // Adds one row for each reason, with the labels of all keys that are missing for it.
     void AddLost()
     {
         for (const Missing missing :
@@ -148,7 +147,7 @@ private:
         }
     }
 
-    // `all`: what says it shorter if the whole group is missing.
+    // `all`: replaces the labels if every key of the group is missing; null for no replacement.
     void AddLost(std::string& labels, KeyGroup group, Missing missing, const char* all)
     {
         std::string some;
@@ -181,13 +180,13 @@ void PrintWarnings(std::ostream& out, const std::vector<std::string>& warnings, 
     out << "\n";
 }
 
-// The last lines of many, under one label.
+// Adds the last lines under one label.
 void AddLines(TextTable& table, const std::string& label, const std::vector<std::string>& lines)
 {
     std::string first = label;
-    const std::size_t left = lines.size() - std::min(lines.size(), kMostOtherLines);
+    const std::size_t left = lines.size() - std::min(lines.size(), kMaxOtherLines);
     if (left > 0)
-        table.Add(std::exchange(first, ""), fmt::format("({} lines before)", left));
+        table.Add(std::exchange(first, ""), fmt::format("({} earlier lines)", left));
     for (std::size_t line = left; line < lines.size(); ++line) {
         const std::string text = ShowBytes(lines[line]);
         table.Add(std::exchange(first, ""), text.empty() ? "(empty)" : text);
@@ -220,7 +219,7 @@ std::string GetTimeText(const RunOutcome& outcome)
     return text;
 }
 
-// "2 OpenGL, no OpenCL"
+// Returns a text such as "2 OpenGL, no OpenCL".
 std::string GetCountText(const Answers& answers)
 {
     std::string text;

@@ -1,4 +1,4 @@
-// A run for people: warnings first, then one table a device, then the verdict.
+// The text form of a run: the warnings, a table for each device, and the verdict.
 #pragma once
 
 #include <ostream>
@@ -8,7 +8,8 @@
 
 namespace assay_host {
 
-// `width`: columns of the terminal; longer values are wrapped.
+// Prints the run. `width`: columns of the terminal, to which values are wrapped; at least 40 are
+// used. Doesn't check the stream for failures.
 void PrintText(std::ostream& out, const Report& report, const RunOutcome& outcome, int width);
 
 } // namespace assay_host

@@ -18,7 +18,6 @@ namespace {
 
 constexpr const char* kNotKnown = "not known";
 
-// Blanks at the end of a name are nothing to look at.
 std::string_view TrimEnd(std::string_view text)
 {
     return text.substr(0, text.find_last_not_of(' ') + 1);
@@ -83,7 +82,7 @@ std::optional<std::string> GetFlagText(std::string_view value)
     return std::nullopt;
 }
 
-// "[8]" is 8, "[8, 4]" stays.
+// Shows "[8]" as "8". A longer list is shown as it is.
 std::optional<std::string> GetCountText(std::string_view value)
 {
     const auto numbers = ReadNumberList(value);
@@ -92,7 +91,7 @@ std::optional<std::string> GetCountText(std::string_view value)
     return std::string(value.substr(1, value.size() - 2));
 }
 
-// The system's own form of a date, "20210315000000.000000-000".
+// Reads a date in the form of WMI, "20210315000000.000000-000".
 std::optional<std::string> GetDateText(std::string_view value)
 {
     const auto isDigit = [](char character) { return character >= '0' && character <= '9'; };
@@ -110,7 +109,7 @@ std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
         break;
     case ValueForm::kAdapter:
         if (value.empty())
-            return "none of the system's";
+            return "none";
         break;
     case ValueForm::kDate:
         return GetDateText(value);

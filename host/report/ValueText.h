@@ -1,4 +1,4 @@
-// Values as people like to read them.
+// Values in the text form. Any thread may call.
 #pragma once
 
 #include <string>
@@ -7,11 +7,13 @@
 
 namespace assay_host {
 
-// The answer's value in a sensible unit ("4 GiB", "0x10DE (4318)", "yes"), for a terminal; what has
-// another form than its key is shown as it came. Of a missing one "- (REASON)".
+// Returns the value with its unit, safe to write to a terminal: "4 GiB", "0x10DE (4318)", "yes". A
+// value that doesn't have the form of its key is shown as it is, a missing one as "- (REASON)".
+// Never empty.
 std::string GetValueText(const Answer& answer);
 
-// A device's name for people: the adapter's, else the renderer's, as it came. May be empty.
+// Returns the device's name: the adapter's if there is one, otherwise the renderer's. The bytes are
+// unchanged; the name may be empty.
 std::string GetDeviceName(const DeviceAnswers& device);
 
 } // namespace assay_host

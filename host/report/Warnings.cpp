@@ -1,7 +1,6 @@
 #include "report/Warnings.h"
 
 #include <algorithm>
-#include <cctype>
 #include <string_view>
 
 #include <fmt/format.h>
@@ -15,7 +14,7 @@ namespace {
 
 using Warnings = std::vector<std::string>;
 
-// Parts of the names that software renderers give themselves, in small letters.
+// Parts of the names of software renderers, in lower case.
 constexpr std::string_view kSoftwareNames[] = {
     "llvmpipe",
     "softpipe",
@@ -25,23 +24,23 @@ constexpr std::string_view kSoftwareNames[] = {
     "basic render driver",
 };
 
-// No device copies or computes so fast: its clock can't be right.
-constexpr double kMostBytesPerSecond = 1e13;
-constexpr double kMostScore = 1e8;
+// No device is as fast: a larger measurement means that its clock is wrong.
+constexpr double kMaxBytesPerSecond = 1e13;
+constexpr double kMaxScore = 1e8;
 
 struct Check {
     const char* fKey;
     const char* fText;
 };
 constexpr Check kReportChecks[] = {
-    {"QGFCoreInitialized", "The graphics library doesn't start."},
-    {"QGFOGLInitialized", "There is no OpenGL binding with a display device."},
-    {"OGLContextCreated", "No OpenGL context can be made on the first display device."},
+    {"QGFCoreInitialized", "The graphics library could not be initialized."},
+    {"QGFOGLInitialized", "OpenGL could not be initialized on any display device."},
+    {"OGLContextCreated", "No OpenGL context could be created on the first display device."},
     {"NumGLGPUs", "No OpenGL device was found."},
 };
 constexpr Check kTrials[] = {
-    {"CanCompileProgramGLSL", "a realistic pair of shaders doesn't compile and link"},
-    {"GLFrameBufferOK", "a framebuffer object can't be made, drawn to and found complete"},
+    {"CanCompileProgramGLSL", "a realistic pair of shaders does not compile and link"},
+    {"GLFrameBufferOK", "no complete framebuffer object could be created and drawn to"},
 };
 
 bool IsSoftware(std::string name)
@@ -74,27 +73,27 @@ void WarnOfAdapter(Warnings& warnings, const DeviceAnswers& device)
     const bool isIdless = device.GetValue("GLVendorID") == "0";
     if (!isNameless && !isIdless)
         return;
-    warnings.push_back(fmt::format("{}: no adapter of the system matches it ({})", device.fTag,
+    warnings.push_back(fmt::format("{}: matches no adapter of the system ({})", device.fTag,
                                    isNameless && isIdless ? "no name and no vendor id"
                                    : isNameless           ? "no name"
                                                           : "no vendor id"));
 }
 
 void WarnOfMeasurement(Warnings& warnings, const DeviceAnswers& device, const char* key,
-                       const char* what, double most)
+                       const char* what, double max)
 {
     const ReportLine* const line = device.Find(key);
     if (!line)
         return;
     const auto value = ReadDouble(line->fValue);
-    if (value && *value > 0 && *value <= most)
+    if (value && *value > 0 && *value <= max)
         return;
     warnings.push_back(value && *value == 0
-                           ? fmt::format("{}: {} could not be measured: the device's clock shows "
-                                         "no time",
+                           ? fmt::format("{}: {} could not be measured: the device's clock "
+                                         "reported no elapsed time",
                                          device.fTag, what)
-                           : fmt::format("{}: {} is implausible ({}): the device's clock can't be "
-                                         "trusted",
+                           : fmt::format("{}: {} is implausible ({}): the device's clock is "
+                                         "unreliable",
                                          device.fTag, what, ShowBytes(line->fValue)));
 }
 
@@ -121,8 +120,8 @@ void WarnOfDevice(Warnings& warnings, const DeviceAnswers& device)
     }
     WarnOfAdapter(warnings, device);
     WarnOfFailure(warnings, device);
-    WarnOfMeasurement(warnings, device, "CLBandwidth", "the copy bandwidth", kMostBytesPerSecond);
-    WarnOfMeasurement(warnings, device, "CLCompute", "the compute score", kMostScore);
+    WarnOfMeasurement(warnings, device, "CLBandwidth", "the copy bandwidth", kMaxBytesPerSecond);
+    WarnOfMeasurement(warnings, device, "CLCompute", "the compute score", kMaxScore);
 }
 
 } // namespace
@@ -131,13 +130,13 @@ std::vector<std::string> GetWarnings(const Answers& answers, const RunOutcome& o
 {
     Warnings warnings;
     if (outcome.fLeftBehind)
-        warnings.emplace_back("A process of the child couldn't be ended and may still run.");
+        warnings.emplace_back("A process of the child could not be killed and may still run.");
     if (outcome.fLostOutputBytes > 0)
-        warnings.push_back(fmt::format("The child's output was too much: {} bytes of it were cut.",
+        warnings.push_back(fmt::format("The child wrote too much output: {} bytes were dropped.",
                                        outcome.fLostOutputBytes));
     if (outcome.fLostErrorBytes > 0)
         warnings.push_back(
-            fmt::format("The child's standard error was too much: {} bytes of it were cut.",
+            fmt::format("The child wrote too much to standard error: {} bytes were dropped.",
                         outcome.fLostErrorBytes));
     for (const Check& check : kReportChecks) {
         const auto answer =

@@ -1,4 +1,4 @@
-// What a person should know before anything else of a run.
+// The warnings that the text form begins with.
 #pragma once
 
 #include <string>
@@ -9,7 +9,8 @@
 
 namespace assay_host {
 
-// One sentence each, ready for a terminal: of the run first, then of each device.
+// Returns one sentence for each warning, safe to write to a terminal: of the run, then of each
+// device. Any thread may call.
 std::vector<std::string> GetWarnings(const Answers& answers, const RunOutcome& outcome);
 
 } // namespace assay_host

@@ -1,4 +1,4 @@
-// Reports to test with.
+// Builds reports for tests.
 #pragma once
 
 #include <algorithm>
@@ -7,7 +7,8 @@
 
 namespace assay_host {
 
-// The two devices of a machine with one good card, as key and value in the report's form.
+// A key and its value in the form of a report. The tables have the two devices of a machine with
+// one card.
 struct SampleValue {
     const char* fKey;
     const char* fValue;
@@ -67,27 +68,27 @@ constexpr SampleValue kSampleCL[] = {
     {"CLCompute", "1234.56"},
 };
 
-// Builds a report of several devices in the report's order, and breaks it off or changes it.
+// Builds the report of a machine with several devices. It can be changed and truncated.
 class Sample {
 public:
     Sample(int glCount, int clCount) : fGLCount(glCount), fCLCount(clCount) {}
 
-    // Another value for a key, tag and all; an empty one leaves the line out.
+    // Changes the value of a key (with its tag). An empty value removes the line.
     Sample& Set(std::string key, std::string value)
     {
         fChanges.push_back({std::move(key), std::move(value)});
         return *this;
     }
 
-    // The device has no line from this key on.
+    // Removes the device's lines from this key on.
     Sample& Fail(std::string tag, std::string key)
     {
         fFailures.push_back({std::move(tag), std::move(key)});
         return *this;
     }
 
-    // Nothing comes behind this key, tag and all.
-    Sample& EndBehind(std::string key)
+    // Removes all lines after that of this key (with its tag).
+    Sample& EndAfter(std::string key)
     {
         fLastKey = std::move(key);
         return *this;

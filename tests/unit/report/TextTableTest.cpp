@@ -22,7 +22,7 @@ TEST(TextTable, WrapsAtBlanksAndWithinLongWords)
     EXPECT_EQ(WrapText("0123456789 ", 10), (Texts{"0123456789", ""}));
 }
 
-TEST(TextTable, CountsCharactersAndKeepsThemWhole)
+TEST(TextTable, CountsAndKeepsWholeCharacters)
 {
     const std::string e = "\xC3\xA9";
     EXPECT_EQ(WrapText(e + e + e + e, 4), Texts{e + e + e + e});
@@ -32,12 +32,10 @@ TEST(TextTable, CountsCharactersAndKeepsThemWhole)
 TEST(TextTable, AlignsItsValues)
 {
     TextTable table;
-    EXPECT_TRUE(table.IsEmpty());
     table.Add("A", "first");
     table.Add("A heading that is very long", "");
     table.Add("Longer", "second value that is wrapped");
     table.Add("", "third");
-    EXPECT_FALSE(table.IsEmpty());
     std::ostringstream out;
     table.Print(out, 31);
     EXPECT_EQ(out.str(), "  A       first\n"

@@ -61,7 +61,7 @@ TEST(TextView, OfAGoodMachine)
               "                          GL_EXT_framebuffer_object, GL_ARB_texture_rectangle,\n"
               "                          GL_ARB_texture_float, GL_ARB_occlusion_query,\n"
               "                          GL_ARB_vertex_buffer_object\n"
-              "  Extensions it lacks     GL_ARB_shader_texture_lod\n"
+              "  Extensions missing      GL_ARB_shader_texture_lod\n"
               "\n"
               "OpenCL device clgpu[0]: Accelerator 4000\n"
               "----------------------------------------\n"
@@ -105,18 +105,18 @@ TEST(TextView, OfACrashAndABadDevice)
                                    .Set("glgpu[0].GLName", "\"\"")
                                    .Fail("glgpu[0]", "GLDriver")
                                    .Set("glgpu[1].GLName", "\"Evil \x1B[2J\xFF\"")
-                                   .EndBehind("glgpu[1].GLDriverDate")
+                                   .EndAfter("glgpu[1].GLDriverDate")
                                    .GetText();
     EXPECT_EQ(Print(report + "# 00004 compiling\n", outcome, 70),
               "Warnings\n"
               "--------\n"
               "  !  glgpu[0]: software renderer, no graphics hardware: softpipe\n"
-              "  !  glgpu[0]: no adapter of the system matches it (no name)\n"
+              "  !  glgpu[0]: matches no adapter of the system (no name)\n"
               "  !  glgpu[0]: a test failed: no answer from GLDriver on\n"
               "\n"
               "OpenGL device glgpu[0]: softpipe\n"
               "--------------------------------\n"
-              "  Adapter               none of the system's\n"
+              "  Adapter               none\n"
               "  Renderer              softpipe\n"
               "  Vendor                Example Corporation\n"
               "  Vendor id             0x10DE (4318)\n"
@@ -160,7 +160,7 @@ TEST(TextView, OfACrashAndABadDevice)
               "  Last report line  glgpu[1].GLDriverDate=\"\"\n"
               "  Last log line     # 00004 compiling\n"
               "  Next to report    glgpu[1].CanCompileProgramGLSL\n"
-              "  Standard error    (3 lines before)\n"
+              "  Standard error    (3 earlier lines)\n"
               "                    error 3\n"
               "                    error 4\n"
               "                    error 5\n"
@@ -185,7 +185,7 @@ TEST(TextView, OfAChildThatNeverStarted)
                                   "  Time           0.00 s\n");
 }
 
-TEST(TextView, OfAChildThatSaysSomethingElse)
+TEST(TextView, OfAChildWithoutAReport)
 {
     RunOutcome outcome;
     outcome.fVerdict = Verdict::kUsageError;
@@ -201,14 +201,14 @@ TEST(TextView, OfAChildThatSaysSomethingElse)
                                          "  Other lines     x\n");
 }
 
-TEST(TextView, HasKeysThatAreNotKnown)
+TEST(TextView, HasUnknownKeys)
 {
     const std::string text = Print(Sample(1, -1).GetText() + "glgpu[0].Extra=\"1\t2\"\n", {});
     EXPECT_NE(text.find("  Others\n    Extra                 1\\t2\n"), std::string::npos) << text;
     EXPECT_NE(text.find("  Devices  1 OpenGL, no OpenCL\n"), std::string::npos) << text;
 }
 
-TEST(TextView, ListsExtensionsThatHaveNoAnswerOfTheirForm)
+TEST(TextView, ListsExtensionsWithUnclearOrMissingAnswers)
 {
     const std::string text =
         Print(Sample(1, 0)
@@ -223,7 +223,7 @@ TEST(TextView, ListsExtensionsThatHaveNoAnswerOfTheirForm)
         << text;
 }
 
-TEST(TextView, ShowsNoByteThatATerminalObeys)
+TEST(TextView, EscapesWhatControlsATerminal)
 {
     std::string bytes;
     for (int byte = 0; byte < 256; ++byte)
@@ -242,7 +242,7 @@ TEST(TextView, ShowsNoByteThatATerminalObeys)
                                    .Set("glgpu[0].GLRenderer", "\"llvmpipe" + bytes + "\"")
                                    .Set("glgpu[0].GLMemoryMB", bytes.substr(11))
                                    .Set("clgpu[0].CLBandwidth", bytes.substr(11))
-                                   .EndBehind("clgpu[0].CLBandwidth")
+                                   .EndAfter("clgpu[0].CLBandwidth")
                                    .GetText();
     for (const char character : Print(report + bytes, outcome, 0))
         EXPECT_TRUE(character == '\n' || (character >= ' ' && character <= '~'));

@@ -8,7 +8,7 @@
 namespace assay_host {
 namespace {
 
-// How the value of a device's key is shown, as it stands in a report.
+// Returns the value of the line of a device's key as it is shown.
 std::string Show(const std::string& line)
 {
     const Report report = ReadReport(line + "\n");
@@ -20,7 +20,7 @@ std::string Show(const std::string& line)
     return "no value";
 }
 
-TEST(ValueText, HasSensibleUnits)
+TEST(ValueText, HasUnits)
 {
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=0"), "not known");
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=512"), "512 MiB");
@@ -42,7 +42,7 @@ TEST(ValueText, HasSensibleUnits)
     EXPECT_EQ(Show("glgpu[0].glGetIntegerv[GL_MAX_TEXTURE_UNITS]=[8, 4]"), "[8, 4]");
 }
 
-TEST(ValueText, HasIdsAsBooksHaveThem)
+TEST(ValueText, ShowsIdsInHexadecimal)
 {
     EXPECT_EQ(Show("glgpu[0].GLVendorID=4318"), "0x10DE (4318)");
     EXPECT_EQ(Show("glgpu[0].GLRendererID=1"), "0x0001 (1)");
@@ -50,7 +50,7 @@ TEST(ValueText, HasIdsAsBooksHaveThem)
     EXPECT_EQ(Show("glgpu[0].GLVendorID=0"), "not known");
 }
 
-TEST(ValueText, HasWordsForFlagsAndForWhatIsNotKnown)
+TEST(ValueText, HasWordsForFlagsAndUnknownValues)
 {
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=1"), "yes");
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=0"), "no");
@@ -58,13 +58,13 @@ TEST(ValueText, HasWordsForFlagsAndForWhatIsNotKnown)
     EXPECT_EQ(Show("glgpu[0].GLDriver=\"\""), "(empty)");
     EXPECT_EQ(Show("glgpu[0].GLDriver=\"  \""), "(empty)");
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB="), "(empty)");
-    EXPECT_EQ(Show("glgpu[0].GLName=\"\""), "none of the system's");
+    EXPECT_EQ(Show("glgpu[0].GLName=\"\""), "none");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"?\""), "not known");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"20210315000000.000000-000\""), "2021-03-15");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"March 2021\""), "March 2021");
 }
 
-TEST(ValueText, ShowsWhatHasAnotherFormAsItCame)
+TEST(ValueText, ShowsOtherFormsUnchanged)
 {
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=much"), "much");
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=-1"), "-1");
@@ -77,7 +77,7 @@ TEST(ValueText, ShowsWhatHasAnotherFormAsItCame)
     EXPECT_EQ(Show("glgpu[0].GLRenderer=\"3.0  \""), "3.0");
 }
 
-TEST(ValueText, SaysWhatWasCutAndWhatIsMissing)
+TEST(ValueText, MarksCutAndMissingValues)
 {
     ReportReader::Limits limits;
     limits.fMaxLineBytes = 28;

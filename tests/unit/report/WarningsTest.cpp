@@ -20,14 +20,14 @@ std::vector<std::string> Warn(const std::string& text, const RunOutcome& outcome
     return GetWarnings(GetAnswers(report), outcome);
 }
 
-TEST(Warnings, AreNoneOfAGoodMachine)
+TEST(Warnings, AreNoneForAGoodMachine)
 {
     EXPECT_THAT(Warn(Sample(2, 2).GetText()), IsEmpty());
     EXPECT_THAT(Warn(Sample(1, -1).GetText()), IsEmpty());
     EXPECT_THAT(Warn(""), IsEmpty());
 }
 
-TEST(Warnings, TellEachSoftwareRenderer)
+TEST(Warnings, NameEachSoftwareRenderer)
 {
     for (const char* name :
          {"llvmpipe (LLVM 15.0.6, 256 bits)", "softpipe", "Google SwiftShader", "GDI Generic",
@@ -44,30 +44,30 @@ TEST(Warnings, TellEachSoftwareRenderer)
                 ElementsAre("glgpu[0]: software renderer, no graphics hardware: softpipe\\x1B"));
 }
 
-TEST(Warnings, TellAFailedTrial)
+TEST(Warnings, NameAFailedTrial)
 {
     EXPECT_THAT(Warn(Sample(2, 0)
                          .Set("glgpu[1].CanCompileProgramGLSL", "0")
                          .Set("glgpu[1].GLFrameBufferOK", "0")
                          .GetText()),
-                ElementsAre("glgpu[1]: a realistic pair of shaders doesn't compile and link",
-                            "glgpu[1]: a framebuffer object can't be made, drawn to and found "
-                            "complete"));
+                ElementsAre("glgpu[1]: a realistic pair of shaders does not compile and link",
+                            "glgpu[1]: no complete framebuffer object could be created and drawn "
+                            "to"));
 }
 
-TEST(Warnings, TellADeviceThatNoAdapterMatches)
+TEST(Warnings, NameADeviceThatMatchesNoAdapter)
 {
     EXPECT_THAT(Warn(Sample(1, 0).Set("glgpu[0].GLName", "\"\"").GetText()),
-                ElementsAre("glgpu[0]: no adapter of the system matches it (no name)"));
+                ElementsAre("glgpu[0]: matches no adapter of the system (no name)"));
     EXPECT_THAT(Warn(Sample(1, 0).Set("glgpu[0].GLVendorID", "0").GetText()),
-                ElementsAre("glgpu[0]: no adapter of the system matches it (no vendor id)"));
+                ElementsAre("glgpu[0]: matches no adapter of the system (no vendor id)"));
     EXPECT_THAT(
         Warn(Sample(1, 0).Set("glgpu[0].GLVendorID", "0").Set("glgpu[0].GLName", "\"\"").GetText()),
-        ElementsAre("glgpu[0]: no adapter of the system matches it (no name and no vendor id)"));
+        ElementsAre("glgpu[0]: matches no adapter of the system (no name and no vendor id)"));
     EXPECT_THAT(Warn(Sample(1, 1).Set("clgpu[0].CLVendorID", "0").GetText()), IsEmpty());
 }
 
-TEST(Warnings, TellAFailedTest)
+TEST(Warnings, NameADeviceWithAFailedTest)
 {
     EXPECT_THAT(Warn(Sample(1, 1)
                          .Fail("glgpu[0]", "GLRenderer")
@@ -77,10 +77,10 @@ TEST(Warnings, TellAFailedTest)
                             "clgpu[0]: a test failed: no answer from CLPlatformVersion on"));
     EXPECT_THAT(Warn(Sample(1, 0).GetText() + "# x Testing terminated for glgpu[0]\n"),
                 ElementsAre("glgpu[0]: a test failed"));
-    EXPECT_THAT(Warn(Sample(1, 0).EndBehind("glgpu[0].GLName").GetText()), IsEmpty());
+    EXPECT_THAT(Warn(Sample(1, 0).EndAfter("glgpu[0].GLName").GetText()), IsEmpty());
 }
 
-TEST(Warnings, TellAMeasurementThatIsNone)
+TEST(Warnings, NameAnImpossibleMeasurement)
 {
     const auto warn = [](const char* bandwidth, const char* compute) {
         return Warn(Sample(1, 1)
@@ -90,36 +90,36 @@ TEST(Warnings, TellAMeasurementThatIsNone)
     };
     EXPECT_THAT(warn("0", "0"),
                 ElementsAre("clgpu[0]: the copy bandwidth could not be measured: the device's "
-                            "clock shows no time",
+                            "clock reported no elapsed time",
                             "clgpu[0]: the compute score could not be measured: the device's clock "
-                            "shows no time"));
+                            "reported no elapsed time"));
     EXPECT_THAT(warn("3.35544e+16", "8e+09"),
                 ElementsAre("clgpu[0]: the copy bandwidth is implausible (3.35544e+16): the "
-                            "device's clock can't be trusted",
+                            "device's clock is unreliable",
                             "clgpu[0]: the compute score is implausible (8e+09): the device's "
-                            "clock can't be trusted"));
+                            "clock is unreliable"));
     EXPECT_THAT(warn("inf", "-1"),
                 ElementsAre("clgpu[0]: the copy bandwidth is implausible (inf): the device's clock "
-                            "can't be trusted",
+                            "is unreliable",
                             "clgpu[0]: the compute score is implausible (-1): the device's clock "
-                            "can't be trusted"));
+                            "is unreliable"));
     EXPECT_THAT(warn("1e+13", "1e+08"), IsEmpty());
 }
 
-TEST(Warnings, TellFailedChecksOfTheReport)
+TEST(Warnings, NameFailedChecksOfTheReport)
 {
     EXPECT_THAT(Warn(Sample(0, 0)
                          .Set("QGFCoreInitialized", "0")
                          .Set("QGFOGLInitialized", "0")
                          .Set("OGLContextCreated", "0")
                          .GetText()),
-                ElementsAre("The graphics library doesn't start.",
-                            "There is no OpenGL binding with a display device.",
-                            "No OpenGL context can be made on the first display device.",
+                ElementsAre("The graphics library could not be initialized.",
+                            "OpenGL could not be initialized on any display device.",
+                            "No OpenGL context could be created on the first display device.",
                             "No OpenGL device was found."));
 }
 
-TEST(Warnings, TellWhatWasLostAndLeft)
+TEST(Warnings, NameLostBytesAndProcessesLeftBehind)
 {
     RunOutcome outcome;
     outcome.fLostOutputBytes = 5;
@@ -129,9 +129,9 @@ TEST(Warnings, TellWhatWasLostAndLeft)
     for (int index = 0; index < 258; ++index)
         text += "glgpu[" + std::to_string(index) + "].X=1\n";
     EXPECT_THAT(Warn(text, outcome),
-                ElementsAre("A process of the child couldn't be ended and may still run.",
-                            "The child's output was too much: 5 bytes of it were cut.",
-                            "The child's standard error was too much: 6 bytes of it were cut.",
+                ElementsAre("A process of the child could not be killed and may still run.",
+                            "The child wrote too much output: 5 bytes were dropped.",
+                            "The child wrote too much to standard error: 6 bytes were dropped.",
                             "2 more devices are left out."));
 }
 
