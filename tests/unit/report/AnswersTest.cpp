@@ -11,8 +11,8 @@
 namespace assay_host {
 namespace {
 
-// "value", or "- reason", of a device's key or of one without a tag.
-std::string Tell(const Answers& answers, const std::string& tag, const std::string& key)
+// Returns the key's value, or "- REASON" if it is missing. An empty tag is for a key without one.
+std::string Show(const Answers& answers, const std::string& tag, const std::string& key)
 {
     const std::vector<Answer>* list = tag.empty() ? &answers.fReport : nullptr;
     for (const DeviceAnswers& device : answers.fDevices) {
@@ -34,7 +34,7 @@ std::string Next(const std::string& text)
     return GetAnswers(ReadReport(text)).fNext;
 }
 
-TEST(KnownKeys, AreThoseOfAWholeReportInItsOrder)
+TEST(KnownKeys, AreInTheOrderOfAWholeReport)
 {
     const Table<KnownKey> gl = GetDeviceKeys(DeviceKind::kOpenGL);
     ASSERT_EQ(gl.size(), std::size(kSampleGL));
@@ -47,7 +47,7 @@ TEST(KnownKeys, AreThoseOfAWholeReportInItsOrder)
     EXPECT_EQ(GetReportKeys().size(), 8U);
 }
 
-TEST(Answers, AreAllThereOfAWholeReport)
+TEST(Answers, OfAWholeReportHaveAllLines)
 {
     const Report report = ReadReport(Sample(2, 1).GetText());
     const Answers answers = GetAnswers(report);
@@ -70,29 +70,29 @@ TEST(Answers, AreAllThereOfAWholeReport)
     }
 }
 
-TEST(Answers, TellANoFromADeviceWithoutCUDA)
+TEST(Answers, NameNoFailureOfADeviceWithoutCUDA)
 {
     const Report without = ReadReport(
         Sample(0, 1).Set("clgpu[0].CUDASupported", "0").Set("clgpu[0].CUDAVersion", "").GetText());
-    EXPECT_EQ(Tell(GetAnswers(without), "clgpu[0]", "CUDAVersion"), "- not printed by this device");
+    EXPECT_EQ(Show(GetAnswers(without), "clgpu[0]", "CUDAVersion"), "- not printed by this device");
     EXPECT_FALSE(GetAnswers(without).fDevices.at(0).fFailed);
     const Report nameless = ReadReport(Sample(0, 1).Set("clgpu[0].CUDAVersion", "").GetText());
-    EXPECT_EQ(Tell(GetAnswers(nameless), "clgpu[0]", "CUDAVersion"),
+    EXPECT_EQ(Show(GetAnswers(nameless), "clgpu[0]", "CUDAVersion"),
               "- not printed by this device");
 }
 
-TEST(Answers, TellWhichDeviceFailed)
+TEST(Answers, NameTheFailedDevices)
 {
     const Report report = ReadReport(
         Sample(2, 2).Fail("glgpu[0]", "GLMemoryMB").Fail("clgpu[1]", "CUDAVersion").GetText());
     const Answers answers = GetAnswers(report);
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "IsIntegratedGLGPU"), "0");
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "GLMemoryMB"), "- device failed before");
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "extension[QGF::OGL::GL_ARB_SHADER_TEXTURE_LOD]"),
+    EXPECT_EQ(Show(answers, "glgpu[0]", "IsIntegratedGLGPU"), "0");
+    EXPECT_EQ(Show(answers, "glgpu[0]", "GLMemoryMB"), "- device failed before");
+    EXPECT_EQ(Show(answers, "glgpu[0]", "extension[QGF::OGL::GL_ARB_SHADER_TEXTURE_LOD]"),
               "- device failed before");
-    EXPECT_EQ(Tell(answers, "clgpu[1]", "CUDASupported"), "1");
-    EXPECT_EQ(Tell(answers, "clgpu[1]", "CUDAVersion"), "- device failed before");
-    EXPECT_EQ(Tell(answers, "clgpu[1]", "CLCompute"), "- device failed before");
+    EXPECT_EQ(Show(answers, "clgpu[1]", "CUDASupported"), "1");
+    EXPECT_EQ(Show(answers, "clgpu[1]", "CUDAVersion"), "- device failed before");
+    EXPECT_EQ(Show(answers, "clgpu[1]", "CLCompute"), "- device failed before");
     EXPECT_TRUE(answers.fDevices[0].fFailed);
     EXPECT_FALSE(answers.fDevices[0].fComplete);
     EXPECT_FALSE(answers.fDevices[1].fFailed);
@@ -101,61 +101,61 @@ TEST(Answers, TellWhichDeviceFailed)
     EXPECT_TRUE(answers.fDevices[3].fFailed);
 }
 
-TEST(Answers, TellAFailedDeviceFromTheOneThatWasUnderWay)
+TEST(Answers, DistinguishFailedDevicesFromTheCurrentOne)
 {
-    const Report report = ReadReport(
-        Sample(3, 0).Fail("glgpu[0]", "GLName").EndBehind("glgpu[1].GLVendor").GetText());
+    const Report report =
+        ReadReport(Sample(3, 0).Fail("glgpu[0]", "GLName").EndAfter("glgpu[1].GLVendor").GetText());
     const Answers answers = GetAnswers(report);
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "GLName"), "- device failed before");
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "GLFrameBufferOK"), "- device failed before");
-    EXPECT_EQ(Tell(answers, "glgpu[1]", "GLVendor"), "Example Corporation");
-    EXPECT_EQ(Tell(answers, "glgpu[1]", "GLVendorID"), "- run ended before");
-    EXPECT_EQ(Tell(answers, "glgpu[2]", "GLName"), "Accelerator 4000");
-    EXPECT_EQ(Tell(answers, "glgpu[2]", "GLVendor"), "- run ended before");
-    EXPECT_EQ(Tell(answers, "", "NumCLGPUs"), "- run ended before");
-    EXPECT_EQ(Tell(answers, "", "assayEnd"), "- run ended before");
+    EXPECT_EQ(Show(answers, "glgpu[0]", "GLName"), "- device failed before");
+    EXPECT_EQ(Show(answers, "glgpu[0]", "GLFrameBufferOK"), "- device failed before");
+    EXPECT_EQ(Show(answers, "glgpu[1]", "GLVendor"), "Example Corporation");
+    EXPECT_EQ(Show(answers, "glgpu[1]", "GLVendorID"), "- run ended before");
+    EXPECT_EQ(Show(answers, "glgpu[2]", "GLName"), "Accelerator 4000");
+    EXPECT_EQ(Show(answers, "glgpu[2]", "GLVendor"), "- run ended before");
+    EXPECT_EQ(Show(answers, "", "NumCLGPUs"), "- run ended before");
+    EXPECT_EQ(Show(answers, "", "assayEnd"), "- run ended before");
     EXPECT_EQ(answers.fNext, "glgpu[2].GLVendor");
 }
 
-TEST(Answers, BelieveTheLogThatADeviceFailed)
+TEST(Answers, TakeAFailureFromTheLog)
 {
-    const std::string text = Sample(1, 0).EndBehind("glgpu[0].GLName").GetText();
-    EXPECT_EQ(Tell(GetAnswers(ReadReport(text)), "glgpu[0]", "GLVendor"), "- run ended before");
+    const std::string text = Sample(1, 0).EndAfter("glgpu[0].GLName").GetText();
+    EXPECT_EQ(Show(GetAnswers(ReadReport(text)), "glgpu[0]", "GLVendor"), "- run ended before");
     const Report report = ReadReport(text + "# 00009.x Testing terminated for glgpu[0]\n");
     const Answers answers = GetAnswers(report);
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "GLVendor"), "- device failed before");
+    EXPECT_EQ(Show(answers, "glgpu[0]", "GLVendor"), "- device failed before");
     EXPECT_TRUE(answers.fDevices.at(0).fFailed);
     EXPECT_EQ(answers.fNext, "NumCLGPUs");
     const Report other = ReadReport(text + "Testing terminated for glgpu[0]\n");
     EXPECT_FALSE(GetAnswers(other).fDevices.at(0).fFailed);
 }
 
-TEST(Answers, NameDevicesThatTheReportOnlyCounts)
+TEST(Answers, IncludeDevicesThatAreOnlyCounted)
 {
-    const Report ended = ReadReport(Sample(2, 0).EndBehind("NumGLGPUs").GetText());
+    const Report ended = ReadReport(Sample(2, 0).EndAfter("NumGLGPUs").GetText());
     EXPECT_EQ(GetAnswers(ended).fDevices.size(), 2U);
-    EXPECT_EQ(Tell(GetAnswers(ended), "glgpu[1]", "GLVersion"), "- run ended before");
+    EXPECT_EQ(Show(GetAnswers(ended), "glgpu[1]", "GLVersion"), "- run ended before");
     const Report failed = ReadReport(Sample(1, 0).Fail("glgpu[0]", "GLVersion").GetText());
-    EXPECT_EQ(Tell(GetAnswers(failed), "glgpu[0]", "GLVersion"), "- device failed before");
+    EXPECT_EQ(Show(GetAnswers(failed), "glgpu[0]", "GLVersion"), "- device failed before");
 }
 
 TEST(Answers, FindNoLinesOfADeviceThatIsCountedTooLate)
 {
     const Report report =
         ReadReport("glgpu[0].GLVersion=\"4.1\"\nNumGLGPUs=2\nglgpu[0].IsIntegratedGLGPU=0\n");
-    EXPECT_EQ(Tell(GetAnswers(report), "glgpu[1]", "GLVersion"), "- no readable line");
-    EXPECT_EQ(Tell(GetAnswers(report), "glgpu[1]", "GLName"), "- run ended before");
+    EXPECT_EQ(Show(GetAnswers(report), "glgpu[1]", "GLVersion"), "- no readable line");
+    EXPECT_EQ(Show(GetAnswers(report), "glgpu[1]", "GLName"), "- run ended before");
 }
 
-TEST(Answers, TellThatThereIsNoOpenCL)
+TEST(Answers, NameTheLackOfOpenCL)
 {
     const Report report = ReadReport(Sample(1, -1).GetText());
-    EXPECT_EQ(Tell(GetAnswers(report), "", "NumCLGPUs"), "- no OpenCL");
+    EXPECT_EQ(Show(GetAnswers(report), "", "NumCLGPUs"), "- no OpenCL");
     const Report none = ReadReport(Sample(1, 0).GetText());
-    EXPECT_EQ(Tell(GetAnswers(none), "", "NumCLGPUs"), "0");
+    EXPECT_EQ(Show(GetAnswers(none), "", "NumCLGPUs"), "0");
 }
 
-TEST(Answers, TellALostLineFromAFailure)
+TEST(Answers, DistinguishALostLineFromAFailure)
 {
     const Report report = ReadReport(Sample(1, 1)
                                          .Set("glgpu[0].GLName", "\"open")
@@ -163,26 +163,26 @@ TEST(Answers, TellALostLineFromAFailure)
                                          .Set("Tester", "")
                                          .GetText());
     const Answers answers = GetAnswers(report);
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "GLName"), "- no readable line");
-    EXPECT_EQ(Tell(answers, "", "NumCLGPUs"), "- no readable line");
-    EXPECT_EQ(Tell(answers, "", "Tester"), "- no readable line");
+    EXPECT_EQ(Show(answers, "glgpu[0]", "GLName"), "- no readable line");
+    EXPECT_EQ(Show(answers, "", "NumCLGPUs"), "- no readable line");
+    EXPECT_EQ(Show(answers, "", "Tester"), "- no readable line");
     EXPECT_FALSE(answers.fDevices[0].fFailed);
 }
 
-TEST(Answers, TakeInKeysThatAreNotKnown)
+TEST(Answers, IncludeUnknownKeys)
 {
     const Report report =
         ReadReport("Extra=1\nglgpu[0].Extra=2\nglgpu[7].GLName=\"x\"\ngputag.GL_X=3\nExtra=4\n");
     const Answers answers = GetAnswers(report);
-    EXPECT_EQ(Tell(answers, "", "Extra"), "4");
-    EXPECT_EQ(Tell(answers, "", "gputag.GL_X"), "3");
+    EXPECT_EQ(Show(answers, "", "Extra"), "4");
+    EXPECT_EQ(Show(answers, "", "gputag.GL_X"), "3");
     EXPECT_EQ(answers.fReport.size(), 10U);
-    EXPECT_EQ(Tell(answers, "glgpu[0]", "Extra"), "2");
+    EXPECT_EQ(Show(answers, "glgpu[0]", "Extra"), "2");
     EXPECT_EQ(answers.fDevices[0].fAnswers.back().fKnown, nullptr);
     EXPECT_EQ(answers.fDevices[1].fIndex, 7U);
 }
 
-TEST(Answers, OfAnEmptyReportAreAllMissing)
+TEST(Answers, OfAnEmptyReportHaveNoLines)
 {
     const Report report;
     const Answers answers = GetAnswers(report);
@@ -193,7 +193,7 @@ TEST(Answers, OfAnEmptyReportAreAllMissing)
     EXPECT_EQ(answers.fNext, "Tester");
 }
 
-TEST(Answers, StopAtMoreDevicesThanAnyMachineHas)
+TEST(Answers, LimitTheNumberOfDevices)
 {
     const Report counted = ReadReport("NumGLGPUs=18446744073709551615\nNumCLGPUs=x\n");
     EXPECT_EQ(GetAnswers(counted).fDevices.size(), 256U);
@@ -206,9 +206,9 @@ TEST(Answers, StopAtMoreDevicesThanAnyMachineHas)
     EXPECT_EQ(GetAnswers(named).fDevicesLeftOut, 744U);
 }
 
-TEST(Answers, TellTheNextLine)
+TEST(Answers, NameTheNextLine)
 {
-    const auto ended = [](const char* key) { return Next(Sample(2, 2).EndBehind(key).GetText()); };
+    const auto ended = [](const char* key) { return Next(Sample(2, 2).EndAfter(key).GetText()); };
     EXPECT_EQ(ended("Tester"), "assayStart");
     EXPECT_EQ(ended("OGLContextCreated"), "NumGLGPUs");
     EXPECT_EQ(ended("NumGLGPUs"), "glgpu[0].GLVersion");
@@ -217,23 +217,22 @@ TEST(Answers, TellTheNextLine)
     EXPECT_EQ(ended("glgpu[1].extension[QGF::OGL::GL_ARB_SHADER_TEXTURE_LOD]"), "NumCLGPUs");
     EXPECT_EQ(ended("NumCLGPUs"), "clgpu[0].CLPlatformVersion");
     EXPECT_EQ(ended("clgpu[1].CLCompute"), "assayEnd");
-    EXPECT_EQ(Next(Sample(0, 0).EndBehind("NumGLGPUs").GetText()), "NumCLGPUs");
-    EXPECT_EQ(Next(Sample(0, 0).EndBehind("NumCLGPUs").GetText()), "assayEnd");
+    EXPECT_EQ(Next(Sample(0, 0).EndAfter("NumGLGPUs").GetText()), "NumCLGPUs");
+    EXPECT_EQ(Next(Sample(0, 0).EndAfter("NumCLGPUs").GetText()), "assayEnd");
 }
 
-TEST(Answers, PassOverWhatPrintsNothingForTheNextLine)
+TEST(Answers, SkipDevicesThatPrintNothingNext)
 {
-    EXPECT_EQ(
-        Next(Sample(2, 0).Fail("glgpu[1]", "GLName").EndBehind("glgpu[0].GLVendor").GetText()),
-        "glgpu[0].GLVendorID");
+    EXPECT_EQ(Next(Sample(2, 0).Fail("glgpu[1]", "GLName").EndAfter("glgpu[0].GLVendor").GetText()),
+              "glgpu[0].GLVendorID");
     EXPECT_EQ(Next(Sample(0, 1)
                        .Set("clgpu[0].CUDASupported", "0")
-                       .EndBehind("clgpu[0].CUDASupported")
+                       .EndAfter("clgpu[0].CUDASupported")
                        .GetText()),
               "clgpu[0].CLBandwidth");
-    EXPECT_EQ(Next(Sample(0, 1).EndBehind("clgpu[0].CUDASupported").GetText()),
+    EXPECT_EQ(Next(Sample(0, 1).EndAfter("clgpu[0].CUDASupported").GetText()),
               "clgpu[0].CUDAVersion");
-    const std::string text = Sample(1, 0).EndBehind("glgpu[0].GLFrameBufferOK").GetText();
+    const std::string text = Sample(1, 0).EndAfter("glgpu[0].GLFrameBufferOK").GetText();
     EXPECT_EQ(Next(text + "gputag.GL_SHADING_LANGUAGE_VERSION=35724\n# log\nraw\nX=1\n"),
               "glgpu[0].glGetString[GL_SHADING_LANGUAGE_VERSION]");
 }

@@ -22,7 +22,7 @@ TEST(Bytes, ReadEachWellFormedCharacter)
     }
 }
 
-TEST(Bytes, RefuseWhatIsNotWellFormed)
+TEST(Bytes, RejectMalformedCharacters)
 {
     for (const char* bytes :
          {"\x80", "\xBF", "\xC0\x80", "\xC1\xBF", "\xC2\x7F", "\xC2\xC0", "\xE0\x9F\xBF",
@@ -31,7 +31,7 @@ TEST(Bytes, RefuseWhatIsNotWellFormed)
         EXPECT_EQ(ReadCharacter(bytes).fSize, 0U) << bytes;
 }
 
-TEST(Bytes, ShowNothingThatATerminalObeys)
+TEST(Bytes, EscapeWhatControlsATerminal)
 {
     EXPECT_EQ(ShowBytes("plain \"text\" \\ \xC3\xA9 \xE4\xB8\xAD \xF0\x9F\x98\x80"),
               "plain \"text\" \\ \xC3\xA9 \xE4\xB8\xAD \xF0\x9F\x98\x80");
@@ -48,7 +48,7 @@ TEST(Bytes, ShowNothingThatATerminalObeys)
     }
 }
 
-TEST(Bytes, CountColumnsByCharacters)
+TEST(Bytes, CountOneColumnForEachCharacter)
 {
     EXPECT_EQ(CountColumns(""), 0U);
     EXPECT_EQ(CountColumns("abc"), 3U);

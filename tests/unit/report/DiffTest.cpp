@@ -25,13 +25,13 @@ std::string Diff(Sample before, Sample after, double tolerance = 0.1)
     return Diff(before.GetText(), after.GetText(), tolerance);
 }
 
-TEST(Diff, OfTheSameReportIsNone)
+TEST(Diff, OfEqualReportsIsEmpty)
 {
     EXPECT_EQ(Diff(Sample(2, 2), Sample(2, 2)), "");
     EXPECT_EQ(Diff("", ""), "");
 }
 
-TEST(Diff, LeavesOutStampsAndLogLines)
+TEST(Diff, IgnoresStampsAndLogLines)
 {
     EXPECT_EQ(
         Diff(Sample(1, 1).GetText(),
@@ -40,7 +40,7 @@ TEST(Diff, LeavesOutStampsAndLogLines)
         "");
 }
 
-TEST(Diff, LeavesOutHowLinesEnd)
+TEST(Diff, IgnoresLineEnds)
 {
     std::string text = Sample(1, 1).GetText();
     std::string windows;
@@ -49,7 +49,7 @@ TEST(Diff, LeavesOutHowLinesEnd)
     EXPECT_EQ(Diff(text, windows), "");
 }
 
-TEST(Diff, TellsAChangedValue)
+TEST(Diff, ReportsAChangedValue)
 {
     EXPECT_EQ(Diff(Sample(2, 1), Sample(2, 1)
                                      .Set("QGFOGLInitialized", "0")
@@ -62,7 +62,7 @@ TEST(Diff, TellsAChangedValue)
     EXPECT_EQ(Diff("a=\"\x1B\"\n", "a=\"\xFF\n\"\n"), "a: \"\\x1B\" -> \"\\xFF\\n\"\n");
 }
 
-TEST(Diff, AllowsMeasuredNumbersTheirTolerance)
+TEST(Diff, AppliesTheToleranceToMeasurements)
 {
     const auto diff = [](const char* before, const char* after, double tolerance) {
         return Diff(Sample(0, 1).Set("clgpu[0].CLBandwidth", before),
@@ -85,13 +85,13 @@ TEST(Diff, AllowsMeasuredNumbersTheirTolerance)
               "glgpu[0].GLMemoryMB: 24564 -> 24563\n");
 }
 
-TEST(Diff, TellsWhatIsMissingAndWhy)
+TEST(Diff, ReportsMissingKeysAndTheirReasons)
 {
     EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CUDAVersion", "")),
               "clgpu[0].CUDAVersion: \"12.0.89\" -> missing (not printed by this device)\n");
     EXPECT_EQ(Diff(Sample(0, 1).Fail("clgpu[0]", "CLCompute"), Sample(0, 1)),
               "clgpu[0].CLCompute: missing (device failed before) -> 1234.56\n");
-    EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).EndBehind("clgpu[0].CLBandwidth")),
+    EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).EndAfter("clgpu[0].CLBandwidth")),
               "report: whole -> broken off\n"
               "clgpu[0].CLCompute: 1234.56 -> missing (run ended before)\n");
     EXPECT_EQ(Diff(Sample(0, 0), Sample(0, -1)), "NumCLGPUs: 0 -> missing (no OpenCL)\n");
@@ -126,14 +126,14 @@ TEST(Diff, MatchesDevicesByName)
               "glgpu[0] \"A\": now glgpu[1]\n");
 }
 
-TEST(Diff, MatchesEqualNamesByPlace)
+TEST(Diff, MatchesEqualNamesByIndex)
 {
     EXPECT_EQ(Diff(Named(2, "A", "A"), Named(2, "A", "A").Set("glgpu[1].GLMemoryMB", "1")),
               "glgpu[1].GLMemoryMB: 24564 -> 1\n");
     EXPECT_EQ(Diff(Named(2, "A", "A"), Named(2, "B", "A")), "glgpu[0].GLName: \"A\" -> \"B\"\n");
 }
 
-TEST(Diff, MatchesByPlaceWhatHasNoNameInCommon)
+TEST(Diff, MatchesTheRestByIndex)
 {
     EXPECT_EQ(Diff(Named(1, "A", ""), Named(1, "B", "")), "glgpu[0].GLName: \"A\" -> \"B\"\n");
     EXPECT_EQ(Diff("glgpu[0].GLVendor=\"A\"\n", "glgpu[0].GLVendor=\"B\"\n"),
@@ -142,7 +142,7 @@ TEST(Diff, MatchesByPlaceWhatHasNoNameInCommon)
                                                         "clgpu[0]: only in the second report\n");
 }
 
-TEST(Diff, TellsLinesThatAreNoReportLines)
+TEST(Diff, ReportsRawLines)
 {
     EXPECT_EQ(Diff("a=1\nx\ny\ny\n", "y\na=1\nz\x1B\n"),
               "other line, only in the first report: x\n"

@@ -51,7 +51,7 @@ TEST(JsonDocument, HasTheSameMembersInTheSameOrderForEachRun)
     EXPECT_EQ(Document("")["schema"], 1);
 }
 
-TEST(JsonDocument, TellsTheOutcome)
+TEST(JsonDocument, HasTheOutcome)
 {
     RunOutcome outcome;
     outcome.fVerdict = Verdict::kCrashed;
@@ -96,7 +96,7 @@ TEST(JsonDocument, HasEachVerdictWithItsStatus)
     }
 }
 
-TEST(JsonDocument, KeepsTimesThatJsonCanSay)
+TEST(JsonDocument, ReplacesTimesThatJsonCannotHold)
 {
     RunOutcome outcome;
     outcome.fSeconds = std::numeric_limits<double>::quiet_NaN();
@@ -106,7 +106,7 @@ TEST(JsonDocument, KeepsTimesThatJsonCanSay)
     EXPECT_EQ(json["timeoutSeconds"], 0.0);
 }
 
-TEST(JsonDocument, HasEachValueRawAndAsANumber)
+TEST(JsonDocument, HasEachValueAsTextAndNumber)
 {
     const Json document = Document(Sample(1, 1).GetText());
     ASSERT_EQ(document["devices"].size(), 2U);
@@ -133,7 +133,7 @@ TEST(JsonDocument, HasEachValueRawAndAsANumber)
     EXPECT_EQ(document["report"]["keys"]["Tester"], Json::parse(R"({"value": "Pixmere"})"));
 }
 
-TEST(JsonDocument, GivesNoNumberForWhatIsNone)
+TEST(JsonDocument, HasNoNumberForOtherTexts)
 {
     const Json keys =
         Document("glgpu[0].GLMemoryMB=many\nglgpu[0].GLVendorID=\nclgpu[0].CLCompute=inf\n"
@@ -145,7 +145,7 @@ TEST(JsonDocument, GivesNoNumberForWhatIsNone)
     EXPECT_EQ(keys["devices"][1]["keys"]["Extra"], Json::parse(R"({"value": "[1, x]"})"));
 }
 
-TEST(JsonDocument, GivesNoNumberThatAReaderWouldChange)
+TEST(JsonDocument, HasNoNumberThatAReaderWouldChange)
 {
     const Json keys = Document("clgpu[0].A=9007199254740993\nclgpu[0].B=18446744073709551615\n"
                                "clgpu[0].C=[1, 9007199254740993]\nclgpu[0].D=9007199254740992\n"
@@ -158,7 +158,7 @@ TEST(JsonDocument, GivesNoNumberThatAReaderWouldChange)
     EXPECT_EQ(keys["E"], Json::parse(R"({"value": "40"})")); // its line has no end
 }
 
-TEST(JsonDocument, IsWrittenAsIfItWasDumpedWhole)
+TEST(JsonDocument, IsWrittenLikeADump)
 {
     for (const std::string& text : {std::string(), Sample(1, 1).GetText(), std::string("x\n# y")}) {
         const std::string document = GetDocumentText(ReadReport(text), GoodOutcome());
@@ -175,7 +175,7 @@ TEST(JsonDocument, IsReadInAnyOrderOfMembers)
         "a=1\n");
 }
 
-TEST(JsonDocument, HoldsNoMoreLinesThanAReport)
+TEST(JsonDocument, LimitsTheNumberOfLines)
 {
     const Json line = Json::parse(R"({"kind": "raw", "text": "", "end": "\n"})");
     Json document = {{"schema", 1}, {"lines", Json::array()}};
@@ -185,13 +185,13 @@ TEST(JsonDocument, HoldsNoMoreLinesThanAReport)
     EXPECT_THROW(ReadDocument(document), std::runtime_error);
 }
 
-TEST(JsonDocument, SaysWhyAValueIsMissing)
+TEST(JsonDocument, NamesTheReasonForAMissingValue)
 {
     const auto reason = [](const char* text) { return Json{{"value", nullptr}, {"reason", text}}; };
     const Json document = Document(Sample(2, 0)
                                        .Fail("glgpu[0]", "GLName")
                                        .Set("glgpu[1].GLVersion", "")
-                                       .EndBehind("glgpu[1].GLVendor")
+                                       .EndAfter("glgpu[1].GLVendor")
                                        .GetText());
     EXPECT_EQ(document["devices"][0]["keys"]["GLName"], reason("device failed before"));
     EXPECT_EQ(document["devices"][0]["failed"], true);
@@ -208,13 +208,13 @@ TEST(JsonDocument, SaysWhyAValueIsMissing)
               reason("no OpenCL"));
 }
 
-// The way through the document's text and back.
+// Writes the report to a document and reads it back.
 Report RoundTrip(const Report& report)
 {
     return ReadDocument(SaveDocument(MakeDocument(report, GoodOutcome())));
 }
 
-TEST(JsonDocument, GivesTheReportBackByteByByte)
+TEST(JsonDocument, RestoresTheReportByteByByte)
 {
     std::string bytes;
     for (int byte = 0; byte < 256; ++byte)
@@ -231,7 +231,7 @@ TEST(JsonDocument, GivesTheReportBackByteByByte)
     }
 }
 
-TEST(JsonDocument, GivesCutLinesBack)
+TEST(JsonDocument, RestoresCutLines)
 {
     ReportReader::Limits limits;
     limits.fMaxLineBytes = 8;
@@ -244,7 +244,7 @@ TEST(JsonDocument, GivesCutLinesBack)
               Json::parse(R"({"kind": "value", "text": "a=\"12345", "end": "\n", "cut": true})"));
 }
 
-TEST(JsonDocument, TakesAFloodOfKeysAndDevices)
+TEST(JsonDocument, HoldsManyKeysAndDevices)
 {
     std::string text = "NumGLGPUs=4000000000\n";
     for (int line = 0; line < 8000; ++line) {
@@ -258,7 +258,7 @@ TEST(JsonDocument, TakesAFloodOfKeysAndDevices)
     EXPECT_EQ(ReadDocument(document).ToText(), text);
 }
 
-TEST(JsonDocument, RefusesWhatIsNoDocument)
+TEST(JsonDocument, RejectsOtherDocuments)
 {
     struct Row {
         const char* fJson;
@@ -334,7 +334,7 @@ std::string Events(const std::string& report)
     return text + MakeErrorLineEvent("x", 1);
 }
 
-TEST(JsonEvents, GiveTheReportBack)
+TEST(JsonEvents, RestoreTheReport)
 {
     const std::string report = Sample(1, 1).GetText() + "a=\"\xFF\n\"\r\n# log\nraw";
     const std::string text = Events(report) + MakeEndEvent(GoodOutcome());
@@ -342,7 +342,7 @@ TEST(JsonEvents, GiveTheReportBack)
     EXPECT_EQ(ReadEvents(text).ToText(), report);
 }
 
-TEST(JsonEvents, GiveWhatAHostThatDiedLeft)
+TEST(JsonEvents, RestoreTheReportOfAKilledHost)
 {
     const std::string text = Events("a=1\nb=2\n");
     const std::size_t last = text.rfind("{\"event\":\"line\"");
@@ -351,7 +351,7 @@ TEST(JsonEvents, GiveWhatAHostThatDiedLeft)
     EXPECT_EQ(ReadEvents(text.substr(0, text.find('\n', last))).ToText(), "a=1\nb=2\n");
 }
 
-TEST(JsonEvents, RefuseWhatIsNoEvent)
+TEST(JsonEvents, RejectOtherLines)
 {
     struct Row {
         std::string fText;
@@ -391,7 +391,7 @@ TEST(JsonEvents, RefuseWhatIsNoEvent)
     }
 }
 
-TEST(JsonBytes, LeaveTextAsItIs)
+TEST(JsonBytes, KeepText)
 {
     for (const char* text : {"", "plain", "\xC3\xA9", "\xE4\xB8\xAD", "\xF0\x9F\x98\x80",
                              "\xEE\x80\x80", "\xEF\x9D\xBF" /* U+F77F */,
@@ -401,7 +401,7 @@ TEST(JsonBytes, LeaveTextAsItIs)
     }
 }
 
-TEST(JsonBytes, WriteOtherBytesAsCharactersOfAPrivateRange)
+TEST(JsonBytes, EncodeOtherBytesInAPrivateRange)
 {
     for (int byte = 0x80; byte < 0x100; ++byte) {
         std::string expected;
@@ -410,12 +410,12 @@ TEST(JsonBytes, WriteOtherBytesAsCharactersOfAPrivateRange)
         EXPECT_EQ(EncodeBytes(bytes), expected);
         EXPECT_EQ(DecodeBytes(expected), bytes);
     }
-    // U+F7C3 and U+F7A9, each byte of the real character U+F7A9 apart.
+    // U+F7C3, and the real character U+F7A9, whose bytes are encoded one by one.
     EXPECT_EQ(EncodeBytes("\xC3"), "\xEF\x9F\x83");
     EXPECT_EQ(EncodeBytes("\xEF\x9E\xA9"), "\xEF\x9F\xAF\xEF\x9E\x9E\xEF\x9E\xA9");
 }
 
-TEST(JsonBytes, ComeBackWhateverTheyAre)
+TEST(JsonBytes, RoundTrip)
 {
     std::vector<std::string> texts = {"\xC3",
                                       "\xE4\xB8",

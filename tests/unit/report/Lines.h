@@ -1,4 +1,4 @@
-// Helpers of the report's tests: texts to lines, and lines that print themselves when a test fails.
+// Reads and compares lines in tests, and prints them when a test fails.
 #pragma once
 
 #include <algorithm>
@@ -27,7 +27,7 @@ inline std::ostream& operator<<(std::ostream& out, const ReportLine& line)
                << "} value {" << line.fValue << (line.fQuoted ? "} quoted" : "}");
 }
 
-// All the lines of a text that comes in pieces of this size.
+// Reads all lines of a text that arrives in pieces of this size.
 inline std::vector<ReportLine> ReadLines(std::string_view text, std::size_t piece = 1 << 20,
                                          const ReportReader::Limits& limits = {})
 {

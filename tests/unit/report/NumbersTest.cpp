@@ -8,7 +8,7 @@
 namespace assay_host {
 namespace {
 
-TEST(Numbers, AreIntegersWhereOneHoldsThem)
+TEST(Numbers, AreIntegersIfExact)
 {
     EXPECT_EQ(ReadNumber("0"), Number(std::int64_t{0}));
     EXPECT_EQ(ReadNumber("-7"), Number(std::int64_t{-7}));
@@ -18,7 +18,7 @@ TEST(Numbers, AreIntegersWhereOneHoldsThem)
     EXPECT_EQ(ReadNumber("0.5"), Number(0.5));
 }
 
-TEST(Numbers, AreNoneWhereAReaderWouldLoseDigits)
+TEST(Numbers, AreRejectedIfDigitsWouldBeLost)
 {
     for (const char* text :
          {"9007199254740993", "-9007199254740993", "9223372036854775807", "18446744073709551615",
@@ -44,7 +44,7 @@ TEST(Numbers, KeepTheirDigitsInAnyNotation)
     EXPECT_EQ(ReadUnsigned("18446744073709551615"), 18446744073709551615U);
 }
 
-TEST(Numbers, AreNothingElse)
+TEST(Numbers, RejectOtherTexts)
 {
     for (const char* text : {"", " 1", "1 ", "+1", "0x10", "1,5", "one", "inf", "-inf", "nan",
                              "1e999", "--1", "[1]", "1.2.3"})
@@ -53,7 +53,7 @@ TEST(Numbers, AreNothingElse)
     EXPECT_FALSE(ReadDouble("inf"));
 }
 
-TEST(Numbers, MakeLists)
+TEST(Numbers, FormLists)
 {
     const auto list = ReadNumberList("[8, -4, 0.5]");
     ASSERT_TRUE(list);

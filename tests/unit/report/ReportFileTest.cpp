@@ -16,7 +16,7 @@
 namespace assay_host {
 namespace {
 
-// A file that is gone with its object.
+// A file that is deleted with its object.
 class File {
 public:
     explicit File(const std::string& text, const char* name = "assay-report-file")
@@ -63,7 +63,7 @@ std::string MakeEvents(const std::string& text)
     return events + MakeEndEvent({});
 }
 
-TEST(ReportFile, GivesTheReportOfEachForm)
+TEST(ReportFile, LoadsEachForm)
 {
     for (const std::string& text :
          {Sample(1, 1).GetText(), std::string("x\na=\"\xFF\r\n\"\r\n# log"), std::string("a=1")}) {
@@ -78,13 +78,13 @@ TEST(ReportFile, GivesTheReportOfEachForm)
     EXPECT_EQ(Load(MakeDocument({}, {}).dump()), "");
 }
 
-TEST(ReportFile, HasAPathOfAnyLanguage)
+TEST(ReportFile, AcceptsAUnicodePath)
 {
     const File file("a=1\n", "assay-r\xC3\xA9port-\xE4\xB8\xAD");
     EXPECT_EQ(LoadReport(file.fPath).ToText(), "a=1\n");
 }
 
-TEST(ReportFile, SaysWhatIsWrongWithAFile)
+TEST(ReportFile, NamesTheErrorInAFile)
 {
     EXPECT_EQ(LoadFailure(""), "neither a JSON document nor a report");
     EXPECT_EQ(LoadFailure("# only a comment\nand text"), "neither a JSON document nor a report");
@@ -100,7 +100,7 @@ TEST(ReportFile, SaysWhatIsWrongWithAFile)
     EXPECT_EQ(LoadFailure("{} {}").substr(0, 16), "not valid JSON: ");
 }
 
-TEST(ReportFile, RefusesWhatIsTooLargeBeforeItIsHeld)
+TEST(ReportFile, RejectsLargeInputBeforeItIsHeld)
 {
     const std::string large(std::size_t{5} << 20, 'x');
     EXPECT_EQ(LoadFailure("{\"a\": \"" + large + "\"}"), "too large for a report");
@@ -119,12 +119,12 @@ TEST(ReportFile, RefusesWhatIsTooLargeBeforeItIsHeld)
     EXPECT_THROW(ReadDocument(stream), std::runtime_error);
 }
 
-TEST(ReportFile, SaysWhatANumberIsThatNothingHolds)
+TEST(ReportFile, NamesANumberOutOfRange)
 {
     EXPECT_EQ(LoadFailure("{\"schema\": 1, \"x\": 1e999}"), "number overflow parsing '1e999'");
 }
 
-TEST(ReportFile, SaysThatAFileCannotBeRead)
+TEST(ReportFile, NamesAFileThatCannotBeRead)
 {
     const std::string path = testing::TempDir() + "assay-no-such-file";
     try {

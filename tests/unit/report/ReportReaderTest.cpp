@@ -40,7 +40,7 @@ ReportLine Raw(std::string text, std::string end = "\n")
 
 using Lines = std::vector<ReportLine>;
 
-TEST(ReportReader, TakesEachFormOfLineApart)
+TEST(ReportReader, ReadsEachFormOfLine)
 {
     EXPECT_EQ(ReadLines("NumGLGPUs=2\n"), Lines{Plain("NumGLGPUs=2", "\n", "NumGLGPUs", "2")});
     EXPECT_EQ(ReadLines("Tester=\"Pixmere\"\n"),
@@ -62,7 +62,7 @@ TEST(ReportReader, TakesEachFormOfLineApart)
     EXPECT_EQ(ReadLines("# text\n"), Lines{Comment("# text")});
 }
 
-TEST(ReportReader, TakesTheFirstSignOfAValueThatHoldsMore)
+TEST(ReportReader, SplitsAtTheFirstEqualsSign)
 {
     EXPECT_EQ(ReadLines("a=b=c\n"), Lines{Plain("a=b=c", "\n", "a", "b=c")});
     EXPECT_EQ(ReadLines("a=\"b=\"c\"\n"), Lines{Text("a=\"b=\"c\"", "\n", "a", "b=\"c")});
@@ -72,7 +72,7 @@ TEST(ReportReader, TakesTheFirstSignOfAValueThatHoldsMore)
     EXPECT_EQ(ReadLines("a=b\"\n"), Lines{Plain("a=b\"", "\n", "a", "b\"")});
 }
 
-TEST(ReportReader, KeepsWhatIsNoLineOfAReportRaw)
+TEST(ReportReader, KeepsOtherLinesRaw)
 {
     for (const char* text : {"", "text", "=1", " a=1", "a b=1", "\"a\"=1", "a\x80=1", "a\x7F=1",
                              " # text", "DoStdout failed"}) {
@@ -80,7 +80,7 @@ TEST(ReportReader, KeepsWhatIsNoLineOfAReportRaw)
     }
 }
 
-TEST(ReportReader, KeepsTheLineEndAsItCame)
+TEST(ReportReader, KeepsTheLineEnd)
 {
     EXPECT_EQ(ReadLines("a=1\r\nb=\"2\"\r\n# c\r\nd\r\n\r\n"),
               (Lines{Plain("a=1", "\r\n", "a", "1"), Text("b=\"2\"", "\r\n", "b", "2"),
@@ -89,7 +89,7 @@ TEST(ReportReader, KeepsTheLineEndAsItCame)
               (Lines{Plain("a=1\r", "\r\n", "a", "1\r"), Raw("b\rc")}));
 }
 
-TEST(ReportReader, GivesALineThatBreaksOffAtTheEnd)
+TEST(ReportReader, ReturnsAnIncompleteLastLine)
 {
     EXPECT_EQ(ReadLines("a=1\nb=2"),
               (Lines{Plain("a=1", "\n", "a", "1"), Plain("b=2", "", "b", "2")}));
@@ -100,7 +100,7 @@ TEST(ReportReader, GivesALineThatBreaksOffAtTheEnd)
     EXPECT_EQ(ReadLines(""), Lines{});
 }
 
-TEST(ReportReader, FollowsAQuoteOverLineEnds)
+TEST(ReportReader, ContinuesAQuoteAcrossLines)
 {
     EXPECT_EQ(ReadLines("a=\"one\ntwo\"\n"), Lines{Text("a=\"one\ntwo\"", "\n", "a", "one\ntwo")});
     EXPECT_EQ(ReadLines("a=\"\n\n\"\r\n"), Lines{Text("a=\"\n\n\"", "\r\n", "a", "\n\n")});
@@ -115,7 +115,7 @@ TEST(ReportReader, FollowsAQuoteOverLineEnds)
               Lines{Text("a=\"one\" two\n\"", "\n", "a", "one\" two\n")});
 }
 
-TEST(ReportReader, LetsAnOpenQuoteStandAloneBeforeALineOfTheReport)
+TEST(ReportReader, ReleasesAnOpenQuoteBeforeALineOfTheReport)
 {
     for (const char* own :
          {"# log", "#", "glgpu[0].GLVendor=\"x", "clgpu[12].CLName=", "gputag.GL_X=1", "Tester=1",
@@ -134,7 +134,7 @@ TEST(ReportReader, LetsAnOpenQuoteStandAloneBeforeALineOfTheReport)
     }
 }
 
-TEST(ReportReader, OpensAQuoteAnewBehindOneThatStoodAlone)
+TEST(ReportReader, OpensANewQuoteAfterAReleasedOne)
 {
     EXPECT_EQ(
         ReadLines("glgpu[0].GLName=\"one\nglgpu[0].GLVendor=\"two\nthree\"\nx\n"),
@@ -143,7 +143,7 @@ TEST(ReportReader, OpensAQuoteAnewBehindOneThatStoodAlone)
                Raw("x")}));
 }
 
-TEST(ReportReader, LetsTheLinesOfAnOpenQuoteStandAloneAtTheEnd)
+TEST(ReportReader, ReleasesAnOpenQuoteAtTheEnd)
 {
     EXPECT_EQ(ReadLines("a=\"one\nb=2\n# c"),
               (Lines{Raw("a=\"one"), Plain("b=2", "\n", "b", "2"), Comment("# c", "")}));
@@ -152,7 +152,7 @@ TEST(ReportReader, LetsTheLinesOfAnOpenQuoteStandAloneAtTheEnd)
     EXPECT_EQ(ReadLines("a=\"one\ntwo\""), Lines{Text("a=\"one\ntwo\"", "", "a", "one\ntwo")});
 }
 
-TEST(ReportReader, TakesAnyByte)
+TEST(ReportReader, AcceptsAnyByte)
 {
     std::string all;
     for (int byte = 0; byte < 256; ++byte) {
@@ -166,7 +166,7 @@ TEST(ReportReader, TakesAnyByte)
     EXPECT_EQ(ReadLines(zeros), (Lines{Raw(std::string(2, '\0')), Raw(std::string("\0=\0", 3))}));
 }
 
-// What lies on the borders of pieces: quotes, line ends of both kinds, quotes that stay open.
+// Has quotes, both kinds of line end, and quotes that stay open, to be split at any byte.
 constexpr const char* kMixed = "Tester=\"Pixmere\"\r\n"
                                "glgpu[0].GLName=\"one \"two\".\r\nthree\r\n\"\r\n"
                                "glgpu[0].GLVendor=\"open\n"
@@ -177,7 +177,7 @@ constexpr const char* kMixed = "Tester=\"Pixmere\"\r\n"
                                "a=\"\n\n"
                                "b=[8, 4]\r";
 
-TEST(ReportReader, GivesTheSameWhereverTheDataIsSplit)
+TEST(ReportReader, IgnoresWhereTheDataIsSplit)
 {
     const std::string text = kMixed;
     const Lines whole = ReadLines(text);
@@ -197,7 +197,7 @@ TEST(ReportReader, GivesTheSameWhereverTheDataIsSplit)
     }
 }
 
-TEST(ReportReader, GivesALineAsSoonAsItIsThere)
+TEST(ReportReader, ReturnsALineAsSoonAsItIsComplete)
 {
     ReportReader reader;
     EXPECT_TRUE(reader.Feed("a=").empty());
@@ -209,13 +209,13 @@ TEST(ReportReader, GivesALineAsSoonAsItIsThere)
     EXPECT_TRUE(reader.Finish().empty());
 }
 
-TEST(ReportReader, LosesNoByteOfAnyText)
+TEST(ReportReader, KeepsEveryByte)
 {
     const Report report = ReadReport(kMixed);
     EXPECT_EQ(report.ToText(), kMixed);
 }
 
-TEST(ReportReader, IsAsNewBehindTheEnd)
+TEST(ReportReader, CanBeUsedAgainAfterFinish)
 {
     ReportReader reader;
     reader.Feed("a=\"1\nb");
@@ -225,7 +225,7 @@ TEST(ReportReader, IsAsNewBehindTheEnd)
     EXPECT_EQ(reader.GetByteCount(), 9U);
 }
 
-// Every split of a text with these limits gives the same lines and the same counts.
+// Reads the text in pieces of every size, and checks that the lines and the counts are the same.
 Lines ReadWithLimits(const std::string& text, const ReportReader::Limits& limits,
                      std::uint64_t expectedLost)
 {
@@ -270,7 +270,7 @@ TEST(ReportReader, CutsALineThatIsTooLong)
               (Lines{Raw("12345678", "\r\n"), Cut(Raw("12345678"))}));
 }
 
-TEST(ReportReader, LetsAQuoteStandAloneThatGrowsTooLong)
+TEST(ReportReader, ReleasesAQuoteThatIsTooLong)
 {
     ReportReader::Limits limits;
     limits.fMaxLineBytes = 12;
@@ -284,7 +284,7 @@ TEST(ReportReader, LetsAQuoteStandAloneThatGrowsTooLong)
               (Lines{Raw("a=\"34"), Cut(Raw("012345678901"))}));
 }
 
-TEST(ReportReader, LosesWhatComesBehindTheMostBytes)
+TEST(ReportReader, DropsBytesBeyondTheLimit)
 {
     ReportReader::Limits limits;
     limits.fMaxBytes = 6;
@@ -296,7 +296,7 @@ TEST(ReportReader, LosesWhatComesBehindTheMostBytes)
               (Lines{Raw("a=\"1"), Cut(Raw("\r", ""))}));
 }
 
-TEST(ReportReader, LosesWhatComesBehindTheMostLines)
+TEST(ReportReader, DropsLinesBeyondTheLimit)
 {
     ReportReader::Limits limits;
     limits.fMaxLines = 2;
@@ -305,7 +305,7 @@ TEST(ReportReader, LosesWhatComesBehindTheMostLines)
     EXPECT_EQ(ReadWithLimits("a=\"1\n2\n\"\n", limits, 2), (Lines{Raw("a=\"1"), Raw("2")}));
 }
 
-TEST(ReportReader, TakesLimitsOfNothing)
+TEST(ReportReader, AcceptsLimitsOfZero)
 {
     ReportReader::Limits limits;
     limits.fMaxLineBytes = 0;
@@ -319,7 +319,7 @@ TEST(ReportReader, TakesLimitsOfNothing)
     EXPECT_EQ(ReadWithLimits("ab\n", limits, 3), Lines{});
 }
 
-TEST(ReportReader, HoldsNoMoreThanItsLimitsOfAFlood)
+TEST(ReportReader, LimitsWhatItHolds)
 {
     ReportReader reader;
     const std::string piece(1 << 20, 'x');
@@ -340,9 +340,9 @@ TEST(ReportReader, HoldsNoMoreThanItsLimitsOfAFlood)
     EXPECT_EQ(count, ReportReader::Limits().fMaxLines);
 }
 
-TEST(ReportReader, LooksAtTheLinesOfManyOpenQuotesOnce)
+TEST(ReportReader, ReadsTheLinesOfManyOpenQuotesOnce)
 {
-    // Were each open quote to try the rest anew, this would take minutes.
+    // Reading the rest again after each open quote would take minutes.
     std::string text;
     for (int line = 0; line < 15000; ++line)
         text += "a=\"x\n";

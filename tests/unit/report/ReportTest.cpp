@@ -32,7 +32,7 @@ TEST(Report, FindsValuesOfKeysWithoutATag)
     EXPECT_EQ(report.Find(""), nullptr);
 }
 
-TEST(Report, KnowsItsDevicesInTheirOrderWithTheirKeys)
+TEST(Report, ListsDevicesAndTheirKeysInOrder)
 {
     const Report report = ReadReport(kText);
     ASSERT_EQ(report.GetDevices().size(), 3U);
@@ -50,7 +50,7 @@ TEST(Report, KnowsItsDevicesInTheirOrderWithTheirKeys)
     EXPECT_EQ(Value(report.Find(report.GetDevices()[2], "CLName")), "One");
 }
 
-TEST(Report, CountsTheLastOfAKeyThatComesTwice)
+TEST(Report, TakesTheLastLineOfARepeatedKey)
 {
     const Report report = ReadReport("K=1\nglgpu[0].A=1\nglgpu[0].B=2\nglgpu[0].A=3\nK=4\n");
     EXPECT_EQ(Value(report.Find("K")), "4");
@@ -60,7 +60,7 @@ TEST(Report, CountsTheLastOfAKeyThatComesTwice)
     EXPECT_EQ(device.fKeys[0].second, 3U);
 }
 
-TEST(Report, TakesNoTagForADeviceThatIsNone)
+TEST(Report, RejectsMalformedTags)
 {
     const Report report =
         ReadReport("gputag.GL_X=3\nglgpu[].A=1\nglgpu[x].A=1\nglgpu[1]A=1\nxglgpu[1].A=1\n"
@@ -84,13 +84,13 @@ TEST(Report, IsWholeWithBothItsStamps)
     EXPECT_FALSE(ReadReport("# assayEnd=\"x\"\nassayStart=\"x\"\n").IsWhole());
 }
 
-TEST(Report, GivesItsTextBack)
+TEST(Report, RestoresItsText)
 {
     EXPECT_EQ(ReadReport(kText).ToText(), kText);
     EXPECT_EQ(ReadReport("a=\"b\r\nc\"\r\nbroken off").ToText(), "a=\"b\r\nc\"\r\nbroken off");
 }
 
-TEST(Report, TakesManyDevicesAndKeysWithoutSlowingDown)
+TEST(Report, HoldsManyDevicesAndKeys)
 {
     std::string text;
     for (int index = 0; index < 10000; ++index) {

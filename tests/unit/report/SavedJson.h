@@ -1,4 +1,4 @@
-// Keeps the JSON that a test makes in the folder ASSAY_JSON, if that is set, for another test to
+// Saves the JSON of the tests in the folder ASSAY_JSON, if that is set, for another test to
 // validate.
 #pragma once
 
@@ -31,7 +31,7 @@ inline void SaveText(const std::string& text, const char* ending)
     EXPECT_TRUE(file) << path;
 }
 
-// What the program writes and reads as streams, for tests that look at whole documents.
+// The product's functions on streams, with whole documents.
 inline std::string GetDocumentText(const Report& report, const RunOutcome& outcome)
 {
     std::ostringstream out;
@@ -56,7 +56,7 @@ inline Report ReadEvents(const std::string& text)
     return ReadEvents(in);
 }
 
-// The JSON as its reader gets it.
+// Saves the JSON and returns it as a reader parses it.
 inline Json SaveDocument(const Json& document)
 {
     const std::string text = document.dump(2);

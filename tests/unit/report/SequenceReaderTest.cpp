@@ -32,7 +32,7 @@ TEST(SequenceReader, NamesTheNextKeyThroughoutARun)
     EXPECT_EQ(reader.GetSteps(), 9 + 1 + 2 * 35 + 2 * 12 - 1U); // the last one shows no line
 }
 
-TEST(SequenceReader, PassesOverADeviceThatDroppedOut)
+TEST(SequenceReader, SkipsADeviceThatFailed)
 {
     SequenceReader reader;
     auto run = MakeWholeRun(2, -1);
@@ -42,7 +42,7 @@ TEST(SequenceReader, PassesOverADeviceThatDroppedOut)
     EXPECT_EQ(reader.GetNextKey(), "glgpu[1].GLMemoryMB");
 }
 
-TEST(SequenceReader, BelievesTheLogThatADeviceDroppedOut)
+TEST(SequenceReader, TakesAFailureFromTheLog)
 {
     SequenceReader reader;
     Feed(reader, {"NumGLGPUs=2", "glgpu[0].GLVersion=\"4.1\"", "glgpu[1].GLVersion=\"4.1\"",
@@ -64,7 +64,7 @@ TEST(SequenceReader, IgnoresALogLineThatNamesMoreThanADevice)
     EXPECT_EQ(reader.GetNextKey(), "glgpu[0].GLVersion");
 }
 
-TEST(SequenceReader, TakesADeviceBackWhoseLineAloneWasLost)
+TEST(SequenceReader, CorrectsAFailureWhenTheDeviceGoesOn)
 {
     SequenceReader reader;
     Feed(reader, {"NumGLGPUs=2", "glgpu[0].GLVersion=\"4.1\"", "glgpu[1].GLVersion=\"4.1\"",
@@ -76,7 +76,7 @@ TEST(SequenceReader, TakesADeviceBackWhoseLineAloneWasLost)
     EXPECT_EQ(reader.GetSteps(), 1 + 6 + 2 + 2 + 1U); // that of the lost line too
 }
 
-TEST(SequenceReader, KnowsADeviceWithoutACount)
+TEST(SequenceReader, FindsDevicesWithoutACount)
 {
     SequenceReader reader;
     Feed(reader, {"Tester=\"x\"", "glgpu[0].GLVersion=\"4.1\"", "glgpu[2].GLVersion=\"4.1\""});
@@ -85,7 +85,7 @@ TEST(SequenceReader, KnowsADeviceWithoutACount)
     EXPECT_EQ(reader.GetNextKey(), "clgpu[0].CLBandwidth");
 }
 
-TEST(SequenceReader, TakesSilenceWhereItMayBeForNoFailure)
+TEST(SequenceReader, TakesNoFailureFromAKeyThatMayBeSilent)
 {
     SequenceReader reader;
     Feed(reader, {"NumCLGPUs=2", "clgpu[0].CUDASupported=1", "clgpu[1].CUDASupported=1"});
@@ -95,7 +95,7 @@ TEST(SequenceReader, TakesSilenceWhereItMayBeForNoFailure)
     EXPECT_EQ(reader.GetNextKey(), "clgpu[1].CLBandwidth");
 }
 
-TEST(SequenceReader, IgnoresWhatIsForgedOrForeign)
+TEST(SequenceReader, IgnoresForgedAndUnknownLines)
 {
     SequenceReader reader;
     Feed(reader, {"Tester=\"x\"", "NumGLGPUs=99999999999", "# Tester=", "glgpu[7].GLNews=1",
