@@ -1,0 +1,118 @@
+"""Which mutants each test asks for while none is on, and how long it takes; kept until a program or
+a test changes."""
+import hashlib
+import json
+import re
+import sys
+from concurrent.futures import ThreadPoolExecutor
+from pathlib import Path
+
+from mutants import isolation
+from mutants.workshop import TARGETS, run
+
+# Cases of one job: the jobs go on side by side.
+CHUNK = 100
+
+
+class Survey:
+    def __init__(self, workshop, folder, size, with_program):
+        self.workshop, self.folder, self.size = workshop, folder, size
+        self.with_program = with_program
+        self.cases = {}  # program: {case: {"seconds", "reached"}}
+
+    def job(self, **more):
+        shop = self.workshop
+        tests = sorted(str(path) for path in (shop.tree / "tests" / "program").glob("test_*.py"))
+        return {"board": str(shop.board), "size": self.size, "tree": str(shop.tree),
+                "build": str(shop.build), "program_tests": tests, **more}
+
+    def state(self):
+        state = hashlib.sha256()
+        programs = sorted((self.workshop.build / "bin").glob("*"))
+        for path in [*programs, *sorted((self.workshop.tree / "tests" / "program").glob("*.py"))]:
+            state.update(path.read_bytes())
+        return state.hexdigest()
+
+    def take(self):
+        kept = self.folder / f"survey-{'all' if self.with_program else 'unit'}.json"
+        state = self.state()
+        if kept.exists():
+            old = json.loads(kept.read_text())
+            if old["state"] == state:
+                self.cases = old["cases"]
+                return
+        with ThreadPoolExecutor(self.workshop.jobs) as pool:
+            for found in pool.map(self.look, self.parts()):
+                for program, cases in found.items():
+                    self.cases.setdefault(program, {}).update(cases)
+        for program, cases in self.cases.items():
+            for case in [case for case, found in cases.items() if not found["passed"]]:
+                print(f"not used, fails without a mutant: {Path(program).name} {case}", file=sys.stderr)
+                del cases[case]
+        kept.write_text(json.dumps({"state": state, "cases": self.cases}))
+
+    def parts(self):
+        if self.with_program:
+            yield self.job(what="survey", programs={})
+        for target in TARGETS:
+            program = self.workshop.build / "bin" / target
+            if not program.exists():
+                continue
+            cases = list_cases(program)
+            for start in range(0, len(cases), CHUNK):
+                yield {**self.job(what="survey", programs={str(program): cases[start:start + CHUNK]}),
+                       "program_tests": []}
+
+    def look(self, job):
+        result, output = isolation.run(job, self.folder, 3600)
+        if result is None:
+            sys.exit(f"the tests end without a result where no mutant is on:\n{output}")
+        return result
+
+    def steps(self, numbers, budget):
+        """(program, {case: seconds}) for the tests that ask for any of these mutants: the unit tests
+        of the program that asks most first, quick cases before slow ones; then the program tests, as
+        many of the quickest of each file as `budget` seconds hold."""
+        numbers = set(numbers)
+        found = []
+        for program, cases in self.cases.items():
+            asking = {case: each["seconds"] for case, each in cases.items()
+                      if not numbers.isdisjoint(each["reached"])}
+            if program != "program" and asking:
+                found.append((len(asking) / len(cases), program, asking))
+        steps = []
+        for _, program, asking in sorted(found, reverse=True):
+            quick = {case: seconds for case, seconds in asking.items() if seconds < 0.3}
+            slow = {case: seconds for case, seconds in asking.items() if seconds >= 0.3}
+            steps += [(program, part) for part in (quick, slow) if part]
+        asking = {case: each["seconds"] for case, each in self.cases.get("program", {}).items()
+                  if not numbers.isdisjoint(each["reached"])}
+        chosen = within_budget(asking, budget)
+        return steps + ([("program", chosen)] if chosen else [])
+
+
+def within_budget(seconds, budget):
+    """The quickest case of each file, then the second quickest, until the budget is spent."""
+    files = {}
+    for case in sorted(seconds, key=seconds.get):
+        files.setdefault(case.split("::")[0], []).append(case)
+    rounds = [case for rank in range(max(map(len, files.values()), default=0))
+              for case in (cases[rank] for cases in files.values() if rank < len(cases))]
+    chosen, spent = {}, 0.0
+    for case in rounds:
+        if spent + seconds[case] <= budget:
+            chosen[case] = seconds[case]
+            spent += seconds[case]
+    return chosen
+
+
+def list_cases(program):
+    """All cases of a GoogleTest program, as SUITE.NAME."""
+    suite, cases = "", []
+    for line in run([str(program), "--gtest_list_tests"]).stdout.splitlines():
+        name = line.split("#")[0].rstrip()
+        if re.fullmatch(r"[\w/]+\.", name):
+            suite = name
+        elif re.fullmatch(r"  [\w/]+", name) and "DISABLED_" not in name:
+            cases.append(suite + name.strip())
+    return cases
