@@ -29,6 +29,9 @@ public:
         for (const DeviceKind kind : kKinds)
             CollectDevices(kind);
         CollectReportKeys();
+        JudgeValues(fAnswers.fReport, true);
+        for (DeviceAnswers& device : fAnswers.fDevices)
+            JudgeValues(device.fAnswers, device.GetValue("GLVendorID") != "0");
         fAnswers.fNext = fSequence.GetNextKey();
         return std::move(fAnswers);
     }
@@ -39,6 +42,7 @@ private:
     Missing JudgeMissing(const DeviceAnswers& device, std::size_t key) const;
     void CollectReportKeys();
     Missing JudgeMissingReportKey(const KnownKey& key) const;
+    static void JudgeValues(std::vector<Answer>& answers, bool hasAdapter);
 
     bool HasDevice(DeviceKind kind) const;
 
@@ -83,7 +87,7 @@ DeviceAnswers Collector::CollectDevice(const DeviceTag& tag, const Device* devic
     answers.fFailed = fSequence.HasFailed(tag);
     for (const KnownKey& known : GetDeviceKeys(tag.fKind)) {
         const ReportLine* const line = device ? fReport.Find(*device, known.fKey) : nullptr;
-        answers.fAnswers.push_back({known.fKey, &known, line, Missing::kNot});
+        answers.fAnswers.push_back({known.fKey, &known, line, Missing::kNot, Unknown::kNot});
     }
     answers.fComplete = answers.fAnswers.back().fLine != nullptr;
     for (std::size_t key = 0; key < answers.fAnswers.size(); ++key) {
@@ -94,7 +98,8 @@ DeviceAnswers Collector::CollectDevice(const DeviceTag& tag, const Device* devic
         return answers;
     for (const auto& [key, line] : device->fKeys) {
         if (!FindKnownKey(tag.fKind, key))
-            answers.fAnswers.push_back({key, nullptr, &fReport.GetLines()[line], Missing::kNot});
+            answers.fAnswers.push_back(
+                {key, nullptr, &fReport.GetLines()[line], Missing::kNot, Unknown::kNot});
     }
     return answers;
 }
@@ -135,6 +140,14 @@ Missing Collector::JudgeMissingReportKey(const KnownKey& key) const
     const bool isNoOpenCL =
         key.fKey == GetCountKey(DeviceKind::kOpenCL) && !HasDevice(DeviceKind::kOpenCL);
     return isNoOpenCL ? Missing::kNoOpenCL : Missing::kUnreadable;
+}
+
+void Collector::JudgeValues(std::vector<Answer>& answers, bool hasAdapter)
+{
+    for (Answer& answer : answers) {
+        if (answer.fLine)
+            answer.fUnknown = JudgeUnknown(*answer.fLine, answer.fKnown, hasAdapter);
+    }
 }
 
 } // namespace

@@ -8,6 +8,7 @@
 
 #include "report/KnownKeys.h"
 #include "report/Report.h"
+#include "report/Unknown.h"
 
 namespace assay_host {
 
@@ -30,6 +31,10 @@ struct Answer {
     const KnownKey* fKnown;  // null if the key isn't in the table
     const ReportLine* fLine; // null if missing; owned by the report
     Missing fMissing = Missing::kNot;
+    Unknown fUnknown = Unknown::kNot; // why the line's value stands for "not known"
+
+    // Whether there is a value that says something.
+    bool IsKnown() const { return fLine != nullptr && fUnknown == Unknown::kNot; }
 };
 
 struct DeviceAnswers {

@@ -35,6 +35,12 @@ KnownKey DeviceKey(DeviceKind kind, int row, const char* name, const char* label
     return key;
 }
 
+KnownKey ByAdapter(KnownKey key)
+{
+    key.fNeedsAdapter = true;
+    return key;
+}
+
 KnownKey Query(std::string text, const char* name, int code, const char* label)
 {
     KnownKey key;
@@ -98,7 +104,7 @@ std::vector<KnownKey> MakeKnownKeys()
 
         ReportKey(GetCountKey(kGL)),
         DeviceKey(kGL, 8, "GLVersion", "OpenGL version", Form::kText),
-        DeviceKey(kGL, 6, "IsIntegratedGLGPU", "Integrated", Form::kFlag),
+        ByAdapter(DeviceKey(kGL, 6, "IsIntegratedGLGPU", "Integrated", Form::kFlag)),
         DeviceKey(kGL, 7, "GLMemoryMB", "Memory", Form::kMebibytes, Match::kInteger),
         DeviceKey(kGL, 1, "GLName", "Adapter", Form::kAdapter),
         DeviceKey(kGL, 3, "GLVendor", "Vendor", Form::kText),

@@ -75,6 +75,9 @@ struct KnownKey {
     // printing a line, and always does if its key of this name is 0.
     std::string fSilentWithout{};
 
+    // The value is worked out from the system's adapter lists alone.
+    bool fNeedsAdapter = false;
+
     bool fTakesStep = true;
 
     bool MayBeSilent() const { return !fSilentWithout.empty(); }

@@ -168,14 +168,14 @@ private:
     TextTable fTable;
 };
 
-void PrintWarnings(std::ostream& out, const std::vector<std::string>& warnings, std::size_t width)
+void PrintWarnings(std::ostream& out, const std::vector<Warning>& warnings, std::size_t width)
 {
     if (warnings.empty())
         return;
     out << "Warnings\n--------\n";
     TextTable table;
-    for (const std::string& warning : warnings)
-        table.Add("!", warning);
+    for (const Warning& warning : warnings)
+        table.Add("!", GetWarningText(warning));
     table.Print(out, width);
     out << "\n";
 }

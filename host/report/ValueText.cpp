@@ -16,7 +16,21 @@ namespace assay_host {
 
 namespace {
 
-constexpr const char* kNotKnown = "not known";
+// Whether to say no more of it than that. An empty text, an adapter's missing name and a wrong
+// measurement are shown in their own ways.
+bool IsNotKnown(const Answer& answer)
+{
+    const ValueForm form = answer.fKnown ? answer.fKnown->fForm : ValueForm::kText;
+    switch (answer.fUnknown) {
+    case Unknown::kNotListed:
+    case Unknown::kNoFigure:
+        return true;
+    case Unknown::kNoAdapter:
+        return form != ValueForm::kAdapter;
+    default:
+        return false;
+    }
+}
 
 std::string_view TrimEnd(std::string_view text)
 {
@@ -38,8 +52,6 @@ std::optional<std::string> GetMebibytesText(std::string_view value)
     const auto mebibytes = ReadUnsigned(value);
     if (!mebibytes)
         return std::nullopt;
-    if (*mebibytes == 0)
-        return kNotKnown;
     if (*mebibytes < 1024)
         return fmt::format("{} MiB", *mebibytes);
     return TrimNumber(static_cast<double>(*mebibytes) / 1024) + " GiB";
@@ -50,8 +62,6 @@ std::optional<std::string> GetIdText(std::string_view value)
     const auto id = ReadUnsigned(value);
     if (!id)
         return std::nullopt;
-    if (*id == 0)
-        return kNotKnown;
     return fmt::format("0x{:04X} ({})", *id, *id);
 }
 
@@ -139,12 +149,12 @@ std::string GetValueText(const Answer& answer)
 {
     if (!answer.fLine)
         return fmt::format("- ({})", GetMissingText(answer.fMissing));
+    if (IsNotKnown(answer))
+        return "not known";
     const std::string& value = answer.fLine->fValue;
     std::optional<std::string> text;
     if (answer.fKnown)
         text = GetFormText(answer.fKnown->fForm, value);
-    if (!text && answer.fLine->fQuoted && value == "?")
-        text = kNotKnown;
     if (!text)
         text = ShowBytes(TrimEnd(value));
     if (!IsWholeValue(*answer.fLine))

@@ -14,10 +14,60 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-std::vector<std::string> Warn(const std::string& text, const RunOutcome& outcome = {})
+std::vector<Warning> GetAll(const std::string& text, const RunOutcome& outcome = {})
 {
     const Report report = ReadReport(text);
     return GetWarnings(GetAnswers(report), outcome);
+}
+
+std::vector<std::string> Warn(const std::string& text, const RunOutcome& outcome = {})
+{
+    std::vector<std::string> texts;
+    for (const Warning& warning : GetAll(text, outcome))
+        texts.push_back(GetWarningText(warning));
+    return texts;
+}
+
+std::vector<std::string> GetCodes(const std::string& text, const RunOutcome& outcome = {})
+{
+    std::vector<std::string> codes;
+    for (const Warning& warning : GetAll(text, outcome))
+        codes.emplace_back(warning.fCode);
+    return codes;
+}
+
+TEST(Warnings, HaveACodeAndTheirDevice)
+{
+    const std::vector<Warning> all = GetAll(Sample(2, 1)
+                                                .Set("glgpu[1].GLRenderer", "\"softpipe\"")
+                                                .Set("glgpu[1].GLVendorID", "0")
+                                                .Set("glgpu[1].CanCompileProgramGLSL", "0")
+                                                .Set("glgpu[1].GLFrameBufferOK", "0")
+                                                .GetText());
+    ASSERT_EQ(all.size(), 4U);
+    EXPECT_EQ(all[0].fTag, "glgpu[1]");
+    EXPECT_STREQ(all[0].fCode, "software");
+    EXPECT_EQ(all[0].fText, "software renderer, no graphics hardware: softpipe");
+    EXPECT_STREQ(all[1].fCode, "shader-trial-failed");
+    EXPECT_STREQ(all[2].fCode, "framebuffer-trial-failed");
+    EXPECT_STREQ(all[3].fCode, "no-adapter");
+    EXPECT_THAT(GetCodes(Sample(0, 1)
+                             .Set("QGFCoreInitialized", "0")
+                             .Set("QGFOGLInitialized", "0")
+                             .Set("OGLContextCreated", "0")
+                             .Set("clgpu[0].CLBandwidth", "0")
+                             .Set("clgpu[0].CLCompute", "-1")
+                             .GetText()),
+                ElementsAre("no-core-library", "no-opengl", "no-default-context",
+                            "no-opengl-device", "no-measurement", "implausible-measurement"));
+    RunOutcome outcome;
+    outcome.fLeftBehind = true;
+    outcome.fLostOutputBytes = 1;
+    outcome.fLostErrorBytes = 1;
+    EXPECT_THAT(GetCodes("glgpu[256].X=1\n", outcome),
+                ElementsAre("left-behind", "output-lost", "error-output-lost", "devices-left-out"));
+    EXPECT_THAT(GetCodes(Sample(1, 0).Fail("glgpu[0]", "GLName").GetText()),
+                ElementsAre("device-failed"));
 }
 
 TEST(Warnings, AreNoneForAGoodMachine)
