@@ -1,5 +1,7 @@
 #include "report/RunOutcome.h"
 
+#include <algorithm>
+
 namespace assay_host {
 
 namespace {
@@ -18,6 +20,13 @@ const char* GetVerdictName(Verdict verdict)
 int GetVerdictStatus(Verdict verdict)
 {
     return static_cast<int>(verdict);
+}
+
+std::string RunOutcome::FindCause(const std::string& key) const
+{
+    const auto cause = std::find_if(fCauses.begin(), fCauses.end(),
+                                    [&key](const Cause& each) { return each.fKey == key; });
+    return cause == fCauses.end() ? std::string() : cause->fText;
 }
 
 } // namespace assay_host

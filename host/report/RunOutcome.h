@@ -25,6 +25,12 @@ const char* GetVerdictName(Verdict verdict);
 // Returns the exit status of `assay-host run` for the verdict: 0 to 6 in the order above.
 int GetVerdictStatus(Verdict verdict);
 
+// What the child logged of something that failed.
+struct Cause {
+    std::string fKey;  // of the report line that the failure belongs to, tag and all
+    std::string fText; // raw bytes, without the log's prefix
+};
+
 struct RunOutcome {
     Verdict fVerdict = Verdict::kNeverStarted;
     std::vector<std::string> fCommand; // the child's path and its options
@@ -38,7 +44,11 @@ struct RunOutcome {
     std::vector<std::string> fErrorLines; // raw lines of standard error, without line ends
     std::uint64_t fLostOutputBytes = 0;   // dropped by a limit
     std::uint64_t fLostErrorBytes = 0;
-    bool fLeftBehind = false; // a process could not be killed and may still be running
+    std::vector<Cause> fCauses; // in the order of the log; empty if the child kept none
+    bool fLeftBehind = false;   // a process could not be killed and may still be running
+
+    // The text of the first cause of that key; empty without one.
+    std::string FindCause(const std::string& key) const;
 };
 
 } // namespace assay_host

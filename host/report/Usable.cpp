@@ -1,0 +1,257 @@
+#include "report/Usable.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <optional>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include <fmt/format.h>
+
+#include "report/Bytes.h"
+#include "report/LineForm.h"
+#include "report/Software.h"
+
+namespace assay_host {
+
+namespace {
+
+constexpr std::string_view kContextFailure = "ContextOffscreen exception caught and ignored.";
+
+bool HasPart(std::string_view text, std::string_view part)
+{
+    return text.find(part) != std::string_view::npos;
+}
+
+bool StartsWith(std::string_view text, std::string_view start)
+{
+    return text.substr(0, start.size()) == start;
+}
+
+// How one device came through the trials of its interface.
+struct Trial {
+    const DeviceAnswers* fDevice;
+    const char* fFailure; // a reason; null if it passed
+    std::string fText;
+};
+
+class UsableJudge {
+public:
+    UsableJudge(DeviceKind kind, const Answers& answers, const RunOutcome& outcome)
+        : fKind(kind), fAnswers(answers), fOutcome(outcome)
+    {}
+
+    Usable Judge() const
+    {
+        if (IsDone())
+            return JudgeDevices();
+        if (fOutcome.fVerdict == Verdict::kNeverStarted)
+            return Unknown("never-started", "The child could not be started.");
+        if (fOutcome.fVerdict == Verdict::kUsageError)
+            return Unknown("usage-error", "The child rejected its command line.");
+        if (fOutcome.fVerdict == Verdict::kInterrupted)
+            return Unknown(
+                "interrupted",
+                fmt::format("The run was interrupted before {} was tried.", GetKindName(fKind)));
+        if (fAnswers.fNext.empty() || HasPassed())
+            return Unknown("unreadable",
+                           fmt::format("Lines of the report about {} are missing or garbled.",
+                                       GetKindName(fKind)));
+        if (FindStop() != fKind)
+            return Unknown("ended-before",
+                           fmt::format("The run ended before {} was tried.", GetKindName(fKind)));
+        return JudgeStop();
+    }
+
+private:
+    const Answer& Get(const char* key) const
+    {
+        return *std::find_if(fAnswers.fReport.begin(), fAnswers.fReport.end(),
+                             [key](const Answer& answer) { return answer.fKey == key; });
+    }
+
+    bool Is(const char* key, const char* value) const
+    {
+        const ReportLine* const line = Get(key).fLine;
+        return line != nullptr && line->fValue == value;
+    }
+
+    // Whether the report went on after everything of this interface.
+    bool IsDone() const
+    {
+        const Answer& count = Get(GetCountKey(fKind));
+        return HasPassed() && (count.IsKnown() || count.fMissing == Missing::kNoOpenCL);
+    }
+
+    bool HasPassed() const
+    {
+        const std::string& next = fAnswers.fNext;
+        if (next.empty())
+            return Get("assayEnd").fLine != nullptr;
+        if (fKind == DeviceKind::kOpenCL)
+            return next == "assayEnd" && FindStop() != fKind;
+        return (next == GetCountKey(DeviceKind::kOpenCL) && FindStop() != fKind) ||
+               GetKeyKind(next) == DeviceKind::kOpenCL || next == "assayEnd";
+    }
+
+    static std::optional<DeviceKind> GetKeyKind(const std::string& key)
+    {
+        const auto word = GetDeviceTag(key);
+        return word ? std::optional(ReadDeviceTag(*word)->fKind) : std::nullopt;
+    }
+
+    // The interface that the child was at when the report broke off; none before the first and
+    // after the last one.
+    std::optional<DeviceKind> FindStop() const
+    {
+        constexpr DeviceKind kGL = DeviceKind::kOpenGL;
+        constexpr DeviceKind kCL = DeviceKind::kOpenCL;
+        // A device that failed a test is given back before anything else is done.
+        constexpr std::string_view kTerminated = "Testing terminated for ";
+        const std::size_t at = fOutcome.fLastLogLine.rfind(kTerminated);
+        if (at != std::string::npos) {
+            const auto tag = ReadDeviceTag(
+                std::string_view(fOutcome.fLastLogLine).substr(at + kTerminated.size()));
+            if (tag)
+                return tag->fKind;
+        }
+        const std::string& next = fAnswers.fNext;
+        if (const auto kind = GetKeyKind(next))
+            return kind;
+        if (next == GetCountKey(kCL))
+            return kCL;
+        const bool isOfGL = next == "QGFOGLInitialized" || next == "OGLContextCreated" ||
+                            next == GetCountKey(kGL) || StartsWith(next, "gputag.");
+        return isOfGL ? std::optional(kGL) : std::nullopt;
+    }
+
+    Usable JudgeStop() const
+    {
+        const auto tag = GetDeviceTag(fAnswers.fNext);
+        const std::string device(tag ? *tag : "");
+        const std::string where = ShowBytes(fAnswers.fNext);
+        switch (fOutcome.fVerdict) {
+        case Verdict::kCrashed:
+            return {Usability::kBroken, "crashed",
+                    fmt::format("The child crashed in {}, at {}.", GetKindName(fKind), where),
+                    device};
+        case Verdict::kHung:
+            return {Usability::kBroken, "hung",
+                    fmt::format("The child hung in {}, at {}.", GetKindName(fKind), where), device};
+        default:
+            return {Usability::kBroken, "ended",
+                    fmt::format("The child ended in {}, at {}.", GetKindName(fKind), where),
+                    device};
+        }
+    }
+
+    Usable JudgeDevices() const
+    {
+        std::vector<Trial> trials;
+        for (const DeviceAnswers& device : fAnswers.fDevices) {
+            if (device.fKind == fKind)
+                trials.push_back(MakeTrial(device));
+        }
+        if (trials.empty())
+            return JudgeNoDevice();
+        const Trial* software = nullptr;
+        const Trial* failed = nullptr;
+        for (const Trial& trial : trials) {
+            const bool isSoftware = !FindSoftwareText(*trial.fDevice).empty();
+            if (!trial.fFailure && !isSoftware)
+                return {Usability::kHardware, "trials-passed",
+                        fmt::format("{} works on graphics hardware.", GetKindName(fKind)),
+                        trial.fDevice->fTag};
+            const Trial*& first = trial.fFailure ? failed : software;
+            if (!first)
+                first = &trial;
+        }
+        if (!software)
+            return {Usability::kBroken, failed->fFailure,
+                    fmt::format("{} does not work: {}.", GetKindName(fKind), failed->fText),
+                    failed->fDevice->fTag};
+        return {Usability::kSoftware, failed ? "others-failed" : "only-software",
+                fmt::format("{} works in software alone{}.", GetKindName(fKind),
+                            failed ? ": " + failed->fDevice->fTag + " does not work" : ""),
+                software->fDevice->fTag};
+    }
+
+    Trial MakeTrial(const DeviceAnswers& device) const
+    {
+        const auto fails = [&device](const char* reason, const char* text) {
+            return Trial{&device, reason, fmt::format("{}: {}", device.fTag, text)};
+        };
+        if (device.GetValue("CanCompileProgramGLSL") == "0")
+            return fails("shader-trial-failed", "a realistic pair of shaders does not compile");
+        if (device.GetValue("GLFrameBufferOK") == "0")
+            return fails("framebuffer-trial-failed", "no framebuffer could be drawn to");
+        // What only describes a device may fail after its last trial.
+        const char* const last = fKind == DeviceKind::kOpenGL ? "GLFrameBufferOK" : "CLCompute";
+        if (!device.Find(last))
+            return device.fFailed ? fails("device-failed", "a test failed")
+                                  : fails("no-trial", "no answer came from its trials");
+        return {&device, nullptr, {}};
+    }
+
+    Usable JudgeNoDevice() const
+    {
+        const char* const name = GetKindName(fKind);
+        if (fKind == DeviceKind::kOpenCL) {
+            if (Get(GetCountKey(fKind)).fMissing == Missing::kNoOpenCL)
+                return {Usability::kAbsent, "no-library", "There is no OpenCL library.", {}};
+            return {Usability::kAbsent, "no-device", "OpenCL has no graphics device.", {}};
+        }
+        if (std::count(fOutcome.fErrorLines.begin(), fOutcome.fErrorLines.end(), kContextFailure))
+            return {Usability::kBroken,
+                    "context-failed",
+                    "No OpenGL context could be created on any display device.",
+                    {}};
+        if (Is("QGFOGLInitialized", "0") && !fOutcome.FindCause("QGFOGLInitialized").empty()) {
+            const std::string cause = fOutcome.FindCause("QGFOGLInitialized");
+            if (HasPart(cause, "can't be opened"))
+                return {Usability::kAbsent, "no-library", "There is no OpenGL library.", {}};
+            if (!HasPart(cause, "has no display device"))
+                return {Usability::kBroken,
+                        "library-failed",
+                        fmt::format("The OpenGL library does not work: {}.", ShowBytes(cause)),
+                        {}};
+        }
+        return {Usability::kAbsent, "no-device", fmt::format("{} has no device.", name), {}};
+    }
+
+    static Usable Unknown(const char* reason, std::string text)
+    {
+        return {Usability::kUnknown, reason, std::move(text), {}};
+    }
+
+    const DeviceKind fKind;
+    const Answers& fAnswers;
+    const RunOutcome& fOutcome;
+};
+
+} // namespace
+
+const char* GetUsabilityName(Usability usability)
+{
+    switch (usability) {
+    case Usability::kHardware:
+        return "hardware";
+    case Usability::kSoftware:
+        return "software";
+    case Usability::kBroken:
+        return "broken";
+    case Usability::kAbsent:
+        return "absent";
+    case Usability::kUnknown:
+        break;
+    }
+    return "unknown";
+}
+
+Usable JudgeUsable(DeviceKind kind, const Answers& answers, const RunOutcome& outcome)
+{
+    return UsableJudge(kind, answers, outcome).Judge();
+}
+
+} // namespace assay_host
