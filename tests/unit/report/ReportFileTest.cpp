@@ -2,6 +2,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <random>
 #include <stdexcept>
 #include <string>
 #include <system_error>
@@ -16,11 +17,11 @@
 namespace assay_host {
 namespace {
 
-// A file that is deleted with its object.
+// A file that no other process has, deleted with its object.
 class File {
 public:
-    explicit File(const std::string& text, const char* name = "assay-report-file")
-        : fPath(testing::TempDir() + name)
+    explicit File(const std::string& text, const std::string& name = "assay-report-file")
+        : fPath(testing::TempDir() + name + "-" + std::to_string(std::random_device()()))
     {
         std::ofstream file(std::filesystem::u8path(fPath), std::ios::binary);
         file << text;
