@@ -11,9 +11,9 @@
 #include <string>
 
 #include "TestChild.h"
-#include "Waits.h"
 #include "pmutil/ConsoleAppLauncher.h"
 #include "pmutil/OutputTask.h"
+#include "support/Waits.h"
 
 namespace pmutil {
 
@@ -54,7 +54,8 @@ public:
     void AwaitStart()
     {
         boost::unique_lock<boost::mutex> lock(fStartMutex);
-        EXPECT_TRUE(fStartCond.timed_wait(lock, boost::posix_time::seconds(30),
+        EXPECT_TRUE(fStartCond.timed_wait(lock,
+                                          boost::posix_time::seconds(static_cast<long>(kLong)),
                                           [this] { return fStarted; }));
     }
 
@@ -140,6 +141,7 @@ private:
 
 // A launcher with an application and two collecting tasks.
 struct RealLaunch {
+    LongShortWait longShortWait;
     boost::shared_ptr<StartedApp> app = boost::make_shared<StartedApp>();
     boost::shared_ptr<CollectingTask> out = boost::make_shared<CollectingTask>(app);
     boost::shared_ptr<CollectingTask> err = boost::make_shared<CollectingTask>(app);

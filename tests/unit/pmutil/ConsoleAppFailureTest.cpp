@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include "ConsoleAppFixture.h"
+#include "FailingStart.h"
 #include "RecordingLogger.h"
 
 using namespace pmutil;
@@ -34,6 +35,7 @@ TEST_F(FailureList, IsThrownByEachKindOfWait)
     EXPECT_TRUE(ThrowsFailure("stdout: stored", [&] { fApp->Wait(nullptr, kLong); }));
     OpenTasks();
     fail();
+    const NoShortWait noWait; // for a launch that nobody ends
     EXPECT_TRUE(ThrowsFailure("stdout: stored", [&] { fApp->Launch(fData, fParams); }))
         << "one that was stored before";
     EXPECT_EQ(Peek(), State::kIdle);
@@ -53,21 +55,6 @@ TEST_F(FailureList, IsDiscardedBehindTheOneThatWaitThrows)
     fApp->NotifyFailure(Exception(TaskID::kStdout, "first"));
     fApp->NotifyFailure(Exception(TaskID::kStdout, "second"));
     EXPECT_TRUE(ThrowsFailure("stdout: first", [&] { fApp->Wait(nullptr, kLong); }));
-    EXPECT_EQ(Peek(), State::kIdle);
-}
-
-TEST_F(FailureList, WakesASleepingWaitAtOnce)
-{
-    Launch();
-    boost::thread failing([&] {
-        // Wait logs nothing that could be waited for; whether it sleeps already or not, it throws.
-        fApp->NotifyFailure(Exception(TaskID::kStdout, "ouch"));
-        End(kEndedNormally);
-    });
-    const auto start = std::chrono::steady_clock::now();
-    EXPECT_TRUE(ThrowsFailure("stdout: ouch", [&] { fApp->Wait(nullptr, kLong); }));
-    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(30));
-    failing.join();
     EXPECT_EQ(Peek(), State::kIdle);
 }
 
@@ -219,7 +206,10 @@ protected:
 TEST_P(OutputFault, NotifyOutputTaskBeginFailsTheLaunch)
 {
     fApp->SetInjectedFault(Fault::kNotifyOutputTaskBegin);
-    EXPECT_TRUE(ThrowsFailure(fParty + ": NotifyOutputTaskBegin", [&] { Launch(); }));
+    {
+        const FailingStart failing(fParty);
+        EXPECT_TRUE(ThrowsFailure(fParty + ": NotifyOutputTaskBegin", [&] { Launch(); }));
+    }
     EXPECT_EQ(Peek(), State::kIdle);
     EXPECT_TRUE(fLauncher->AwaitKills(1));
     EXPECT_THAT(fApp->Events(), testing::ElementsAre("OnLaunching"));
@@ -274,57 +264,17 @@ TEST_F(Situation, TheChildHangs)
     EXPECT_EQ(fApp->Wait(&exitCode, 0.02), State::kTimeout);
     EXPECT_EQ(Peek(), State::kTimeout);
     EXPECT_EQ(exitCode, -1);
-    fApp->Kill();
+    KillAtTimeout();
     EXPECT_EQ(fApp->Wait(&exitCode, kLong), State::kKilled);
-}
-
-TEST_F(Situation, OneOutputThreadWillNotEnd)
-{
-    const DebugValueSetter log("ConsoleAppLog", 1);
-    const RecordingLogger logger;
-    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
-    Launch();
-    fStdout->fGate.Open();
-    fLauncher->End(kEndedNormally, 4);
-    // The client waits when the thread of the launch has given it up.
-    EXPECT_TRUE(Eventually([&] {
-        const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
-        return std::any_of(logger.lines.begin(), logger.lines.end(), [](const std::string& line) {
-            return MessageOf(line) ==
-                   "NotifyFailureLocked: exc=Launcher: output task thread abandoned\n";
-        });
-    }));
-    EXPECT_TRUE(ThrowsFailure("Launcher: output task thread abandoned",
-                              [&] { fApp->Wait(nullptr, kLong); }));
-    EXPECT_EQ(Peek(), State::kIdle);
-    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads + 1) << "the pump runs on";
-    EXPECT_TRUE(fStderr->IsRunning(0.0));
-}
-
-TEST_F(Situation, BothOutputThreadsWillNotEnd)
-{
-    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
-    Launch();
-    fLauncher->End(kEndedNormally, 4);
-    int exitCode = -1;
-    // The clean-up takes two short waits, and the client's wait for it only one.
-    EXPECT_EQ(fApp->Wait(&exitCode, kLong), State::kTimeout);
-    EXPECT_EQ(exitCode, -1);
-    EXPECT_EQ(Peek(), State::kIdle);
-    EXPECT_GE(ManagedThread::GetRegisteredThreadCount(), threads + 2);
 }
 
 TEST_F(Situation, AnOutputTaskDoesNotStartInTheShortWait)
 {
-    // It starts when the launch has given it up.
     fApp->fOnEvent = [gate = fGate](const std::string& event) {
         if (event == "begin stdout")
             gate->Await();
     };
-    fLauncher->fOnKill = [gate = fGate, out = fStdout] {
-        out->fGate.Open();
-        gate->Open();
-    };
+    const NoShortWait noWait;
     // Launch waits as long as the thread of the launch does; either may be first.
     EXPECT_TRUE(ThrowsFailure("Launcher: LauncherTask: output task stdout never started", [&] {
         Launch();
@@ -337,6 +287,7 @@ TEST_F(Situation, AnOutputTaskDoesNotStartInTheShortWait)
 TEST_F(Situation, AnOutputTaskThatFailsTakesPrecedenceOverOneThatNeverStarted)
 {
     fApp->fThrowIn = "begin stderr";
+    const FailingStart failing("stderr");
     EXPECT_TRUE(ThrowsFailure("stderr: begin stderr failed", [&] { Launch(); }));
     EXPECT_TRUE(fLauncher->AwaitKills(1));
     EXPECT_EQ(Peek(), State::kIdle);
@@ -381,6 +332,7 @@ TEST_F(Situation, SeveralFailures)
     EXPECT_TRUE(ThrowsFailure("Client: first", [&] { Peek(); }));
     EXPECT_TRUE(ThrowsFailure("Client: second", [&] { fApp->Kill(); }));
     EXPECT_EQ(fLauncher->fKills, 0) << "the wait in it threw";
+    const NoShortWait noWait;
     fApp->Reset();
     EXPECT_EQ(Peek(), State::kIdle) << "the rest is discarded";
     EXPECT_EQ(fLauncher->fKills, 0) << "a reset kills nobody";

@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include "FakeLauncher.h"
+#include "ThreadsEnd.h"
 #include "Throws.h"
 
 namespace pmutil {
@@ -31,6 +32,7 @@ protected:
 
     ~ConsoleAppFixture() override
     {
+        fGate->Open();
         OpenTasks();
         fLauncher->End(kEndedNormally);
     }
@@ -64,6 +66,13 @@ protected:
         EXPECT_TRUE(Eventually([&] { return fLauncher->fWaits > waits; }));
     }
 
+    // Kill waits first for another state than Timeout, and none comes.
+    void KillAtTimeout()
+    {
+        const NoShortWait noWait;
+        fApp->Kill();
+    }
+
     // Lets the child and its output end.
     void End(WaitResult result, int exitCode = 0)
     {
@@ -89,6 +98,8 @@ protected:
 
     State Peek() { return fApp->GetState(0.0); }
 
+    const ThreadsEnd fNoThreadIsLeft; // which the next test would count
+    const LongShortWait fLongShortWait;
     boost::shared_ptr<FakeLauncher> fLauncher = boost::make_shared<FakeLauncher>();
     // The one fake serves as a new launcher too.
     boost::shared_ptr<RecordingApp> fApp =

@@ -68,10 +68,7 @@ TEST_F(StateSequence, OfAKillAfterATimedOutWait)
     fLauncher->fMortal = false;
     Launch();
     fApp->Wait(nullptr, 0.0);
-    {
-        const NoShortWait noWait;
-        fApp->Kill();
-    }
+    KillAtTimeout();
     End(kEndedByKill);
     fApp->Wait(nullptr, kLong);
     EXPECT_THAT(log.Get(), ElementsAre("Launching", "Launching", "Launched", "Running", "Timeout",
@@ -240,7 +237,7 @@ TEST_F(Notification, KillOfThePlatformIsCalledUnderTheLock)
 {
     bool locked = false;
     fLauncher->fMortal = false;
-    fLauncher->fOnKill = [&] { locked = fApp->IsLocked(50); };
+    fLauncher->fOnKill = [&] { locked = fApp->IsLocked(0.05); };
     LaunchUntilItWaits();
     fApp->Kill();
     fApp->JoinAskers();

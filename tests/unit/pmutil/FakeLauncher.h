@@ -13,10 +13,10 @@
 #include <vector>
 
 #include "FakeChannel.h"
-#include "Waits.h"
 #include "pmutil/ConsoleApp.h"
 #include "pmutil/Launcher.h"
 #include "pmutil/OutputTask.h"
+#include "support/Waits.h"
 
 namespace pmutil {
 
@@ -168,15 +168,16 @@ public:
         return std::count(events.begin(), events.end(), event);
     }
 
-    // True if the calling thread, or another, holds the lock for good.
-    bool IsLocked(int milliseconds = 20'000)
+    // True if the calling thread, or another, holds the lock for that long.
+    bool IsLocked(double seconds = kLong)
     {
         const auto done = boost::make_shared<std::atomic<bool>>(false);
         boost::thread asker([this, done] {
             ThrowIfInjected(TaskID::kClient, Fault::kNoFault, nullptr); // takes the lock
             *done = true;
         });
-        const bool locked = !asker.timed_join(boost::posix_time::milliseconds(milliseconds));
+        const bool locked = !asker.timed_join(
+            boost::posix_time::milliseconds(static_cast<std::int64_t>(seconds * 1000)));
         if (locked) {
             const boost::lock_guard<boost::mutex> lock(fEventMutex);
             fAskers.push_back(std::move(asker));

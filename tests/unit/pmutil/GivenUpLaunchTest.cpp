@@ -3,6 +3,7 @@
 
 #include "CollectingTask.h"
 #include "ConsoleAppFixture.h"
+#include "FailingStart.h"
 #include "OpenThings.h"
 #include "RecordingLogger.h"
 
@@ -12,6 +13,7 @@ using consoleapp::Exception;
 namespace {
 
 constexpr char kJoinsAfterEnd[] = "ConsoleApp::Wait fLauncherThread.TimedJoin(";
+constexpr char kJoinsStdout[] = "CleanupLaunchThreadTask: joining output task thread for stdout";
 
 class GivenUpLaunch : public ConsoleAppFixture {
 protected:
@@ -33,9 +35,6 @@ protected:
         OpenTasks();
         for (const auto& task : fOldTasks)
             task->fGate.Open();
-        // The threads that were given up log until they end, and nobody joins them.
-        EXPECT_TRUE(Eventually([&] { return CountThreads() <= fThreads; }));
-        const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
     }
 
     // Whose tasks go on meanwhile.
@@ -83,20 +82,12 @@ protected:
         fLogger.lines.clear();
     }
 
-    static long CountIdleThreads()
-    {
-        boost::thread([] {}).join(); // a sanitizer adds one of its own to the first
-        return CountThreads();
-    }
-
-    const long fThreads = CountIdleThreads();
-    // A short wait that nothing comes to the end of.
-    const DebugValueSetter fLongShortWait{"ConsoleAppShortWaitSecondsMinusOne", 599};
     const DebugValueSetter fLog{"ConsoleAppLog", 1};
     RecordingLogger fLogger;
     boost::shared_ptr<FakeLauncher> fSecond = boost::make_shared<FakeLauncher>();
     std::atomic<int> fMade{0};
     std::vector<boost::shared_ptr<PatientTask>> fOldTasks;
+    const ThreadsEnd fThreadsEnd;
 };
 
 TEST_F(GivenUpLaunch, OneLauncherServesAllLaunchesThatEnd)
@@ -369,6 +360,44 @@ TEST_F(GivenUpLaunch, ASleepingWaiterOfItLeavesTheNextAlone)
     EXPECT_TRUE(ThrowsFailure("Client: mine", [&] { Peek(); }));
 }
 
+TEST_F(GivenUpLaunch, OneOutputThreadWillNotEnd)
+{
+    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
+    std::optional<NoShortWait> noWait;
+    // The thread of standard output ends when it is waited for, and the other one doesn't.
+    fApp->fOnEvent = [&](const std::string& event) {
+        if (event != "end stdout")
+            return;
+        EXPECT_TRUE(AwaitLine(kJoinsStdout));
+        noWait.emplace();
+    };
+    Launch();
+    fStdout->fGate.Open();
+    fLauncher->End(kEndedNormally, 4);
+    EXPECT_TRUE(AwaitLine("NotifyFailureLocked: exc=Launcher: output task thread abandoned"));
+    noWait.reset();
+    EXPECT_TRUE(ThrowsFailure("Launcher: output task thread abandoned",
+                              [&] { fApp->Wait(nullptr, kLong); }));
+    EXPECT_EQ(Peek(), State::kIdle);
+    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads + 1) << "the pump runs on";
+    EXPECT_TRUE(fStderr->IsRunning(0.0));
+}
+
+// The clean-up takes two short waits then, and the client's wait for it only one.
+TEST_F(GivenUpLaunch, TheClientIsFirstToGiveUpWhenNoOutputThreadEnds)
+{
+    const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
+    Launch();
+    fLauncher->End(kEndedNormally, 4);
+    EXPECT_TRUE(AwaitLine(kJoinsStdout));
+    int exitCode = -1;
+    const NoShortWait noWait;
+    EXPECT_EQ(fApp->Wait(&exitCode, kLong), State::kTimeout);
+    EXPECT_EQ(exitCode, -1);
+    EXPECT_EQ(Peek(), State::kIdle);
+    EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads + 3);
+}
+
 TEST_F(GivenUpLaunch, ResetDoesNotWaitForAnotherThreadsWait)
 {
     LaunchUntilItWaits();
@@ -471,12 +500,23 @@ using FailedStart = ConsoleAppFixture;
 TEST_F(FailedStart, ClosesTheReaderOfATaskThatNeverRan)
 {
     fApp->SetInjectedFault(Fault::kNotifyOutputTaskBegin);
+    const FailingStart failing("stdout");
     EXPECT_TRUE(ThrowsFailure("stdout: NotifyOutputTaskBegin", [&] { Launch(); }));
     EXPECT_TRUE(Eventually([&] { return !fLauncher->fOutput[1]->fOpen; }));
 }
 
 // At each point at which a launch fails with its child alive.
-class FailedLaunch : public ConsoleAppFixture, public testing::WithParamInterface<Fault> {};
+class FailedLaunch : public ConsoleAppFixture, public testing::WithParamInterface<Fault> {
+protected:
+    template <typename Call>
+    static void ExpectFailure(const Call& launch)
+    {
+        std::optional<FailingStart> failing;
+        if (GetParam() == Fault::kNotifyOutputTaskBegin)
+            failing.emplace("stdout");
+        EXPECT_THROW(launch(), Exception);
+    }
+};
 
 TEST_P(FailedLaunch, KillsTheChildBeforeItsInputEnds)
 {
@@ -486,7 +526,7 @@ TEST_P(FailedLaunch, KillsTheChildBeforeItsInputEnds)
         before();
     };
     fApp->SetInjectedFault(GetParam());
-    EXPECT_THROW(Launch(), Exception);
+    ExpectFailure([&] { Launch(); });
     EXPECT_TRUE(fLauncher->AwaitKills(1));
     EXPECT_TRUE(Eventually([&] { return fLauncher->fInput.use_count() == 1; }));
     EXPECT_GT(holders, 1);
@@ -494,14 +534,11 @@ TEST_P(FailedLaunch, KillsTheChildBeforeItsInputEnds)
 
 TEST_P(FailedLaunch, LeavesNoDescriptorOfARealChild)
 {
-    // A thread that is given up keeps handles on Windows, so that none may be. Only a task that
-    // never starts takes the whole short wait, and Reset waits as long again.
-    const DebugValueSetter wait{"ConsoleAppShortWaitSecondsMinusOne",
-                                GetParam() == Fault::kNotifyOutputTaskBegin ? 1 : 599};
+    // A thread that is given up keeps handles on Windows, so that none may be.
     const auto fail = [] {
         RealLaunch launch({"sleep", "60000"});
         launch.app->SetInjectedFault(GetParam());
-        EXPECT_THROW(launch.launcher.Launch(), Exception);
+        ExpectFailure([&] { launch.launcher.Launch(); });
         EXPECT_EQ(launch.launcher.Wait(nullptr, 0.0), State::kIdle);
         // Wine 8's server crashes if it lists handles while a process dies.
         EXPECT_TRUE(Eventually([] { return !HasChildren(); }));

@@ -13,9 +13,9 @@
 #include <string>
 #include <vector>
 
-#include "OpenThings.h"
 #include "RecordingLogger.h"
-#include "Waits.h"
+#include "ThreadsEnd.h"
+#include "support/Waits.h"
 
 namespace pmutil {
 
@@ -121,26 +121,6 @@ private:
     std::map<boost::thread::id, std::string> fParties;
     std::map<std::string, Entries> fEntries;
     std::map<std::string, std::size_t> fTaken;
-};
-
-// Threads that are given up log until they end, and nobody joins them: this waits for that when it
-// goes.
-class ThreadsEnd {
-public:
-    ~ThreadsEnd()
-    {
-        EXPECT_TRUE(Eventually([&] { return CountThreads() <= fThreads; }));
-        const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
-    }
-
-private:
-    static long CountIdle()
-    {
-        boost::thread([] {}).join(); // a sanitizer adds one of its own to the first
-        return CountThreads();
-    }
-
-    const long fThreads = CountIdle();
 };
 
 } // namespace pmutil

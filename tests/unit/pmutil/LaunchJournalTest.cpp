@@ -250,7 +250,7 @@ protected:
 
     static Entries ClientSleeps(const std::string& state)
     {
-        return Entries{"ConsoleApp::Wait() maxWaitSeconds=60"} + Look(state) +
+        return Entries{"ConsoleApp::Wait() maxWaitSeconds=300"} + Look(state) +
                Entries{"ConsoleApp::Wait fState=" + state + " fCond.timed_wait waitSeconds=..."};
     }
 
@@ -265,8 +265,7 @@ protected:
     void HoldUntilReleased(const std::string& event) { fHolds[event] = {{"Client", kReleased, 1}}; }
 
     const DebugValueSetter fLog{"ConsoleAppLog", 1};
-    // A short wait that nothing comes to the end of.
-    const DebugValueSetter fLongShortWait{"ConsoleAppShortWaitSecondsMinusOne", 599};
+    const LongShortWait fLongShortWait;
     Journal fJournal;
     std::map<std::string, std::vector<Held>> fHolds;
     boost::shared_ptr<JournalLauncher> fLauncher = boost::make_shared<JournalLauncher>(*this);
@@ -485,7 +484,7 @@ TEST_F(LaunchJournal, OfAThreadThatNeverFinishes)
     }
     EXPECT_THAT(
         fJournal.Take("Client"),
-        ElementsAreArray(Entries{"ConsoleApp::Wait() maxWaitSeconds=60"} + Look("Finished") +
+        ElementsAreArray(Entries{"ConsoleApp::Wait() maxWaitSeconds=300"} + Look("Finished") +
                          Entries{"ConsoleApp::Wait fLauncherThread.TimedJoin(0)",
                                  "ConsoleApp::Wait fLauncherThread never finished",
                                  "thread Launcher was abandoned", "SetStateLocked state=Idle",

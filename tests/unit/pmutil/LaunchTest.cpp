@@ -4,6 +4,7 @@
 #include <thread>
 
 #include "CollectingTask.h"
+#include "FailingStart.h"
 #include "TempFolder.h"
 #include "Throws.h"
 
@@ -51,7 +52,10 @@ TEST(Launch, HangingChildTimesOutAndIsKilled)
     EXPECT_EQ(exitCode, -1);
     EXPECT_TRUE(ThrowsRuntimeError("ConsoleAppLauncher::Launch: already launched",
                                    [&] { launch.launcher.Launch(); }));
-    launch.launcher.Kill();
+    {
+        const NoShortWait noWait; // no other state comes
+        launch.launcher.Kill();
+    }
     EXPECT_EQ(launch.launcher.Wait(&exitCode, kLong), State::kKilled);
     EXPECT_EQ(exitCode, 0);
     launch.launcher.Kill();
@@ -132,11 +136,19 @@ TEST(Launch, ChildThatClosesItsOutputsAtOnceIsStillWaitedFor)
 
 TEST(Launch, GrandchildThatHoldsThePipesIsGivenUp)
 {
+    const DebugValueSetter log("ConsoleAppLog", 1);
+    Journal journal;
+    const ThreadsEnd threadsEnd;
     const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
     // The grandchild reads its input, which is the child's, to its end.
     RealLaunch launch({"heir", "exit", "0"}, true);
-    // Both pumps hang, for a short wait each: the launcher's thread is given up before that.
-    EXPECT_EQ(launch.launcher.LaunchAndWait(nullptr, kLong), State::kTimeout);
+    launch.launcher.Launch();
+    // Both pumps hang, and the launcher's thread with them.
+    journal.Await("Launcher", "CleanupLaunchThreadTask: joining output task thread for stdout");
+    {
+        const NoShortWait noWait;
+        EXPECT_EQ(launch.launcher.Wait(nullptr, kLong), State::kTimeout);
+    }
     EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
     EXPECT_GT(ManagedThread::GetRegisteredThreadCount(), threads);
     // The reset has closed the input, so that the grandchild ends, and with it the pumps.
@@ -250,6 +262,9 @@ TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
     bool killed = false;
     State result = State::kUndefined;
     int exitCode = -1;
+    std::optional<FailingStart> failing;
+    if (GetFault() == Fault::kNotifyOutputTaskBegin)
+        failing.emplace("stdout");
     try {
         launch.launcher.Launch();
         launched = true;
@@ -258,7 +273,8 @@ TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
                 launch.launcher.Kill();
             } catch (const Exception& exc) {
                 failure = exc.what();
-                launch.launcher.Kill(); // fires once
+                const NoShortWait noWait; // no other state comes
+                launch.launcher.Kill();   // fires once
             }
             killed = true;
         }

@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 
 #include "ConsoleAppFixture.h"
+#include "FailingStart.h"
 #include "RecordingLogger.h"
 #include "all/LaunchOutputThreadTask.h"
 #include "all/LaunchThreadTask.h"
@@ -251,6 +252,16 @@ TEST_F(LauncherThread, FailuresAreStoredByTheirKind)
     EXPECT_THAT(TakeFailures(), ElementsAre("Launcher: LaunchThreadTask failed"));
     EXPECT_THAT(Messages(), testing::Contains("LaunchThreadTask inner exception=?\n"));
     EXPECT_EQ(fLauncher->fKills, 0) << "no child was started";
+}
+
+TEST_F(LauncherThread, AFailureOfATaskIsFoundBeforeItCountsAsOneThatNeverStarted)
+{
+    fParams.SetOutputTask(OutputChannel::kStderr, fStderr);
+    fApp->fThrowIn = "begin stderr";
+    const FailingStart failing("stderr");
+    Run();
+    EXPECT_THAT(TakeFailures(), ElementsAre("stderr: begin stderr failed"));
+    EXPECT_EQ(fLauncher->fKills, 1);
 }
 
 TEST_F(LauncherThread, AFailureInTheCleanUpIsOnlyLogged)

@@ -69,6 +69,27 @@ TEST_F(LaunchWait, GetStateSleepsUntilAStableState)
     fApp->Reset();
 }
 
+TEST_F(LaunchWait, KillSleepsUntilAStableState)
+{
+    fApp->SetState(State::kLaunched);
+    boost::thread killer([&] {
+        fJournal.Enter(kOther);
+        fApp->Kill();
+    });
+    fJournal.Await(kOther, "ConsoleApp::GetStateLocked nloops=0 fState=Launched");
+    EXPECT_EQ(fLauncher->fKills, 0);
+    fApp->SetState(State::kRunning);
+    killer.join();
+    EXPECT_THAT(fJournal.Take(kOther),
+                testing::ElementsAre("ConsoleApp::GetStateLocked nloops=0 fState=Launched",
+                                     "ConsoleApp::ThrowIfFailurePendingLocked numFailures=0",
+                                     "ConsoleApp::GetStateLocked nloops=1 fState=Running",
+                                     "ConsoleApp::ThrowIfFailurePendingLocked numFailures=0",
+                                     "SetStateLocked state=Killing"));
+    EXPECT_EQ(fLauncher->fKills, 1);
+    fApp->Reset();
+}
+
 TEST_F(LaunchWait, KillWaitsNoLongerThanTheShortWait)
 {
     const DebugValueSetter defaultWait("ConsoleAppDefaultWaitSecondsMinus10", 100'000);

@@ -10,6 +10,7 @@
 
 #include "RecordingLogger.h"
 #include "pmutil/PMLogging.h"
+#include "support/Waits.h"
 
 using pmutil::ManagedThread;
 
@@ -125,7 +126,7 @@ TEST(ManagedThread, AbandonedThreadRunsOnAndStaysRegistered)
     EXPECT_EQ(Count(), before + 2);
     gate.Open();
     gate.AwaitEnds(2);
-    EXPECT_TRUE(thread.TimedJoin(10.0));
+    EXPECT_TRUE(thread.TimedJoin(pmutil::kLong));
     EXPECT_EQ(Count(), before + 1);
 }
 
@@ -138,7 +139,7 @@ TEST(ManagedThread, JoinedThreadThatSomebodySharesStaysRegistered)
     thread.Assign(gate.NewThread());
     const auto share = thread.GetThread();
     gate.Open();
-    EXPECT_TRUE(thread.TimedJoin(10.0));
+    EXPECT_TRUE(thread.TimedJoin(pmutil::kLong));
     EXPECT_FALSE(thread.HoldsThread());
     EXPECT_FALSE(share->joinable());
     EXPECT_EQ(Count(), before + 1);
@@ -156,7 +157,7 @@ TEST(ManagedThread, OnlyTheJoinedThreadLeavesTheRegistry)
     const boost::weak_ptr<boost::thread> joined = other.GetThread();
     thread.Abandon();
     otherGate.Open();
-    EXPECT_TRUE(other.TimedJoin(10.0));
+    EXPECT_TRUE(other.TimedJoin(pmutil::kLong));
     EXPECT_TRUE(joined.expired());
     EXPECT_FALSE(abandoned.expired());
 }
@@ -202,7 +203,7 @@ TEST(ManagedThread, AThreadCannotWaitForItself)
     // Looked at from outside only after the thread is through with it.
     while (joined)
         boost::this_thread::yield();
-    EXPECT_TRUE(thread.TimedJoin(10.0));
+    EXPECT_TRUE(thread.TimedJoin(pmutil::kLong));
 }
 
 TEST(ManagedThread, ArraysAreBuiltWithoutNames)
@@ -212,7 +213,7 @@ TEST(ManagedThread, ArraysAreBuiltWithoutNames)
     threads[1].SetName("stdout");
     threads[1].Assign(gate.NewThread());
     gate.Open();
-    EXPECT_TRUE(threads[1].TimedJoin(10.0));
+    EXPECT_TRUE(threads[1].TimedJoin(pmutil::kLong));
 }
 
 class ManagedThreadLog : public testing::TestWithParam<const char*> {};

@@ -20,8 +20,8 @@
 #include "OpenThings.h"
 #include "TestChild.h"
 #include "Throws.h"
-#include "Waits.h"
 #include "pmutil/PosixHandle.h"
+#include "support/Waits.h"
 
 using namespace pmutil;
 
@@ -409,11 +409,13 @@ TEST(LauncherPosix, HostThatIgnoresChildrenLaterGetsAClearFailure)
 
 TEST(LauncherPosix, OrphanIsSeenOffLater)
 {
+    LaunchResult ends;
     {
         LauncherPosix launcher;
-        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"sleep", "50"});
+        ends = launcher.Launch(TEST_CHILD, {"echo"});
     }
     EXPECT_TRUE(HasChildren());
+    ends.fAppInput.reset(); // now it ends
     EXPECT_TRUE(Eventually([] {
         RunChild({"exit", "0"}); // a launch looks after those of before
         return !HasChildren();

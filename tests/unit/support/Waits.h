@@ -8,8 +8,8 @@
 
 namespace pmutil {
 
-// Longer than anything takes on a machine that works.
-constexpr double kLong = 60.0;
+// Longer than anything takes, on a busy machine and in a process that is stopped most of the time.
+constexpr double kLong = 300.0;
 
 // True as soon as the condition holds; false if it doesn't within kLong.
 template <typename Condition>
@@ -41,11 +41,26 @@ private:
     int fOld = 0;
 };
 
-// Makes the short wait no wait at all for as long as it lives. No thread of a launch may come to a
-// short wait of its own meanwhile.
-class NoShortWait : public DebugValueSetter {
+// Sets the short wait for as long as it lives. How long a test's machine takes must not matter: a
+// test that is about giving up has none, and every other one a long one.
+class ShortWait : public DebugValueSetter {
 public:
-    NoShortWait() : DebugValueSetter("ConsoleAppShortWaitSecondsMinusOne", -1) {}
+    explicit ShortWait(int seconds)
+        : DebugValueSetter("ConsoleAppShortWaitSecondsMinusOne", seconds - 1)
+    {}
+};
+
+// A short wait that nothing comes to the end of.
+class LongShortWait : public ShortWait {
+public:
+    LongShortWait() : ShortWait(600) {}
+};
+
+// The short wait is no wait at all. No thread of a launch may come to a short wait of its own
+// meanwhile, unless it is to run out.
+class NoShortWait : public ShortWait {
+public:
+    NoShortWait() : ShortWait(0) {}
 };
 
 } // namespace pmutil
