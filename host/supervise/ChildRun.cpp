@@ -111,11 +111,14 @@ private:
     {
         while (fEvidence.fStartFailure.empty() && !IsOver()) {
             const Clock::time_point before = fTimes.fNow();
-            const std::optional<Event> event = fQueue->Pop(GetPatience());
+            const milliseconds patience = GetPatience();
+            const std::optional<Event> event = fQueue->Pop(patience);
             if (fEnded)
-                fIdle += fTimes.fNow() - before;
+                fIdle += std::min<Seconds>(fTimes.fNow() - before, patience);
             if (event)
                 Take(*event);
+            if (fKilled)
+                fKillWait += std::min<Seconds>(fTimes.fNow() - before, fTimes.fTick);
             Tick();
         }
     }
@@ -125,7 +128,7 @@ private:
         if (fEnded && fOpenStreams == 0)
             return true;
         if (!fEnded)
-            return fKilled && fTimes.fNow() - fKillTime >= fTimes.fKillGrace;
+            return fKilled && fKillWait >= fTimes.fKillGrace;
         if (fTreeEnded)
             return fIdle >= fTimes.fLastStreamGrace + fTimes.fStreamGrace;
         if (fIdle >= fTimes.fStreamGrace) {
@@ -197,14 +200,15 @@ private:
             Kill(KillReason::kTimeout);
     }
 
-    // A failure of the launcher's own ends the launch, and pmutil has killed the child then. One of
-    // a pump costs its stream.
+    // A failure of the launcher's own ends the launch, and pmutil has killed the child then; but
+    // not one that comes after the child's end, which may be seen before that end is taken from the
+    // queue. A failure of a pump costs its stream.
     void LookForFailure()
     {
         try {
             fLaunch.ThrowIfFailurePending();
         } catch (const pmutil::consoleapp::Exception& exc) {
-            if (exc.GetTaskID() == pmutil::TaskID::kLauncher)
+            if (exc.GetTaskID() == pmutil::TaskID::kLauncher && !fLauncher->GetEnd())
                 NoteStartFailure(exc.what());
         }
     }
@@ -212,7 +216,6 @@ private:
     void Kill(KillReason reason)
     {
         fKilled = true;
-        fKillTime = fTimes.fNow();
         fEvidence.fKillReason = reason;
         try {
             fLaunch.Kill();
@@ -281,8 +284,10 @@ private:
 
     const Clock::time_point fStart = fTimes.fNow();
     Clock::time_point fLastTick = fStart;
-    Clock::time_point fKillTime;
-    Seconds fIdle{0}; // waited for output since the child's end
+    // If this process stands still in a pass, as when the system stops it, that time doesn't count:
+    // the threads that bring what is waited for stand still too.
+    Seconds fKillWait{0}; // since the kill
+    Seconds fIdle{0};     // waited for output since the child's end
     bool fKilled = false;
     bool fEnded = false;
     bool fTreeEnded = false;

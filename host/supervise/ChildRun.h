@@ -40,12 +40,12 @@ struct RunTimes {
     using Seconds = std::chrono::duration<double>;
 
     std::function<Clock::time_point()> fNow = &Clock::now; // of these times and of the timeout
-    std::chrono::milliseconds fTick{100};
-    Seconds fKillGrace{0.7};       // for a killed child to end
-    Seconds fStreamGrace{0.2};     // for the streams to end after the child
-    Seconds fLastStreamGrace{0.2}; // for the streams to end after the descendants
-    double fTreeSeconds = 0.2;     // for the descendants to end, by the system's clock
-    double fJoinSeconds = 0.3;     // for the launch to end after the child, by the system's clock
+    std::chrono::milliseconds fTick{100}; // a longer pause counts as one in the graces
+    Seconds fKillGrace{0.7};              // for a killed child to end
+    Seconds fStreamGrace{0.2};            // for the streams to end after the child
+    Seconds fLastStreamGrace{0.2};        // for the streams to end after the descendants
+    double fTreeSeconds = 0.2;            // for the descendants to end, by the system's clock
+    double fJoinSeconds = 0.3; // for the launch to end after the child, by the system's clock
 };
 
 // Launches the child with its standard input closed, waits for its end no longer than the timeout,

@@ -3,17 +3,23 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <boost/make_shared.hpp>
 #include <boost/thread/condition_variable.hpp>
+#include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
 #include <chrono>
+#include <functional>
+#include <optional>
 #include <stdexcept>
 #include <thread>
 #include <utility>
 
 #include "TestChild.h"
+#include "pmutil/PMLogging.h"
 #include "pmutil/Reader.h"
 #include "supervise/ChildCommand.h"
+#include "support/Waits.h"
 
 namespace assay_host {
 namespace {
@@ -24,6 +30,7 @@ using testing::IsEmpty;
 using testing::StartsWith;
 
 constexpr double kTimeout = 30;
+constexpr int kLongShortWait = 600;
 
 // Moves only by Advance, and by `step` seconds at each reading. For one thread.
 class TestClock {
@@ -47,38 +54,52 @@ private:
 // Long enough on a busy machine for all that ends.
 RunTimes GetLongTimes()
 {
-    constexpr double kLong = 120;
     RunTimes times;
-    times.fKillGrace = times.fLastStreamGrace = RunTimes::Seconds(kLong);
-    times.fTreeSeconds = times.fJoinSeconds = kLong;
+    times.fKillGrace = times.fLastStreamGrace = RunTimes::Seconds(pmutil::kLong);
+    times.fTreeSeconds = times.fJoinSeconds = pmutil::kLong;
     return times;
 }
 
 // Keeps what it is told.
 class Recorder : public RunObserver {
 public:
-    void OnStart() override { ++fStarts; }
+    void OnStart() override
+    {
+        ++fStarts;
+        if (fOnStart)
+            fOnStart();
+    }
     void OnLine(const ReportLine& line, double /*seconds*/) override
     {
         fLines.push_back(line.fText);
         std::this_thread::sleep_for(fDelay);
         if (fClock != nullptr)
             std::exchange(fClock, nullptr)->Advance(kTimeout);
+        if (fOnLine)
+            fOnLine();
     }
     void OnErrorLine(const std::string& line, double /*seconds*/) override
     {
         fErrorLines.push_back(line);
+        if (fOnErrorLine)
+            fOnErrorLine();
     }
     void OnTick(double /*seconds*/) override
     {
         if (++fTicks == fStopAtTick)
             fStop->Raise();
+        if (fOnTick)
+            fOnTick();
     }
 
     std::shared_ptr<StopRequest> fStop = std::make_shared<StopRequest>();
     int fStarts = 0;
     int fTicks = 0;
     int fStopAtTick = 0;
+    std::function<void()> fOnStart;
+    std::function<void()> fOnLine;
+    std::function<void()> fOnErrorLine;
+    std::function<void()> fOnTick;
     TestClock* fClock = nullptr; // passes the timeout with the first line
     std::chrono::milliseconds fDelay{0};
     std::vector<std::string> fLines;
@@ -97,6 +118,7 @@ void RunWith(Watched& run, const std::string& program, std::vector<std::string> 
     options.fProgram = program;
     options.fArgs = std::move(args);
     options.fTimeoutSeconds = timeout;
+    const pmutil::LongShortWait shortWait;
     run.fOutcome =
         RunChild(options, run.fRecorder, *run.fRecorder.fStop, MakeChildLauncher(), times);
 }
@@ -201,7 +223,7 @@ TEST(ChildRun, StopsWhenItIsToldTo)
     run.fRecorder.fStopAtTick = 3;
     RunWith(run, TEST_CHILD, {"sleep", "600000"}, 0, GetLongTimes());
     EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kInterrupted);
-    EXPECT_EQ(run.fRecorder.fTicks, 3);
+    EXPECT_GE(run.fRecorder.fTicks, 3);
     EXPECT_FALSE(run.fOutcome.fLeftBehind);
 }
 
@@ -262,13 +284,12 @@ TEST(ChildRun, LosesNothingToASlowObserver)
 {
     Watched run;
     run.fRecorder.fDelay = std::chrono::milliseconds(100);
-    ChildOptions options;
-    options.fProgram = TEST_CHILD;
+    std::vector<std::string> args;
     for (int line = 0; line < 10; ++line) {
-        options.fArgs.emplace_back("out");
-        options.fArgs.push_back("line" + std::to_string(line) + "=1");
+        args.emplace_back("out");
+        args.push_back("line" + std::to_string(line) + "=1");
     }
-    run.fOutcome = RunChild(options, run.fRecorder, *run.fRecorder.fStop);
+    RunWith(run, TEST_CHILD, args, 0, GetLongTimes());
     EXPECT_EQ(run.fRecorder.fLines.size(), 10U);
 }
 
@@ -292,78 +313,209 @@ TEST(ChildRun, WorksAgainAndAgain)
         EXPECT_EQ(RunTestChild(kWhole).fOutcome.fVerdict, Verdict::kComplete);
 }
 
-// A stream that never brings anything and never ends, as one that another process holds.
-class SilentReader : public pmutil::Reader {
+// Something that happens once, and that any thread may wait for.
+class Moment {
 public:
-    ~SilentReader() override = default;
-
-protected:
-    void BinioClose() override { fOpen = false; }
-    bool BinioIsOpen() const override { return fOpen; }
-    std::uint64_t BinioReadSome(void* /*bytes*/, std::uint64_t /*nbytes*/) override
+    void Come()
     {
-        std::this_thread::sleep_for(std::chrono::seconds(10));
-        return 0;
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fCame = true;
+        fCond.notify_all();
+    }
+    void Await()
+    {
+        boost::unique_lock<boost::mutex> lock(fMutex);
+        fCond.wait(lock, [this] { return fCame; });
     }
 
 private:
-    bool fOpen = true;
+    boost::mutex fMutex;
+    boost::condition_variable fCond;
+    bool fCame = false;
 };
 
-// Its child can't be killed, or leaves streams that can't be ended.
-class StubbornLauncher : public pmutil::Launcher {
+struct Moments {
+    Moment fWords; // the child says something on each stream
+    Moment fChildEnds;
+    Moment fStreamsEnd;
+};
+
+// Its child does nothing but at those moments.
+class ScriptedLauncher : public pmutil::Launcher {
 public:
-    explicit StubbornLauncher(bool ends) : fEnds(ends) {}
+    explicit ScriptedLauncher(boost::shared_ptr<Moments> moments) : fMoments(std::move(moments)) {}
 
     pmutil::LaunchResult Launch(const std::wstring& /*program*/,
                                 const std::deque<std::string>& /*args*/) override
     {
         pmutil::LaunchResult result;
-        result.fAppOutput[1] = boost::make_shared<SilentReader>();
-        result.fAppOutput[2] = boost::make_shared<SilentReader>();
+        result.fAppOutput[1] = boost::make_shared<Stream>(fMoments);
+        result.fAppOutput[2] = boost::make_shared<Stream>(fMoments);
         return result;
     }
     pmutil::WaitResult Wait(int* exitCode) override
     {
-        if (!fEnds)
-            std::this_thread::sleep_for(std::chrono::seconds(10));
+        fMoments->fChildEnds.Await();
+        if (fKilled)
+            return pmutil::kEndedByKill;
         *exitCode = 0;
         return pmutil::kEndedNormally;
     }
-    void Kill() override { throw std::runtime_error("no"); }
+    void Kill() override
+    {
+        if (!fOnKill)
+            throw std::runtime_error("no");
+        fKilled = true;
+        fOnKill();
+    }
+
+    std::function<void()> fOnKill; // or it can't be killed
 
 private:
-    const bool fEnds;
+    class Stream : public pmutil::Reader {
+    public:
+        explicit Stream(boost::shared_ptr<Moments> moments) : fMoments(std::move(moments)) {}
+        ~Stream() override = default;
+
+    protected:
+        void BinioClose() override { fOpen = false; }
+        bool BinioIsOpen() const override { return fOpen; }
+        std::uint64_t BinioReadSome(void* bytes, std::uint64_t /*nbytes*/) override
+        {
+            if (std::exchange(fSilent, false)) {
+                fMoments->fWords.Await();
+                static_cast<char*>(bytes)[0] = '\n';
+                return 1;
+            }
+            fMoments->fStreamsEnd.Await();
+            return 0;
+        }
+
+    private:
+        const boost::shared_ptr<Moments> fMoments;
+        bool fSilent = true;
+        bool fOpen = true;
+    };
+
+    const boost::shared_ptr<Moments> fMoments;
+    std::atomic<bool> fKilled{false};
 };
 
-Watched RunStubborn(bool ends)
+class ScriptedChild : public testing::Test {
+protected:
+    // What is given up ends with the test.
+    ~ScriptedChild() override { ComeAll(); }
+
+    void ComeAll()
+    {
+        fMoments->fWords.Come();
+        fMoments->fChildEnds.Come();
+        fMoments->fStreamsEnd.Come();
+    }
+
+    // The clock goes on by `step` seconds at each reading.
+    RunOutcome Run(double step, RunTimes times = {})
+    {
+        TestClock clock(step);
+        times.fNow = [&clock] { return clock.Read(); };
+        std::optional<pmutil::ShortWait> shortWait{std::in_place, kLongShortWait};
+        // The start takes what it takes; what is given up later isn't waited for.
+        fRecorder.fOnStart = [&] { shortWait.emplace(0); };
+        ChildOptions options;
+        options.fProgram = "scripted";
+        options.fTimeoutSeconds = 1;
+        return RunChild(options, fRecorder, *fRecorder.fStop, fLauncher, times);
+    }
+
+    const boost::shared_ptr<Moments> fMoments = boost::make_shared<Moments>();
+    const boost::shared_ptr<ScriptedLauncher> fLauncher =
+        boost::make_shared<ScriptedLauncher>(fMoments);
+    Recorder fRecorder;
+};
+
+constexpr double kSmallStep = 0.05; // less than each of the times that pass
+constexpr double kLeap = 10'000;    // more than any
+
+TEST_F(ScriptedChild, IsGivenUpIfItOutlivesItsKill)
 {
-    Watched run;
-    ChildOptions options;
-    options.fProgram = "stubborn";
-    options.fTimeoutSeconds = 1;
-    TestClock clock(0.05); // less than each of the times that pass
-    RunTimes times;
-    times.fNow = [&clock] { return clock.Read(); };
-    run.fOutcome = RunChild(options, run.fRecorder, *run.fRecorder.fStop,
-                            boost::make_shared<StubbornLauncher>(ends), times);
-    return run;
+    const RunOutcome outcome = Run(kSmallStep);
+    EXPECT_EQ(outcome.fVerdict, Verdict::kHung);
+    EXPECT_THAT(outcome.fReason, HasSubstr("which it did not"));
+    EXPECT_TRUE(outcome.fLeftBehind);
+    EXPECT_GE(outcome.fSeconds, 1 + RunTimes().fKillGrace.count());
 }
 
-TEST(ChildRun, GivesUpAChildThatOutlivesItsKill)
+TEST_F(ScriptedChild, IsGivenUpIfItsStreamsDoNotEnd)
 {
-    const Watched run = RunStubborn(false);
-    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kHung);
-    EXPECT_THAT(run.fOutcome.fReason, HasSubstr("which it did not"));
-    EXPECT_TRUE(run.fOutcome.fLeftBehind);
-    EXPECT_GE(run.fOutcome.fSeconds, 1 + RunTimes().fKillGrace.count());
+    fMoments->fChildEnds.Come();
+    const RunOutcome outcome = Run(kSmallStep);
+    EXPECT_EQ(outcome.fVerdict, Verdict::kFailedTests);
+    EXPECT_TRUE(outcome.fLeftBehind);
 }
 
-TEST(ChildRun, GivesUpStreamsThatDontEnd)
+// Comes when the launcher's thread gives a stream up.
+class StreamGivenUp : public pmutil::PMLogger {
+public:
+    StreamGivenUp() : PMLogger("stream given up") {}
+
+    void Write(const char* data, std::size_t size) override { fLine.append(data, size); }
+    void Flush() override
+    {
+        if (fLine.find("exc=Launcher: output task thread abandoned") != std::string::npos)
+            fMoment.Come();
+        fLine.clear();
+    }
+
+    Moment fMoment;
+
+private:
+    const pmutil::DebugValueSetter fLog{"ConsoleAppLog", 1};
+    std::string fLine;
+};
+
+// The supervision sees the failure before it takes the child's end from its queue.
+TEST_F(ScriptedChild, HasStartedThoughAStreamIsGivenUp)
 {
-    const Watched run = RunStubborn(true);
-    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kFailedTests);
-    EXPECT_TRUE(run.fOutcome.fLeftBehind);
+    StreamGivenUp givenUp;
+    fRecorder.fOnTick = [&] {
+        fMoments->fChildEnds.Come();
+        givenUp.fMoment.Await();
+    };
+    EXPECT_EQ(Run(kSmallStep).fVerdict, Verdict::kFailedTests);
+}
+
+// As when the system stops this process just then.
+TEST_F(ScriptedChild, HasItsGraceThoughTheClockLeapsAfterItsKill)
+{
+    bool killed = false;
+    fLauncher->fOnKill = [&] { killed = true; };
+    fRecorder.fOnTick = [&] {
+        if (killed)
+            ComeAll();
+    };
+    RunTimes times = GetLongTimes();
+    times.fStreamGrace = times.fKillGrace;
+    const RunOutcome outcome = Run(kLeap, times);
+    EXPECT_EQ(outcome.fVerdict, Verdict::kHung);
+    EXPECT_FALSE(outcome.fLeftBehind) << outcome.fReason;
+}
+
+TEST_F(ScriptedChild, HasItsStreamsReadThoughTheClockLeapsAfterItsEnd)
+{
+    fMoments->fChildEnds.Come();
+    int words = 0;
+    const auto count = [&] {
+        if (++words == 2)
+            fMoments->fStreamsEnd.Come();
+    };
+    fRecorder.fOnLine = count;
+    fRecorder.fOnErrorLine = count;
+    fRecorder.fOnTick = [this] { fMoments->fWords.Come(); };
+    RunTimes times = GetLongTimes();
+    times.fStreamGrace = times.fKillGrace;
+    const RunOutcome outcome = Run(kLeap, times);
+    EXPECT_EQ(words, 2);
+    EXPECT_FALSE(outcome.fLeftBehind);
 }
 
 } // namespace
