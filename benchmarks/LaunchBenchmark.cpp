@@ -65,19 +65,17 @@ bool Run(pmutil::ConsoleAppLauncher& launcher)
 
 void BareSpawn(benchmark::State& state)
 {
-    for (auto _ : state) {
+    for (auto _ : state)
         if (!Await(Spawn({BENCHMARK_CHILD}, -1)))
             state.SkipWithError("the child failed");
-    }
 }
 
 void LaunchAndWait(benchmark::State& state)
 {
     pmutil::ConsoleAppLauncher launcher = MakeLauncher(nullptr, {});
-    for (auto _ : state) {
+    for (auto _ : state)
         if (!Run(launcher))
             state.SkipWithError("the child failed");
-    }
 }
 
 void PumpBare(benchmark::State& state, int pipeBytes)
@@ -132,10 +130,9 @@ void PumpTask(benchmark::State& state)
 {
     const auto task = boost::make_shared<CountingTask>();
     pmutil::ConsoleAppLauncher launcher = MakeLauncher(task, {std::to_string(kFlood)});
-    for (auto _ : state) {
+    for (auto _ : state)
         if (!Run(launcher) || task->fTotal != kFlood)
             state.SkipWithError("the child failed");
-    }
 }
 
 // Memory that is there, page by page.
@@ -155,12 +152,11 @@ BENCHMARK(LaunchAndWait)->UseRealTime();
 int main(int argc, char** argv)
 {
     const std::unique_ptr<char[]> resident = Occupy(RESIDENT_BYTES);
-    if (RESIDENT_BYTES == 0) {
+    if (RESIDENT_BYTES == 0)
         for (const auto& [name, function] : {std::pair{"PumpBareReads", PumpBareReads},
                                              {"PumpBareReadsOfAWidePipe", PumpBareReadsOfAWidePipe},
                                              {"PumpTask", PumpTask}})
             benchmark::RegisterBenchmark(name, function)->UseRealTime();
-    }
     benchmark::Initialize(&argc, argv);
     benchmark::RunSpecifiedBenchmarks();
     return EXIT_SUCCESS;

@@ -192,10 +192,9 @@ private:
         }
         if (fTortureCommand->parsed()) {
             fTorture.fChild.fArgs = words.fChild;
-            for (const std::string& word : words.fChild) {
+            for (const std::string& word : words.fChild)
                 if (word.rfind("-crashAfter=", 0) == 0 || word.rfind("-throwAfter=", 0) == 0)
                     throw CLI::ValidationError(word, "torture sets this itself");
-            }
             if (fKind != "throw")
                 fTorture.fFailures.push_back(StepFailure::kCrash);
             if (fKind != "crash")

@@ -90,10 +90,9 @@ DeviceAnswers Collector::CollectDevice(const DeviceTag& tag, const Device* devic
         answers.fAnswers.push_back({known.fKey, &known, line, Missing::kNot, Unknown::kNot});
     }
     answers.fComplete = answers.fAnswers.back().fLine != nullptr;
-    for (std::size_t key = 0; key < answers.fAnswers.size(); ++key) {
+    for (std::size_t key = 0; key < answers.fAnswers.size(); ++key)
         if (!answers.fAnswers[key].fLine)
             answers.fAnswers[key].fMissing = JudgeMissing(answers, key);
-    }
     if (!device)
         return answers;
     for (const auto& [key, line] : device->fKeys) {
@@ -144,10 +143,9 @@ Missing Collector::JudgeMissingReportKey(const KnownKey& key) const
 
 void Collector::JudgeValues(std::vector<Answer>& answers, bool hasAdapter)
 {
-    for (Answer& answer : answers) {
+    for (Answer& answer : answers)
         if (answer.fLine)
             answer.fUnknown = JudgeUnknown(*answer.fLine, answer.fKnown, hasAdapter);
-    }
 }
 
 } // namespace

@@ -177,10 +177,9 @@ void Comparer::CompareAnswers(const std::string& prefix, const std::vector<Answe
         compare(answer.fKey, &answer, partner);
         partners.erase(answer.fKey);
     }
-    for (const Answer& answer : after) {
+    for (const Answer& answer : after)
         if (partners.count(answer.fKey) > 0)
             compare(answer.fKey, nullptr, &answer);
-    }
 }
 
 bool Comparer::IsSame(const Answer* before, const Answer* after) const
@@ -204,10 +203,9 @@ void Comparer::CompareRawLines(const Report& before, const Report& after)
 {
     std::map<std::string_view, std::ptrdiff_t> counts;
     const auto count = [&counts](const Report& report, std::ptrdiff_t weight) {
-        for (const ReportLine& line : report.GetLines()) {
+        for (const ReportLine& line : report.GetLines())
             if (line.fKind == LineKind::kRaw)
                 counts[line.fText] += weight;
-        }
     };
     count(before, -1);
     count(after, 1);

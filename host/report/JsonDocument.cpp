@@ -457,12 +457,11 @@ std::string EncodeBytes(const std::string& bytes)
     while (!rest.empty()) {
         const Character character = ReadCharacter(rest);
         const std::size_t size = std::max<std::size_t>(character.fSize, 1);
-        if (character.fSize > 0 && !IsByteCharacter(character.fCode)) {
+        if (character.fSize > 0 && !IsByteCharacter(character.fCode))
             text += rest.substr(0, size);
-        } else {
+        else
             for (const char byte : rest.substr(0, size))
                 AppendCharacter(text, kByteBase + static_cast<unsigned char>(byte));
-        }
         rest.remove_prefix(size);
     }
     return text;

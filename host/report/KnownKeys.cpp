@@ -210,10 +210,9 @@ const std::vector<const KnownKey*>& GetReportKeys()
 {
     static const std::vector<const KnownKey*> keys = [] {
         std::vector<const KnownKey*> found;
-        for (const KnownKey& key : GetKnownKeys()) {
+        for (const KnownKey& key : GetKnownKeys())
             if (!key.fKind)
                 found.push_back(&key);
-        }
         return found;
     }();
     return keys;

@@ -81,10 +81,9 @@ void SequenceReader::AddDeviceLine(const DeviceTag& tag, const ReportLine& line)
     const Table<KnownKey> keys = GetDeviceKeys(tag.fKind);
     device.fAnswered =
         std::max(device.fAnswered, static_cast<std::size_t>(known - keys.begin()) + 1);
-    for (const KnownKey& key : keys) {
+    for (const KnownKey& key : keys)
         if (line.fValue == "0" && key.fSilentWithout == known->fKey)
             device.fSilent.insert(GetRow(key));
-    }
     if (kind.Has(tag.fIndex))
         Advance({GetRow(*known), tag.fIndex, known->fTagLines.size()});
 }
@@ -162,10 +161,9 @@ std::size_t SequenceReader::GetSteps() const
         if (isReached && (!isCLCount || HasOpenCL()))
             ++steps;
     }
-    for (const auto& [which, kind] : fKinds) {
+    for (const auto& [which, kind] : fKinds)
         for (const auto& [index, device] : kind.fDevices)
             steps += CountSteps({which, index}, device);
-    }
     return steps;
 }
 

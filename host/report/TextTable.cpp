@@ -34,10 +34,9 @@ void TextTable::Add(std::string label, std::string value)
 void TextTable::Print(std::ostream& out, std::size_t width) const
 {
     std::size_t labels = 0;
-    for (const Row& row : fRows) {
+    for (const Row& row : fRows)
         if (!row.fValue.empty())
             labels = std::max(labels, CountColumns(row.fLabel));
-    }
     const std::size_t values = kIndent + labels + kGap;
     const std::size_t room = std::max(kMinValueWidth, width > values ? width - values : 0);
     for (const Row& row : fRows) {

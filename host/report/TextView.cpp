@@ -70,10 +70,9 @@ private:
     void AddMain()
     {
         std::multimap<int, const Answer*> rows;
-        for (const Answer& answer : fDevice.fAnswers) {
+        for (const Answer& answer : fDevice.fAnswers)
             if (answer.fKnown && answer.fKnown->fGroup == KeyGroup::kMain && !IsLost(answer))
                 rows.emplace(answer.fKnown->fRow, &answer);
-        }
         for (const auto& [row, answer] : rows)
             fTable.Add(GetLabel(*answer), GetValueText(*answer));
     }
@@ -81,10 +80,9 @@ private:
     template <typename Action>
     void ForEach(KeyGroup group, Action action)
     {
-        for (const Answer& answer : fDevice.fAnswers) {
+        for (const Answer& answer : fDevice.fAnswers)
             if (answer.fKnown && answer.fKnown->fGroup == group && answer.fLine)
                 action(answer);
-        }
     }
 
     void AddLimits()
@@ -196,10 +194,9 @@ void AddLines(TextTable& table, const std::string& label, const std::vector<std:
 std::vector<std::string> GetRawLines(const Report& report)
 {
     std::vector<std::string> texts;
-    for (const ReportLine& line : report.GetLines()) {
+    for (const ReportLine& line : report.GetLines())
         if (line.fKind == LineKind::kRaw && !line.fText.empty())
             texts.push_back(line.fText);
-    }
     return texts;
 }
 

@@ -149,10 +149,9 @@ private:
     Usable JudgeDevices() const
     {
         std::vector<Trial> trials;
-        for (const DeviceAnswers& device : fAnswers.fDevices) {
+        for (const DeviceAnswers& device : fAnswers.fDevices)
             if (device.fKind == fKind)
                 trials.push_back(MakeTrial(device));
-        }
         if (trials.empty())
             return JudgeNoDevice();
         const Trial* software = nullptr;

@@ -93,10 +93,9 @@ void WarnOfFailure(Warnings& warnings, const DeviceAnswers& device)
 void WarnOfDevice(Warnings& warnings, const DeviceAnswers& device)
 {
     WarnOfSoftware(warnings, device);
-    for (const Check& trial : kTrials) {
+    for (const Check& trial : kTrials)
         if (device.GetValue(trial.fKey) == "0")
             warnings.push_back({trial.fCode, device.fTag, trial.fText});
-    }
     WarnOfAdapter(warnings, device);
     WarnOfFailure(warnings, device);
     WarnOfMeasurement(warnings, device, "CLBandwidth", "the copy bandwidth");

@@ -76,10 +76,9 @@ std::vector<std::string> ListOwnTexts(const std::vector<std::string>& errors)
 std::vector<std::string> ListLines(const Report& report)
 {
     std::vector<std::string> result;
-    for (const ReportLine& line : report.GetLines()) {
+    for (const ReportLine& line : report.GetLines())
         if (line.fKind != LineKind::kComment)
             result.push_back(line.fText);
-    }
     return result;
 }
 
@@ -237,10 +236,9 @@ std::size_t StepRules::AddDevices(const Report& report, const SequenceReader& se
             operation.fTag = tags[device];
             operation.fTakesStep = known.fTakesStep;
             operation.fFails = index == failing[device];
-            if (!operation.fFails || known.fTagsFirst) {
+            if (!operation.fFails || known.fTagsFirst)
                 for (const std::string& line : known.fTagLines)
                     operation.fLines.push_back({line, Match::kExact});
-            }
             const std::string key = known.GetKey(tags[device]);
             if (!operation.fFails && (!known.MayBeSilent() || report.Find(key) != nullptr))
                 operation.fLines.push_back({Require(report, key).fText, known.fMatch});

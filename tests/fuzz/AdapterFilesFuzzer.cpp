@@ -16,9 +16,8 @@ namespace {
 
 void Require(bool holds)
 {
-    if (!holds) {
+    if (!holds)
         std::abort();
-    }
 }
 
 bool IsOneLine(const std::string& text)
@@ -49,18 +48,15 @@ void CheckMemory(const std::string& text)
 void CheckNumbers(const std::string& text)
 {
     std::uint64_t number = 0;
-    if (pmutil::ParseSystemNumber(text, number)) {
+    if (pmutil::ParseSystemNumber(text, number))
         Require(pmutil::ParseSystemNumber(std::to_string(number), number));
-    }
     std::uint64_t bytes = 0;
-    if (pmutil::ParseMemoryTotal(text, bytes)) {
+    if (pmutil::ParseMemoryTotal(text, bytes))
         Require(bytes % 1024 == 0);
-    }
     std::uint32_t width = 0;
     std::uint32_t height = 0;
-    if (pmutil::ParseModeSize(text, width, height)) {
+    if (pmutil::ParseModeSize(text, width, height))
         Require(width != 0 && height != 0 && width <= 65536 && height <= 65536);
-    }
 }
 
 } // namespace

@@ -16,9 +16,8 @@ namespace {
 
 void Require(bool holds)
 {
-    if (!holds) {
+    if (!holds)
         std::abort();
-    }
 }
 
 std::vector<std::string> ReadAll(const std::vector<std::string>& files)
@@ -75,9 +74,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     static Machine gMachines[] = {Machine("hybrid-laptop"),   Machine("intel-arc-asleep"),
                                   Machine("intel-two-tiles"), Machine("radeon"),
                                   Machine("nouveau"),         Machine("soc-beside-pci")};
-    if (size == 0) {
+    if (size == 0)
         return 0;
-    }
     Spread(gMachines[data[0] % std::size(gMachines)], data + 1, size - 1);
 
     pmutil::ContextsByDeviceString contexts;

@@ -89,14 +89,13 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     std::vector<std::string> out;
     std::vector<std::string> err;
     GPUAssayApp::Arguments leftovers;
-    for (auto argument = given.begin(); argument != help; ++argument) {
+    for (auto argument = given.begin(); argument != help; ++argument)
         if (!IsOption(*argument))
             leftovers.push_back(*argument);
         else if (StartsWith(*argument, "-stdout=") || StartsWith(*argument, "-comment="))
             out.push_back(Printed(*argument));
         else if (StartsWith(*argument, "-stderr="))
             err.push_back(Printed(*argument));
-    }
 
     QuietApp app;
     GPUAssayApp::Arguments arguments = given;

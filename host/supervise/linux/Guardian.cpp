@@ -49,13 +49,12 @@ public:
         siginfo_t end = {};
         while (end.si_pid == 0) {
             const int number = ::sigwaitinfo(&awaited, nullptr);
-            if (number == SIGCHLD) {
+            if (number == SIGCHLD)
                 end = TakeChange();
-            } else if (number == SIGTSTP) {
+            else if (number == SIGTSTP)
                 ::kill(fWorker, SIGSTOP); // Suspend follows once it has stopped
-            } else if (number > 0) {
+            else if (number > 0)
                 ::kill(fWorker, number); // not waited for yet, so no other process's number
-            }
         }
         fTree.EndAll(end.si_code == CLD_EXITED ? kRestSeconds : kLastSeconds);
         if (end.si_code != CLD_EXITED)

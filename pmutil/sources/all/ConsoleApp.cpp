@@ -445,10 +445,9 @@ unsigned ConsoleApp::GetTasksRunning()
     unsigned result = 0;
     if (fLauncherThread.HoldsThread())
         result |= 1U << static_cast<unsigned>(TaskID::kLauncher);
-    for (const OutputChannel channel : {OutputChannel::kStdout, OutputChannel::kStderr}) {
+    for (const OutputChannel channel : {OutputChannel::kStdout, OutputChannel::kStderr})
         if (fExecutionData->GetOutputTask(channel)->IsRunning(0.0))
             result |= 1U << static_cast<unsigned>(channel);
-    }
     PM_LOG(gConsoleAppLog, "GetTasksRunning result=" << result);
     return result;
 }

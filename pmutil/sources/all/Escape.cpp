@@ -139,10 +139,9 @@ unsigned UnescapeCharacter(const Char*& position, const Char* end, int size)
         }
         return code;
     }
-    for (const ShortForm& form : kShortForms) {
+    for (const ShortForm& form : kShortForms)
         if (second == CodeOf(form.letter))
             return form.code;
-    }
     return second;
 }
 

@@ -78,10 +78,9 @@ GPUImplWins::const_iterator FindImplByName(GPUImplWins::const_iterator first,
                                            GPUImplWins::const_iterator last,
                                            const std::string& name)
 {
-    for (; first != last; ++first) {
+    for (; first != last; ++first)
         if ((*first)->GetGLName() == name)
             break;
-    }
     return first;
 }
 

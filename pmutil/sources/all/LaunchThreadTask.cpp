@@ -81,10 +81,9 @@ void LaunchThreadTask::operator()()
         PM_LOG(gConsoleAppLog, "LaunchThreadTask outer exception=?");
     }
     EndStart();
-    for (const OutputChannel channel : kChannels) {
+    for (const OutputChannel channel : kChannels)
         if (const boost::shared_ptr<OutputTask> task = fLaunchParams.GetOutputTask(channel))
             task->Discard(fExecutionData.get());
-    }
 }
 
 // A start that is not over by now has failed: the output tasks may end.

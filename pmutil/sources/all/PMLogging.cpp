@@ -101,10 +101,9 @@ std::string PMLogger::GetBaseName(const char* path)
     if (path == nullptr)
         return {};
     const char* base = path;
-    for (const char* at = path; *at != '\0'; ++at) {
+    for (const char* at = path; *at != '\0'; ++at)
         if ((*at == '\\' || *at == '/') && at[1] != '\0')
             base = at + 1;
-    }
     return base;
 }
 

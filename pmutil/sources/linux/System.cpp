@@ -116,10 +116,9 @@ void PrepareSignals()
 // closed stream did.
 void OccupyClosedStreams()
 {
-    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) {
+    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream)
         if (fcntl(stream, F_GETFD) < 0 && errno == EBADF)
             open("/", O_PATH);
-    }
 }
 
 } // namespace

@@ -74,10 +74,9 @@ int CountPipes()
 void WriteState()
 {
     std::printf("descriptors");
-    for (int descriptor = 0; descriptor < kDescriptors; ++descriptor) {
+    for (int descriptor = 0; descriptor < kDescriptors; ++descriptor)
         if (::fcntl(descriptor, F_GETFD) != -1)
             std::printf(" %d", descriptor);
-    }
     std::printf("\n");
     sigset_t mask;
     ::sigprocmask(SIG_BLOCK, nullptr, &mask);

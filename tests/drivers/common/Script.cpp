@@ -29,23 +29,19 @@ constexpr int kBadScript = 125;
     text << "scripted driver: " << file << ":" << line << ": " << problem << "\n";
     const std::string whole = text.str();
     // Ends without the host's exit handlers: the run is void.
-    if (::write(STDERR_FILENO, whole.data(), whole.size()) < 0) {
+    if (::write(STDERR_FILENO, whole.data(), whole.size()) < 0)
         std::_Exit(kBadScript);
-    }
     std::_Exit(kBadScript);
 }
 
 int HexDigit(char c)
 {
-    if (c >= '0' && c <= '9') {
+    if (c >= '0' && c <= '9')
         return c - '0';
-    }
-    if (c >= 'a' && c <= 'f') {
+    if (c >= 'a' && c <= 'f')
         return c - 'a' + 10;
-    }
-    if (c >= 'A' && c <= 'F') {
+    if (c >= 'A' && c <= 'F')
         return c - 'A' + 10;
-    }
     return -1;
 }
 
@@ -71,9 +67,8 @@ std::string ReadQuoted(const std::string& text, std::size_t& at, const std::stri
             case 'x': {
                 const int high = at < text.size() ? HexDigit(text[at]) : -1;
                 const int low = at + 1 < text.size() ? HexDigit(text[at + 1]) : -1;
-                if (high < 0 || low < 0) {
+                if (high < 0 || low < 0)
                     Refuse(file, line, "\\x needs two hexadecimal digits");
-                }
                 c = static_cast<char>(static_cast<unsigned char>(high * 16 + low));
                 at += 2;
                 break;
@@ -84,9 +79,8 @@ std::string ReadQuoted(const std::string& text, std::size_t& at, const std::stri
         }
         result += c;
     }
-    if (at == text.size()) {
+    if (at == text.size())
         Refuse(file, line, "a text lacks its closing quote");
-    }
     ++at;
     return result;
 }
@@ -118,9 +112,8 @@ bool WriteAll(int file, const std::string& text)
     std::size_t done = 0;
     while (done < text.size()) {
         const ssize_t written = ::write(file, text.data() + done, text.size() - done);
-        if (written < 0 && errno != EINTR) {
+        if (written < 0 && errno != EINTR)
             return false;
-        }
         done += written > 0 ? static_cast<std::size_t>(written) : 0;
     }
     return true;
@@ -134,9 +127,8 @@ void Flood(int file, const std::string& line, std::int64_t lines)
     for (std::int64_t i = 0; i < lines; ++i) {
         chunk += line;
         if (chunk.size() >= kChunk || i + 1 == lines) {
-            if (!WriteAll(file, chunk)) {
+            if (!WriteAll(file, chunk))
                 return;
-            }
             chunk.clear();
         }
     }
@@ -147,28 +139,24 @@ void LeaveGrandchild()
 {
     if (::fork() == 0) {
         ::setsid();
-        for (;;) {
+        for (;;)
             ::pause();
-        }
     }
 }
 
 std::optional<std::int64_t> ToNumber(const std::string& text, const Line::Names& names)
 {
     if (names) {
-        if (const auto known = names(text)) {
+        if (const auto known = names(text))
             return known;
-        }
     }
-    if (text.empty()) {
+    if (text.empty())
         return {};
-    }
     char* end = nullptr;
     errno = 0;
     const long long value = std::strtoll(text.c_str(), &end, 0);
-    if (errno != 0 || *end != '\0') {
+    if (errno != 0 || *end != '\0')
         return {};
-    }
     return value;
 }
 
@@ -176,17 +164,15 @@ std::optional<std::int64_t> ToNumber(const std::string& text, const Line::Names&
 
 const Word& Line::Take(const char* what)
 {
-    if (AtEnd()) {
+    if (AtEnd())
         Fail(std::string("lacks ") + what);
-    }
     return fWords[fNext++];
 }
 
 bool Line::TakeIf(const char* bare)
 {
-    if (AtEnd() || fWords[fNext].quoted || fWords[fNext].text != bare) {
+    if (AtEnd() || fWords[fNext].quoted || fWords[fNext].text != bare)
         return false;
-    }
     ++fNext;
     return true;
 }
@@ -195,30 +181,25 @@ std::int64_t Line::TakeNumber(const char* what, const Names& names)
 {
     const Word& word = Take(what);
     const auto value = ToNumber(word.text, names);
-    if (!value || word.quoted) {
+    if (!value || word.quoted)
         Fail("\"" + word.text + "\" is no number or known name; expected " + what);
-    }
     return *value;
 }
 
 std::optional<std::string> Line::TakeText(const char* what)
 {
-    if (TakeIf("null")) {
+    if (TakeIf("null"))
         return {};
-    }
     std::string result;
     do {
         std::int64_t count = 1;
-        if (TakeIf("repeat")) {
+        if (TakeIf("repeat"))
             count = TakeNumber("a count behind repeat");
-        }
         const Word& word = Take(what);
-        if (!word.quoted) {
+        if (!word.quoted)
             Fail(std::string("expected ") + what + " in quotes, or null");
-        }
-        for (std::int64_t i = 0; i < count; ++i) {
+        for (std::int64_t i = 0; i < count; ++i)
             result += word.text;
-        }
     } while (TakeIf("+"));
     return result;
 }
@@ -231,25 +212,22 @@ void Line::Fail(const std::string& problem) const
 std::vector<Line> ReadScript(const std::string& path)
 {
     std::ifstream in(path, std::ios::binary);
-    if (!in) {
+    if (!in)
         Refuse(path, 0, "can't be read");
-    }
     std::vector<Line> lines;
     std::string text;
     for (int number = 1; std::getline(in, text); ++number) {
         std::vector<Word> words = SplitLine(text, path, number);
-        if (!words.empty()) {
+        if (!words.empty())
             lines.emplace_back(path, number, std::move(words));
-        }
     }
     return lines;
 }
 
 std::string Quoted(const char* text, std::optional<std::size_t> size)
 {
-    if (text == nullptr) {
+    if (text == nullptr)
         return "null";
-    }
     static const char kDigits[] = "0123456789ABCDEF";
     std::string result = "\"";
     const std::size_t length = size ? *size : std::strlen(text);
@@ -305,14 +283,11 @@ struct Monitor::Rule {
     bool Matches(const char* call, int callDevice, const std::vector<Argument>& arguments) const
     {
         if ((!name.empty() && name != call) || (device && *device != callDevice) ||
-            values.size() > arguments.size()) {
+            values.size() > arguments.size())
             return false;
-        }
-        for (std::size_t i = 0; i < values.size(); ++i) {
-            if (values[i] && values[i] != arguments[i].number) {
+        for (std::size_t i = 0; i < values.size(); ++i)
+            if (values[i] && values[i] != arguments[i].number)
                 return false;
-            }
-        }
         return true;
     }
 };
@@ -328,17 +303,15 @@ Monitor::Monitor() : fState(std::make_unique<State>()) {}
 
 Monitor::~Monitor()
 {
-    if (fState->record >= 0) {
+    if (fState->record >= 0)
         ::close(fState->record);
-    }
 }
 
 void Monitor::RecordTo(const std::string& path)
 {
     const int opened = ::open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0666);
-    if (opened < 0) {
+    if (opened < 0)
         Refuse(path, 0, "can't be opened as a record");
-    }
     fState->record = opened;
 }
 
@@ -354,28 +327,24 @@ void Monitor::AddRule(Line& line, const Line::Names& names)
     }
     const std::size_t bracket = word.find('(');
     rule.name = word.substr(0, bracket);
-    if (rule.name == "any") {
+    if (rule.name == "any")
         rule.name.clear();
-    }
     if (bracket != std::string::npos) {
-        if (word.back() != ')') {
+        if (word.back() != ')')
             line.Fail("the arguments of \"" + word + "\" lack their closing bracket");
-        }
         std::istringstream list(word.substr(bracket + 1, word.size() - bracket - 2));
         for (std::string value; std::getline(list, value, ',');) {
             std::optional<std::int64_t> number;
             if (value != "*") {
                 number = ToNumber(value, names);
-                if (!number) {
+                if (!number)
                     line.Fail("\"" + value + "\" is no number or known name");
-                }
             }
             rule.values.push_back(number);
         }
     }
-    if (line.TakeIf("on")) {
+    if (line.TakeIf("on"))
         rule.device = static_cast<int>(line.TakeNumber("a device's number"));
-    }
 
     static const std::map<std::string, Rule::Kind> kPlain = {
         {"crash", Rule::Kind::Crash},
@@ -417,9 +386,8 @@ void Monitor::AddRule(Line& line, const Line::Names& names)
     } else {
         line.Fail("unknown action \"" + action + "\"");
     }
-    if (!line.AtEnd()) {
+    if (!line.AtEnd())
         line.Fail("words are left behind the action");
-    }
     rule.file = line.File();
     rule.line = line.Number();
     fState->rules.push_back(std::make_shared<Rule>(std::move(rule)));
@@ -435,28 +403,24 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
         if (fState->record >= 0) {
             std::ostringstream line;
             line << fState->calls << ' ';
-            if (device < 0) {
+            if (device < 0)
                 line << '-';
-            } else {
+            else
                 line << device;
-            }
             line << ' ' << name;
-            for (const Argument& argument : arguments) {
+            for (const Argument& argument : arguments)
                 line << ' ' << argument.text;
-            }
             line << '\n';
             const std::string text = line.str();
             // One write a call, before its effect: a crash leaves this call last.
-            if (::write(fState->record, text.data(), text.size()) < 0) {
+            if (::write(fState->record, text.data(), text.size()) < 0)
                 Refuse("record", 0, std::strerror(errno));
-            }
         }
         for (const std::shared_ptr<Rule>& rule : fState->rules) {
             if (rule->Matches(name, device, arguments)) {
                 ++rule->matched;
-                if (rule->matched >= rule->first && rule->matched <= rule->last) {
+                if (rule->matched >= rule->first && rule->matched <= rule->last)
                     due.push_back(rule);
-                }
             }
         }
     }
@@ -474,9 +438,8 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
         case Rule::Kind::Abort:
             std::abort();
         case Rule::Kind::Hang:
-            for (;;) {
+            for (;;)
                 ::pause();
-            }
         case Rule::Kind::Exit:
             std::exit(static_cast<int>(rule.number));
         case Rule::Kind::QuickExit:
@@ -507,15 +470,13 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
             effect.returns = rule.number;
             break;
         case Rule::Kind::Claim:
-            if (gives != Gives::Number && gives != Gives::TextAndSize) {
+            if (gives != Gives::Number && gives != Gives::TextAndSize)
                 Refuse(rule.file, rule.line, std::string(name) + " gives no number");
-            }
             effect.claim = rule.number;
             break;
         case Rule::Kind::Text:
-            if (gives != Gives::Text && gives != Gives::TextAndSize) {
+            if (gives != Gives::Text && gives != Gives::TextAndSize)
                 Refuse(rule.file, rule.line, std::string(name) + " gives no text");
-            }
             effect.text = &rule.text;
             break;
         }

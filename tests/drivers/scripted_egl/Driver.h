@@ -65,9 +65,8 @@ inline Argument Enum(std::uint32_t value)
 {
     static const char kDigits[] = "0123456789ABCDEF";
     std::string digits;
-    for (std::uint32_t rest = value; digits.size() < 4 || rest != 0; rest >>= 4U) {
+    for (std::uint32_t rest = value; digits.size() < 4 || rest != 0; rest >>= 4U)
         digits.insert(digits.begin(), kDigits[rest & 0xFU]);
-    }
     return {"0x" + digits, value};
 }
 inline Argument Number(std::int64_t value)

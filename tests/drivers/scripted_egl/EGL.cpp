@@ -43,11 +43,9 @@ Objects& TheObjects()
 int DeviceOf(const void* handle)
 {
     const std::vector<Device>& devices = TheModel().devices;
-    for (std::size_t i = 0; i < devices.size(); ++i) {
-        if (&devices[i] == handle) {
+    for (std::size_t i = 0; i < devices.size(); ++i)
+        if (&devices[i] == handle)
             return static_cast<int>(i);
-        }
-    }
     return -1;
 }
 
@@ -107,9 +105,8 @@ Argument SurfaceArgument(EGLSurface handle)
 template <typename T>
 Argument AttributesArgument(const T* attributes)
 {
-    if (attributes == nullptr) {
+    if (attributes == nullptr)
         return {"null", {}};
-    }
     std::string text = "[";
     for (; *attributes != static_cast<T>(EGL_NONE); attributes += 2) {
         text += (text.size() == 1 ? "" : " ") +
@@ -127,16 +124,13 @@ struct Call {
          Gives gives = Gives::Neither)
         : effect(TheModel().monitor.Enter(name, device, arguments, gives))
     {
-        if (effect.claim) {
+        if (effect.claim)
             effect.returns = effect.claim;
-        }
         // The error stays as it is while it is asked for.
-        if (std::strcmp(name, "eglGetError") != 0) {
+        if (std::strcmp(name, "eglGetError") != 0)
             tError = EGL_SUCCESS;
-        }
-        if (effect.error) {
+        if (effect.error)
             tError = static_cast<EGLint>(*effect.error);
-        }
     }
     bool Over() const { return effect.error || effect.returns || effect.text != nullptr; }
     // The text of a call that is over.
@@ -177,14 +171,12 @@ bool OffersClient(const char* extension)
 
 EGLDisplay PlatformDisplay(const Call& call, EGLenum platform, void* native)
 {
-    if (call.Over()) {
+    if (call.Over())
         return nullptr;
-    }
     if (platform == EGL_PLATFORM_DEVICE_EXT && OffersClient("EGL_EXT_platform_device")) {
         const int device = DeviceOf(native);
-        if (device >= 0) {
+        if (device >= 0)
             return TheObjects().displays[static_cast<std::size_t>(device)].get();
-        }
     } else if (platform == EGL_PLATFORM_SURFACELESS_MESA &&
                OffersClient("EGL_MESA_platform_surfaceless")) {
         return DefaultDisplay();
@@ -218,21 +210,18 @@ EGLBoolean QueryDevices(EGLint size, EGLDeviceEXT* devices, EGLint* count)
     const Call call("eglQueryDevicesEXT", -1, {Number(size)}, Gives::Number);
     if (call.Over()) {
         // `return N` claims N devices.
-        if (call.effect.returns && count != nullptr) {
+        if (call.effect.returns && count != nullptr)
             *count = static_cast<EGLint>(*call.effect.returns);
-        }
         return call.effect.error ? EGL_FALSE : EGL_TRUE;
     }
-    if (count == nullptr || (devices != nullptr && size <= 0)) {
+    if (count == nullptr || (devices != nullptr && size <= 0))
         return Fail(EGL_BAD_PARAMETER);
-    }
     std::vector<Device>& all = TheModel().devices;
     *count = static_cast<EGLint>(all.size());
     if (devices != nullptr) {
         *count = std::min(*count, size);
-        for (EGLint i = 0; i < *count; ++i) {
+        for (EGLint i = 0; i < *count; ++i)
             devices[i] = &all[static_cast<std::size_t>(i)];
-        }
     }
     return EGL_TRUE;
 }
@@ -242,9 +231,8 @@ const char* QueryDeviceString(EGLDeviceEXT handle, EGLint name)
     const int device = DeviceOf(handle);
     const Call call("eglQueryDeviceStringEXT", device,
                     {DeviceArgument(handle), Enum(static_cast<std::uint32_t>(name))}, Gives::Text);
-    if (call.Over()) {
+    if (call.Over())
         return call.Text();
-    }
     if (device < 0) {
         Fail(EGL_BAD_DEVICE_EXT);
         return nullptr;
@@ -264,16 +252,13 @@ EGLBoolean QueryDisplayAttribute(EGLDisplay handle, EGLint attribute, EGLAttrib*
 {
     const Call call("eglQueryDisplayAttribEXT", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), Enum(static_cast<std::uint32_t>(attribute))});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
     const DisplayObject* display = Ready(handle);
-    if (display == nullptr) {
+    if (display == nullptr)
         return EGL_FALSE;
-    }
-    if (attribute != EGL_DEVICE_EXT) {
+    if (attribute != EGL_DEVICE_EXT)
         return Fail(EGL_BAD_ATTRIBUTE);
-    }
     // The handle as EGL hands it out, in an integer.
     *value =
         reinterpret_cast<EGLAttrib>(&TheModel().devices[static_cast<std::size_t>(display->device)]);
@@ -312,23 +297,19 @@ EGLAPI const char* EGLAPIENTRY eglQueryString(EGLDisplay handle, EGLint name)
 {
     const Call call("eglQueryString", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), Enum(static_cast<std::uint32_t>(name))}, Gives::Text);
-    if (call.Over()) {
+    if (call.Over())
         return call.Text();
-    }
     if (handle == EGL_NO_DISPLAY) {
-        if (name == EGL_EXTENSIONS && TheModel().clientExtensions) {
+        if (name == EGL_EXTENSIONS && TheModel().clientExtensions)
             return TheModel().clientExtensions->c_str();
-        }
-        if (name == EGL_VERSION) {
+        if (name == EGL_VERSION)
             return "1.5 Scripted";
-        }
         Fail(EGL_BAD_DISPLAY);
         return nullptr;
     }
     const DisplayObject* display = Ready(handle);
-    if (display == nullptr) {
+    if (display == nullptr)
         return nullptr;
-    }
     return TextOf(TheModel().devices[static_cast<std::size_t>(display->device)].displayTexts, name,
                   EGL_BAD_PARAMETER);
 }
@@ -350,33 +331,27 @@ EGLAPI EGLDisplay EGLAPIENTRY eglGetPlatformDisplay(EGLenum platform, void* nati
 EGLAPI EGLBoolean EGLAPIENTRY eglInitialize(EGLDisplay handle, EGLint* major, EGLint* minor)
 {
     const Call call("eglInitialize", DeviceOfDisplay(handle), {DisplayArgument(handle)});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
     DisplayObject* display = DisplayOf(handle);
-    if (display == nullptr) {
+    if (display == nullptr)
         return Fail(EGL_BAD_DISPLAY);
-    }
     display->initialized = true;
-    if (major != nullptr) {
+    if (major != nullptr)
         *major = TheModel().eglMajor;
-    }
-    if (minor != nullptr) {
+    if (minor != nullptr)
         *minor = TheModel().eglMinor;
-    }
     return EGL_TRUE;
 }
 
 EGLAPI EGLBoolean EGLAPIENTRY eglTerminate(EGLDisplay handle)
 {
     const Call call("eglTerminate", DeviceOfDisplay(handle), {DisplayArgument(handle)});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
     DisplayObject* display = DisplayOf(handle);
-    if (display == nullptr) {
+    if (display == nullptr)
         return Fail(EGL_BAD_DISPLAY);
-    }
     display->initialized = false;
     return EGL_TRUE;
 }
@@ -384,12 +359,10 @@ EGLAPI EGLBoolean EGLAPIENTRY eglTerminate(EGLDisplay handle)
 EGLAPI EGLBoolean EGLAPIENTRY eglBindAPI(EGLenum api)
 {
     const Call call("eglBindAPI", -1, {Enum(api)});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
-    if (api != EGL_OPENGL_API && api != EGL_OPENGL_ES_API) {
+    if (api != EGL_OPENGL_API && api != EGL_OPENGL_ES_API)
         return Fail(EGL_BAD_PARAMETER);
-    }
     tAPI = api;
     return EGL_TRUE;
 }
@@ -405,16 +378,13 @@ EGLAPI EGLBoolean EGLAPIENTRY eglGetConfigs(EGLDisplay handle, EGLConfig* config
 {
     const Call call("eglGetConfigs", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), Number(size)});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
-    if (Ready(handle) == nullptr) {
+    if (Ready(handle) == nullptr)
         return EGL_FALSE;
-    }
     *count = 1;
-    if (configs != nullptr && size > 0) {
+    if (configs != nullptr && size > 0)
         configs[0] = &TheObjects().config;
-    }
     return EGL_TRUE;
 }
 
@@ -426,18 +396,15 @@ EGLAPI EGLBoolean EGLAPIENTRY eglChooseConfig(EGLDisplay handle, const EGLint* a
                     Gives::Number);
     if (call.Over()) {
         // `return N` claims N configurations and gives none.
-        if (call.effect.returns && count != nullptr) {
+        if (call.effect.returns && count != nullptr)
             *count = static_cast<EGLint>(*call.effect.returns);
-        }
         return call.effect.error ? EGL_FALSE : EGL_TRUE;
     }
-    if (Ready(handle) == nullptr) {
+    if (Ready(handle) == nullptr)
         return EGL_FALSE;
-    }
     *count = 1;
-    if (configs != nullptr && size > 0) {
+    if (configs != nullptr && size > 0)
         configs[0] = &TheObjects().config;
-    }
     return EGL_TRUE;
 }
 
@@ -446,12 +413,10 @@ EGLAPI EGLBoolean EGLAPIENTRY eglGetConfigAttrib(EGLDisplay handle, EGLConfig /*
 {
     const Call call("eglGetConfigAttrib", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), Enum(static_cast<std::uint32_t>(attribute))});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
-    if (Ready(handle) == nullptr) {
+    if (Ready(handle) == nullptr)
         return EGL_FALSE;
-    }
     static const std::map<EGLint, EGLint> kAttributes = {
         {EGL_RED_SIZE, 8},
         {EGL_GREEN_SIZE, 8},
@@ -474,13 +439,11 @@ EGLAPI EGLContext EGLAPIENTRY eglCreateContext(EGLDisplay handle, EGLConfig conf
                      {config == nullptr ? "none" : "config", {}},
                      ContextArgument(share),
                      AttributesArgument(attributes)});
-    if (call.Over()) {
+    if (call.Over())
         return EGL_NO_CONTEXT;
-    }
     const DisplayObject* display = Ready(handle);
-    if (display == nullptr) {
+    if (display == nullptr)
         return EGL_NO_CONTEXT;
-    }
     if (config == nullptr && !OffersDisplay(*display, "EGL_KHR_no_config_context")) {
         Fail(EGL_BAD_CONFIG);
         return EGL_NO_CONTEXT;
@@ -502,13 +465,11 @@ EGLAPI EGLBoolean EGLAPIENTRY eglDestroyContext(EGLDisplay handle, EGLContext co
 {
     const Call call("eglDestroyContext", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), ContextArgument(context)});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
     const ContextObject* object = ContextOf(context);
-    if (object == nullptr) {
+    if (object == nullptr)
         return Fail(EGL_BAD_CONTEXT);
-    }
     Objects& objects = TheObjects();
     const std::lock_guard<std::mutex> lock(objects.mutex);
     objects.deadContexts.push_back(object);
@@ -521,9 +482,8 @@ EGLAPI EGLSurface EGLAPIENTRY eglCreatePbufferSurface(EGLDisplay handle, EGLConf
     const Call call("eglCreatePbufferSurface", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), AttributesArgument(attributes)});
     const DisplayObject* display = call.Over() ? nullptr : Ready(handle);
-    if (display == nullptr) {
+    if (display == nullptr)
         return EGL_NO_SURFACE;
-    }
     Objects& objects = TheObjects();
     const std::lock_guard<std::mutex> lock(objects.mutex);
     objects.surfaces.push_back(std::make_unique<SurfaceObject>());
@@ -536,9 +496,8 @@ EGLAPI EGLBoolean EGLAPIENTRY eglDestroySurface(EGLDisplay handle, EGLSurface su
 {
     const Call call("eglDestroySurface", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), SurfaceArgument(surface)});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
     return Find(TheObjects().surfaces, surface) == nullptr ? Fail(EGL_BAD_SURFACE) : EGL_TRUE;
 }
 
@@ -548,13 +507,11 @@ EGLAPI EGLBoolean EGLAPIENTRY eglMakeCurrent(EGLDisplay handle, EGLSurface draw,
     const Call call("eglMakeCurrent", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), SurfaceArgument(draw), SurfaceArgument(read),
                      ContextArgument(context)});
-    if (call.Over()) {
+    if (call.Over())
         return call.Answer();
-    }
     const DisplayObject* display = Ready(handle);
-    if (display == nullptr) {
+    if (display == nullptr)
         return EGL_FALSE;
-    }
     if (context == EGL_NO_CONTEXT) {
         tContext = nullptr;
         tDisplay = nullptr;
@@ -562,13 +519,11 @@ EGLAPI EGLBoolean EGLAPIENTRY eglMakeCurrent(EGLDisplay handle, EGLSurface draw,
         return EGL_TRUE;
     }
     ContextObject* object = ContextOf(context);
-    if (object == nullptr) {
+    if (object == nullptr)
         return Fail(EGL_BAD_CONTEXT);
-    }
     if (object->device != display->device ||
-        (draw == EGL_NO_SURFACE && !OffersDisplay(*display, "EGL_KHR_surfaceless_context"))) {
+        (draw == EGL_NO_SURFACE && !OffersDisplay(*display, "EGL_KHR_surfaceless_context")))
         return Fail(EGL_BAD_MATCH);
-    }
     tContext = object;
     tDisplay = handle;
     tSurface = draw;
@@ -608,9 +563,8 @@ EGLAPI __eglMustCastToProperFunctionPointerType EGLAPIENTRY eglGetProcAddress(co
 {
     const Call call("eglGetProcAddress", tContext == nullptr ? -1 : tContext->device, {Text(name)});
     const std::vector<std::string>& absent = TheModel().absent;
-    if (call.Over() || std::find(absent.begin(), absent.end(), name) != absent.end()) {
+    if (call.Over() || std::find(absent.begin(), absent.end(), name) != absent.end())
         return nullptr;
-    }
     static const std::map<std::string, Entry> kEntries = {
         {"eglQueryDevicesEXT", reinterpret_cast<Entry>(&QueryDevices)},
         {"eglQueryDeviceStringEXT", reinterpret_cast<Entry>(&QueryDeviceString)},

@@ -28,12 +28,10 @@ struct Call {
         : effect(TheModel().monitor.Enter(name, context == nullptr ? -1 : context->device,
                                           arguments, gives))
     {
-        if (effect.claim) {
+        if (effect.claim)
             effect.returns = effect.claim;
-        }
-        if (effect.error) {
+        if (effect.error)
             Error(static_cast<GLenum>(*effect.error));
-        }
     }
     bool Over() const
     {
@@ -50,9 +48,8 @@ struct Call {
     Device& Model() const { return DeviceOfContext(*context); }
     void Error(GLenum error) const
     {
-        if (context != nullptr && error != GL_NO_ERROR) {
+        if (context != nullptr && error != GL_NO_ERROR)
             context->gl.errors.push_back(error);
-        }
     }
 };
 
@@ -62,9 +59,8 @@ std::vector<std::string> Extensions(const Device& device)
     const auto list = device.glTexts.find(GL_EXTENSIONS);
     if (list != device.glTexts.end()) {
         std::istringstream words(list->second.value_or(""));
-        for (std::string each; words >> each;) {
+        for (std::string each; words >> each;)
             names.push_back(each);
-        }
     }
     return names;
 }
@@ -77,9 +73,8 @@ const GLubyte* AsBytes(const char* text)
 const GLubyte* GetString(GLenum name)
 {
     const Call call("glGetString", {Enum(name)}, Gives::Text);
-    if (call.Over()) {
+    if (call.Over())
         return call.Text();
-    }
     const Texts& texts = call.Model().glTexts;
     const auto found = texts.find(name);
     if (found == texts.end()) {
@@ -92,9 +87,8 @@ const GLubyte* GetString(GLenum name)
 const GLubyte* GetStringi(GLenum name, GLuint index)
 {
     const Call call("glGetStringi", {Enum(name), Number(index)}, Gives::Text);
-    if (call.Over()) {
+    if (call.Over())
         return call.Text();
-    }
     if (name != GL_EXTENSIONS) {
         call.Error(GL_INVALID_ENUM);
         return nullptr;
@@ -102,9 +96,8 @@ const GLubyte* GetStringi(GLenum name, GLuint index)
     // Kept for the life of the process, as the caller may expect.
     static auto* const kNames = new std::map<const Device*, std::vector<std::string>>;
     std::vector<std::string>& names = (*kNames)[&call.Model()];
-    if (names.empty()) {
+    if (names.empty())
         names = Extensions(call.Model());
-    }
     if (index >= names.size()) {
         call.Error(GL_INVALID_VALUE);
         return nullptr;
@@ -115,12 +108,10 @@ const GLubyte* GetStringi(GLenum name, GLuint index)
 GLenum GetError()
 {
     const Call call("glGetError", {}, Gives::Number);
-    if (call.effect.returns) {
+    if (call.effect.returns)
         return static_cast<GLenum>(*call.effect.returns);
-    }
-    if (call.context == nullptr || call.GL().errors.empty()) {
+    if (call.context == nullptr || call.GL().errors.empty())
         return GL_NO_ERROR;
-    }
     const GLenum error = call.GL().errors.front();
     call.GL().errors.pop_front();
     return error;
@@ -133,9 +124,8 @@ std::pair<GLint, GLint> Version(const Device& device)
     int minor = 0;
     const auto text = device.glTexts.find(GL_VERSION);
     if (text != device.glTexts.end() && text->second &&
-        std::sscanf(text->second->c_str(), "%d.%d", &major, &minor) != 2) {
+        std::sscanf(text->second->c_str(), "%d.%d", &major, &minor) != 2)
         return {0, 0};
-    }
     return {major, minor};
 }
 
@@ -143,33 +133,30 @@ void GetIntegerv(GLenum name, GLint* result)
 {
     const Call call("glGetIntegerv", {Enum(name)}, Gives::Number);
     if (call.Over()) {
-        if (call.effect.returns) {
+        if (call.effect.returns)
             *result = static_cast<GLint>(call.Answer());
-        }
         return;
     }
     const Device& device = call.Model();
     const auto found = device.integers.find(name);
-    if (found != device.integers.end()) {
+    if (found != device.integers.end())
         std::copy(found->second.begin(), found->second.end(), result);
-    } else if (Version(device).first >= 3 && name == GL_MAJOR_VERSION) {
+    else if (Version(device).first >= 3 && name == GL_MAJOR_VERSION)
         *result = Version(device).first;
-    } else if (Version(device).first >= 3 && name == GL_MINOR_VERSION) {
+    else if (Version(device).first >= 3 && name == GL_MINOR_VERSION)
         *result = Version(device).second;
-    } else if (Version(device).first >= 3 && name == GL_NUM_EXTENSIONS) {
+    else if (Version(device).first >= 3 && name == GL_NUM_EXTENSIONS)
         *result = static_cast<GLint>(Extensions(device).size());
-    } else {
+    else
         call.Error(GL_INVALID_ENUM);
-    }
 }
 
 void GetProgramivARB(GLenum target, GLenum name, GLint* result)
 {
     const Call call("glGetProgramivARB", {Enum(target), Enum(name)}, Gives::Number);
     if (call.Over()) {
-        if (call.effect.returns) {
+        if (call.effect.returns)
             *result = static_cast<GLint>(call.Answer());
-        }
         return;
     }
     const auto found = call.Model().programLimits.find(name);
@@ -194,13 +181,11 @@ void ClearColor(GLfloat red, GLfloat green, GLfloat blue, GLfloat alpha)
 
 GLenum FramebufferStatus(const GLState& gl)
 {
-    if (gl.boundFramebuffer == 0) {
+    if (gl.boundFramebuffer == 0)
         return GL_FRAMEBUFFER_UNDEFINED;
-    }
     const GLuint texture = gl.framebuffers.at(gl.boundFramebuffer);
-    if (texture == 0) {
+    if (texture == 0)
         return GL_FRAMEBUFFER_INCOMPLETE_MISSING_ATTACHMENT;
-    }
     const auto image = gl.textures.find(texture);
     return image != gl.textures.end() && image->second ? GL_FRAMEBUFFER_COMPLETE
                                                        : GL_FRAMEBUFFER_INCOMPLETE_ATTACHMENT;
@@ -209,17 +194,15 @@ GLenum FramebufferStatus(const GLState& gl)
 void Clear(GLbitfield mask)
 {
     const Call call("glClear", {Enum(mask)});
-    if (!call.Over() && FramebufferStatus(call.GL()) != GL_FRAMEBUFFER_COMPLETE) {
+    if (!call.Over() && FramebufferStatus(call.GL()) != GL_FRAMEBUFFER_COMPLETE)
         call.Error(GL_INVALID_FRAMEBUFFER_OPERATION);
-    }
 }
 
 GLuint CreateShader(GLenum kind)
 {
     const Call call("glCreateShader", {Enum(kind)}, Gives::Number);
-    if (call.Over()) {
+    if (call.Over())
         return static_cast<GLuint>(call.Answer());
-    }
     if (kind != GL_VERTEX_SHADER && kind != GL_FRAGMENT_SHADER) {
         call.Error(GL_INVALID_ENUM);
         return 0;
@@ -255,24 +238,21 @@ void ShaderSource(GLuint shader, GLsizei count, const GLchar* const* strings, co
         Number(shader), Number(count), {lengths == nullptr ? "null" : "lengths", {}}};
     for (GLsizei i = 0; i < count; ++i) {
         std::optional<std::size_t> size;
-        if (lengths != nullptr && lengths[i] >= 0) {
+        if (lengths != nullptr && lengths[i] >= 0)
             size = static_cast<std::size_t>(lengths[i]);
-        }
         arguments.push_back({Quoted(strings[i], size), {}});
     }
     const Call call("glShaderSource", arguments);
-    if (!call.Over()) {
+    if (!call.Over())
         ShaderOf(call, shader);
-    }
 }
 
 void CompileShader(GLuint shader)
 {
     const Call call("glCompileShader", {Number(shader)});
     GLState::Shader* object = call.Over() ? nullptr : ShaderOf(call, shader);
-    if (object == nullptr) {
+    if (object == nullptr)
         return;
-    }
     const Device& device = call.Model();
     const std::optional<std::string>& log =
         object->kind == GL_VERTEX_SHADER ? device.vertexLog : device.fragmentLog;
@@ -294,21 +274,18 @@ void CopyLog(const std::string& log, GLsizei size, GLsizei* length, GLchar* text
         std::memcpy(text, log.data(), copied);
         text[copied] = '\0';
     }
-    if (length != nullptr) {
+    if (length != nullptr)
         *length = static_cast<GLsizei>(copied);
-    }
 }
 
 void GetShaderiv(GLuint shader, GLenum name, GLint* result)
 {
     const Call call("glGetShaderiv", {Number(shader), Enum(name)}, Gives::Number);
-    if (call.effect.returns) {
+    if (call.effect.returns)
         *result = static_cast<GLint>(call.Answer());
-    }
     const GLState::Shader* object = call.Over() ? nullptr : ShaderOf(call, shader);
-    if (object == nullptr) {
+    if (object == nullptr)
         return;
-    }
     switch (name) {
     case GL_COMPILE_STATUS:
         *result = object->compiled ? GL_TRUE : GL_FALSE;
@@ -328,26 +305,23 @@ void GetShaderInfoLog(GLuint shader, GLsizei size, GLsizei* length, GLchar* text
 {
     const Call call("glGetShaderInfoLog", {Number(shader), Number(size)});
     const GLState::Shader* object = call.Over() ? nullptr : ShaderOf(call, shader);
-    if (object != nullptr) {
+    if (object != nullptr)
         CopyLog(object->log, size, length, text);
-    }
 }
 
 void DeleteShader(GLuint shader)
 {
     const Call call("glDeleteShader", {Number(shader)});
     // A shader that is attached lives on until its program goes; nothing asks for it any more.
-    if (!call.Over() && shader != 0) {
+    if (!call.Over() && shader != 0)
         ShaderOf(call, shader);
-    }
 }
 
 GLuint CreateProgram()
 {
     const Call call("glCreateProgram", {}, Gives::Number);
-    if (call.Over()) {
+    if (call.Over())
         return static_cast<GLuint>(call.Answer());
-    }
     const GLuint id = call.GL().nextID++;
     call.GL().programs[id] = {};
     return id;
@@ -357,18 +331,16 @@ void AttachShader(GLuint program, GLuint shader)
 {
     const Call call("glAttachShader", {Number(program), Number(shader)});
     GLState::Program* object = call.Over() ? nullptr : ProgramOf(call, program);
-    if (object != nullptr && ShaderOf(call, shader) != nullptr) {
+    if (object != nullptr && ShaderOf(call, shader) != nullptr)
         object->shaders.push_back(shader);
-    }
 }
 
 void LinkProgram(GLuint program)
 {
     const Call call("glLinkProgram", {Number(program)});
     GLState::Program* object = call.Over() ? nullptr : ProgramOf(call, program);
-    if (object == nullptr) {
+    if (object == nullptr)
         return;
-    }
     const bool compiled =
         std::all_of(object->shaders.begin(), object->shaders.end(),
                     [&](GLuint shader) { return call.GL().shaders.at(shader).compiled; });
@@ -380,13 +352,11 @@ void LinkProgram(GLuint program)
 void GetProgramiv(GLuint program, GLenum name, GLint* result)
 {
     const Call call("glGetProgramiv", {Number(program), Enum(name)}, Gives::Number);
-    if (call.effect.returns) {
+    if (call.effect.returns)
         *result = static_cast<GLint>(call.Answer());
-    }
     const GLState::Program* object = call.Over() ? nullptr : ProgramOf(call, program);
-    if (object == nullptr) {
+    if (object == nullptr)
         return;
-    }
     switch (name) {
     case GL_LINK_STATUS:
         *result = object->linked ? GL_TRUE : GL_FALSE;
@@ -403,17 +373,15 @@ void GetProgramInfoLog(GLuint program, GLsizei size, GLsizei* length, GLchar* te
 {
     const Call call("glGetProgramInfoLog", {Number(program), Number(size)});
     const GLState::Program* object = call.Over() ? nullptr : ProgramOf(call, program);
-    if (object != nullptr) {
+    if (object != nullptr)
         CopyLog(object->log, size, length, text);
-    }
 }
 
 void DeleteProgram(GLuint program)
 {
     const Call call("glDeleteProgram", {Number(program)});
-    if (!call.Over() && program != 0 && ProgramOf(call, program) != nullptr) {
+    if (!call.Over() && program != 0 && ProgramOf(call, program) != nullptr)
         call.GL().programs.erase(program);
-    }
 }
 
 void GenTextures(GLsizei count, GLuint* ids)
@@ -421,18 +389,16 @@ void GenTextures(GLsizei count, GLuint* ids)
     const Call call("glGenTextures", {Number(count)}, Gives::Number);
     for (GLsizei i = 0; i < count; ++i) {
         ids[i] = call.Over() ? static_cast<GLuint>(call.Answer()) : call.GL().nextID++;
-        if (!call.Over()) {
+        if (!call.Over())
             call.GL().textures[ids[i]] = false;
-        }
     }
 }
 
 void BindTexture(GLenum target, GLuint texture)
 {
     const Call call("glBindTexture", {Enum(target), Number(texture)});
-    if (!call.Over()) {
+    if (!call.Over())
         call.GL().boundTexture = texture;
-    }
 }
 
 void TexParameteri(GLenum target, GLenum name, GLint value)
@@ -453,9 +419,8 @@ void TexImage2D(GLenum target, GLint level, GLint internalFormat, GLsizei width,
                                      Enum(format),
                                      Enum(type),
                                      {data == nullptr ? "null" : "data", {}}});
-    if (call.Over()) {
+    if (call.Over())
         return;
-    }
     if (call.GL().boundTexture == 0) {
         call.Error(GL_INVALID_OPERATION);
         return;
@@ -471,18 +436,16 @@ void GenerateMipmap(GLenum target)
 std::vector<Argument> IDs(GLsizei count, const GLuint* ids)
 {
     std::vector<Argument> arguments = {Number(count)};
-    for (GLsizei i = 0; i < count; ++i) {
+    for (GLsizei i = 0; i < count; ++i)
         arguments.push_back(Number(ids[i]));
-    }
     return arguments;
 }
 
 void DeleteTextures(GLsizei count, const GLuint* ids)
 {
     const Call call("glDeleteTextures", IDs(count, ids));
-    for (GLsizei i = 0; i < count && !call.Over(); ++i) {
+    for (GLsizei i = 0; i < count && !call.Over(); ++i)
         call.GL().textures.erase(ids[i]);
-    }
 }
 
 void GenFramebuffers(GLsizei count, GLuint* ids)
@@ -490,18 +453,16 @@ void GenFramebuffers(GLsizei count, GLuint* ids)
     const Call call("glGenFramebuffers", {Number(count)}, Gives::Number);
     for (GLsizei i = 0; i < count; ++i) {
         ids[i] = call.Over() ? static_cast<GLuint>(call.Answer()) : call.GL().nextID++;
-        if (!call.Over()) {
+        if (!call.Over())
             call.GL().framebuffers[ids[i]] = 0;
-        }
     }
 }
 
 void BindFramebuffer(GLenum target, GLuint framebuffer)
 {
     const Call call("glBindFramebuffer", {Enum(target), Number(framebuffer)});
-    if (call.Over()) {
+    if (call.Over())
         return;
-    }
     if (framebuffer != 0 && call.GL().framebuffers.count(framebuffer) == 0) {
         call.Error(GL_INVALID_OPERATION);
         return;
@@ -514,9 +475,8 @@ void FramebufferTexture2D(GLenum target, GLenum attachment, GLenum textureTarget
 {
     const Call call("glFramebufferTexture2D", {Enum(target), Enum(attachment), Enum(textureTarget),
                                                Number(texture), Number(level)});
-    if (call.Over()) {
+    if (call.Over())
         return;
-    }
     if (call.GL().boundFramebuffer == 0 || call.GL().textures.count(texture) == 0) {
         call.Error(GL_INVALID_OPERATION);
         return;
@@ -535,9 +495,8 @@ void DeleteFramebuffers(GLsizei count, const GLuint* ids)
     const Call call("glDeleteFramebuffers", IDs(count, ids));
     for (GLsizei i = 0; i < count && !call.Over(); ++i) {
         call.GL().framebuffers.erase(ids[i]);
-        if (call.GL().boundFramebuffer == ids[i]) {
+        if (call.GL().boundFramebuffer == ids[i])
             call.GL().boundFramebuffer = 0;
-        }
     }
 }
 

@@ -91,9 +91,8 @@ void Offer(Device& device, const std::string& extension)
 {
     std::string& list =
         device.deviceTexts[EGL_EXTENSIONS].emplace(device.deviceTexts[EGL_EXTENSIONS].value_or(""));
-    if (!HoldsWord(list, extension)) {
+    if (!HoldsWord(list, extension))
         list += (list.empty() ? "" : " ") + extension;
-    }
 }
 
 std::vector<std::int32_t> TakeIntegers(Line& line)
@@ -165,11 +164,10 @@ void ReadOfDevice(Device& device, const std::string& verb, Line& line)
         (device.*texts->second)[name] = line.TakeText("the text");
     } else if (const auto integers = kIntegers.find(verb); integers != kIntegers.end()) {
         const std::int64_t name = line.TakeNumber("the value's name", NumberOf);
-        if (line.TakeIf("unknown")) {
+        if (line.TakeIf("unknown"))
             (device.*integers->second).erase(name);
-        } else {
+        else
             (device.*integers->second)[name] = TakeIntegers(line);
-        }
     } else if (const auto log = kLogs.find(verb); log != kLogs.end()) {
         device.*log->second = line.AtEnd() ? "" : line.TakeText("the log");
     } else {
@@ -191,14 +189,12 @@ void ReadModel(Model& model)
     for (Line& line : ReadScript(path)) {
         const std::string verb = line.Take("a word").text;
         if (!ReadGlobal(model, verb, line)) {
-            if (model.devices.empty()) {
+            if (model.devices.empty())
                 line.Fail("\"" + verb + "\" is unknown or stands before the first device");
-            }
             ReadOfDevice(model.devices.back(), verb, line);
         }
-        if (!line.AtEnd()) {
+        if (!line.AtEnd())
             line.Fail("words are left at the end of the line");
-        }
     }
 }
 
@@ -218,20 +214,17 @@ Model& TheModel()
 std::optional<std::int64_t> NumberOf(const std::string& name)
 {
     const auto found = KnownNames().find(name);
-    if (found == KnownNames().end()) {
+    if (found == KnownNames().end())
         return {};
-    }
     return found->second;
 }
 
 bool HoldsWord(const std::string& list, const std::string& word)
 {
     std::istringstream words(list);
-    for (std::string each; words >> each;) {
-        if (each == word) {
+    for (std::string each; words >> each;)
+        if (each == word)
             return true;
-        }
-    }
     return false;
 }
 

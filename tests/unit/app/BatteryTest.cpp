@@ -269,10 +269,9 @@ TEST(CLKeys, EachFailingOneCostsItsDeviceTheRest)
         for (const std::string& operation : operations) {
             gone = gone || operation == failing;
             std::string line = "CLCompute=32";
-            for (const KeyRow& key : kCLKeys) {
+            for (const KeyRow& key : kCLKeys)
                 if (operation == key.operation)
                     line = key.line;
-            }
             expected.push_back("clgpu[0]." + line);
             if (!gone)
                 expected.push_back("clgpu[1]." + line);
@@ -542,12 +541,11 @@ TEST(Battery, OfOneDeviceHasItsLinesAndSteps)
 
     int names = 0;
     int programs = 0;
-    for (const std::string& line : pixmere.out) {
+    for (const std::string& line : pixmere.out)
         if (line == "gputag.GL_FRAGMENT_PROGRAM_ARB=34820")
             ++programs;
         else if (line.compare(0, 7, "gputag.") == 0)
             ++names;
-    }
     EXPECT_EQ(names, 21);
     EXPECT_EQ(programs, 1);
 }

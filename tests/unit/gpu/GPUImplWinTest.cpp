@@ -374,10 +374,9 @@ TEST_F(GPUImplWinTest, TheSystemsListsAreReadBeforeAnyContextExists)
     EXPECT_EQ(callsAtCreation, fScript.calls);
     EXPECT_EQ(fScript.CountCalls("~factory"), 2U);
     std::vector<std::string> counts;
-    for (const std::string& line : fLog.Lines()) {
+    for (const std::string& line : fLog.Lines())
         if (line.find("Num") != std::string::npos)
             counts.push_back(line.substr(0, line.find('=')));
-    }
     EXPECT_THAT(counts,
                 ElementsAre("wmiNumDevices", "dxgiNumDevices", "qgfNumDevices", "qgfNumContexts"));
     EXPECT_EQ(fScript.calls[1], "Initialize"); // WMI's turn comes before DXGI's

@@ -108,10 +108,9 @@ protected:
         std::ostringstream line;
         line << "SetStateLocked state=" << expected << "\n";
         std::string last;
-        for (const std::string& each : logger.lines) {
+        for (const std::string& each : logger.lines)
             if (MessageOf(each).compare(0, 14, "SetStateLocked") == 0)
                 last = MessageOf(each);
-        }
         EXPECT_EQ(last, line.str());
         EXPECT_EQ(Peek(), IsStable(expected) ? expected : State::kTimeout);
         fApp->Reset();

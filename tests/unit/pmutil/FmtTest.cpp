@@ -98,9 +98,8 @@ TEST(Fmt, UnsignedLongHasAWidthOfFourBytesOnEveryPlatform)
 {
     EXPECT_STREQ(Fmt::GetULongFormat(), "0x%08lx");
     EXPECT_EQ(Text(10UL), "0x0000000a");
-    if constexpr (sizeof(unsigned long) == 8) {
+    if constexpr (sizeof(unsigned long) == 8)
         EXPECT_EQ(Text(static_cast<unsigned long>(0x1234567890ULL)), "0x1234567890");
-    }
 }
 
 TEST(Fmt, FloatingPoint)

@@ -195,9 +195,8 @@ TEST_F(LaunchWait, AStateThatComesWhenTheTimeHasJustRunOutIsSeen)
             fApp->SetState(State::kRunning);
         }
         waiter.join();
-        if (seen != 0) {
+        if (seen != 0)
             EXPECT_EQ(state, State::kRunning);
-        }
     }
     fApp->Reset();
 }
@@ -258,9 +257,8 @@ TEST_F(LaunchWait, AnEndThatComesWhenTheTimeHasJustRunOutIsSeen)
         const unsigned char byte = 'x';
         fApp->WriteAppStdin(&byte, 1);
         waiter.join();
-        if (seen != 0) {
+        if (seen != 0)
             EXPECT_THAT(fJournal.Take(kOther), testing::Not(timesOut));
-        }
         End(kEndedNormally);
         fApp->Reset();
     }

@@ -160,10 +160,9 @@ TEST_F(PMLoggingTest, LineHasPrefixMessageAndLineEnd)
     PM_LOG(gOn, "count=" << 3 << ", ok");
     ASSERT_THAT(logger.lines, SizeIs(1));
     std::string form = logger.lines[0].substr(0, 43);
-    for (std::size_t at = 5; at < 29 && at < form.size(); ++at) {
+    for (std::size_t at = 5; at < 29 && at < form.size(); ++at)
         if (form[at] >= '0' && form[at] <= '9')
             form[at] = 'd';
-    }
     EXPECT_EQ(form, "00000.dddd.dd.dd_dd:dd:dd.ddd(+00.000)[tid=");
     EXPECT_EQ(MessageOf(logger.lines[0]), "count=3, ok\n");
     EXPECT_NE(logger.lines[0].find("(+00.000)[tid=" + GetCurrentThreadName() + "] "),

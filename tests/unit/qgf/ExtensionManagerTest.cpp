@@ -90,9 +90,8 @@ TEST_P(ExtensionRow, IsSupportedByItsVersionAndByEachOfItsNames)
     EXPECT_FALSE(Driver(row.versionBefore).supports(row.id));
     EXPECT_FALSE(Driver(row.versionBefore, {"GL_OTHER"}).supports(row.id));
     EXPECT_EQ(Driver("4.6").supports(row.id), row.version != nullptr);
-    if (row.version != nullptr) {
+    if (row.version != nullptr)
         EXPECT_TRUE(Driver(row.version).supports(row.id));
-    }
     for (const std::string& name : row.names) {
         EXPECT_TRUE(Driver("1.1", {"GL_A", name, "GL_Z"}).supports(row.id)) << name;
         EXPECT_TRUE(Driver(row.versionBefore, {name}).supports(row.id)) << name;

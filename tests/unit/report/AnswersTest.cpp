@@ -15,10 +15,9 @@ namespace {
 std::string Show(const Answers& answers, const std::string& tag, const std::string& key)
 {
     const std::vector<Answer>* list = tag.empty() ? &answers.fReport : nullptr;
-    for (const DeviceAnswers& device : answers.fDevices) {
+    for (const DeviceAnswers& device : answers.fDevices)
         if (device.fTag == tag)
             list = &device.fAnswers;
-    }
     if (!list)
         return "no device";
     for (const Answer& answer : *list) {

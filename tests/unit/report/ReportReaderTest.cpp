@@ -75,9 +75,8 @@ TEST(ReportReader, SplitsAtTheFirstEqualsSign)
 TEST(ReportReader, KeepsOtherLinesRaw)
 {
     for (const char* text : {"", "text", "=1", " a=1", "a b=1", "\"a\"=1", "a\x80=1", "a\x7F=1",
-                             " # text", "DoStdout failed"}) {
+                             " # text", "DoStdout failed"})
         EXPECT_EQ(ReadLines(std::string(text) + "\n"), Lines{Raw(text)}) << text;
-    }
 }
 
 TEST(ReportReader, KeepsTheLineEnd)
@@ -129,9 +128,8 @@ TEST(ReportReader, ReleasesAnOpenQuoteBeforeALineOfTheReport)
         EXPECT_EQ(lines[3].fText, own);
     }
     for (const char* other : {"glgpu[].X=1", "glgpu[0]X=1", "gputagX=1", "Tester", "NumGLGPUsX=1",
-                              "Tester x=1", "", " # log"}) {
+                              "Tester x=1", "", " # log"})
         EXPECT_EQ(ReadLines(std::string("a=\"one\n") + other + "\nend\"\n").size(), 1U) << other;
-    }
 }
 
 TEST(ReportReader, OpensANewQuoteAfterAReleasedOne)
@@ -155,10 +153,9 @@ TEST(ReportReader, ReleasesAnOpenQuoteAtTheEnd)
 TEST(ReportReader, AcceptsAnyByte)
 {
     std::string all;
-    for (int byte = 0; byte < 256; ++byte) {
+    for (int byte = 0; byte < 256; ++byte)
         if (byte != '\n')
             all += static_cast<char>(byte);
-    }
     EXPECT_EQ(ReadLines("a=\"" + all + "\"\n"), Lines{Text("a=\"" + all + "\"", "\n", "a", all)});
     EXPECT_EQ(ReadLines(all + "\n"), Lines{Raw(all)});
     EXPECT_EQ(ReadLines("# " + all + "\n"), Lines{Comment("# " + all)});
@@ -233,10 +230,9 @@ Lines ReadWithLimits(const std::string& text, const ReportReader::Limits& limits
     for (std::size_t piece = text.size(); piece > 0; --piece) {
         ReportReader reader(limits);
         Lines lines;
-        for (std::size_t at = 0; at < text.size(); at += piece) {
+        for (std::size_t at = 0; at < text.size(); at += piece)
             for (ReportLine& line : reader.Feed(std::string_view(text).substr(at, piece)))
                 lines.push_back(std::move(line));
-        }
         for (ReportLine& line : reader.Finish())
             lines.push_back(std::move(line));
         EXPECT_EQ(reader.GetByteCount(), text.size()) << piece;

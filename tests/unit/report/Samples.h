@@ -125,10 +125,9 @@ private:
         for (const SampleValue& value : values) {
             for (std::size_t index = 0; index < isFailed.size(); ++index) {
                 const std::string tag = word + ("[" + std::to_string(index) + "]");
-                for (const Item& failure : fFailures) {
+                for (const Item& failure : fFailures)
                     if (failure.fKey == tag && failure.fValue == value.fKey)
                         isFailed[index] = true;
-                }
                 if (!isFailed[index])
                     Add(tag + "." + value.fKey, value.fValue);
             }
@@ -137,10 +136,9 @@ private:
 
     void Add(const std::string& key, std::string value)
     {
-        for (const Item& change : fChanges) {
+        for (const Item& change : fChanges)
             if (change.fKey == key)
                 value = change.fValue;
-        }
         if (!fEnded && !value.empty())
             fText += key + "=" + value + "\n";
         fEnded = fEnded || key == fLastKey;

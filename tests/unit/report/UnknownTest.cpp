@@ -18,10 +18,9 @@ Unknown Judge(const std::string& key, const std::string& value)
     const Report report =
         ReadReport(sample.Set((isGL ? "glgpu[0]." : "clgpu[0].") + key, value).GetText());
     const Answers answers = GetAnswers(report);
-    for (const Answer& answer : answers.fDevices.at(0).fAnswers) {
+    for (const Answer& answer : answers.fDevices.at(0).fAnswers)
         if (answer.fKey == key)
             return answer.fUnknown;
-    }
     ADD_FAILURE() << key;
     return Unknown::kNot;
 }
@@ -71,10 +70,9 @@ TEST(Unknown, IsWhatFollowsFromAMissingAdapter)
     const Report report = ReadReport(Sample(1, 0).Set("glgpu[0].GLVendorID", "0").GetText());
     const Answers answers = GetAnswers(report);
     std::set<std::string> keys;
-    for (const Answer& answer : answers.fDevices.at(0).fAnswers) {
+    for (const Answer& answer : answers.fDevices.at(0).fAnswers)
         if (answer.fUnknown == Unknown::kNoAdapter)
             keys.insert(answer.fKey);
-    }
     EXPECT_EQ(keys, (std::set<std::string>{"IsIntegratedGLGPU", "GLVendorID"}));
 }
 

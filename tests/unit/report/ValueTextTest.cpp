@@ -13,10 +13,9 @@ std::string Show(const std::string& line)
 {
     const Report report = ReadReport(line + "\n");
     const Answers answers = GetAnswers(report);
-    for (const Answer& answer : answers.fDevices.at(0).fAnswers) {
+    for (const Answer& answer : answers.fDevices.at(0).fAnswers)
         if (answer.fLine)
             return GetValueText(answer);
-    }
     return "no value";
 }
 

@@ -34,10 +34,9 @@ TEST(ErrorLines, AreCutAtTheLimits)
 
     ErrorLines manyBytes;
     std::size_t held = 0;
-    for (int block = 0; block < 20; ++block) {
+    for (int block = 0; block < 20; ++block)
         for (const std::string& line : manyBytes.Feed(std::string(65535, 'x') + "\n"))
             held += line.size() + 1;
-    }
     for (const std::string& line : manyBytes.Finish())
         held += line.size();
     EXPECT_EQ(held, ErrorLines::kMaxBytes);

@@ -53,10 +53,9 @@ std::vector<Lines> MakeFailingRuns(bool logs)
 std::vector<Lines> MakeWholeRuns()
 {
     std::vector<Lines> runs;
-    for (int glCount = 0; glCount <= 3; ++glCount) {
+    for (int glCount = 0; glCount <= 3; ++glCount)
         for (int clCount = 0; clCount <= 2; ++clCount)
             runs.push_back(Join(MakeWholeRun(glCount, clCount)));
-    }
     return runs;
 }
 
@@ -104,10 +103,9 @@ TEST(NextLine, IsTheSameInAllOutputsOfCutReports)
     constexpr int kReports = 20000;
     constexpr int kShownInFull = 100; // each of so many
     std::vector<Report> runs = {ReadReport(Join(MakeWholeRun(1, -1)))};
-    for (const auto& some : {MakeWholeRuns(), MakeFailingRuns(false), MakeFailingRuns(true)}) {
+    for (const auto& some : {MakeWholeRuns(), MakeFailingRuns(false), MakeFailingRuns(true)})
         for (const Lines& lines : some)
             runs.push_back(ReadReport(lines));
-    }
     std::mt19937 random(20261121);
     int differing = 0;
     for (int number = 0; number < kReports; ++number) {

@@ -45,9 +45,8 @@ void Write(const fs::path& path, const std::string& text, std::ios::openmode mod
 {
     std::ofstream file(path, std::ios::binary | mode);
     file << text;
-    if (!file.flush()) {
+    if (!file.flush())
         throw std::runtime_error("can't write " + path.string());
-    }
 }
 
 // What stands behind "NAME" and a separator on a line of a tree.
@@ -71,17 +70,16 @@ void Unpack(std::istream& tree, const fs::path& root)
             const std::size_t blank = line.find(' ');
             const std::string kind = line.substr(std::min(blank, line.size()));
             file = folder / line.substr(0, blank);
-            if (kind.compare(0, 4, " -> ") == 0) {
+            if (kind.compare(0, 4, " -> ") == 0)
                 fs::create_symlink(kind.substr(4), file);
-            } else if (kind == " =") {
+            else if (kind == " =")
                 Write(file, "", std::ios::trunc);
-            } else if (kind.compare(0, 3, " = ") == 0) {
+            else if (kind.compare(0, 3, " = ") == 0)
                 Write(file, Behind(kind, 0, 3) + "\n", std::ios::trunc);
-            } else if (kind.compare(0, 3, " :=") == 0) {
+            else if (kind.compare(0, 3, " :=") == 0)
                 Write(file, Behind(kind, 0, 4), std::ios::trunc);
-            } else {
+            else
                 throw std::runtime_error("a tree has the line " + line);
-            }
         }
     }
 }
@@ -91,13 +89,11 @@ void Unpack(std::istream& tree, const fs::path& root)
 AdapterTree::AdapterTree(const std::string& name)
 {
     std::ifstream tree(kData + name + "/tree.txt", std::ios::binary);
-    if (!tree) {
+    if (!tree)
         throw std::runtime_error("no tree " + name);
-    }
     std::string folder = (fs::temp_directory_path() / "adapters-XXXXXX").string();
-    if (!mkdtemp(folder.data())) {
+    if (!mkdtemp(folder.data()))
         throw std::runtime_error("can't make " + folder);
-    }
     fRoot = folder;
     Unpack(tree, fRoot);
     QGF::SetSystemRoot(fRoot);
@@ -113,11 +109,9 @@ AdapterTree::~AdapterTree()
 std::vector<std::string> AdapterTree::files() const
 {
     std::vector<std::string> paths;
-    for (const auto& entry : fs::recursive_directory_iterator(fRoot)) {
-        if (entry.symlink_status().type() == fs::file_type::regular) {
+    for (const auto& entry : fs::recursive_directory_iterator(fRoot))
+        if (entry.symlink_status().type() == fs::file_type::regular)
             paths.push_back(entry.path().string());
-        }
-    }
     std::sort(paths.begin(), paths.end());
     return paths;
 }
@@ -144,11 +138,9 @@ void AdapterTree::refresh() const
 std::vector<std::string> AdapterTreeNames()
 {
     std::vector<std::string> names;
-    for (const auto& entry : fs::directory_iterator(kData)) {
-        if (entry.is_directory()) {
+    for (const auto& entry : fs::directory_iterator(kData))
+        if (entry.is_directory())
             names.push_back(entry.path().filename().string());
-        }
-    }
     std::sort(names.begin(), names.end());
     return names;
 }
@@ -158,8 +150,7 @@ std::string ReadAdapterData(const std::string& tree, const std::string& file)
     std::ifstream in(kData + tree + "/" + file, std::ios::binary);
     std::ostringstream text;
     text << in.rdbuf();
-    if (!in) {
+    if (!in)
         throw std::runtime_error("no " + file + " of tree " + tree);
-    }
     return text.str();
 }

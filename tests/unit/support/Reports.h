@@ -55,10 +55,9 @@ inline std::vector<std::vector<std::string>> MakeWholeRun(int glCount, int clCou
           "GLVendor=\"A vendor\"", "GLVendorID=4318", "GLDriverVersion=\"1.2\"",
           "GLRectTextureSize=16384", "GLRenderer=\"A renderer\"", "GLRendererID=5",
           "HasGLNPOTSupport=1", "GLDriver=\"driver\"", "GLDriverDate=\"?\"",
-          "CanCompileProgramGLSL=1", "GLFrameBufferOK=1"}) {
+          "CanCompileProgramGLSL=1", "GLFrameBufferOK=1"})
         for (int device = 0; device < glCount; ++device)
             run.push_back({GL(device, key)});
-    }
     for (int device = 0; device < glCount; ++device)
         run.push_back({"gputag.GL_SHADING_LANGUAGE_VERSION=35724",
                        GL(device, "glGetString[GL_SHADING_LANGUAGE_VERSION]=\"4.50\"")});

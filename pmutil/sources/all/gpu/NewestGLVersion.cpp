@@ -24,10 +24,9 @@ constexpr VersionText kVersions[] = {
 const char*
 NewestGLVersion(const std::function<bool(QGF::OGL::OpenGLExtension version)>& isSupported)
 {
-    for (const VersionText& version : kVersions) {
+    for (const VersionText& version : kVersions)
         if (isSupported(version.version))
             return version.text;
-    }
     return nullptr;
 }
 

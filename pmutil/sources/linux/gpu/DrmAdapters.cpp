@@ -45,9 +45,8 @@ using Nodes = std::vector<QGF::DrmNode>;
 std::map<std::string, Nodes> NodesByPlace()
 {
     std::map<std::string, Nodes> nodes;
-    for (QGF::DrmNode& node : QGF::DrmNodes()) {
+    for (QGF::DrmNode& node : QGF::DrmNodes())
         nodes[node.place].push_back(std::move(node));
-    }
     return nodes;
 }
 
@@ -89,9 +88,8 @@ std::optional<std::uint64_t> AskForMemory(const std::string& folder, const Nodes
 {
     const std::string node = RenderNodeOf(nodes);
     if (node.empty() || !AnswersOnDrmNode(driver) ||
-        QGF::ReadSystemLine(folder + "power/runtime_status") != "active") {
+        QGF::ReadSystemLine(folder + "power/runtime_status") != "active")
         return std::nullopt;
-    }
     return MemoryInAnswer(driver, AskDrmNode(node, driver));
 }
 
@@ -110,27 +108,24 @@ void ReadMemory(const std::string& folder, const Nodes& nodes, DrmAdapter& adapt
 {
     adapter.dedicatedBytes = ReadSize(folder + "mem_info_vram_total");
     adapter.sharedBytes = ReadSize(folder + "mem_info_gtt_total");
-    if (adapter.dedicatedBytes) {
+    if (adapter.dedicatedBytes)
         return;
-    }
     adapter.dedicatedBytes = AskForMemory(folder, nodes, adapter.driver);
     if (!adapter.dedicatedBytes && HasOwnMemory(folder, adapter)) {
         std::string resource;
         QGF::ReadSystemFile(folder + "resource", resource);
         adapter.dedicatedBytes = LargestPrefetchableBar(resource);
     }
-    if (adapter.dedicatedBytes == 0U) {
+    if (adapter.dedicatedBytes == 0U)
         adapter.dedicatedBytes.reset();
-    }
 }
 
 // The module behind a device's driver, or the driver itself where it is built into the kernel.
 std::string ModuleOf(const std::string& device)
 {
     std::string module = QGF::LastOfPath(QGF::ReadSystemLink(device + "driver/module"));
-    if (!module.empty()) {
+    if (!module.empty())
         return module;
-    }
     return QGF::LastOfPath(QGF::ReadSystemLink(device + "driver"));
 }
 
@@ -141,15 +136,12 @@ std::string DeviceOfNodes(const std::string& folder, const std::string& place, c
 {
     const QGF::DrmNode* best = nullptr;
     for (const QGF::DrmNode& node : nodes) {
-        if (node.firmware) {
+        if (node.firmware)
             continue;
-        }
-        if (QGF::LastOfPath(node.device) == QGF::LastOfPath(place)) {
+        if (QGF::LastOfPath(node.device) == QGF::LastOfPath(place))
             return folder;
-        }
-        if (best == nullptr || IsRenderNode(node)) {
+        if (best == nullptr || IsRenderNode(node))
             best = &node;
-        }
     }
     return best == nullptr ? folder : best->device + "/";
 }
@@ -163,9 +155,8 @@ std::string DrawingDriver(const std::string& device)
         for (const std::string& name : QGF::ListSystemFolder(device)) {
             std::string carried =
                 name.compare(0, 6, "virtio") == 0 ? ModuleOf(device + name + "/") : std::string();
-            if (!carried.empty()) {
+            if (!carried.empty())
                 return carried;
-            }
         }
     }
     return driver;
@@ -174,36 +165,31 @@ std::string DrawingDriver(const std::string& device)
 void ReadDriver(const std::string& folder, const Nodes& nodes, DrmAdapter& adapter)
 {
     adapter.driver = DrawingDriver(DeviceOfNodes(folder, adapter.place, nodes));
-    if (adapter.driver.empty()) {
+    if (adapter.driver.empty())
         return;
-    }
     adapter.driverVersion = QGF::ReadSystemLine("/sys/module/" + adapter.driver + "/version");
     if (adapter.driver == "nvidia") {
         std::string text;
         QGF::ReadSystemFile("/proc/driver/nvidia/version", text);
         const NvidiaVersion nvidia = ParseNvidiaVersion(text);
-        if (adapter.driverVersion.empty()) {
+        if (adapter.driverVersion.empty())
             adapter.driverVersion = nvidia.version;
-        }
         adapter.driverDate = nvidia.date;
     }
-    if (adapter.driverVersion.empty()) {
+    if (adapter.driverVersion.empty())
         adapter.driverVersion = QGF::ReadSystemLine("/proc/sys/kernel/osrelease");
-    }
 }
 
 // False if the connector has gone since it was listed.
 bool ReadConnector(const std::string& folder, DrmConnector& connector)
 {
     const std::string status = QGF::ReadSystemLine(folder + "/status");
-    if (status == "connected") {
+    if (status == "connected")
         connector.connected = true;
-    } else if (status == "disconnected") {
+    else if (status == "disconnected")
         connector.connected = false;
-    }
-    if (connector.connected.value_or(false)) {
+    if (connector.connected.value_or(false))
         ParseModeSize(QGF::ReadSystemLine(folder + "/modes"), connector.width, connector.height);
-    }
     return connector.connected || !QGF::ListSystemFolder(folder).empty();
 }
 
@@ -213,14 +199,12 @@ void ReadConnectors(const std::vector<std::string>& classNames, const Nodes& nod
     for (const QGF::DrmNode& node : nodes) {
         const std::string prefix = node.name + "-";
         for (const std::string& name : classNames) {
-            if (name.compare(0, prefix.size(), prefix) != 0) {
+            if (name.compare(0, prefix.size(), prefix) != 0)
                 continue;
-            }
             DrmConnector connector;
             connector.name = name.substr(prefix.size());
-            if (ReadConnector(kDrmClass + name, connector)) {
+            if (ReadConnector(kDrmClass + name, connector))
                 adapter.connectors.push_back(std::move(connector));
-            }
         }
     }
 }
@@ -230,9 +214,8 @@ void ReadRenderer(const Nodes& nodes, const std::vector<std::string>& nvidiaCard
 {
     adapter.renderName = RenderNodeOf(nodes);
     if (adapter.renderName.empty() &&
-        std::find(nvidiaCards.begin(), nvidiaCards.end(), adapter.place) != nvidiaCards.end()) {
+        std::find(nvidiaCards.begin(), nvidiaCards.end(), adapter.place) != nvidiaCards.end())
         adapter.renderName = "nvidia";
-    }
     adapter.renders = !adapter.renderName.empty();
 }
 
@@ -278,15 +261,13 @@ bool ParseModeSize(const std::string& mode, std::uint32_t& width, std::uint32_t&
     std::uint32_t parsedWidth = 0;
     std::uint32_t parsedHeight = 0;
     const auto first = std::from_chars(mode.data(), end, parsedWidth);
-    if (first.ec != std::errc() || first.ptr == end || *first.ptr != 'x') {
+    if (first.ec != std::errc() || first.ptr == end || *first.ptr != 'x')
         return false;
-    }
     const auto second = std::from_chars(first.ptr + 1, end, parsedHeight);
     const std::string rest(second.ptr, end);
     if (second.ec != std::errc() || (!rest.empty() && rest != "i") || parsedWidth == 0 ||
-        parsedHeight == 0 || parsedWidth > kMaxModeSize || parsedHeight > kMaxModeSize) {
+        parsedHeight == 0 || parsedWidth > kMaxModeSize || parsedHeight > kMaxModeSize)
         return false;
-    }
     width = parsedWidth;
     height = parsedHeight;
     return true;

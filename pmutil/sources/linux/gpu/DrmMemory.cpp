@@ -22,9 +22,8 @@ using Bytes = std::optional<std::uint64_t>;
 template <typename Structure>
 bool At(const std::string& answer, std::size_t offset, Structure& structure)
 {
-    if (offset > answer.size() || answer.size() - offset < sizeof structure) {
+    if (offset > answer.size() || answer.size() - offset < sizeof structure)
         return false;
-    }
     std::memcpy(&structure, answer.data() + offset, sizeof structure);
     return true;
 }
@@ -52,9 +51,8 @@ Bytes LocalMemory(const std::string& answer, std::size_t headSize, std::size_t c
 Bytes InI915Answer(const std::string& answer)
 {
     drm_i915_query_memory_regions head{};
-    if (!At(answer, 0, head)) {
+    if (!At(answer, 0, head))
         return std::nullopt;
-    }
     return LocalMemory<drm_i915_memory_region_info>(
         answer, sizeof head, head.num_regions, [](const drm_i915_memory_region_info& region) {
             return region.region.memory_class == I915_MEMORY_CLASS_DEVICE ? region.probed_size : 0;
@@ -64,9 +62,8 @@ Bytes InI915Answer(const std::string& answer)
 Bytes InXeAnswer(const std::string& answer)
 {
     XeRegionsHead head{};
-    if (!At(answer, 0, head)) {
+    if (!At(answer, 0, head))
         return std::nullopt;
-    }
     return LocalMemory<XeRegion>(
         answer, sizeof head, head.num_mem_regions, [](const XeRegion& region) {
             return region.mem_class == kXeClassVram ? region.total_size : 0;
@@ -126,9 +123,8 @@ std::uint64_t LargestPrefetchableBar(const std::string& resource)
         if (ParseSystemNumber(texts[0], first) && ParseSystemNumber(texts[1], last) &&
             ParseSystemNumber(texts[2], flags) &&
             (flags & kPrefetchableMemory) == kPrefetchableMemory && last > first &&
-            last - first != std::numeric_limits<std::uint64_t>::max()) {
+            last - first != std::numeric_limits<std::uint64_t>::max())
             largest = std::max(largest, last - first + 1);
-        }
     }
     return largest;
 }

@@ -35,9 +35,8 @@ public:
     {}
     ~Node()
     {
-        if (fNode >= 0) {
+        if (fNode >= 0)
             fCalls.close(fNode);
-        }
     }
     Node(const Node&) = delete;
     Node& operator=(const Node&) = delete;
@@ -46,12 +45,10 @@ public:
     bool ask(unsigned long request, void* argument) const
     {
         for (int i = 0; fNode >= 0 && i != kMaxTries; ++i) {
-            if (fCalls.ioctl(fNode, request, argument) >= 0) {
+            if (fCalls.ioctl(fNode, request, argument) >= 0)
                 return true;
-            }
-            if (errno != EINTR && errno != EAGAIN) {
+            if (errno != EINTR && errno != EAGAIN)
                 break;
-            }
         }
         return false;
     }
@@ -82,9 +79,8 @@ std::string AskI915(const Node& node)
     query.num_items = 1;
     query.items_ptr = AddressOf(&item);
     if (!node.ask(DRM_IOCTL_I915_QUERY, &query) || item.length <= 0 ||
-        static_cast<std::size_t>(item.length) > kAnswerLimit) {
+        static_cast<std::size_t>(item.length) > kAnswerLimit)
         return std::string();
-    }
     std::string answer(static_cast<std::size_t>(item.length), '\0');
     item.data_ptr = AddressOf(answer.data());
     const std::int32_t length = item.length;
@@ -95,9 +91,8 @@ std::string AskXe(const Node& node)
 {
     XeDeviceQuery query{};
     query.query = kXeQueryMemRegions;
-    if (!node.ask(kXeIoctlDeviceQuery, &query) || query.size == 0 || query.size > kAnswerLimit) {
+    if (!node.ask(kXeIoctlDeviceQuery, &query) || query.size == 0 || query.size > kAnswerLimit)
         return std::string();
-    }
     std::string answer(query.size, '\0');
     query.data = AddressOf(answer.data());
     return node.ask(kXeIoctlDeviceQuery, &query) && query.size == answer.size() ? answer
@@ -163,9 +158,8 @@ std::string AskDrmNode(const DrmCalls& calls, const std::string& node, const std
 
 std::string AskDrmNode(const std::string& node, const std::string& driver)
 {
-    if (QGF::SystemRoot().empty()) {
+    if (QGF::SystemRoot().empty())
         return AskDrmNode(SystemDrmCalls(), node, driver);
-    }
     std::string answer;
     QGF::ReadSystemFile("/dev/dri/" + node + "." + driver, answer);
     return answer;

@@ -60,9 +60,8 @@ PropertyValue Text(const std::string& text)
 PropertyValue TextOrNull(const std::string& text)
 {
     PropertyValue value = Text(text);
-    if (text.empty()) {
+    if (text.empty())
         value.type = PropertyValue::kNull;
-    }
     return value;
 }
 
@@ -80,11 +79,9 @@ PropertyValue Memory(const std::optional<std::uint64_t>& bytes)
 
 PropertyValue VideoMode(const DrmAdapter& adapter)
 {
-    for (const DrmConnector& connector : adapter.connectors) {
-        if (connector.width != 0) {
+    for (const DrmConnector& connector : adapter.connectors)
+        if (connector.width != 0)
             return Text(std::to_string(connector.width) + " x " + std::to_string(connector.height));
-        }
-    }
     return TextOrNull(std::string());
 }
 
@@ -107,9 +104,8 @@ public:
     {
         const auto property = std::find_if(fProperties.begin(), fProperties.end(),
                                            [&](const auto& entry) { return entry.first == name; });
-        if (property == fProperties.end()) {
+        if (property == fProperties.end())
             return kPropertyNotFound;
-        }
         value = property->second;
         return 0;
     }
@@ -157,9 +153,8 @@ public:
 
     ResultCode GetDesc(OutputDescriptor& description) override
     {
-        if (!fConnector.connected) {
+        if (!fConnector.connected)
             return kDeviceRemoved;
-        }
         description = OutputDescriptor();
         Store(fConnector.name, description.DeviceName);
         description.DesktopCoordinates.right = static_cast<std::int32_t>(fConnector.width);
@@ -204,9 +199,8 @@ public:
 
     ResultCode EnumOutputs(std::uint32_t index, std::unique_ptr<AdapterOutput>& output) override
     {
-        if (index >= fAdapter.connectors.size()) {
+        if (index >= fAdapter.connectors.size())
             return kNotFound;
-        }
         output = std::make_unique<LinuxOutput>(fAdapter.connectors[index]);
         return 0;
     }
@@ -214,14 +208,12 @@ public:
 private:
     std::uint64_t SharedMemory() const
     {
-        if (fAdapter.sharedBytes) {
+        if (fAdapter.sharedBytes)
             return *fAdapter.sharedBytes;
-        }
         const bool maker = fAdapter.vendor == kVendorIntel || fAdapter.vendor == kVendorAMD;
         std::uint64_t installed = 0;
-        if (!maker || fAdapter.dedicatedBytes.value_or(0) != 0 || !PhysicalMemory(installed)) {
+        if (!maker || fAdapter.dedicatedBytes.value_or(0) != 0 || !PhysicalMemory(installed))
             return 0;
-        }
         return installed / 2;
     }
 
@@ -232,9 +224,8 @@ class LinuxFactory : public AdapterFactory {
 public:
     ResultCode EnumAdapters(std::uint32_t index, std::unique_ptr<Adapter>& adapter) override
     {
-        if (index >= fAdapters->size()) {
+        if (index >= fAdapters->size())
             return kNotFound;
-        }
         adapter = std::make_unique<LinuxAdapter>((*fAdapters)[index]);
         return 0;
     }

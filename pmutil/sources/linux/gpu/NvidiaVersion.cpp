@@ -27,11 +27,9 @@ bool IsVersion(const std::string& word)
 std::string DateAt(const std::vector<std::string>& words, std::size_t first)
 {
     int month = 0;
-    for (int i = 0; i != 12; ++i) {
-        if (words[first] == kMonths[i]) {
+    for (int i = 0; i != 12; ++i)
+        if (words[first] == kMonths[i])
             month = i + 1;
-        }
-    }
     int day = 0;
     int year = 0;
     int hour = 0;
@@ -45,9 +43,8 @@ std::string DateAt(const std::vector<std::string>& words, std::size_t first)
                           std::sscanf(words[first + 4].c_str(), "%4d%c", &year, &rest) == 1;
     // NOLINTEND(cert-err34-c)
     if (!complete || month == 0 || day < 1 || day > 31 || hour < 0 || hour > 23 || minute < 0 ||
-        minute > 59 || second < 0 || second > 60 || year < 1990) {
+        minute > 59 || second < 0 || second > 60 || year < 1990)
         return std::string();
-    }
     for (const Zone& zone : kZones) {
         if (words[first + 3] == zone.name) {
             char text[80];
@@ -66,21 +63,17 @@ NvidiaVersion ParseNvidiaVersion(const std::string& text)
     NvidiaVersion found;
     static const char kKey[] = "NVRM version:";
     const std::size_t begin = text.find(kKey);
-    if (begin == std::string::npos) {
+    if (begin == std::string::npos)
         return found;
-    }
     std::istringstream line(text.substr(begin, text.find('\n', begin) - begin));
     std::vector<std::string> words;
-    for (std::string word; line >> word;) {
+    for (std::string word; line >> word;)
         words.push_back(word);
-    }
     for (std::size_t i = 0; i != words.size(); ++i) {
-        if (found.version.empty() && IsVersion(words[i])) {
+        if (found.version.empty() && IsVersion(words[i]))
             found.version = words[i];
-        }
-        if (found.date.empty() && i + 5 <= words.size()) {
+        if (found.date.empty() && i + 5 <= words.size())
             found.date = DateAt(words, i);
-        }
     }
     return found;
 }

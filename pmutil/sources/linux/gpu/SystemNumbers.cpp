@@ -15,9 +15,8 @@ bool ParseSystemNumber(const std::string& line, std::uint64_t& number)
     std::uint64_t parsed = 0;
     const std::from_chars_result result =
         std::from_chars(begin, end, parsed, hexadecimal ? 16 : 10);
-    if (result.ec != std::errc() || result.ptr != end) {
+    if (result.ec != std::errc() || result.ptr != end)
         return false;
-    }
     number = parsed;
     return true;
 }
@@ -36,17 +35,15 @@ bool ParseMemoryTotal(const std::string& meminfo, std::uint64_t& bytes)
         const std::size_t end = std::min(meminfo.find('\n', begin), meminfo.size());
         const std::string line = meminfo.substr(begin, end - begin);
         begin = end + 1;
-        if (line.compare(0, sizeof kKey - 1, kKey) != 0) {
+        if (line.compare(0, sizeof kKey - 1, kKey) != 0)
             continue;
-        }
         const std::size_t first = line.find_first_not_of(' ', sizeof kKey - 1);
         const std::size_t unit = line.rfind(kUnit);
         std::uint64_t kilobytes = 0;
         if (first == std::string::npos || unit == std::string::npos || unit < first ||
             !ParseSystemNumber(line.substr(first, unit - first), kilobytes) ||
-            kilobytes > std::numeric_limits<std::uint64_t>::max() / 1024) {
+            kilobytes > std::numeric_limits<std::uint64_t>::max() / 1024)
             return false;
-        }
         bytes = kilobytes * 1024;
         return true;
     }

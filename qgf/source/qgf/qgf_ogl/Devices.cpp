@@ -56,10 +56,9 @@ void Library::Initialize(const InitOptions&)
 
 DisplayDeviceKey Context::PrimaryDisplayDevice()
 {
-    for (const DisplayDeviceKey& key : DisplayDevices()) {
+    for (const DisplayDeviceKey& key : DisplayDevices())
         if (!key.deviceName().empty())
             return key;
-    }
     throw LogicalException("OpenGL has no display device on this machine");
 }
 

@@ -53,11 +53,9 @@ bool Covers(const Note& note, const std::string& path)
 std::vector<std::string> Entries(const std::string& root)
 {
     std::vector<std::string> paths;
-    for (const auto& entry : fs::recursive_directory_iterator(root)) {
-        if (entry.is_symlink() || !entry.is_directory() || fs::is_empty(entry.path())) {
+    for (const auto& entry : fs::recursive_directory_iterator(root))
+        if (entry.is_symlink() || !entry.is_directory() || fs::is_empty(entry.path()))
             paths.push_back(entry.path().string().substr(root.size() + 1));
-        }
-    }
     return paths;
 }
 
@@ -84,9 +82,8 @@ TEST_P(AdapterNotesTest, EveryNoteNamesDriverFileFunctionAndVersion)
 {
     for (const Note& note : ReadNotes(GetParam())) {
         ASSERT_EQ(note.source.size(), 4U) << note.pattern;
-        for (const std::string& part : note.source) {
+        for (const std::string& part : note.source)
             EXPECT_NE(part, "") << note.pattern;
-        }
         EXPECT_NE(note.source[3].find_first_of("0123456789"), std::string::npos) << note.pattern;
         // A note that covers everything says nothing.
         EXPECT_FALSE(Covers(note, "sys/devices/pci0000:00/0000:00:02.0/lmem_total_bytes"))

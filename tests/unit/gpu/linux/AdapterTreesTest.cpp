@@ -37,12 +37,10 @@ using ::testing::Not;
 std::set<std::string> PlacesWithDriver()
 {
     std::set<std::string> places;
-    for (const QGF::DrmNode& node : QGF::DrmNodes()) {
+    for (const QGF::DrmNode& node : QGF::DrmNodes())
         places.insert(node.place);
-    }
-    for (const std::string& card : QGF::ListSystemFolder("/proc/driver/nvidia/gpus")) {
+    for (const std::string& card : QGF::ListSystemFolder("/proc/driver/nvidia/gpus"))
         places.insert(card);
-    }
     return places;
 }
 
@@ -72,9 +70,8 @@ std::string Describe(GPUImplWin& device)
 std::string DescribeMachine()
 {
     std::string text;
-    for (const auto& device : Join()) {
+    for (const auto& device : Join())
         text += (text.empty() ? "" : "\n") + Describe(*device);
-    }
     return text;
 }
 
@@ -163,11 +160,9 @@ public:
     explicit Watch(const std::string& root) : fFd(inotify_init1(IN_NONBLOCK | IN_CLOEXEC))
     {
         add(root);
-        for (const auto& entry : fs::recursive_directory_iterator(root)) {
-            if (entry.symlink_status().type() == fs::file_type::directory) {
+        for (const auto& entry : fs::recursive_directory_iterator(root))
+            if (entry.symlink_status().type() == fs::file_type::directory)
                 add(entry.path().string());
-            }
-        }
     }
     ~Watch() { close(fFd); }
     Watch(const Watch&) = delete;
@@ -185,9 +180,8 @@ public:
         while ((length = read(fFd, buffer, sizeof buffer)) > 0) {
             for (ssize_t i = 0; i < length;) {
                 const auto* event = reinterpret_cast<const inotify_event*>(buffer + i);
-                if ((event->mask & IN_ISDIR) == 0 && (event->mask & IN_OPEN) != 0) {
+                if ((event->mask & IN_ISDIR) == 0 && (event->mask & IN_OPEN) != 0)
                     opened.insert(event->name);
-                }
                 changed |= (event->mask & (IN_MODIFY | IN_CREATE | IN_DELETE | IN_ATTRIB |
                                            IN_CLOSE_WRITE | IN_MOVE)) != 0;
                 i += static_cast<ssize_t>(sizeof *event + event->len);
@@ -233,9 +227,8 @@ const std::set<std::string>& HarmlessFiles()
 // Without the answers that drivers give on nodes: SleepingCardTest has those.
 std::set<std::string> WithoutAnswers(std::set<std::string> files)
 {
-    for (auto file = files.begin(); file != files.end();) {
+    for (auto file = files.begin(); file != files.end();)
         file = file->compare(0, 7, "renderD") == 0 ? files.erase(file) : std::next(file);
-    }
     return files;
 }
 
@@ -243,19 +236,16 @@ TEST_P(AdapterTreesTest, ReadingItOpensOnlyFilesThatWakeNoCardAndChangesNothing)
 {
     const AdapterTree tree(GetParam());
     Watch watch(tree.root());
-    if (!watch.valid()) {
+    if (!watch.valid())
         GTEST_SKIP() << "this machine can't watch folders";
-    }
     Join();
     watch.collect();
     EXPECT_FALSE(watch.changed);
     EXPECT_THAT(WithoutAnswers(watch.opened), IsSubsetOf(HarmlessFiles()));
-    if (!QGF::DisplayAdapters().empty()) {
+    if (!QGF::DisplayAdapters().empty())
         EXPECT_THAT(watch.opened, AnyOf(Contains("vendor"), Contains("uevent")));
-    }
-    if (GetParam() == "hybrid-laptop") {
+    if (GetParam() == "hybrid-laptop")
         EXPECT_THAT(watch.opened, Not(Contains("information")));
-    }
 }
 
 // What a recorded machine has as a file is an answer that takes opening the node.
@@ -265,11 +255,9 @@ std::set<std::string> NodesOpened(const AdapterTree& tree)
     Join();
     watch.collect();
     std::set<std::string> nodes;
-    for (const std::string& name : watch.opened) {
-        if (name.compare(0, 7, "renderD") == 0) {
+    for (const std::string& name : watch.opened)
+        if (name.compare(0, 7, "renderD") == 0)
             nodes.insert(name);
-        }
-    }
     return nodes;
 }
 
@@ -277,9 +265,8 @@ TEST(SleepingCardTest, ANodeIsOpenedOnlyWhileItsCardIsAwake)
 {
     const AdapterTree tree("intel-arc-xe");
     const std::string status = "/sys/bus/pci/devices/0000:03:00.0/power/runtime_status";
-    if (!Watch(tree.root()).valid()) {
+    if (!Watch(tree.root()).valid())
         GTEST_SKIP() << "this machine can't watch folders";
-    }
     EXPECT_THAT(NodesOpened(tree), ElementsAre("renderD128.xe"));
     for (const char* state :
          {"suspended", "suspending", "resuming", "error", "unsupported", "", "activity"}) {
@@ -293,9 +280,8 @@ TEST(SleepingCardTest, ANodeIsOpenedOnlyWhileItsCardIsAwake)
 TEST(SleepingCardTest, OneOfTwoCardsAwakeIsAsked)
 {
     const AdapterTree tree("intel-arc-asleep");
-    if (!Watch(tree.root()).valid()) {
+    if (!Watch(tree.root()).valid())
         GTEST_SKIP() << "this machine can't watch folders";
-    }
     tree.write("/dev/dri/renderD129.i915", "what a sleeping card would say");
     EXPECT_THAT(NodesOpened(tree), ElementsAre("renderD128.i915"));
 }
@@ -306,9 +292,8 @@ std::string Row(const std::string& device)
     static const std::regex gForm("name=(.*)\nvendor=(.*) device=(.*)\ndriver=(.*) version=(.*) "
                                   "date=(.*)\nmemoryMB=(.*)\nintegrated=(.*)\n");
     std::smatch found;
-    if (!std::regex_match(device, found, gForm)) {
+    if (!std::regex_match(device, found, gForm))
         return device;
-    }
     const auto text = [&](std::size_t i) { return found[i].str().empty() ? "-" : found[i].str(); };
     return text(1) + " | " + text(2) + ":" + text(3) + " | " + text(7) + " MB | " + text(8) +
            " | " + text(4) + " | " + text(5) + " | " + text(6);

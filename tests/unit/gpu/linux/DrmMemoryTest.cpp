@@ -89,9 +89,8 @@ TEST(DrmMemoryTest, RadeonAndNouveauGiveOneFigure)
 TEST(DrmMemoryTest, AnAnswerThatIsCutShortIsNone)
 {
     const std::string whole = I915Head(2) + I915Region(0, kGiB) + I915Region(1, kGiB);
-    for (std::size_t length = 0; length != whole.size(); ++length) {
+    for (std::size_t length = 0; length != whole.size(); ++length)
         EXPECT_FALSE(MemoryInAnswer("i915", whole.substr(0, length))) << length;
-    }
     EXPECT_FALSE(MemoryInAnswer("xe", XeHead(1)));
     EXPECT_FALSE(MemoryInAnswer("radeon", std::string(23, '\1')));
     EXPECT_FALSE(MemoryInAnswer("nouveau", std::string(15, '\1')));
@@ -132,14 +131,12 @@ TEST(DrmMemoryTest, OtherRangesAreNoAperture)
     EXPECT_EQ(LargestPrefetchableBar("0x0 0x3fffffff 0x140204\n0x0 0xff 0x40101\n"), 0U);
     // The ROM, and what the function lends to its virtual ones, are no BARs of its own.
     std::string lines;
-    for (int i = 0; i != 6; ++i) {
+    for (int i = 0; i != 6; ++i)
         lines += kNothing;
-    }
     EXPECT_EQ(LargestPrefetchableBar(lines + "0x0 0x3fffffff 0x14220c\n"), 0U);
     for (const char* broken : {"0x0\n", "0x0 0x1000 what\n", "0x2 0x1 0x220c\n", "\n\n\n", "x x x",
-                               "0x0 0xffffffffffffffff 0x220c"}) {
+                               "0x0 0xffffffffffffffff 0x220c"})
         EXPECT_EQ(LargestPrefetchableBar(broken), 0U) << broken;
-    }
 }
 
 } // namespace

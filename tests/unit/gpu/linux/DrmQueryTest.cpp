@@ -139,9 +139,8 @@ protected:
     DrmQueryTest()
     {
         gKernel = Kernel();
-        for (std::size_t i = 0; i != GetParam().second; ++i) {
+        for (std::size_t i = 0; i != GetParam().second; ++i)
             gKernel.answer += static_cast<char>(i + 1);
-        }
     }
     const char* driver() const { return GetParam().first; }
 };

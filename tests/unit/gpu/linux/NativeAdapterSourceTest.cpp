@@ -34,9 +34,8 @@ AdapterDescriptor FirstDescriptor()
     NativeAdapterSource().CreateFactory(factory);
     std::unique_ptr<Adapter> adapter;
     AdapterDescriptor descriptor;
-    if (!Failed(factory->EnumAdapters(0, adapter))) {
+    if (!Failed(factory->EnumAdapters(0, adapter)))
         adapter->GetDesc(descriptor);
-    }
     return descriptor;
 }
 
@@ -169,9 +168,8 @@ std::string Outputs(std::uint32_t index)
     std::unique_ptr<AdapterFactory> factory;
     NativeAdapterSource().CreateFactory(factory);
     std::unique_ptr<Adapter> adapter;
-    if (Failed(factory->EnumAdapters(index, adapter))) {
+    if (Failed(factory->EnumAdapters(index, adapter)))
         return "none";
-    }
     std::string names;
     std::unique_ptr<AdapterOutput> output;
     for (std::uint32_t i = 0; !Failed(adapter->EnumOutputs(i, output)); ++i) {

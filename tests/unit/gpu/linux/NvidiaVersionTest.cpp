@@ -70,9 +70,8 @@ TEST(NvidiaVersionTest, PartsOutOfRangeAreNoDate)
          {"Aug 0 01:15:15 UTC 2023", "Aug 32 01:15:15 UTC 2023", "Aug 19 24:15:15 UTC 2023",
           "Aug 19 01:60:15 UTC 2023", "Aug 19 01:15:61 UTC 2023", "Aug 19 01:15:15 UTC 1023",
           "Aug 19 01:15 UTC 2023", "Aug 19 01:15:15 UTC", "Aug x 01:15:15 UTC 2023",
-          "Agu 19 01:15:15 UTC 2023", "Aug 119 01:15:15 UTC 2023", "Aug 19 01:15:15 UTC 20233"}) {
+          "Agu 19 01:15:15 UTC 2023", "Aug 119 01:15:15 UTC 2023", "Aug 19 01:15:15 UTC 20233"})
         EXPECT_EQ(ParseNvidiaVersion(std::string("NVRM version: 1.2 ") + date).date, "") << date;
-    }
 }
 
 TEST(NvidiaVersionTest, OtherTextsHaveNeither)

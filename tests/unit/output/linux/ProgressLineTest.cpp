@@ -56,10 +56,9 @@ public:
         constexpr int kMinute = 60'000;
         pollfd control = {fControl, POLLIN, 0};
         while (fText.size() < end.size() ||
-               fText.compare(fText.size() - end.size(), end.size(), end) != 0) {
+               fText.compare(fText.size() - end.size(), end.size(), end) != 0)
             if (::poll(&control, 1, kMinute) != 1 || !Read())
                 return false;
-        }
         return true;
     }
 

@@ -19,10 +19,9 @@ namespace {
 ::pid_t StartSleeper()
 {
     const ::pid_t pid = ::fork();
-    if (pid == 0) {
+    if (pid == 0)
         for (;;)
             ::pause();
-    }
     return pid;
 }
 

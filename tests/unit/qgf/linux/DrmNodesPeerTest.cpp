@@ -28,11 +28,9 @@ using Nodes = std::map<std::string, std::string>;
 Nodes PciNodesOf(const drmDevice& device)
 {
     Nodes nodes;
-    for (const int kind : {DRM_NODE_PRIMARY, DRM_NODE_RENDER}) {
-        if (device.bustype == DRM_BUS_PCI && (device.available_nodes & (1 << kind)) != 0) {
+    for (const int kind : {DRM_NODE_PRIMARY, DRM_NODE_RENDER})
+        if (device.bustype == DRM_BUS_PCI && (device.available_nodes & (1 << kind)) != 0)
             nodes[LastOfPath(device.nodes[kind])] = AddressOf(*device.businfo.pci);
-        }
-    }
     return nodes;
 }
 
@@ -53,21 +51,16 @@ TEST(DrmNodesPeerTest, LibdrmHasTheSameNodesOnPci)
     drmDevicePtr devices[64];
     const int count = getDevices(0, devices, 64);
     Nodes theirs;
-    for (int i = 0; i < count; ++i) {
+    for (int i = 0; i < count; ++i)
         theirs.merge(PciNodesOf(*devices[i]));
-    }
-    if (count > 0) {
+    if (count > 0)
         freeDevices(devices, count);
-    }
-    if (theirs.empty()) {
+    if (theirs.empty())
         GTEST_SKIP() << "this machine has no DRM node on PCI";
-    }
     Nodes ours;
-    for (const DrmNode& node : DrmNodes()) {
-        if (!node.firmware && AdapterFolder(node.place).compare(0, 9, "/sys/bus/") == 0) {
+    for (const DrmNode& node : DrmNodes())
+        if (!node.firmware && AdapterFolder(node.place).compare(0, 9, "/sys/bus/") == 0)
             ours[node.name] = node.place;
-        }
-    }
     EXPECT_EQ(ours, theirs);
 }
 

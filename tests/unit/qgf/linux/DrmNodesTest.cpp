@@ -19,9 +19,8 @@ using Texts = std::vector<std::string>;
 Texts Places()
 {
     Texts texts;
-    for (const DrmNode& node : DrmNodes()) {
+    for (const DrmNode& node : DrmNodes())
         texts.push_back(node.name + " " + node.place + (node.firmware ? " firmware" : ""));
-    }
     return texts;
 }
 
@@ -53,9 +52,8 @@ TEST(DrmNodesTest, OtherFilesHaveNoAdapter)
 {
     const AdapterTree tree("amd-discrete");
     for (const char* file : {"", "/dev/dri/", "/dev/dri/card9", "/dev/dri/card", "/dev/dri/version",
-                             "/dev/dri/card0-DP-1", "/dev/dri/../../etc/passwd", "/dev/nvidia0"}) {
+                             "/dev/dri/card0-DP-1", "/dev/dri/../../etc/passwd", "/dev/nvidia0"})
         EXPECT_EQ(AdapterOfDrmNode(file), "") << file;
-    }
 }
 
 TEST(DrmNodesTest, OnPciTheFunctionIsTheAdapter)
@@ -115,9 +113,8 @@ TEST(DrmNodesTest, LinksToOtherPathsAreIgnored)
                                "../../devices/platform/gpu/drm/card1", "/nowhere/at/all"}) {
         const AdapterTree tree("empty");
         std::filesystem::create_directories(tree.root() + "/sys/class/drm");
-        if (*target != '\0') {
+        if (*target != '\0')
             std::filesystem::create_symlink(target, tree.root() + "/sys/class/drm/card0");
-        }
         EXPECT_THAT(DrmNodes(), IsEmpty()) << target;
     }
 }

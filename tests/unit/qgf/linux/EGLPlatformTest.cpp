@@ -119,10 +119,9 @@ EGLBoolean BindAPI(EGLenum api)
 
 bool HasPair(const EGLint* attributes, EGLint name, EGLint value)
 {
-    for (; *attributes != EGL_NONE; attributes += 2) {
+    for (; *attributes != EGL_NONE; attributes += 2)
         if (attributes[0] == name && attributes[1] == value)
             return true;
-    }
     return false;
 }
 
@@ -180,10 +179,9 @@ EGLBoolean QueryDevices(EGLint size, EGLDeviceEXT* devices, EGLint* count)
         return EGL_FALSE;
     const auto known = static_cast<EGLint>(gScript->devices.size());
     *count = gScript->claimedDevices.value_or(known);
-    if (devices != nullptr) {
+    if (devices != nullptr)
         for (EGLint i = 0; i < std::min(size, known); ++i)
             devices[i] = AsHandle<EGLDeviceEXT>(static_cast<std::size_t>(i) + 1);
-    }
     return EGL_TRUE;
 }
 

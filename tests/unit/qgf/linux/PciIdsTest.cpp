@@ -55,9 +55,8 @@ TEST(PciIdsTest, LineEndsAndBlanksAreTrimmed)
 TEST(PciIdsTest, TruncatedTextsHaveNoName)
 {
     const std::string text = "1002  A\n\t744c  B\n";
-    for (std::size_t length = 0; length + 2 < text.size(); ++length) {
+    for (std::size_t length = 0; length + 2 < text.size(); ++length)
         EXPECT_EQ(FindPciName(text.substr(0, length), 0x1002, 0x744C), "") << length;
-    }
 }
 
 TEST(PciIdsTest, TheDatabaseIsReadFromEitherPath)
@@ -75,9 +74,8 @@ TEST(PciIdsTest, TheDatabaseIsReadFromEitherPath)
 TEST(PciIdsTest, TheLibraryAndTheTextAgree)
 {
     std::string database;
-    if (!ReadSystemFile("/usr/share/misc/pci.ids", database, std::size_t{16} << 20)) {
+    if (!ReadSystemFile("/usr/share/misc/pci.ids", database, std::size_t{16} << 20))
         GTEST_SKIP() << "no PCI id database on this machine";
-    }
     const char* const names[] = {"libpciaccess.so.0", nullptr};
     try {
         Core::OpenLibrary(names);

@@ -73,10 +73,9 @@ void PixmereTester::DoRunGLTests()
     GPUAssayTester::DoRunGLTests();
     GPUEntries entries = fGLGPUs;
     const std::size_t size = entries.size();
-    if (!entries.empty()) {
+    if (!entries.empty())
         for (const BatteryRow& row : kBattery)
             RunRow(*this, entries, row);
-    }
     if (entries.size() != size)
         fGLGPUs = entries;
 }

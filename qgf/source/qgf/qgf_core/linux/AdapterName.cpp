@@ -61,16 +61,13 @@ std::vector<std::string> FindAdapters()
 {
     std::set<std::string> onPci;
     std::set<std::string> elsewhere;
-    for (const DrmNode& node : DrmNodes()) {
+    for (const DrmNode& node : DrmNodes())
         (IsPciAddress(node.place) ? onPci : elsewhere).insert(node.place);
-    }
     std::vector<std::string> adapters;
-    for (const std::string& address : ListSystemFolder(kPciDevices)) {
+    for (const std::string& address : ListSystemFolder(kPciDevices))
         if (IsPciAddress(address) &&
-            (onPci.count(address) != 0 || IdOf(address, "class") >> 16 == kDisplayClass)) {
+            (onPci.count(address) != 0 || IdOf(address, "class") >> 16 == kDisplayClass))
             adapters.push_back(address);
-        }
-    }
     adapters.insert(adapters.end(), elsewhere.begin(), elsewhere.end());
     return adapters;
 }
@@ -87,16 +84,14 @@ std::string Plain(const std::string& name)
 {
     std::string plain;
     for (const char c : name) {
-        if (static_cast<unsigned char>(c) >= 0x80 && static_cast<unsigned char>(c) < 0xC0) {
+        if (static_cast<unsigned char>(c) >= 0x80 && static_cast<unsigned char>(c) < 0xC0)
             continue; // a UTF-8 continuation byte: the lead byte has become '?'
-        }
-        if (c == '"') {
+        if (c == '"')
             plain += '\'';
-        } else if (c == '\\') {
+        else if (c == '\\')
             plain += '/';
-        } else {
+        else
             plain += c >= ' ' && c <= '~' ? c : '?';
-        }
     }
     plain.resize(std::min(plain.size(), kMaxNameLength));
     return plain;
@@ -107,15 +102,12 @@ std::string PciNameOf(const std::string& address, PciIds& ids)
     const std::uint16_t vendor = ShortIdOf(address, "vendor");
     const std::uint16_t device = ShortIdOf(address, "device");
     std::string name;
-    if (vendor == kNvidia) {
+    if (vendor == kNvidia)
         name = Plain(NvidiaModel(address));
-    }
-    if (name.empty()) {
+    if (name.empty())
         name = Plain(AttributeOf(address, "product_name"));
-    }
-    if (name.empty()) {
+    if (name.empty())
         name = Plain(ids.name(vendor, device));
-    }
     return name.empty() ? HexName(vendor, device) : name;
 }
 
@@ -125,9 +117,8 @@ std::string DeviceNameOf(const std::string& place)
     std::string uevent;
     ReadSystemFile(AdapterFolder(place) + "uevent", uevent);
     std::string name = Plain(UeventValue(uevent, "OF_COMPATIBLE_0"));
-    if (name.empty()) {
+    if (name.empty())
         name = Plain(LastOfPath(ReadSystemLink(AdapterFolder(place) + "driver")));
-    }
     return name.empty() ? Plain(LastOfPath(place)) : name;
 }
 
@@ -144,20 +135,17 @@ Adapters ReadAdapters()
         ++uses[name];
     }
     int elsewhere = 0;
-    for (auto& [place, name] : adapters.names) {
-        if (uses[name] > 1) {
+    for (auto& [place, name] : adapters.names)
+        if (uses[name] > 1)
             name += " (" + (IsPciAddress(place) ? place : std::to_string(++elsewhere)) + ")";
-        }
-    }
     return adapters;
 }
 
 const Adapters& GetAdapters()
 {
     static std::unique_ptr<Adapters> gKnown;
-    if (!gKnown || gKnown->rootCount != SystemRootCount()) {
+    if (!gKnown || gKnown->rootCount != SystemRootCount())
         gKnown = std::make_unique<Adapters>(ReadAdapters());
-    }
     return *gKnown;
 }
 
@@ -193,40 +181,33 @@ std::vector<std::string> NvidiaAdapters(const std::vector<std::string>& names,
     std::vector<std::string> cards = NvidiaCards();
     const bool listed = !cards.empty();
     if (!listed) {
-        for (const std::string& address : DisplayAdapters()) {
-            if (ShortIdOf(address, "vendor") == kNvidia) {
+        for (const std::string& address : DisplayAdapters())
+            if (ShortIdOf(address, "vendor") == kNvidia)
                 cards.push_back(address);
-            }
-        }
     }
     cards.erase(std::remove_if(cards.begin(), cards.end(), isTaken), cards.end());
     if (!listed) {
-        if (names.size() == 1 && cards.size() == 1) {
+        if (names.size() == 1 && cards.size() == 1)
             addresses[0] = cards[0];
-        }
         return addresses;
     }
 
     std::map<std::string, std::string> models;
-    for (const std::string& card : cards) {
+    for (const std::string& card : cards)
         models[card] = NvidiaModel(card);
-    }
     std::vector<std::string*> unassigned;
     for (std::size_t i = 0; i != names.size(); ++i) {
         const auto card = std::find_if(cards.begin(), cards.end(), [&](const std::string& address) {
             return !names[i].empty() && models[address] == names[i];
         });
-        if (card == cards.end()) {
+        if (card == cards.end())
             unassigned.push_back(&addresses[i]);
-        } else {
+        else
             Assign(cards, card, addresses[i]);
-        }
     }
-    if (unassigned.size() == cards.size()) {
-        for (std::string* address : unassigned) {
+    if (unassigned.size() == cards.size())
+        for (std::string* address : unassigned)
             Assign(cards, cards.begin(), *address);
-        }
-    }
     return addresses;
 }
 

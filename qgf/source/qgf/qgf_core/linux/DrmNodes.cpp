@@ -42,9 +42,8 @@ std::string DeviceOfNode(const std::string& name)
     const std::string tail = "/drm/" + name;
     const std::size_t begin = link.find(gDevices);
     if (begin == std::string::npos || link.size() < begin + gDevices.size() + tail.size() ||
-        link.compare(link.size() - tail.size(), tail.size(), tail) != 0) {
+        link.compare(link.size() - tail.size(), tail.size(), tail) != 0)
         return std::string();
-    }
     return link.substr(begin + gDevices.size(),
                        link.size() - tail.size() - begin - gDevices.size());
 }
@@ -53,9 +52,8 @@ DrmNode Locate(const std::string& name)
 {
     DrmNode node;
     const std::string device = DeviceOfNode(name);
-    if (device.empty()) {
+    if (device.empty())
         return node;
-    }
     node.name = name;
     node.device = kDevices + device;
     const std::string last = LastOfPath(device);
@@ -68,11 +66,10 @@ DrmNode Locate(const std::string& name)
                     std::end(kFirmwareDrivers);
     const std::string parent =
         LastOfPath(device.substr(0, std::min(device.rfind('/'), device.size())));
-    if (IsPciAddress(parent) && (node.firmware || IsNumbered(last, "virtio"))) {
+    if (IsPciAddress(parent) && (node.firmware || IsNumbered(last, "virtio")))
         node.place = parent;
-    } else if (!node.firmware && !driver.empty()) {
+    else if (!node.firmware && !driver.empty())
         node.place = device;
-    }
     return node;
 }
 
@@ -84,9 +81,8 @@ std::vector<DrmNode> DrmNodes()
     for (const std::string& name : ListSystemFolder(kDrmClass)) {
         if (IsDrmNode(name)) {
             DrmNode node = Locate(name);
-            if (!node.place.empty()) {
+            if (!node.place.empty())
                 nodes.push_back(std::move(node));
-            }
         }
     }
     return nodes;

@@ -19,9 +19,8 @@ std::string NvidiaField(const std::string& information, const std::string& key)
         if (information.compare(begin, key.size(), key) == 0 && begin + key.size() < end &&
             information[begin + key.size()] == ':') {
             const std::size_t first = information.find_first_not_of(blanks, begin + key.size() + 1);
-            if (first == std::string::npos || first >= end) {
+            if (first == std::string::npos || first >= end)
                 return std::string();
-            }
             return information.substr(first,
                                       information.find_last_not_of(blanks, end - 1) - first + 1);
         }
@@ -38,9 +37,8 @@ std::string NvidiaModel(const std::string& pciAddress)
     // (Documentation/ABI/testing/sysfs-devices-power).
     const std::string power =
         ReadSystemLine("/sys/bus/pci/devices/" + pciAddress + "/power/runtime_status");
-    if (power == "suspended" || power == "suspending") {
+    if (power == "suspended" || power == "suspending")
         return std::string();
-    }
     std::string information;
     ReadSystemFile(std::string(kCards) + "/" + pciAddress + "/information", information);
     const std::string model = NvidiaField(information, "Model");
@@ -50,11 +48,9 @@ std::string NvidiaModel(const std::string& pciAddress)
 std::vector<std::string> NvidiaCards()
 {
     std::vector<std::string> cards;
-    for (const std::string& name : ListSystemFolder(kCards)) {
-        if (IsPciAddress(name)) {
+    for (const std::string& name : ListSystemFolder(kCards))
+        if (IsPciAddress(name))
             cards.push_back(name);
-        }
-    }
     return cards;
 }
 

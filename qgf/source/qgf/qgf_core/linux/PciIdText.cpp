@@ -8,15 +8,13 @@ namespace {
 // The name in a line "xxxx  name"; empty if the line's id isn't `id`.
 std::string_view NameOf(std::string_view line, const char (&id)[5])
 {
-    if (line.substr(0, 4) != std::string_view(id, 4) || line.size() < 6 || line[4] != ' ') {
+    if (line.substr(0, 4) != std::string_view(id, 4) || line.size() < 6 || line[4] != ' ')
         return std::string_view();
-    }
     line.remove_prefix(line.find_first_not_of(' ', 4) == std::string_view::npos
                            ? line.size()
                            : line.find_first_not_of(' ', 4));
-    while (!line.empty() && (line.back() == ' ' || line.back() == '\r')) {
+    while (!line.empty() && (line.back() == ' ' || line.back() == '\r'))
         line.remove_suffix(1);
-    }
     return line;
 }
 
@@ -46,23 +44,19 @@ std::string FindPciName(const std::string& database, std::uint16_t vendor, std::
         const std::size_t end = rest.find('\n');
         const std::string_view line = rest.substr(0, end);
         rest.remove_prefix(end == std::string_view::npos ? rest.size() : end + 1);
-        if (line.empty() || line[0] == '#') {
+        if (line.empty() || line[0] == '#')
             continue;
-        }
         if (line[0] != '\t') {
-            if (!vendorName.empty()) {
+            if (!vendorName.empty())
                 break;
-            }
             vendorName = NameOf(line, vendorId);
             continue;
         }
-        if (vendorName.empty() || line.size() < 2 || line[1] == '\t') {
+        if (vendorName.empty() || line.size() < 2 || line[1] == '\t')
             continue;
-        }
         const std::string_view deviceName = NameOf(line.substr(1), deviceId);
-        if (!deviceName.empty()) {
+        if (!deviceName.empty())
             return std::string(vendorName).append(" ").append(deviceName);
-        }
     }
     return std::string();
 }

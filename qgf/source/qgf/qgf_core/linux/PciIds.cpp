@@ -37,9 +37,8 @@ GetStrings LoadGetStrings()
 std::string LibraryName(std::uint16_t vendor, std::uint16_t device)
 {
     static const GetStrings gGetStrings = LoadGetStrings();
-    if (!gGetStrings) {
+    if (!gGetStrings)
         return std::string();
-    }
     pci_id_match match{};
     match.vendor_id = vendor;
     match.device_id = device;
@@ -48,9 +47,8 @@ std::string LibraryName(std::uint16_t vendor, std::uint16_t device)
     const char* deviceName = nullptr;
     const char* vendorName = nullptr;
     gGetStrings(&match, &deviceName, &vendorName, nullptr, nullptr);
-    if (!deviceName || !vendorName) {
+    if (!deviceName || !vendorName)
         return std::string();
-    }
     return std::string(vendorName) + " " + deviceName;
 }
 
@@ -60,17 +58,14 @@ std::string PciIds::name(std::uint16_t vendor, std::uint16_t device)
 {
     if (SystemRoot().empty()) {
         std::string name = LibraryName(vendor, device);
-        if (!name.empty()) {
+        if (!name.empty())
             return name;
-        }
     }
     if (!fRead) {
         fRead = true;
-        for (const char* path : kDatabases) {
-            if (ReadSystemFile(path, fDatabase, kMaxDatabaseSize)) {
+        for (const char* path : kDatabases)
+            if (ReadSystemFile(path, fDatabase, kMaxDatabaseSize))
                 break;
-            }
-        }
     }
     return FindPciName(fDatabase, vendor, device);
 }

@@ -19,9 +19,8 @@ public:
     explicit Descriptor(int fd) : fFd(fd) {}
     ~Descriptor()
     {
-        if (fFd >= 0) {
+        if (fFd >= 0)
             close(fFd);
-        }
     }
     Descriptor(const Descriptor&) = delete;
     Descriptor& operator=(const Descriptor&) = delete;
@@ -37,14 +36,12 @@ bool ReadAll(int fd, std::string& text, std::size_t maxSize)
     while (text.size() < maxSize) {
         const ssize_t count = read(fd, block, std::min(sizeof block, maxSize - text.size()));
         if (count < 0) {
-            if (errno == EINTR) {
+            if (errno == EINTR)
                 continue;
-            }
             return false;
         }
-        if (count == 0) {
+        if (count == 0)
             break;
-        }
         text.append(block, static_cast<std::size_t>(count));
     }
     return true;
@@ -59,13 +56,11 @@ bool ReadSystemFile(const std::string& path, std::string& text, std::size_t maxS
     // Check the type before the open: opening a pipe would block, and opening a device node may
     // have an effect. Check again after it, since the file may have been replaced.
     struct stat status {};
-    if (stat(full.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
+    if (stat(full.c_str(), &status) != 0 || !S_ISREG(status.st_mode))
         return false;
-    }
     const Descriptor file(open(full.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC | O_NOCTTY));
-    if (file.get() < 0 || fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode)) {
+    if (file.get() < 0 || fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode))
         return false;
-    }
     if (!ReadAll(file.get(), text, maxSize)) {
         text.clear();
         return false;
@@ -80,9 +75,8 @@ std::string ReadSystemLine(const std::string& path)
     text.resize(std::min(text.find('\n'), text.size()));
     const char* const blanks = " \t\r";
     const std::size_t first = text.find_first_not_of(blanks);
-    if (first == std::string::npos) {
+    if (first == std::string::npos)
         return std::string();
-    }
     return text.substr(first, text.find_last_not_of(blanks) - first + 1);
 }
 
@@ -91,18 +85,15 @@ std::vector<std::string> ListSystemFolder(const std::string& path)
     std::vector<std::string> names;
     const std::unique_ptr<DIR, int (*)(DIR*)> folder(opendir((SystemRoot() + path).c_str()),
                                                      closedir);
-    if (!folder) {
+    if (!folder)
         return names;
-    }
     while (names.size() < kMaxFolderEntries) {
         // NOLINTNEXTLINE(concurrency-mt-unsafe): the stream is local to this call.
         const dirent* const entry = readdir(folder.get());
-        if (!entry) {
+        if (!entry)
             break;
-        }
-        if (entry->d_name[0] != '.') {
+        if (entry->d_name[0] != '.')
             names.emplace_back(entry->d_name);
-        }
     }
     std::sort(names.begin(), names.end());
     return names;
