@@ -1,4 +1,5 @@
-// What a launch takes: the child gets exactly the arguments that were asked for.
+// Makes the command of a child so that it receives exactly the given arguments. Any thread may
+// call.
 #pragma once
 
 #include <deque>
@@ -11,18 +12,18 @@
 
 namespace assay_host {
 
-// The program and the arguments of a pmutil::LaunchParams.
+// The program and the arguments for a pmutil::LaunchParams.
 struct ChildCommand {
     std::wstring fProgram;
     std::deque<std::string> fArgs;
 };
 
-// `program` is a path; all texts are UTF-8. On Windows fProgram holds the whole command line, which
-// the launcher passes on unchanged; its own quoting of arguments can't express all of them.
+// `program` is a path; all texts are UTF-8. On Windows fProgram is the whole command line, which
+// the launcher passes on unchanged: the launcher's own quoting can't express every argument.
 ChildCommand MakeChildCommand(const std::string& program, const std::vector<std::string>& args);
 
-// The launcher of this platform. On Linux its child is in a process group of its own, so that a
-// signal that the child sends to its group doesn't reach this process.
+// Makes the launcher of this platform. On Linux its child is in a process group of its own, so that
+// a signal that the child sends to its group doesn't reach this process.
 boost::shared_ptr<pmutil::Launcher> MakeChildLauncher();
 
 } // namespace assay_host

@@ -1,4 +1,4 @@
-// Standard error of a child as lines, within limits.
+// Splits a child's standard error into lines.
 #pragma once
 
 #include <cstddef>
@@ -9,18 +9,21 @@
 
 namespace assay_host {
 
+// One thread at a time.
 class ErrorLines {
 public:
+    // Bytes beyond these limits are dropped and counted.
     static constexpr std::uint64_t kMaxBytes = std::uint64_t{1} << 20;
     static constexpr std::size_t kMaxLineBytes = std::size_t{1} << 16;
     static constexpr std::size_t kMaxLines = 10000;
 
-    // The lines that these bytes complete, without their ends.
+    // Returns the lines that these bytes complete, without "\n" or "\r\n".
     std::vector<std::string> Feed(std::string_view bytes);
 
-    // A last line without an end.
+    // Call at the end of the data. Returns the last line if it has no end.
     std::vector<std::string> Finish();
 
+    // Returns the number of bytes dropped so far.
     std::uint64_t GetLostByteCount() const { return fLost; }
 
 private:

@@ -1,5 +1,5 @@
-// Brings what the threads of a launch see to the thread that supervises it. Holds a bounded number
-// of bytes: who brings more waits until some were taken.
+// Passes events from the threads of a launch to the thread that supervises it. Holds a bounded
+// number of bytes.
 #pragma once
 
 #include <chrono>
@@ -30,17 +30,17 @@ struct Event {
 // Any thread may call.
 class EventQueue {
 public:
-    // Waits while too many bytes are held. After Close it drops the event.
+    // Appends an event. Blocks while the queue is full. After Close the event is dropped.
     void Push(Event event);
 
-    // The oldest event; nothing if none came within the limit (of the steady clock) or before a
-    // Wake.
+    // Returns the oldest event. Waits for one up to the limit, by the steady clock; returns nothing
+    // if none comes, or Wake is called.
     std::optional<Event> Pop(std::chrono::milliseconds limit);
 
-    // Ends the wait of the current Pop, else of the next one.
+    // Ends the wait of the current Pop, or of the next one.
     void Wake();
 
-    // Nobody will take events any more.
+    // Drops all events and ends all waits. Call when no events will be popped any more.
     void Close();
 
 private:

@@ -5,7 +5,7 @@
 
 namespace assay_host {
 
-// The exit status that a waiting process gets.
+// Returns the exit status that a waiting process receives for `returned`. Any thread may call.
 std::int64_t GetReportedStatus(std::int32_t returned);
 
 } // namespace assay_host

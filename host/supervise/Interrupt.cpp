@@ -20,7 +20,7 @@ struct Notes {
 
 Notes& GetNotes()
 {
-    static Notes& notes = *new Notes; // the watching thread outlives statics
+    static Notes& notes = *new Notes; // never deleted: the watching thread outlives statics
     return notes;
 }
 

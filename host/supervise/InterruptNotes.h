@@ -1,4 +1,4 @@
-// What the platform's code reports to the neutral code about interrupts.
+// The interface from the platforms' code of interrupts to the neutral code.
 #pragma once
 
 #include <memory>
@@ -7,10 +7,10 @@
 
 namespace assay_host {
 
-// The request that an interrupt raises.
+// Sets the request that an interrupt raises. Any thread may call.
 void SetInterruptStop(std::shared_ptr<StopRequest> stop);
 
-// Reports an interrupt. Any thread may call, but no signal handler.
+// Reports an interrupt. Any thread may call; a signal handler must not.
 void NoteInterrupt();
 
 } // namespace assay_host

@@ -20,13 +20,7 @@ bool StartsWith(const std::string& text, const char* start)
     return text.rfind(start, 0) == 0;
 }
 
-bool TellsFailure(const std::string& line)
-{
-    return StartsWith(line, "exception: ") || StartsWith(line, "QGF::LogicalException: ") ||
-           line == "unknown exception";
-}
-
-bool TellsUsage(const std::string& line)
+bool IsUsageLine(const std::string& line)
 {
     return StartsWith(line, "Usage exception: ") || StartsWith(line, "usage: ");
 }
@@ -37,34 +31,34 @@ std::string FindErrorLine(const RunOutcome& outcome, bool (*matches)(const std::
     return line == outcome.fErrorLines.end() ? std::string() : *line;
 }
 
-// A status that is too large to be told from a crash is known by its code.
-bool IsAskedFor(const Evidence& evidence, std::int64_t asked)
+// An exit status above 255 on Windows counts as a crash, so that its code has to be compared.
+bool HasStatus(const Evidence& evidence, std::int64_t status)
 {
     if (evidence.fEnd->fResult == pmutil::kEndedNormally)
-        return evidence.fEnd->fExitCode == asked;
-    return evidence.fTermination == fmt::format("code 0x{:08X}", asked);
+        return evidence.fEnd->fExitCode == status;
+    return evidence.fTermination == fmt::format("code 0x{:08X}", status);
 }
 
-// Behind which line, and in which question.
+// Returns where the report stopped, as the end of a sentence.
 std::string Where(const ReportProgress& report)
 {
     if (!report.HasValues())
         return " before its first line";
     const std::string next = report.GetSequence().GetNextKey();
-    return fmt::format(" behind {}{}", report.GetLastKey(), next.empty() ? "" : ", at " + next);
+    return fmt::format(" after {}{}", report.GetLastKey(), next.empty() ? "" : ", at " + next);
 }
 
 void JudgeNormalEnd(const Evidence& evidence, RunOutcome& outcome)
 {
     const int status = evidence.fEnd->fExitCode;
-    const std::string failure = FindErrorLine(outcome, TellsFailure);
+    const std::string failure = FindErrorLine(outcome, IsFailureLine);
     if (status == kUsageStatus && !evidence.fReport.HasValues() &&
-        !FindErrorLine(outcome, TellsUsage).empty()) {
+        !FindErrorLine(outcome, IsUsageLine).empty()) {
         outcome.fVerdict = Verdict::kUsageError;
-        outcome.fReason = "The child refused its command line.";
+        outcome.fReason = "The child rejected its command line.";
     } else if (!evidence.fReport.IsWhole()) {
         outcome.fVerdict = Verdict::kFailedTests;
-        outcome.fReason = fmt::format("The report broke off{}; the child ended with status {}{}.",
+        outcome.fReason = fmt::format("The report stopped{}; the child ended with status {}{}.",
                                       Where(evidence.fReport), status,
                                       failure.empty() ? "" : " (" + failure + ")");
     } else {
@@ -74,16 +68,16 @@ void JudgeNormalEnd(const Evidence& evidence, RunOutcome& outcome)
     }
 }
 
-// An -exit= of 2 can't be told from failed tests but by what standard error says.
+// With -exit=2 the status doesn't show whether tests failed; only standard error does.
 bool IsComplete(const Evidence& evidence, const RunOutcome& outcome)
 {
     if (!evidence.fReport.IsWhole())
         return false;
     const std::vector<std::string> options(outcome.fCommand.begin() + 1, outcome.fCommand.end());
-    const std::int64_t asked = GetReportedStatus(GetAskedStatus(options));
-    if (!IsAskedFor(evidence, asked))
+    const std::int64_t requested = GetReportedStatus(GetRequestedStatus(options));
+    if (!HasStatus(evidence, requested))
         return false;
-    return asked != kFailedStatus || FindErrorLine(outcome, TellsFailure).empty();
+    return requested != kFailedStatus || FindErrorLine(outcome, IsFailureLine).empty();
 }
 
 } // namespace
@@ -133,16 +127,22 @@ void Judge(const Evidence& evidence, RunOutcome& outcome)
     } else if (evidence.fKillReason == KillReason::kTimeout) {
         outcome.fVerdict = Verdict::kHung;
         outcome.fReason = fmt::format(
-            "The child did not end within {:g} s and was {}{}.", outcome.fTimeoutSeconds,
-            evidence.fEnd ? "killed" : "told to die, which it did not,", Where(evidence.fReport));
+            "The child did not end within {:g} s and {}{}.", outcome.fTimeoutSeconds,
+            evidence.fEnd ? "was killed" : "could not be killed", Where(evidence.fReport));
     } else {
         outcome.fVerdict = Verdict::kCrashed;
-        outcome.fReason =
-            fmt::format("The child died of {}{}.", outcome.fTermination, Where(evidence.fReport));
+        outcome.fReason = fmt::format("The child crashed with {}{}.", outcome.fTermination,
+                                      Where(evidence.fReport));
     }
 }
 
-std::int32_t GetAskedStatus(const std::vector<std::string>& options)
+bool IsFailureLine(const std::string& line)
+{
+    return StartsWith(line, "exception: ") || StartsWith(line, "QGF::LogicalException: ") ||
+           line == "unknown exception";
+}
+
+std::int32_t GetRequestedStatus(const std::vector<std::string>& options)
 {
     std::int32_t status = 0;
     for (const std::string& word : options) {

@@ -1,4 +1,4 @@
-// The verdict on a run, from what was seen of it.
+// Derives the verdict on a run from what was observed. One thread at a time.
 #pragma once
 
 #include <cstdint>
@@ -13,16 +13,25 @@
 
 namespace assay_host {
 
-// What the report has shown, line by line.
+// The state of a report while it arrives.
 class ReportProgress {
 public:
+    // Reads the next line. Any line is accepted.
     void Add(const ReportLine& line);
 
+    // Whether a key=value line has come.
     bool HasValues() const { return fHasValues; }
+
+    // Whether the start stamp and the end stamp have come, both whole.
     bool IsWhole() const { return fHasStart && fHasEnd; }
+
+    // Returns the last key=value line and its key; empty if there is none.
     const std::string& GetLastReportLine() const { return fLastReportLine; }
     const std::string& GetLastKey() const { return fLastKey; }
+
+    // Returns the last log line after the last key=value line; empty if there is none.
     const std::string& GetLastLogLine() const { return fLastLogLine; }
+
     const SequenceReader& GetSequence() const { return fSequence; }
 
 private:
@@ -35,22 +44,27 @@ private:
     SequenceReader fSequence;
 };
 
-// Why the host ended the child.
+// Why the host killed the child.
 enum class KillReason { kNone, kTimeout, kInterrupt };
 
+// What was observed of a run.
 struct Evidence {
-    std::string fStartFailure;    // why there was no child; empty if there was one
-    std::optional<ChildEnd> fEnd; // nothing if the child's end wasn't seen
-    std::string fTermination;     // what ended it, if it didn't itself
+    std::string fStartFailure;    // why the child could not be started; empty if it was
+    std::optional<ChildEnd> fEnd; // empty if the child's end was not observed
+    std::string fTermination;     // what ended the child, if it didn't end by itself
     KillReason fKillReason = KillReason::kNone;
     ReportProgress fReport;
 };
 
-// Fills in the verdict, the exit status, the termination, the reason and the last lines. Takes the
-// options and the error lines from the outcome.
+// Sets the verdict, the exit status, the termination, the reason and the last lines of the outcome.
+// Its command and its error lines must be set before.
 void Judge(const Evidence& evidence, RunOutcome& outcome);
 
-// What the options make the child's main return with -exit=; the last one counts.
-std::int32_t GetAskedStatus(const std::vector<std::string>& options);
+// Whether the line of standard error is the child's message of a failure: "exception: TEXT",
+// "QGF::LogicalException: TEXT" or "unknown exception".
+bool IsFailureLine(const std::string& line);
+
+// Returns the value of the last -exit= option as the child parses it; 0 without one.
+std::int32_t GetRequestedStatus(const std::vector<std::string>& options);
 
 } // namespace assay_host

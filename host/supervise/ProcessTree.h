@@ -1,12 +1,12 @@
-// What a supervised child leaves behind: processes that it started and that go on without it.
+// The processes that a supervised child leaves behind.
 #pragma once
 
 #include <memory>
 
 namespace assay_host {
 
-// From its construction on, what the children of this process leave behind stays in reach. Children
-// that this process has had before are left alone; make it when no other launch is under way.
+// From its construction on, keeps track of the descendants of this process. Children that existed
+// before are excluded; construct it while no launch is in progress. One thread at a time.
 class ProcessTree {
 public:
     ProcessTree();
@@ -14,8 +14,9 @@ public:
     ProcessTree(const ProcessTree&) = delete;
     ProcessTree& operator=(const ProcessTree&) = delete;
 
-    // Ends by force whatever descends from the children since, which themselves have ended. False
-    // if something is left after so many seconds, or the system doesn't report it.
+    // Kills all descendants that were started since the construction. Call after the children
+    // themselves have ended. Returns false if some are left after this time, by the system's clock,
+    // or if the system doesn't report them.
     bool EndAll(double seconds);
 
 private:

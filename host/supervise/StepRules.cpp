@@ -1,7 +1,6 @@
 #include "supervise/StepRules.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <iterator>
 #include <regex>
 #include <set>
@@ -10,6 +9,8 @@
 #include <fmt/format.h>
 
 #include "report/Bytes.h"
+#include "report/Numbers.h"
+#include "supervise/Judge.h"
 
 namespace assay_host {
 
@@ -20,7 +21,7 @@ constexpr int kFailedStatus = 2;
 constexpr char kCrashText[] = "exception: programmed failure";
 constexpr char kThrowText[] = "exception: Programmed throw";
 
-// What enumerating the OpenGL devices may say.
+// The messages that enumerating the OpenGL devices may print.
 const std::set<std::string>& GetEnumerationTexts()
 {
     static const std::set<std::string> texts = {
@@ -30,18 +31,13 @@ const std::set<std::string>& GetEnumerationTexts()
     return texts;
 }
 
-bool IsFailure(const std::string& line)
-{
-    return line.rfind("exception: ", 0) == 0 || line.rfind("QGF::LogicalException: ", 0) == 0 ||
-           line == "unknown exception";
-}
-
-// What the child says of each failure, in order. A failed query of a device is told twice.
+// Returns the lines of each failure, in order. A failed query of a device prints its text twice,
+// the second time as an exception.
 std::vector<std::vector<std::string>> ListFailures(const std::vector<std::string>& errors)
 {
     std::vector<std::vector<std::string>> result;
     for (std::size_t index = 0; index < errors.size(); ++index) {
-        if (!IsFailure(errors[index]))
+        if (!IsFailureLine(errors[index]))
             continue;
         result.emplace_back();
         if (index > 0 && errors[index] == "exception: " + errors[index - 1])
@@ -59,14 +55,14 @@ std::vector<std::string> ListEnumerationTexts(const std::vector<std::string>& er
     return result;
 }
 
-// The child's own words of all that standard error holds.
+// Returns the child's own messages, without those of drivers.
 std::vector<std::string> ListOwnTexts(const std::vector<std::string>& errors)
 {
     std::vector<std::string> result;
     for (std::size_t index = 0; index < errors.size(); ++index) {
         const bool announces =
             index + 1 < errors.size() && errors[index + 1] == "exception: " + errors[index];
-        if (announces || IsFailure(errors[index]) ||
+        if (announces || IsFailureLine(errors[index]) ||
             GetEnumerationTexts().count(errors[index]) != 0)
             result.push_back(errors[index]);
     }
@@ -93,16 +89,17 @@ const ReportLine& Require(const Report& report, const std::string& key)
 std::vector<std::string> ListTags(const Report& report, DeviceKind kind)
 {
     const std::string& value = Require(report, GetCountKey(kind)).fValue;
-    const std::size_t count = std::strtoul(value.c_str(), nullptr, 10);
+    const std::uint64_t count = ReadUnsigned(value).value_or(0);
     if (count > kMaxDevices)
-        throw std::runtime_error(fmt::format("the report tells of {} devices", count));
+        throw std::runtime_error(fmt::format("the report counts {} devices", count));
     std::vector<std::string> tags;
     for (std::size_t index = 0; index < count; ++index)
         tags.push_back(MakeTag(kind, index));
     return tags;
 }
 
-// The test that the device didn't survive, to go by its last line; the number of tests if it did.
+// Returns the index of the device's test that failed, judged by its last line; the number of tests
+// if none did. A test that may print no line is taken for passed.
 std::size_t FindFailingTest(const SequenceReader& sequence, const DeviceTag& tag)
 {
     const Table<KnownKey> keys = GetDeviceKeys(tag.fKind);
@@ -125,17 +122,17 @@ const std::regex& GetShape(Match match)
     }
 }
 
-// The lines of two lists side by side from shortly before the first difference on.
+// Shows two lists of lines from a few lines before the first difference on.
 std::string ShowLists(const std::string& title, const std::vector<std::string>& expected,
                       const std::vector<std::string>& found, std::size_t first)
 {
-    constexpr std::size_t kBefore = 2;
-    constexpr std::size_t kBehind = 4;
+    constexpr std::size_t kMaxBefore = 2;
+    constexpr std::size_t kMaxAfter = 4;
     std::string text = title + "\n";
-    for (std::size_t index = first - std::min(first, kBefore); index < first; ++index)
+    for (std::size_t index = first - std::min(first, kMaxBefore); index < first; ++index)
         text += fmt::format("      {}\n", ShowBytes(found[index]));
     const auto show = [&](const char* mark, const std::vector<std::string>& lines) {
-        const std::size_t end = std::min(lines.size(), first + kBehind);
+        const std::size_t end = std::min(lines.size(), first + kMaxAfter);
         for (std::size_t index = first; index < end; ++index)
             text += fmt::format("    {} {}\n", mark, ShowBytes(lines[index]));
         if (lines.size() > end)
@@ -160,9 +157,9 @@ bool ExpectedLine::Matches(const std::string& text) const
     if (fMatch == Match::kExact)
         return text == fText;
     const std::size_t key = fText.find('=') + 1;
-    // No time and no number is so long, and a longer text would exhaust the matcher's stack.
-    constexpr std::size_t kMostShape = 64;
-    return text.size() - std::min(text.size(), key) <= kMostShape &&
+    // Longer than any time and any number. A longer text would exhaust the stack of std::regex.
+    constexpr std::size_t kMaxValueBytes = 64;
+    return text.size() - std::min(text.size(), key) <= kMaxValueBytes &&
            text.compare(0, key, fText, 0, key) == 0 &&
            std::regex_match(text.substr(key), GetShape(fMatch));
 }
@@ -170,9 +167,9 @@ bool ExpectedLine::Matches(const std::string& text) const
 StepRules::StepRules(const Report& report, const RunOutcome& outcome)
 {
     if (!report.IsWhole() || !outcome.fExitStatus)
-        throw std::runtime_error("the undisturbed run did not come to its end: " + outcome.fReason);
+        throw std::runtime_error("the undisturbed run did not complete: " + outcome.fReason);
 
-    // Options such as -stdout= print before the start.
+    // Options such as -stdout= print before the first line of the report.
     Operation start;
     for (const std::string& line : ListLines(report)) {
         if (line == Require(report, "Tester").fText)
@@ -207,7 +204,7 @@ StepRules::StepRules(const Report& report, const RunOutcome& outcome)
         }));
     const std::string difference = ShowDifference(Predict(StepFailure::kNone, 0), report, outcome);
     if (!difference.empty())
-        throw std::runtime_error("the undisturbed run is not what the rules say:\n" + difference);
+        throw std::runtime_error("the undisturbed run does not follow the rules:\n" + difference);
 }
 
 void StepRules::AddReportKey(const Report& report, const KnownKey& key)
@@ -222,7 +219,7 @@ std::size_t StepRules::AddDevices(const Report& report, const SequenceReader& se
 {
     const Table<KnownKey> keys = GetDeviceKeys(kind);
     const std::vector<std::string> tags = ListTags(report, kind);
-    std::vector<std::size_t> failing; // by device, the test that has cost it the rest
+    std::vector<std::size_t> failing; // the test that failed, by device
     failing.reserve(tags.size());
     for (std::size_t device = 0; device < tags.size(); ++device)
         failing.push_back(FindFailingTest(sequence, {kind, device}));
@@ -257,11 +254,11 @@ void StepRules::AddFailureTexts(const RunOutcome& outcome)
             continue;
         if (failure == failures.end())
             throw std::runtime_error(operation.fTag +
-                                     " has no more lines, and standard error doesn't say why");
+                                     " has lines missing, and standard error names no failure");
         operation.fErrors = *failure++;
     }
     if (failure != failures.end())
-        throw std::runtime_error("standard error tells of a failure that costs no device: " +
+        throw std::runtime_error("standard error names a failure that no device had: " +
                                  failure->back());
 }
 

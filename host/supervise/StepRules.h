@@ -1,5 +1,5 @@
-// What a child that is told to fail at a step must do: the rules of docs/report-format.md, applied
-// to what an undisturbed run has shown of the machine.
+// Predicts the output of a child that is made to fail at a step, by the rules of
+// docs/report-format.md and an undisturbed run on the same machine.
 #pragma once
 
 #include <cstddef>
@@ -20,45 +20,49 @@ enum class StepFailure {
     kThrow  // -throwAfter=N: exactly step N
 };
 
-// "crashAfter", "throwAfter".
+// Returns "crashAfter" or "throwAfter".
 const char* GetOptionName(StepFailure failure);
 
 struct ExpectedLine {
-    std::string fText; // as the undisturbed run had it
+    std::string fText; // of the undisturbed run
     Match fMatch = Match::kExact;
 
+    // Whether a line without its end is as expected.
     bool Matches(const std::string& text) const;
 };
 
 struct Prediction {
-    std::vector<ExpectedLine> fLines;
-    std::vector<std::string> fErrors; // what the child itself says on standard error
+    std::vector<ExpectedLine> fLines; // without comments
+    std::vector<std::string> fErrors; // the child's own messages on standard error
     int fStatus = 0;
 };
 
+// Constant after construction: any thread may call.
 class StepRules {
 public:
-    // From an undisturbed run. Throws std::runtime_error with what is wrong if the run didn't come
-    // to its end or isn't what the rules say itself.
+    // Takes an undisturbed run. Throws std::runtime_error that names the difference if the run
+    // didn't complete or doesn't follow the rules itself.
     StepRules(const Report& report, const RunOutcome& outcome);
 
-    // How many steps that run took; a failure at this one or behind it never comes.
+    // Returns the number of steps of the undisturbed run. A failure at a step from this number on
+    // never occurs.
     std::size_t GetStepCount() const { return fStepCount; }
 
     std::size_t GetGLCount() const { return fGLCount; }
     std::size_t GetCLCount() const { return fCLCount; }
     bool HasOpenCL() const { return fHasOpenCL; }
 
+    // Predicts a run with this failure at this step.
     Prediction Predict(StepFailure failure, std::size_t step) const;
 
 private:
-    // One question put to one device or to none.
+    // One test of one device, or one test that belongs to no device.
     struct Operation {
         std::string fTag; // of the device; empty for none
         std::vector<ExpectedLine> fLines;
-        std::vector<std::string> fErrors; // said in any case
+        std::vector<std::string> fErrors; // printed whether or not the step fails
         bool fTakesStep = true;
-        bool fFails = false; // by itself
+        bool fFails = false; // in the undisturbed run
     };
 
     void AddReportKey(const Report& report, const KnownKey& key);
@@ -73,8 +77,8 @@ private:
     std::size_t fStepCount = 0;
 };
 
-// The lines in which a child differs from its prediction, a few before the first one with it; empty
-// if it is as predicted. Comments, and what drivers say on standard error, don't count.
+// Returns the differences between a run and its prediction, with the lines around the first one;
+// empty if there are none. Comments, and messages of drivers on standard error, are ignored.
 std::string ShowDifference(const Prediction& expected, const Report& report,
                            const RunOutcome& outcome);
 

@@ -8,8 +8,8 @@ void StopRequest::Raise()
 {
     const std::lock_guard<std::mutex> lock(fMutex);
     fRaised = true;
-    if (fHeard)
-        fHeard();
+    if (fListener)
+        fListener();
 }
 
 bool StopRequest::IsRaised() const
@@ -18,10 +18,10 @@ bool StopRequest::IsRaised() const
     return fRaised;
 }
 
-void StopRequest::SetListener(std::function<void()> heard)
+void StopRequest::SetListener(std::function<void()> listener)
 {
     const std::lock_guard<std::mutex> lock(fMutex);
-    fHeard = std::move(heard);
+    fListener = std::move(listener);
 }
 
 } // namespace assay_host

@@ -9,19 +9,19 @@ namespace assay_host {
 // Any thread may call.
 class StopRequest {
 public:
-    // A request can't be withdrawn.
+    // Makes the request, which can't be withdrawn, and calls the listener.
     void Raise();
 
     bool IsRaised() const;
 
-    // `heard` is called when the request is raised, on the thread that raises it. Replaces the
-    // previous listener, which isn't called any more once this returns. May be empty.
-    void SetListener(std::function<void()> heard);
+    // Sets a function that Raise calls, on the thread of Raise. Replaces the previous listener,
+    // which isn't called any more once this returns. May be empty. It must not call this object.
+    void SetListener(std::function<void()> listener);
 
 private:
     mutable std::mutex fMutex;
     bool fRaised = false;
-    std::function<void()> fHeard;
+    std::function<void()> fListener;
 };
 
 } // namespace assay_host

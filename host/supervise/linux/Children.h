@@ -1,4 +1,4 @@
-// The children of a process, as /proc shows them.
+// Lists the children of a process by /proc.
 #pragma once
 
 #include <sys/types.h>
@@ -7,8 +7,8 @@
 
 namespace assay_host {
 
-// Each child's number and the letter of its state ('Z' of one that has ended). Empty if /proc can't
-// be read.
+// Returns each child's process id and the letter of its state ('Z' for a zombie). Empty if /proc
+// can't be read. Any thread may call.
 std::map<::pid_t, char> ListChildren(::pid_t parent);
 
 } // namespace assay_host

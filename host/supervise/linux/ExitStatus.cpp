@@ -2,7 +2,7 @@
 
 namespace assay_host {
 
-// The low byte.
+// Linux reports the low byte.
 std::int64_t GetReportedStatus(std::int32_t returned)
 {
     return returned & 0xFF;

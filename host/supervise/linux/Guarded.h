@@ -1,9 +1,9 @@
-// Whether this process's guardian is alive.
+// The state of this process's guardian.
 #pragma once
 
 namespace assay_host {
 
-// False once the guardian has ended; true without a guardian. Any thread may call.
+// Returns false once the guardian has ended, and true if there is none. Any thread may call.
 bool IsGuarded();
 
 } // namespace assay_host

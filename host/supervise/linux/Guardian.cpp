@@ -15,20 +15,21 @@ namespace assay_host {
 
 namespace {
 
-// After a worker that exited: it has tried to end its descendants itself.
+// The time to kill descendants after the worker exited: it has tried to kill them itself.
 constexpr double kRestSeconds = 0.2;
 
-// After a sudden end. It mostly takes some milliseconds, but longer on a busy machine, and no other
-// process tries again.
+// The same after a sudden end. Killing usually takes some milliseconds, but longer on a busy
+// machine, and no other process tries again.
 constexpr double kLastSeconds = 10;
 
-// A shell reports an end by a signal as this plus the signal's number.
+// A shell reports a signal that ended a process as this plus the signal's number.
 constexpr int kSignalStatus = 128;
 
-// Another name than the program's, so that killall doesn't end the worker with the guardian.
+// Differs from the program's name, so that killall doesn't kill the worker along with the guardian.
 constexpr char kWorkerName[] = "assay-worker";
 
-// The kernel sends it to the worker when the guardian has ended. Hardly used otherwise.
+// The signal that the kernel sends to the worker when the guardian has ended. Rarely used
+// otherwise.
 int GetDeathSignal()
 {
     return SIGRTMAX;
@@ -36,10 +37,10 @@ int GetDeathSignal()
 
 ::pid_t gGuardian = 0;
 
-// All that the worker starts, in any run. Never deleted.
+// All processes that the worker starts, in any run. Never deleted.
 ProcessTree* gStarted = nullptr;
 
-// Waits for its worker, and ends as it did.
+// Waits for its worker, and ends with its status or signal.
 class Guardian {
 public:
     Guardian(::pid_t worker, ProcessTree& tree) : fWorker(worker), fTree(tree) {}
@@ -63,7 +64,7 @@ public:
     }
 
 private:
-    // The worker's end; zeros if it hasn't ended.
+    // Returns the worker's end; zeros if it hasn't ended.
     siginfo_t TakeChange() const
     {
         siginfo_t change = {};
@@ -74,8 +75,9 @@ private:
         return {};
     }
 
-    // Ctrl-Z reaches this process alone: the worker's group and the child's aren't the terminal's.
-    // The worker has stopped, so that it starts no child and no child's number becomes another's.
+    // Ctrl-Z stops only this process: the worker and the child have process groups of their own.
+    // The worker must have stopped, so that it starts no child and reaps none: no process id is
+    // reused meanwhile.
     void Suspend() const
     {
         SignalChildren(SIGSTOP);
@@ -84,7 +86,7 @@ private:
         ::kill(fWorker, SIGCONT);
     }
 
-    // With what they started, as far as that is in the groups that they lead.
+    // Signals the worker's children and the process groups that they lead.
     void SignalChildren(int number) const
     {
         for (const auto& [child, state] : ListChildren(fWorker)) {
@@ -108,8 +110,8 @@ private:
     ProcessTree& fTree;
 };
 
-// All signals but those that are ignored, which would be delivered if they were blocked, and those
-// that keep their default.
+// Returns all signals except those that are ignored, which would be delivered if they were blocked,
+// and those that keep their default action.
 sigset_t GetGuardianSignals()
 {
     sigset_t result;
@@ -165,7 +167,7 @@ void GuardProcess()
         ::setpgid(worker, worker); // here too, in case the worker has not run yet
         Guardian(worker, tree).Watch(awaited);
     }
-    // No process can be started, so there is nothing to guard.
+    // fork failed. Other processes can't be started either, so there is nothing to guard.
     gGuardian = 0;
     ::pthread_sigmask(SIG_SETMASK, &before, nullptr);
 }

@@ -25,11 +25,11 @@ void PrepareSignals()
 void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
 {
     SetInterruptStop(std::move(stop));
-    // In the background of a terminal the run goes on.
+    // The run continues in the background of a terminal.
     std::signal(SIGTTIN, SIG_IGN);
     std::signal(SIGTTOU, SIG_IGN);
     const sigset_t awaited = GetEndSignals();
-    // Blocked in all threads: they inherit this mask.
+    // Block the signals in all threads, which inherit this mask.
     ::pthread_sigmask(SIG_SETMASK, &awaited, nullptr);
     std::thread([awaited] {
         for (;;) {
@@ -37,7 +37,7 @@ void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
                 continue;
             NoteInterrupt();
             if (!IsGuarded())
-                NoteInterrupt(); // the guardian is dead: don't wait for readers
+                NoteInterrupt(); // without the guardian, don't wait for readers
         }
     }).detach();
 }

@@ -42,12 +42,12 @@ class ProcessTree::Platform {
 public:
     Platform() : fBefore(ListOwnChildren())
     {
-        // Orphans become this process's children, instead of the first process's.
+        // Orphaned descendants become children of this process.
         ::prctl(PR_SET_CHILD_SUBREAPER, 1, 0, 0, 0);
     }
 
-    // Kills only children, which only this process reaps: a number always means the same process.
-    // The children of one that ends become children of this process.
+    // Kills only children of this process: only it reaps them, so that no process id is reused. The
+    // children of a killed process become children of this process in turn.
     bool EndAll(double seconds)
     {
         const auto deadline =

@@ -5,8 +5,8 @@
 
 namespace assay_host {
 
-// All signals that end a process by default, except SIGKILL, those of a fault of the process, those
-// of a failing write, and those that are ignored now.
+// Returns all signals that end a process by default, except SIGKILL, those of a fault of the
+// process, those of a failing write, and those that are ignored now.
 sigset_t GetEndSignals();
 
 } // namespace assay_host

@@ -2,7 +2,7 @@
 
 namespace assay_host {
 
-// All of it, as an unsigned number.
+// Windows reports all bits, as an unsigned number.
 std::int64_t GetReportedStatus(std::int32_t returned)
 {
     return static_cast<std::uint32_t>(returned);

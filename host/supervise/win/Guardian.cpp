@@ -6,7 +6,7 @@ namespace assay_host {
 
 void GuardProcess()
 {
-    const ProcessTree job; // which the system ends with this process
+    const ProcessTree job; // makes the job, whose processes the system kills with this one
 }
 
 void EndUnguarded() {}

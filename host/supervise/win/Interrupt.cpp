@@ -10,15 +10,15 @@ namespace assay_host {
 
 namespace {
 
-// Windows ends the process when this returns after a closed console, a logoff or a shutdown; it
-// allows some seconds before.
-constexpr DWORD kTimeForTheEnd = 4000;
+// In milliseconds. After a closed console, a logoff or a shutdown, Windows ends the process when
+// the handler returns, or after 5 seconds.
+constexpr DWORD kMaxEndTime = 4000;
 
 BOOL WINAPI TakeEvent(DWORD event)
 {
     NoteInterrupt();
     if (event != CTRL_C_EVENT && event != CTRL_BREAK_EVENT)
-        ::Sleep(kTimeForTheEnd);
+        ::Sleep(kMaxEndTime);
     return TRUE;
 }
 

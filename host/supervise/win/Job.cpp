@@ -27,7 +27,7 @@ HANDLE MakeOwnJob()
     return nullptr;
 }
 
-// While the handle is open, no other process gets the number, so membership is tested then.
+// The process id isn't reused while the handle is open, so the membership is tested after opening.
 void End(HANDLE job, DWORD process)
 {
     const HANDLE handle =

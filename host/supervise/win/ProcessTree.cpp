@@ -16,7 +16,7 @@ public:
 
 private:
     const HANDLE fJob;
-    std::optional<std::set<DWORD>> fBefore; // nothing if it isn't known
+    std::optional<std::set<DWORD>> fBefore; // empty if the system doesn't report it
 };
 
 ProcessTree::ProcessTree() : fPlatform(std::make_unique<Platform>()) {}

@@ -2,7 +2,7 @@
 
 namespace assay_host {
 
-// Backslashes mean themselves except before a quotation mark, where two stand for one.
+// A backslash is literal except before a quotation mark, where two backslashes mean one.
 std::wstring Quote(const std::wstring& argument)
 {
     std::wstring result = L"\"";

@@ -1,12 +1,12 @@
-// Arguments on a Windows command line.
+// Quotes arguments for a Windows command line. Any thread may call.
 #pragma once
 
 #include <string>
 
 namespace assay_host {
 
-// The argument in quotation marks, from which CommandLineToArgvW and the C runtime make exactly the
-// argument again. It must hold no zero.
+// Returns the argument in quotation marks, so that CommandLineToArgvW and the C runtime parse it
+// back unchanged. It must not contain zeros.
 std::wstring Quote(const std::wstring& argument);
 
 } // namespace assay_host

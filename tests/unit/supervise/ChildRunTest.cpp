@@ -440,7 +440,7 @@ TEST_F(ScriptedChild, IsGivenUpIfItOutlivesItsKill)
 {
     const RunOutcome outcome = Run(kSmallStep);
     EXPECT_EQ(outcome.fVerdict, Verdict::kHung);
-    EXPECT_THAT(outcome.fReason, HasSubstr("which it did not"));
+    EXPECT_THAT(outcome.fReason, HasSubstr("could not be killed"));
     EXPECT_TRUE(outcome.fLeftBehind);
     EXPECT_GE(outcome.fSeconds, 1 + RunTimes().fKillGrace.count());
 }

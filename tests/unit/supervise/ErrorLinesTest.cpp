@@ -10,7 +10,7 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 
-TEST(ErrorLines, ComeWholeWhateverTheirPieces)
+TEST(ErrorLines, AreJoinedFromPieces)
 {
     ErrorLines lines;
     EXPECT_THAT(lines.Feed("on"), IsEmpty());

@@ -35,12 +35,12 @@ TEST(EventQueue, CloseDropsWhatItHoldsAndWhatComes)
     EXPECT_FALSE(queue.Pop(milliseconds(0)));
 }
 
-TEST(EventQueue, CloseLetsAPushGoThatWaitsForRoom)
+TEST(EventQueue, CloseEndsTheWaitOfAPush)
 {
     const auto queue = boost::make_shared<EventQueue>();
     queue->Push(Bytes(std::string(std::size_t{1} << 18, 'x')));
     boost::thread pusher([queue] { queue->Push(Bytes("y")); });
-    EXPECT_FALSE(pusher.timed_join(boost::posix_time::milliseconds(50))) << "there is no room";
+    EXPECT_FALSE(pusher.timed_join(boost::posix_time::milliseconds(50))) << "the queue is full";
     queue->Close();
     EXPECT_TRUE(pusher.timed_join(boost::posix_time::seconds(60)));
 }

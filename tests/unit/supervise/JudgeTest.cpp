@@ -49,7 +49,7 @@ ChildEnd Ended(int status)
 const std::string kWhole = "assayStart=\"x\"\nassayEnd=\"y\"\n";
 const std::string kBroken = "assayStart=\"x\"\nQGFCoreInitialized=1\n";
 
-TEST(Judge, CallsAWholeReportWithTheStatusAskedForComplete)
+TEST(Judge, CallsAWholeReportWithTheRequestedStatusComplete)
 {
     EXPECT_EQ((Case{kWhole, {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kComplete);
     EXPECT_EQ((Case{kWhole, {}, {"-exit=7"}, Ended(7)}.Judge().fVerdict), Verdict::kComplete);
@@ -60,7 +60,7 @@ TEST(Judge, CallsAWholeReportWithTheStatusAskedForComplete)
               Verdict::kComplete);
 }
 
-TEST(Judge, KnowsALargeStatusThatWasAskedFor)
+TEST(Judge, AcceptsALargeRequestedStatus)
 {
     Case large{kWhole, {}, {"-exit=300"}, ChildEnd{pmutil::kEndedByCrash, 0}};
     char code[sizeof "code 0x00000000"];
@@ -77,26 +77,26 @@ TEST(Judge, CallsAnyOtherEndFailed)
     EXPECT_EQ((Case{kWhole, {}, {"-exit=7"}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
     EXPECT_EQ((Case{kBroken, {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
     EXPECT_EQ((Case{"", {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
-    const RunOutcome told = Case{kWhole, {"exception: x"}, {"-exit=2"}, Ended(2)}.Judge();
-    EXPECT_EQ(told.fVerdict, Verdict::kFailedTests);
-    EXPECT_THAT(told.fReason, HasSubstr("exception: x"));
-    EXPECT_EQ(told.fExitStatus, 2);
+    const RunOutcome failed = Case{kWhole, {"exception: x"}, {"-exit=2"}, Ended(2)}.Judge();
+    EXPECT_EQ(failed.fVerdict, Verdict::kFailedTests);
+    EXPECT_THAT(failed.fReason, HasSubstr("exception: x"));
+    EXPECT_EQ(failed.fExitStatus, 2);
     EXPECT_THAT((Case{kBroken, {}, {}, Ended(2)}.Judge().fReason),
-                HasSubstr("behind QGFCoreInitialized, at QGFOGLInitialized"));
+                HasSubstr("after QGFCoreInitialized, at QGFOGLInitialized"));
     EXPECT_THAT((Case{"", {}, {}, Ended(0)}.Judge().fReason), HasSubstr("before its first line"));
 }
 
-TEST(Judge, CallsAReportWithHalfAStampBrokenOff)
+TEST(Judge, CallsAReportWithAnIncompleteStampStopped)
 {
     for (const char* end : {"", "=", "=\n", "=\"2026-11", "=\"x\""}) {
         const RunOutcome outcome =
             Case{"assayStart=\"x\"\nassayEnd" + std::string(end), {}, {}, Ended(0)}.Judge();
         EXPECT_EQ(outcome.fVerdict, Verdict::kFailedTests) << end;
-        EXPECT_THAT(outcome.fReason, HasSubstr("broke off")) << end;
+        EXPECT_THAT(outcome.fReason, HasSubstr("The report stopped")) << end;
     }
 }
 
-TEST(Judge, KnowsAUsageErrorByStatusAndText)
+TEST(Judge, DetectsAUsageErrorByStatusAndText)
 {
     const std::vector<std::string> usage = {"Usage exception: usage", "usage: "};
     EXPECT_EQ((Case{"# text\n", usage, {}, Ended(3)}.Judge().fVerdict), Verdict::kUsageError);
@@ -105,7 +105,7 @@ TEST(Judge, KnowsAUsageErrorByStatusAndText)
     EXPECT_EQ((Case{kWhole, usage, {"-exit=3"}, Ended(3)}.Judge().fVerdict), Verdict::kComplete);
 }
 
-TEST(Judge, TellsACrashFromAHangAndFromAnInterrupt)
+TEST(Judge, DistinguishesCrashHangAndInterrupt)
 {
     Case died{kBroken, {}, {}, ChildEnd{pmutil::kEndedByCrash, 0}};
     died.fTermination = "signal 11 (Segmentation fault)";
@@ -123,12 +123,12 @@ TEST(Judge, TellsACrashFromAHangAndFromAnInterrupt)
     EXPECT_EQ(died.Judge().fVerdict, Verdict::kHung);
     EXPECT_THAT(died.Judge().fReason, HasSubstr("within 5 s and was killed"));
 
-    // The whole report doesn't help a child that never came to its end.
+    // A child that doesn't end is hung even if its report is whole.
     died.fReport = kWhole;
     EXPECT_EQ(died.Judge().fVerdict, Verdict::kHung);
 }
 
-TEST(Judge, KeepsAnEndThatCameJustBeforeTheKill)
+TEST(Judge, KeepsAnEndJustBeforeTheKill)
 {
     Case ended{kWhole, {}, {}, Ended(0)};
     for (const KillReason reason : {KillReason::kTimeout, KillReason::kInterrupt}) {
@@ -137,7 +137,7 @@ TEST(Judge, KeepsAnEndThatCameJustBeforeTheKill)
     }
 }
 
-TEST(ReportProgress, KeepsALogLineOnlyBehindTheLastReportLine)
+TEST(ReportProgress, KeepsALogLineOnlyAfterTheLastReportLine)
 {
     ReportProgress progress;
     const Report first = ReadReport("# one\na=1\n");
@@ -151,21 +151,21 @@ TEST(ReportProgress, KeepsALogLineOnlyBehindTheLastReportLine)
     EXPECT_EQ(progress.GetLastReportLine(), "a=1");
 }
 
-TEST(GetAskedStatus, ReadsAsTheChildDoes)
+TEST(GetRequestedStatus, ParsesAsTheChildDoes)
 {
-    EXPECT_EQ(GetAskedStatus({}), 0);
-    EXPECT_EQ(GetAskedStatus({"-exit=010"}), 8);
-    EXPECT_EQ(GetAskedStatus({"-exit=7x"}), 7);
-    EXPECT_EQ(GetAskedStatus({"-exit="}), 0);
-    EXPECT_EQ(GetAskedStatus({"exit=7", "-exit"}), 0);
-    EXPECT_EQ(GetAskedStatus({"-exit=7", "-exitt=8", "-Exit=9"}), 7);
-    EXPECT_EQ(GetAskedStatus({"-exit=\"9\""}), 9);
+    EXPECT_EQ(GetRequestedStatus({}), 0);
+    EXPECT_EQ(GetRequestedStatus({"-exit=010"}), 8);
+    EXPECT_EQ(GetRequestedStatus({"-exit=7x"}), 7);
+    EXPECT_EQ(GetRequestedStatus({"-exit="}), 0);
+    EXPECT_EQ(GetRequestedStatus({"exit=7", "-exit"}), 0);
+    EXPECT_EQ(GetRequestedStatus({"-exit=7", "-exitt=8", "-Exit=9"}), 7);
+    EXPECT_EQ(GetRequestedStatus({"-exit=\"9\""}), 9);
     using Limits = std::numeric_limits<std::int32_t>;
     for (const char* text :
          {"2147483648", "4294967296", "99999999999", "0x100000000", "99999999999999999999999"})
-        EXPECT_EQ(GetAskedStatus({std::string("-exit=") + text}), Limits::max()) << text;
+        EXPECT_EQ(GetRequestedStatus({std::string("-exit=") + text}), Limits::max()) << text;
     for (const char* text : {"-2147483649", "-4294967296", "-99999999999999999999999"})
-        EXPECT_EQ(GetAskedStatus({std::string("-exit=") + text}), Limits::min()) << text;
+        EXPECT_EQ(GetRequestedStatus({std::string("-exit=") + text}), Limits::min()) << text;
 }
 
 } // namespace

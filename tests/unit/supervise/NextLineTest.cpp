@@ -1,4 +1,4 @@
-// What comes next in a report that broke off: each output names it, and they name the same.
+// All outputs must name the same next line of an incomplete report.
 #include <random>
 #include <regex>
 #include <sstream>
@@ -17,7 +17,7 @@ namespace {
 
 using Lines = std::vector<std::string>;
 
-// A run in which the device fails at the test that the line answers; `logs`: and the log says so.
+// Makes a run in which the device fails at the test of this key. `logs`: with the log line.
 Lines MakeFailingRun(int glCount, int clCount, const std::string& tag, const std::string& key,
                      bool logs)
 {
@@ -71,7 +71,8 @@ RunOutcome JudgeCrash(const ReportProgress& progress)
     return outcome;
 }
 
-// "glgpu[0].GLName" of "... behind glgpu[0].GLMemoryMB, at glgpu[0].GLName."; empty without one.
+// Returns "glgpu[0].GLName" for "... after glgpu[0].GLMemoryMB, at glgpu[0].GLName."; empty if the
+// reason names no key.
 std::string GetKeyOfReason(const std::string& reason)
 {
     constexpr char kText[] = ", at ";
@@ -101,7 +102,7 @@ void ExpectOneKeyInAllOutputs(const Report& report, const RunOutcome& outcome,
 TEST(NextLine, IsTheSameInAllOutputsOfCutReports)
 {
     constexpr int kReports = 20000;
-    constexpr int kShownInFull = 100; // each of so many
+    constexpr int kFullInterval = 100; // of the reports that all outputs show
     std::vector<Report> runs = {ReadReport(Join(MakeWholeRun(1, -1)))};
     for (const auto& some : {MakeWholeRuns(), MakeFailingRuns(false), MakeFailingRuns(true)})
         for (const Lines& lines : some)
@@ -124,13 +125,13 @@ TEST(NextLine, IsTheSameInAllOutputsOfCutReports)
         const std::string next = GetAnswers(report).fNext;
         if (progress.HasValues() && GetKeyOfReason(outcome.fReason) != next)
             ++differing;
-        if (progress.HasValues() && number % kShownInFull == 0 && !report.IsWhole())
+        if (progress.HasValues() && number % kFullInterval == 0 && !report.IsWhole())
             ExpectOneKeyInAllOutputs(report, outcome, next);
     }
     EXPECT_EQ(differing, 0);
 }
 
-// Wherever a report ends: also in front of a gputag line, and after a failure that the log tells.
+// Ends the report after each line, also before gputag lines and after failures in the log.
 TEST(NextLine, IsTheOneThatTheChildPrintsNext)
 {
     std::vector<Lines> runs = MakeWholeRuns();

@@ -48,7 +48,7 @@ TEST(StepRules, CountsTheStepsOfTheReportsTable)
     }
 }
 
-TEST(StepRules, PredictAnUndisturbedRunBehindTheLastStep)
+TEST(StepRules, PredictAnUndisturbedRunAfterTheLastStep)
 {
     const StepRules rules = MakeRules(2, 1);
     for (const StepFailure failure : {StepFailure::kCrash, StepFailure::kThrow}) {
@@ -74,7 +74,7 @@ TEST(StepRules, EndTheRunAtAStepOfNoDevice)
                 ElementsAre("exception: Programmed throw"));
 }
 
-TEST(StepRules, LoseTheDeviceOfAThrowAndGoOn)
+TEST(StepRules, LoseOneDeviceToAThrow)
 {
     const StepRules rules = MakeRules(2, -1);
     const Prediction prediction = rules.Predict(StepFailure::kThrow, 10); // glgpu[1], second key
@@ -91,9 +91,9 @@ TEST(StepRules, LoseTheDeviceOfAThrowAndGoOn)
     EXPECT_EQ(prediction.fStatus, 2);
 }
 
-TEST(StepRules, LoseAllDevicesToACrashAndEndAtTheNextStepOfNone)
+TEST(StepRules, LoseAllDevicesToACrashAndEndAtTheNextOtherStep)
 {
-    // As docs/report-format.md tells it: one device, crash after 8.
+    // The example of docs/report-format.md: one device, -crashAfter=8.
     const Prediction one = MakeRules(1, 0).Predict(StepFailure::kCrash, 8);
     EXPECT_EQ(GetTexts(one).back(), "NumCLGPUs=0");
     EXPECT_EQ(GetTexts(one)[7], "glgpu[0].IsIntegratedGLGPU=0");
@@ -124,7 +124,7 @@ TEST(StepRules, TakeTheStepOfASilentCudaVersion)
     EXPECT_THAT(prediction.fErrors, ElementsAre("exception: Programmed throw"));
 }
 
-TEST(StepRules, KeepWhatOptionsPrintInFront)
+TEST(StepRules, KeepTheOutputOfOptionsBeforeTheReport)
 {
     std::vector<std::string> lines = Join(MakeWholeRun(0, -1));
     lines.insert(lines.begin(), "a=b");
@@ -137,8 +137,8 @@ TEST(StepRules, KeepWhatOptionsPrintInFront)
 
 class FailingDevice : public testing::TestWithParam<std::size_t> {};
 
-// The second of two devices fails by itself at its k-th question.
-TEST_P(FailingDevice, IsLearntWithItsTexts)
+// The second of two devices fails by itself at its k-th test.
+TEST_P(FailingDevice, IsFoundWithItsMessages)
 {
     const std::size_t failing = GetParam();
     std::vector<std::string> lines;
@@ -166,8 +166,7 @@ TEST_P(FailingDevice, IsLearntWithItsTexts)
                 ElementsAre("Failed requirement: x", "exception: Failed requirement: x"));
     EXPECT_EQ(whole.fStatus, 2);
 
-    // The other one thrown out before: the failing one still fails in its own way, and first or
-    // second by the order of the questions.
+    // With the first device lost to a throw, the second one still fails by itself.
     const Prediction both = rules.Predict(StepFailure::kThrow, 7);
     EXPECT_THAT(both.fErrors, SizeIs(3));
     EXPECT_EQ(both.fErrors.front(), "exception: Programmed throw");
@@ -175,7 +174,7 @@ TEST_P(FailingDevice, IsLearntWithItsTexts)
 
 INSTANTIATE_TEST_SUITE_P(AtEachQuestion, FailingDevice, testing::Range<std::size_t>(0, 36));
 
-TEST(StepRules, ExpectWhatTheEnumerationSaidOnlyBehindIt)
+TEST(StepRules, ExpectMessagesOfTheEnumerationOnlyAfterIt)
 {
     const std::string text = "ContextOffscreen exception caught and ignored.";
     const StepRules rules(ReadReport(Join(MakeWholeRun(1, -1))), MakeOutcome(0, {text}));
@@ -185,13 +184,13 @@ TEST(StepRules, ExpectWhatTheEnumerationSaidOnlyBehindIt)
                 ElementsAre(text, "exception: Programmed throw"));
 }
 
-TEST(StepRules, RefuseWhatIsNoUndisturbedRun)
+TEST(StepRules, RejectOtherRuns)
 {
     const std::vector<std::string> whole = Join(MakeWholeRun(1, 0));
     auto broken = whole;
     broken.pop_back();
     EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(broken), MakeOutcome(2)); }),
-                HasSubstr("did not come to its end"));
+                HasSubstr("did not complete"));
     broken = whole;
     broken.erase(broken.begin() + 3);
     EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(broken), MakeOutcome(0)); }),
@@ -199,13 +198,13 @@ TEST(StepRules, RefuseWhatIsNoUndisturbedRun)
     broken = whole;
     std::swap(broken[7], broken[8]);
     EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(broken), MakeOutcome(0)); }),
-                HasSubstr("not what the rules say"));
+                HasSubstr("does not follow the rules"));
     broken = whole;
     broken.insert(broken.begin() + 9, "glgpu[0].GLNews=1");
     EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(broken), MakeOutcome(0)); }),
                 HasSubstr("+ glgpu[0].GLNews=1"));
     EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(whole), MakeOutcome(0, {"exception: x"})); }),
-                HasSubstr("a failure that costs no device: exception: x"));
+                HasSubstr("a failure that no device had: exception: x"));
     broken = whole;
     broken.erase(broken.begin() + 20);
     EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(broken), MakeOutcome(2)); }),
@@ -249,12 +248,12 @@ TEST(ShowDifference, ShowsEachKind)
               "  standard error (- predicted, + found):\n    - (the end)\n    + exception: x\n"
               "    + (the end)\n  exit status: predicted 0, found 2\n");
     RunOutcome died;
-    died.fReason = "The child died of it.";
+    died.fReason = "The child crashed.";
     EXPECT_EQ(ShowDifference(expected, ReadReport("a=1\nb=2\n"), died),
-              "  exit status: predicted 0, found none: The child died of it.\n");
+              "  exit status: predicted 0, found none: The child crashed.\n");
 }
 
-TEST(ExpectedLine, TakesNoValueTooLongForAnyNumber)
+TEST(ExpectedLine, RejectsAValueTooLongForAnyNumber)
 {
     const ExpectedLine line{"a=1", Match::kInteger};
     EXPECT_TRUE(line.Matches("a=23"));

@@ -10,22 +10,22 @@
 namespace assay_host {
 namespace {
 
-TEST(StopRequest, TellsItsListener)
+TEST(StopRequest, CallsItsListener)
 {
     StopRequest stop;
-    int heard = 0;
-    stop.SetListener([&heard] { ++heard; });
+    int calls = 0;
+    stop.SetListener([&calls] { ++calls; });
     EXPECT_FALSE(stop.IsRaised());
     stop.Raise();
     EXPECT_TRUE(stop.IsRaised());
-    EXPECT_EQ(heard, 1);
+    EXPECT_EQ(calls, 1);
     stop.SetListener({});
     stop.Raise();
     EXPECT_TRUE(stop.IsRaised());
-    EXPECT_EQ(heard, 1);
+    EXPECT_EQ(calls, 1);
 }
 
-// Without the wake these would wait for hours.
+// These would wait for hours without Wake.
 TEST(EventQueue, IsWokenWhileItWaits)
 {
     EventQueue queue;
@@ -37,7 +37,7 @@ TEST(EventQueue, IsWokenWhileItWaits)
     other.join();
 }
 
-TEST(EventQueue, RemembersAWakeForTheNextWait)
+TEST(EventQueue, KeepsAWakeForTheNextWait)
 {
     EventQueue queue;
     queue.Wake();

@@ -1,4 +1,4 @@
-// Reports as the child prints them, for a machine of so many devices.
+// Makes the reports of machines with any number of devices.
 #pragma once
 
 #include <string>
@@ -37,8 +37,8 @@ inline std::string CL(int device, const std::string& rest)
     return "clgpu[" + std::to_string(device) + "]." + rest;
 }
 
-// The groups of lines of an undisturbed run: one for each question, in order; written out here
-// apart from the product's tables.
+// Returns the lines of an undisturbed run in groups, one for each step, in order. Independent of
+// the product's tables.
 inline std::vector<std::vector<std::string>> MakeWholeRun(int glCount, int clCount)
 {
     std::vector<std::vector<std::string>> run = {

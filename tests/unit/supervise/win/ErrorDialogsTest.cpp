@@ -7,7 +7,7 @@
 namespace assay_host {
 namespace {
 
-TEST(ErrorDialogs, AreKeptAwayAndNothingElseChanges)
+TEST(ErrorDialogs, AreDisabledAndNothingElseChanges)
 {
     const UINT before = ::GetErrorMode();
     ::SetErrorMode(SEM_NOALIGNMENTFAULTEXCEPT);

@@ -10,7 +10,7 @@ namespace {
 
 constexpr double kPatience = 20;
 
-// Children in a job of their own, which sleep; they go with it.
+// A job with children that sleep. The destructor kills them.
 class Job {
 public:
     explicit Job(int children) : fHandle(::CreateJobObjectW(nullptr, nullptr))
@@ -53,14 +53,14 @@ private:
     std::vector<PROCESS_INFORMATION> fProcesses;
 };
 
-TEST(Job, ListsHoweverManyThereAre)
+TEST(Job, ListsAnyNumberOfProcesses)
 {
     EXPECT_EQ(Job(0).CountListed(), 0U);
     EXPECT_EQ(Job(3).CountListed(), 3U);
-    EXPECT_EQ(Job(70).CountListed(), 70U) << "more than are asked for at first";
+    EXPECT_EQ(Job(70).CountListed(), 70U) << "more than the first buffer holds";
 }
 
-TEST(Job, FailedQueryIsNoEmptyList)
+TEST(Job, FailedQueryIsNotAnEmptyList)
 {
     const HANDLE noJob = ::CreateEventW(nullptr, TRUE, FALSE, nullptr);
     EXPECT_EQ(ListProcesses(noJob), std::nullopt);
@@ -68,7 +68,7 @@ TEST(Job, FailedQueryIsNoEmptyList)
     ::CloseHandle(noJob);
 }
 
-TEST(Job, EndsThoseThatAreNew)
+TEST(Job, EndsNewProcesses)
 {
     const Job job(3);
     const std::set<DWORD> all = ListProcesses(job.GetHandle()).value();
