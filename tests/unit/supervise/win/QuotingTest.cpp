@@ -20,31 +20,31 @@ namespace {
 
 using Texts = std::vector<std::wstring>;
 
-// The hard characters; of the last ones a command line's parser knows none.
+// Difficult characters. The last ones have no meaning to a parser of command lines.
 const Texts kHard = {L" ", L"\t", L"\"", L"\\", L"\u00e9", L"%", L"^", L"\u65e5", L"\U0001F600"};
-// One for each way in which a parser can take a character.
+// One character for each way in which a parser can treat it.
 const Texts kKinds(kHard.begin(), kHard.begin() + 5);
 
-// Tells every text of up to `length` of the parts, the empty one included.
+// Calls `act` with every text of up to `length` parts, including the empty one.
 void ForEachText(const Texts& parts, int length,
-                 const std::function<void(const std::wstring&)>& tell)
+                 const std::function<void(const std::wstring&)>& act)
 {
     Texts texts = {L""};
-    tell(L"");
+    act(L"");
     for (int round = 0; round < length; ++round) {
         Texts longer;
         longer.reserve(texts.size() * parts.size());
         for (const std::wstring& text : texts) {
             for (const std::wstring& part : parts) {
                 longer.push_back(text + part);
-                tell(longer.back());
+                act(longer.back());
             }
         }
         texts.swap(longer);
     }
 }
 
-void ForRandomTexts(int count, int maxParts, const std::function<void(const std::wstring&)>& tell)
+void ForRandomTexts(int count, int maxParts, const std::function<void(const std::wstring&)>& act)
 {
     std::mt19937 random(20260119);
     for (int round = 0; round < count; ++round) {
@@ -53,11 +53,11 @@ void ForRandomTexts(int count, int maxParts, const std::function<void(const std:
         for (unsigned part = 0; part < parts; ++part)
             text += random() % 4 == 0 ? std::wstring(1, static_cast<wchar_t>('a' + random() % 26))
                                       : kHard[random() % kHard.size()];
-        tell(text);
+        act(text);
     }
 }
 
-// Collects texts, and has them looked at together whenever a command line is full.
+// Collects texts, and checks them together when a command line is full.
 class Batch {
 public:
     using Check = std::function<void(const std::wstring& line, const Texts& texts)>;
