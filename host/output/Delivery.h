@@ -1,4 +1,4 @@
-// The last part of a command: its child has ended, and the rest of the output is written.
+// Finishes the output of a command after its child has ended.
 #pragma once
 
 #include <memory>
@@ -7,7 +7,8 @@
 
 namespace assay_host {
 
-// From its construction on an interrupt ends the process with the status of an interrupted run.
+// From its construction on, an interrupt ends the process with the status of an interrupted run.
+// For the main thread.
 class Delivery {
 public:
     explicit Delivery(std::shared_ptr<WriterThread> writer);
@@ -15,9 +16,10 @@ public:
     Delivery(const Delivery&) = delete;
     Delivery& operator=(const Delivery&) = delete;
 
-    // Waits without limit for the readers and finishes the output. After one interrupt it waits
-    // only while they read, after more interrupts not at all; ends the process if the output isn't
-    // written then. Throws what the output throws.
+    // Writes the rest of the output and finishes it. Waits for readers without limit; if one
+    // interrupt came before the construction, only while they read something each second; after
+    // more interrupts, not at all. If it stops waiting, it ends the process with the status of an
+    // interrupted run. Throws the output's exceptions.
     void Finish() const;
 
 private:

@@ -7,7 +7,7 @@ namespace assay_host {
 boost::filesystem::path FollowLinks(boost::filesystem::path path)
 {
     namespace fs = boost::filesystem;
-    constexpr int kMaxLinks = 40; // as many as Linux follows
+    constexpr int kMaxLinks = 40; // the limit of Linux
     boost::system::error_code error;
     for (int links = 0; links < kMaxLinks; ++links) {
         if (fs::symlink_status(path, error).type() != fs::symlink_file)
@@ -15,7 +15,7 @@ boost::filesystem::path FollowLinks(boost::filesystem::path path)
         const fs::path target = fs::read_symlink(path, error);
         if (error)
             break;
-        path = path.parent_path() / target; // the target alone if that is absolute
+        path = path.parent_path() / target; // an absolute target replaces the path
     }
     return path;
 }

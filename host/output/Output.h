@@ -1,5 +1,5 @@
-// Where a command's result goes. Every failure throws std::runtime_error that names the place and
-// says what the system says.
+// The destination of a command's result. Every failure throws std::runtime_error with the text
+// "cannot write PLACE: REASON", where PLACE is the file or "to standard output".
 #pragma once
 
 #include <memory>
@@ -8,34 +8,36 @@
 
 namespace assay_host {
 
+// One thread at a time, except for Abandon.
 class Output {
 public:
     virtual ~Output() = default;
     Output(const Output&) = delete;
     Output& operator=(const Output&) = delete;
 
-    // Called first. May wait for a reader, for example when it opens a named pipe.
+    // Call first. May block until there is a reader, for example of a named pipe.
     virtual void Open() {}
 
-    // Has reached the system when it returns.
+    // Writes all of the text, without a buffer. May block.
     virtual void Write(std::string_view text) = 0;
 
-    // Nothing more comes. A file gets its name here.
+    // Call after the last Write. Gives a temporary file its final name.
     virtual void Finish() = 0;
 
-    // Deletes a temporary file, as no result will come. Another thread may call it while one of the
-    // other functions runs or blocks.
+    // Deletes a temporary file: there will be no result. May be called by another thread while one
+    // of the other functions runs or blocks. Never throws.
     virtual void Abandon() {}
 
 protected:
     Output() = default;
 };
 
+// Returns an output that writes to this program's standard output.
 std::unique_ptr<Output> OpenStandardOutput();
 
-// A file that takes its place only when it is finished: until then it is a temporary one in the
-// same folder, deleted if it never comes to that. What exists there and is no file, as a device or
-// a pipe, is written to directly.
+// Returns an output that replaces or creates a file. It writes to a temporary file in the same
+// folder, which Finish renames, and which is deleted otherwise. An existing device or pipe is
+// written to directly. The path is UTF-8. Throws if the temporary file can't be created.
 std::unique_ptr<Output> OpenFile(const std::string& path);
 
 } // namespace assay_host

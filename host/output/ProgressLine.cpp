@@ -18,7 +18,7 @@ void ProgressLine::Show(std::string text)
 {
     if (!fShows)
         return;
-    // The last column would wrap. What isn't ASCII has a width of its own.
+    // A character in the last column would wrap the line. The width of other characters is unknown.
     text.resize(std::min(text.size(), static_cast<std::size_t>(GetErrorWidth() - 1)));
     std::replace_if(
         text.begin(), text.end(), [](char byte) { return byte < ' ' || byte > '~'; }, '?');

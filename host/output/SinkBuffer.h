@@ -1,5 +1,4 @@
-// A stream buffer that passes what is written to a function in blocks, so that no text is held
-// whole.
+// A stream buffer that passes the written bytes to a function in blocks.
 #pragma once
 
 #include <functional>
@@ -10,6 +9,7 @@
 
 namespace assay_host {
 
+// Flush the stream at the end. One thread at a time.
 class SinkBuffer : public std::streambuf {
 public:
     using Sink = std::function<void(std::string_view)>;
@@ -34,7 +34,7 @@ protected:
         return size;
     }
 
-    // The sink's exceptions reach the writer if the stream's exception mask has badbit.
+    // The stream rethrows the sink's exceptions if its exception mask has badbit.
     int sync() override
     {
         const std::string block = std::exchange(fBlock, {});

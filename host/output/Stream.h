@@ -1,5 +1,5 @@
-// This program's own standard streams without a buffer: a write that waits for a reader holds no
-// lock that another thread needs to end the process.
+// Writes to this program's standard streams without the C library's buffers: a write that blocks
+// holds no lock that another thread needs to end the process.
 #pragma once
 
 #include <string_view>
@@ -9,7 +9,8 @@ namespace assay_host {
 
 enum class StandardStream { kOutput, kError };
 
-// Writes all of it, and waits for the reader without limit. Returns the error.
+// Writes all of the text. Blocks as long as the reader doesn't read. Returns the system's error, or
+// none. Any thread may call.
 std::error_code WriteStream(StandardStream stream, std::string_view text);
 
 } // namespace assay_host

@@ -1,11 +1,12 @@
-// What this program's own streams are.
+// Properties of the terminal behind this program's standard streams. Any thread may call.
 #pragma once
 
 namespace assay_host {
 
+// Whether standard error is a terminal.
 bool IsErrorTerminal();
 
-// The columns of the terminal behind standard output, or what is usual where there is none.
+// Returns the number of columns of the terminal behind standard output; 80 if there is none.
 int GetOutputWidth();
 
 // The same for standard error.

@@ -19,14 +19,14 @@ namespace assay_host {
 
 namespace {
 
-// Small enough for a slow reader to be told from one that doesn't read.
+// Small enough to distinguish a slow reader from one that doesn't read.
 constexpr std::size_t kPieceBytes = 4096;
 
 struct Item {
     StandardStream fStream = StandardStream::kOutput;
     std::string fText;
-    WriterThread::MakeText fMakeText;               // if there is one, instead of the text
-    std::function<void(std::ostream&)> fWriteLarge; // the same
+    WriterThread::MakeText fMakeText;               // replaces fText if it isn't empty
+    std::function<void(std::ostream&)> fWriteLarge; // replaces both if it isn't empty
 };
 
 } // namespace
@@ -46,7 +46,7 @@ struct WriterThread::State {
             if (!IsAbandoned())
                 fOutput->Finish();
         } catch (...) {
-            fOutput->Abandon(); // once this thread is done, the process may end before ~Output
+            fOutput->Abandon(); // the process may end before ~Output once fDone is set
             Fail(std::current_exception());
         }
         fProgress.Clear();
@@ -87,7 +87,7 @@ struct WriterThread::State {
     bool fDone = false;
 
 private:
-    // Short texts wait together: each item costs memory beyond its text.
+    // Short texts share an item, which costs memory beyond its text.
     bool CanJoin(const Item& item) const
     {
         const auto isMade = [](const Item& each) { return each.fMakeText || each.fWriteLarge; };
@@ -96,7 +96,7 @@ private:
                fItems.back().fText.size() + item.fText.size() <= kPieceBytes;
     }
 
-    // False once there is nothing more to be written.
+    // Waits for something to write, and writes it. Returns false at the end.
     bool WriteNext()
     {
         Item item;

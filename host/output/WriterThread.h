@@ -1,4 +1,5 @@
-// Writes the output of a run on a thread of its own: only that thread waits for a reader.
+// Writes the output of a run on a thread of its own, so that only this thread blocks if a reader
+// doesn't read.
 #pragma once
 
 #include <chrono>
@@ -12,45 +13,47 @@
 
 namespace assay_host {
 
-// Keeps each text until it is written, without a limit of its own: the limits of the report's
-// reader bound what comes from a child.
+// Holds every text until it is written. The queue has no limit of its own: the limits of
+// ReportReader and ErrorLines bound what a child can cause to be written.
 //
 // Any thread may call. Call Finish once; only Abandon may follow.
 class WriterThread {
 public:
-    // Called once, on the writer's thread, when its turn has come.
+    // Makes a text. Called once, on the writer's thread, just before the text is written.
     using MakeText = std::function<std::string()>;
 
-    // `failed` is called on the writer's thread if the output fails before Finish. Texts after a
+    // Starts the thread. `failed` is called on it if the output fails before Finish. Texts after a
     // failure are dropped.
     WriterThread(std::unique_ptr<Output> output, std::function<void()> failed);
 
-    // Abandons what isn't written, without waiting.
+    // Calls Abandon.
     ~WriterThread();
     WriterThread(const WriterThread&) = delete;
     WriterThread& operator=(const WriterThread&) = delete;
 
-    // To the output. Pass a MakeText for a text that is larger than what it is made of: it is held
-    // only while it is written.
+    // Queues a text for the output. Pass a MakeText if the text is larger than the data that it is
+    // made of.
     void Write(std::string text);
     void Write(MakeText makeText);
 
-    // The same for a text that is never held whole: `write` is called once, on the writer's thread,
-    // when its turn has come.
+    // Queues a text that is never held as a whole: `write` is called once, on the writer's thread,
+    // with a stream to the output.
     void WriteLarge(std::function<void(std::ostream&)> write);
 
-    // To standard error. If that fails, the text is lost.
+    // Queues a text for standard error. It is lost if it can't be written.
     void WriteError(std::string text);
 
-    // If standard error is a terminal, shows one line of progress as soon as nothing else is to be
-    // written. The next line replaces it.
+    // Sets the line of progress, which is shown while the queue is empty, if standard error is a
+    // terminal.
     void ShowProgress(std::string text);
 
-    // Waits until all is written and the output is finished. Throws the failure of the output if it
-    // had one. With a patience, returns false once nothing could be written for so long.
+    // Waits until everything is written and the output is finished, and returns true. Throws the
+    // output's exception if it failed. With a patience, by the steady clock, returns false when
+    // nothing could be written for that long.
     bool Finish(std::optional<std::chrono::milliseconds> patience);
 
-    // Gives up what isn't written. A thread that waits for a reader goes on until the process ends.
+    // Drops the queue and abandons the output, without waiting. If the thread is blocked in a
+    // write, it stays so until the process ends.
     void Abandon();
 
 private:

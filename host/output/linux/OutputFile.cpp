@@ -16,7 +16,7 @@ namespace assay_host {
 
 namespace {
 
-constexpr ::mode_t kMode = 0666; // less what the user's mask takes
+constexpr ::mode_t kMode = 0666; // before the umask
 
 class OutputFile : public Output {
 public:
@@ -71,8 +71,8 @@ public:
     }
 
 private:
-    // A link stays: the file that it leads to is replaced or created. Links to open files, such as
-    // /dev/stdout, can be followed only by the system.
+    // Returns the file that a link leads to, so that the link itself stays. Only the system can
+    // follow links to open files, such as /dev/stdout.
     static std::string Resolve(const std::string& path)
     {
         boost::system::error_code error;

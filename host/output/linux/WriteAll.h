@@ -1,4 +1,4 @@
-// Writes a whole text.
+// Writes a text to a file descriptor.
 #pragma once
 
 #include <string_view>
@@ -6,7 +6,8 @@
 
 namespace assay_host {
 
-// Waits until all is written, also on a non-blocking descriptor. Returns the error.
+// Writes all of the text. Blocks until it is written, also on a non-blocking descriptor. Returns
+// the system's error, or none.
 std::error_code WriteAll(int descriptor, std::string_view text);
 
 } // namespace assay_host

@@ -8,7 +8,7 @@ namespace assay_host {
 
 namespace {
 
-constexpr std::size_t kMaxWrite = std::size_t{1} << 20;
+constexpr std::size_t kMaxWriteBytes = std::size_t{1} << 20;
 
 } // namespace
 
@@ -16,8 +16,9 @@ std::error_code WriteAll(HANDLE handle, std::string_view text)
 {
     while (!text.empty()) {
         DWORD count = 0;
-        if (::WriteFile(handle, text.data(), static_cast<DWORD>(std::min(text.size(), kMaxWrite)),
-                        &count, nullptr) == 0)
+        if (::WriteFile(handle, text.data(),
+                        static_cast<DWORD>(std::min(text.size(), kMaxWriteBytes)), &count,
+                        nullptr) == 0)
             return {static_cast<int>(::GetLastError()), std::system_category()};
         text.remove_prefix(count);
     }

@@ -8,7 +8,7 @@ namespace {
 
 constexpr int kUsualWidth = 80;
 
-// 0 if it is no console.
+// Returns 0 if the stream isn't a console.
 int GetConsoleWidth(DWORD stream)
 {
     CONSOLE_SCREEN_BUFFER_INFO info = {};

@@ -1,4 +1,4 @@
-// Writes a whole text.
+// Writes a text to a handle.
 #pragma once
 
 #include <windows.h>
@@ -8,6 +8,7 @@
 
 namespace assay_host {
 
+// Writes all of the text. Blocks until it is written. Returns the system's error, or none.
 std::error_code WriteAll(HANDLE handle, std::string_view text);
 
 } // namespace assay_host

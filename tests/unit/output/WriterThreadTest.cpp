@@ -15,10 +15,10 @@ using std::chrono::milliseconds;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// What an output got, and whether its reader reads.
+// A reader of an output that can stop reading.
 struct Reader {
     void Stop() { SetReads(false); }
-    void GoOn() { SetReads(true); }
+    void Resume() { SetReads(true); }
 
     void Take(std::string_view text)
     {
@@ -86,8 +86,8 @@ private:
 
 class WriterThreadTest : public testing::Test {
 protected:
-    // A thread that still waits must not outlive the test.
-    ~WriterThreadTest() override { fReader->GoOn(); }
+    // A thread that is blocked must not outlive the test.
+    ~WriterThreadTest() override { fReader->Resume(); }
 
     std::shared_ptr<Reader> fReader = std::make_shared<Reader>();
     std::shared_ptr<std::atomic<int>> fFailures = std::make_shared<std::atomic<int>>(0);
@@ -106,17 +106,17 @@ TEST_F(WriterThreadTest, WritesInOrder)
     EXPECT_TRUE(fReader->fFinished);
     EXPECT_EQ(*fFailures, 0);
     fWriter.Abandon();
-    EXPECT_FALSE(fReader->fAbandoned); // it is finished
+    EXPECT_FALSE(fReader->fAbandoned); // the output was finished before
 }
 
-TEST_F(WriterThreadTest, KeepsNobodyWaitingForAReader)
+TEST_F(WriterThreadTest, DoesNotBlockItsCallers)
 {
     fReader->Stop();
     for (int line = 0; line < 10000; ++line)
         fWriter.Write("a line");
     fReader->AwaitAsked(1);
     EXPECT_THAT(fReader->GetTaken(), IsEmpty());
-    fReader->GoOn();
+    fReader->Resume();
     EXPECT_TRUE(fWriter.Finish(std::nullopt));
     EXPECT_EQ(fReader->GetAllTaken().size(), 10000 * std::string("a line").size());
 }
@@ -131,7 +131,7 @@ TEST_F(WriterThreadTest, GivesUpAReaderThatDoesNotRead)
     EXPECT_FALSE(fReader->fFinished);
 }
 
-TEST_F(WriterThreadTest, MakesATextWhenItsTurnHasCome)
+TEST_F(WriterThreadTest, MakesATextJustBeforeItIsWritten)
 {
     fReader->Stop();
     std::atomic<bool> made{false};
@@ -142,7 +142,7 @@ TEST_F(WriterThreadTest, MakesATextWhenItsTurnHasCome)
     });
     fReader->AwaitAsked(1);
     EXPECT_FALSE(made);
-    fReader->GoOn();
+    fReader->Resume();
     EXPECT_TRUE(fWriter.Finish(std::nullopt));
     EXPECT_TRUE(made);
 }
@@ -157,7 +157,7 @@ TEST_F(WriterThreadTest, HoldsNoLargeTextWhole)
     });
     fReader->AwaitAsked(1);
     EXPECT_LT(lines, 1000);
-    fReader->GoOn();
+    fReader->Resume();
     EXPECT_TRUE(fWriter.Finish(std::nullopt));
     EXPECT_EQ(fReader->GetAllTaken(), std::string(1000000, 'x'));
 }
@@ -171,7 +171,7 @@ TEST_F(WriterThreadTest, WritesALongTextInPieces)
     EXPECT_GT(fReader->GetTaken().size(), 1U);
 }
 
-TEST_F(WriterThreadTest, TellsAFailureOnceAndThrowsItAtTheEnd)
+TEST_F(WriterThreadTest, ReportsAFailureOnceAndThrowsItAtTheEnd)
 {
     fWriter.Write("bad");
     fWriter.Write("one");
@@ -180,7 +180,7 @@ TEST_F(WriterThreadTest, TellsAFailureOnceAndThrowsItAtTheEnd)
     fWriter.Write("two");
     EXPECT_THROW(fWriter.Finish(std::nullopt), std::runtime_error);
     EXPECT_EQ(*fFailures, 1);
-    EXPECT_TRUE(fReader->fAbandoned); // the process may end now, and end the thread
+    EXPECT_TRUE(fReader->fAbandoned); // the process may end before the output is destroyed
     EXPECT_THAT(fReader->GetTaken(), IsEmpty());
     EXPECT_FALSE(fReader->fFinished);
 }
