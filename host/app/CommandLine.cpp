@@ -17,7 +17,7 @@ namespace {
 constexpr char kChildWord[] = "--";
 constexpr std::size_t kHelpColumn = 26;
 
-// Words behind the first "--" are the child's, whatever they look like.
+// The words before and after the first "--". The latter are the child's.
 struct Words {
     std::vector<std::string> fOwn;
     std::vector<std::string> fChild;
@@ -35,7 +35,7 @@ Words Split(const std::vector<std::string>& words)
     return result;
 }
 
-// Usage lines as a person types them.
+// Formats the usage lines.
 class HelpFormatter : public CLI::Formatter {
 public:
     HelpFormatter() { column_width(kHelpColumn); }
@@ -54,32 +54,33 @@ private:
     std::map<std::string, std::string> fUsages;
 };
 
-// A number of seconds or a part: nothing that isn't finite, and nothing below 0.
 std::string CheckNumber(const std::string& text)
 {
     double value = 0;
     if (!CLI::detail::lexical_cast(text, value) || !std::isfinite(value) || value < 0)
-        return '"' + text + "\" is no number from 0 on";
+        return '"' + text + "\" is not a number of at least 0";
     return {};
 }
 
-std::string CheckGiven(const std::string& text)
+std::string CheckNotEmpty(const std::string& text)
 {
     return text.empty() ? "must not be empty" : "";
 }
 
-CLI::Validator MakeGivenCheck(const char* what)
+CLI::Validator MakeNotEmptyCheck(const char* what)
 {
-    return {CheckGiven, what};
+    return {CheckNotEmpty, what};
 }
 
 void AddChildOptions(CLI::App& command, ChildChoice& child)
 {
     command
-        .add_option("--assay", child.fProgram, "the program [beside assay-host, or on the PATH]")
+        .add_option("--assay", child.fProgram, "program to run [beside assay-host, or on the PATH]")
         ->option_text("PATH")
-        ->check(MakeGivenCheck("PATH"));
-    command.add_option("--timeout", child.fTimeoutSeconds, "kill it then, 0: never [60]")
+        ->check(MakeNotEmptyCheck("PATH"));
+    command
+        .add_option("--timeout", child.fTimeoutSeconds,
+                    "kill the child after this time, 0: never [60]")
         ->option_text("SECONDS")
         ->check(CLI::Validator(CheckNumber, "SECONDS"));
 }
@@ -94,7 +95,7 @@ public:
         fApp.set_help_flag("-h,--help", "show this text");
         fApp.set_version_flag("--version", "assay-host " ASSAY_VERSION, "show the version");
         fApp.require_subcommand(1);
-        fApp.footer("\"assay-host COMMAND --help\" tells more of each.");
+        fApp.footer("\"assay-host COMMAND --help\" describes a command.");
         AddRun();
         AddTorture();
         AddDiff();
@@ -113,14 +114,14 @@ public:
             if (fApp.exit(error, out, err) == 0)
                 return {std::nullopt, 0, out.str()};
             const bool isDiff = !words.empty() && words.front() == "diff";
-            return {std::nullopt, isDiff ? kDiffTroubleStatus : kTroubleStatus, GetText(error)};
+            return {std::nullopt, isDiff ? kDiffErrorStatus : kErrorStatus, GetText(error)};
         }
     }
 
 private:
     static std::string GetText(const CLI::ParseError& error)
     {
-        return fmt::format("assay-host: {}\nassay-host --help tells more.\n",
+        return fmt::format("assay-host: {}\nRun \"assay-host --help\" for the usage.\n",
                            ShowBytes(error.what()));
     }
 
@@ -134,30 +135,29 @@ private:
 
     void AddRun()
     {
-        fRunCommand =
-            AddCommand("run", "run assay, survive it, and show what it found",
-                       "run [option...] [-- child option...]",
-                       "exit status: 0 complete, 1 failed tests, 2 usage error of the child,\n"
-                       "  3 crashed, 4 hung and killed, 5 never started, 6 interrupted,\n"
-                       "  10 trouble with the command line or the output");
+        fRunCommand = AddCommand(
+            "run", "run assay and show its report", "run [option...] [-- child option...]",
+            "exit status: 0 complete, 1 failed tests, 2 usage error of the child,\n"
+            "  3 crashed, 4 hung and killed, 5 never started, 6 interrupted,\n"
+            "  10 error in the command line or the output");
         AddChildOptions(*fRunCommand, fRun.fChild);
         fRunCommand->add_option("--format", fFormat, "text, json or jsonl [text]")
             ->option_text("FORMAT")
             ->check(CLI::IsMember({"text", "json", "jsonl"}));
         fRunCommand->add_flag("--raw", fRun.fRaw,
-                              "the child's own lines first, as they come; with text");
-        fRunCommand->add_option("--output", fRun.fOutput, "write there [standard output]")
+                              "print the child's own lines first; only with text");
+        fRunCommand->add_option("--output", fRun.fOutput, "write to this file [standard output]")
             ->option_text("FILE")
-            ->check(MakeGivenCheck("FILE"));
+            ->check(MakeNotEmptyCheck("FILE"));
     }
 
     void AddTorture()
     {
         fTortureCommand =
-            AddCommand("torture", "make assay fail at every step, and check each outcome",
+            AddCommand("torture", "make assay fail at every step and check each outcome",
                        "torture [option...] [-- child option...]",
-                       "exit status: 0 all as predicted, 1 not, 5 never started, 6 interrupted,\n"
-                       "  10 trouble with the command line or the output");
+                       "exit status: 0 as predicted, 1 different, 5 never started, 6 interrupted,\n"
+                       "  10 error in the command line or the output");
         AddChildOptions(*fTortureCommand, fTorture.fChild);
         fTortureCommand->add_option("--kind", fKind, "crash, throw or both [both]")
             ->option_text("KIND")
@@ -167,20 +167,21 @@ private:
     void AddDiff()
     {
         fDiffCommand =
-            AddCommand("diff", "tell what changed between two reports", "diff [option...] A B",
-                       "exit status: 0 same, 1 different, 2 trouble");
+            AddCommand("diff", "show the differences between two reports", "diff [option...] A B",
+                       "exit status: 0 same, 1 different, 2 error");
         fDiffCommand->add_option("A", fDiff.fBefore, "a report: json, jsonl, or as assay prints it")
             ->required()
             ->option_text(" ")
-            ->check(MakeGivenCheck("FILE"));
-        fDiffCommand->add_option("B", fDiff.fAfter, "the other one")
+            ->check(MakeNotEmptyCheck("FILE"));
+        fDiffCommand->add_option("B", fDiff.fAfter, "the other report")
             ->required()
             ->option_text(" ")
-            ->check(MakeGivenCheck("FILE"));
+            ->check(MakeNotEmptyCheck("FILE"));
         fDiffCommand
-            ->add_option("--tolerance", fDiff.fTolerance, "for measured numbers, as a part [0.1]")
-            ->option_text("PART")
-            ->check(CLI::Validator(CheckNumber, "PART"));
+            ->add_option("--tolerance", fDiff.fTolerance,
+                         "of measurements, relative to the larger one [0.1]")
+            ->option_text("FRACTION")
+            ->check(CLI::Validator(CheckNumber, "FRACTION"));
     }
 
     Choice Choose(const Words& words)
@@ -210,7 +211,7 @@ private:
         return fRun;
     }
 
-    CLI::App fApp{"Runs assay as a child, survives whatever a driver does, says what came of it."};
+    CLI::App fApp{"Runs assay as a child process, survives its failures, and shows its report."};
     const std::shared_ptr<HelpFormatter> fFormatter = std::make_shared<HelpFormatter>();
     CLI::App* fRunCommand = nullptr;
     CLI::App* fTortureCommand = nullptr;

@@ -1,4 +1,4 @@
-// The command line of assay-host.
+// Parses the command line of assay-host.
 #pragma once
 
 #include <optional>
@@ -13,9 +13,9 @@ namespace assay_host {
 enum class Format { kText, kJson, kJsonLines };
 
 struct ChildChoice {
-    std::string fProgram; // empty: the one that is found
+    std::string fProgram; // empty: as FindAssay() finds it
     std::vector<std::string> fArgs;
-    double fTimeoutSeconds = 60;
+    double fTimeoutSeconds = 60; // 0: no limit
 };
 
 struct RunChoice {
@@ -33,23 +33,26 @@ struct TortureChoice {
 struct DiffChoice {
     std::string fBefore;
     std::string fAfter;
-    double fTolerance = 0.1;
+    double fTolerance = 0.1; // as DiffOptions::fTolerance
 };
 
 using Choice = std::variant<RunChoice, TortureChoice, DiffChoice>;
 
-// Statuses beside those of the verdicts.
-constexpr int kTroubleStatus = 10;
+// Exit statuses other than those of the verdicts.
+constexpr int kErrorStatus = 10; // of run and torture
 constexpr int kDifferentStatus = 1;
-constexpr int kDiffTroubleStatus = 2;
+constexpr int kDiffErrorStatus = 2;
 
 struct Parsed {
-    std::optional<Choice> fChoice; // nothing if the program is to end at once
-    int fStatus = 0;               // with which it ends then
-    std::string fText;             // what it says then, on standard output for the status 0
+    std::optional<Choice> fChoice; // empty if the program must end at once
+    // Only without a choice: the exit status, and what to print before. The text goes to standard
+    // output if the status is 0, otherwise to standard error.
+    int fStatus = 0;
+    std::string fText;
 };
 
-// `words`: the command line without the program's name.
+// Parses the words of the command line after the program's name, in UTF-8. Never throws for what
+// the words are.
 Parsed ParseCommandLine(const std::vector<std::string>& words);
 
 } // namespace assay_host

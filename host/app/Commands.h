@@ -1,4 +1,5 @@
-// What the commands do. Each gives the exit status; what throws is trouble.
+// The commands. Each returns the exit status and throws std::runtime_error for an error in its
+// input or output. Call on the main thread, once in a process.
 #pragma once
 
 #include "app/CommandLine.h"

@@ -1,4 +1,4 @@
-// Which program is run where none is named.
+// Finds the program to run.
 #pragma once
 
 #include <string>
@@ -8,10 +8,11 @@
 
 namespace assay_host {
 
-// The one beside this program, else the one on the PATH; if there is none, the path beside this
-// program all the same, so that it can be named.
+// Returns the path of the assay beside this program, otherwise of the one on the PATH, in UTF-8. If
+// there is neither, the path beside this program, for the error message.
 std::string FindAssay();
 
+// Makes the options of a run, with FindAssay() if no program is named.
 ChildOptions MakeChildOptions(const ChildChoice& choice);
 
 } // namespace assay_host

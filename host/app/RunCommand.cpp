@@ -25,8 +25,8 @@ namespace {
 
 constexpr int kFileWidth = 100;
 
-// The line without its key and value, which RestoreLine takes from the text again: less memory
-// while it waits to be written.
+// Returns the line without its key and value, which RestoreLine reads from the text again. Saves
+// memory while the line waits to be written.
 ReportLine ShortenLine(const ReportLine& line)
 {
     ReportLine kept;
@@ -44,7 +44,7 @@ ReportLine RestoreLine(const ReportLine& kept)
     return ReadLine(kept.fText, kept.fLineEnd, kept.fCut);
 }
 
-// Collects the report, and writes at once what doesn't wait for the verdict.
+// Collects the report, and passes lines and events to the writer at once.
 class Session : public RunObserver {
 public:
     Session(const RunChoice& choice, WriterThread& writer) : fChoice(choice), fWriter(writer) {}

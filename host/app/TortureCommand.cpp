@@ -53,26 +53,26 @@ public:
         const RunOutcome outcome = RunChild(fOptions, undisturbed, fStop);
         if (outcome.fVerdict == Verdict::kNeverStarted ||
             outcome.fVerdict == Verdict::kInterrupted) {
-            Say(ShowBytes(outcome.fReason) + "\n");
+            Write(ShowBytes(outcome.fReason) + "\n");
             return GetVerdictStatus(outcome.fVerdict);
         }
         try {
             fRules.emplace(undisturbed.fReport, outcome);
         } catch (const std::runtime_error& error) {
-            Say(fmt::format("Nothing can be predicted: {}\n{}", error.what(),
-                            ShowCommand(outcome)));
+            Write(fmt::format("The runs can't be predicted: {}\n{}", error.what(),
+                              ShowCommand(outcome)));
             return kUnpredictedStatus;
         }
-        Say(fmt::format("{} OpenGL and {} OpenCL devices, {} steps.\n", fRules->GetGLCount(),
-                        fRules->HasOpenCL() ? std::to_string(fRules->GetCLCount()) : "no",
-                        fRules->GetStepCount()));
+        Write(fmt::format("{} OpenGL and {} OpenCL devices, {} steps.\n", fRules->GetGLCount(),
+                          fRules->HasOpenCL() ? std::to_string(fRules->GetCLCount()) : "no",
+                          fRules->GetStepCount()));
         for (const StepFailure failure : fChoice.fFailures) {
             const int status = RunAll(failure);
             if (status != 0)
                 return status;
         }
-        Say(fmt::format("{} runs, each as predicted, in {:.1f} s.\n", fRuns,
-                        std::chrono::duration<double>(Clock::now() - fStart).count()));
+        Write(fmt::format("{} runs, each as predicted, in {:.1f} s.\n", fRuns,
+                          std::chrono::duration<double>(Clock::now() - fStart).count()));
         return 0;
     }
 
@@ -89,22 +89,22 @@ private:
             const RunOutcome outcome = RunChild(options, collector, fStop);
             ++fRuns;
             if (outcome.fVerdict == Verdict::kInterrupted) {
-                Say(fmt::format("Interrupted at {}.\n", option));
+                Write(fmt::format("Interrupted at {}.\n", option));
                 return GetVerdictStatus(outcome.fVerdict);
             }
             const std::string difference =
                 ShowDifference(fRules->Predict(failure, step), collector.fReport, outcome);
             if (!difference.empty()) {
-                Say(fmt::format("{} is not what the rules predict:\n{}{}", option, difference,
-                                ShowCommand(outcome)));
+                Write(fmt::format("{} differs from its prediction:\n{}{}", option, difference,
+                                  ShowCommand(outcome)));
                 return kUnpredictedStatus;
             }
         }
-        Say(fmt::format("-{}=0 to {}: as predicted.\n", GetOptionName(failure), steps));
+        Write(fmt::format("-{}=0 to {}: as predicted.\n", GetOptionName(failure), steps));
         return 0;
     }
 
-    void Say(std::string text) { fWriter.Write(std::move(text)); }
+    void Write(std::string text) { fWriter.Write(std::move(text)); }
 
     const TortureChoice& fChoice;
     const ChildOptions fOptions;

@@ -1,4 +1,4 @@
-// assay-host: the host's side for people and scripts.
+// assay-host: runs assay as a child and reports the result.
 #include <cstdio>
 #include <exception>
 #include <string>
@@ -62,6 +62,6 @@ int main(int argc, char** argv)
         SetInterruptEnd([] { EndProcess(GetVerdictStatus(Verdict::kInterrupted)); });
         std::fprintf(stderr, "assay-host: %s\n", ShowBytes(exc.what()).c_str());
         const bool isDiff = argc > 1 && std::string(argv[1]) == "diff";
-        return isDiff ? kDiffTroubleStatus : kTroubleStatus;
+        return isDiff ? kDiffErrorStatus : kErrorStatus;
     }
 }

@@ -1,4 +1,4 @@
-"""What `assay-host` says of its commands and options, to the letter."""
+"""The help texts of `assay-host`, compared as a whole."""
 
 import pytest
 
@@ -6,7 +6,7 @@ from hosting import host_run
 
 HELP = {
     None: """\
-Runs assay as a child, survives whatever a driver does, says what came of it.
+Runs assay as a child process, survives its failures, and shows its report.
 usage: assay-host run|torture|diff [option...]
 
 Options:
@@ -14,54 +14,54 @@ Options:
   --version               show the version
 
 Subcommands:
-  run                     run assay, survive it, and show what it found
-  torture                 make assay fail at every step, and check each outcome
-  diff                    tell what changed between two reports
+  run                     run assay and show its report
+  torture                 make assay fail at every step and check each outcome
+  diff                    show the differences between two reports
 
-"assay-host COMMAND --help" tells more of each.
+"assay-host COMMAND --help" describes a command.
 """,
     "run": """\
-run assay, survive it, and show what it found
+run assay and show its report
 usage: assay-host run [option...] [-- child option...]
 
 Options:
   -h,--help               show this text
-  --assay PATH            the program [beside assay-host, or on the PATH]
-  --timeout SECONDS       kill it then, 0: never [60]
+  --assay PATH            program to run [beside assay-host, or on the PATH]
+  --timeout SECONDS       kill the child after this time, 0: never [60]
   --format FORMAT         text, json or jsonl [text]
-  --raw                   the child's own lines first, as they come; with text
-  --output FILE           write there [standard output]
+  --raw                   print the child's own lines first; only with text
+  --output FILE           write to this file [standard output]
 
 exit status: 0 complete, 1 failed tests, 2 usage error of the child,
   3 crashed, 4 hung and killed, 5 never started, 6 interrupted,
-  10 trouble with the command line or the output
+  10 error in the command line or the output
 """,
     "torture": """\
-make assay fail at every step, and check each outcome
+make assay fail at every step and check each outcome
 usage: assay-host torture [option...] [-- child option...]
 
 Options:
   -h,--help               show this text
-  --assay PATH            the program [beside assay-host, or on the PATH]
-  --timeout SECONDS       kill it then, 0: never [60]
+  --assay PATH            program to run [beside assay-host, or on the PATH]
+  --timeout SECONDS       kill the child after this time, 0: never [60]
   --kind KIND             crash, throw or both [both]
 
-exit status: 0 all as predicted, 1 not, 5 never started, 6 interrupted,
-  10 trouble with the command line or the output
+exit status: 0 as predicted, 1 different, 5 never started, 6 interrupted,
+  10 error in the command line or the output
 """,
     "diff": """\
-tell what changed between two reports
+show the differences between two reports
 usage: assay-host diff [option...] A B
 
 Positionals:
   A                       a report: json, jsonl, or as assay prints it
-  B                       the other one
+  B                       the other report
 
 Options:
   -h,--help               show this text
-  --tolerance PART        for measured numbers, as a part [0.1]
+  --tolerance FRACTION    of measurements, relative to the larger one [0.1]
 
-exit status: 0 same, 1 different, 2 trouble
+exit status: 0 same, 1 different, 2 error
 """,
 }
 

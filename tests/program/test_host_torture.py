@@ -64,7 +64,7 @@ def wrapped(folder, condition, action):
 
 RULE_BREAKERS = {
     "a wrong status": (f"{PROGRAM} \"$@\"; exit 0", "exit status: predicted 2, found 0"),
-    "a crash in earnest": ("kill -SEGV $$", "predicted 2, found none: The child died of signal 11"),
+    "a crash in earnest": ("kill -SEGV $$", "predicted 2, found none: The child crashed with signal 11"),
     "a line too few": (f"{PROGRAM} \"$@\" | sed '$d'; exit 2", "    + (the end)"),
     "a line too many": (f"{PROGRAM} \"$@\"; echo NumGLGPUs=1; exit 2", "    + NumGLGPUs=1"),
     "another order": (f"{PROGRAM} \"$@\" | sed '$!{{h;d}};G'; exit 2", "report (- predicted"),
@@ -82,7 +82,7 @@ def test_first_outcome_that_is_not_predicted(host, tmp_path, name):
     run = torture(host.environment(script=Gpu().script(), opencl="absent"), "--timeout", "2",
                   assay=child)
     assert run.status == 1
-    assert "\n-crashAfter=5 is not what the rules predict:\n" in run.text
+    assert "\n-crashAfter=5 differs from its prediction:\n" in run.text
     assert shown in run.text
     assert run.text.endswith(f"  command: {child} -crashAfter=5\n")
 
@@ -91,10 +91,10 @@ def test_undisturbed_run_that_is_none(host, tmp_path):
     environment = host.environment(script=Gpu().script(), opencl="absent")
     run = torture(environment, assay="/bin/true")
     assert run.status == 1
-    assert run.text.startswith("Nothing can be predicted: the undisturbed run did not come to its end")
+    assert run.text.startswith("The runs can't be predicted: the undisturbed run did not complete")
     run = torture(environment, assay=script_child(tmp_path, f'{PROGRAM} "$@" | grep -v GLVendor='))
     assert run.status == 1
-    assert "Nothing can be predicted: the report has no line for glgpu[0].GLVendor" in run.text
+    assert "The runs can't be predicted: the report has no line for glgpu[0].GLVendor" in run.text
     run = torture(environment, assay=tmp_path / "missing")
     assert run.status == 5
     assert "there is no file" in run.text
