@@ -29,7 +29,11 @@ SANITIZERS = {
     "ASAN_OPTIONS": CRASHES,
     "TSAN_OPTIONS": f"{CRASHES}:report_signal_unsafe=0",
     "UBSAN_OPTIONS": "print_stacktrace=1",
+    "LSAN_OPTIONS": f"print_suppressions=0:suppressions={TREE / 'tests' / 'lsan.supp'}",
 }
+# Every program that a test starts gets them, with or without an environment of its own.
+for name, value in SANITIZERS.items():
+    os.environ[name] = ":".join(filter(None, [os.environ.get(name), value]))
 
 STAMP = re.compile(r'^(assayStart|assayEnd)="\d{4}-\d\d-\d\d_\d\d:\d\d:\d\d"$', re.MULTILINE)
 
@@ -138,8 +142,7 @@ class Host:
         result = {"PATH": os.environ.get("PATH", "/usr/bin:/bin")}
         if egl == "real" or opencl == "real":
             result = dict(os.environ)
-        for name, value in SANITIZERS.items():
-            result[name] = ":".join(filter(None, [os.environ.get(name), value]))
+        result.update((name, os.environ[name]) for name in SANITIZERS)
         if egl == "real" or opencl == "real":
             # What the machine's drivers keep to the end is not the program's to free.
             result["ASAN_OPTIONS"] += ":detect_leaks=0"
