@@ -223,7 +223,7 @@ public:
     Report TakeReport() { return std::move(fReport); }
 
 private:
-    const ReportReader::Limits fLimits;
+    const ReportReader::Limits fLimits{};
     Report fReport;
     std::size_t fCount = 0;
     std::uint64_t fBytes = 0;
