@@ -14,7 +14,7 @@
 namespace pmutil {
 
 // The parent's ends of a child's pipes.
-struct LaunchResult {
+struct LaunchResult { // NOLINT(bugprone-reserved-identifier): clang's name for copying the array
     boost::shared_ptr<Writer> fAppInput;
     boost::shared_ptr<Reader> fAppOutput[kOutputSlots]; // indexed by TaskID; entry 0 stays empty
 };

@@ -11,7 +11,7 @@ namespace pmutil {
 class UTF8Console {
 public:
     UTF8Console();
-    ~UTF8Console();
+    ~UTF8Console(); // NOLINT(performance-trivially-destructible): Windows has work here
     UTF8Console(const UTF8Console&) = delete;
     UTF8Console& operator=(const UTF8Console&) = delete;
 
