@@ -139,11 +139,20 @@ private:
             "run", "run assay and show its report", "run [option...] [-- child option...]",
             "exit status: 0 complete, 1 failed tests, 2 usage error of the child,\n"
             "  3 crashed, 4 hung and killed, 5 never started, 6 interrupted,\n"
-            "  10 error in the command line or the output");
+            "  10 error in the command line or the output;\n"
+            "  with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown");
         AddChildOptions(*fRunCommand, fRun.fChild);
         fRunCommand->add_option("--format", fFormat, "text, json or jsonl [text]")
             ->option_text("FORMAT")
             ->check(CLI::IsMember({"text", "json", "jsonl"}));
+        fRunCommand->add_option("--schema", fRun.fSchema, "of json and jsonl, 1 or 2 [2]")
+            ->option_text("NUMBER")
+            ->check(CLI::IsMember({"1", "2"}));
+        fRunCommand
+            ->add_option("--need", fNeed, "opengl, opencl or both: exit by whether they work")
+            ->option_text("WHAT")
+            ->check(CLI::IsMember({"opengl", "opencl", "both"}));
+        fRunCommand->add_flag("--identify", fRun.fIdentify, "name this machine in json and jsonl");
         fRunCommand->add_flag("--raw", fRun.fRaw,
                               "print the child's own lines first; only with text");
         fRunCommand->add_option("--output", fRun.fOutput, "write to this file [standard output]")
@@ -207,6 +216,12 @@ private:
                                             : Format::kText;
         if (fRun.fRaw && fRun.fFormat != Format::kText)
             throw CLI::ValidationError("--raw", "only with --format text");
+        if (fRunCommand->count("--schema") > 0 && fRun.fFormat == Format::kText)
+            throw CLI::ValidationError("--schema", "only with --format json or jsonl");
+        fRun.fNeed = fNeed == "opengl"   ? Need::kOpenGL
+                     : fNeed == "opencl" ? Need::kOpenCL
+                     : fNeed == "both"   ? Need::kBoth
+                                         : Need::kNothing;
         fRun.fChild.fArgs = words.fChild;
         return fRun;
     }
@@ -221,6 +236,7 @@ private:
     DiffChoice fDiff;
     std::string fFormat = "text";
     std::string fKind = "both";
+    std::string fNeed;
 };
 
 } // namespace

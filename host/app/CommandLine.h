@@ -12,6 +12,9 @@ namespace assay_host {
 
 enum class Format { kText, kJson, kJsonLines };
 
+// What the exit status of a run is about: its verdict, or whether these can be used.
+enum class Need { kNothing, kOpenGL, kOpenCL, kBoth };
+
 struct ChildChoice {
     std::string fProgram; // empty: as FindAssay() finds it
     std::vector<std::string> fArgs;
@@ -21,6 +24,9 @@ struct ChildChoice {
 struct RunChoice {
     ChildChoice fChild;
     Format fFormat = Format::kText;
+    int fSchema = 2; // of the JSON forms
+    Need fNeed = Need::kNothing;
+    bool fIdentify = false;
     bool fRaw = false;
     std::string fOutput; // empty: standard output
 };

@@ -6,6 +6,7 @@
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
+#include "facts/Environment.h"
 #include "output/Delivery.h"
 #include "output/Output.h"
 #include "output/Terminal.h"
@@ -15,6 +16,7 @@
 #include "report/Report.h"
 #include "report/SequenceReader.h"
 #include "report/TextView.h"
+#include "report/Usable.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
@@ -44,15 +46,43 @@ ReportLine RestoreLine(const ReportLine& kept)
     return ReadLine(kept.fText, kept.fLineEnd, kept.fCut);
 }
 
+RunFacts MakeFacts(const RunChoice& choice)
+{
+    RunFacts facts;
+    facts.fHostVersion = ASSAY_VERSION;
+    facts.fChildVersion = {{}, "its file does not name one"};
+    if (choice.fFormat != Format::kText)
+        facts.fEnvironment = GetEnvironment(choice.fIdentify);
+    return facts;
+}
+
+int GetStatus(Need need, const Report& report, const RunOutcome& outcome)
+{
+    if (need == Need::kNothing)
+        return GetVerdictStatus(outcome.fVerdict);
+    const Answers answers = GetAnswers(report);
+    const Usability gl = JudgeUsable(DeviceKind::kOpenGL, answers, outcome).fUsability;
+    const Usability cl = JudgeUsable(DeviceKind::kOpenCL, answers, outcome).fUsability;
+    return GetUsabilityStatus(need == Need::kOpenGL   ? gl
+                              : need == Need::kOpenCL ? cl
+                                                      : GetLesser(gl, cl));
+}
+
 // Collects the report, and passes lines and events to the writer at once.
 class Session : public RunObserver {
 public:
-    Session(const RunChoice& choice, WriterThread& writer) : fChoice(choice), fWriter(writer) {}
+    Session(const RunChoice& choice, WriterThread& writer)
+        : fChoice(choice), fWriter(writer), fFacts(MakeFacts(choice))
+    {}
 
     void Start(const std::vector<std::string>& command)
     {
-        if (fChoice.fFormat == Format::kJsonLines)
-            fWriter.Write([command] { return MakeStartEvent(command); });
+        if (fChoice.fFormat != Format::kJsonLines)
+            return;
+        if (fChoice.fSchema == kFirstSchemaVersion)
+            fWriter.Write([command] { return MakeFirstStartEvent(command); });
+        else
+            fWriter.Write([command, facts = fFacts] { return MakeStartEvent(command, facts); });
     }
 
     void OnLine(const ReportLine& line, double seconds) override
@@ -62,7 +92,8 @@ public:
             fWriter.Write([kept = ShortenLine(line), seconds] {
                 return MakeLineEvent(RestoreLine(kept), seconds);
             });
-        else
+        // The answers need no other lines, and these are on their way already.
+        if (fChoice.fFormat != Format::kJsonLines || line.fKind == LineKind::kValue)
             fReport.Add(line);
         if (fChoice.fRaw)
             fWriter.Write(line.fText + line.fLineEnd);
@@ -83,36 +114,42 @@ public:
                                          next.empty() ? "at the end" : "at " + next));
     }
 
-    void Finish(const RunOutcome& outcome)
+    // Writes the rest, and returns the exit status.
+    int Finish(const RunOutcome& outcome)
     {
+        const auto report = std::make_shared<const Report>(std::move(fReport));
+        const int status = GetStatus(fChoice.fNeed, *report, outcome);
+        const bool isFirst = fChoice.fSchema == kFirstSchemaVersion;
         switch (fChoice.fFormat) {
         case Format::kJsonLines:
-            fWriter.Write([outcome] { return MakeEndEvent(outcome); });
+            fWriter.Write([report, outcome, isFirst] {
+                return isFirst ? MakeFirstEndEvent(outcome)
+                               : MakeEndEvent(GetAnswers(*report), outcome);
+            });
             break;
         case Format::kJson:
-            fWriter.WriteLarge([report = TakeReport(), outcome](std::ostream& out) {
-                WriteDocument(out, *report, outcome);
+            fWriter.WriteLarge([report, outcome, facts = fFacts, isFirst](std::ostream& out) {
+                if (isFirst)
+                    WriteFirstDocument(out, *report, outcome);
+                else
+                    WriteDocument(out, *report, outcome, facts);
             });
             break;
         case Format::kText:
             if (fChoice.fRaw)
                 fWriter.Write("\n");
             const int width = fChoice.fOutput.empty() ? GetOutputWidth() : kFileWidth;
-            fWriter.WriteLarge([report = TakeReport(), outcome, width](std::ostream& out) {
+            fWriter.WriteLarge([report, outcome, width](std::ostream& out) {
                 PrintText(out, *report, outcome, width);
             });
         }
+        return status;
     }
 
 private:
-    // The writer may outlive this object.
-    std::shared_ptr<const Report> TakeReport()
-    {
-        return std::make_shared<const Report>(std::move(fReport));
-    }
-
     const RunChoice& fChoice;
     WriterThread& fWriter;
+    const RunFacts fFacts;
     Report fReport;
     SequenceReader fSequence;
 };
@@ -134,9 +171,9 @@ int Run(const RunChoice& choice)
     session.Start(command);
     const RunOutcome outcome = RunChild(options, session, *stop);
     const Delivery delivery(writer);
-    session.Finish(outcome);
+    const int status = session.Finish(outcome);
     delivery.Finish();
-    return GetVerdictStatus(outcome.fVerdict);
+    return status;
 }
 
 } // namespace assay_host

@@ -14,6 +14,7 @@
 
 #include "report/Answers.h"
 #include "report/Bytes.h"
+#include "report/JsonFacts.h"
 #include "report/JsonWriter.h"
 #include "report/LineForm.h"
 #include "report/Numbers.h"
@@ -70,14 +71,17 @@ Json MakeTexts(const std::vector<std::string>& texts)
     return array;
 }
 
-Json MakeAnswer(const Answer& answer)
+bool IsFlag(const Answer& answer)
 {
-    if (!answer.fLine)
-        return {{"value", nullptr}, {"reason", GetMissingText(answer.fMissing)}};
-    const ReportLine& line = *answer.fLine;
-    Json json = {{"value", MakeText(line.fValue)}};
+    return answer.fKnown && answer.fKnown->fForm == ValueForm::kFlag &&
+           (answer.fLine->fValue == "0" || answer.fLine->fValue == "1");
+}
+
+// The members of a value that is no text.
+void AddNumbers(Json& json, const ReportLine& line)
+{
     if (line.fQuoted || !IsWholeValue(line))
-        return json;
+        return;
     if (const auto number = ReadNumber(line.fValue))
         json["number"] = MakeNumber(*number);
     if (const auto numbers = ReadNumberList(line.fValue)) {
@@ -85,18 +89,41 @@ Json MakeAnswer(const Answer& answer)
         for (const Number& number : *numbers)
             json["numbers"].push_back(MakeNumber(number));
     }
+}
+
+Json MakeFirstAnswer(const Answer& answer)
+{
+    if (!answer.fLine)
+        return {{"value", nullptr}, {"reason", GetMissingText(answer.fMissing)}};
+    Json json = {{"value", MakeText(answer.fLine->fValue)}};
+    AddNumbers(json, *answer.fLine);
     return json;
 }
 
-void WriteAnswers(JsonWriter& json, const std::vector<Answer>& answers)
+Json MakeAnswer(const Answer& answer)
+{
+    if (!answer.fLine)
+        return {{"known", false}, {"value", nullptr}, {"reason", GetMissingText(answer.fMissing)}};
+    const Json value = MakeText(answer.fLine->fValue);
+    if (!answer.IsKnown())
+        return {{"known", false}, {"value", value}, {"reason", GetUnknownText(answer.fUnknown)}};
+    Json json = {{"known", true}, {"value", value}};
+    AddNumbers(json, *answer.fLine);
+    if (IsFlag(answer))
+        json["flag"] = answer.fLine->fValue == "1";
+    return json;
+}
+
+void WriteAnswers(JsonWriter& json, const std::vector<Answer>& answers, int schema)
 {
     json.Open('{', "keys");
     for (const Answer& answer : answers)
-        json.Write(answer.fKey, MakeAnswer(answer));
+        json.Write(answer.fKey,
+                   schema == kFirstSchemaVersion ? MakeFirstAnswer(answer) : MakeAnswer(answer));
     json.Close('}');
 }
 
-void WriteDevice(JsonWriter& json, const DeviceAnswers& device)
+void WriteDevice(JsonWriter& json, const DeviceAnswers& device, int schema)
 {
     json.Open('{');
     json.Write("tag", device.fTag);
@@ -104,7 +131,9 @@ void WriteDevice(JsonWriter& json, const DeviceAnswers& device)
     json.Write("index", device.fIndex);
     json.Write("complete", device.fComplete);
     json.Write("failed", device.fFailed);
-    WriteAnswers(json, device.fAnswers);
+    if (schema != kFirstSchemaVersion)
+        json.Write("software", MakeSoftware(device));
+    WriteAnswers(json, device.fAnswers, schema);
     json.Close('}');
 }
 
@@ -120,7 +149,26 @@ Json MakeLine(const ReportLine& line)
     return json;
 }
 
-Json MakeOutcome(const RunOutcome& outcome)
+// The parts that both schemas have.
+void WriteReport(JsonWriter& json, const Report& report, const Answers& answers, int schema)
+{
+    json.Open('{', "report");
+    json.Write("whole", report.IsWhole());
+    json.Write("next", MakeTextOrNull(answers.fNext));
+    WriteAnswers(json, answers.fReport, schema);
+    json.Close('}');
+    json.Open('[', "devices");
+    for (const DeviceAnswers& device : answers.fDevices)
+        WriteDevice(json, device, schema);
+    json.Close(']');
+    json.Write("devicesLeftOut", answers.fDevicesLeftOut);
+    json.Open('[', "lines");
+    for (const ReportLine& line : report.GetLines())
+        json.Write(MakeLine(line));
+    json.Close(']');
+}
+
+Json MakeFirstOutcome(const RunOutcome& outcome)
 {
     return {
         {"verdict", GetVerdictName(outcome.fVerdict)},
@@ -138,6 +186,13 @@ Json MakeOutcome(const RunOutcome& outcome)
         {"lostErrorBytes", outcome.fLostErrorBytes},
         {"leftBehind", outcome.fLeftBehind},
     };
+}
+
+Json MakeOutcome(const RunOutcome& outcome)
+{
+    Json json = MakeFirstOutcome(outcome);
+    json["causes"] = MakeCauses(outcome);
+    return json;
 }
 
 // Returns a required member of an object. Throws if it is missing or of another type.
@@ -179,9 +234,10 @@ ReportLine ReadJsonLine(const Json& json, const std::string& where)
 void CheckSchema(const Json& json, const std::string& where)
 {
     const Json& schema = Get(json, where, "schema", &Json::is_number_integer, "an integer");
-    if (schema != kSchemaVersion)
-        throw std::runtime_error(fmt::format("{}: \"schema\" is {}, and only {} can be read", where,
-                                             schema.dump(), kSchemaVersion));
+    if (schema != kSchemaVersion && schema != kFirstSchemaVersion)
+        throw std::runtime_error(fmt::format("{}: \"schema\" is {}, and only {} and {} can be read",
+                                             where, schema.dump(), kFirstSchemaVersion,
+                                             kSchemaVersion));
 }
 
 class JsonFailure : public std::runtime_error {
@@ -339,38 +395,54 @@ std::string ToEvent(const Json& event)
 
 } // namespace
 
-void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome)
+void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome,
+                   const RunFacts& facts)
 {
     const Answers answers = GetAnswers(report);
     JsonWriter json(out);
     json.Open('{');
     json.Write("schema", kSchemaVersion);
+    json.Write("versions", MakeVersions(facts));
+    json.Write("environment", MakeEnvironment(facts.fEnvironment));
     json.Write("command", MakeTexts(outcome.fCommand));
     json.Write("outcome", MakeOutcome(outcome));
-    json.Open('{', "report");
-    json.Write("whole", report.IsWhole());
-    json.Write("next", MakeTextOrNull(answers.fNext));
-    WriteAnswers(json, answers.fReport);
-    json.Close('}');
-    json.Open('[', "devices");
-    for (const DeviceAnswers& device : answers.fDevices)
-        WriteDevice(json, device);
-    json.Close(']');
-    json.Write("devicesLeftOut", answers.fDevicesLeftOut);
-    json.Open('[', "lines");
-    for (const ReportLine& line : report.GetLines())
-        json.Write(MakeLine(line));
-    json.Close(']');
+    json.Write("usable", MakeUsable(answers, outcome));
+    json.Write("warnings", MakeWarnings(GetWarnings(answers, outcome)));
+    WriteReport(json, report, answers, kSchemaVersion);
     json.Close('}');
     out << '\n';
 }
 
-std::string MakeStartEvent(const std::vector<std::string>& command)
+void WriteFirstDocument(std::ostream& out, const Report& report, const RunOutcome& outcome)
+{
+    JsonWriter json(out);
+    json.Open('{');
+    json.Write("schema", kFirstSchemaVersion);
+    json.Write("command", MakeTexts(outcome.fCommand));
+    json.Write("outcome", MakeFirstOutcome(outcome));
+    WriteReport(json, report, GetAnswers(report), kFirstSchemaVersion);
+    json.Close('}');
+    out << '\n';
+}
+
+std::string MakeStartEvent(const std::vector<std::string>& command, const RunFacts& facts)
 {
     return ToEvent({
         {"event", "start"},
         {"seconds", 0.0},
         {"schema", kSchemaVersion},
+        {"versions", MakeVersions(facts)},
+        {"environment", MakeEnvironment(facts.fEnvironment)},
+        {"command", MakeTexts(command)},
+    });
+}
+
+std::string MakeFirstStartEvent(const std::vector<std::string>& command)
+{
+    return ToEvent({
+        {"event", "start"},
+        {"seconds", 0.0},
+        {"schema", kFirstSchemaVersion},
         {"command", MakeTexts(command)},
     });
 }
@@ -392,12 +464,23 @@ std::string MakeErrorLineEvent(const std::string& line, double seconds)
         {{"event", "error"}, {"seconds", MakeSeconds(seconds)}, {"text", MakeText(line)}});
 }
 
-std::string MakeEndEvent(const RunOutcome& outcome)
+std::string MakeEndEvent(const Answers& answers, const RunOutcome& outcome)
 {
     return ToEvent({
         {"event", "end"},
         {"seconds", MakeSeconds(outcome.fSeconds)},
         {"outcome", MakeOutcome(outcome)},
+        {"usable", MakeUsable(answers, outcome)},
+        {"warnings", MakeWarnings(GetWarnings(answers, outcome))},
+    });
+}
+
+std::string MakeFirstEndEvent(const RunOutcome& outcome)
+{
+    return ToEvent({
+        {"event", "end"},
+        {"seconds", MakeSeconds(outcome.fSeconds)},
+        {"outcome", MakeFirstOutcome(outcome)},
     });
 }
 

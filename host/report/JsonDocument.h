@@ -13,20 +13,29 @@
 #include <string>
 #include <vector>
 
+#include "report/Answers.h"
 #include "report/Report.h"
+#include "report/RunFacts.h"
 #include "report/RunOutcome.h"
 
 namespace assay_host {
 
-// Incremented when the document changes in a way that breaks existing readers.
-constexpr int kSchemaVersion = 1;
+// Incremented when the document changes in a way that breaks existing readers. The first one is
+// still written on request; both are read.
+constexpr int kSchemaVersion = 2;
+constexpr int kFirstSchemaVersion = 1;
 
 // Writes the document and a line end, piece by piece. Doesn't check the stream for failures.
-void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome);
+void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome,
+                   const RunFacts& facts);
+
+// Writes the document of the first schema.
+void WriteFirstDocument(std::ostream& out, const Report& report, const RunOutcome& outcome);
 
 // Makes the event "start" of a run, 0 seconds after its launch. Every event is a JSON object on one
 // line, with its line end.
-std::string MakeStartEvent(const std::vector<std::string>& command);
+std::string MakeStartEvent(const std::vector<std::string>& command, const RunFacts& facts);
+std::string MakeFirstStartEvent(const std::vector<std::string>& command);
 
 // Makes the event "line", `seconds` after the launch.
 std::string MakeLineEvent(const ReportLine& line, double seconds);
@@ -35,7 +44,8 @@ std::string MakeLineEvent(const ReportLine& line, double seconds);
 std::string MakeErrorLineEvent(const std::string& line, double seconds);
 
 // Makes the event "end".
-std::string MakeEndEvent(const RunOutcome& outcome);
+std::string MakeEndEvent(const Answers& answers, const RunOutcome& outcome);
+std::string MakeFirstEndEvent(const RunOutcome& outcome);
 
 // Reads the report of a document, without holding the other parts of it. Throws std::runtime_error
 // that names the first error in the document.

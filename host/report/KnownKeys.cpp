@@ -21,6 +21,13 @@ KnownKey ReportKey(const char* name, Match match = Match::kExact)
     return key;
 }
 
+KnownKey ReportFlag(const char* name)
+{
+    KnownKey key = ReportKey(name);
+    key.fForm = ValueForm::kFlag;
+    return key;
+}
+
 KnownKey DeviceKey(DeviceKind kind, int row, const char* name, const char* label, ValueForm form,
                    Match match = Match::kExact, const char* silentWithout = "")
 {
@@ -98,9 +105,9 @@ std::vector<KnownKey> MakeKnownKeys()
     return {
         ReportKey("Tester"),
         ReportKey("assayStart", Match::kStamp),
-        ReportKey("QGFCoreInitialized"),
-        ReportKey("QGFOGLInitialized"),
-        ReportKey("OGLContextCreated"),
+        ReportFlag("QGFCoreInitialized"),
+        ReportFlag("QGFOGLInitialized"),
+        ReportFlag("OGLContextCreated"),
 
         ReportKey(GetCountKey(kGL)),
         DeviceKey(kGL, 8, "GLVersion", "OpenGL version", Form::kText),

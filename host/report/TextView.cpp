@@ -12,6 +12,7 @@
 #include "report/Answers.h"
 #include "report/Bytes.h"
 #include "report/TextTable.h"
+#include "report/Usable.h"
 #include "report/ValueText.h"
 #include "report/Warnings.h"
 
@@ -208,6 +209,13 @@ std::string GetCommandText(const RunOutcome& outcome)
     return text;
 }
 
+// "hardware (glgpu[0]): OpenGL works on graphics hardware."
+std::string GetUsableText(const Usable& usable)
+{
+    return fmt::format("{}{}: {}", GetUsabilityName(usable.fUsability),
+                       usable.fTag.empty() ? "" : " (" + usable.fTag + ")", usable.fText);
+}
+
 std::string GetTimeText(const RunOutcome& outcome)
 {
     std::string text = fmt::format("{:.2f} s", outcome.fSeconds);
@@ -256,6 +264,8 @@ void PrintVerdict(std::ostream& out, const Report& report, const Answers& answer
             table.Add(label, value);
     };
     add("What happened", ShowBytes(outcome.fReason));
+    for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL})
+        add(GetKindName(kind), GetUsableText(JudgeUsable(kind, answers, outcome)));
     add("Ended by", ShowBytes(outcome.fTermination));
     add("Exit status", outcome.fExitStatus ? std::to_string(*outcome.fExitStatus) : "");
     add("Command", GetCommandText(outcome));

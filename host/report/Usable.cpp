@@ -248,6 +248,21 @@ const char* GetUsabilityName(Usability usability)
     return "unknown";
 }
 
+int GetUsabilityStatus(Usability usability)
+{
+    constexpr int kFirstOther = 20;
+    return usability == Usability::kHardware ? 0 : kFirstOther + static_cast<int>(usability) - 1;
+}
+
+Usability GetLesser(Usability first, Usability second)
+{
+    for (const Usability less :
+         {Usability::kBroken, Usability::kAbsent, Usability::kUnknown, Usability::kSoftware})
+        if (first == less || second == less)
+            return less;
+    return Usability::kHardware;
+}
+
 Usable JudgeUsable(DeviceKind kind, const Answers& answers, const RunOutcome& outcome)
 {
     return UsableJudge(kind, answers, outcome).Judge();

@@ -20,6 +20,14 @@ enum class Usability {
 // Returns "hardware", "software", "broken", "absent" or "unknown".
 const char* GetUsabilityName(Usability usability);
 
+// Returns the exit status of `assay-host run --need` for it: 0 for hardware, 20 to 23 for the
+// others in the order above. None is the status of a verdict.
+int GetUsabilityStatus(Usability usability);
+
+// The answer for a host that needs both: the one that leaves less. Broken leaves least, then
+// absent, unknown, software and hardware.
+Usability GetLesser(Usability first, Usability second);
+
 struct Usable {
     Usability fUsability = Usability::kUnknown;
     const char* fReason = ""; // a stable word for programs

@@ -37,7 +37,7 @@ Report ReadReport(std::string_view text)
 std::string GetDocument(const Report& report, const RunOutcome& outcome)
 {
     std::ostringstream out;
-    WriteDocument(out, report, outcome);
+    WriteDocument(out, report, outcome, {});
     return out.str();
 }
 
@@ -55,6 +55,7 @@ RunOutcome MakeOutcome(const std::string& bytes)
     outcome.fReason = bytes;
     outcome.fLastReportLine = bytes;
     outcome.fErrorLines = {bytes};
+    outcome.fCauses = {{bytes, bytes}};
     return outcome;
 }
 
@@ -68,10 +69,10 @@ void CheckReport(const std::string& bytes)
     Require(back.ToText() == report.ToText());
     Require(GetDocument(back, outcome) == document);
 
-    std::string events = MakeStartEvent({bytes});
+    std::string events = MakeStartEvent({bytes}, {});
     for (const ReportLine& line : report.GetLines())
         events += MakeLineEvent(line, 1);
-    events += MakeErrorLineEvent(bytes, 1) + MakeEndEvent(outcome);
+    events += MakeErrorLineEvent(bytes, 1) + MakeEndEvent(GetAnswers(report), outcome);
     Require(Read(ReadEvents, events).ToText() == report.ToText());
 
     Require(DecodeBytes(EncodeBytes(bytes)) == bytes);
@@ -103,7 +104,7 @@ void CheckJson(const std::string& bytes)
 {
     CheckRead([&bytes] { Read(ReadDocument, bytes); });
     CheckRead([&bytes] { Read(ReadEvents, bytes); });
-    CheckRead([&bytes] { Read(ReadEvents, MakeStartEvent({}) + bytes); });
+    CheckRead([&bytes] { Read(ReadEvents, MakeFirstStartEvent({}) + bytes); });
 }
 
 } // namespace

@@ -29,12 +29,16 @@ Options:
   --assay PATH            program to run [beside assay-host, or on the PATH]
   --timeout SECONDS       kill the child after this time, 0: never [60]
   --format FORMAT         text, json or jsonl [text]
+  --schema NUMBER         of json and jsonl, 1 or 2 [2]
+  --need WHAT             opengl, opencl or both: exit by whether they work
+  --identify              name this machine in json and jsonl
   --raw                   print the child's own lines first; only with text
   --output FILE           write to this file [standard output]
 
 exit status: 0 complete, 1 failed tests, 2 usage error of the child,
   3 crashed, 4 hung and killed, 5 never started, 6 interrupted,
-  10 error in the command line or the output
+  10 error in the command line or the output;
+  with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown
 """,
     "torture": """\
 make assay fail at every step and check each outcome

@@ -31,22 +31,35 @@ def _load(text):
     return json.loads(text, parse_constant=_no_constant)
 
 
-DOCUMENT = _validator("assay-report-1.schema.json")
-EVENT = _validator("assay-events-1.schema.json")
+# By the schema's number.
+DOCUMENTS = {number: _validator(f"assay-report-{number}.schema.json") for number in (1, 2)}
+EVENTS = {number: _validator(f"assay-events-{number}.schema.json") for number in (1, 2)}
+
+
+def document_validator(document):
+    """The validator of the schema that the document names; raises KeyError for any other."""
+    return DOCUMENTS[document["schema"]]
+
+
+def event_validator(event):
+    """The validator of an event that stands alone. Those of lines are the same in both schemas."""
+    return EVENTS[event.get("schema", 2 if "usable" in event else 1)]
 
 
 def validate_document(data):
-    """The document in these bytes; raises for what is no JSON, or not of the schema."""
+    """The document in these bytes; raises for what is no JSON, or not of its schema."""
     document = _load(data.decode("utf-8"))
-    DOCUMENT.validate(document)
+    document_validator(document).validate(document)
     return document
 
 
 def validate_events(data):
-    """The events in these bytes, one a line; raises as validate_document does."""
+    """The events in these bytes, one a line; raises as validate_document does. The first one names
+    the schema of all, if it is the start."""
     events = [_load(line) for line in data.decode("utf-8").split("\n") if line]
+    number = events[0].get("schema") if events else None
     for event in events:
-        EVENT.validate(event)
+        (EVENTS[number] if number else event_validator(event)).validate(event)
     return events
 
 

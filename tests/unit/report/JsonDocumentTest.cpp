@@ -269,7 +269,8 @@ TEST(JsonDocument, RejectsOtherDocuments)
         {"null", "the document is not an object"},
         {"{}", "the document: \"schema\" is missing"},
         {R"({"schema": "1"})", "the document: \"schema\" is not an integer"},
-        {R"({"schema": 2, "lines": []})", "the document: \"schema\" is 2, and only 1 can be read"},
+        {R"({"schema": 3, "lines": []})",
+         "the document: \"schema\" is 3, and only 1 and 2 can be read"},
         {R"({"schema": 1})", "the document: \"lines\" is missing"},
         {R"({"schema": 1, "lines": {}})", "the document: \"lines\" is not an array"},
         {R"({"schema": 1, "lines": [1]})", "lines[0] is not an object"},
@@ -301,7 +302,7 @@ TEST(JsonDocument, RejectsOtherDocuments)
 
 TEST(JsonEvents, HaveTheirForms)
 {
-    EXPECT_EQ(SaveEvent(MakeStartEvent({"assay", "-x"})),
+    EXPECT_EQ(SaveEvent(MakeFirstStartEvent({"assay", "-x"})),
               Json::parse(R"({"event": "start", "seconds": 0.0, "schema": 1, )"
                           R"("command": ["assay", "-x"]})"));
     const std::vector<ReportLine> lines = ReadLines("a=\"\xFF\"\r\n# b\nc");
@@ -320,7 +321,7 @@ TEST(JsonEvents, HaveTheirForms)
     EXPECT_EQ(SaveEvent(MakeLineEvent(cut, -1))["cut"], true);
     EXPECT_EQ(SaveEvent(MakeErrorLineEvent("\x80", 2)),
               Json::parse(R"({"event": "error", "seconds": 2.0, "text": "\uF780"})"));
-    const Json end = SaveEvent(MakeEndEvent(GoodOutcome()));
+    const Json end = SaveEvent(MakeFirstEndEvent(GoodOutcome()));
     EXPECT_EQ(Names(end), (std::vector<std::string>{"event", "seconds", "outcome"}));
     EXPECT_EQ(end["seconds"], 0.25);
     EXPECT_EQ(end["outcome"], Document("")["outcome"]);
@@ -328,7 +329,7 @@ TEST(JsonEvents, HaveTheirForms)
 
 std::string Events(const std::string& report)
 {
-    std::string text = MakeStartEvent({"assay"});
+    std::string text = MakeFirstStartEvent({"assay"});
     for (const ReportLine& line : ReadLines(report))
         text += MakeLineEvent(line, 0.5);
     return text + MakeErrorLineEvent("x", 1);
@@ -337,7 +338,7 @@ std::string Events(const std::string& report)
 TEST(JsonEvents, RestoreTheReport)
 {
     const std::string report = Sample(1, 1).GetText() + "a=\"\xFF\n\"\r\n# log\nraw";
-    const std::string text = Events(report) + MakeEndEvent(GoodOutcome());
+    const std::string text = Events(report) + MakeFirstEndEvent(GoodOutcome());
     SaveText(text, ".jsonl");
     EXPECT_EQ(ReadEvents(text).ToText(), report);
 }
@@ -357,7 +358,7 @@ TEST(JsonEvents, RejectOtherLines)
         std::string fText;
         const char* fMessage;
     };
-    const std::string start = MakeStartEvent({});
+    const std::string start = MakeFirstStartEvent({});
     const Row rows[] = {
         {"{}", "line 1: \"event\" is missing"},
         {"[]\n", "line 1 is not a JSON object"},
@@ -371,7 +372,8 @@ TEST(JsonEvents, RejectOtherLines)
         {R"({"event": 1})", "line 1: \"event\" is not a string"},
         {R"({"event": "end"})", "line 1 is not the event \"start\""},
         {R"({"event": "start"})", "line 1: \"schema\" is missing"},
-        {R"({"event": "start", "schema": 7})", "line 1: \"schema\" is 7, and only 1 can be read"},
+        {R"({"event": "start", "schema": 7})",
+         "line 1: \"schema\" is 7, and only 1 and 2 can be read"},
         {start + start, "line 2 is a second event \"start\""},
         {start + "\n" + start, "line 2: not valid JSON: "},
         {start + "{\"event\": \"line\"}\n", "line 2: \"kind\" is missing"},

@@ -58,10 +58,10 @@ std::string Load(const std::string& text)
 
 std::string MakeEvents(const std::string& text)
 {
-    std::string events = MakeStartEvent({"assay"});
+    std::string events = MakeFirstStartEvent({"assay"});
     for (const ReportLine& line : ReadLines(text))
         events += MakeLineEvent(line, 1);
-    return events + MakeEndEvent({});
+    return events + MakeFirstEndEvent({});
 }
 
 TEST(ReportFile, LoadsEachForm)
@@ -107,7 +107,7 @@ TEST(ReportFile, RejectsLargeInputBeforeItIsHeld)
     EXPECT_EQ(LoadFailure("{\"a\": \"" + large + "\"}"), "too large for a report");
     EXPECT_EQ(LoadFailure("{\n\"a\": " + std::string(large.size(), '1') + "}"),
               "too large for a report");
-    EXPECT_EQ(LoadFailure(MakeStartEvent({}) + "{\"event\": \"" + large + "\"}\n"),
+    EXPECT_EQ(LoadFailure(MakeFirstStartEvent({}) + "{\"event\": \"" + large + "\"}\n"),
               "too large for a report");
     EXPECT_EQ(LoadFailure(std::string(large.size(), '\n')),
               "lines too long, or too many, for a report");

@@ -35,7 +35,7 @@ inline void SaveText(const std::string& text, const char* ending)
 inline std::string GetDocumentText(const Report& report, const RunOutcome& outcome)
 {
     std::ostringstream out;
-    WriteDocument(out, report, outcome);
+    WriteFirstDocument(out, report, outcome);
     return out.str();
 }
 

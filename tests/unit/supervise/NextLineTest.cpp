@@ -87,7 +87,7 @@ void ExpectOneKeyInAllOutputs(const Report& report, const RunOutcome& outcome,
                               const std::string& key)
 {
     std::ostringstream json;
-    WriteDocument(json, report, outcome);
+    WriteDocument(json, report, outcome, {});
     const auto next = nlohmann::json::parse(json.str())["report"]["next"];
     EXPECT_EQ(next.is_null() ? "" : next.get<std::string>(), key);
 

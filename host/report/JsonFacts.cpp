@@ -1,0 +1,92 @@
+#include "report/JsonFacts.h"
+
+#include "report/JsonDocument.h"
+#include "report/Software.h"
+
+namespace assay_host {
+
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+Json MakeTag(const std::string& tag)
+{
+    return tag.empty() ? Json() : Json(tag);
+}
+
+Json MakeAnswer(const Usable& usable)
+{
+    return {
+        {"answer", GetUsabilityName(usable.fUsability)},
+        {"reason", usable.fReason},
+        {"device", MakeTag(usable.fTag)},
+        {"text", EncodeBytes(usable.fText)},
+    };
+}
+
+} // namespace
+
+Json MakeFact(const Fact& fact)
+{
+    if (!fact.IsKnown())
+        return {{"known", false}, {"reason", EncodeBytes(fact.fReason)}};
+    return {{"known", true}, {"value", EncodeBytes(fact.fValue)}};
+}
+
+Json MakeVersions(const RunFacts& facts)
+{
+    return {
+        {"assay-host", MakeFact({facts.fHostVersion, {}})},
+        {"assay", MakeFact(facts.fChildVersion)},
+    };
+}
+
+Json MakeEnvironment(const Environment& environment)
+{
+    return {
+        {"time", environment.fTime},
+        {"utcOffset", environment.fOffset},
+        {"system", MakeFact(environment.fSystem)},
+        {"build", MakeFact(environment.fBuild)},
+        {"kernel", MakeFact(environment.fKernel)},
+        {"architecture", MakeFact(environment.fArchitecture)},
+        {"host", MakeFact(environment.fHost)},
+    };
+}
+
+Json MakeUsable(const Answers& answers, const RunOutcome& outcome)
+{
+    return {
+        {"opengl", MakeAnswer(JudgeUsable(DeviceKind::kOpenGL, answers, outcome))},
+        {"opencl", MakeAnswer(JudgeUsable(DeviceKind::kOpenCL, answers, outcome))},
+    };
+}
+
+Json MakeWarnings(const std::vector<Warning>& warnings)
+{
+    Json array = Json::array();
+    for (const Warning& warning : warnings)
+        array.push_back({
+            {"code", warning.fCode},
+            {"device", MakeTag(warning.fTag)},
+            {"text", EncodeBytes(warning.fText)},
+        });
+    return array;
+}
+
+Json MakeCauses(const RunOutcome& outcome)
+{
+    Json array = Json::array();
+    for (const Cause& cause : outcome.fCauses)
+        array.push_back({{"key", EncodeBytes(cause.fKey)}, {"text", EncodeBytes(cause.fText)}});
+    return array;
+}
+
+Json MakeSoftware(const DeviceAnswers& device)
+{
+    if (!CanTellSoftware(device))
+        return {{"known", false}, {"reason", "no answer names the renderer"}};
+    return {{"known", true}, {"flag", !FindSoftwareText(device).empty()}};
+}
+
+} // namespace assay_host

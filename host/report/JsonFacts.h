@@ -1,0 +1,31 @@
+// The parts of a document that the second schema added.
+#pragma once
+
+#include <vector>
+
+#include <nlohmann/json.hpp>
+
+#include "report/Answers.h"
+#include "report/RunFacts.h"
+#include "report/RunOutcome.h"
+#include "report/Usable.h"
+#include "report/Warnings.h"
+
+namespace assay_host {
+
+// {"known": true, "value": ...}, or {"known": false, "reason": ...}.
+nlohmann::ordered_json MakeFact(const Fact& fact);
+
+nlohmann::ordered_json MakeVersions(const RunFacts& facts);
+nlohmann::ordered_json MakeEnvironment(const Environment& environment);
+
+// Both interfaces' answers, under "opengl" and "opencl".
+nlohmann::ordered_json MakeUsable(const Answers& answers, const RunOutcome& outcome);
+
+nlohmann::ordered_json MakeWarnings(const std::vector<Warning>& warnings);
+nlohmann::ordered_json MakeCauses(const RunOutcome& outcome);
+
+// Whether the device is a software renderer: {"known": true, "flag": ...}.
+nlohmann::ordered_json MakeSoftware(const DeviceAnswers& device);
+
+} // namespace assay_host
