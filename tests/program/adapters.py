@@ -1,5 +1,5 @@
-"""Writes the files in which a Linux kernel describes graphics adapters, as far as the program reads
-them, under a folder that stands for the root of the file system."""
+"""Writes the files of a Linux kernel that describe graphics adapters, as far as the program reads
+them, below a folder that replaces the root of the file system."""
 
 import os
 from dataclasses import dataclass
@@ -7,7 +7,7 @@ from dataclasses import dataclass
 
 @dataclass
 class Adapter:
-    """An AMD card with memory of its own: the vendor whose driver tells name and memory itself."""
+    """An AMD card with dedicated memory, whose driver reports name and memory itself."""
 
     index: int
     name: str
@@ -39,7 +39,7 @@ def link(path, target):
 
 
 def write_tree(root, adapters):
-    """Writes the tree of a machine with these adapters."""
+    """Writes the files of a machine with these adapters."""
     (root / "sys/class/drm").mkdir(parents=True)
     put(root / "proc/sys/kernel/osrelease", "6.1.0-test")
     for adapter in adapters:

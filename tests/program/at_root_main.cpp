@@ -1,5 +1,5 @@
-// The program, with the folder that stands for the root of the file system taken from
-// ASSAY_TEST_ROOT: the only difference from the real one, which takes nothing but its arguments.
+// The program, except that it takes the folder that replaces the root of the file system from
+// ASSAY_TEST_ROOT. The real one reads no variable.
 #include <cstdlib>
 
 #include "Output.h"

@@ -1,6 +1,6 @@
-"""The driver calls of a run, each with the line that stood last in the output when it was made: what a
-host would see if the call crashed. The scripted drivers record to standard output for that, where their
-lines come between those of the report. And what docs/report-format.md tells of such last lines."""
+"""The driver calls of a run, each with the last line of the output at that time, which a host would see
+if the call crashed. The scripted drivers record to standard output, so that their lines come between
+those of the report. Also the tables of last lines in docs/report-format.md."""
 
 import functools
 import re
@@ -23,15 +23,15 @@ def without_calls(lines):
 
 
 class Made(NamedTuple):
-    """A call, and what stood in the output by then."""
+    """A call, and the output before it."""
 
     call: Call
-    last: str  # the last line, as the document writes it
-    printed: int  # how many lines
+    last: str  # the last line, without the prefix of log lines
+    printed: int  # the number of lines
 
 
 def calls_of(lines):
-    """The calls of a run, in their order."""
+    """The calls of a run, in order."""
     last, printed, found = "", 0, []
     for line in lines:
         if CALL.match(line):
@@ -42,7 +42,7 @@ def calls_of(lines):
 
 
 class LastLines:
-    """The tables of last lines and calls. A new call without a row of its own is a mistake of theirs."""
+    """The tables of last lines and calls. They must have every call."""
 
     def __init__(self):
         text = (TREE / "docs" / "report-format.md").read_text(encoding="utf-8")
@@ -61,28 +61,29 @@ class LastLines:
     def _find_row(self, last):
         rows = [number for number, (pattern, _) in enumerate(self.rows)
                 if re.fullmatch(pattern, last)]
-        assert len(rows) == 1, f"{last!r} has {len(rows)} rows of its own"
+        assert len(rows) == 1, f"{len(rows)} rows match {last!r}"
         return rows[0]
 
     def check(self, name, last):
-        """Asserts that the call is told behind that last line; gives the row's number."""
+        """Asserts that the row of this last line names the call. Returns the row's number."""
         row = self._row_of(last)
         names = self.rows[row][1]
         if name == "eglGetError":
-            assert any(each.startswith("egl") for each in names), f"{name} behind {last!r}"
+            assert any(each.startswith("egl") for each in names), f"{name} after {last!r}"
         else:
-            assert name in names, f"{name} isn't told behind {last!r}"
+            assert name in names, f"no row has {name} after {last!r}"
         return row
 
 
 @dataclass
 class FullMachine:
-    """A machine with one GPU for OpenGL and one for OpenCL, both by scripted drivers that are asked
-    for as much as possible: extensions one by one, and a surface for the context."""
+    """A machine with one GPU for OpenGL and one for OpenCL, both by scripted drivers that make the
+    program call as many functions as possible: it asks for extensions one by one, and needs a
+    surface for the context."""
 
     folder: Path
     gpu: Gpu = field(default_factory=lambda: Gpu(adapter=Adapter(0, "Card"), version="4.6 Scripted"))
-    # Two batches make the second of the measurement full.
+    # Two batches fill the second that the measurement takes.
     opencl: list = field(default_factory=lambda: [ClPlatform([ClGpu(batch=600_000_000)])])
 
     def __post_init__(self):
@@ -90,8 +91,8 @@ class FullMachine:
             write_tree(self.folder / "root", [self.gpu.adapter])
 
     def host(self, name, gl_lines="", cl_lines=""):
-        """A host for one run, and what it finds: the machine with these lines in front of its
-        scripts' own."""
+        """A host for one run, and its arguments: the machine with these lines added to its
+        scripts."""
         surface = 'display-string EGL_EXTENSIONS ""\n'
         scripts = {"gl": self.gpu.script() + surface + gl_lines,
                    "cl": cl_script_of(self.opencl) + cl_lines}
@@ -105,7 +106,7 @@ class FullMachine:
         return host, {"script": files["gl"], "opencl": "empty", "root": self.folder / "root"}
 
     def run(self, name, gl_lines="", cl_lines="", **options):
-        """A run with the log and with the calls between its lines."""
+        """Runs the program with the log, and with the calls between its lines."""
         host, found = self.host(name, RECORD_HERE + gl_lines, RECORD_HERE + cl_lines)
         return host.run("-verbose=1", **found, **options)
 

@@ -1,9 +1,9 @@
-"""The OpenCL half of what the report should be: devices that become a driver script and, by the table
-of tests alone, report lines."""
+"""The model of the OpenCL half of a report: devices that become a driver script and, by the table of
+tests alone, report lines."""
 
 from dataclasses import dataclass, field
 
-# The key tests in the order in which they run; the last one is the host's own addition.
+# The key tests in the order in which they run.
 CL_KEYS = [
     "CLPlatformVersion", "CLDeviceVersion", "IsIntegratedCLGPU", "CLMemoryMB", "CLName", "CLVendor",
     "CLVendorID", "CLDriverVersion", "CUDASupported", "CUDAVersion", "CLBandwidth", "CLCompute",
@@ -17,7 +17,7 @@ def quoted(text):
 
 
 def escaped(text):
-    """A text as a driver script writes it."""
+    """The text as a literal of a driver script."""
     data = text.encode("utf-8", "surrogateescape")
     return '"' + "".join(
         chr(byte) if 0x20 <= byte < 0x7F and byte not in b'"\\' else f"\\x{byte:02X}"
@@ -31,7 +31,7 @@ def number(value):
 
 @dataclass
 class ClGpu:
-    """One OpenCL GPU and what its driver says of it."""
+    """One OpenCL GPU, with the answers of its driver."""
 
     name: str = "A device"
     vendor: str = "A vendor"
@@ -40,7 +40,7 @@ class ClGpu:
     device_version: str = "OpenCL 1.2 of a device"
     memory: int = 3 << 30
     integrated: bool = False
-    # The nanoseconds of a batch of ten copies, and of the kernel.
+    # The times of a batch of ten copies and of the kernel, in nanoseconds.
     batch: int = 200_000_000
     kernel: int = 250_000_000
     type: str = "gpu"
@@ -60,7 +60,7 @@ class ClGpu:
         ]) + "\n"
 
     def values(self, platform):
-        """The values as the report shows them; None where a key has no line."""
+        """The values as the report shows them; None for a key without a line."""
         version = platform.version.removeprefix("OpenCL ")
         version, _, cuda = version.partition(" CUDA ")
         return dict(zip(CL_KEYS, [
@@ -100,7 +100,7 @@ def cl_values_of(platforms):
 
 
 def cl_test(key):
-    """The test of one key: yields lines, and None for a step."""
+    """The test of one key. It yields lines, and None for a step."""
 
     def run(tag, values):
         value = values[key]

@@ -2,7 +2,7 @@
 
 import pytest
 
-# Before their first import, or their assertions don't tell what differs.
+# Must precede the first import, or failed assertions don't show the values.
 pytest.register_assert_rewrite("calls", "clmodel", "harness", "hosting", "model", "sweep")
 
 import harness  # noqa: E402
@@ -10,14 +10,15 @@ import harness  # noqa: E402
 
 @pytest.fixture
 def host(tmp_path):
-    """Runs the program as a host does, with its scripts and records under tmp_path."""
+    """Runs the program like a host, with its scripts and records under tmp_path."""
     return harness.Host(tmp_path)
 
 
 def pytest_collection_modifyitems(items):
-    """Without the program nothing here can pass: say so once, instead of failing each test."""
+    """Reports a missing program once, instead of failing each test."""
     if not harness.PROGRAM.exists():
-        raise pytest.UsageError(f"{harness.PROGRAM} isn't there: build first, or set ASSAY_BUILD_DIR")
+        raise pytest.UsageError(
+            f"{harness.PROGRAM} doesn't exist: build first, or set ASSAY_BUILD_DIR")
 
 
 CLOSING_LINES = []
@@ -25,7 +26,7 @@ CLOSING_LINES = []
 
 @pytest.fixture(scope="session")
 def closing_lines():
-    """What a test has to say at the end, also if it passes."""
+    """Lines to print at the end, also if all tests pass."""
     return CLOSING_LINES
 
 

@@ -1,6 +1,6 @@
-"""Asks the machine's EGL and OpenGL, without a line of the program under test, what the report
-should say of each device, and prints it as JSON. A program of its own, so that a driver that crashes
-takes down no test.
+"""Asks the machine's EGL and OpenGL, without any code of the program under test, what the report
+should have for each device, and prints it as JSON. A program of its own, so that a crash of the driver
+doesn't end the tests.
 
 The numbers of constants come from Khronos' headers.
 """
@@ -24,7 +24,7 @@ INTEGERS = [
 ]
 PROGRAM_INTEGERS = ["GL_MAX_PROGRAM_INSTRUCTIONS_ARB"]
 
-# Both ends of the fixed-function names, and a texture.
+# Shaders that use the built-in variables of the fixed-function pipeline, and a texture.
 VERTEX = b"""
 void main() { gl_TexCoord[0] = gl_MultiTexCoord0; gl_Position = ftransform(); }
 """
@@ -38,7 +38,7 @@ Handle = c.c_void_p
 
 @functools.lru_cache
 def constants():
-    """Each #define of the headers that has a plain number."""
+    """The constants of the headers that are plain numbers."""
     found = {}
     for header in GL_HEADERS + EGL_HEADERS:
         for name, value in re.findall(r"^#define +((?:GL|EGL)_\w+)\s+(0x[0-9A-Fa-f]+|\d+)\s*$",
@@ -56,7 +56,7 @@ def number(name):
 
 
 class Failed(Exception):
-    """A device on which no context can be made."""
+    """No context can be created on a device."""
 
 
 class EGL:
@@ -92,7 +92,7 @@ class EGL:
         return (text or b"").decode()
 
     def make_current(self, device):
-        """A compatibility context, which is what plain attributes give."""
+        """Makes a context current, without attributes, so that it is a compatibility context."""
         display = self.call("eglGetPlatformDisplayEXT", Handle,
                             (c.c_uint, number("EGL_PLATFORM_DEVICE_EXT")), (Handle, device),
                             (Handle, None))
@@ -119,13 +119,13 @@ class EGL:
 
 
 class GL:
-    """The context that is current."""
+    """The current context."""
 
     def __init__(self, egl):
         self.call = egl.call
 
     def errors(self):
-        """Whether there were any."""
+        """Clears all errors, and returns whether there were any."""
         found = False
         while self.call("glGetError", c.c_uint) != 0:
             found = True
@@ -135,7 +135,7 @@ class GL:
         return (self.call("glGetString", c.c_char_p, (c.c_uint, number(name))) or b"").decode()
 
     def integer(self, name):
-        """None where OpenGL refuses the question."""
+        """The value; None if OpenGL raises an error."""
         values = (c.c_int * 16)(*[-1] * 16)
         self.errors()
         self.call("glGetIntegerv", None, (c.c_uint, number(name)), (Handle, c.addressof(values)))
@@ -164,7 +164,8 @@ class GL:
         return linked.value != 0
 
     def draws_to_texture(self):
-        """Clears a texture through a framebuffer, and reads the colour back."""
+        """Clears a texture through a framebuffer, and reads the colour back. Returns whether it is the
+        expected one."""
         self.errors()
         flat = number("GL_TEXTURE_2D")
         target = number("GL_FRAMEBUFFER")

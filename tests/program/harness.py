@@ -1,7 +1,7 @@
-"""Runs the built program as a host sees it: arguments in; standard output, standard error and exit
-status out. Nothing here knows how the program is made.
+"""Runs the built program like a host: arguments in; standard output, standard error and exit status
+out. Nothing here depends on how the program is implemented.
 
-The build folder is the one that ASSAY_BUILD_DIR names, else build/linux.
+ASSAY_BUILD_DIR names the build folder; the default is build/linux.
 """
 
 import os
@@ -14,16 +14,16 @@ from pathlib import Path
 TREE = Path(__file__).resolve().parents[2]
 BUILD = Path(os.environ.get("ASSAY_BUILD_DIR", TREE / "build" / "linux")).resolve()
 PROGRAM = BUILD / "bin" / "assay"
-# The same program with the folder that stands for the root of the file system in
-# ASSAY_TEST_ROOT: the only way to show it adapters that this machine hasn't got.
+# The same program, which takes the root of the file system from ASSAY_TEST_ROOT: the only way to give
+# it adapters that this machine doesn't have.
 PROGRAM_AT_ROOT = BUILD / "bin" / "assay-at-root"
 SCRIPTED_EGL = BUILD / "drivers" / "egl"
 
 SECONDS = 60
 
-# The sanitizers that the build is under, as ASSAY_SANITIZE named them; "" without.
+# The sanitizers of the build, as ASSAY_SANITIZE names them; "" without.
 SANITIZED_BY = os.environ.get("ASSAY_SANITIZE", "")
-# A sanitizer must leave a crash a crash: its signal is what a host sees.
+# A sanitizer must not handle crashes: a host must see their signals.
 CRASHES = "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0:handle_sigfpe=0"
 SANITIZERS = {
     "ASAN_OPTIONS": CRASHES,
@@ -39,7 +39,7 @@ STAMP = re.compile(r'^(assayStart|assayEnd)="\d{4}-\d\d-\d\d_\d\d:\d\d:\d\d"$', 
 
 
 def text_of(data):
-    """Bytes as text that keeps every byte."""
+    """Decodes bytes to text that keeps every byte."""
     return data.decode("utf-8", "surrogateescape")
 
 
@@ -53,7 +53,7 @@ class Run:
 
     @property
     def report(self):
-        """The report as text, with fixed texts in the place of well-formed time stamps."""
+        """The report as text, with well-formed time stamps replaced by a fixed text."""
         return STAMP.sub(r'\1="STAMP"', text_of(self.out))
 
     @property
@@ -66,17 +66,17 @@ class Run:
 
     @property
     def comments(self):
-        """The lines that a reader of the report skips."""
+        """The comment lines of the report."""
         return [line for line in self.lines if line.startswith("#")]
 
     @property
     def facts(self):
-        """The report without its comments, as a dictionary; quotes stay with their texts."""
+        """The report without its comments, as a dictionary of keys and values with their quotes."""
         return dict(line.split("=", 1) for line in self.lines if not line.startswith("#"))
 
 
 def split_lines(text):
-    """The lines of a text in which every line has its end."""
+    """The lines of a text. Every line must have its line end."""
     assert text == "" or text.endswith("\n"), f"no line end at the end of {text[-200:]!r}"
     return text.split("\n")[:-1]
 
@@ -103,7 +103,7 @@ def read_record(path):
 
 @dataclass
 class Host:
-    """Where runs keep their files, and what they find on the machine."""
+    """Runs the program. Describes the machine that it finds, and the folder for its files."""
 
     folder: Path
     variables: dict = field(default_factory=dict)
@@ -112,19 +112,19 @@ class Host:
         return read_record(self.folder / "record")
 
     def record_so_far(self):
-        """The record of a run that may still be at work, or not yet at it."""
+        """The record of a run that has not ended, and may not have started."""
         try:
             return self.record()
         except FileNotFoundError:
             return []
 
     def fresh_record(self):
-        """A script line that records to an empty file."""
+        """Deletes the record, and returns a script line that makes the driver write a new one."""
         (self.folder / "record").unlink(missing_ok=True)
         return f"record {self.folder / 'record'}\n"
 
     def broken_libraries(self, name, *files):
-        """A folder in which those libraries are found and can't be loaded."""
+        """A folder with libraries of these names that can't be loaded."""
         folder = self.folder / name
         folder.mkdir(exist_ok=True)
         for file in files:
@@ -132,19 +132,19 @@ class Host:
         return folder
 
     def environment(self, script=None, egl="scripted", opencl="absent", root=None):
-        """What the child finds.
+        """The environment of the program.
 
         script: the text of an EGL script, or the path of a file that holds one.
         egl: "scripted", "absent", or "real" for the machine's own.
         opencl: "absent" (no loader), "empty" (a loader without platforms), or "real".
-        root: the folder that stands for the root of the file system.
+        root: the folder that replaces the root of the file system.
         """
         result = {"PATH": os.environ.get("PATH", "/usr/bin:/bin")}
         if egl == "real" or opencl == "real":
             result = dict(os.environ)
         result.update((name, os.environ[name]) for name in SANITIZERS)
         if egl == "real" or opencl == "real":
-            # What the machine's drivers keep to the end is not the program's to free.
+            # The machine's drivers keep memory to the end that the program can't free.
             result["ASAN_OPTIONS"] += ":detect_leaks=0"
         search = []
         if egl == "scripted":
@@ -172,8 +172,8 @@ class Host:
 
     def run(self, *arguments, seconds=SECONDS, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
             stderr=subprocess.PIPE, before=None, clear=False, **machine):
-        """Runs the program to its end. `before` is called in the child; `clear` leaves it no
-        variable but those that make up the machine."""
+        """Runs the program to its end. `before` is called in the child; `clear` removes all variables
+        except those that describe the machine."""
         program = PROGRAM if machine.get("root") is None else PROGRAM_AT_ROOT
         environment = self.environment(**machine)
         if clear:
@@ -184,12 +184,12 @@ class Host:
 
     def start(self, *arguments, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
               stderr=subprocess.PIPE, before=None, **machine):
-        """Starts the program and leaves it to the caller. `before` is called in the child."""
+        """Starts the program and returns its process. `before` is called in the child."""
         program = PROGRAM if machine.get("root") is None else PROGRAM_AT_ROOT
         return subprocess.Popen([program, *arguments], stdin=stdin, stdout=stdout, stderr=stderr,
                                 env=self.environment(**machine), preexec_fn=before)
 
 
 def ended_by(run, *signals):
-    """Tells whether one of these signals ended the run."""
+    """Whether one of these signals ended the run."""
     return run.status in [-int(signal.Signals[each]) for each in signals]

@@ -1,4 +1,4 @@
-"""Runs assay-host as its users do, and holds what it says to its own schemas."""
+"""Runs assay-host like its users, and validates its output against its schemas."""
 
 import errno
 import json
@@ -27,29 +27,29 @@ WORKER = "assay-worker"
 
 STATUSES = {"complete": 0, "failed-tests": 1, "usage-error": 2, "crashed": 3, "hung": 4,
             "never-started": 5, "interrupted": 6}
-TROUBLE = 10
+ERROR_STATUS = 10
 
-# What a verdict may take beyond the timeout, and what a busy machine adds.
-GRACE = 2.0 if SANITIZED_BY != "thread" else 10.0  # which slows a flood down tenfold
+# The time of a verdict beyond the timeout, and an addition for a busy machine, in seconds.
+GRACE = 2.0 if SANITIZED_BY != "thread" else 10.0  # the sanitizer slows a flood down tenfold
 SLACK = 1.0
 
 
 @dataclass
 class Hosted:
-    """How assay-host ended, and what it said."""
+    """How assay-host ended, and its output."""
 
     status: int
     out: bytes
     err: bytes
     seconds: float
-    peak_kib: int  # the most memory that it had itself, guardian and worker together
+    peak_kib: int  # its maximum memory, guardian and worker together
 
     @property
     def text(self):
         return text_of(self.out)
 
     def document(self):
-        """The JSON document, held to the schema and to the status."""
+        """The JSON document, after checking it against the schema and the exit status."""
         result = validate_document(self.out)
         assert self.status == result["outcome"]["status"]
         assert self.status == STATUSES[result["outcome"]["verdict"]]
@@ -64,7 +64,7 @@ class Hosted:
 
 
 def processes_with(mark):
-    """The processes that have the mark among their variables."""
+    """The ids and states of the processes that have the mark in their environment."""
     found = []
     for folder in Path("/proc").iterdir():
         try:
@@ -83,7 +83,7 @@ def name_of(pid):
 
 
 def peak_of(pid):
-    """In KiB; 0 of a process that has gone."""
+    """The maximum memory of a process in KiB; 0 if it has ended."""
     try:
         for line in Path(f"/proc/{pid}/status").read_text().splitlines():
             if line.startswith("VmHWM:"):
@@ -94,7 +94,7 @@ def peak_of(pid):
 
 
 class Watched:
-    """assay-host at work. Used as a context: at its end nothing that it started may be left."""
+    """A running assay-host. As a context manager, asserts at the end that no process of it is left."""
 
     def __init__(self, *arguments, environment=None, stdin=subprocess.DEVNULL,
                  stdout=subprocess.PIPE, stderr=subprocess.PIPE, program=HOST, **options):
@@ -116,8 +116,7 @@ class Watched:
         assert left == 0
 
     def end_what_is_left(self):
-        """Kills what was started and still runs, and waits until it is gone; gives how many that
-        were."""
+        """Kills all processes that are left, and waits for their end. Returns their number."""
         left = processes_with(self.mark)
         for number, _ in left:
             try:
@@ -129,7 +128,7 @@ class Watched:
         return len(left)
 
     def wait(self, seconds):
-        """Waits for the end of the process itself, whatever holds its streams."""
+        """Waits for the end of the process itself, even if others hold its streams open."""
         descriptor = os.pidfd_open(self.process.pid)
         try:
             assert select.select([descriptor], [], [], seconds)[0], "the process doesn't end"
@@ -138,7 +137,7 @@ class Watched:
         self.process.wait()
 
     def worker(self):
-        """The process that does the work; None if there is none any more, or none yet."""
+        """The id of the worker process; None if there is none yet, or not any more."""
         pid = self.process.pid
         try:
             children = Path(f"/proc/{pid}/task/{pid}/children").read_text().split()
@@ -166,13 +165,13 @@ class Watched:
 
 
 def host_run(*arguments, seconds=60, **options):
-    """One run of assay-host to its end."""
+    """Runs assay-host to its end."""
     with Watched(*arguments, **options) as watched:
         return watched.finish(seconds)
 
 
 def run_assay(host, *options, child=(), assay=None, machine=None, **more):
-    """`assay-host run` on a machine as the harness describes one."""
+    """Runs `assay-host run` on a machine as Host.environment describes it."""
     machine = dict(machine or {})
     machine.setdefault("opencl", "absent")
     arguments = ["run", "--assay", str(assay or PROGRAM), *options]
@@ -182,7 +181,7 @@ def run_assay(host, *options, child=(), assay=None, machine=None, **more):
 
 
 def script_child(folder, text, name="child"):
-    """An executable shell script that plays the child."""
+    """Writes an executable shell script that replaces the child."""
     file = folder / name
     file.write_text("#!/bin/sh\n" + text + "\n")
     file.chmod(0o755)
@@ -193,13 +192,13 @@ def texts(document, kind="value"):
     return [text_of(decode(line["text"])) for line in document["lines"] if line["kind"] == kind]
 
 
-__all__ = ["CHILD", "GRACE", "HOST", "SLACK", "STATUSES", "TROUBLE", "Hosted", "WORKER",
+__all__ = ["CHILD", "GRACE", "HOST", "SLACK", "STATUSES", "ERROR_STATUS", "Hosted", "WORKER",
            "Watched", "decode", "host_run", "json", "processes_with", "report_bytes", "run_assay",
            "script_child", "texts"]
 
 
 def read_to_the_end(control):
-    """What was written to a pseudo-terminal whose other side is closed: it may come in pieces, and
+    """Reads what was written to a pseudo-terminal whose other side is closed. It comes in pieces, and
     its end is an error."""
     data = b""
     try:

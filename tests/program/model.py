@@ -1,14 +1,14 @@
-"""What the report should be, worked out from the table of tests and steps alone.
+"""The model of a report, computed from the table of tests and steps alone.
 
-The machine is told by Gpu objects: they become a driver script (and, for more than one, a tree of
-adapter files), and the same values are what the report must show.
+Gpu objects describe the machine. They become a driver script (and, for more than one, a tree of adapter
+files), and the report must show their values.
 """
 
 from dataclasses import dataclass, field
 
 from clmodel import CL_KEYS, cl_test
 
-# What the two sides agree on: EGL's names of the values, and where a report line shows each.
+# The constants of the battery, and their codes.
 BATTERY_INTEGERS = [
     ("GL_MAX_TEXTURE_UNITS", 34018),
     ("GL_MAX_COMBINED_TEXTURE_IMAGE_UNITS", 35661),
@@ -21,7 +21,7 @@ BATTERY_INTEGERS = [
     ("GL_MAX_VERTEX_ATTRIBS", 34921),
 ]
 
-# The name in the report, its number there, the extension, and the core version that has it too.
+# The name in the report, its number there, the extension, and the core version that includes it.
 BATTERY_EXTENSIONS = [
     ("GL_ARB_VERTEX_PROGRAM", 69, "GL_ARB_vertex_program", None),
     ("GL_ARB_FRAGMENT_PROGRAM", 27, "GL_ARB_fragment_program", None),
@@ -50,7 +50,7 @@ def quoted(text):
 
 
 def escaped(text):
-    """A text as a driver script writes it."""
+    """The text as a literal of a driver script."""
     data = text.encode("utf-8", "surrogateescape")
     return '"' + "".join(
         chr(byte) if 0x20 <= byte < 0x7F and byte not in b'"\\' else f"\\x{byte:02X}"
@@ -59,7 +59,7 @@ def escaped(text):
 
 @dataclass
 class Gpu:
-    """One device: what the driver says of it and, behind that, what the system says."""
+    """One device, with the answers of the driver and of the system."""
 
     vendor: str = "A vendor"
     renderer: str = "A renderer"
@@ -71,7 +71,7 @@ class Gpu:
     extensions: list = field(default_factory=lambda: [
         "GL_ARB_vertex_program", "GL_ARB_fragment_program", "GL_ARB_vertex_shader",
         "GL_ARB_fragment_shader", "GL_EXT_framebuffer_object", "GL_ARB_framebuffer_object", NPOT])
-    # None: no adapter is known, and the report has what stands for that.
+    # None: no adapter matches.
     adapter: "object" = None
 
     def offers(self, extension, core_since):
@@ -79,7 +79,7 @@ class Gpu:
             core_since is not None and self.version[:3] >= core_since)
 
     def values(self):
-        """The values of the fifteen keys, as the report shows them, while all goes well."""
+        """The values of the fifteen keys, as the report shows them, if no test fails."""
         adapter = self.adapter
         return dict(zip(KEYS, [
             quoted(min(self.version[:3], NEWEST_VERSION)),
@@ -102,7 +102,7 @@ class Gpu:
     def script(self):
         lines = ["device"]
         if self.adapter is None:
-            # Else the program would look for its adapter on the machine that runs the tests.
+            # Keeps the program from looking for the adapter on the machine that runs the tests.
             lines.append("software")
         else:
             lines.append(f'drm "/dev/dri/{self.adapter.card}"')
@@ -125,10 +125,10 @@ def script_of(gpus):
     return "".join(gpu.script() for gpu in gpus)
 
 
-# No newer one is told from it.
+# The report has no newer version.
 NEWEST_VERSION = "4.1"
 
-# How a per-GPU test tells that OpenGL raised an error.
+# The messages of a test in which OpenGL raised an error.
 GL_ERROR = "\n".join(["Failed requirement: glStatus == GL_NO_ERROR",
                       "exception: Failed requirement: glStatus == GL_NO_ERROR"])
 
@@ -137,7 +137,7 @@ STEPS_BEFORE_TESTS = 7
 
 
 class Programmed(Exception):
-    """The failure that a step was told to have."""
+    """A programmed failure of a step."""
 
 
 class Steps:
@@ -161,11 +161,11 @@ class Prediction:
     lines: list
     errors: list
     status: int
-    steps: int  # how many were taken, the failing one included
+    steps: int  # the number of steps taken, including the failing one
 
 
 class Failing(Exception):
-    """A test that the driver makes fail, with the lines that standard error shows for it."""
+    """A test that the driver makes fail, with its lines on standard error."""
 
 
 def per_gpu_tests(gpu_values):
@@ -217,12 +217,12 @@ def per_gpu_tests(gpu_values):
 
 def predict(gpus, crash_after=-1, throw_after=-1, exit_status=0, opencl=None, core=1, ogl=1,
             context=None, failing=(), cl_failing=()):
-    """The report of a run.
+    """Predicts a run.
 
-    gpus: what the enumeration finds, in its order.
-    opencl: None without a loader, 0 for no OpenCL GPU, else the values of each one's keys.
-    context: whether a first context can be made; by default, whether there is a GPU.
-    failing: {(index of the GPU, key): lines on standard error} for what the driver makes fail.
+    gpus: the GPUs that the enumeration finds, in its order.
+    opencl: None without a loader, 0 for no OpenCL GPU, otherwise the values of each one's keys.
+    context: whether a first context can be created; by default, whether there is a GPU.
+    failing: {(index of the GPU, key): lines on standard error} for tests that the driver makes fail.
     cl_failing: the same for the OpenCL GPUs.
     """
     failing = dict(failing)
@@ -291,7 +291,7 @@ def predict(gpus, crash_after=-1, throw_after=-1, exit_status=0, opencl=None, co
 
 
 def check(run, expected):
-    """Asserts that a run is what was predicted."""
+    """Asserts that a run is as predicted."""
     assert run.lines == expected.lines
     assert run.errors == expected.errors
     assert run.status == expected.status

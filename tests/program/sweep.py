@@ -1,4 +1,4 @@
-"""Runs with one fault in one driver call, for every call of a full run: bare, and under assay-host."""
+"""Runs with one fault in one driver call, for every call of a full run: without and with assay-host."""
 
 import contextlib
 import os
@@ -14,11 +14,11 @@ from harness import PROGRAM_AT_ROOT, Call, Run
 from hosting import HOST, Hosted, Watched
 
 WORKERS = max(2, os.cpu_count() or 1)
-# Far beyond what the way to any call takes; a child that hangs under assay-host costs that long.
+# Far more than it takes to reach any call. A child that hangs under assay-host takes this long.
 TIMEOUT = 20
-# For what must happen, on however busy a machine.
+# For events that must come, even on a busy machine.
 DEADLINE = 200
-# Of a sample, one pair in so many of an entry point and a fault.
+# A sample has one in this many pairs of an entry point and a fault.
 ONE_IN = 2
 
 DURATION = re.compile(r"duration=\S+")
@@ -26,12 +26,12 @@ DURATION = re.compile(r"duration=\S+")
 
 @dataclass
 class Pair:
-    """A call of the undisturbed run, and a fault of it."""
+    """A call of the undisturbed run, and a fault for it."""
 
     call: Call
     fault: Fault
-    before: list = field(repr=False)  # the lines that are printed by then
-    by_loader: bool  # the OpenCL loader made the call, and trusts the answer
+    before: list = field(repr=False)  # the lines printed before the call
+    by_loader: bool  # the OpenCL loader makes the call, and doesn't check the answer
 
     @property
     def name(self):
@@ -43,13 +43,13 @@ class Pair:
 
 
 def normal(lines):
-    """Lines without what differs from run to run."""
+    """Removes from the lines what differs from run to run."""
     return [DURATION.sub("duration=", PREFIX.sub("# ", line)) for line in lines]
 
 
 def sample(pairs, shift):
-    """Some of a fault's pairs: of each entry point or of one in ONE_IN of them, by the fault's number,
-    always the same one of its calls."""
+    """Selects some of a fault's pairs: for every entry point, or one in ONE_IN of them, one call. The
+    fault's number `shift` determines which."""
     by_name = {}
     for pair in pairs:
         by_name.setdefault(pair.call.name, []).append(pair)
@@ -59,7 +59,7 @@ def sample(pairs, shift):
 
 
 class Sweep:
-    """The undisturbed run, and what can be done to it. Its runs may be made by several threads."""
+    """The undisturbed run, and runs with faults. Several threads may make runs."""
 
     def __init__(self, folder):
         self.folder = folder
@@ -71,9 +71,9 @@ class Sweep:
         self._starting = threading.Semaphore(WORKERS)
 
     def pairs(self, fault, all_of_them):
-        """The fault's pairs, and how many calls it makes no sense for, by reason."""
+        """The fault's pairs, and the number of calls to which it doesn't apply, by reason."""
         found, left_out = [], Counter()
-        # What is asked before the program's own first question comes from the loader.
+        # The loader makes the OpenCL calls before the program's own first one.
         first = next(made.call.number for made in self.calls if made.call.name == "clGetDeviceIDs")
         for made in self.calls:
             reason = fault.why_not(made.call)
@@ -93,13 +93,13 @@ class Sweep:
                                         cl_lines=record["cl"] + cl_lines)
         environment = host.environment(**found)
         if pair.by_loader:
-            # An exception that passes the loader leaves it no chance to close its directory, and it
-            # asks for as much memory as the driver claims that it needs.
+            # An exception through the loader leaves its directory open, and the loader allocates as
+            # much memory as the driver claims to need.
             environment["ASAN_OPTIONS"] += ":detect_leaks=0:allocator_may_return_null=1"
         return Watched(*arguments, program=program, environment=environment, stdout=out, stderr=err)
 
     def _wait_until_called(self, pair, record, process):
-        """Waits until the call stands last in the record, which is the fault's begin."""
+        """Waits until the call is the last one in the record: the fault has begun."""
         deadline = time.monotonic() + DEADLINE
         start = f"{pair.call.number} ".encode()
         while True:
@@ -111,7 +111,7 @@ class Sweep:
             time.sleep(0.01)
 
     def bare(self, pair):
-        """The program by itself, with its calls between its lines."""
+        """Runs the program by itself, with its calls between its lines."""
         files = [self.folder / f"{pair.name}-{stream}" for stream in ("out", "err")]
         with open(files[0], "ab") as out, open(files[1], "ab") as err, self._watch(
                 pair, "bare", "-verbose=1", program=PROGRAM_AT_ROOT, out=out, err=err,
@@ -121,7 +121,7 @@ class Sweep:
                 watched.process.kill()
             watched.wait(DEADLINE)
             if pair.fault.leaves:
-                # Nobody else does.
+                # Without assay-host nothing else ends them.
                 assert watched.end_what_is_left() == pair.fault.leaves
         run = Run(watched.process.returncode, *(file.read_bytes() for file in files))
         for file in files:
@@ -129,14 +129,14 @@ class Sweep:
         return run
 
     def hosted(self, pair):
-        """The same under assay-host."""
+        """Runs the same under assay-host."""
         record = {library: self.folder / f"{pair.name}-{library}-record"
                   for library in ("gl", "cl")}
         files = [self.folder / f"{pair.name}-host-{stream}" for stream in ("out", "err")]
         hangs = pair.fault.ends == "hang"
         with contextlib.ExitStack() as stack:
             out, err = (stack.enter_context(open(file, "wb")) for file in files)
-            # As many as there are cores on their way to the call, however many wait there.
+            # Limits the runs that are on the way to the call, not those that hang in it.
             with self._starting:
                 watched = stack.enter_context(self._watch(
                     pair, "hosted", "run", "--assay", str(PROGRAM_AT_ROOT), "--format", "json",

@@ -1,18 +1,18 @@
-"""Every OpenGL, EGL and OpenCL call of a full run, with every fault that a driver can have there, bare
-and under assay-host. By ASSAY_LONG_TESTS=1 that is each call; else a sample in which each fault and
-each entry point occurs.
+"""Every OpenGL, EGL and OpenCL call of a full run, with every fault that a driver can have there,
+without and with assay-host. ASSAY_LONG_TESTS=1 tests all calls, otherwise a sample in which every fault
+and every entry point occurs.
 
-A fault that ends the run: the output is that of an undisturbed run up to that call, the documented
-table names the call behind the last line, and the end is the fault's own; for assay-host that is the
+If a fault ends the run: the output up to the call is that of an undisturbed run, the documented table
+has the call in the row of the last line, and the run ends as the fault does; for assay-host this is the
 verdict, the reason and the status.
 
-A fault behind which the run goes on: the output is that of an undisturbed run up to that call; behind it
-no key comes that isn't due, none out of order, and no value of another form; a text is a beginning of
-the given one; the report is whole, or standard error says why not; the status agrees with standard
-error. The documented table names each further call too. Under assay-host the report and the exit
-status are the same as bare.
+If the run continues after a fault: the output up to the call is that of an undisturbed run; after it
+there are only keys that are due, in order, with values of the right form; a text is a prefix of the
+given one; the report is whole, or standard error has the reason; the status agrees with standard error.
+The documented table has all further calls too. Under assay-host the report and the exit status are the
+same.
 
-No process of a run is left, whatever happens."""
+No process of a run is left in any case."""
 
 import ctypes.util
 import json
@@ -25,7 +25,7 @@ import pytest
 
 from calls import LastLines, PREFIX, calls_of, without_calls
 from clmodel import cl_values_of
-from faults import FAULTS, GIVES
+from faults import FAULTS, RESULTS
 from harness import STAMP, Run, ended_by, split_lines, text_of
 from hosting import STATUSES, report_bytes
 from model import check, predict
@@ -35,14 +35,14 @@ pytestmark = pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
                                 reason="this machine has no OpenCL loader library")
 
 ALL = bool(os.environ.get("ASSAY_LONG_TESTS"))
-# Runs that hang wait and don't compute.
+# Hanging runs only wait, so that there may be many.
 HANGING = 64
 
-# What assay-host keeps of a line, and how many lines.
-LINE_BYTES = 65536
-LINES = 24576
-# What two runs must agree on: the prefix of a log line may differ a little in its length.
-COMPARED = LINE_BYTES - 100
+# The limits of assay-host.
+MAX_LINE_BYTES = 65536
+MAX_LINES = 24576
+# The compared part of a line: the prefix of a log line may vary in its length.
+MAX_COMPARED = MAX_LINE_BYTES - 100
 
 UNKNOWN = '"?"'
 
@@ -71,13 +71,13 @@ def form(value):
 
 
 def is_part(part, whole):
-    """Whether the items stand in the other list, in that order."""
+    """Whether the other list has all the items in the same order."""
     rest = iter(whole)
     return all(each in rest for each in part)
 
 
 def check_end(table, pair, run):
-    """A run that the fault ended."""
+    """Checks a run that the fault ended."""
     ends = pair.fault.ends
     if ends == "_exit":
         assert run.status == 0
@@ -90,7 +90,7 @@ def check_end(table, pair, run):
 
 
 def check_going_on(sweep, table, pair, run):
-    """A run that came to an end of its own."""
+    """Checks a run that ended by itself."""
     assert run.status in (0, 2)
     lines = normal(without_calls(run.lines))
     own = lines[:len(pair.before)] + lines[len(pair.before) + len(pair.fault.prints):]
@@ -116,21 +116,21 @@ def check_going_on(sweep, table, pair, run):
 
 
 def check_hosted(table, pair, bare, hosted):
-    """assay-host tells of the run what the run bare was."""
-    # What the schema says of it, others test: it would take most of the time.
+    """Checks that assay-host reports the run as it was without it."""
+    # Other tests validate the document against the schema, which would take most of the time here.
     document = json.loads(hosted.out)
     outcome = document["outcome"]
     lines = without_calls(bare.lines)
-    wanted = [line[:COMPARED] for line in normal(lines)]
+    wanted = [line[:MAX_COMPARED] for line in normal(lines)]
     kept = STAMP.sub(r'\1="STAMP"', text_of(report_bytes(document)))
-    assert [line[:COMPARED] for line in normal(split_lines(kept))] == wanted[:LINES]
+    assert [line[:MAX_COMPARED] for line in normal(split_lines(kept))] == wanted[:MAX_LINES]
     assert not outcome["leftBehind"]
     assert (outcome["lostOutputBytes"] > 0) == (
-        len(lines) > LINES or any(len(line) > LINE_BYTES for line in lines))
+        len(lines) > MAX_LINES or any(len(line) > MAX_LINE_BYTES for line in lines))
 
     ends = next((name for name in SIGNALS if name != "hang" and ended_by(bare, name)), None)
     ends = pair.fault.ends if pair.fault.ends in ENDS else ends
-    whole = 'assayEnd="STAMP"' in wanted[:LINES]
+    whole = 'assayEnd="STAMP"' in wanted[:MAX_LINES]
     if ends is None:
         assert outcome["exitStatus"] == bare.status
         assert outcome["verdict"] == ("complete" if whole and bare.status == 0 else "failed-tests")
@@ -148,7 +148,7 @@ def check_hosted(table, pair, bare, hosted):
 
 
 def run_pair(sweep, table, pair):
-    """None if all is well, else what isn't."""
+    """Returns None if the runs of the pair are right, otherwise the first error."""
     try:
         bare = sweep.bare(pair)
         if pair.fault.ends is not None:
@@ -158,14 +158,14 @@ def run_pair(sweep, table, pair):
         else:
             check_going_on(sweep, table, pair, bare)
         check_hosted(table, pair, bare, sweep.hosted(pair))
-    except Exception as error:  # the other pairs go on
+    except Exception as error:  # continue with the other pairs
         place = traceback.extract_tb(error.__traceback__)[-1]
         return f"{pair}: {place.name}:{place.lineno}: {place.line}: {str(error)[:500]}"
     return None
 
 
 def test_the_undisturbed_run(sweep):
-    """What all others are compared with is what such a machine must report."""
+    """The run that the others are compared with has the predicted report."""
     machine = sweep.machine
     report = "".join(f"{line}\n" for line in sweep.whole if not line.startswith("#"))
     check(Run(0, report.encode(), b""),
@@ -178,10 +178,10 @@ def test_fault_in_every_call(sweep, table, fault, closing_lines):
     with ThreadPoolExecutor(HANGING if fault.ends == "hang" else WORKERS) as workers:
         failures = [failure for failure in workers.map(
             lambda pair: run_pair(sweep, table, pair), pairs) if failure]
-    told = ", ".join(f"{count} calls: {reason}" for reason, count in left_out.items())
+    reasons = ", ".join(f"{count} calls: {reason}" for reason, count in left_out.items())
     closing_lines.append(
-        f"fault sweep: {fault.name}: {len(pairs)} of {len(sweep.calls)} calls, bare and under "
-        f"assay-host, {len(failures)} wrong" + (f"; makes no sense for {told}" if told else ""))
+        f"fault sweep: {fault.name}: {len(pairs)} of {len(sweep.calls)} calls, without and with "
+        f"assay-host, {len(failures)} wrong" + (f"; not applicable to {reasons}" if reasons else ""))
     assert not failures, "\n".join(failures)
 
 
@@ -190,4 +190,4 @@ def test_the_sample_has_every_fault_and_every_entry_point(sweep):
     sampled = [pair for fault in FAULTS.values() for pair in sweep.pairs(fault, False)[0]]
     assert {pair.call.name for pair in sampled} == names
     assert {pair.fault.name for pair in sampled} == set(FAULTS)
-    assert set().union(*GIVES.values()) == names
+    assert set().union(*RESULTS.values()) == names

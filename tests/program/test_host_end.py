@@ -1,5 +1,5 @@
-"""What ends assay-host, and who keeps it waiting: readers that don't read, signals, limits, and its own
-sudden end. Whatever comes, the child and what that started end first, or at once behind it."""
+"""The end of assay-host: with readers that don't read, by signals, at limits, and by its own sudden end.
+In every case the child and its descendants end before it, or immediately after it."""
 
 import os
 import pty
@@ -14,14 +14,14 @@ import time
 import pytest
 
 from harness import SANITIZED_BY
-from hosting import CHILD, HOST, TROUBLE, Watched, host_run, processes_with, script_child, texts
+from hosting import CHILD, HOST, ERROR_STATUS, Watched, host_run, processes_with, script_child, texts
 
 INTERRUPTED = 6
-DEADLINE = 30  # for what must come at all
+DEADLINE = 30  # for events that must come
 TIMEOUT = 1.5
 LONG = bool(os.environ.get("ASSAY_LONG_TESTS"))
 
-# Many lines, then nothing more; with a grandchild that no group and no session reaches.
+# Prints many lines, then hangs, with a grandchild in a session of its own.
 CHATTERBOX = """
 i=0
 while [ $i -lt 2000 ]; do
@@ -44,7 +44,7 @@ def until(condition, what):
 
 
 class Scene:
-    """A child that is ready to be left alone, and a pipe that nobody reads unless a test does."""
+    """A child that prints and hangs, and a pipe that only a test reads."""
 
     def __init__(self, folder):
         self.folder = folder
@@ -71,7 +71,7 @@ class Scene:
             setattr(self, end, None)
 
     def rest(self):
-        """All that is still to be read."""
+        """Reads the pipe to its end."""
         self.close_end("write")
         data = b""
         while piece := os.read(self.read, 65536):
@@ -87,13 +87,14 @@ def scene(tmp_path):
 
 
 def children_of(watched):
-    """What the host started, without itself."""
+    """The processes that the host started, without the host's own."""
     own = {watched.process.pid, watched.worker()}
     return [number for number, _ in processes_with(watched.mark) if number not in own]
 
 
 def await_none(watched):
-    """Twice, since a process that starts another one and ends may hide both from one look."""
+    """Waits until no such process is left. Checks twice: a process that starts another one and ends
+    may hide both from a single check."""
     for _ in range(2):
         until(lambda: not children_of(watched), "something is left")
 
@@ -101,7 +102,7 @@ def await_none(watched):
 # Readers.
 
 def blocked(scene, name):
-    """Options and streams of a run that gets no word out."""
+    """The options and streams of a run whose output is blocked."""
     if name == "json lines":
         return ["--format", "jsonl"], {}
     if name == "raw":
@@ -121,26 +122,26 @@ BLOCKED = ["json lines", "raw", "raw standard error", "unread fifo", "pipe that 
 
 @pytest.mark.parametrize("name", BLOCKED)
 def test_reader_that_does_not_read(scene, name):
-    """The child's time runs out all the same, and one signal ends the wait for the reader."""
+    """The child is still killed in time, and one signal ends the wait for the reader."""
     options, streams = blocked(scene, name)
     with scene.watch("--timeout", str(TIMEOUT), *options, **streams) as watched:
         scene.await_ready()
         await_none(watched)
-        assert watched.process.poll() is None # it still wants to be read
+        assert watched.process.poll() is None # it still waits for the reader
         watched.process.send_signal(signal.SIGTERM)
         assert watched.finish().status == INTERRUPTED
 
 
 @pytest.mark.parametrize("name", BLOCKED)
-def test_signal_before_the_time_is_out(scene, name):
+def test_signal_before_the_timeout(scene, name):
     options, streams = blocked(scene, name)
     with scene.watch("--timeout", "600", *options, **streams) as watched:
         scene.await_ready()
         watched.process.send_signal(signal.SIGTERM)
-        assert watched.finish().status == INTERRUPTED # not kept by a reader that doesn't read
+        assert watched.finish().status == INTERRUPTED # without waiting for the reader
 
 
-def test_reader_that_comes_late_gets_all(scene):
+def test_late_reader_gets_everything(scene):
     with scene.watch("--timeout", str(TIMEOUT), "--format", "jsonl") as watched:
         await_none_once_ready(scene, watched)
         data = scene.rest()
@@ -166,7 +167,7 @@ def test_fifo_that_is_read_late(scene):
 
 
 def test_stopped_terminal(scene):
-    """As after Ctrl-S: the progress line isn't taken."""
+    """As after Ctrl-S: the terminal doesn't accept the progress line."""
     control, terminal = pty.openpty()
     try:
         with scene.watch("--timeout", str(TIMEOUT), stdout=subprocess.DEVNULL,
@@ -174,14 +175,14 @@ def test_stopped_terminal(scene):
             termios.tcflow(terminal, termios.TCOOFF)
             await_none_once_ready(scene, watched)
             watched.process.send_signal(signal.SIGTERM)
-            assert watched.finish().status in (4, INTERRUPTED) # it may not have shown any
+            assert watched.finish().status in (4, INTERRUPTED) # it may not have shown any progress
     finally:
         os.close(terminal)
         os.close(control)
 
 
-def test_output_file_of_a_run_that_is_given_up(scene):
-    """Standard error keeps the writer, and the temporary file goes with it."""
+def test_output_file_of_an_abandoned_run(scene):
+    """Standard error blocks the writer, and the temporary file is deleted."""
     file = scene.folder / "result"
     with scene.watch("--timeout", str(TIMEOUT), "--raw", "--output", file,
                      stdout=subprocess.DEVNULL, stderr=scene.write) as watched:
@@ -193,13 +194,13 @@ def test_output_file_of_a_run_that_is_given_up(scene):
 
 # Signals.
 
-STKFLT = 16 # which this Python may have no name for
-DEFAULT_IS_TO_END = [signal.SIGHUP, signal.SIGINT, signal.SIGQUIT, signal.SIGUSR1, signal.SIGUSR2,
+STKFLT = 16 # Python may have no name for it
+ENDING_BY_DEFAULT = [signal.SIGHUP, signal.SIGINT, signal.SIGQUIT, signal.SIGUSR1, signal.SIGUSR2,
                      signal.SIGALRM, signal.SIGTERM, STKFLT, signal.SIGXCPU, signal.SIGVTALRM,
                      signal.SIGPROF, signal.SIGIO, signal.SIGPWR, signal.SIGRTMIN, signal.SIGRTMAX]
 
 
-@pytest.mark.parametrize("number", DEFAULT_IS_TO_END, ids=str)
+@pytest.mark.parametrize("number", ENDING_BY_DEFAULT, ids=str)
 def test_signal_that_ends(scene, number):
     with scene.watch("--timeout", "600", "--format", "json", stdout=subprocess.PIPE) as watched:
         scene.await_ready()
@@ -225,14 +226,14 @@ def test_signal_that_does_not(number):
 
 @pytest.mark.parametrize("number", [signal.SIGINT, signal.SIGTERM, signal.SIGHUP], ids=str)
 @pytest.mark.parametrize("pause", [0, 0.001, 0.01, 0.1])
-def test_signals_one_after_the_other(scene, number, pause):
-    """None but the first two have anything to do, and none ends the host before its child."""
+def test_repeated_signals(scene, number, pause):
+    """Only the first two have an effect, and none ends the host before its child."""
     with scene.watch("--timeout", "600") as watched:
         scene.await_ready()
         while watched.process.poll() is None:
             watched.process.send_signal(number)
             time.sleep(pause)
-        assert children_of(watched) == [] # at the very moment
+        assert children_of(watched) == [] # immediately
         assert watched.process.returncode == INTERRUPTED
 
 
@@ -256,7 +257,7 @@ def test_torture_is_interrupted(scene):
 
 
 def test_suspended_and_continued():
-    """As by Ctrl-Z and fg: the whole run stands still, and goes on; so do grandchildren."""
+    """As by Ctrl-Z and fg: the whole run stops and continues, including grandchildren."""
     with Watched("run", "--assay", CHILD, "--", "spawn", "60000", "sleep", "2000", "out",
                  'assayStart="x"', "out", 'assayEnd="y"') as watched:
         until(lambda: watched.worker() and len(children_of(watched)) == 2, "no grandchild")
@@ -272,7 +273,7 @@ def state_of(pid):
         return stat.read().rpartition(")")[2].split()[0]
 
 
-# What is inherited.
+# Inherited state.
 
 def whole(*options, **more):
     return host_run("run", "--assay", CHILD, *options, "--", "out", 'assayStart="x"', "out",
@@ -318,7 +319,7 @@ def test_closed_streams(tmp_path, closed):
 
 
 def test_orphans_of_an_earlier_program(tmp_path):
-    """Children that the process had before it was assay-host aren't its own."""
+    """Children that the process had before it became assay-host are left alone."""
     script = script_child(tmp_path, f'sleep 1000 >&- 2>&- & echo $! > {tmp_path}/pid; exec {HOST} "$@"',
                           "wrapper")
     with Watched("run", "--assay", CHILD, "--", "out", "a=1", program=script) as watched:
@@ -337,15 +338,15 @@ def limit(kind, value):
 
 @pytest.mark.parametrize("form", ["text", "json", "jsonl"])
 def test_file_that_may_not_grow(tmp_path, form):
-    """SIGXFSZ isn't ignored by whoever starts the host, as a rule."""
+    """SIGXFSZ has its default action when the host starts, as usual."""
     with open(tmp_path / "out", "wb") as out:
         run = whole("--format", form, stdout=out,
                     preexec_fn=limit(resource.RLIMIT_FSIZE, 100), restore_signals=True)
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"cannot write to standard output: File too large" in run.err
     run = whole("--format", form, "--output", tmp_path / "result",
                 preexec_fn=limit(resource.RLIMIT_FSIZE, 100), restore_signals=True)
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"File too large" in run.err
     assert [each.name for each in tmp_path.iterdir()] == ["out"]
 
@@ -358,7 +359,7 @@ def test_other_commands_with_a_file_that_may_not_grow(tmp_path, arguments, host)
     with open(tmp_path / "out", "wb") as out:
         run = host_run(*arguments, stdout=out, cwd=tmp_path, environment=environment,
                        preexec_fn=limit(resource.RLIMIT_FSIZE, 5), restore_signals=True)
-    assert run.status == (2 if arguments[0] == "diff" else TROUBLE)
+    assert run.status == (2 if arguments[0] == "diff" else ERROR_STATUS)
     assert b"cannot write to standard output: File too large" in run.err
 
 
@@ -379,7 +380,7 @@ os.waitpid(job, os.WUNTRACED)
 
 
 def test_background_of_a_terminal(tmp_path):
-    """With the terminal's tostop a write from there stops a process, unless it minds that."""
+    """With the terminal's tostop, a write from the background stops a process by default."""
     file = tmp_path / "result"
     control, terminal = pty.openpty()
     try:
@@ -395,14 +396,14 @@ def test_background_of_a_terminal(tmp_path):
 
 
 def test_processor_time_that_is_used_up(tmp_path):
-    """First it is asked to end, then it is killed."""
+    """At the soft limit of processor time, the host gets SIGXCPU."""
     child = script_child(tmp_path, "setsid sleep 1000 & while :; do echo 'a=\"'; done")
     with Watched("run", "--assay", child, "--timeout", "600", stdout=subprocess.DEVNULL,
                  preexec_fn=lambda: resource.setrlimit(resource.RLIMIT_CPU, (1, 600))) as watched:
-        assert watched.finish(120).status in (3, INTERRUPTED) # the child's time may be up first
+        assert watched.finish(120).status in (3, INTERRUPTED) # the child may reach the limit first
 
 
-# Its own sudden end.
+# A sudden end of the host.
 
 def kill_host(watched):
     watched.process.kill()
@@ -418,7 +419,7 @@ def kill_worker(watched):
 
 
 def kill_by_name(watched):
-    """As killall does, which knows the name only."""
+    """Kills by name, like killall."""
     for number, _ in processes_with(watched.mark):
         try:
             with open(f"/proc/{number}/comm", encoding="utf-8") as name:
@@ -457,7 +458,7 @@ def test_end_while_suspended(scene):
 
 
 def test_sudden_end_again_and_again(tmp_path):
-    """At any moment of a run, with nothing left."""
+    """A sudden end at any moment of a run leaves no process."""
     child = script_child(tmp_path, "setsid sh -c 'setsid sleep 1000 & sleep 1000' & sleep 0.02\n"
                                    "setsid sleep 1000 & echo a=1; sleep 1000")
     rounds = 1000 if LONG else 40

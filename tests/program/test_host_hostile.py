@@ -1,5 +1,5 @@
-"""Children that do what no child should: assay-host ends within the timeout plus two seconds, says
-clearly what it saw, keeps its memory bounded, and leaves no process behind."""
+"""Children that misbehave in every way: assay-host ends within the timeout plus two seconds, reports
+what happened, keeps its memory bounded, and leaves no process behind."""
 
 import os
 import re
@@ -10,18 +10,18 @@ import time
 import pytest
 
 from harness import PROGRAM, SANITIZED_BY, text_of
-from hosting import (CHILD, GRACE, TROUBLE, Watched, host_run, report_bytes, script_child, texts)
+from hosting import (CHILD, GRACE, ERROR_STATUS, Watched, host_run, report_bytes, script_child, texts)
 
 TIMEOUT = 1.5
 MEBIBYTE = 1 << 20
 
-# What assay-host may need for any child, limits reached and all.
-MOST_KIB = 64 * 1024
+# The maximum memory of assay-host, also for a child that reaches all limits.
+MAX_KIB = 64 * 1024
 REPORT = 'echo \'assayStart="x"\'; echo \'assayEnd="y"\''
 
 
 def run_child(program, *options, timeout=TIMEOUT, child=(), **more):
-    """A document of a run that must end in time."""
+    """Runs a child, and checks that the run ends in time and within the maximum memory."""
     arguments = ["run", "--assay", str(program), "--format", "json", "--timeout", str(timeout),
                  *options]
     if child:
@@ -29,7 +29,7 @@ def run_child(program, *options, timeout=TIMEOUT, child=(), **more):
     run = host_run(*arguments, **more)
     assert run.seconds < timeout + GRACE
     if not SANITIZED_BY:
-        assert run.peak_kib < MOST_KIB
+        assert run.peak_kib < MAX_KIB
     return run
 
 
@@ -60,7 +60,7 @@ def test_no_permission(tmp_path):
 
 
 def foreign_elf(folder):
-    """This machine's program, said to be for another one (EM_SPARC)."""
+    """This machine's program with the machine type of another one (EM_SPARC)."""
     data = bytearray(PROGRAM.read_bytes())
     assert data[:4] == b"\x7fELF"
     struct.pack_into("<H", data, 18, 2)
@@ -99,16 +99,16 @@ def test_another_program_than_assay():
     ("", "json", 1_000_000_000), ('a="', "json", 1_000_000_000), ("a=1", "jsonl", 200_000_000),
     ("xxxxxxxxxx", "text", 200_000_000), ("a=1", "text", 200_000_000)])
 def test_flood(tmp_path, line, form, size):
-    """Gigabytes, in one line or in many; bounded memory, and the cut is told."""
+    """Gigabytes, in one line or in many: the memory is bounded, and the loss is reported."""
     flood = f"yes '{line}' | head -c {size}"
     if line.startswith("x"):
         flood += " | tr '\\n' x"
     child = script_child(tmp_path, f"{flood}; {REPORT}")
     arguments = ["run", "--assay", str(child), "--format", form, "--timeout", "0"]
     run = host_run(*arguments, seconds=280)
-    assert run.status == 1 # the report's own lines went down in the flood
+    assert run.status == 1 # the report's own lines came after the limit
     if not SANITIZED_BY:
-        assert run.peak_kib < MOST_KIB
+        assert run.peak_kib < MAX_KIB
     if form == "text":
         assert re.search(r"wrote too much output: \d{9} bytes were dropped", run.text)
         return
@@ -139,7 +139,7 @@ def test_binary_garbage(tmp_path):
     child = script_child(tmp_path, f"cat {tmp_path}/garbage; cat {tmp_path}/garbage >&2; {REPORT}")
     run = run_child(child, timeout=20)
     document = run.document()
-    # The first line of the report went into the garbage's last one.
+    # The first line of the report is part of the garbage's last line.
     assert document["outcome"]["verdict"] == "failed-tests"
     assert report_bytes(document).startswith(data)
     assert texts(document)[-1] == 'assayEnd="y"'
@@ -155,16 +155,16 @@ def test_garbage_that_is_no_line(tmp_path):
     assert report_bytes(document).endswith(data)
 
 
-def test_deaf_to_signals(tmp_path):
+def test_child_that_ignores_signals(tmp_path):
     child = script_child(tmp_path, "trap '' TERM INT HUP; while :; do sleep 0.1; done")
     assert verdict_of(run_child(child)) == "hung"
 
 
-def test_deaf_to_the_end_of_its_input(tmp_path):
+def test_child_that_ignores_the_end_of_its_input(tmp_path):
     child = script_child(tmp_path, f"cat; {REPORT}; while :; do sleep 0.1; done")
     document = run_child(child).document()
     assert document["outcome"]["verdict"] == "hung"
-    assert texts(document)[-1] == 'assayEnd="y"' # its input had ended
+    assert texts(document)[-1] == 'assayEnd="y"' # its input was at its end
 
 
 def test_own_input_is_not_the_childs(tmp_path):
@@ -180,16 +180,16 @@ def test_own_input_is_not_the_childs(tmp_path):
 LEFT_BEHIND = {
     "with the pipe": "sleep 1000 &",
     "in a session of its own": "setsid sleep 1000 &",
-    "twice removed": "(setsid sh -c 'sleep 1000 & sleep 1000 &' &)",
+    "two levels down": "(setsid sh -c 'sleep 1000 & sleep 1000 &' &)",
     "without the pipe": "setsid sleep 1000 >/dev/null 2>&1 </dev/null &",
-    "deaf": "sh -c \"trap '' TERM; while :; do sleep 1; done\" &",
+    "ignoring signals": "sh -c \"trap '' TERM; while :; do sleep 1; done\" &",
     "many": "for i in 1 2 3 4 5 6 7 8 9 10 11 12 13 14 15 16; do sleep 1000 & done",
 }
 
 
 @pytest.mark.parametrize("name", LEFT_BEHIND)
 def test_grandchild(tmp_path, name):
-    """Watched sees to it that none is left."""
+    """Watched asserts that none is left."""
     run = run_child(script_child(tmp_path, f"{REPORT}; {LEFT_BEHIND[name]}"), timeout=20)
     assert verdict_of(run) == "complete"
     assert not run.document()["outcome"]["leftBehind"]
@@ -197,7 +197,7 @@ def test_grandchild(tmp_path, name):
 
 
 @pytest.mark.skipif(SANITIZED_BY == "thread",
-                    reason="the thread sanitizer is too slow for a launch beside a flood")
+                    reason="the thread sanitizer is too slow for a launch during a flood")
 def test_grandchild_that_floods(tmp_path):
     run = run_child(script_child(tmp_path, f"{REPORT}; yes words &"), timeout=20)
     assert verdict_of(run) == "complete"
@@ -235,7 +235,7 @@ def test_child_that_stops_its_group(tmp_path, name):
     assert run.seconds >= TIMEOUT
 
 
-def test_arguments_reach_the_child_as_they_are():
+def test_arguments_reach_the_child_unchanged():
     words = ["", "a b", '"', "'", "\\", "-x=--", "*", "caf\u00e9", "\udcff", "--", "--help"]
     run = run_child(CHILD, child=["args", *words])
     shown = [bytes.fromhex(line) for line in text_of(report_bytes(run.document())).splitlines()]
@@ -248,7 +248,7 @@ def test_arguments_reach_the_child_as_they_are():
 def test_output_that_is_full(form):
     with open("/dev/full", "wb") as full:
         run = host_run("run", "--assay", CHILD, "--format", form, "--", "out", "a=1", stdout=full)
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"cannot write to standard output: No space left on device" in run.err
 
 
@@ -260,7 +260,7 @@ def test_reader_that_has_gone(form):
     run = host_run("run", "--assay", CHILD, "--format", form, "--", "out", "a=1", "sleep", "500",
                    stdout=write)
     os.close(write)
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"cannot write to standard output: Broken pipe" in run.err
     assert time.monotonic() - start < 5
 
@@ -268,12 +268,12 @@ def test_reader_that_has_gone(form):
 def test_closed_standard_output():
     run = host_run("run", "--assay", CHILD, "--", "out", "a=1", stdout=None,
                    preexec_fn=lambda: os.close(1))
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"cannot write to standard output" in run.err
 
 
 def test_reader_that_leaves_ends_the_run():
-    """Nobody is left to run for."""
+    """Without a reader the run has no purpose."""
     read, write = os.pipe()
     with Watched("run", "--assay", CHILD, "--raw", "--timeout", "60", "--", "out", "a=1", "sleep",
                  "300", "out", "b=1", "sleep", "50000", stdout=write) as watched:
@@ -281,7 +281,7 @@ def test_reader_that_leaves_ends_the_run():
         assert os.read(read, 100) == b"a=1\n"
         os.close(read)
         run = watched.finish(20)
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert run.seconds < 5
 
 
@@ -305,7 +305,7 @@ def test_output_file_is_replaced_in_one_piece(tmp_path):
         assert file.read_text() == "before"
         others = [each for each in tmp_path.iterdir() if each not in (file, link)]
         assert len(others) == 1
-        assert b"a=1" in others[0].read_bytes() # there, should the host itself die
+        assert b"a=1" in others[0].read_bytes() # already written, in case the host is killed
         watched.finish()
     assert b"a=1" in file.read_bytes()
     assert file.stat().st_mode & 0o777 == 0o640
@@ -314,7 +314,7 @@ def test_output_file_is_replaced_in_one_piece(tmp_path):
 
 
 def test_output_through_a_link_that_leads_nowhere(tmp_path):
-    """The file is made where the link leads, as a shell's redirection does; the link stays."""
+    """The file is created where the link leads, as by a shell's redirection; the link stays."""
     (tmp_path / "folder").mkdir()
     (tmp_path / "folder" / "next").symlink_to("../end")
     (tmp_path / "link").symlink_to("folder/next")
@@ -325,11 +325,11 @@ def test_output_through_a_link_that_leads_nowhere(tmp_path):
     assert sorted(each.name for each in tmp_path.iterdir()) == ["end", "folder", "link"]
 
 
-def test_output_on_links_in_a_circle(tmp_path):
+def test_output_on_a_loop_of_links(tmp_path):
     (tmp_path / "a").symlink_to("b")
     (tmp_path / "b").symlink_to("a")
     run = host_run("run", "--assay", CHILD, "--output", tmp_path / "a", "--", "out", "a=1")
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"Too many levels of symbolic links" in run.err
     assert (tmp_path / "a").is_symlink()
     assert sorted(each.name for each in tmp_path.iterdir()) == ["a", "b"]
@@ -347,7 +347,7 @@ def test_output_on_standard_output_by_its_name():
     (["diff", "", "b"], "A"), (["diff", "a", ""], "B")])
 def test_empty_names_are_usage_errors(arguments, name):
     run = host_run(*arguments)
-    assert run.status == (2 if arguments[0] == "diff" else TROUBLE)
+    assert run.status == (2 if arguments[0] == "diff" else ERROR_STATUS)
     assert text_of(run.err).startswith(f"assay-host: {name}: must not be empty")
     assert run.out == b""
 
@@ -365,9 +365,9 @@ SHOWN = "\\x1B[31m\\x07\\n\\u{202E}\\xFF"
 def test_control_bytes_of_arguments_are_shown_escaped(arguments):
     run = host_run(*arguments)
     assert run.status not in (0, 1)
-    said = run.out + run.err
-    assert SHOWN.encode() in said
-    assert not re.search(rb"[\x00-\x09\x0b-\x1f\x7f\xff]|\xe2\x80\xae", said)
+    printed = run.out + run.err
+    assert SHOWN.encode() in printed
+    assert not re.search(rb"[\x00-\x09\x0b-\x1f\x7f\xff]|\xe2\x80\xae", printed)
 
 
 @pytest.mark.parametrize("path, text", [
@@ -376,7 +376,7 @@ def test_control_bytes_of_arguments_are_shown_escaped(arguments):
 def test_output_that_cannot_be(tmp_path, path, text):
     (tmp_path / "file").touch()
     run = host_run("run", "--assay", CHILD, "--output", tmp_path / path, "--", "out", "a=1")
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert text_of(run.err).startswith(f"assay-host: cannot write {tmp_path / path}: ")
     assert text in text_of(run.err)
     assert [each.name for each in tmp_path.iterdir()] == ["file"]
@@ -384,7 +384,7 @@ def test_output_that_cannot_be(tmp_path, path, text):
 
 def test_output_on_a_device():
     run = host_run("run", "--assay", CHILD, "--output", "/dev/full", "--", "out", "a=1")
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"cannot write /dev/full: No space left on device" in run.err
     assert not os.path.isfile("/dev/full")
     assert host_run("run", "--assay", CHILD, "--output", "/dev/null", "--", "out",
@@ -393,7 +393,7 @@ def test_output_on_a_device():
 
 
 def test_output_on_a_full_disk(tmp_path):
-    """The limit on a file's size stands for the disk."""
+    """The limit on a file's size replaces the full disk."""
     import resource
 
     def limit():
@@ -403,7 +403,7 @@ def test_output_on_a_full_disk(tmp_path):
     file = tmp_path / "result"
     file.write_text("before")
     run = host_run("run", "--assay", CHILD, "--output", file, "--", "out", "a=1", preexec_fn=limit)
-    assert run.status == TROUBLE
+    assert run.status == ERROR_STATUS
     assert b"File too large" in run.err
     assert file.read_text() == "before"
     assert [each.name for each in tmp_path.iterdir()] == ["result"]

@@ -1,4 +1,4 @@
-"""What assay-host needs at most for a child that prints whatever it likes, and for a file that is no
+"""The maximum memory of assay-host, for a child that prints anything and for a file that isn't a
 report."""
 
 import os
@@ -12,9 +12,9 @@ from hosting import HOST, script_child
 
 pytestmark = pytest.mark.skipif(bool(SANITIZED_BY), reason="a sanitizer has memory of its own")
 
-MOST_KIB = 64 * 1024
-SIZE = 6 << 20 # beyond what is kept
-COUNT = 60000  # also
+MAX_KIB = 64 * 1024
+SIZE = 6 << 20 # beyond the limit of bytes
+COUNT = 60000  # beyond the limit of lines
 
 
 def numbered(form):
@@ -44,7 +44,7 @@ FLOODS = {
 
 
 def peak_of(output, *arguments, standard_error=subprocess.DEVNULL):
-    """The status of assay-host and the most memory that it, or a child that it waited for, had."""
+    """Returns the status of assay-host, and the maximum memory in KiB of it or a child of it."""
     with subprocess.Popen([HOST, *map(str, arguments)], stdin=subprocess.DEVNULL, stdout=output,
                           stderr=standard_error) as process:
         _, status, usage = os.wait4(process.pid, 0)
@@ -67,7 +67,7 @@ def test_flood(tmp_path, name, stream):
         if form[0] != "text":
             status, peaks[f"diff of {form[0]}"] = peak_of(subprocess.DEVNULL, "diff", result, result)
             assert status == 0
-    assert max(peaks.values()) <= MOST_KIB, peaks
+    assert max(peaks.values()) <= MAX_KIB, peaks
 
 
 @pytest.fixture(name="report")
@@ -79,17 +79,17 @@ def fixture_report(tmp_path):
 @pytest.mark.parametrize("path, text", [
     ("/dev/zero", b"lines too long, or too many, for a report"),
     ("/dev/null", b"neither a JSON document nor a report"), ("/", b"can't read: Is a directory")])
-def test_difference_to_what_is_no_file(report, tmp_path, path, text):
-    with (tmp_path / "said").open("wb") as said:
-        status, peak = peak_of(subprocess.DEVNULL, "diff", report, path, standard_error=said)
+def test_difference_to_a_device_or_a_folder(report, tmp_path, path, text):
+    with (tmp_path / "errors").open("wb") as errors:
+        status, peak = peak_of(subprocess.DEVNULL, "diff", report, path, standard_error=errors)
     assert status == 2
-    assert peak <= MOST_KIB
-    assert (tmp_path / "said").read_bytes() == b"assay-host: " + path.encode() + b": " + text + b"\n"
+    assert peak <= MAX_KIB
+    assert (tmp_path / "errors").read_bytes() == b"assay-host: " + path.encode() + b": " + text + b"\n"
 
 
 @pytest.mark.parametrize("piece", [b"a=1\n", b"\0", b"{\n", b'{"a": "', b" ", b'{"a":1,'])
 def test_endless_pipe(report, tmp_path, piece):
-    """No more is read than a report can have."""
+    """Reading stops at the limits of a report."""
     os.mkfifo(tmp_path / "pipe")
     written = []
 
@@ -105,13 +105,13 @@ def test_endless_pipe(report, tmp_path, piece):
     writer = threading.Thread(target=write)
     writer.start()
     try:
-        with (tmp_path / "said").open("wb") as said:
+        with (tmp_path / "errors").open("wb") as errors:
             status, peak = peak_of(subprocess.DEVNULL, "diff", report, tmp_path / "pipe",
-                                   standard_error=said)
+                                   standard_error=errors)
     finally:
         writer.join()
     assert status == 2
-    assert b"for a report" in (tmp_path / "said").read_bytes() or b"not valid JSON" in (
-        tmp_path / "said").read_bytes()
+    assert b"for a report" in (tmp_path / "errors").read_bytes() or b"not valid JSON" in (
+        tmp_path / "errors").read_bytes()
     assert sum(written) <= 65 << 20
-    assert peak <= MOST_KIB
+    assert peak <= MAX_KIB

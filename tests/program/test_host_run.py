@@ -1,5 +1,5 @@
-"""`assay-host run` over drivers that behave and drivers that don't: verdicts, formats, what is kept of
-a report that broke off."""
+"""`assay-host run` with good and bad drivers: verdicts, formats, and the parts of an incomplete
+report."""
 
 import ctypes.util
 import os
@@ -13,7 +13,7 @@ import pytest
 
 from clmodel import ClGpu, ClPlatform
 from harness import PROGRAM, PROGRAM_AT_ROOT, STAMP, text_of
-from hosting import (GRACE, HOST, SLACK, TROUBLE, Watched, decode, host_run, read_to_the_end,
+from hosting import (GRACE, HOST, SLACK, ERROR_STATUS, Watched, decode, host_run, read_to_the_end,
                      report_bytes, run_assay, texts)
 from model import KEYS, Gpu, predict
 from test_command_line import STATUSES as EXITS
@@ -44,7 +44,7 @@ def test_complete(host):
 
 
 @pytest.mark.parametrize("value, status", [("2", 2), ("3", 3), *EXITS])
-def test_complete_with_the_status_asked_for(host, value, status):
+def test_complete_with_the_requested_status(host, value, status):
     run = run_assay(host, "--format", "json", child=[f"-exit={value}"], machine=scripted())
     document = run.document()
     assert document["outcome"]["verdict"] == "complete"
@@ -54,7 +54,7 @@ def test_complete_with_the_status_asked_for(host, value, status):
 FAILURES = {
     "programmed throw": (["-throwAfter=8"], "", "exception: Programmed throw", True),
     "programmed crash": (["-crashAfter=3"], "", "exception: programmed failure", False),
-    "status asked for": (["-throwAfter=8", "-exit=2"], "", "exception: Programmed throw", True),
+    "requested status": (["-throwAfter=8", "-exit=2"], "", "exception: Programmed throw", True),
     "failing query": ([], "at glGetString(GL_VENDOR) error GL_INVALID_OPERATION",
                       "exception: Failed requirement: glStatus == GL_NO_ERROR", True),
     "driver exits": ([], "at glLinkProgram exit 42", "status 42", False),
@@ -80,7 +80,7 @@ def test_usage_error(host, child):
     assert "Usage exception: usage" in document["outcome"]["errorLines"]
 
 
-# What the driver does, and what is told: how the child died and what it was at.
+# The driver's action, and the reported termination and key.
 CRASHES = {
     "crash in the shader compile": ("at glCompileShader crash",
                                     r"signal 11 \(.+\)", "CanCompileProgramGLSL"),
@@ -166,7 +166,7 @@ def test_opencl_drivers(host, rule, verdict, key):
 
 @pytest.mark.parametrize("number", [signal.SIGINT, signal.SIGTERM, signal.SIGHUP])
 @pytest.mark.parametrize("form", FORMATS)
-def test_interrupt_keeps_what_there_is(host, form, number):
+def test_interrupt_keeps_the_report(host, form, number):
     environment = host.environment(opencl="absent",
                                    **scripted(host.fresh_record() + "at glLinkProgram hang"))
     with Watched("run", "--assay", PROGRAM, "--format", form, environment=environment) as watched:
@@ -174,10 +174,10 @@ def test_interrupt_keeps_what_there_is(host, form, number):
         while not any(call.name == "glLinkProgram" for call in host.record_so_far()):
             assert time.monotonic() < deadline
             time.sleep(0.01)
-        asked = time.monotonic()
+        start = time.monotonic()
         watched.process.send_signal(number)
         run = watched.finish()
-        assert time.monotonic() - asked < GRACE
+        assert time.monotonic() - start < GRACE
     assert run.status == 6
     if form == "json":
         document = run.document()
@@ -207,7 +207,7 @@ def test_two_devices_of_each_kind(host):
                                   "\x00".replace("\x00", "\x01") + "\x1b[31m", "caf\u00e9", "\uf780",
                                   "\r", "x" * 30000], ids=lambda text: repr(text)[:30])
 def test_any_bytes_of_a_driver(host, text):
-    """The document is valid, and leads back to the very bytes of the child."""
+    """The document is valid, and decodes to the exact bytes of the child."""
     gpu = Gpu(vendor=text, renderer=text + "2", language=text)
     run = run_assay(host, "--format", "json", machine={"script": gpu.script()})
     document = run.document()
@@ -224,7 +224,7 @@ def test_any_bytes_of_a_driver(host, text):
 
 
 def test_events_come_as_they_happen(host):
-    """The child hangs, and its lines are there all the same."""
+    """The lines of a child that hangs are already written."""
     environment = host.environment(opencl="absent", **scripted("at glLinkProgram hang"))
     with Watched("run", "--assay", PROGRAM, "--format", "jsonl", environment=environment) as watched:
         seen = b""
@@ -300,11 +300,11 @@ def test_version():
 
 
 @pytest.mark.parametrize("command, status", [
-    ([], TROUBLE), (["bogus"], TROUBLE), (["run", "bogus"], TROUBLE),
-    (["run", "--timeout", "nan"], TROUBLE), (["run", "--timeout", "-1"], TROUBLE),
-    (["run", "--timeout", ""], TROUBLE), (["run", "--timeout", "1x"], TROUBLE),
-    (["run", "--format", "xml"], TROUBLE), (["run", "--raw", "--format", "json"], TROUBLE),
-    (["torture", "--kind", "x"], TROUBLE), (["torture", "--", "-crashAfter=3"], TROUBLE),
+    ([], ERROR_STATUS), (["bogus"], ERROR_STATUS), (["run", "bogus"], ERROR_STATUS),
+    (["run", "--timeout", "nan"], ERROR_STATUS), (["run", "--timeout", "-1"], ERROR_STATUS),
+    (["run", "--timeout", ""], ERROR_STATUS), (["run", "--timeout", "1x"], ERROR_STATUS),
+    (["run", "--format", "xml"], ERROR_STATUS), (["run", "--raw", "--format", "json"], ERROR_STATUS),
+    (["torture", "--kind", "x"], ERROR_STATUS), (["torture", "--", "-crashAfter=3"], ERROR_STATUS),
     (["diff"], 2), (["diff", "a"], 2), (["diff", "a", "b", "c"], 2),
     (["diff", "--tolerance", "-1", "a", "b"], 2), (["diff", "a", "b", "--", "x"], 2),
 ], ids=str)

@@ -1,4 +1,4 @@
-"""`assay-host torture`: every step of real and scripted machines, and children that break the rules."""
+"""`assay-host torture`: every step on real and scripted machines, and children that break the rules."""
 
 import os
 import re
@@ -43,32 +43,32 @@ def test_kinds(host, kind, runs):
 
 
 def test_device_that_fails_by_itself(host):
-    """In the middle of its tests, and at a test that prints before it asks."""
+    """In the middle of its tests, and at a test that prints before it queries."""
     for rule in ("at glGetString(GL_RENDERER) error GL_INVALID_OPERATION",
                  "at glGetString(GL_SHADING_LANGUAGE_VERSION) error GL_INVALID_OPERATION"):
         run = torture(host.environment(script=Gpu().script() + rule + "\n", opencl="absent"))
         assert run.status == 0, run.text
 
 
-def test_child_options_go_along(host):
+def test_child_options_are_passed_on(host):
     run = torture(host.environment(script=Gpu().script(), opencl="absent"), "--kind", "throw", "--",
                   "-exit=7", "-stdout=in front", "-verbose=1")
     assert run.status == 0, run.text
 
 
 def wrapped(folder, condition, action):
-    """A child that is assay but where the condition holds of its last argument."""
+    """A child that is assay, except when the condition holds for its last argument."""
     return script_child(folder, f'for last; do :; done\ncase "$last" in\n{condition}) {action};;\nesac\n'
                         f'exec {PROGRAM} "$@"')
 
 
 RULE_BREAKERS = {
     "a wrong status": (f"{PROGRAM} \"$@\"; exit 0", "exit status: predicted 2, found 0"),
-    "a crash in earnest": ("kill -SEGV $$", "predicted 2, found none: The child crashed with signal 11"),
-    "a line too few": (f"{PROGRAM} \"$@\" | sed '$d'; exit 2", "    + (the end)"),
-    "a line too many": (f"{PROGRAM} \"$@\"; echo NumGLGPUs=1; exit 2", "    + NumGLGPUs=1"),
+    "a real crash": ("kill -SEGV $$", "predicted 2, found none: The child crashed with signal 11"),
+    "a missing line": (f"{PROGRAM} \"$@\" | sed '$d'; exit 2", "    + (the end)"),
+    "an extra line": (f"{PROGRAM} \"$@\"; echo NumGLGPUs=1; exit 2", "    + NumGLGPUs=1"),
     "another order": (f"{PROGRAM} \"$@\" | sed '$!{{h;d}};G'; exit 2", "report (- predicted"),
-    "other words": ("echo exception: other >&2; exec " + str(PROGRAM) + ' "$@"',
+    "another message": ("echo exception: other >&2; exec " + str(PROGRAM) + ' "$@"',
                     "    + exception: other"),
     "no failure": (f"exec {PROGRAM}", "exit status: predicted 2, found 0"),
     "no end": ("sleep 1000", "did not end within 2 s"),
@@ -87,7 +87,7 @@ def test_first_outcome_that_is_not_predicted(host, tmp_path, name):
     assert run.text.endswith(f"  command: {child} -crashAfter=5\n")
 
 
-def test_undisturbed_run_that_is_none(host, tmp_path):
+def test_failing_undisturbed_run(host, tmp_path):
     environment = host.environment(script=Gpu().script(), opencl="absent")
     run = torture(environment, assay="/bin/true")
     assert run.status == 1

@@ -1,4 +1,4 @@
-"""The recorded machines of tests/data/adapters, whose README.md tells the form of the files."""
+"""The recorded machines of tests/data/adapters, whose README.md describes the files."""
 
 import re
 from pathlib import Path
@@ -14,7 +14,7 @@ def unescape(text):
 
 
 def unpack(name, root):
-    """Writes the files of a machine below root."""
+    """Writes the files of a machine below `root`, and returns it."""
     folder = file = root
     for line in (DATA / name / "tree.txt").read_text(encoding="ascii").splitlines():
         if line.startswith("@ "):
@@ -38,7 +38,7 @@ def unpack(name, root):
 
 
 def expected(name):
-    """What the report must tell of each device, by the report's keys."""
+    """The expected values of each device, by key of the report."""
     devices = []
     text = (DATA / name / "expected.txt").read_text(encoding="ascii")
     for block in filter(None, text.split("\n\n")):
@@ -59,7 +59,7 @@ def expected(name):
 
 
 def cards(root):
-    """The DRM cards of a machine whose devices are there."""
+    """The DRM cards of a machine whose devices exist."""
     folder = root / "sys/class/drm"
     found = [path.name for path in folder.glob("card*")
              if re.fullmatch(r"card\d+", path.name) and path.exists()]
