@@ -1,4 +1,4 @@
-"""The adapters of whole machines: the report carries each one's own name, ids, driver and memory."""
+"""The adapters of recorded machines: the report has each one's own name, ids, driver and memory."""
 
 import shutil
 
@@ -6,10 +6,10 @@ import pytest
 
 import trees
 
-# What these queries answer would be added to the memory that the system's files tell.
+# Disables the queries whose results would replace the memory size of the system's files.
 NO_MEMORY_QUERY = ("integer 0x9047 unknown\ninteger 0x87FC unknown\n")
 
-# How NVIDIA's EGL presents a card whose driver has no DRM part.
+# NVIDIA's EGL device of a card whose driver has no DRM part.
 NVIDIA_WITHOUT_NODE = 'device\ndevice-string EGL_EXTENSIONS "EGL_NV_device_cuda"\n'
 
 
@@ -30,13 +30,13 @@ def assert_devices(run, devices):
 
 @pytest.mark.parametrize("name", trees.NAMES)
 def test_machine(host, tmp_path, name):
-    """EGL lists the cards in the opposite order: the join goes by name, not by place."""
+    """EGL lists the cards in the opposite order: the join is by name, not by index."""
     root = trees.unpack(name, tmp_path / "root")
     devices = [device_on(card) for card in reversed(trees.cards(root))]
     if name == "nvidia-no-drm":
         devices = [NVIDIA_WITHOUT_NODE]
     if not trees.expected(name):
-        # A context on a node that is no adapter's would be the last resort.
+        # A context on a node without an adapter would be reported as the last resort.
         devices = []
     run = host.run(script="".join(device + NO_MEMORY_QUERY for device in devices) or "# none\n",
                    root=root)
@@ -55,7 +55,7 @@ def test_the_firmwares_framebuffer_is_not_the_cards_driver(host, tmp_path, frame
 
 
 def test_two_devices_of_a_machine_with_more(host, tmp_path):
-    """The third adapter has no context and is left out."""
+    """The third adapter has no context and isn't reported."""
     root = trees.unpack("server-bmc", tmp_path / "root")
     run = host.run(script="".join(device_on(card) + NO_MEMORY_QUERY for card in ("card2", "card0")),
                    root=root)
@@ -65,7 +65,7 @@ def test_two_devices_of_a_machine_with_more(host, tmp_path):
 
 @pytest.mark.parametrize("nodes", [True, False], ids=["with nodes", "without nodes"])
 def test_eight_identical_cards_are_eight_devices(host, tmp_path, nodes):
-    """Each has the memory that its own context tells."""
+    """Each has the memory that its own context reports."""
     root = trees.unpack("nvidia-eight", tmp_path / "root")
     devices = [device_on(card) for card in trees.cards(root)]
     if not nodes:
@@ -82,7 +82,7 @@ def test_eight_identical_cards_are_eight_devices(host, tmp_path, nodes):
 
 
 def test_software_renderer_on_a_machine_without_a_gpu(host, tmp_path):
-    """The last resort: a device without name or ids, and the log tells it."""
+    """The last resort: a device without name or ids, with a message in the log."""
     root = trees.unpack("empty", tmp_path / "root")
     run = host.run("-verbose=1", script="device\nsoftware\n", root=root)
     assert_devices(run, [{
@@ -109,7 +109,7 @@ def test_software_renderer_that_borrows_a_cards_node_is_not_the_card(host, tmp_p
 
 
 def test_a_card_without_a_monitor_is_a_device(host, tmp_path):
-    """Its render node stands in for the output."""
+    """Its render node replaces the output."""
     root = trees.unpack("hybrid-laptop", tmp_path / "root")
     log = host.run("-verbose=1", script=device_on("card1"), root=root).comments
     assert any(line.endswith("adapter[1] displays: 1") for line in log)
@@ -117,8 +117,8 @@ def test_a_card_without_a_monitor_is_a_device(host, tmp_path):
     assert any(line.endswith("dxgiNumDevices=2") for line in log)
 
 
-def test_the_log_tells_the_adapters(host, tmp_path):
-    """Raw adapters keep their numbers, and the one that is a virtual machine's has no count."""
+def test_the_log_lists_the_adapters(host, tmp_path):
+    """Raw adapters keep their indices, and the one that a virtual machine uses has no count."""
     root = trees.unpack("vfio", tmp_path / "root")
     run = host.run("-verbose=1", script=device_on("card0"), root=root)
     log = run.comments

@@ -1,5 +1,5 @@
-"""Drivers that misbehave: what they say reaches the report as it is, and what they do costs a GPU
-or the child, never the sense of the report."""
+"""Drivers that misbehave: their texts reach the report unchanged, and their failures end the tests of
+one GPU or the child, but never garble the report."""
 
 import pytest
 
@@ -54,7 +54,7 @@ def test_huge_extension_list(host):
                                   "GL_SHADING_LANGUAGE_VERSION"])
 @pytest.mark.parametrize("version", ["2.1 Scripted", "4.6 Scripted"])
 def test_null_texts(host, name, version):
-    """At worst the GPU gets no further tests; the run comes to its end."""
+    """At worst the GPU fails; the run completes."""
     gpu = Gpu(version=version)
     run = host.run(script=gpu.script() + f"string {name} null\n")
     assert run.status in (0, 2)
@@ -64,7 +64,7 @@ def test_null_texts(host, name, version):
 
 @pytest.mark.parametrize("version", ["", "4", "four", "OpenGL ES 3.2", "-1.5", "99999999999.1",
                                      ".", "4.", "\udcff", "0.0"], ids=repr)
-def test_versions_that_are_none(host, version):
+def test_malformed_versions(host, version):
     run = host.run(script=Gpu().script() + f"version {escaped(version)}\n")
     assert run.status in (0, 2)
     assert run.lines[-1] == 'assayEnd="STAMP"'
@@ -115,9 +115,9 @@ def test_extreme_integers(host, values):
     "at eglInitialize error EGL_NOT_INITIALIZED",
     "at eglBindAPI return 0",
 ], ids=str)
-def test_nonsense_is_survived(host, line):
-    """A driver that answers nonsense, in the number and size of things above all: the run comes to
-    its end quickly, with whole lines."""
+def test_absurd_answers(host, line):
+    """Absurd answers of a driver, above all in counts and sizes: the run completes quickly, with
+    whole lines."""
     for version in ("2.1 Scripted", "4.6 Scripted"):
         run = host.run(seconds=10, script=Gpu(version=version).script() + line + "\n")
         assert run.status in (0, 2)
@@ -134,7 +134,7 @@ def calls_of(host, gpu):
 @pytest.mark.parametrize("action, signals", [
     ("abort", ["SIGABRT"]), ("signal 8", ["SIGFPE"]), ("signal 4", ["SIGILL"]),
     ("signal 7", ["SIGBUS"]), ("signal 9", ["SIGKILL"])])
-def test_other_deaths(host, action, signals):
+def test_other_signals(host, action, signals):
     gpu = Gpu()
     whole = predict([gpu]).lines
     for name in ("eglQueryString", "eglCreateContext", "glCompileShader", "glClear"):
@@ -152,7 +152,7 @@ def test_driver_that_exits(host):
 
 
 def test_driver_that_prints(host):
-    """A driver's own words on standard error pass by; on standard output they come between lines."""
+    """A driver's messages on standard error are kept; on standard output they are between lines."""
     gpu = Gpu()
     run = host.run(script=gpu.script() + 'at 1 eglInitialize print 2 "libEGL warning: x\\n"\n'
                    'at glLinkProgram print 1 "driver: y\\n"\n')
@@ -161,8 +161,8 @@ def test_driver_that_prints(host):
     assert run.lines.count("driver: y") == 1
 
 
-def test_what_is_made_is_freed(host):
-    """Every object of an undisturbed run is given back, and no context stays current."""
+def test_objects_are_released(host):
+    """Every object of an undisturbed run is released, and no context stays current."""
     calls = calls_of(host, Gpu())
     count = {}
     for call in calls:
@@ -179,8 +179,8 @@ def test_what_is_made_is_freed(host):
     assert all(call.device >= 0 for call in calls if call.name.startswith("gl"))
 
 
-def test_shaders_as_the_driver_gets_them(host):
-    """13 and 76 strings, each read to its end."""
+def test_shader_sources(host):
+    """The driver receives 13 and 76 strings, each ended by a zero."""
     sources = [call.arguments for call in calls_of(host, Gpu()) if call.name == "glShaderSource"]
     assert len(sources) == 2
     vertex, fragment = sources
@@ -197,7 +197,7 @@ def test_shaders_as_the_driver_gets_them(host):
 
 
 def test_framebuffer_calls(host):
-    """The clear is what is told: opaque white far out of range, colours only, 32 by 32."""
+    """The clear: white with components of 255, only the colour buffer, 32 by 32."""
     calls = calls_of(host, Gpu())
     assert [call.arguments for call in calls if call.name == "glClearColor"] == ["255 255 255 255"]
     assert [call.arguments for call in calls if call.name == "glClear"] == ["0x4000"]

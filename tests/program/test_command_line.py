@@ -1,4 +1,4 @@
-"""The command line: effects from left to right, and one answer to whatever can't be taken."""
+"""The command line: options take effect from left to right, and every error prints the usage."""
 
 import pytest
 
@@ -28,7 +28,7 @@ MALFORMED = [
     "-\"stdout\"=x", "-stdout\n=x", "-\xff=1", "-exit:1", "–exit=1",
 ]
 
-# What behind the "=" of a text option gives what text.
+# The value of a text option, and the text that it prints.
 TEXTS = [
     ("x", "x"),
     ("", ""),
@@ -51,7 +51,7 @@ TEXTS = [
     ("\udcff\udc80", "\udcff\udc80"),
 ]
 
-# What behind "-exit=" gives what status.
+# The value of "-exit=", and the exit status.
 STATUSES = [
     ("0", 0),
     ("7", 7),
@@ -85,7 +85,7 @@ STATUSES = [
     ("-99999999999999999999999", 0),
 ]
 
-# What behind "-crashAfter=" and "-throwAfter=" is what step.
+# The value of "-crashAfter=" and "-throwAfter=", and the step.
 THRESHOLDS = [
     ("0", 0), ("abc", 0), ("", 0), ("5", 5), ("0x0c", 12), ("014", 12), ("-1", -1),
     ("4294967295", 2**31 - 1), ("-5", -5), ("2 and more", 2),
@@ -108,7 +108,7 @@ def test_malformed(one, argument):
     assert run.out == b""
 
 
-def test_arguments_that_are_no_text(one):
+def test_arguments_that_are_not_utf_8(one):
     run = one.run(b"\xff\xfe", b"-\x80\x81=1", **one.found)
     assert (run.status, run.errors, run.out) == (3, USAGE, b"")
 
@@ -130,7 +130,7 @@ def test_many_arguments(one):
 
 
 def test_effects_of_valid_options_come_before_the_usage_text(one):
-    """Those to the left and to the right of the bad one, in their order."""
+    """The options to the left and to the right of the bad one take effect, in order."""
     run = one.run("-stdout=left", "-stderr=first", "-bogus", "-comment=right", "-stderr=second",
                   "-stdout=last", "-exit=7", "-crashAfter=0", **one.found)
     assert run.lines == ["left", "# right", "last"]
@@ -201,9 +201,9 @@ def test_options_without_a_visible_effect(one, options):
     check(one.run(*options, seconds=8, **one.found), predict([one.gpu]))
 
 
-def test_status_3_wins_over_the_status_asked_for(one):
+def test_status_3_replaces_the_requested_status(one):
     assert one.run("-exit=7", "-bogus", **one.found).status == 3
 
 
-def test_status_2_wins_over_the_status_asked_for(one):
+def test_status_2_replaces_the_requested_status(one):
     assert one.run("-exit=7", "-throwAfter=10", **one.found).status == 2

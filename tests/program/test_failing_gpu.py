@@ -10,7 +10,7 @@ from model import (GL_ERROR, KEYS, STEPS_BEFORE_TESTS, Gpu, check, per_gpu_tests
 
 WHOLE_BATTERY_LINES = 43
 
-# What a driver can do to make a key test fail. The other keys don't come from the driver.
+# Driver failures that make a key test fail. The other keys don't come from the driver.
 DRIVER_FAILURES = {
     "GLVersion": ('version "1.1 Scripted"', "exception: Cannot determine OGL version"),
     "GLVendor": ("at glGetString(GL_VENDOR) on {device} error GL_INVALID_OPERATION", GL_ERROR),
@@ -60,7 +60,7 @@ def test_programmed_failure_in_each_test(two, tmp_path):
         check(run, predict(gpus, throw_after=step))
         assert run.errors == ["exception: Programmed throw"]
         assert_other_is_complete(run, failed)
-        # The line comes before the step, so the failing test's own line is the GPU's last.
+        # The line precedes the step, so that the failing test's line is the GPU's last one.
         own = [line for line in run.lines if line.startswith(f"glgpu[{failed}].")]
         assert [line.split("=")[0].split(".")[1] for line in own] == KEYS[:key + 1]
 
@@ -68,7 +68,7 @@ def test_programmed_failure_in_each_test(two, tmp_path):
 @pytest.mark.parametrize("failed", [0, 1])
 @pytest.mark.parametrize("key", DRIVER_FAILURES)
 def test_driver_failure(two, tmp_path, key, failed):
-    """A failing fetch leaves no line of that key."""
+    """A key whose query fails has no line."""
     line, error = DRIVER_FAILURES[key]
     gpus = two.gpus
     scripts = [gpu.script() for gpu in gpus]
@@ -81,7 +81,7 @@ def test_driver_failure(two, tmp_path, key, failed):
 
 
 def test_all_gpus_fail(two, tmp_path):
-    """With the last GPU gone the rest of the sequence goes on."""
+    """The sequence continues after the last GPU failed."""
     scripts = [gpu.script() + "integer GL_MAX_RECTANGLE_TEXTURE_SIZE_ARB unknown\n"
                for gpu in two.gpus]
     run = two.run(script="".join(scripts), root=tmp_path / "root")
@@ -91,7 +91,7 @@ def test_all_gpus_fail(two, tmp_path):
 
 
 def test_whole_battery_of_one_gpu():
-    """43 lines, of which 22 tell a code, and 20 steps."""
+    """43 lines, 22 of them gputag lines, and 20 steps."""
     tests = per_gpu_tests(Gpu.values)[len(KEYS):]
     output = [line for test in tests for line in test("glgpu[0]", Gpu())]
     lines = [line for line in output if line is not None]
@@ -101,8 +101,8 @@ def test_whole_battery_of_one_gpu():
 
 
 @pytest.mark.parametrize("failed", [0, 1])
-def test_context_that_cannot_be_made(two, tmp_path, failed):
-    """No context, no device: the other one is alone in the list, with the first tag."""
+def test_context_that_cannot_be_created(two, tmp_path, failed):
+    """A device without a context isn't listed: the other one is alone, with the first tag."""
     rule = f"at eglCreateContext on {failed} error EGL_BAD_ALLOC\n"
     run = two.run(script=script_of(two.gpus) + rule, root=tmp_path / "root")
     expected = predict([two.gpus[1 - failed]], context=failed)
@@ -140,8 +140,8 @@ def test_no_context_on_any_device(two, tmp_path):
     ('at glClear throw "what a driver throws"', "GLFrameBufferOK"),
     ('at glLinkProgram throw "what a driver throws"', "CanCompileProgramGLSL"),
 ])
-def test_answers_that_are_no_failure(host, line, key):
-    """What can't be compiled or rendered into is answered with 0, without a word."""
+def test_trials_that_fail(host, line, key):
+    """A failed compilation or framebuffer is reported as 0, without a message."""
     gpu = Gpu()
     run = host.run(script=gpu.script() + line + "\n")
     expected = predict([gpu])
@@ -151,7 +151,7 @@ def test_answers_that_are_no_failure(host, line, key):
 
 
 def test_texture_without_memory(host):
-    """No framebuffer, and the log says why. The error doesn't meet the next question."""
+    """The framebuffer fails, and the log has the reason. The error doesn't affect the next query."""
     gpu = Gpu()
     script = gpu.script() + "at glTexImage2D error GL_OUT_OF_MEMORY\n"
     expected = predict([gpu])

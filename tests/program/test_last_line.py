@@ -1,6 +1,6 @@
-"""What docs/report-format.md tells a host of the last line behind a crash: whatever driver call the
-program makes, on whatever machine and also behind a failure, the tables name it behind the line that
-stands last then; each word of them is used."""
+"""The tables of last lines in docs/report-format.md: for every driver call of the program, on any
+machine and also after a failure, the row of the last line names the call; and every entry of the tables
+occurs."""
 
 import ctypes.util
 from concurrent.futures import ThreadPoolExecutor
@@ -15,7 +15,7 @@ WORKERS = 2
 pytestmark = pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
                                 reason="this machine has no OpenCL loader library")
 
-# What makes the program take another way than usual.
+# Script lines that make the program take another path than usual.
 MACHINES = {
     "extensions in one text": "version \"2.1 Scripted\"",
     "no extensions in one text": "version \"2.1 Scripted\"\nstring GL_EXTENSIONS null",
@@ -57,7 +57,7 @@ def test_every_call(tmp_path):
         return machine.run(number, cl_lines=rule if opencl else "", gl_lines="" if opencl else rule)
 
     jobs = [(call, f"error {ERRORS[library_of(call.name)]}") for call in first.values()]
-    # A platform that can't be made at all.
+    # A platform that can't be created at all.
     jobs += [(call, 'throw "thrown"') for call in first.values() if library_of(call.name) == "egl"]
     with ThreadPoolExecutor(WORKERS) as workers:
         for run in workers.map(run_disturbed, enumerate(jobs)):
@@ -65,12 +65,12 @@ def test_every_call(tmp_path):
     for name, lines in MACHINES.items():
         learn(machine.run(name.replace(" ", "-"), gl_lines=lines + "\n"))
 
-    told = {(row, name) for row, (_, names) in enumerate(table.rows) for name in names}
-    assert {each for each in told - seen if each[1] not in UNSEEN} == set()
+    listed = {(row, name) for row, (_, names) in enumerate(table.rows) for name in names}
+    assert {each for each in listed - seen if each[1] not in UNSEEN} == set()
 
 
 def test_a_call_without_a_row_fails():
-    """The tables are read as they are meant."""
+    """The check of the tables rejects wrong calls and lines."""
     table = LastLines()
     table.check("glGetStringi", "NumGLGPUs=1")
     table.check("eglGetError", "NumGLGPUs=1")

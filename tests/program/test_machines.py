@@ -34,12 +34,12 @@ def test_real_driver(host):
 
 
 def test_real_driver_is_the_same_twice(host):
-    """Nothing of a run depends on the one before."""
+    """A run doesn't depend on the previous one."""
     assert host.run(egl="real").report == host.run(egl="real").report
 
 
 def test_real_driver_without_a_gpu(host):
-    """Mesa's software renderer alone: one device, known to no adapter list."""
+    """Mesa's software renderer alone: one device that no adapter matches."""
     run = host.run("-verbose=1", egl="real")
     if "llvmpipe" not in run.facts.get("glgpu[0].GLRenderer", ""):
         pytest.skip("the first OpenGL device of this machine isn't Mesa's software renderer")
@@ -66,14 +66,14 @@ def test_no_egl_library(host, opencl):
     assert run.status == 0
 
 
-def test_no_egl_library_is_told_in_the_log(host):
+def test_no_egl_library_is_logged(host):
     run = host.run("-verbose=1", egl="absent")
     assert any("QGF::OGL::Library::initialize() failed: " in line for line in run.comments)
     assert run.status == 0
 
 
-def test_library_that_is_no_egl(host, tmp_path):
-    """A library of that name without one EGL function."""
+def test_library_without_egl(host, tmp_path):
+    """A library of that name without any EGL function."""
     folder = tmp_path / "wrong"
     folder.mkdir()
     libc = next(line.split("=>")[1].split()[0] for line in subprocess.run(
@@ -87,7 +87,7 @@ def test_library_that_is_no_egl(host, tmp_path):
 
 
 def test_no_device(host):
-    check(host.run(script="# EGL, and nothing behind it\n"), predict([], ogl=0))
+    check(host.run(script="# EGL without a device\n"), predict([], ogl=0))
 
 
 @pytest.mark.parametrize("count", [2, 9])
@@ -102,7 +102,7 @@ def test_many_devices(host, tmp_path, count):
 
 
 def test_adapter_that_egl_does_not_know(host, tmp_path):
-    """No context, no device: the second card is left out."""
+    """The second card has no context and isn't reported."""
     adapters = [Adapter(0, "Known"), Adapter(1, "Unknown")]
     gpus = [Gpu(adapter=adapters[0])]
     write_tree(tmp_path / "root", adapters)
@@ -113,7 +113,7 @@ def test_adapter_that_egl_does_not_know(host, tmp_path):
 
 
 def test_software_beside_a_card(host, tmp_path):
-    """A software renderer is no adapter, and isn't reported where there is one."""
+    """A software renderer isn't reported on a machine with a card."""
     adapter = Adapter(0, "Card")
     gpus = [Gpu(adapter=adapter), Gpu(renderer="software")]
     write_tree(tmp_path / "root", [adapter])
@@ -121,13 +121,13 @@ def test_software_beside_a_card(host, tmp_path):
 
 
 def test_bare_environment(host):
-    """No HOME, no DISPLAY, no PATH, nothing but where the libraries are."""
+    """No HOME, no DISPLAY, no PATH, only the paths of the libraries."""
     gpu = Gpu()
     check(host.run(script=gpu.script(), clear=True), predict([gpu]))
 
 
 def test_bare_environment_with_the_real_driver(host):
-    """Only the words on standard error may differ: they are the driver's."""
+    """Only the driver's messages on standard error may differ."""
     full = host.run(egl="real")
     host.variables.update(HOME="", DISPLAY="", XDG_RUNTIME_DIR="", WAYLAND_DISPLAY="")
     bare = host.run(egl="real")
@@ -136,14 +136,14 @@ def test_bare_environment_with_the_real_driver(host):
 
 
 def test_environment_is_not_read(host):
-    """What other programs go by changes nothing."""
+    """Variables that other programs read have no effect."""
     gpu = Gpu()
     host.variables.update(GPUAssay="1", ASSAY_VERBOSE="1", VERBOSE="1", AssayDebugFlags="GPUAssay=1",
                           LANG="de_DE.UTF-8", LC_ALL="de_DE.UTF-8", POSIXLY_CORRECT="1")
     check(host.run(script=gpu.script()), predict([gpu]))
 
 
-def test_working_directory_that_has_gone(host, tmp_path):
+def test_deleted_working_directory(host, tmp_path):
     gone = tmp_path / "gone"
     gone.mkdir()
 
@@ -156,9 +156,9 @@ def test_working_directory_that_has_gone(host, tmp_path):
 
 
 @pytest.mark.skipif("undefined" in SANITIZED_BY,
-                    reason="the undefined behaviour sanitizer takes a descriptor for its checks")
+                    reason="the undefined behaviour sanitizer needs a descriptor for its checks")
 def test_no_file_descriptors_left(host):
-    """A machine at its limit: what can't be opened isn't there."""
+    """A library that can't be opened counts as missing."""
     # One descriptor more than the streams: enough to load a library, not to open two files.
     run = subprocess.run(
         ["/bin/sh", "-c", 'ulimit -n 4; exec "$0"', str(PROGRAM)], capture_output=True,

@@ -1,5 +1,5 @@
-"""The OpenCL half: the whole report over scripted and real drivers, failures at every step and in
-every kind of driver call, bad answers, and what is left behind."""
+"""The OpenCL half: the whole report with scripted and real drivers, failures at every step and in
+every kind of driver call, bad answers, and objects that stay."""
 
 import ctypes.util
 import re
@@ -30,7 +30,7 @@ pytestmark = pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
 
 
 def platforms_of_two():
-    """Two platforms with a GPU each, one of them with CUDA; a CPU lies between."""
+    """Two platforms with a GPU each, the first with CUDA and a CPU."""
     return [
         ClPlatform([ClGpu(name="First device"), ClGpu(name="A processor", type="cpu")],
                    version="OpenCL 1.2 CUDA 8.0.0"),
@@ -66,7 +66,7 @@ class Machine:
         return self
 
     def run(self, *arguments, extra="", **options):
-        """Runs on the platforms, with further script lines for the last device."""
+        """Runs the program on the platforms, with extra script lines for the last device."""
         self.script(cl_script_of(self.platforms) + extra)
         return self.host.run(*arguments, **self.found, **options)
 
@@ -76,13 +76,13 @@ class Machine:
 
 @pytest.fixture
 def machine(host):
-    """No OpenGL GPU and the two OpenCL GPUs: what a test of the OpenCL half needs."""
+    """A machine with two OpenCL GPUs and no OpenGL GPU."""
     return Machine(host, gl=0)
 
 
 @pytest.fixture
 def one(host):
-    """The same with one OpenCL GPU."""
+    """A machine with one OpenCL GPU and no OpenGL GPU."""
     result = Machine(host, gl=0)
     result.platforms = [ClPlatform([ClGpu()])]
     return result
@@ -118,7 +118,7 @@ def test_driver_without_platforms(machine):
 
 
 def test_library_without_opencls_entry_points(machine, tmp_path):
-    """A library of that name which isn't one: no OpenCL line at all."""
+    """A library of that name without its functions: no OpenCL line at all."""
     folder = tmp_path / "wrong"
     folder.mkdir()
     libm = next(line.split("=>")[1].split()[0] for line in subprocess.run(
@@ -144,8 +144,8 @@ CALLED = """
 
 
 def loader_without(machine, folder, lacks):
-    """Lets the program find a copy of the loader that lacks the names for which `lacks` is true;
-    returns those names."""
+    """Makes the program find a copy of the loader without the names for which `lacks` is true.
+    Returns those names."""
     found = subprocess.run(["ldconfig", "-p"], capture_output=True, text=True, check=True).stdout
     loader = next(line.split("=>")[1].strip() for line in found.splitlines()
                   if "libOpenCL.so.1 " in line and "x86-64" in line)
@@ -153,8 +153,8 @@ def loader_without(machine, folder, lacks):
     names = {name.decode() for name in re.findall(rb"\0(cl[A-Z]\w+)(?=\0)", library)}
     missing = [name for name in names if lacks(name) and not name.startswith("clIcd")]
     for name in missing:
-        # The first place is the table of exported names; what is there then is no longer the name
-        # that its hash stands for.
+        # The first occurrence is in the table of exported names. The changed name doesn't match its
+        # hash.
         library = library.replace(f"\0{name}\0".encode(), f"\0_{name[1:]}\0".encode(), 1)
     folder.mkdir()
     (folder / "libOpenCL.so.1").write_bytes(library)
@@ -163,16 +163,16 @@ def loader_without(machine, folder, lacks):
     return missing
 
 
-def test_loader_that_lacks_what_is_not_called(one, tmp_path):
-    """Whatever nobody calls may be missing."""
+def test_loader_without_uncalled_functions(one, tmp_path):
+    """Functions that the program doesn't call may be missing."""
     missing = loader_without(one, tmp_path / "loader", lambda name: name not in CALLED)
     assert "clUnloadCompiler" in missing
     check(one.run(), one.predict())
 
 
 @pytest.mark.parametrize("name", CALLED)
-def test_loader_that_lacks_what_is_called(one, tmp_path, name):
-    """OpenCL is missing, and nothing else happens."""
+def test_loader_without_a_called_function(one, tmp_path, name):
+    """OpenCL counts as missing, without any other effect."""
     assert loader_without(one, tmp_path / "loader", lambda each: each == name) == [name]
     check(one.run(), predict([], **one.checks))
 
@@ -199,7 +199,7 @@ def test_bandwidth_of_scripted_counters(one, batch, batches, bandwidth):
     (15_625_000, 7, "2.14748e+09"),
 ])
 def test_bandwidth_of_even_copies(one, copy, batches, bandwidth):
-    """The sum of ten durations is what doubles make of it, here and there just less than expected."""
+    """The sum of ten durations in doubles may be just less than expected."""
     run = one.run(extra=f"copy-ns {copy}\n" + one.host.fresh_record())
     assert run.facts["clgpu[0].CLBandwidth"] == bandwidth
     copies = [call for call in one.host.record() if call.name == "clEnqueueCopyBuffer"]
@@ -215,7 +215,7 @@ def test_compute_of_scripted_counters(one, kernel, score):
 
 
 @pytest.mark.parametrize("verbosity", [0, 1, -1])
-def test_driver_sees_the_same_calls_whatever_is_logged(one, verbosity):
+def test_logging_does_not_change_the_driver_calls(one, verbosity):
     one.run(extra=one.host.fresh_record())
     silent = one.host.record()
     one.run(f"-verbose={verbosity}", extra=one.host.fresh_record())
@@ -237,8 +237,8 @@ def test_kernel_text_and_arguments(one):
     assert calls["clEnqueueNDRangeKernel"] == "queue2 kernel1 1 null 1048576 64 0 null"
 
 
-def test_objects_left_behind(one):
-    """Events of all batches but the last, and program, kernel and event of the kernel's run."""
+def test_objects_that_stay(one):
+    """Events of all batches except the last, and program, kernel and event of the kernel's run."""
     one.run(extra=one.host.fresh_record())
     names = [call.name for call in one.host.record()]
     counts = {name: names.count(name) for name in set(names)}
@@ -271,8 +271,8 @@ def test_failure_at_every_step(host, option):
     assert [run.status for run in runs] == [2] * steps + [0]
 
 
-# A driver call that fails on the second of two devices: the script line, the key whose test it ends,
-# and what standard error shows.
+# A driver call that fails on the second of two devices: the script line, the key whose test fails, and
+# the lines on standard error.
 FAILING_CALLS = [
     ("at clGetDeviceInfo(1,CL_DEVICE_PLATFORM) error CL_INVALID_DEVICE", "CLPlatformVersion",
      "QGF::LogicalException: clGetDeviceInfo(CL_DEVICE_PLATFORM) failed: CL_INVALID_DEVICE (-33)"),
@@ -323,7 +323,7 @@ FAILING_CALLS = [
 
 
 @pytest.mark.parametrize("line, key, errors", FAILING_CALLS)
-def test_failing_call_costs_one_gpu_its_remaining_tests(machine, line, key, errors):
+def test_failing_call_ends_the_tests_of_one_gpu(machine, line, key, errors):
     machine.platforms[0].devices.pop()
     run = machine.run(extra=line + "\n")
     check(run, machine.predict(cl_failing={(1, key): errors}))
@@ -345,11 +345,11 @@ def test_failing_call_costs_one_gpu_its_remaining_tests(machine, line, key, erro
     'at clReleaseCommandQueue throw "x"',
     "at clReleaseContext throw int 5",
 ])
-def test_failures_that_nobody_reports(one, line):
+def test_failures_that_are_not_reported(one, line):
     check(one.run(extra=line + "\n"), one.predict())
 
 
-def test_profiling_that_fails_is_no_failure(one):
+def test_failed_profiling_reports_0(one):
     run = one.run(extra="at clGetEventProfilingInfo error CL_PROFILING_INFO_NOT_AVAILABLE\n")
     assert run.facts["clgpu[0].CLBandwidth"] == "0"
     assert run.facts["clgpu[0].CLCompute"] == "0"
@@ -357,13 +357,13 @@ def test_profiling_that_fails_is_no_failure(one):
     assert run.status == 0
 
 
-# A bad answer of the only device: the script line, the key, and standard error or a value.
+# A bad answer of the only device: the script line, the key, and the lines on standard error.
 BAD_ANSWERS = [
     ("claim CL_DEVICE_NAME -1", "CLName", NO_ROOM),
     ("claim CL_DEVICE_VENDOR -1", "CLVendor", NO_ROOM),
     ("claim CL_DRIVER_VERSION -1", "CLDriverVersion", NO_ROOM),
     ("claim CL_DEVICE_VERSION -1", "CLDeviceVersion", NO_ROOM),
-    # More than an address space holds.
+    # More than an address space can hold.
     pytest.param("claim CL_DRIVER_VERSION 0x4000000000000", "CLDriverVersion", NO_ROOM,
                  marks=pytest.mark.skipif(SANITIZED_BY != "",
                                           reason="the sanitizer's allocator ends the process")),
@@ -381,7 +381,7 @@ BAD_ANSWERS = [
 
 
 @pytest.mark.parametrize("line, key, errors", BAD_ANSWERS)
-def test_bad_answer_costs_the_gpu_its_remaining_tests(one, line, key, errors):
+def test_bad_answer_ends_the_tests_of_the_gpu(one, line, key, errors):
     check(one.run(extra=line + "\n"), one.predict(cl_failing={(0, key): errors}))
 
 
@@ -400,7 +400,7 @@ def test_bad_answer_costs_the_gpu_its_remaining_tests(one, line, key, errors):
     ("ulong CL_DEVICE_GLOBAL_MEM_SIZE 1048575", "CLMemoryMB", "0"),
     ("uint CL_DEVICE_VENDOR_ID 0xFFFFFFFF", "CLVendorID", "4294967295"),
 ], ids=lambda text: text[:60])
-def test_odd_answer_is_reported_as_it_stands(one, line, key, value):
+def test_odd_answer_is_reported_unchanged(one, line, key, value):
     run = one.run(extra=line + "\n")
     assert run.facts[f"clgpu[0].{key}"] == value
     assert run.errors == []
@@ -413,7 +413,7 @@ def test_line_end_in_a_name_is_reported_raw(one):
     assert run.status == 0
 
 
-def test_null_device_costs_that_device_its_tests(one):
+def test_null_device_fails(one):
     """The other device of the platform is complete."""
     run = one.run(extra="device null\n")
     values = cl_values_of(one.platforms)
@@ -440,19 +440,19 @@ def test_devices_beyond_reason_end_the_run(one):
 
 
 def test_platforms_that_cannot_be_listed(one):
-    """A driver that the loader itself gives up on is as good as absent."""
+    """The loader drops the driver, which then counts as absent."""
     check(one.run(extra="at clIcdGetPlatformIDsKHR error CL_OUT_OF_HOST_MEMORY\n"),
           predict([], opencl=0, **one.checks))
 
 
-def test_driver_that_exits_takes_the_run_along(one):
+def test_driver_that_exits_ends_the_run(one):
     run = one.run(extra="at clBuildProgram exit 41\n")
     assert run.status == 41
     assert run.lines[-1].startswith("clgpu[0].CLBandwidth=")
 
 
 def use_vendor(host, name, **variables):
-    """Lets the loader find that one of the machine's drivers."""
+    """Makes the loader find only this one of the machine's drivers."""
     file = VENDORS / name
     if not file.exists():
         pytest.skip(f"this machine has no {file}")
@@ -464,7 +464,7 @@ def use_mesa_as_gpu(host):
 
 
 def test_processors_are_never_listed(host):
-    """PoCL has nothing but the processor."""
+    """PoCL offers only the processor."""
     use_vendor(host, "pocl.icd")
     peer = subprocess.run(["clinfo", "-l"], capture_output=True, check=False,
                           env=host.environment(opencl="real"))
@@ -475,7 +475,7 @@ def test_processors_are_never_listed(host):
 
 
 def clinfo_devices(host, **machine):
-    """What clinfo says of each GPU, in the loader's order."""
+    """The answers of clinfo for each GPU, in the loader's order."""
     if shutil.which("clinfo") is None:
         pytest.skip("clinfo isn't installed")
     done = subprocess.run(["clinfo", "--raw"], capture_output=True, text=True, check=False,
@@ -496,8 +496,8 @@ def clinfo_devices(host, **machine):
             if device != "*" and "CL_DEVICE_TYPE_GPU" in facts.get("CL_DEVICE_TYPE", "")]
 
 
-def told_by_clinfo(device):
-    """What the report should say of a device; all but what is measured."""
+def values_by_clinfo(device):
+    """The expected values of a device, except the measurements."""
     version = device["CL_PLATFORM_VERSION"].removeprefix("OpenCL ")
     version, _, cuda = version.partition(" CUDA ")
     values = {
@@ -522,14 +522,14 @@ def assert_agrees_with_clinfo(run, devices):
         tag = f"clgpu[{index}]."
         own = {key.removeprefix(tag): value for key, value in facts.items() if key.startswith(tag)}
         del own["CLBandwidth"], own["CLCompute"]
-        assert own == told_by_clinfo(device)
+        assert own == values_by_clinfo(device)
 
 
 @pytest.mark.skipif(SANITIZED_BY == "thread",
                     reason="Mesa's OpenCL compiler doesn't end under the thread sanitizer")
 def test_mesa_as_gpu(host):
-    """The whole report over a real driver, and clinfo's word for each fact. Mesa's software device
-    has no sound counters: that the two measured values are there is all that can be asked."""
+    """The whole report with a real driver, compared with clinfo. Mesa's software device has no
+    reliable counters, so that the two measurements are only checked to be positive."""
     use_mesa_as_gpu(host)
     run = host.run(script=Gpu().script(), opencl="real", seconds=300)
     assert run.status == 0
@@ -545,7 +545,7 @@ def test_mesa_as_gpu(host):
 
 
 def test_drivers_of_this_machine(host):
-    """Whatever GPUs the installed drivers show, clinfo shows the same."""
+    """The report has the same GPUs and values as clinfo."""
     devices = clinfo_devices(host, egl="real", opencl="real")
     if not devices:
         pytest.skip("no OpenCL driver of this machine shows a GPU")

@@ -1,7 +1,7 @@
-"""Every OpenGL line of the report over the machine's own driver, against what others say of it.
+"""Every OpenGL line of the report with the machine's own driver, compared with other sources.
 
-SOURCES tells, line by line of the report, who is asked. A line that no row covers fails the test;
-only what the system's adapter lists say of real hardware is left to the tests of those lists.
+SOURCES has the sources for each line of the report. A line without a row fails the test. Only the values
+of the system's adapter lists for real hardware are left to the tests of those lists.
 """
 
 import contextlib
@@ -21,20 +21,20 @@ from harness import TREE
 
 NEWEST_VERSION = "4.1"
 
-# What no adapter list knows of a software renderer.
+# The value that no adapter list has for a software renderer.
 UNKNOWN = '"?"'
 
-# In the place of an answer: compared elsewhere, with recorded lists.
+# Replaces an answer that other tests compare, with recorded lists.
 OF_THE_LISTS = object()
 
 
 @dataclass
 class Peers:
-    """What the others say of one device."""
+    """The answers of the other sources for one device."""
 
-    egl: dict  # gl_peer.py's words on it
-    glx: object  # glxinfo's, or None where it can't be asked about this driver
-    devices: list  # eglinfo's words on each EGL device
+    egl: dict  # of gl_peer.py
+    glx: object  # of glxinfo, or None if it has none for this driver
+    devices: list  # of eglinfo, for each EGL device
 
     @property
     def hardware(self):
@@ -51,7 +51,7 @@ def extension_name(name):
     return re.sub(r"^(GL_[A-Z]+_)(.+)$", lambda found: found[1] + found[2].lower(), name)
 
 
-# Extensions that became part of OpenGL as they were: a driver may leave out their names.
+# Extensions that became part of OpenGL unchanged: a driver may omit their names.
 CORE_SINCE = {
     "GL_ARB_VERTEX_SHADER": "2.0", "GL_ARB_FRAGMENT_SHADER": "2.0",
     "GL_EXT_FRAMEBUFFER_OBJECT": "3.0", "GL_ARB_TEXTURE_RECTANGLE": "3.1",
@@ -100,7 +100,7 @@ def in_list(value):
 
 
 def adapter_id(file):
-    """For a device with a DRM node, the system's word; a software renderer is no adapter."""
+    """The id by sysfs for a device with a DRM node, and 0 for a software renderer."""
     def ask(peers, _):
         if peers.egl["software"]:
             return "0"
@@ -130,8 +130,8 @@ EGLINFO = "eglinfo"
 HEADERS = "Khronos' headers"
 ADAPTERS = "the system's adapters"
 
-# The line, who is asked, and the answer from the peers and the name in the line. A source that can't
-# tell answers None; the others then have to.
+# The line, the source, and a function of the peers and the name in the line that returns the value; None
+# if the source doesn't know it, so that another one must.
 SOURCES = [
     (r"QGFOGLInitialized", EGLINFO, some_device),
     (r"OGLContextCreated", EGL, lambda peers, _: str(int("failed" not in peers.egl))),
@@ -184,13 +184,13 @@ SOURCES = [
     (r"glgpu\[\d+\]\.extension\[QGF::OGL::(\w+)\]", GLX, glx_extension),
 ]
 
-# Lines that say nothing of OpenGL: the tester, the time, the start of the program's own library, and
+# Lines that aren't about OpenGL: the tester, the time, the start of the program's own library, and
 # OpenCL, which test_opencl.py compares with clinfo.
 NOT_OPENGL = re.compile(r"Tester|assayStart|assayEnd|QGFCoreInitialized|NumCLGPUs|clgpu\[\d+\]\..*")
 
 
 def answers(key, peers):
-    """Who says what: {source: value}."""
+    """The values of a key by source: {source: value}."""
     result = {}
     for pattern, source, ask in SOURCES:
         found = re.fullmatch(pattern, key)
@@ -202,7 +202,8 @@ def answers(key, peers):
 
 
 def differences(facts, peers):
-    """What is wrong with the report: a line for each fact, and each source that says otherwise.
+    """The errors in the report: a line for each value and source that differ, and for each line without
+    a source.
 
     facts: the report's lines as a dictionary. peers: by the index of the device."""
     result = []
@@ -210,11 +211,11 @@ def differences(facts, peers):
         if NOT_OPENGL.fullmatch(key):
             continue
         found = re.match(r"glgpu\[(\d+)\]", key)
-        told = answers(key, peers[int(found[1]) if found else 0])
-        if not told:
-            result.append(f"{key}: nobody to ask")
-        result += [f"{key}={value}, but {source} says {other}"
-                   for source, other in told.items() if other not in (value, OF_THE_LISTS)]
+        known = answers(key, peers[int(found[1]) if found else 0])
+        if not known:
+            result.append(f"{key}: no source")
+        result += [f"{key}={value}, but {source} has {other}"
+                   for source, other in known.items() if other not in (value, OF_THE_LISTS)]
     return result
 
 
@@ -240,7 +241,7 @@ def ask_eglinfo(environment):
 
 @contextlib.contextmanager
 def display():
-    """The name of an X display of its own, or None."""
+    """Starts an X server, and yields the name of its display, or None if there is no Xvfb."""
     if shutil.which("Xvfb") is None:
         yield None
         return
@@ -258,7 +259,7 @@ def display():
 
 
 def ask_glxinfo(environment):
-    """Its words on the compatibility context, or None where it can't be asked."""
+    """The answers of glxinfo for the compatibility context; None if it doesn't work here."""
     if shutil.which("glxinfo") is None:
         return None
     with display() as name:
@@ -296,20 +297,20 @@ def machine(host):
     run = host.run(egl="real")
     assert run.status == 0
     environment = host.environment(egl="real")
-    told = [device for device in ask_egl(environment) if "failed" not in device]
-    told = [device for device in told if not device["software"]] or told
+    usable = [device for device in ask_egl(environment) if "failed" not in device]
+    usable = [device for device in usable if not device["software"]] or usable
     count = int(run.facts["NumGLGPUs"])
-    if count == 0 and not told:
+    if count == 0 and not usable:
         pytest.skip("this machine has no EGL device on which a context can be made")
-    assert count == len(told)
+    assert count == len(usable)
     devices, glx = ask_eglinfo(environment), ask_glxinfo(environment)
     peers = []
     for index in range(count):
-        # The order is that of the adapter lists: of several devices, this is one of that name.
+        # The order is that of the adapter lists, so that devices are matched by name.
         own = [run.facts[f"glgpu[{index}].{key}"] for key in ("GLVendor", "GLRenderer")]
-        at = next((at for at, device in enumerate(told) if own == [
+        at = next((at for at, device in enumerate(usable) if own == [
             f'"{device["strings"][name]}"' for name in ("GL_VENDOR", "GL_RENDERER")]), 0)
-        egl = told.pop(at)
+        egl = usable.pop(at)
         same = glx and glx["strings"].get("renderer") == egl["strings"]["GL_RENDERER"]
         peers.append(Peers(egl, glx if same else None, devices))
     return run.facts, peers
@@ -318,13 +319,13 @@ def machine(host):
 def test_every_opengl_line(machine):
     facts, peers = machine
     assert differences(facts, peers) == []
-    # Fifteen keys, and 43 lines of constants and extensions, each of them compared.
+    # All three checks, fifteen keys, and 43 lines of constants and extensions were compared.
     compared = [key for key in facts if not NOT_OPENGL.fullmatch(key)]
     assert len(compared) == 3 + 15 * len(peers) + 22 + 21 * len(peers)
 
 
-def test_glxinfo_is_asked_too(machine):
-    """It draws by other means on the same driver, and prints each fact of OpenGL's own."""
+def test_glxinfo_is_compared_too(machine):
+    """It uses the same driver through GLX, and prints all values that come from OpenGL alone."""
     facts, peers = machine
     if peers[0].glx is None:
         pytest.skip("glxinfo shows no such driver here (no Xvfb, or no GLX)")
@@ -334,18 +335,18 @@ def test_glxinfo_is_asked_too(machine):
 
 
 def test_a_wrong_value_is_noticed(machine):
-    """Whichever it is, in each of the lines."""
+    """A wrong value in any of the lines is an error."""
     facts, peers = machine
     for key, value in facts.items():
         if not NOT_OPENGL.fullmatch(key) and OF_THE_LISTS not in answers(key, peers[0]).values():
-            told = differences({**facts, key: value[:-1] + "7" + value[-1]}, peers)
-            assert told and all(line.startswith(f"{key}=") for line in told), key
+            errors = differences({**facts, key: value[:-1] + "7" + value[-1]}, peers)
+            assert errors and all(line.startswith(f"{key}=") for line in errors), key
 
 
-def test_a_line_that_nobody_is_asked_about_is_noticed(machine):
+def test_a_line_without_a_source_is_noticed(machine):
     facts, peers = machine
     assert differences({**facts, "glgpu[0].GLNewKey": "1"}, peers) == [
-        "glgpu[0].GLNewKey: nobody to ask"]
+        "glgpu[0].GLNewKey: no source"]
     assert differences({**facts, "glgpu[0].glGetIntegerv[GL_NEW]": "[1]"}, peers) == [
-        "glgpu[0].glGetIntegerv[GL_NEW]: nobody to ask"]
-    assert differences({**facts, "gputag.GL_NEW": "1"}, peers) == ["gputag.GL_NEW: nobody to ask"]
+        "glgpu[0].glGetIntegerv[GL_NEW]: no source"]
+    assert differences({**facts, "gputag.GL_NEW": "1"}, peers) == ["gputag.GL_NEW: no source"]

@@ -1,4 +1,4 @@
-"""scripts/record-adapters: what it records of a machine is that machine, and nobody's in particular."""
+"""scripts/record-adapters: a recording describes the machine, without data that identifies it."""
 
 import os
 import re
@@ -12,7 +12,7 @@ import trees
 
 SCRIPT = Path(__file__).resolve().parents[2] / "scripts" / "record-adapters"
 
-# Damaged by hand, in ways that a recording doesn't keep.
+# "unreadable" was damaged by hand, in ways that a recording doesn't preserve.
 WHOLE = [name for name in trees.NAMES if name != "unreadable"]
 
 
@@ -31,18 +31,18 @@ def test_recording_a_recorded_machine_gives_the_same(tmp_path, name):
     recorded = record(trees.unpack(name, tmp_path / "root"))
     kept = (trees.DATA / name / "tree.txt").read_text(encoding="ascii")
     if name == "hybrid-laptop":
-        # Asking for it would wake the card.
+        # Reading it would wake the card.
         begin = kept.index("information =")
         kept = kept[:begin] + kept[kept.index("@", begin):]
     assert recorded == kept
 
 
-def test_a_damaged_machine_is_recorded_as_far_as_it_goes(tmp_path):
+def test_a_damaged_machine_is_recorded_as_far_as_possible(tmp_path):
     recorded = record(trees.unpack("unreadable", tmp_path / "root"))
     assert "0000:01:00.0" in recorded
 
 
-def test_nothing_tells_whose_machine_it_is(tmp_path):
+def test_nothing_identifies_the_machine(tmp_path):
     root = trees.unpack("nvidia-drm", tmp_path / "root")
     card = "proc/driver/nvidia/gpus/0000:01:00.0"
     device = "sys/bus/pci/devices/0000:01:00.0"
@@ -63,7 +63,7 @@ def test_nothing_tells_whose_machine_it_is(tmp_path):
     assert "0x0000000000000000 0x000000000000ffff 0x0000000000140204" in recorded
 
 
-def test_devices_outside_pci_keep_what_the_device_tree_says_alone(tmp_path):
+def test_devices_outside_pci_keep_only_the_device_trees_lines(tmp_path):
     root = trees.unpack("soc-v3d", tmp_path / "root")
     put(root, "sys/devices/platform/gpu/uevent",
         "DRIVER=vc4-drm\nOF_FULLNAME=/gpu\nOF_COMPATIBLE_0=brcm,bcm2711-vc5\nSERIAL=beef\n")
@@ -72,14 +72,14 @@ def test_devices_outside_pci_keep_what_the_device_tree_says_alone(tmp_path):
     assert "beef" not in recorded and "FULLNAME" not in recorded
 
 
-def test_no_sleeping_card_is_asked(tmp_path):
+def test_no_sleeping_card_is_queried(tmp_path):
     root = trees.unpack("intel-arc-xe", tmp_path / "root")
     assert "renderD128.xe" in record(root)
     put(root, "sys/bus/pci/devices/0000:03:00.0/power/runtime_status", "suspended\n")
     assert "renderD128.xe" not in record(root)
 
 
-def test_it_writes_a_file_that_the_tests_can_unpack(tmp_path, monkeypatch):
+def test_recording_can_be_unpacked(tmp_path, monkeypatch):
     root = trees.unpack("radeon", tmp_path / "root")
     (tmp_path / "again").mkdir()
     assert record(root, tmp_path / "again" / "tree.txt") == ""
@@ -91,7 +91,7 @@ def test_it_writes_a_file_that_the_tests_can_unpack(tmp_path, monkeypatch):
 
 
 def test_this_machine_can_be_recorded():
-    """Whatever it has; the figures are its own."""
+    """The recording has this machine's own data."""
     recorded = record("/")
     assert recorded.startswith("@ ")
     assert f"osrelease = {os.uname().release}" in recorded

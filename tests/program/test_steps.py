@@ -12,9 +12,9 @@ WORKERS = 2
 
 
 def machine(count, folder):
-    """The GPUs of a machine and what the program is run with to find them."""
+    """The GPUs of a machine, the arguments of Host.run for it, and those of predict."""
     if count == 0:
-        # A script without a device: EGL is there and has nothing to offer.
+        # A script without a device: EGL exists and has none.
         return [], {"script": "# nothing\n"}, {"ogl": 0, "context": 0}
     if count == 1:
         gpus = [Gpu()]
@@ -62,13 +62,13 @@ def test_failure_at_every_step(host, tmp_path, count, option):
         expected = predict(gpus, **{field: step}, **checks)
         check(run, expected)
         statuses.append(run.status)
-    # One past the last step nothing fails; before that each step is somebody's failure.
+    # A failure at each step has an effect; one after the last step has none.
     assert statuses == [2] * steps + [0]
 
 
 @pytest.mark.parametrize("option", ["crashAfter", "throwAfter"])
 def test_failure_at_the_opencl_steps(host, tmp_path, option):
-    """The step of the OpenCL enumeration and those behind it."""
+    """The step of the OpenCL enumeration and those after it."""
     gpus, found, checks = machine(1, tmp_path)
     steps = predict(gpus, opencl=0, **checks).steps
     field = {"crashAfter": "crash_after", "throwAfter": "throw_after"}[option]
@@ -85,7 +85,7 @@ def test_crash_wins_over_throw_at_the_same_step(host, tmp_path):
 
 
 def test_throw_before_the_crash(host, tmp_path):
-    """A throw inside a test costs one GPU; the crash threshold then ends the run."""
+    """A throw inside a test ends the tests of one GPU; the crash threshold then ends the run."""
     gpus, found, checks = machine(2, tmp_path)
     run = host.run("-throwAfter=9", "-crashAfter=30", **found)
     check(run, predict(gpus, throw_after=9, crash_after=30, **checks))
@@ -100,7 +100,7 @@ def test_thresholds_that_no_run_reaches(host, tmp_path, value):
           predict(gpus, **checks))
 
 
-def test_no_failure_keeps_the_status_asked_for(host, tmp_path):
+def test_requested_status_without_a_failure(host, tmp_path):
     gpus, found, checks = machine(1, tmp_path)
     check(host.run("-exit=7", **found), predict(gpus, exit_status=7, **checks))
     check(host.run("-exit=7", "-throwAfter=10", **found),

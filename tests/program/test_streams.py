@@ -1,4 +1,4 @@
-"""Standard streams that fail: the run goes on, and its status is what the tests earned."""
+"""Standard streams that fail: the run continues, and its status depends on the tests alone."""
 
 import errno
 import fcntl
@@ -40,7 +40,7 @@ def test_full_device(one, options, status):
 
 
 def test_full_device_with_log_lines(one):
-    """Log lines are lost without a word."""
+    """Log lines are lost without a message."""
     with open("/dev/full", "wb") as full:
         run = one.run("-verbose=1", stdout=full, **one.found)
     assert run.errors == [LOST] * len(predict([one.gpu]).lines)
@@ -65,11 +65,11 @@ def test_reader_that_has_gone(one):
     assert run.status == 0
 
 
-def test_reader_that_goes_in_the_middle(one):
-    """What the reader took is a beginning of the report; each later line is told as lost."""
+def test_reader_that_closes_in_the_middle(one):
+    """The reader gets a beginning of the report; each later line is reported as lost."""
     expected = predict([one.gpu]).lines
     vendor = next(index for index, line in enumerate(expected) if ".GLVendor=" in line)
-    # Time for the reader to go.
+    # Time for the reader to close the pipe.
     script = one.gpu.script() + "at glGetString(GL_VENDOR) sleep 500\n"
     child = one.start(script=script)
     seen = b"".join(child.stdout.readline() for _ in range(vendor))
@@ -83,11 +83,11 @@ def test_reader_that_goes_in_the_middle(one):
 
 
 def test_output_that_fails_for_a_while(one):
-    """A later line is tried afresh, and no lost line turns up behind it."""
+    """Later lines are written again, and no lost line comes after them."""
     expected = predict([one.gpu]).lines
     renderer = next(index for index, line in enumerate(expected) if ".GLRenderer=" in line)
     script = one.fresh_record() + one.gpu.script() + "at glGetString(GL_RENDERER) sleep 800\n"
-    # A pipe that is full and doesn't let the writer wait.
+    # A full pipe in non-blocking mode.
     reader, writer = os.pipe()
     fcntl.fcntl(writer, fcntl.F_SETPIPE_SZ, 4096)
     os.set_blocking(writer, False)
@@ -120,13 +120,13 @@ STOP = "at 1 glGetString(GL_RENDERER) signal 19\n"
 
 
 def wait_until_stopped(child):
-    """Waits for the driver to stop the process, as STOP has it."""
+    """Waits until the driver stops the process by the rule STOP."""
     state = os.waitid(os.P_PID, child.pid, os.WEXITED | os.WSTOPPED | os.WNOWAIT)
     assert state.si_code == os.CLD_STOPPED
 
 
 def rest_of(child):
-    """Lets a stopped child go on, and gives what it then prints on standard error and its status."""
+    """Continues a stopped child, and returns its further standard error and its status."""
     child.send_signal(signal.SIGCONT)
     errors = child.stderr.read()
     child.stderr.close()
@@ -134,8 +134,8 @@ def rest_of(child):
 
 
 @pytest.mark.parametrize("options", [[], ["-verbose=1"]])
-def test_line_that_a_pipe_takes_in_part(one, options):
-    """The next line stands on a line of its own."""
+def test_partial_write_to_a_pipe(one, options):
+    """The next line begins on a line of its own."""
     capacity = 4096
     one.gpu.vendor = "v" * (2 * capacity)
     reader, writer = os.pipe()
@@ -159,11 +159,11 @@ def test_line_that_a_pipe_takes_in_part(one, options):
 
 
 @pytest.mark.parametrize("options", [[], ["-verbose=1"]])
-def test_line_that_a_full_disk_takes_in_part(one, options):
-    """Wherever the cut is, at a line's first byte or its last, the next line stands on its own."""
+def test_partial_write_to_a_full_disk(one, options):
+    """Wherever the line is cut, at its first byte or its last, the next one begins on its own line."""
     whole = predict([one.gpu]).lines
     first = len(Run(0, one.run(*options, **one.found).out, b"").out.split(b"\n")[0])
-    told = next(index for index, line in enumerate(whole) if ".GLRenderer=" in line)
+    after = next(index for index, line in enumerate(whole) if ".GLRenderer=" in line)
     for limit in [*range(first - 1, first + 4), *range(120, 340, 23)]:
         with tempfile.TemporaryFile() as file:
             child = one.start(*options, script=one.gpu.script() + STOP, stdout=file,
@@ -178,7 +178,7 @@ def test_line_that_a_full_disk_takes_in_part(one, options):
         lines = Run(status, out, errors).lines
         facts = [line for line in lines if line and not line.startswith("#")]
         assert "" not in lines, limit
-        assert facts[-len(whole[told:]):] == whole[told:], limit
+        assert facts[-len(whole[after:]):] == whole[after:], limit
         assert (out[limit - 1:limit] == b"\n") != (out[limit:limit + 1] == b"\n"), limit
         assert status == 0
 
@@ -191,7 +191,7 @@ def closed(*descriptors):
 
 
 def test_closed_stdout(one):
-    """Nothing that the run opens takes the place of the closed stream."""
+    """No file that the run opens gets the number of the closed stream."""
     script = one.fresh_record() + one.gpu.script()
     run = one.run(script=script, stdout=None, before=closed(1))
     assert run.errors == [LOST] * len(predict([one.gpu]).lines)
@@ -233,7 +233,7 @@ def test_both_streams_full(one):
 
 
 def test_every_line_is_flushed_on_its_own(one):
-    """A host sees each line before the next probe begins."""
+    """A host receives each line before the next test begins."""
     script = one.gpu.script() + "at glGetString(GL_VENDOR) hang\n"
     child = one.start(script=script)
     try:
@@ -253,7 +253,7 @@ def test_every_line_is_flushed_on_its_own(one):
 
 
 def test_every_line_is_one_write(one):
-    """A packet pipe keeps writes apart: what dies between two of them leaves no half line."""
+    """A packet pipe keeps writes apart: a crash between two of them leaves no partial line."""
     reader, writer = os.pipe2(os.O_DIRECT)
     fcntl.fcntl(writer, fcntl.F_SETPIPE_SZ, 1 << 20)  # a page for each packet
     try:
@@ -273,7 +273,7 @@ def test_every_line_is_one_write(one):
 
 
 def test_file_size_limit(one):
-    """What fits is there to the byte; each line beyond it is told as lost."""
+    """The file is filled to the last byte; each line beyond the limit is reported as lost."""
     limit = 500
     whole = b"".join(line.encode() + b"\n" for line in predict([one.gpu]).lines)
     with tempfile.TemporaryFile() as file:
@@ -288,7 +288,7 @@ def test_file_size_limit(one):
     assert run.status == 7
 
 
-# Runs its arguments as a background job of a terminal that stops such jobs when they write to it.
+# Runs its arguments as a background job of a terminal that stops jobs that write in the background.
 BACKGROUND = """
 import fcntl, os, subprocess, sys, termios
 fcntl.ioctl(0, termios.TIOCSCTTY, 0)
@@ -308,7 +308,7 @@ sys.exit(job.wait())
 
 
 def test_background_of_a_terminal(one):
-    """A terminal that stops background jobs that write to it doesn't stop this one."""
+    """A terminal that stops jobs that write in the background doesn't stop this one."""
     main, terminal = pty.openpty()
     leader = subprocess.Popen([sys.executable, "-c", BACKGROUND, PROGRAM, "-exit=7"],
                               stdin=terminal, stdout=terminal, stderr=subprocess.PIPE,
@@ -318,7 +318,7 @@ def test_background_of_a_terminal(one):
     try:
         while piece := os.read(main, 4096):
             out += piece
-    except OSError as error:  # the terminal's last user has gone
+    except OSError as error:  # the terminal is closed
         assert error.errno == errno.EIO
     errors = leader.communicate(timeout=30)[1]
     os.close(main)
@@ -326,7 +326,7 @@ def test_background_of_a_terminal(one):
 
 
 def test_signals_blocked_and_ignored_on_entry(one):
-    """A driver's raised signal is a crash, whoever ignored it before."""
+    """A signal that a driver raises is a crash, even if it was ignored at the start."""
     def ignore():
         signal.signal(signal.SIGBUS, signal.SIG_IGN)
         signal.pthread_sigmask(signal.SIG_BLOCK, signal.valid_signals())
@@ -339,10 +339,10 @@ def test_signals_blocked_and_ignored_on_entry(one):
 
 
 def test_core_limit(one):
-    """The limit that the kernel takes for "no dump", also to a crash reporter."""
-    most = resource.getrlimit(resource.RLIMIT_CORE)[1]
+    """The soft limit is 1, at which the kernel neither dumps nor starts a crash reporter."""
+    hard = resource.getrlimit(resource.RLIMIT_CORE)[1]
     child = one.start(script=one.gpu.script() + "at glGetString(GL_VENDOR) hang\n",
-                      before=lambda: resource.setrlimit(resource.RLIMIT_CORE, (most, most)))
+                      before=lambda: resource.setrlimit(resource.RLIMIT_CORE, (hard, hard)))
     try:
         assert child.stdout.readline()
         limits = Path(f"/proc/{child.pid}/limits").read_text(encoding="ascii")

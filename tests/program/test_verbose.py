@@ -24,13 +24,13 @@ def test_only_comments_are_added(host, tmp_path, verbosity, count, opencl):
         found["root"] = tmp_path / "root"
     found.update(script=script_of(gpus), opencl=opencl)
     silent = host.run("-verbose=0", **found)
-    talking = host.run(f"-verbose={verbosity}", **found)
+    verbose = host.run(f"-verbose={verbosity}", **found)
     assert silent.comments == []
-    assert len(talking.comments) > count
-    assert "".join(f"{line}\n" for line in talking.lines if not line.startswith("# ")) \
+    assert len(verbose.comments) > count
+    assert "".join(f"{line}\n" for line in verbose.lines if not line.startswith("# ")) \
         == silent.report
-    assert talking.status == silent.status == 0
-    assert talking.err == silent.err == b""
+    assert verbose.status == silent.status == 0
+    assert verbose.err == silent.err == b""
 
 
 def test_form_of_comments(host):
@@ -43,40 +43,40 @@ def test_form_of_comments(host):
     assert len({re.search(r"\[tid=(\w+)\]", line)[1] for line in run.comments}) == 1
 
 
-def test_last_resort_is_told(host):
+def test_last_resort_is_logged(host):
     run = host.run("-verbose=1", script=Gpu().script())
     assert any(line.endswith(
         "] successful context creation but no matching WMI or DXGI devices found")
         for line in run.comments)
 
 
-def test_enumeration_is_told_in_order(host):
+def test_enumeration_is_logged_in_order(host):
     run = host.run("-verbose=1", script=Gpu().script())
-    told = [PREFIX.sub("", line) for line in run.comments]
+    messages = [PREFIX.sub("", line) for line in run.comments]
     wanted = ["wmiNumDevices=", "dxgiNumDevices=", "qgfNumDevices=1", "qgfDeviceIndex=0",
               "creating ContextOffscreen for ", "qgfDevice[0]=", "qgfNumContexts=1"]
-    positions = [next(index for index, line in enumerate(told) if line.startswith(text))
+    positions = [next(index for index, line in enumerate(messages) if line.startswith(text))
                  for text in wanted]
     assert positions == sorted(positions)
 
 
-def test_failures_are_told(host):
+def test_failures_are_logged(host):
     gpu = Gpu()
     script = gpu.script() + "integer GL_MAX_RECTANGLE_TEXTURE_SIZE_ARB unknown\n"
     silent = host.run(script=script)
     check(silent, predict([gpu], failing={(0, "GLRectTextureSize"): GL_ERROR}))
-    talking = host.run("-verbose=1", script=script)
-    assert talking.err == silent.err
-    told = [PREFIX.sub("", line) for line in talking.comments]
-    assert "GPUImplHardware::DoGLGetIntegerv(34040): glGetError() returns 1280" in told
-    assert "Testing terminated for glgpu[0]" in told
+    verbose = host.run("-verbose=1", script=script)
+    assert verbose.err == silent.err
+    messages = [PREFIX.sub("", line) for line in verbose.comments]
+    assert "GPUImplHardware::DoGLGetIntegerv(34040): glGetError() returns 1280" in messages
+    assert "Testing terminated for glgpu[0]" in messages
 
 
-def test_failed_checks_are_told(host):
+def test_failed_checks_are_logged(host):
     run = host.run("-verbose=1", script="# no device\n")
-    told = [PREFIX.sub("", line) for line in run.comments]
-    assert any(line.startswith("QGF::OGL::Library::initialize() failed: ") for line in told)
-    assert any(line.startswith("Cannot create default ContextOffscreen: ") for line in told)
-    assert "qgfNumDevices=0" in told
-    assert "qgfNumContexts=0" in told
-    assert not any("no matching WMI or DXGI" in line for line in told)
+    messages = [PREFIX.sub("", line) for line in run.comments]
+    assert any(line.startswith("QGF::OGL::Library::initialize() failed: ") for line in messages)
+    assert any(line.startswith("Cannot create default ContextOffscreen: ") for line in messages)
+    assert "qgfNumDevices=0" in messages
+    assert "qgfNumContexts=0" in messages
+    assert not any("no matching WMI or DXGI" in line for line in messages)

@@ -1,7 +1,7 @@
-"""The Windows program under Wine, as a host sees it.
+"""Runs the Windows program under Wine, like a host.
 
-The tests share what the Linux ones know of reports. Whatever Wine offers is the machine: WMI and
-DXGI, WGL on Mesa, OpenCL.dll over the Linux drivers.
+The tests share the model of reports with the Linux tests. Wine provides the machine: WMI and DXGI, WGL
+on Mesa, OpenCL.dll on the Linux drivers.
 """
 
 import contextlib
@@ -29,10 +29,10 @@ NO_OPENCL_PLATFORM = {"OCL_ICD_VENDORS": "/nonexistent"}
 
 
 def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, cwd=None, **variables):
-    """Runs the program to its end; text mode's line ends come back as plain newlines.
+    """Runs the program to its end. Converts line ends to newlines.
 
-    Once in some hundred times Wine doesn't get as far as the program, and ends with the status 1 and
-    no word of the program: then it is tried again."""
+    Wine fails before it starts the program about once in some hundred runs, with the status 1 and no
+    output of the program: then it is run again."""
     for _ in range(3):
         done = subprocess.run([TREE / "scripts" / "run-under-wine", program, *arguments],
                               stdin=subprocess.DEVNULL, stdout=stdout, stderr=subprocess.PIPE,
@@ -46,20 +46,20 @@ def run_under_wine(*arguments, stdout=subprocess.PIPE, program=PROGRAM, cwd=None
 
 
 def is_noise(line):
-    """What the virtual display and Wine itself say."""
+    """Whether the line is a message of the virtual display or of Wine itself."""
     return line.startswith((b"X connection", b"Authorization required", b"wine:", b"MESA"))
 
 
 @contextlib.contextmanager
 def wine_desktop(**variables):
-    """Keeps Wine's desktop process alive, which takes seconds to start: one that a program under
-    test starts would hold the streams of whoever started that, and outlive it."""
+    """Keeps Wine's desktop process alive. It takes seconds to start, and if a program under test started
+    it, it would hold the test's streams open and outlive the program."""
     wine = TREE / "scripts" / "run-under-wine"
     options = {"stdin": subprocess.DEVNULL, "stdout": subprocess.DEVNULL,
                "stderr": subprocess.DEVNULL, "env": {**os.environ, **variables}}
     with subprocess.Popen([wine, "C:\\windows\\system32\\notepad.exe"], **options) as window:
         try:
-            # It needs a window, and so it waits for the desktop.
+            # The program creates a window, so that it waits for the desktop.
             subprocess.run([wine, PROGRAM], timeout=SECONDS, check=False,
                            **{**options, "env": {**options["env"], **NO_OPENCL_PLATFORM}})
             yield
@@ -82,7 +82,7 @@ def own_prefix(tmp_path_factory):
 
 
 def gpu_of(run):
-    """The device that a report tells of, for the prediction of other runs on it."""
+    """The device of a report, for the prediction of other runs."""
     facts = run.facts
 
     def text(key):
@@ -105,10 +105,10 @@ def gpu_of(run):
 
 @pytest.fixture(scope="session")
 def whole_run():
-    """One run with nothing asked for and no OpenCL platform."""
+    """A run without options and without an OpenCL platform."""
     return run_under_wine(**NO_OPENCL_PLATFORM)
 
 
 def pytest_collection_modifyitems():
     if not PROGRAM.exists():
-        raise pytest.UsageError(f"{PROGRAM} isn't there: build first, or set ASSAY_BUILD_DIR")
+        raise pytest.UsageError(f"{PROGRAM} doesn't exist: build first, or set ASSAY_BUILD_DIR")

@@ -1,10 +1,10 @@
-"""Which tests of Linux don't run under Wine, and why; each shows as skipped."""
+"""The tests of Linux that don't run under Wine, shown as skipped with the reasons."""
 
 import pytest
 
 from conftest import TREE
 
-# A program test of Linux and the ones that stand for it here, or why there are none.
+# The program tests of Linux with their counterparts here, and those without one by reason.
 COUNTERPARTS = {
     "test_command_line": "test_windows_command_line",
     "test_host_end": "test_windows_host",

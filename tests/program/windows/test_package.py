@@ -1,4 +1,4 @@
-"""The zip for people who don't build."""
+"""The zip of the Windows programs."""
 
 import os
 import re
@@ -14,7 +14,7 @@ from harness import text_of
 
 
 def pack(tmp_path, **variables):
-    """Packs, and unpacks the programs; what the script said comes with the folder."""
+    """Makes the zip and unpacks it. Returns its folder and the script's messages."""
     done = subprocess.run([TREE / "scripts" / "package", "windows", "--as-built"],
                           stderr=subprocess.PIPE, text=True, check=True,
                           env={**os.environ, **variables})
@@ -26,17 +26,17 @@ def pack(tmp_path, **variables):
 
 @pytest.fixture(scope="module")
 def package(tmp_path_factory):
-    """The unpacked zip's one folder."""
+    """The folder of the unpacked zip."""
     if BUILD != TREE / "build" / "windows":
         pytest.skip("the zip is made of build/windows")
     return pack(tmp_path_factory.mktemp("unpacked"))[0]
 
 
-def test_name_tells_version_and_machine(package):
+def test_name_has_version_and_machine(package):
     assert re.fullmatch(r"assay-\d+\.\d+\.\d+-windows-x86_64", package.name)
 
 
-def test_holds_programs_and_what_to_read(package):
+def test_has_programs_documents_and_licences(package):
     assert {path.name for path in package.iterdir()} == {
         "assay.exe", "assay-host.exe", "README.md", "docs", "schema", "licences", "check.cmd",
         "check"}
@@ -52,12 +52,12 @@ def test_runs_in_an_empty_prefix(package, tmp_path):
     assert run.lines[-1] == 'assayEnd="STAMP"'
 
 
-def test_holds_no_symbols_and_debug_sections(package):
+def test_has_no_symbols_and_debug_sections(package):
     programs = sorted(package.rglob("*.exe"))
     assert len(programs) > 2
     for program in programs:
         image = pefile.PE(str(program), fast_load=True)
-        # A name of more than 8 characters, as ".debug_info", stands elsewhere: "/4".
+        # A name of more than 8 characters, such as ".debug_info", is a reference: "/4".
         names = [section.Name.rstrip(b"\0") for section in image.sections]
         assert b".text" in names
         assert not [name for name in names if name.startswith((b"/", b".debug"))]
@@ -65,7 +65,7 @@ def test_holds_no_symbols_and_debug_sections(package):
 
 
 def test_check_script(package):
-    """The part that needs no minutes; the unit tests that the whole one runs are there too."""
+    """The quick part of the script passes, and the unit tests for the whole of it are included."""
     run = run_under_wine("/c", "check.cmd", "quick", program="cmd.exe", cwd=package,
                          **NO_OPENCL_PLATFORM)
     assert run.status == 0, text_of(run.out)
@@ -79,7 +79,7 @@ def test_check_script(package):
         path.name for path in (package / "check").iterdir()}
 
 
-def test_check_script_tells_what_fails(package, tmp_path):
+def test_check_script_names_what_fails(package, tmp_path):
     broken = tmp_path / "broken"
     shutil.copytree(package, broken)
     shutil.copy(broken / "check" / "test_child.exe", broken / "assay.exe")
@@ -91,7 +91,7 @@ def test_check_script_tells_what_fails(package, tmp_path):
 
 
 def test_signature(package, tmp_path_factory):
-    """With a certificate each program is signed with it, without one the script says so."""
+    """With a certificate every program is signed; without one the script reports it."""
     folder = tmp_path_factory.mktemp("certificate")
     key, certificate, both, password = [folder / name for name in
                                         ("key.pem", "certificate.pem", "both.p12", "password")]
@@ -101,14 +101,14 @@ def test_signature(package, tmp_path_factory):
                     "-out", certificate], stderr=subprocess.DEVNULL, check=True)
     subprocess.run(["openssl", "pkcs12", "-export", "-inkey", key, "-in", certificate, "-out", both,
                     "-passout", f"file:{password}"], check=True)
-    signed, said = pack(tmp_path_factory.mktemp("signed"), ASSAY_SIGN_CERTIFICATE=str(both),
+    signed, messages = pack(tmp_path_factory.mktemp("signed"), ASSAY_SIGN_CERTIFICATE=str(both),
                         ASSAY_SIGN_PASSWORD_FILE=str(password))
-    assert "Not signed" not in said
+    assert "Not signed" not in messages
     for program in signed.rglob("*.exe"):
         subprocess.run(["osslsigncode", "verify", "-CAfile", certificate, "-in", program],
                        stdout=subprocess.DEVNULL, check=True)
-    _, said = pack(tmp_path_factory.mktemp("unsigned"))
-    assert "Not signed: ASSAY_SIGN_CERTIFICATE names no certificate" in said
+    _, messages = pack(tmp_path_factory.mktemp("unsigned"))
+    assert "Not signed: ASSAY_SIGN_CERTIFICATE names no certificate" in messages
     unsigned = subprocess.run(["osslsigncode", "verify", "-in", package / "assay.exe"],
                               stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL, check=False)
     assert unsigned.returncode != 0

@@ -10,8 +10,8 @@ from model import KEYS, check, predict
 
 
 def test_report(whole_run):
-    """Wine's display device has a name of its own, so no adapter matches it and the last resort
-    gives one device without name, ids or driver."""
+    """Wine's display device has a name of its own, so that no adapter matches it, and the last resort
+    reports one device without name, ids or driver."""
     assert whole_run.status == 0
     assert whole_run.errors == []
     facts = whole_run.facts
@@ -63,7 +63,7 @@ def test_failure_at_every_step(whole_run, option, field):
 
 
 def test_no_display():
-    """No window, hence no context, and no adapter drives a display: zeros, and no crash."""
+    """Without a window there is no context, and no adapter drives a display: the report has zeros."""
     run = run_under_wine(DISPLAY=":4711", **NO_OPENCL_PLATFORM)
     assert run.status == 0
     assert run.lines == predict([], opencl=0, context=0).lines
@@ -72,7 +72,7 @@ def test_no_display():
 
 
 def test_no_wmi():
-    """Without the service's library the list is empty, the log says why, and the run goes on."""
+    """Without the service's library the list is empty, the log has the reason, and the run continues."""
     run = run_under_wine("-verbose=1", WINEDLLOVERRIDES="mscoree,mshtml,wbemprox=",
                          **NO_OPENCL_PLATFORM)
     assert run.status == 0
@@ -83,7 +83,7 @@ def test_no_wmi():
 
 
 def test_reader_that_has_gone(whole_run):
-    """A pipe whose reader has gone costs the lines and not the run."""
+    """A pipe without a reader loses the lines; the run continues."""
     command = (f"'{PROGRAM.parents[3]}/scripts/run-under-wine' '{PROGRAM}'; "
                f"echo status $? >&2")
     done = subprocess.run(["bash", "-c", f"({command}) | (exec 0<&-; sleep 1)"],

@@ -1,4 +1,4 @@
-"""The command line under Wine: what holds on Linux holds here."""
+"""The command line under Wine: the same as on Linux."""
 
 import pytest
 
@@ -6,7 +6,7 @@ from conftest import NO_OPENCL_PLATFORM, gpu_of, run_under_wine
 from model import check, predict
 from test_command_line import MALFORMED, STATUSES, TEXTS, THRESHOLDS, USAGE
 
-# Beyond ASCII it is the process's code page that decides what text arrives.
+# Other characters depend on the code page of the process.
 
 
 def is_ascii(argument):
@@ -32,7 +32,7 @@ def test_text_options_print_in_order():
     assert run.errors == ["d", *USAGE]
 
 
-def is_nought(value):
+def is_zero(value):
     try:
         return int(value, 0) == 0
     except ValueError:
@@ -41,14 +41,13 @@ def is_nought(value):
 
 @pytest.mark.parametrize("value, status", STATUSES)
 def test_exit_status(value, status):
-    """The status that a Linux parent of Wine sees is cut to 8 bits, but stays a failure if it was
-    one."""
-    if status == 0 and not is_nought(value):
+    """A Linux parent of Wine sees the low 8 bits of the status, and 1 instead of 0 for a nonzero one."""
+    if status == 0 and not is_zero(value):
         status = 1
     assert run_under_wine(f"-exit={value}", **NO_OPENCL_PLATFORM).status == status
 
 
-def test_failure_wins_over_the_status_asked_for():
+def test_failure_replaces_the_requested_status():
     assert run_under_wine("-exit=7", "-throwAfter=10", **NO_OPENCL_PLATFORM).status == 2
 
 

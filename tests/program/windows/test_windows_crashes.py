@@ -1,6 +1,6 @@
-"""A driver that takes assay.exe down from within: bare, and as assay-host.exe judges it.
+"""A driver that ends assay.exe in various ways: without and with assay-host.exe.
 
-The driver is a real OpenCL.dll, in the system's folder of a prefix of these tests' own.
+The driver is a real OpenCL.dll in the system's folder of a separate prefix.
 """
 
 import json
@@ -13,7 +13,7 @@ from conftest import BUILD, run_under_wine
 DRIVER = BUILD / "drivers" / "opencl" / "OpenCL.dll"
 HOST = BUILD / "bin" / "assay-host.exe"
 
-# What the driver does, the code that the process ends with, and the host's verdict.
+# The driver's action, the exit code of the process, and the host's verdict.
 ENDS = [
     ("access-violation", 0xC0000005, "crashed"),
     ("abort", 0xC0000409, "crashed"),
@@ -59,7 +59,7 @@ def test_judged(prefix, how, code, verdict):
         assert outcome["termination"] == f"code 0x{code:08X}"
 
 
-def test_hang_is_no_crash(prefix):
+def test_hang(prefix):
     run = run_under_wine("run", "--format", "json", "--timeout", "20", program=HOST,
                          ASSAY_MISBEHAVE="hang", **prefix)
     outcome = json.loads(run.out)["outcome"]

@@ -23,14 +23,14 @@ from validate import report_bytes, validate_document, validate_events  # noqa: E
 HOST = BUILD / "bin" / "assay-host.exe"
 CHILD = BUILD / "bin" / "test_child.exe"
 REPORT = ["out", 'assayStart="x"', "out", 'assayEnd="y"']
-# Wine's own start is in it.
+# Includes the start of Wine, in seconds.
 SLACK = 4.0
 TIMEOUT = 2.0
 
 
 @pytest.fixture(autouse=True, scope="module")
 def desktop():
-    """One that a child needs first would be among the child's descendants, and be ended with it."""
+    """A desktop that a child started would be its descendant, and be killed with it."""
     with wine_desktop():
         yield
 
@@ -83,7 +83,7 @@ def test_ends_of_assay(options, verdict):
     assert document["outcome"]["verdict"] == verdict
 
 
-def test_options_reach_assay_as_they_are():
+def test_options_reach_assay_unchanged():
     texts = ["a\\", 'a"b', "\u00e9\u65e5\U0001F600", "%PATH%^", " ", "tab\tand \\\" both\\\\"]
     document = document_of(host_run("run", "--format", "json", "--", "-exit=5",
                                     *[f"-stdout={text}" for text in texts]))
@@ -158,7 +158,7 @@ def test_output_file(tmp_path):
 
 
 class Running:
-    """assay-host.exe at work, with a child that can be told from all others."""
+    """A running assay-host.exe, with a child that has a unique argument."""
 
     def __init__(self, *words, options=(), **streams):
         self.word = str(random.randrange(10**8, 2 * 10**9)) # how long the child sleeps
@@ -168,7 +168,7 @@ class Running:
             env={**os.environ, **NO_OPENCL_PLATFORM}, **streams)
 
     def numbers(self, of_host):
-        """Of the Windows processes; Wine's are those whose program is a loader of its."""
+        """The ids of the Windows processes: those whose executable is Wine's loader."""
         found = []
         for folder in Path("/proc").iterdir():
             try:
@@ -197,14 +197,14 @@ class Running:
 
 
 def test_reader_that_does_not_read():
-    """The child's time runs out all the same."""
+    """The child is still killed in time."""
     read, write = os.pipe()
     with Running("flood", "300000", options=["--format", "jsonl", "--timeout", "3"],
                  stdout=write) as running:
         os.close(write)
         running.until_child(there=True)
         running.until_child(there=False)
-        assert running.process.poll() is None # it still wants to be read
+        assert running.process.poll() is None # it still waits for the reader
         with os.fdopen(read, "rb") as reader:
             data = reader.read()
         assert running.process.wait(60) == 4
@@ -212,7 +212,7 @@ def test_reader_that_does_not_read():
 
 
 def test_killed_host():
-    """The job takes the child with it."""
+    """The job kills the child too."""
     with Running(options=["--timeout", "600"], stdout=subprocess.DEVNULL) as running:
         running.until_child(there=True)
         for number in running.numbers(of_host=True):
@@ -239,7 +239,7 @@ def test_torture_with_opencl():
     assert run.status == 0, text_of(run.out)
 
 
-# Wine hands OpenCL calls on to Linux drivers, so the scripted one is that of the Linux build.
+# Wine passes OpenCL calls on to Linux drivers, so that the scripted one is that of the Linux build.
 DRIVER = BUILD.parent / "linux" / "drivers" / "opencl"
 
 

@@ -1,4 +1,4 @@
-"""Which libraries the programs take, and from where: the system's folder alone."""
+"""The programs load libraries only from the system's folder."""
 
 import os
 import shutil
@@ -15,9 +15,9 @@ LOADED = "planted library loaded"
 # Wine's own libraries come last, as Windows has no such choice.
 NATIVE_FIRST = "mscoree,mshtml=;opencl,opengl32,dxgi=n,b"
 
-# Those that Windows maps at its start and gives to every program, whatever lies where it searches
-# (HKLM\SYSTEM\CurrentControlSet\Control\Session Manager\KnownDLLs of Windows 10 and 11), and what
-# is mapped into every process before any search.
+# Libraries that Windows maps at its start and loads from there, never by a search
+# (HKLM\SYSTEM\CurrentControlSet\Control\Session Manager\KnownDLLs of Windows 10 and 11), and those
+# mapped into every process before any search.
 KNOWN = {"advapi32.dll", "combase.dll", "gdi32.dll", "kernel32.dll", "msvcrt.dll", "ole32.dll",
          "oleaut32.dll", "rpcrt4.dll", "sechost.dll", "shell32.dll", "shlwapi.dll", "user32.dll",
          "ws2_32.dll", "ntdll.dll"}
@@ -42,8 +42,8 @@ def plant(folder):
         shutil.copy(PLANTED, folder / name)
 
 
-def test_planted_library_would_tell(tmp_path):
-    """What the tests below look for is what a library that is loaded says."""
+def test_planted_library_prints_its_message(tmp_path):
+    """A planted library prints the message that the tests below look for when it is loaded."""
     plant(tmp_path)
     for name in NAMES:
         done = subprocess.run([TREE / "scripts" / "run-under-wine", "rundll32.exe",
@@ -69,7 +69,7 @@ def test_program_folder_is_not_searched(tmp_path):
 
 @pytest.mark.parametrize("place", ["current", "path"])
 def test_nothing_else_is_searched_for_what_the_system_lacks(own_prefix, tmp_path, place):
-    """These places come after the system's folder, so they are asked for what that hasn't got."""
+    """These places would be searched after the system's folder, for a library that it lacks."""
     plant(tmp_path)
     (own_prefix / "drive_c" / "windows" / "system32" / "opencl.dll").unlink(missing_ok=True)
     run = run_under_wine(cwd=tmp_path if place == "current" else None,
@@ -80,7 +80,7 @@ def test_nothing_else_is_searched_for_what_the_system_lacks(own_prefix, tmp_path
 
 
 def test_no_opengl_library():
-    """Without opengl32.dll, and so without Wine's dxgi.dll, the program tells that there is none."""
+    """Without opengl32.dll, and so without Wine's dxgi.dll, the program reports no OpenGL."""
     run = run_under_wine(WINEDLLOVERRIDES="mscoree,mshtml,opengl32,dxgi=", **NO_OPENCL_PLATFORM)
     assert run.status == 0
     assert run.facts["QGFOGLInitialized"] == "0"

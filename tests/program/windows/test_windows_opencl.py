@@ -1,4 +1,4 @@
-"""OpenCL under Wine: OpenCL.dll over the Linux drivers, a real one and the scripted one."""
+"""OpenCL under Wine: OpenCL.dll with the Linux drivers, a real one and the scripted one."""
 
 import pytest
 
@@ -6,7 +6,7 @@ from clmodel import ClGpu, ClPlatform, cl_script_of, cl_values_of
 from conftest import BUILD, OPENCL_GPU, gpu_of, run_under_wine
 from model import check, predict
 
-# Wine hands OpenCL calls on to Linux drivers, so the scripted one is that of the Linux build.
+# Wine passes OpenCL calls on to Linux drivers, so that the scripted one is that of the Linux build.
 DRIVER = BUILD.parent / "linux" / "drivers" / "opencl"
 
 
@@ -46,7 +46,7 @@ def test_whole_report_with_opencl():
 
 
 def test_no_opencl_library():
-    """Wine finds no OpenCL.dll where it is overridden away: no OpenCL line at all."""
+    """With OpenCL.dll overridden, Wine finds none: no OpenCL line at all."""
     run = run_under_wine(WINEDLLOVERRIDES="mscoree,mshtml,opencl=")
     assert run.status == 0
     assert not [line for line in run.lines if "CL" in line.split("=")[0] and "CLGPU" in line]
@@ -62,7 +62,7 @@ def test_failure_at_every_step_of_two_scripted_devices(whole_run, scripted, opti
     first = predict([gpu], opencl=0).steps - 2
     steps = predict([gpu], opencl=values).steps
     assert steps - first == 26
-    # The steps before are those of a machine without OpenCL.
+    # The earlier steps are those of a machine without OpenCL.
     for step in range(first, steps + 1):
         check(scripted(platforms, f"-{option}={step}"),
               predict([gpu], opencl=values, **{field: step}))
@@ -77,7 +77,7 @@ def test_bandwidth_of_scripted_counters(scripted, batch, bandwidth):
 
 @pytest.mark.parametrize("call", ["clCreateContext", "clEnqueueCopyBuffer", "clBuildProgram"])
 def test_crash_in_a_linux_driver_is_a_failing_call(scripted, call):
-    """Wine survives what happens on the Linux side, and the call comes back with an error."""
+    """Wine survives a crash on the Linux side, and the call returns an error."""
     run = scripted([ClPlatform([ClGpu()])], extra=f"at {call} crash\n")
     assert run.status == 2
     assert run.errors == ["Failed requirement: ciErrNum == CL_SUCCESS",
@@ -85,7 +85,7 @@ def test_crash_in_a_linux_driver_is_a_failing_call(scripted, call):
     assert run.lines[-1] == 'assayEnd="STAMP"'
 
 
-def test_driver_that_aborts_takes_down_the_child_alone(scripted):
+def test_driver_that_aborts_ends_the_child(scripted):
     run = scripted([ClPlatform([ClGpu()])], extra="at clBuildProgram abort\n")
     assert run.status not in (0, 2, 3, 4)
     assert run.lines[-1].startswith("clgpu[0].CLBandwidth=")

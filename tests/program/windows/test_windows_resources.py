@@ -1,4 +1,4 @@
-"""What Windows reads in the programs before it runs them."""
+"""The resources and headers of the Windows programs."""
 
 import re
 from xml.etree import ElementTree
