@@ -2,40 +2,16 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <iterator>
 
+#include <boost/nowide/utf/utf.hpp>
 #include <fmt/format.h>
 
 namespace assay_host {
 
 namespace {
 
-// The well-formed byte sequences of UTF-8 (Unicode Standard, table 3-7): the ranges of the first
-// and the second byte. The other bytes are 80 to BF.
-struct Form {
-    unsigned char fFirstLow;
-    unsigned char fFirstHigh;
-    unsigned char fSize;
-    unsigned char fSecondLow;
-    unsigned char fSecondHigh;
-    unsigned char fFirstBits;
-};
-constexpr Form kForms[] = {
-    {0x00, 0x7F, 1, 0x00, 0x00, 0x7F}, {0xC2, 0xDF, 2, 0x80, 0xBF, 0x1F},
-    {0xE0, 0xE0, 3, 0xA0, 0xBF, 0x0F}, {0xE1, 0xEC, 3, 0x80, 0xBF, 0x0F},
-    {0xED, 0xED, 3, 0x80, 0x9F, 0x0F}, {0xEE, 0xEF, 3, 0x80, 0xBF, 0x0F},
-    {0xF0, 0xF0, 4, 0x90, 0xBF, 0x07}, {0xF1, 0xF3, 4, 0x80, 0xBF, 0x07},
-    {0xF4, 0xF4, 4, 0x80, 0x8F, 0x07},
-};
-
-unsigned char Byte(std::string_view bytes, std::size_t at)
-{
-    return static_cast<unsigned char>(bytes[at]);
-}
-
-bool IsIn(unsigned char byte, unsigned char low, unsigned char high)
-{
-    return byte >= low && byte <= high;
-}
+using Utf8 = boost::nowide::utf::utf_traits<char>;
 
 // Control characters, and format characters that change the direction of writing or are invisible.
 bool IsControl(char32_t code)
@@ -73,46 +49,17 @@ std::string ShowControl(char32_t code)
 
 Character ReadCharacter(std::string_view bytes)
 {
-    if (bytes.empty())
+    using namespace boost::nowide::utf;
+    const char* at = bytes.data();
+    const code_point code = Utf8::decode(at, at + bytes.size());
+    if (code == illegal || code == incomplete)
         return {};
-    const unsigned char first = Byte(bytes, 0);
-    for (const Form& form : kForms) {
-        if (!IsIn(first, form.fFirstLow, form.fFirstHigh))
-            continue;
-        if (bytes.size() < form.fSize)
-            return {};
-        auto code = static_cast<char32_t>(first & form.fFirstBits);
-        for (std::size_t at = 1; at < form.fSize; ++at) {
-            const unsigned char low = at == 1 ? form.fSecondLow : 0x80;
-            const unsigned char high = at == 1 ? form.fSecondHigh : 0xBF;
-            if (!IsIn(Byte(bytes, at), low, high))
-                return {};
-            code = code << 6 | (Byte(bytes, at) & 0x3FU);
-        }
-        return {code, form.fSize};
-    }
-    return {};
+    return {code, static_cast<std::size_t>(at - bytes.data())};
 }
 
 void AppendCharacter(std::string& text, char32_t code)
 {
-    const auto append = [&text](char32_t byte) { text += static_cast<char>(byte & 0xFF); };
-    if (code < 0x80) {
-        append(code);
-        return;
-    }
-    if (code < 0x800) {
-        append(0xC0 | code >> 6);
-    } else {
-        if (code < 0x10000) {
-            append(0xE0 | code >> 12);
-        } else {
-            append(0xF0 | code >> 18);
-            append(0x80 | (code >> 12 & 0x3F));
-        }
-        append(0x80 | (code >> 6 & 0x3F));
-    }
-    append(0x80 | (code & 0x3F));
+    Utf8::encode(code, std::back_inserter(text));
 }
 
 std::string ShowBytes(std::string_view bytes)
@@ -122,7 +69,7 @@ std::string ShowBytes(std::string_view bytes)
         const Character character = ReadCharacter(bytes);
         const std::size_t size = std::max<std::size_t>(character.fSize, 1);
         if (character.fSize == 0)
-            text += fmt::format("\\x{:02X}", Byte(bytes, 0));
+            text += fmt::format("\\x{:02X}", static_cast<unsigned char>(bytes[0]));
         else if (IsControl(character.fCode))
             text += ShowControl(character.fCode);
         else
