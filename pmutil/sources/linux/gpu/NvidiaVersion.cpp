@@ -1,14 +1,17 @@
 #include "linux/gpu/NvidiaVersion.h"
 
-#include <cstdio>
+#include <algorithm>
+#include <ctime>
+#include <iomanip>
+#include <iterator>
+#include <locale>
 #include <sstream>
 #include <vector>
 
 namespace pmutil {
 namespace {
 
-const char* const kMonths[] = {"Jan", "Feb", "Mar", "Apr", "May", "Jun",
-                               "Jul", "Aug", "Sep", "Oct", "Nov", "Dec"};
+constexpr int kFirstYear = 1990; // no driver is older
 
 // The zones of the driver's own builders, in minutes east of Greenwich.
 struct Zone {
@@ -26,34 +29,24 @@ bool IsVersion(const std::string& word)
 // The words "Aug 19 01:15:15 UTC 2023" from index `first` on.
 std::string DateAt(const std::vector<std::string>& words, std::size_t first)
 {
-    int month = 0;
-    for (int i = 0; i != 12; ++i)
-        if (words[first] == kMonths[i])
-            month = i + 1;
-    int day = 0;
-    int year = 0;
-    int hour = 0;
-    int minute = 0;
-    int second = 0;
-    char rest = 0;
-    // NOLINTBEGIN(cert-err34-c): widths bound the numbers, and the ranges are checked below.
-    const bool complete = std::sscanf(words[first + 1].c_str(), "%2d%c", &day, &rest) == 1 &&
-                          std::sscanf(words[first + 2].c_str(), "%2d:%2d:%2d%c", &hour, &minute,
-                                      &second, &rest) == 3 &&
-                          std::sscanf(words[first + 4].c_str(), "%4d%c", &year, &rest) == 1;
-    // NOLINTEND(cert-err34-c)
-    if (!complete || month == 0 || day < 1 || day > 31 || hour < 0 || hour > 23 || minute < 0 ||
-        minute > 59 || second < 0 || second > 60 || year < 1990)
-        return std::string();
-    for (const Zone& zone : kZones) {
-        if (words[first + 3] == zone.name) {
-            char text[80];
-            std::snprintf(text, sizeof text, "%04d%02d%02d%02d%02d%02d.000000%+04d", year, month,
-                          day, hour, minute, second, zone.minutes);
-            return text;
-        }
-    }
-    return std::string();
+    std::istringstream in(words[first] + ' ' + words[first + 1] + ' ' + words[first + 2] + ' ' +
+                          words[first + 4]);
+    in.imbue(std::locale::classic());
+    std::tm date{};
+    in >> std::get_time(&date, "%b %d %H:%M:%S %Y");
+    const bool complete = in && in.peek() == std::istringstream::traits_type::eof();
+    if (!complete || date.tm_year < kFirstYear - 1900)
+        return {};
+    const auto zone = std::find_if(std::begin(kZones), std::end(kZones), [&](const Zone& known) {
+        return words[first + 3] == known.name;
+    });
+    if (zone == std::end(kZones))
+        return {};
+    std::ostringstream out;
+    out.imbue(std::locale::classic());
+    out << std::put_time(&date, "%Y%m%d%H%M%S.000000") << std::showpos << std::internal
+        << std::setfill('0') << std::setw(4) << zone->minutes;
+    return out.str();
 }
 
 } // namespace
