@@ -45,19 +45,6 @@ void AssignDecimal(std::string& out, T value)
     out.assign(buffer, static_cast<std::size_t>(end - buffer));
 }
 
-// "0x%0Nx" with N digits or more.
-template <typename T>
-void AssignHex(std::string& out, T value, int digits)
-{
-    char buffer[24];
-    int used = 0;
-    for (T rest = value; used < digits || rest != 0; rest = static_cast<T>(rest >> 4))
-        buffer[sizeof buffer - static_cast<std::size_t>(++used)] = "0123456789abcdef"[rest & 15];
-    buffer[sizeof buffer - static_cast<std::size_t>(++used)] = 'x';
-    buffer[sizeof buffer - static_cast<std::size_t>(++used)] = '0';
-    out.assign(buffer + sizeof buffer - used, static_cast<std::size_t>(used));
-}
-
 void WriteQuotedChar(std::string& out, char value, char quote)
 {
     out += quote;
@@ -399,10 +386,7 @@ void Fmt::FormatFloat(std::string& out, float value, const char* format)
 
 void Fmt::FormatULongLong(std::string& out, unsigned long long value, const char* format)
 {
-    if (format == GetULongLongFormat())
-        AssignHex(out, value, 16);
-    else
-        Print(out, format, value);
+    Print(out, format, value);
 }
 
 void Fmt::FormatLongLong(std::string& out, long long value, const char* format)
@@ -415,10 +399,7 @@ void Fmt::FormatLongLong(std::string& out, long long value, const char* format)
 
 void Fmt::FormatULong(std::string& out, unsigned long value, const char* format)
 {
-    if (format == GetULongFormat())
-        AssignHex(out, value, 8);
-    else
-        Print(out, format, value);
+    Print(out, format, value);
 }
 
 void Fmt::FormatLong(std::string& out, long value, const char* format)
@@ -431,10 +412,7 @@ void Fmt::FormatLong(std::string& out, long value, const char* format)
 
 void Fmt::FormatUInt(std::string& out, unsigned int value, const char* format)
 {
-    if (format == GetUIntFormat())
-        AssignHex(out, value, 8);
-    else
-        Print(out, format, value);
+    Print(out, format, value);
 }
 
 void Fmt::FormatInt(std::string& out, int value, const char* format)
