@@ -1,11 +1,11 @@
-// The seam to the operating system's adapter lists: rows of named values as a management service
-// keeps them, and raw adapters with their outputs as a display interface lists them. The shapes are
-// those of Windows' WMI and DXGI; other platforms fill the same shapes from what they have.
+// The interface to the operating system's adapter lists: rows of named values, and raw adapters
+// with their outputs. The structures are those of Windows' WMI and DXGI; other platforms fill them
+// from their own sources. An implementation only reads data: filtering and conversion belong to
+// WMIData and DXGIData.
 //
-// Every operation may fail by a result code below 0; an exception that comes out of one ends the
-// enumeration like a failure does. A pointer that an operation fills stays null when it fails.
-// Nothing here decides anything: that is WMIData's and DXGIData's work. Each object that is handed
-// out is released by its destructor, before the object that gave it. Main thread only.
+// An operation that fails returns a negative result code and leaves its output pointer null. An
+// exception ends the enumeration as a failure does. The caller owns each returned object and
+// destroys it before the object that returned it. Main thread only.
 #pragma once
 
 #include <array>
@@ -15,7 +15,7 @@
 
 namespace pmutil {
 
-// A result in the manner of COM: failed if negative. 0 is plain success, 1 success of another kind.
+// A result as in COM: negative for a failure, 0 (S_OK) or 1 (S_FALSE) for a success.
 using ResultCode = std::int32_t;
 inline constexpr bool Failed(ResultCode result)
 {
@@ -38,37 +38,37 @@ struct PropertyValue {
 class AdapterRow {
 public:
     virtual ~AdapterRow() = default;
-    // The property of that name, in the type it has. A null name, and one that the row lacks, fail.
+    // Reads a property with its own type. Fails if `name` is null or the row lacks the property.
     virtual ResultCode Get(const char16_t* name, PropertyValue& value) = 0;
 };
 
-// The rows of a query, one after the other.
+// An iterator over the rows of a query.
 class AdapterRows {
 public:
     virtual ~AdapterRows() = default;
-    // Success with a null row is the end.
+    // Reads the next row. After the last row it succeeds and leaves `row` null.
     virtual ResultCode Next(std::unique_ptr<AdapterRow>& row) = 0;
 };
 
-// The management service, in the steps that reaching it takes, to be called in this order. The
-// destructor releases the connection and the locator where Release hasn't, but undoes Initialize in
-// no case: that is Uninitialize's work.
+// The connection to the management service. Call the operations in their order here. The destructor
+// releases the connection and the locator if Release wasn't called; only Uninitialize undoes
+// Initialize.
 class ManagementService {
 public:
     virtual ~ManagementService() = default;
-    // Starts COM, or what stands for it, for this thread.
+    // Initializes COM for this thread; does nothing where there is no COM.
     virtual ResultCode Initialize() = 0;
     virtual ResultCode CreateLocator() = 0;
     virtual ResultCode ConnectServer() = 0;
     virtual ResultCode SetProxyBlanket() = 0;
     // May succeed and leave `rows` null.
     virtual ResultCode QueryAdapters(std::unique_ptr<AdapterRows>& rows) = 0;
-    // Releases the service, then the locator; the rows are gone by then.
+    // Releases the service, then the locator. The rows must be released before.
     virtual void Release() = 0;
     virtual void Uninitialize() = 0;
 };
 
-// What a raw adapter says of itself. Sizes are bytes.
+// The fields of DXGI_ADAPTER_DESC. Sizes are in bytes.
 struct AdapterDescriptor {
     std::array<char16_t, 128> Description{}; // zero-terminated
     std::uint32_t VendorId = 0;
@@ -80,7 +80,7 @@ struct AdapterDescriptor {
     std::uint64_t SharedSystemMemory = 0;
 };
 
-// What an output of an adapter says of itself.
+// The fields of DXGI_OUTPUT_DESC.
 struct OutputDescriptor {
     struct Rect {
         std::int32_t left = 0;
@@ -106,34 +106,36 @@ class Adapter {
 public:
     virtual ~Adapter() = default;
     virtual ResultCode GetDesc(AdapterDescriptor& description) = 0;
-    // A failure is the end of the outputs.
+    // Fails if there is no output of that index.
     virtual ResultCode EnumOutputs(std::uint32_t index, std::unique_ptr<AdapterOutput>& output) = 0;
 };
 
 class AdapterFactory {
 public:
     virtual ~AdapterFactory() = default;
-    // A failure is the end of the adapters.
+    // Fails if there is no adapter of that index.
     virtual ResultCode EnumAdapters(std::uint32_t index, std::unique_ptr<Adapter>& adapter) = 0;
 };
 
-// One platform's adapter lists.
+// The adapter lists of a platform.
 class AdapterSource {
 public:
     virtual ~AdapterSource() = default;
     // May succeed and leave `factory` null.
     virtual ResultCode CreateFactory(std::unique_ptr<AdapterFactory>& factory) = 0;
-    // Never null. Does nothing but make the object: reaching the service is the object's work.
+    // Returns a new object, never null. Doesn't connect to the service.
     virtual std::unique_ptr<ManagementService> CreateManagementService() = 0;
-    // Total physical memory in bytes; false if the system doesn't say.
+    // Sets the total physical memory in bytes. Returns false if it is unknown.
     virtual bool GetPhysicalMemory(std::uint64_t& bytes) = 0;
 };
 
-// The platform's own source. One twin source per platform implements it.
+// Returns the platform's own source. Each platform has its own source file for it.
 AdapterSource& NativeAdapterSource();
 
-// The source in force: the native one, unless a test has replaced it. Null restores the native one.
+// Returns the source set by ReplaceAdapterSource, else the native source.
 AdapterSource& CurrentAdapterSource();
+
+// Replaces the native source; null restores it. Not owned. For tests.
 void ReplaceAdapterSource(AdapterSource* source);
 
 } // namespace pmutil

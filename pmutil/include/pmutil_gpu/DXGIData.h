@@ -1,4 +1,5 @@
-// One display adapter as the display interface of the operating system sees it.
+// A display adapter of the operating system's DXGI list. On Linux the adapter source fills the same
+// structure.
 #pragma once
 
 #include <ostream>
@@ -25,27 +26,28 @@ public:
     DXGIData() = default;
     explicit DXGIData(const AdapterDescriptor& descriptor) : fAdapterDesc(descriptor) {}
 
-    // The adapters of the current source that drive at least one desktop display, in their order. A
-    // failure is logged and ends the list; no exception comes out.
+    // Lists the adapters of the current source that drive at least one desktop display. A failure
+    // is logged and ends the list; no exception is thrown.
     static std::vector<DXGIData> GetAllDevices();
 
-    // The description, escaped.
+    // Returns the description, escaped.
     std::string GetDeviceName() const override;
-    // Megabytes; shared memory counts for small integrated adapters. Throws std::runtime_error
-    // "GlobalMemoryStatusEx failed" if physical memory is needed and the system doesn't say.
+    // Returns megabytes: dedicated memory, and for an integrated adapter with less than 1 GiB also
+    // shared memory. Throws std::runtime_error "GlobalMemoryStatusEx failed" if the size of the
+    // physical memory is needed and unknown.
     std::uint32_t GetMemoryMB() const override;
     std::uint32_t GetVendorID() const override;
     std::uint32_t GetDeviceID() const override;
+    // Returns the same text as GetDeviceName.
     std::string GetDescription() const override;
 
-    // Whether the adapter shares the processor's memory: AMD's and Intel's with less than 128 MB of
-    // their own. Any other vendor's counts as discrete.
+    // Returns true for an adapter of AMD or Intel with less than 128 MB of dedicated video memory.
     bool IsIntegrated() const;
 
     AdapterDescriptor fAdapterDesc;
 };
 
-// The texts of the log lines.
+// Print the texts of the log lines.
 std::ostream& operator<<(std::ostream& out, const AdapterDescriptor& descriptor);
 std::ostream& operator<<(std::ostream& out, const OutputDescriptor& descriptor);
 std::ostream& operator<<(std::ostream& out, const OutputDescriptor::Rect& rect);

@@ -1,6 +1,6 @@
-// One record per device as OpenGL or OpenCL sees it. A record owns no facts: it holds a share of a
-// GPUImpl and forwards each question to it. A record without one trips the shared pointer's own
-// assertion at the first question.
+// A record of one OpenGL or OpenCL device. A record shares ownership of a GPUImpl and forwards each
+// query to it; it stores no results. With a null GPUImpl, a query fails the shared pointer's
+// assertion.
 #pragma once
 
 #include <cstdint>

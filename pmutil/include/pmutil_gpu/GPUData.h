@@ -1,4 +1,4 @@
-// One adapter as the operating system reports it.
+// An adapter of one of the operating system's lists.
 #pragma once
 
 #include <cstdint>

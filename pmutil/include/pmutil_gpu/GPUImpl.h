@@ -1,5 +1,5 @@
-// The probe interface: every question that can be asked of one graphics device. A question may
-// throw; each call is a fresh query. Main thread only.
+// The probe interface: all queries of one graphics device. No result is cached. A query throws if
+// it fails. Main thread only.
 #pragma once
 
 #include <cstdint>
@@ -22,7 +22,8 @@ public:
     using GLGPUs = std::vector<boost::shared_ptr<GLGPU>>;
     using CLGPUs = std::vector<boost::shared_ptr<CLGPU>>;
 
-    // Factories: the devices of the machine. The object asked serves for nothing else.
+    // Factories: list the machine's devices. Each record has an implementation of its own; call
+    // these on an object that is used for nothing else.
     GLGPUs GetGPUs() { return DoGetGPUs(); }
     CLGPUs GetCLGPUs() { return DoGetCLGPUs(); }
 
@@ -42,9 +43,9 @@ public:
     std::string GetGLDriverExtra() { return DoGetGLDriverExtra(); }
     bool CompileProgramGLSL() { return DoCompileProgramGLSL(); }
     bool GLFramebufferOK() { return DoGLFramebufferOK(); }
-    // OpenGL's own string, which it owns; may be null.
+    // Returns OpenGL's string, which OpenGL owns; may be null.
     const char* GLGetString(std::uint32_t name) { return DoGLGetString(name); }
-    // `result` points to as many integers as OpenGL writes for that name.
+    // `result` must have room for all integers that OpenGL returns for `name`.
     void GLGetIntegerv(std::uint32_t name, std::int32_t* result) { DoGLGetIntegerv(name, result); }
     void GLGetProgramivARB(std::uint32_t target, std::uint32_t code, std::int32_t* result)
     {
@@ -56,7 +57,7 @@ public:
     }
     bool IsIntegratedGLGPU() { return DoIsIntegratedGLGPU(); }
 
-    // OpenCL. Bandwidth is bytes per second, compute a score in which more is faster.
+    // OpenCL. Bandwidth is in bytes per second; compute is a score, where higher is faster.
     std::string GetCLPlatformVersion() { return DoGetCLPlatformVersion(); }
     std::uint32_t GetCLMemoryMB() { return DoGetCLMemoryMB(); }
     std::string GetCLName() { return DoGetCLName(); }

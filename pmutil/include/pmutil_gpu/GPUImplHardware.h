@@ -1,11 +1,10 @@
-// The probes that OpenGL and OpenCL can answer alone. Every OpenGL question makes the device's own
-// context current for its duration, restores what was current before, and checks for an OpenGL
-// error at once.
+// The queries that need OpenGL or OpenCL only. An OpenGL query makes the device's context current,
+// checks glGetError after its call, and restores the previous context.
 //
-// Failures: "Failed requirement: glStatus == GL_NO_ERROR", "QGF::OGL::ExtensionManager::Instance()
-// returned NULL", "Cannot determine OGL version", "clGetDeviceInfo failed", "Failed requirement:
-// status == CL_SUCCESS" and "Failed requirement: ciErrNum == CL_SUCCESS", all std::runtime_error;
-// the graphics library's own exceptions pass through.
+// Failures throw std::runtime_error "Failed requirement: glStatus == GL_NO_ERROR",
+// "QGF::OGL::ExtensionManager::Instance() returned NULL", "Cannot determine OGL version",
+// "clGetDeviceInfo failed", "Failed requirement: status == CL_SUCCESS" or "Failed requirement:
+// ciErrNum == CL_SUCCESS". Exceptions of the graphics library pass through.
 #pragma once
 
 #include "pmutil/DebugValues.h"
@@ -15,7 +14,7 @@
 
 namespace pmutil {
 
-// Governs the log statements of the program's own modules; set from the command line.
+// Enables the log statements of the program's own modules; set from the command line.
 extern DebugValue gGPUAssay;
 
 class GPUImplHardware : public GPUImpl {
@@ -23,11 +22,11 @@ public:
     GPUImplHardware();
     ~GPUImplHardware() override;
 
-    // The device's OpenGL context; null where the object serves OpenCL only. An OpenGL question
-    // then trips the shared pointer's own assertion.
+    // The device's OpenGL context; null if the object is for OpenCL. An OpenGL query then fails the
+    // shared pointer's assertion.
     boost::shared_ptr<QGF::OGL::ContextOffscreen> context;
 
-    // The OpenCL device; a null id where the object serves OpenGL only.
+    // The OpenCL device; its id is null if the object is for OpenGL.
     QGF::OCL::Device device;
 
 private:

@@ -1,5 +1,6 @@
-// The probe implementation of the program: what GPUImplHardware answers, and the rest from the
-// operating system's adapter lists. Its name tells the shape of those lists, not the platform.
+// The program's implementation of GPUImpl: adds to GPUImplHardware the queries that need the
+// operating system's adapter lists. It is used on all platforms; the name refers to the structures
+// of those lists.
 #pragma once
 
 #include <map>
@@ -16,7 +17,7 @@ namespace pmutil {
 using DeviceContext =
     std::pair<boost::shared_ptr<QGF::OGL::ContextOffscreen>, QGF::OGL::DisplayDeviceKey>;
 
-// The contexts that could be made, by the device string of their display device.
+// Contexts by the device string of their display device.
 using ContextsByDeviceString = std::map<std::string, DeviceContext>;
 
 class GPUImplWin : public GPUImplHardware {
@@ -24,8 +25,8 @@ public:
     GPUImplWin();
     ~GPUImplWin() override;
 
-    // Makes a context on each display device that takes one. Of several devices with one device
-    // string the last one stays. A device that fails is skipped, with a line in the log and on
+    // Makes a context on each display device. If several devices have the same device string, the
+    // last one is kept. A device on which it fails is skipped, with a line in the log and on
     // standard error.
     static ContextsByDeviceString CreateContexts();
 
@@ -47,14 +48,14 @@ private:
 
 using GPUImplWins = std::vector<boost::shared_ptr<GPUImplWin>>;
 
-// The first of [first, last) whose OpenGL name equals `name` exactly, or `last`.
+// Returns the first of [first, last) whose OpenGL name equals `name`, or `last`.
 GPUImplWins::const_iterator FindImplByName(GPUImplWins::const_iterator first,
                                            GPUImplWins::const_iterator last,
                                            const std::string& name);
 
-// Joins adapter records with the contexts that could be made: one implementation for each context
-// that a record names, DXGI order first, then what only WMI knows. Records without a context are
-// logged and dropped.
+// Joins adapter records with contexts by name. Returns one implementation for each DXGI name that
+// has a context, in the order of `dxgiDevices`, then one for each WMI record that has a context but
+// no DXGI record. Records without a context are logged and dropped.
 GPUImplWins JoinDevices(const ContextsByDeviceString& contexts,
                         const std::vector<DXGIData>& dxgiDevices,
                         const std::vector<WMIData>& wmiDevices);

@@ -1,4 +1,5 @@
-// One video adapter as the operating system's management service sees it.
+// A video adapter of the operating system's WMI list. On Linux the adapter source fills the same
+// rows.
 #pragma once
 
 #include <vector>
@@ -10,19 +11,20 @@ namespace pmutil {
 
 class WMIData : public GPUData {
 public:
-    // A record that never met a row: its six strings are "?".
+    // A record without a row: its six strings are "?".
     WMIData();
 
-    // Reads a row's properties; one that can't be read leaves its field empty or 0 and logs a line.
+    // Reads the properties of a row. A property that can't be read is logged; its field is empty or
+    // 0.
     WMIData(AdapterRow& row, std::uint32_t vendorID, std::uint32_t deviceID);
 
-    // The rows of the current adapter source in their order, less those whose Status is "Error";
-    // the k-th row kept gets the ids of the k-th raw adapter. A failure is logged and ends the
-    // list; no exception comes out.
+    // Reads the rows of the current adapter source. Rows whose Status is "Error" are left out; the
+    // k-th other row gets the ids of the k-th raw adapter. A failure is logged and ends the list;
+    // no exception is thrown.
     static std::vector<WMIData> GetAllDevices();
 
     std::string GetDeviceName() const override;
-    // The adapter's memory in bytes, in spite of the name.
+    // Returns the adapter's memory in bytes, not megabytes.
     std::uint32_t GetMemoryMB() const override;
     std::uint32_t GetVendorID() const override;
     std::uint32_t GetDeviceID() const override;
@@ -34,7 +36,8 @@ public:
     std::string GetDriverVersion() const { return fDriverVersion; }
     std::string GetDriverDate() const { return fDriverDate; }
 
-    // Reads a text property, narrowed. False leaves `out` alone and logs the result and the type.
+    // Reads a text property through NarrowProperty. On failure logs result and type, leaves `out`
+    // unchanged and returns false.
     static bool GetStrProperty(AdapterRow& row, const char16_t* name, std::string& out);
 
     std::uint32_t fAdapterRAM; // bytes
@@ -48,16 +51,17 @@ public:
     std::string fDriverDate;
 };
 
-// Reads "AdapterRAM". A failure leaves `out` alone and logs the result and the type.
+// Reads "AdapterRAM". On failure logs result and type, leaves `out` unchanged and returns false.
 bool GetIntProperty(AdapterRow& row, std::uint32_t& out);
 
-// Printable ASCII as it stands, any other code unit as "\x" and four hexadecimal digits.
+// Converts a text up to its first zero: printable ASCII is copied, any other code unit becomes "\x"
+// and four hexadecimal digits.
 std::string NarrowProperty(const std::u16string& wide);
 
-// "name=value" of each property that can be read, with nothing between the pairs. For diagnosis.
+// Returns "name=value" of each text property that can be read, without a separator. For diagnosis.
 std::string AllPropertiesString(AdapterRow& row);
 
-// The property names of Win32_VideoController in alphabetical order, ended by a null.
+// The property names of Win32_VideoController in alphabetical order; the last entry is null.
 extern const char16_t* const kWMIPropertyNames[];
 
 } // namespace pmutil

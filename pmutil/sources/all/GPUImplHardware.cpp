@@ -18,7 +18,7 @@ namespace {
 using QGF::OGL::OpenGLExtension;
 using QGF::OGL::OpenGLInterceptor;
 
-// The place that the interceptor is told for each call.
+// The source file that is passed to the interceptor with each call.
 constexpr char kModule[] = "pmutil/sources/all/GPUImplHardware";
 
 constexpr std::uint32_t kGLNoError = 0;
@@ -44,7 +44,7 @@ std::string GPUImplHardware::DoGetGLVersion()
     const ScopedGLCurrentExtensions current(*context);
     const QGF::OGL::ExtensionManager& extensions = RequireExtensions(current.Extensions());
     const char* const version = NewestGLVersion(
-        [&extensions](OpenGLExtension asked) { return extensions.isSupported(asked); });
+        [&extensions](OpenGLExtension candidate) { return extensions.isSupported(candidate); });
     if (version == nullptr)
         throw std::runtime_error("Cannot determine OGL version");
     return version;
@@ -112,8 +112,8 @@ bool GPUImplHardware::DoCompileProgramGLSL()
 bool GPUImplHardware::DoGLFramebufferOK()
 {
     constexpr std::int32_t kSize = 32;
-    // Out of range on purpose: OpenGL has to clamp it to opaque white.
-    constexpr float kOverbright = 255.0F;
+    // Deliberately out of range: OpenGL must clamp it to opaque white.
+    constexpr float kClearValue = 255.0F;
 
     bool result = false;
     try {
@@ -123,8 +123,8 @@ bool GPUImplHardware::DoGLFramebufferOK()
         QGF::OGL::Framebuffer framebuffer;
         framebuffer.bind();
         framebuffer.attach(texture, 0, 0);
-        OpenGLInterceptor::Instance().glClearColor(kModule, __LINE__, kOverbright, kOverbright,
-                                                   kOverbright, kOverbright);
+        OpenGLInterceptor::Instance().glClearColor(kModule, __LINE__, kClearValue, kClearValue,
+                                                   kClearValue, kClearValue);
         OpenGLInterceptor::Instance().glClear(kModule, __LINE__, kGLColorBufferBit);
         framebuffer.unbind();
         const std::uint32_t status = OpenGLInterceptor::Instance().glGetError(kModule, __LINE__);

@@ -1,4 +1,4 @@
-// How fast an OpenCL device copies inside its own memory.
+// Measures the copy bandwidth inside an OpenCL device's memory.
 #include <algorithm>
 #include <array>
 #include <optional>
@@ -47,7 +47,8 @@ double checkBandwidthCL(const QGF::OCL::Context& context, const QGF::OCL::Comman
         scope.emplace(kName, __FILE__, __LINE__);
     const QGF::OCL::FunctionTable& table = QGF::OCL::ExtensionManager::instance().table();
 
-    // A driver may crash in any of the calls below: what is logged before it must name it.
+    // Log each call before it is made, so that the last line names the call in which a driver
+    // crashes.
     cl_int ciErrNum = CL_SUCCESS;
     PM_LOG(gGPUAssay, kName << ": clCreateBuffer d_idata nbytes=" << kBufferBytes);
     const cl_mem d_idata =
@@ -69,8 +70,8 @@ double checkBandwidthCL(const QGF::OCL::Context& context, const QGF::OCL::Comman
     while (totalSeconds < kMaxSeconds && i < kMaxCopies) {
         PM_LOG(gGPUAssay,
                kName << ": " << i << " of " << kMaxCopies << ", totalSeconds=" << totalSeconds);
-        // Overwrites the events of the batch before, whose count stays up: releasing them would
-        // change what the driver is asked to do between two batches.
+        // The events of the previous batch are overwritten without a release: a release would add
+        // calls between the measured batches.
         const double seconds = timeBandwidthCL(queue, events, d_idata, d_odata);
         PM_LOG(gGPUAssay, kName << ": seconds=" << seconds);
         if (seconds > 0.0) {

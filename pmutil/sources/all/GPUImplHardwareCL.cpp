@@ -1,4 +1,4 @@
-// What an OpenCL device says of itself.
+// The queries of an OpenCL device.
 #include <string_view>
 #include <utility>
 
@@ -28,8 +28,8 @@ std::string WithoutVersionPrefix(const std::string& text)
                : text;
 }
 
-// The adapter lists aren't consulted for OpenCL: nothing is known here, in contrast to an adapter
-// that was looked for and not found.
+// The adapter lists aren't read for OpenCL devices, so their texts are empty. The default "?" means
+// that an adapter wasn't found.
 void ClearAdapterData(WMIData& data)
 {
     for (std::string* text : {&data.fName, &data.fCaption, &data.fInstalledDisplayDrivers,
@@ -37,7 +37,7 @@ void ClearAdapterData(WMIData& data)
         text->clear();
 }
 
-// The platform's version, and the CUDA version that some platforms append to it.
+// Reads the platform's version and splits off the CUDA version that some platforms append.
 void SplitVersion(const QGF::OCL::Device& device, std::string& platformVersion,
                   std::string& cudaVersion)
 {
@@ -145,8 +145,8 @@ std::string GPUImplHardware::DoGetCLDeviceVersion()
     const auto clGetDeviceInfo = Table().clGetDeviceInfo;
     std::size_t size = 0;
     require(clGetDeviceInfo(device.id(), CL_DEVICE_VERSION, 0, nullptr, &size) == CL_SUCCESS);
-    // The driver's terminator falls on the room's own. For a size of 0, which hasn't even that, the
-    // length wraps around, and there is no such room.
+    // `size` includes the terminating zero. A size of 0 wraps around, and the allocation throws
+    // std::bad_alloc.
     QGF::Core::TextBuffer text(size - 1);
     require(clGetDeviceInfo(device.id(), CL_DEVICE_VERSION, size, text.data(), nullptr) ==
             CL_SUCCESS);

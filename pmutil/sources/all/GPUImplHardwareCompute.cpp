@@ -1,4 +1,4 @@
-// How fast an OpenCL device computes.
+// Measures the compute speed of an OpenCL device.
 #include <cstdlib>
 #include <optional>
 #include <vector>
@@ -17,8 +17,8 @@ constexpr std::size_t kFloats = 0x100000;
 constexpr std::size_t kLocalSize = 64;
 constexpr double kScoreNumerator = 8.0;
 
-// One line, statements apart by seven tabs and two blanks. Some drivers cache built programs by
-// their text, so a change of blanks is a change of what is measured.
+// The kernel is one line; seven tabs and two blanks separate the statements. Some drivers cache
+// built programs by their text, so even a change of blanks may change the result.
 #define PMUTIL_GAP "\t\t\t\t\t\t\t  "
 constexpr char kKernelText[] =
     "__kernel void justIterate( __global float* v, unsigned int len ){" PMUTIL_GAP
@@ -31,7 +31,7 @@ constexpr char kKernelText[] =
 std::vector<float> MakeData()
 {
     std::vector<float> data(kFloats);
-    // The unseeded sequence, so that every run measures the same work.
+    // Don't seed rand(): all runs must process the same data.
     for (float& value : data)
         value = static_cast<float>(std::rand()); // NOLINT(concurrency-mt-unsafe): main thread only
     return data;
@@ -70,7 +70,7 @@ double MeasureCLCompute(const QGF::OCL::Context& context, const QGF::OCL::Comman
     const double seconds = ProfilingDuration(event);
     PM_LOG(gGPUAssay, kName << ": clFinish");
     table.clFinish(queue.handle());
-    // Program, kernel and event go with the process.
+    // Program, kernel and event are never released.
     QGF::OCL::HandleTraits<cl_mem>::Release(buffer);
     PM_LOG(gGPUAssay, kName << ": result=" << seconds);
     return seconds > 0.0 ? kScoreNumerator / seconds : 0.0;
@@ -80,7 +80,7 @@ double MeasureCLCompute(const QGF::OCL::Context& context, const QGF::OCL::Comman
 
 double GPUImplHardware::DoGetCLCompute()
 {
-    // The label promises a time, but readers of logs look for the score behind it.
+    // The label says "time", but the value is the score. Keep it: readers of logs expect it.
     return OnProfilingQueue("GPUImplHardware::DoGetCLCompute", "timeForKernelExecution=", device,
                             MeasureCLCompute);
 }

@@ -17,7 +17,7 @@ constexpr std::size_t kGLTextureFreeMemoryValues = 4;
 constexpr unsigned kKilobyteShift = 10;
 constexpr unsigned kMegabyteShift = 20;
 
-// One vendor's way to ask OpenGL for memory in kilobytes.
+// A vendor's OpenGL query for memory in kilobytes.
 struct MemoryQuery {
     std::uint32_t vendorID;
     std::uint32_t name;
@@ -30,15 +30,15 @@ constexpr MemoryQuery kMemoryQueries[] = {
      ": vendorID=kVendorNVIDIA, GLGetIntegerv failure"},
 };
 
-// One write, so that the line stays whole whatever else writes there.
-void TellStandardError(const std::string& text)
+// Writes the line in one call, so that no other output splits it.
+void PrintToStandardError(const std::string& text)
 {
     const std::string line = text + "\n";
     std::fwrite(line.data(), 1, line.size(), stderr);
     std::fflush(stderr);
 }
 
-// Bytes by the vendor's own OpenGL query; 0 for a vendor without one and for a query that fails.
+// Returns bytes by the vendor's OpenGL query; 0 if the vendor has none or the query fails.
 std::uint64_t QueryGLBytes(GPUImpl& impl, std::uint32_t vendorID)
 {
     for (const MemoryQuery& query : kMemoryQueries) {
@@ -55,8 +55,7 @@ std::uint64_t QueryGLBytes(GPUImpl& impl, std::uint32_t vendorID)
     return 0;
 }
 
-// The working list's object of that name; one on the entry's context is made and appended if the
-// list has none.
+// Returns the object of that name. If the list has none, appends one with the entry's context.
 GPUImplWin& FindOrAppend(GPUImplWins& impls, const std::string& name, const DeviceContext& entry)
 {
     const auto found = FindImplByName(impls.begin(), impls.end(), name);
@@ -96,7 +95,7 @@ ContextsByDeviceString GPUImplWin::CreateContexts()
             boost::shared_ptr<QGF::OGL::ContextOffscreen> context;
             if (!QGF::OGL::Context::DisplayDevice(index, key))
                 continue;
-            // Before the call, so that a driver that crashes leaves this line last.
+            // Log before the call, so that this line is the last one if the driver crashes.
             PM_LOG(gGPUAssay, "creating ContextOffscreen for " << key);
             context = boost::make_shared<QGF::OGL::ContextOffscreen>(key);
             const std::string deviceString = key.deviceString();
@@ -106,7 +105,7 @@ ContextsByDeviceString GPUImplWin::CreateContexts()
             entry.second = key;
         } catch (...) {
             PM_LOG(gGPUAssay, "ContextOffscreen exception caught and ignored.");
-            TellStandardError("ContextOffscreen exception caught and ignored.");
+            PrintToStandardError("ContextOffscreen exception caught and ignored.");
         }
     }
     return contexts;
@@ -144,7 +143,7 @@ GPUImpl::GLGPUs GPUImplWin::DoGetGPUs()
     ContextsByDeviceString contexts;
     std::size_t numContexts = 0;
     try {
-        // The system's lists are read before any context exists.
+        // Read the system's lists before any context exists.
         const std::vector<WMIData> wmiDevices = WMIData::GetAllDevices();
         PM_LOG(gGPUAssay, "wmiNumDevices=" << wmiDevices.size());
         const std::vector<DXGIData> dxgiDevices = DXGIData::GetAllDevices();
@@ -156,7 +155,7 @@ GPUImpl::GLGPUs GPUImplWin::DoGetGPUs()
             result.push_back(boost::make_shared<GLGPU>(impl));
     } catch (...) {
         PM_LOG(gGPUAssay, "DoGetGPUs fails with exception");
-        TellStandardError("DoGetGPUs fails with exception");
+        PrintToStandardError("DoGetGPUs fails with exception");
     }
 
     if (result.empty() && numContexts != 0) {
@@ -165,7 +164,8 @@ GPUImpl::GLGPUs GPUImplWin::DoGetGPUs()
             const auto impl = boost::make_shared<GPUImplWin>();
             impl->context = contexts.begin()->second.first;
             result.push_back(boost::make_shared<GLGPU>(impl));
-        } catch (...) { // an empty list is the answer then
+        } catch (...) {
+            // Return an empty list.
         }
     }
     return result;

@@ -1,4 +1,4 @@
-// The requirement check of the OpenCL measurements.
+// The status check of the OpenCL measurements.
 #pragma once
 
 #include "pmutil/Requirement.h"
@@ -6,7 +6,8 @@
 
 namespace pmutil {
 
-// Throws std::runtime_error "Failed requirement: ciErrNum == CL_SUCCESS" for every other status.
+// Throws std::runtime_error "Failed requirement: ciErrNum == CL_SUCCESS" unless the status is
+// CL_SUCCESS.
 inline void CheckCLError(cl_int ciErrNum)
 {
     if (ciErrNum != CL_SUCCESS)

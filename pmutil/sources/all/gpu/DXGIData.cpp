@@ -19,11 +19,12 @@ namespace {
 
 constexpr unsigned kMegabyteShift = 20;
 constexpr std::int32_t kMinDedicatedMBForDiscreteGPU = 128;
-constexpr std::uint64_t kSmallMemoryLimit = 0x40000000;
-constexpr std::uint64_t kSharedMemoryCap = 0x80000000;
+// Bytes: 1 GiB and 2 GiB.
+constexpr std::uint64_t kMinMemoryWithoutShared = 0x40000000;
+constexpr std::uint64_t kMaxMemoryWithShared = 0x80000000;
 constexpr double kShareOfInstalledMemory = 0.25;
 
-// The text of a fixed array, up to its terminating zero.
+// Escapes the text of a fixed array up to its terminating zero.
 template <std::size_t size>
 std::string EscapedArray(const std::array<char16_t, size>& text)
 {
@@ -32,7 +33,7 @@ std::string EscapedArray(const std::array<char16_t, size>& text)
     return EscapeText(view, '"');
 }
 
-// How many of the adapter's outputs show the desktop.
+// Returns the number of the adapter's outputs that are attached to the desktop.
 std::int32_t CountDisplays(Adapter& adapter)
 {
     std::int32_t displays = 0;
@@ -49,7 +50,7 @@ std::int32_t CountDisplays(Adapter& adapter)
     }
 }
 
-// Everything of the enumeration that may fail.
+// Appends the adapters to `devices`. Throws on a failure; `devices` keeps the adapters before it.
 void GatherAdapters(AdapterSource& source, std::vector<DXGIData>& devices)
 {
     std::unique_ptr<AdapterFactory> factory;
@@ -96,7 +97,8 @@ std::string DXGIData::GetDeviceName() const
 std::uint32_t DXGIData::GetMemoryMB() const
 {
     std::uint64_t numBytes = fAdapterDesc.DedicatedVideoMemory + fAdapterDesc.DedicatedSystemMemory;
-    if (numBytes < kSmallMemoryLimit && fAdapterDesc.SharedSystemMemory != 0 && IsIntegrated()) {
+    if (numBytes < kMinMemoryWithoutShared && fAdapterDesc.SharedSystemMemory != 0 &&
+        IsIntegrated()) {
         std::uint64_t installedRam = 0;
         if (!CurrentAdapterSource().GetPhysicalMemory(installedRam))
             throw std::runtime_error("GlobalMemoryStatusEx failed");
@@ -105,11 +107,11 @@ std::uint32_t DXGIData::GetMemoryMB() const
             static_cast<std::uint64_t>(static_cast<double>(installedRam) * kShareOfInstalledMemory);
         PM_LOG(gGPUAssay, "installedRamToConsiderForGPU=" << installedRamToConsiderForGPU);
         const std::uint64_t installedRamThatGPUCanUse =
-            std::min(installedRamToConsiderForGPU, kSharedMemoryCap);
+            std::min(installedRamToConsiderForGPU, kMaxMemoryWithShared);
         PM_LOG(gGPUAssay, "installedRamThatGPUCanUse=" << installedRamThatGPUCanUse);
         numBytes += std::min(fAdapterDesc.SharedSystemMemory, installedRamThatGPUCanUse);
         PM_LOG(gGPUAssay, "numBytes=" << numBytes);
-        numBytes = std::min(numBytes, kSharedMemoryCap);
+        numBytes = std::min(numBytes, kMaxMemoryWithShared);
     }
     const auto megabytes = static_cast<std::uint32_t>(numBytes >> kMegabyteShift);
     PM_LOG(gGPUAssay, "DXGI RAM=" << numBytes << "=" << megabytes << "MB");
@@ -155,7 +157,7 @@ std::ostream& operator<<(std::ostream& out, const AdapterDescriptor& descriptor)
                << " Description=" << EscapedArray(descriptor.Description) << "}";
 }
 
-// The brace that this one opens stays open: readers of the report know the line in that form.
+// The first brace is never closed. Keep that: readers of the report parse the line in this form.
 std::ostream& operator<<(std::ostream& out, const OutputDescriptor& descriptor)
 {
     return out << "{ DesktopCoordinates=" << descriptor.DesktopCoordinates

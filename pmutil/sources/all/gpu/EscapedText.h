@@ -1,11 +1,11 @@
-// Zero-terminated texts of foreign origin, made fit for a log line.
+// Escapes zero-terminated texts for log lines.
 #pragma once
 
 #include <string>
 
 namespace pmutil {
 
-// The text with each character escaped, the double quote as the quote; "<NULL>" for null.
+// Returns the escaped text, with the double quote as the quote character; "<NULL>" for null.
 std::string EscapedOrNull(const char* text);
 std::string EscapedOrNull(const char16_t* text);
 

@@ -9,7 +9,7 @@ struct VersionText {
     const char* text;
 };
 
-// Newest first. The imaging subset of 1.2 is optional and says nothing of the version.
+// Newest first. GL_IMAGING_1_2 isn't listed: the imaging subset is optional and implies no version.
 constexpr VersionText kVersions[] = {
     {QGF::OGL::GL_VERSION_4_1, "4.1"}, {QGF::OGL::GL_VERSION_4_0, "4.0"},
     {QGF::OGL::GL_VERSION_3_3, "3.3"}, {QGF::OGL::GL_VERSION_3_2, "3.2"},

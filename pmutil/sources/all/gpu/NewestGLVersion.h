@@ -1,4 +1,4 @@
-// The OpenGL version of a context, from what it claims to support.
+// Determines the OpenGL version of a context from its supported versions.
 #pragma once
 
 #include <functional>
@@ -7,9 +7,8 @@
 
 namespace pmutil {
 
-// The text of the newest version, of those that the program knows, for which `isSupported` answers
-// true; null if there is none. Asks from the newest down, and no further than the first true
-// answer.
+// Calls `isSupported` for the known versions from the newest down and returns the text of the first
+// for which it returns true, such as "4.1"; null if there is none.
 const char*
 NewestGLVersion(const std::function<bool(QGF::OGL::OpenGLExtension version)>& isSupported);
 

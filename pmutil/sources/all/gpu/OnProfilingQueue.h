@@ -1,4 +1,4 @@
-// The frame of an OpenCL measurement: a context and a profiling queue of its own on one device.
+// Runs an OpenCL measurement on a context and a profiling queue of its own.
 #pragma once
 
 #include "qgf/OCL.h"
@@ -8,9 +8,10 @@ namespace pmutil {
 using CLMeasurement = double (*)(const QGF::OCL::Context& context,
                                  const QGF::OCL::CommandQueue& queue);
 
-// What `measure` gives on a fresh context and queue of the device. Logs the two risky calls before
-// they are made, and then the result: behind `resultLabel`, and by `name`, which is also the log
-// scope's. Failures of the library and of `measure` pass through.
+// Makes a context and a queue on the device, calls `measure` with them and returns its result. Logs
+// the two calls before they are made, since a driver may crash in them. Logs the result twice:
+// after `resultLabel`, and as "result=" after `name`, which also names the log scope. Exceptions
+// pass through.
 double OnProfilingQueue(const char* name, const char* resultLabel, const QGF::OCL::Device& device,
                         CLMeasurement measure);
 

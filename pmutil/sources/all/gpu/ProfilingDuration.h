@@ -1,13 +1,13 @@
-// How long a device worked on one command, by its own counters.
+// The execution time of an OpenCL command by the device's counters.
 #pragma once
 
 #include "qgf/OCLFunctionTable.h"
 
 namespace pmutil {
 
-// Seconds between start and end of the command behind a finished event of a profiling queue. A
-// driver that refuses is not told from one that answers: its counter stays 0, and the result has no
-// meaning.
+// Returns the seconds between start and end of the command of a finished event of a profiling
+// queue. The status of the two queries isn't checked: a counter whose query fails is 0, and the
+// result is then meaningless.
 double ProfilingDuration(cl_event event);
 
 } // namespace pmutil

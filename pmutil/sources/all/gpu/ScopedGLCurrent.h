@@ -1,5 +1,5 @@
-// Makes a device's OpenGL context current for the length of a scope, and on every way out restores
-// what was current before. On the thread that owns the context.
+// Makes a device's OpenGL context current for a scope and restores the previous context at its end.
+// Use it on the thread of the context.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -8,9 +8,9 @@
 
 namespace pmutil {
 
-// The library's own exceptions pass through; what was current before is restored then too.
 class ScopedGLCurrent {
 public:
+    // The library's exceptions pass through; the previous context is restored first.
     explicit ScopedGLCurrent(QGF::OGL::ContextOffscreen& context);
 
 private:
@@ -18,20 +18,20 @@ private:
     QGF::OGL::ContextOffscreen* fContext; // not owned
 };
 
-// The same for a scope that asks which extensions the context offers.
+// The same for a scope that needs the context's extensions.
 class ScopedGLCurrentExtensions : public ScopedGLCurrent {
 public:
     explicit ScopedGLCurrentExtensions(QGF::OGL::ContextOffscreen& context);
 
-    // Null if the library has none for the context.
+    // Returns the library's extension manager for the context; may be null.
     QGF::OGL::ExtensionManager* Extensions() const { return fExtensions; }
 
 private:
     QGF::OGL::ExtensionManager* fExtensions; // not owned
 };
 
-// The manager itself. Throws std::runtime_error "QGF::OGL::ExtensionManager::Instance() returned
-// NULL" for null, after the failure handler was told.
+// Returns the manager. For null, reports "QGF::OGL::ExtensionManager::Instance() returned NULL" by
+// RequirementFailed, which throws it as std::runtime_error.
 QGF::OGL::ExtensionManager& RequireExtensions(QGF::OGL::ExtensionManager* extensions);
 
 } // namespace pmutil

@@ -18,8 +18,8 @@ const char* const kTestVertexShader[kTestVertexShaderCount] = {
     "}",
 };
 
-// The seventh tap's sum and the eighth's coordinate share one entry: it stays one, so that every
-// machine is tried with the same strings.
+// One entry has two statements, the sum of the seventh tap and the coordinate of the eighth. Keep
+// it, so that all machines get the same strings.
 const char* const kTestFragmentShader[kTestFragmentShaderCount] = {
     "uniform sampler2D layer_texture;",
     "uniform float offset_x[9];",

@@ -1,6 +1,6 @@
-// The shader program with which a device's compiler is tried: one pass of a compositor, a sampler
-// of nine taps and a blend over a background. Its texts are a fixed part of the trial, unused
-// functions and variables included. OpenGL joins the entries with nothing between them.
+// The shader program of the compile test: one pass of a compositor, a sampler with nine taps and a
+// blend over a background. Don't change the texts, not even the unused functions and variables, so
+// that results stay comparable. OpenGL concatenates the entries without separators.
 #pragma once
 
 namespace pmutil {

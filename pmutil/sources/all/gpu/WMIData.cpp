@@ -32,7 +32,7 @@ void RequireSuccess(ResultCode result, const char* failure)
         RequirementFailed(nullptr, 0, failure, true);
 }
 
-// Both property readers' way: the type is taken as it is, nothing is converted.
+// Reads a property that must have the given type; no type is converted.
 bool ReadProperty(AdapterRow& row, const char16_t* name, std::uint16_t type, PropertyValue& value)
 {
     const ResultCode result = row.Get(name, value);
@@ -54,7 +54,7 @@ AdapterIDs GetRawAdapterIDs(AdapterFactory* factory, std::unique_ptr<Adapter>& a
     AdapterIDs ids;
     if (factory != nullptr && !Failed(factory->EnumAdapters(index, adapter)) && adapter) {
         AdapterDescriptor descriptor;
-        adapter->GetDesc(descriptor); // one that fails leaves the ids at 0
+        adapter->GetDesc(descriptor); // on failure the ids stay 0
         ids.vendor = descriptor.VendorId;
         ids.device = descriptor.DeviceId;
     }
@@ -72,14 +72,14 @@ void AppendRow(std::vector<WMIData>& devices, std::unique_ptr<AdapterRow> row,
     if (status == StatusError())
         return;
 
-    // Paired by position alone: nothing ties a row to a raw adapter.
+    // Rows and raw adapters are paired by position: they have no common key.
     std::unique_ptr<Adapter> adapter; // released before the row
     const AdapterIDs ids =
         GetRawAdapterIDs(factory, adapter, static_cast<std::uint32_t>(devices.size()));
     devices.emplace_back(*row, ids.vendor, ids.device);
 }
 
-// Everything of the enumeration that may fail.
+// Appends the rows to `devices`. Throws on a failure; `devices` keeps the rows before it.
 void GatherRows(AdapterSource& source, std::unique_ptr<AdapterFactory>& factory,
                 std::vector<WMIData>& devices)
 {
@@ -101,8 +101,8 @@ void GatherRows(AdapterSource& source, std::unique_ptr<AdapterFactory>& factory,
         AppendRow(devices, std::move(row), factory.get());
     }
 
-    // Reached only if nothing failed: on any other path the objects are released by their owners,
-    // and Initialize stays in force for the life of the thread.
+    // After a failure these calls aren't made: the owners release the objects, and the thread stays
+    // initialized.
     rows.reset();
     service->Release();
     service->Uninitialize();
@@ -280,13 +280,11 @@ std::string NarrowProperty(const std::u16string& wide)
 
 std::string AllPropertiesString(AdapterRow& row)
 {
-    const std::string separator; // pairs follow each other without a gap
     std::string result;
     for (const char16_t* const* name = kWMIPropertyNames; *name != nullptr; ++name) {
         std::string value;
         if (!WMIData::GetStrProperty(row, *name, value))
             continue;
-        result += separator;
         result += NarrowProperty(*name);
         result += "=";
         result += value;
