@@ -54,7 +54,7 @@ int SetInterruptEnd(std::function<void()> end)
 
 void EndProcess(int status)
 {
-    pmutil::UTF8Console::PutBack();
+    pmutil::UTF8Console::Restore();
     std::_Exit(status);
 }
 

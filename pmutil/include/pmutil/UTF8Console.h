@@ -1,13 +1,13 @@
-// A console that shows UTF-8.
+// Switches the Windows console to UTF-8.
 #pragma once
 
 namespace pmutil {
 
-// On Windows, while it lives, the console behind standard output or standard error shows what is
-// written to it as UTF-8; then, and when Ctrl-C or the like ends the process, the console gets its
-// code page back. It keeps UTF-8 where the process crashes. Streams that go elsewhere are left
-// alone, and other platforms need nothing. Standard output to a console is written when it is
-// flushed. Make one at most, in main, before anything is written.
+// On Windows, sets the output code page of the console to UTF-8 if standard output or standard
+// error is a console. The destructor, and the end of the process by Ctrl-C or a similar event,
+// restore the code page; after a crash it stays UTF-8. Standard output to a console is buffered
+// until a flush. Streams that aren't consoles are unchanged; on other platforms the class does
+// nothing. Make at most one, in main, before the first output.
 class UTF8Console {
 public:
     UTF8Console();
@@ -15,8 +15,9 @@ public:
     UTF8Console(const UTF8Console&) = delete;
     UTF8Console& operator=(const UTF8Console&) = delete;
 
-    // For a process that ends without destroying it. Any thread, any number of times.
-    static void PutBack();
+    // Restores the code page before an exit that doesn't run the destructor. Any thread may call
+    // it, any number of times.
+    static void Restore();
 };
 
 } // namespace pmutil

@@ -5,6 +5,6 @@ namespace pmutil {
 UTF8Console::UTF8Console() = default;
 UTF8Console::~UTF8Console() = default;
 
-void UTF8Console::PutBack() {}
+void UTF8Console::Restore() {}
 
 } // namespace pmutil

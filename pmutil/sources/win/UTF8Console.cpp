@@ -9,7 +9,7 @@ namespace pmutil {
 
 namespace {
 
-std::atomic<UINT> gCodePageBefore{0}; // 0: none to put back
+std::atomic<UINT> gPreviousCodePage{0}; // 0: none to restore
 
 bool IsConsole(DWORD stream)
 {
@@ -17,10 +17,11 @@ bool IsConsole(DWORD stream)
     return GetConsoleMode(GetStdHandle(stream), &mode) != 0;
 }
 
-// Called after the handlers that were added later, and only if none of them handled the event.
-BOOL WINAPI PutBackBeforeTheEnd(DWORD /*event*/)
+// The system calls this after handlers that were added later, and only if none of them handled the
+// event.
+BOOL WINAPI RestoreBeforeTheEnd(DWORD /*event*/)
 {
-    UTF8Console::PutBack();
+    UTF8Console::Restore();
     return FALSE;
 }
 
@@ -28,27 +29,28 @@ BOOL WINAPI PutBackBeforeTheEnd(DWORD /*event*/)
 
 UTF8Console::UTF8Console()
 {
-    // The console shows what comes in one write; a character that comes byte by byte is none to it.
+    // The console decodes each write separately, so the bytes of a character must be written in one
+    // call.
     if (IsConsole(STD_OUTPUT_HANDLE))
         std::setvbuf(stdout, nullptr, _IOFBF, BUFSIZ);
     if (!IsConsole(STD_OUTPUT_HANDLE) && !IsConsole(STD_ERROR_HANDLE))
         return;
-    const UINT before = GetConsoleOutputCP();
-    if (before == CP_UTF8 || SetConsoleOutputCP(CP_UTF8) == 0)
+    const UINT previous = GetConsoleOutputCP();
+    if (previous == CP_UTF8 || SetConsoleOutputCP(CP_UTF8) == 0)
         return;
-    gCodePageBefore = before;
-    SetConsoleCtrlHandler(PutBackBeforeTheEnd, TRUE);
+    gPreviousCodePage = previous;
+    SetConsoleCtrlHandler(RestoreBeforeTheEnd, TRUE);
 }
 
 UTF8Console::~UTF8Console()
 {
-    SetConsoleCtrlHandler(PutBackBeforeTheEnd, FALSE);
-    PutBack();
+    SetConsoleCtrlHandler(RestoreBeforeTheEnd, FALSE);
+    Restore();
 }
 
-void UTF8Console::PutBack()
+void UTF8Console::Restore()
 {
-    if (const UINT codePage = gCodePageBefore.exchange(0))
+    if (const UINT codePage = gPreviousCodePage.exchange(0))
         SetConsoleOutputCP(codePage);
 }
 

@@ -62,7 +62,7 @@ TEST(UTF8ConsoleDeathTest, IsPutBackOnce)
         {
             const UTF8Console console;
             pages.before = ::GetConsoleOutputCP();
-            UTF8Console::PutBack();
+            UTF8Console::Restore();
             pages.during = ::GetConsoleOutputCP();
             ::SetConsoleOutputCP(kOther); // somebody else's from here on
         }
