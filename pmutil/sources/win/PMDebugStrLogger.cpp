@@ -18,7 +18,7 @@ std::string PMDebugStrLogger::GetLineEnd()
 void PMDebugStrLogger::Write(const char* data, std::size_t size)
 {
     const LogTimer timer;
-    const std::string text(data, size); // terminated, as the call needs it
+    const std::string text(data, size); // adds the terminating zero
     OutputDebugStringA(text.c_str());
 }
 

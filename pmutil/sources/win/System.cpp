@@ -19,7 +19,7 @@ namespace pmutil {
 
 namespace {
 
-// The debugger's thread-naming exception and its record, as debuggers know them.
+// The exception by which a debugger learns a thread's name, and its record.
 constexpr DWORD kThreadNameException = 0x406D1388;
 constexpr DWORD kThreadNameType = 0x1000;
 
@@ -32,19 +32,19 @@ struct ThreadNameRecord {
 };
 #pragma pack(pop)
 
-// Swallows that exception where no debugger took it, so that it can't end the thread.
-LONG CALLBACK SwallowThreadNameException(EXCEPTION_POINTERS* pointers)
+// Ignores the exception if no debugger handled it, so that it doesn't end the process.
+LONG CALLBACK IgnoreThreadNameException(EXCEPTION_POINTERS* pointers)
 {
     return pointers->ExceptionRecord->ExceptionCode == kThreadNameException
                ? EXCEPTION_CONTINUE_EXECUTION
                : EXCEPTION_CONTINUE_SEARCH;
 }
 
-// The code page of the narrow file calls, as Boost has it; but a path that it can't say fails, and
-// isn't another path with question marks.
+// Boost's conversion to the code page of the narrow file calls. A path that the code page can't
+// represent is an error; Boost would replace characters by question marks.
 class PathFacet : public boost::filesystem::path::codecvt_type {
 public:
-    PathFacet() : codecvt_type(1) {} // the reference that keeps locales from deleting it
+    PathFacet() : codecvt_type(1) {} // 1: a locale doesn't delete it
 
 private:
     using codecvt_type = boost::filesystem::path::codecvt_type;
@@ -77,31 +77,31 @@ private:
     bool do_always_noconv() const noexcept override { return false; }
 };
 
-// An abort would end the process with 3, as a chosen status. This is the code by which newer
-// runtimes end an aborted process.
+// abort() would end the process with status 3, like a normal exit. Newer runtimes end an aborted
+// process with this code.
 [[noreturn]] void EndAsCrash(int /*signal*/)
 {
     constexpr UINT kAborted = 0xC0000409; // STATUS_STACK_BUFFER_OVERRUN
     TerminateProcess(GetCurrentProcess(), kAborted);
     for (;;)
-        Sleep(INFINITE); // until it has taken effect
+        Sleep(INFINITE); // until the termination takes effect
 }
 
-LPTOP_LEVEL_EXCEPTION_FILTER gFilterBefore = nullptr;
+LPTOP_LEVEL_EXCEPTION_FILTER gPreviousFilter = nullptr;
 
-// Ends the process with the exception's code, before the system asks a debugger or error reporting.
-// The C runtime's own filter comes first: it goes on after a C++ exception that nobody catches, so
+// Ends the process with the exception's code, before the system starts a debugger or error
+// reporting. The C runtime's filter is called first: for an uncaught C++ exception it continues, so
 // that std::terminate is called.
 LONG WINAPI EndAtException(EXCEPTION_POINTERS* pointers)
 {
-    const LONG answer =
-        gFilterBefore != nullptr ? gFilterBefore(pointers) : EXCEPTION_CONTINUE_SEARCH;
-    return answer == EXCEPTION_CONTINUE_EXECUTION ? answer : EXCEPTION_EXECUTE_HANDLER;
+    const LONG action =
+        gPreviousFilter != nullptr ? gPreviousFilter(pointers) : EXCEPTION_CONTINUE_SEARCH;
+    return action == EXCEPTION_CONTINUE_EXECUTION ? action : EXCEPTION_EXECUTE_HANDLER;
 }
 
-// Keeps error reporting from showing crashes that the error mode doesn't cover, on systems that
-// have the calls for it.
-void HideErrorReports()
+// Disables the dialog of Windows Error Reporting for crashes that the error mode doesn't cover.
+// Does nothing on systems that lack the calls.
+void DisableErrorReportDialog()
 {
     constexpr DWORD kNoUI = 0x20; // WER_FAULT_REPORTING_NO_UI
     using GetFlags = HRESULT(WINAPI*)(HANDLE process, DWORD * flags);
@@ -139,7 +139,7 @@ std::uint64_t GetCurrentThreadNumber()
 void ShowThreadName(const std::string& name)
 {
     const ThreadNameRecord record{kThreadNameType, name.c_str(), static_cast<DWORD>(-1), 0};
-    void* const handler = AddVectoredExceptionHandler(1, SwallowThreadNameException);
+    void* const handler = AddVectoredExceptionHandler(1, IgnoreThreadNameException);
     if (handler == nullptr)
         return;
     RaiseException(kThreadNameException, 0, sizeof record / sizeof(ULONG_PTR),
@@ -176,7 +176,7 @@ std::wstring GetCurrentDirectoryPath()
             throw std::runtime_error("GetCurrentDirectoryW failed");
         if (length < buffer.size())
             return std::wstring(buffer.data(), length);
-        buffer.resize(length); // what it asks for includes the terminating zero
+        buffer.resize(length); // includes the terminating zero
     }
 }
 
@@ -187,30 +187,30 @@ std::FILE* OpenSharedAppend(const std::string& path)
 
 void DiscardUnwritten(std::FILE* stream)
 {
-    // The runtime empties its buffer when a write fails; only the error state stays.
+    // The runtime discards its buffer when a write fails; only the error state remains.
     std::clearerr(stream);
 }
 
 void PrepareConsoleProcess()
 {
-    const UINT before = SetErrorMode(SEM_NOGPFAULTERRORBOX);
-    SetErrorMode(before | SEM_NOGPFAULTERRORBOX);
-    // What else would ask the user, on this thread, which is the one that calls drivers: a library
-    // that lacks another one, a drive without a disk.
+    const UINT previousMode = SetErrorMode(SEM_NOGPFAULTERRORBOX);
+    SetErrorMode(previousMode | SEM_NOGPFAULTERRORBOX);
+    // Disable the other dialogs on this thread, which calls the drivers: missing libraries and
+    // drives without a disk.
     SetThreadErrorMode(SEM_FAILCRITICALERRORS | SEM_NOGPFAULTERRORBOX | SEM_NOOPENFILEERRORBOX,
                        nullptr);
-    HideErrorReports();
-    gFilterBefore = SetUnhandledExceptionFilter(EndAtException);
-    ULONG stackForIt = 64 * 1024; // which a stack overflow on this thread leaves to the filter
-    SetThreadStackGuarantee(&stackForIt);
+    DisableErrorReportDialog();
+    gPreviousFilter = SetUnhandledExceptionFilter(EndAtException);
+    ULONG filterStack = 64 * 1024; // bytes reserved for the filter after a stack overflow
+    SetThreadStackGuarantee(&filterStack);
     _set_error_mode(_OUT_TO_STDERR);
     std::signal(SIGABRT, EndAsCrash);
-    SetDllDirectoryW(L""); // no library comes from the current directory
+    SetDllDirectoryW(L""); // load no library from the current directory
 }
 
 const boost::filesystem::path::codecvt_type& GetPathCodecvt()
 {
-    static const PathFacet& facet = *new PathFacet; // outlives all users
+    static const PathFacet& facet = *new PathFacet; // never destroyed: it must outlive all users
     return facet;
 }
 

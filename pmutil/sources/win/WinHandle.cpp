@@ -8,8 +8,8 @@ namespace pmutil {
 
 namespace {
 
-constexpr std::uint64_t kMostPerCall = 0xFFFFFFFF;
-constexpr DWORD kPathLength = 0x104;
+constexpr std::uint64_t kMaxBytesPerCall = 0xFFFFFFFF;
+constexpr DWORD kMaxPathLength = 0x104; // with the terminating zero
 constexpr DWORD kShareAll = FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE;
 
 [[noreturn]] void ThrowCallFailed(const char* call)
@@ -17,7 +17,7 @@ constexpr DWORD kShareAll = FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELE
     throw std::runtime_error(std::string(call) + " failed");
 }
 
-// Both are called with flags that OpenFile has looked at.
+// OpenFile has checked the flags before.
 DWORD GetDesiredAccess(int access)
 {
     static constexpr DWORD kAccess[] = {GENERIC_READ, GENERIC_WRITE, GENERIC_READ | GENERIC_WRITE};
@@ -73,7 +73,7 @@ WinCalls::Handle WinCalls::Open(const Path& path, int access, int creation)
 std::uint64_t WinCalls::Read(Handle handle, void* bytes, std::uint64_t nbytes)
 {
     DWORD count = 0;
-    if (::ReadFile(handle, bytes, static_cast<DWORD>(std::min(nbytes, kMostPerCall)), &count,
+    if (::ReadFile(handle, bytes, static_cast<DWORD>(std::min(nbytes, kMaxBytesPerCall)), &count,
                    nullptr) == 0 &&
         ::GetLastError() != ERROR_BROKEN_PIPE)
         ThrowCallFailed("ReadFile");
@@ -83,7 +83,7 @@ std::uint64_t WinCalls::Read(Handle handle, void* bytes, std::uint64_t nbytes)
 std::uint64_t WinCalls::Write(Handle handle, const void* bytes, std::uint64_t nbytes)
 {
     DWORD count = 0;
-    if (::WriteFile(handle, bytes, static_cast<DWORD>(std::min(nbytes, kMostPerCall)), &count,
+    if (::WriteFile(handle, bytes, static_cast<DWORD>(std::min(nbytes, kMaxBytesPerCall)), &count,
                     nullptr) == 0)
         ThrowCallFailed("WriteFile");
     return count;
@@ -113,16 +113,16 @@ void WinCalls::SetEndOfFile(Handle handle)
 
 WinCalls::Path WinCalls::GetTemporaryDirectory()
 {
-    wchar_t buffer[kPathLength] = {};
-    const DWORD length = ::GetTempPathW(kPathLength, buffer);
-    if (length == 0 || length >= kPathLength) // from there on it is the length that was needed
+    wchar_t buffer[kMaxPathLength] = {};
+    const DWORD length = ::GetTempPathW(kMaxPathLength, buffer);
+    if (length == 0 || length >= kMaxPathLength) // a larger value is the length needed
         ThrowCallFailed("GetTempPathW");
     return buffer;
 }
 
 WinCalls::Path WinCalls::MakeTemporaryFileName(const Path& prefix)
 {
-    wchar_t buffer[kPathLength] = {};
+    wchar_t buffer[kMaxPathLength] = {};
     if (::GetTempFileNameW(GetTemporaryDirectory().c_str(), prefix.c_str(), 0, buffer) == 0)
         ThrowCallFailed("GetTempFileNameW");
     return buffer;

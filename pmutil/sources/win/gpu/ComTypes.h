@@ -1,4 +1,4 @@
-// Owners of COM's own things: references, strings and variants.
+// Owners of COM references, strings and variants.
 #pragma once
 
 #include <windows.h>
@@ -25,7 +25,7 @@ namespace pmutil {
 template <typename Interface>
 using ComPtr = boost::intrusive_ptr<Interface>;
 
-// Takes over a reference that a COM call handed out.
+// Takes ownership of a reference that a COM call returned.
 template <typename Interface>
 ComPtr<Interface> TakeReference(Interface* object)
 {
@@ -33,12 +33,12 @@ ComPtr<Interface> TakeReference(Interface* object)
     return ComPtr<Interface>(object, kAlreadyCounted);
 }
 
-// What a failure of COM raises here; no std::exception, as it has no text.
+// Thrown for a failure of COM. It has no text, so it isn't a std::exception.
 struct ComError {
     HRESULT result;
 };
 
-// A string as COM takes it. Throws ComError E_OUTOFMEMORY.
+// A BSTR. The constructor throws ComError E_OUTOFMEMORY.
 class BString {
 public:
     explicit BString(const wchar_t* text) : fText(SysAllocString(text))
@@ -56,7 +56,7 @@ private:
     BSTR fText;
 };
 
-// A variant, cleared at the end of the scope.
+// A VARIANT. The destructor clears it.
 class Variant {
 public:
     Variant() { VariantInit(&fValue); }

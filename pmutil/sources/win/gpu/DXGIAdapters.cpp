@@ -89,7 +89,7 @@ private:
     ComPtr<IDXGIFactory> fFactory;
 };
 
-// Loaded at the first call and kept; null if the system hasn't got it.
+// The first call loads the library for the rest of the process. Null if the system lacks it.
 decltype(&::CreateDXGIFactory) FindCreateFunction()
 {
     static const char* const kNames[] = {"dxgi.dll", nullptr};

@@ -1,4 +1,4 @@
-// The raw adapters through DXGI.
+// Raw adapters by DXGI.
 #pragma once
 
 #include <memory>
@@ -7,6 +7,8 @@
 
 namespace pmutil {
 
+// Makes a factory by CreateDXGIFactory. Fails with HRESULT_FROM_WIN32(ERROR_MOD_NOT_FOUND) if the
+// system has no dxgi.dll.
 ResultCode MakeDXGIAdapterFactory(std::unique_ptr<AdapterFactory>& factory);
 
 } // namespace pmutil

@@ -52,7 +52,7 @@ public:
     ResultCode Next(std::unique_ptr<AdapterRow>& row) override
     {
         IWbemClassObject* object = nullptr;
-        ULONG count = 0; // not consulted: a null row is the end
+        ULONG count = 0; // unused: a null row is the end
         const HRESULT result = fRows->Next(static_cast<LONG>(WBEM_INFINITE), 1, &object, &count);
         row.reset();
         if (object != nullptr)

@@ -1,4 +1,4 @@
-// The management service through WMI.
+// The management service by WMI.
 #pragma once
 
 #include <memory>
@@ -7,6 +7,7 @@
 
 namespace pmutil {
 
+// Makes an unconnected service. Never null.
 std::unique_ptr<ManagementService> MakeWMIService();
 
 } // namespace pmutil
