@@ -39,7 +39,7 @@ void CheckMemory(const std::string& text)
 {
     for (const char* driver : {"i915", "xe", "radeon", "nouveau", "amdgpu"}) {
         // Each answer needs 16 bytes at least, and each of its figures has a place of its own.
-        Require(!pmutil::MemoryInAnswer(driver, text) || text.size() >= 16);
+        Require(!pmutil::ParseDedicatedMemory(driver, text) || text.size() >= 16);
     }
     Require(pmutil::LargestPrefetchableBar(text) != 1);
     Require(pmutil::LargestPrefetchableBar("0x0 0xfffffff 0x220c\n" + text) >= 0x10000000);

@@ -1,5 +1,5 @@
-// Parts of drivers' interfaces that libdrm's headers don't have: xe's is younger than they are, and
-// nouveau's is no C++ there. After include/uapi/drm/xe_drm.h and nouveau_drm.h of Linux 6.12.
+// Structures of driver interfaces that libdrm's headers lack: they have no xe_drm.h, and their
+// nouveau_drm.h isn't valid C++. From include/uapi/drm/xe_drm.h and nouveau_drm.h of Linux 6.12.
 #pragma once
 
 #include <cstdint>

@@ -1,23 +1,24 @@
-// Which files are read, and why none of them wakes a card:
+// The files that are read here don't wake a suspended card:
 // - "vendor", "device", "subsystem_vendor", "subsystem_device" and "revision" of a PCI device print
-//   the kernel's struct pci_dev (drivers/pci/pci-sysfs.c; Documentation/ABI/testing/sysfs-bus-pci).
-//   "config", "vpd", "rom" and the link speeds would resume the device and are left alone.
-// - "status" and "modes" of a connector print what the last detection found; only writing to
-//   "status" detects anew (drivers/gpu/drm/drm_sysfs.c). "modes" takes the lock of its list, which
-//   a detection under way may hold for a moment, so it is read where a display is attached only.
-// - amdgpu's "mem_info_vram_total" and "mem_info_gtt_total" print sizes kept since the driver
-//   started (drivers/gpu/drm/amd/amdgpu/amdgpu_vram_mgr.c, amdgpu_gtt_mgr.c;
+//   fields of the kernel's struct pci_dev (drivers/pci/pci-sysfs.c;
+//   Documentation/ABI/testing/sysfs-bus-pci). "config", "vpd", "rom" and the link speeds resume the
+//   device and aren't read.
+// - "status" and "modes" of a connector print the result of the last detection; only a write to
+//   "status" starts a new one (drivers/gpu/drm/drm_sysfs.c). "modes" takes the lock of the list of
+//   modes, which a running detection may hold, so it is read only if a display is attached.
+// - amdgpu's "mem_info_vram_total" and "mem_info_gtt_total" print sizes that are set when the
+//   driver starts (drivers/gpu/drm/amd/amdgpu/amdgpu_vram_mgr.c, amdgpu_gtt_mgr.c;
 //   Documentation/gpu/amdgpu/driver-misc.rst), unlike its clocks and sensors.
-// - "resource" prints the kernel's own table of the function's BARs (drivers/pci/pci-sysfs.c,
-//   resource_show). Of the "hwmon" folder, which i915 and xe register for discrete cards only
-//   (i915_hwmon_register, xe_hwmon_register), the presence says enough; its files would wake the
-//   card.
-// - A render node is opened only while "power/runtime_status" says "active"; the state is the
-//   kernel's own variable (drivers/base/power/sysfs.c). DrmQuery.cpp tells what opening does.
+// - "resource" prints the kernel's table of the function's BARs (drivers/pci/pci-sysfs.c,
+//   resource_show). i915 and xe register the "hwmon" folder for discrete cards only
+//   (i915_hwmon_register, xe_hwmon_register); only its presence is checked, since its files wake
+//   the card.
+// - A render node is opened only while "power/runtime_status" is "active"; the state is a variable
+//   of the kernel (drivers/base/power/sysfs.c). DrmQuery.cpp describes the effect of opening one.
 // - /sys/module/NAME/version and the links "driver" and "module" belong to the module, not to a
 //   device (Documentation/ABI/stable/sysfs-module).
-// - /proc/driver/nvidia/version belongs to the module as well, and listing the folder of its cards
-//   asks no card. NvidiaProc.cpp tells of the one file there that does.
+// - /proc/driver/nvidia/version also belongs to the module, and listing the folder of its cards
+//   accesses no card. NvidiaProc.cpp describes the one file there that does.
 #include "linux/gpu/DrmAdapters.h"
 
 #include <algorithm>
@@ -37,9 +38,9 @@ namespace pmutil {
 namespace {
 
 const char kDrmClass[] = "/sys/class/drm/";
-constexpr std::uint32_t kMaxModeSize = 1U << 16;
+constexpr std::uint32_t kMaxModeSize = 1U << 16; // pixels
 
-// The DRM nodes of one adapter, in the order of their names.
+// The DRM nodes of one adapter, sorted by name.
 using Nodes = std::vector<QGF::DrmNode>;
 
 std::map<std::string, Nodes> NodesByPlace()
@@ -61,10 +62,10 @@ std::string RenderNodeOf(const Nodes& nodes)
     return node == nodes.end() ? std::string() : node->name;
 }
 
-std::uint32_t ReadId(const std::string& path, std::uint32_t limit)
+std::uint32_t ReadId(const std::string& path, std::uint32_t max)
 {
     std::uint64_t id = 0;
-    return ReadSystemNumber(path, id) && id <= limit ? static_cast<std::uint32_t>(id) : 0;
+    return ReadSystemNumber(path, id) && id <= max ? static_cast<std::uint32_t>(id) : 0;
 }
 
 void ReadIds(const std::string& folder, DrmAdapter& adapter)
@@ -82,20 +83,20 @@ std::optional<std::uint64_t> ReadSize(const std::string& path)
     return ReadSystemNumber(path, bytes) ? std::optional<std::uint64_t>(bytes) : std::nullopt;
 }
 
-// The driver's own figure; 0 if it says that the card has no memory of its own.
-std::optional<std::uint64_t> AskForMemory(const std::string& folder, const Nodes& nodes,
-                                          const std::string& driver)
+// The driver's figure in bytes; 0 if the card has no dedicated memory.
+std::optional<std::uint64_t> QueryMemory(const std::string& folder, const Nodes& nodes,
+                                         const std::string& driver)
 {
     const std::string node = RenderNodeOf(nodes);
-    if (node.empty() || !AnswersOnDrmNode(driver) ||
+    if (node.empty() || !HasDrmQuery(driver) ||
         QGF::ReadSystemLine(folder + "power/runtime_status") != "active")
         return std::nullopt;
-    return MemoryInAnswer(driver, AskDrmNode(node, driver));
+    return ParseDedicatedMemory(driver, QueryDrmNode(node, driver));
 }
 
-// For a card whose driver gives no figure. Intel's processors have their graphics at 00:02; a card
-// at that place, as virtual machines put it, is known by its sensors.
-bool HasOwnMemory(const std::string& folder, const DrmAdapter& adapter)
+// Guesses for a card whose driver reports no figure. Intel's integrated graphics are at 00:02.x; a
+// discrete card at that address, as in virtual machines, is recognised by its sensors.
+bool HasDedicatedMemory(const std::string& folder, const DrmAdapter& adapter)
 {
     if (adapter.vendor == kVendorIntel) {
         return adapter.place.compare(0, 11, "0000:00:02.") != 0 ||
@@ -110,8 +111,8 @@ void ReadMemory(const std::string& folder, const Nodes& nodes, DrmAdapter& adapt
     adapter.sharedBytes = ReadSize(folder + "mem_info_gtt_total");
     if (adapter.dedicatedBytes)
         return;
-    adapter.dedicatedBytes = AskForMemory(folder, nodes, adapter.driver);
-    if (!adapter.dedicatedBytes && HasOwnMemory(folder, adapter)) {
+    adapter.dedicatedBytes = QueryMemory(folder, nodes, adapter.driver);
+    if (!adapter.dedicatedBytes && HasDedicatedMemory(folder, adapter)) {
         std::string resource;
         QGF::ReadSystemFile(folder + "resource", resource);
         adapter.dedicatedBytes = LargestPrefetchableBar(resource);
@@ -120,7 +121,7 @@ void ReadMemory(const std::string& folder, const Nodes& nodes, DrmAdapter& adapt
         adapter.dedicatedBytes.reset();
 }
 
-// The module behind a device's driver, or the driver itself where it is built into the kernel.
+// The module of a device's driver, or the driver's name if it is built into the kernel.
 std::string ModuleOf(const std::string& device)
 {
     std::string module = QGF::LastOfPath(QGF::ReadSystemLink(device + "driver/module"));
@@ -129,9 +130,9 @@ std::string ModuleOf(const std::string& device)
     return QGF::LastOfPath(QGF::ReadSystemLink(device + "driver"));
 }
 
-// The folder of the device that the adapter's nodes belong to: the adapter's own if one is its or
-// none is anyone's, else the one below it that has the render node. A firmware framebuffer is no
-// driver's.
+// The folder of the device that the adapter's nodes belong to: the adapter's own folder if a node
+// belongs to the adapter itself or there is no node, else the device below it that has the render
+// node. Firmware framebuffers don't count, since they don't belong to the adapter's driver.
 std::string DeviceOfNodes(const std::string& folder, const std::string& place, const Nodes& nodes)
 {
     const QGF::DrmNode* best = nullptr;
@@ -146,17 +147,17 @@ std::string DeviceOfNodes(const std::string& folder, const std::string& place, c
     return best == nullptr ? folder : best->device + "/";
 }
 
-// The driver that draws. virtio's own devices are only the transport of the one below them, whose
-// nodes they have all the same (virtio_gpu_probe in drivers/gpu/drm/virtio/virtgpu_drv.c).
-std::string DrawingDriver(const std::string& device)
+// The graphics driver. A virtio transport device has the DRM nodes, but the graphics driver is
+// bound to the virtio device below it (virtio_gpu_probe in drivers/gpu/drm/virtio/virtgpu_drv.c).
+std::string GraphicsDriver(const std::string& device)
 {
     std::string driver = ModuleOf(device);
     if (driver.compare(0, 7, "virtio_") == 0 || driver.compare(0, 7, "virtio-") == 0) {
         for (const std::string& name : QGF::ListSystemFolder(device)) {
-            std::string carried =
+            std::string child =
                 name.compare(0, 6, "virtio") == 0 ? ModuleOf(device + name + "/") : std::string();
-            if (!carried.empty())
-                return carried;
+            if (!child.empty())
+                return child;
         }
     }
     return driver;
@@ -164,7 +165,7 @@ std::string DrawingDriver(const std::string& device)
 
 void ReadDriver(const std::string& folder, const Nodes& nodes, DrmAdapter& adapter)
 {
-    adapter.driver = DrawingDriver(DeviceOfNodes(folder, adapter.place, nodes));
+    adapter.driver = GraphicsDriver(DeviceOfNodes(folder, adapter.place, nodes));
     if (adapter.driver.empty())
         return;
     adapter.driverVersion = QGF::ReadSystemLine("/sys/module/" + adapter.driver + "/version");
@@ -180,7 +181,7 @@ void ReadDriver(const std::string& folder, const Nodes& nodes, DrmAdapter& adapt
         adapter.driverVersion = QGF::ReadSystemLine("/proc/sys/kernel/osrelease");
 }
 
-// False if the connector has gone since it was listed.
+// Returns false if the connector was removed after it was listed.
 bool ReadConnector(const std::string& folder, DrmConnector& connector)
 {
     const std::string status = QGF::ReadSystemLine(folder + "/status");
@@ -244,15 +245,15 @@ std::vector<DrmAdapter> ReadDrmAdapters()
     return adapters;
 }
 
-std::shared_ptr<const std::vector<DrmAdapter>> KnownDrmAdapters()
+std::shared_ptr<const std::vector<DrmAdapter>> CachedDrmAdapters()
 {
-    static std::shared_ptr<const std::vector<DrmAdapter>> gKnown;
+    static std::shared_ptr<const std::vector<DrmAdapter>> gCached;
     static unsigned gRootCount = 0;
-    if (!gKnown || gRootCount != QGF::SystemRootCount()) {
+    if (!gCached || gRootCount != QGF::SystemRootCount()) {
         gRootCount = QGF::SystemRootCount();
-        gKnown = std::make_shared<const std::vector<DrmAdapter>>(ReadDrmAdapters());
+        gCached = std::make_shared<const std::vector<DrmAdapter>>(ReadDrmAdapters());
     }
-    return gKnown;
+    return gCached;
 }
 
 bool ParseModeSize(const std::string& mode, std::uint32_t& width, std::uint32_t& height)

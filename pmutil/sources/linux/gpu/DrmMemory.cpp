@@ -18,9 +18,9 @@ namespace {
 
 using Bytes = std::optional<std::uint64_t>;
 
-// The structure at an offset of an answer; false if the answer ends before it does.
+// Copies the structure at an offset of an answer. Returns false if the answer is too short.
 template <typename Structure>
-bool At(const std::string& answer, std::size_t offset, Structure& structure)
+bool ReadAt(const std::string& answer, std::size_t offset, Structure& structure)
 {
     if (offset > answer.size() || answer.size() - offset < sizeof structure)
         return false;
@@ -35,23 +35,23 @@ Bytes Sum(Bytes total, std::uint64_t bytes)
                : std::nullopt;
 }
 
-// A head, followed by as many regions as it says. An answer that is cut short is none.
+// Adds up the regions after a head of `headSize` bytes. Returns nothing if the answer is too short.
 template <typename Region, typename Local>
 Bytes LocalMemory(const std::string& answer, std::size_t headSize, std::size_t count, Local local)
 {
     Bytes total = 0;
     for (std::size_t i = 0; total && i != count; ++i) {
         Region region{};
-        total = At(answer, headSize + i * sizeof region, region) ? Sum(total, local(region))
-                                                                 : std::nullopt;
+        total = ReadAt(answer, headSize + i * sizeof region, region) ? Sum(total, local(region))
+                                                                     : std::nullopt;
     }
     return count == 0 ? std::nullopt : total;
 }
 
-Bytes InI915Answer(const std::string& answer)
+Bytes ParseI915(const std::string& answer)
 {
-    drm_i915_query_memory_regions head; // not {}: it ends in a zero-size array, an extension
-    if (!At(answer, 0, head))
+    drm_i915_query_memory_regions head{};
+    if (!ReadAt(answer, 0, head))
         return std::nullopt;
     return LocalMemory<drm_i915_memory_region_info>(
         answer, sizeof head, head.num_regions, [](const drm_i915_memory_region_info& region) {
@@ -59,10 +59,10 @@ Bytes InI915Answer(const std::string& answer)
         });
 }
 
-Bytes InXeAnswer(const std::string& answer)
+Bytes ParseXe(const std::string& answer)
 {
     XeRegionsHead head{};
-    if (!At(answer, 0, head))
+    if (!ReadAt(answer, 0, head))
         return std::nullopt;
     return LocalMemory<XeRegion>(
         answer, sizeof head, head.num_mem_regions, [](const XeRegion& region) {
@@ -70,39 +70,41 @@ Bytes InXeAnswer(const std::string& answer)
         });
 }
 
-Bytes InRadeonAnswer(const std::string& answer)
+Bytes ParseRadeon(const std::string& answer)
 {
     drm_radeon_gem_info info{};
-    return At(answer, 0, info) ? Bytes(info.vram_size) : std::nullopt;
+    return ReadAt(answer, 0, info) ? Bytes(info.vram_size) : std::nullopt;
 }
 
-Bytes InNouveauAnswer(const std::string& answer)
+Bytes ParseNouveau(const std::string& answer)
 {
     NouveauParameter parameter{};
-    return At(answer, 0, parameter) && parameter.param == kNouveauFbSize ? Bytes(parameter.value)
-                                                                         : std::nullopt;
+    return ReadAt(answer, 0, parameter) && parameter.param == kNouveauFbSize
+               ? Bytes(parameter.value)
+               : std::nullopt;
 }
 
-struct Reader {
+struct Parser {
     const char* driver;
-    Bytes (*read)(const std::string& answer);
+    Bytes (*parse)(const std::string& answer);
 };
 
-constexpr Reader kReaders[] = {
-    {"i915", InI915Answer},
-    {"xe", InXeAnswer},
-    {"radeon", InRadeonAnswer},
-    {"nouveau", InNouveauAnswer},
+constexpr Parser kParsers[] = {
+    {"i915", ParseI915},
+    {"xe", ParseXe},
+    {"radeon", ParseRadeon},
+    {"nouveau", ParseNouveau},
 };
 
 } // namespace
 
-std::optional<std::uint64_t> MemoryInAnswer(const std::string& driver, const std::string& answer)
+std::optional<std::uint64_t> ParseDedicatedMemory(const std::string& driver,
+                                                  const std::string& answer)
 {
-    const auto* const reader =
-        std::find_if(std::begin(kReaders), std::end(kReaders),
-                     [&](const Reader& candidate) { return candidate.driver == driver; });
-    return reader == std::end(kReaders) ? std::nullopt : reader->read(answer);
+    const auto* const parser =
+        std::find_if(std::begin(kParsers), std::end(kParsers),
+                     [&](const Parser& candidate) { return candidate.driver == driver; });
+    return parser == std::end(kParsers) ? std::nullopt : parser->parse(answer);
 }
 
 std::uint64_t LargestPrefetchableBar(const std::string& resource)

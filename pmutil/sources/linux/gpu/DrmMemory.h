@@ -1,5 +1,5 @@
-// What the kernel's texts and the drivers' answers say of a card's own memory. Nothing is fetched
-// here: a test can feed all of it.
+// Parses the size of a card's dedicated memory from drivers' answers and kernel texts. No file is
+// read here.
 #pragma once
 
 #include <cstdint>
@@ -8,15 +8,15 @@
 
 namespace pmutil {
 
-// The bytes of a card's own memory by what its driver has answered (AskDrmNode); 0 if it answered
-// that there is none, nothing if that is no answer of that driver. Memory of several tiles is added
-// up.
-std::optional<std::uint64_t> MemoryInAnswer(const std::string& driver, const std::string& answer);
+// Returns the bytes of dedicated memory from the driver's answer to QueryDrmNode: the sum over all
+// tiles, 0 if the card has none. Returns nothing if `answer` is not an answer of that driver.
+std::optional<std::uint64_t> ParseDedicatedMemory(const std::string& driver,
+                                                  const std::string& answer);
 
-// The size in bytes of the largest prefetchable memory BAR by the text of a PCI function's
-// "resource" file; 0 if there is none. Only the first six lines are BARs. It is what the processor
-// can see of the card's memory: often less than there is, and once it has been resized the power of
-// two that holds it.
+// Returns the size in bytes of the largest prefetchable memory BAR in the text of a PCI function's
+// "resource" file; 0 if there is none. Only the first six lines are BARs. A BAR shows the part of
+// the card's memory that the processor can access: often less than all of it, or, after a resize,
+// its size rounded up to a power of two.
 std::uint64_t LargestPrefetchableBar(const std::string& resource);
 
 } // namespace pmutil

@@ -1,10 +1,11 @@
-// Which ioctls are used: each is open to whoever may open the render node (DRM_RENDER_ALLOW in the
-// tables of i915_driver.c, xe_device.c, radeon_drv.c and nouveau_drm.c of Linux 6.12) and gives
-// figures that the driver keeps. But taking the answer wakes a sleeping card:
-// radeon_driver_open_kms and nouveau_drm_open resume it when the node is opened, xe_drm_ioctl at
-// every ioctl, and i915_gem_open sets up page tables, on a discrete card in its own memory.
+// The ioctls need no other right than to open the render node (DRM_RENDER_ALLOW in the tables of
+// i915_driver.c, xe_device.c, radeon_drv.c and nouveau_drm.c of Linux 6.12) and return figures that
+// the driver has stored. But they wake a suspended card: radeon_driver_open_kms and
+// nouveau_drm_open resume it when the node is opened, xe_drm_ioctl at every ioctl, and
+// i915_gem_open sets up page tables, on a discrete card in its own memory.
 //
-// libdrm gives the structures at compile time. Its drmIoctl would only repeat an interrupted call.
+// libdrm's headers supply the structures. Its drmIoctl isn't used: it adds only the retry of an
+// interrupted call.
 #include "linux/gpu/DrmQuery.h"
 
 #include <algorithm>
@@ -25,7 +26,8 @@
 namespace pmutil {
 namespace {
 
-constexpr std::size_t kAnswerLimit = QGF::kMaxSystemFileSize; // bytes; room for 46 regions
+// Bytes; enough for 46 regions. A recorded answer is read from a file of at most this size.
+constexpr std::size_t kMaxAnswerSize = QGF::kMaxSystemFileSize;
 constexpr int kMaxTries = 16;
 
 class Node {
@@ -41,8 +43,8 @@ public:
     Node(const Node&) = delete;
     Node& operator=(const Node&) = delete;
 
-    // Kernel and driver may break a call off for it to be made again.
-    bool ask(unsigned long request, void* argument) const
+    // Repeats a call that fails with EINTR or EAGAIN, at most kMaxTries times.
+    bool ioctl(unsigned long request, void* argument) const
     {
         for (int i = 0; fNode >= 0 && i != kMaxTries; ++i) {
             if (fCalls.ioctl(fNode, request, argument) >= 0)
@@ -69,67 +71,68 @@ std::string Bytes(const Argument& argument)
     return std::string(reinterpret_cast<const char*>(&argument), sizeof argument);
 }
 
-// The driver first says how much there is to tell, then tells it. A second length that differs is
-// no answer.
-std::string AskI915(const Node& node)
+// The first call returns the length, the second the data. A second length that differs from the
+// first is a failure.
+std::string QueryI915(const Node& node)
 {
     drm_i915_query_item item{};
     item.query_id = DRM_I915_QUERY_MEMORY_REGIONS;
     drm_i915_query query{};
     query.num_items = 1;
     query.items_ptr = AddressOf(&item);
-    if (!node.ask(DRM_IOCTL_I915_QUERY, &query) || item.length <= 0 ||
-        static_cast<std::size_t>(item.length) > kAnswerLimit)
+    if (!node.ioctl(DRM_IOCTL_I915_QUERY, &query) || item.length <= 0 ||
+        static_cast<std::size_t>(item.length) > kMaxAnswerSize)
         return std::string();
     std::string answer(static_cast<std::size_t>(item.length), '\0');
     item.data_ptr = AddressOf(answer.data());
     const std::int32_t length = item.length;
-    return node.ask(DRM_IOCTL_I915_QUERY, &query) && item.length == length ? answer : std::string();
+    return node.ioctl(DRM_IOCTL_I915_QUERY, &query) && item.length == length ? answer
+                                                                             : std::string();
 }
 
-std::string AskXe(const Node& node)
+std::string QueryXe(const Node& node)
 {
     XeDeviceQuery query{};
     query.query = kXeQueryMemRegions;
-    if (!node.ask(kXeIoctlDeviceQuery, &query) || query.size == 0 || query.size > kAnswerLimit)
+    if (!node.ioctl(kXeIoctlDeviceQuery, &query) || query.size == 0 || query.size > kMaxAnswerSize)
         return std::string();
     std::string answer(query.size, '\0');
     query.data = AddressOf(answer.data());
-    return node.ask(kXeIoctlDeviceQuery, &query) && query.size == answer.size() ? answer
-                                                                                : std::string();
+    return node.ioctl(kXeIoctlDeviceQuery, &query) && query.size == answer.size() ? answer
+                                                                                  : std::string();
 }
 
-std::string AskRadeon(const Node& node)
+std::string QueryRadeon(const Node& node)
 {
     drm_radeon_gem_info info{};
-    return node.ask(DRM_IOCTL_RADEON_GEM_INFO, &info) ? Bytes(info) : std::string();
+    return node.ioctl(DRM_IOCTL_RADEON_GEM_INFO, &info) ? Bytes(info) : std::string();
 }
 
-std::string AskNouveau(const Node& node)
+std::string QueryNouveau(const Node& node)
 {
     NouveauParameter parameter{};
     parameter.param = kNouveauFbSize;
-    return node.ask(kNouveauIoctlGetParam, &parameter) ? Bytes(parameter) : std::string();
+    return node.ioctl(kNouveauIoctlGetParam, &parameter) ? Bytes(parameter) : std::string();
 }
 
-struct Question {
+struct Query {
     const char* driver;
-    std::string (*ask)(const Node& node);
+    std::string (*run)(const Node& node);
 };
 
-constexpr Question kQuestions[] = {
-    {"i915", AskI915},
-    {"xe", AskXe},
-    {"radeon", AskRadeon},
-    {"nouveau", AskNouveau},
+constexpr Query kQueries[] = {
+    {"i915", QueryI915},
+    {"xe", QueryXe},
+    {"radeon", QueryRadeon},
+    {"nouveau", QueryNouveau},
 };
 
-const Question* QuestionFor(const std::string& driver)
+const Query* FindQuery(const std::string& driver)
 {
-    const auto* const question =
-        std::find_if(std::begin(kQuestions), std::end(kQuestions),
-                     [&](const Question& candidate) { return candidate.driver == driver; });
-    return question == std::end(kQuestions) ? nullptr : question;
+    const auto* const query =
+        std::find_if(std::begin(kQueries), std::end(kQueries),
+                     [&](const Query& candidate) { return candidate.driver == driver; });
+    return query == std::end(kQueries) ? nullptr : query;
 }
 
 } // namespace
@@ -145,21 +148,21 @@ const DrmCalls& SystemDrmCalls()
     return gCalls;
 }
 
-bool AnswersOnDrmNode(const std::string& driver)
+bool HasDrmQuery(const std::string& driver)
 {
-    return QuestionFor(driver) != nullptr;
+    return FindQuery(driver) != nullptr;
 }
 
-std::string AskDrmNode(const DrmCalls& calls, const std::string& node, const std::string& driver)
+std::string QueryDrmNode(const DrmCalls& calls, const std::string& node, const std::string& driver)
 {
-    const Question* const question = QuestionFor(driver);
-    return question != nullptr ? question->ask(Node(calls, node)) : std::string();
+    const Query* const query = FindQuery(driver);
+    return query != nullptr ? query->run(Node(calls, node)) : std::string();
 }
 
-std::string AskDrmNode(const std::string& node, const std::string& driver)
+std::string QueryDrmNode(const std::string& node, const std::string& driver)
 {
     if (QGF::SystemRoot().empty())
-        return AskDrmNode(SystemDrmCalls(), node, driver);
+        return QueryDrmNode(SystemDrmCalls(), node, driver);
     std::string answer;
     QGF::ReadSystemFile("/dev/dri/" + node + "." + driver, answer);
     return answer;

@@ -16,8 +16,8 @@
 namespace pmutil {
 namespace {
 
-// The results that Windows' own services give for the same: a property that isn't there, the end of
-// a list, a device that is gone.
+// The codes that Windows returns for a missing property (WBEM_E_NOT_FOUND), the end of a list
+// (DXGI_ERROR_NOT_FOUND) and a removed device (DXGI_ERROR_DEVICE_REMOVED).
 constexpr ResultCode kPropertyNotFound = static_cast<ResultCode>(0x80041002U);
 constexpr ResultCode kNotFound = static_cast<ResultCode>(0x887A0002U);
 constexpr ResultCode kDeviceRemoved = static_cast<ResultCode>(0x887A0005U);
@@ -34,7 +34,7 @@ void Store(const std::string& text, std::array<char16_t, size>& field)
     std::copy_n(wide.begin(), std::min(wide.size(), size - 1), field.begin());
 }
 
-// A recorded machine has its own memory; the real one is asked as everyone else asks it.
+// A recorded machine's memory comes from its /proc/meminfo.
 bool PhysicalMemory(std::uint64_t& bytes)
 {
     if (!QGF::SystemRoot().empty()) {
@@ -70,9 +70,9 @@ PropertyValue Memory(const std::optional<std::uint64_t>& bytes)
     PropertyValue value;
     value.type = PropertyValue::kNull;
     if (bytes) {
-        constexpr std::uint64_t kMost = std::numeric_limits<std::uint32_t>::max();
+        constexpr std::uint64_t kMaxBytes = std::numeric_limits<std::uint32_t>::max();
         value.type = PropertyValue::kInt32;
-        value.integer = static_cast<std::int32_t>(std::min(*bytes, kMost));
+        value.integer = static_cast<std::int32_t>(std::min(*bytes, kMaxBytes));
     }
     return value;
 }
@@ -127,11 +127,11 @@ public:
     }
 
 private:
-    const std::shared_ptr<const std::vector<DrmAdapter>> fAdapters = KnownDrmAdapters();
+    const std::shared_ptr<const std::vector<DrmAdapter>> fAdapters = CachedDrmAdapters();
     std::size_t fNext = 0;
 };
 
-// The kernel's files need no connection: only the query does anything.
+// The kernel's files need no connection, so only QueryAdapters does something.
 class LinuxService : public ManagementService {
 public:
     ResultCode Initialize() override { return 0; }
@@ -171,16 +171,16 @@ class LinuxAdapter : public Adapter {
 public:
     explicit LinuxAdapter(DrmAdapter adapter) : fAdapter(std::move(adapter))
     {
-        // A card without a monitor, or made for computing and without connectors, is a device like
-        // any other: what it renders with stands in for an attached output.
+        // A card without a monitor or without connectors can render too. Give it an attached output
+        // with the name of its render node, since adapters without one are left out.
         const bool attached =
             std::any_of(fAdapter.connectors.begin(), fAdapter.connectors.end(),
                         [](const DrmConnector& connector) { return connector.connected == true; });
         if (!attached && fAdapter.renders) {
-            DrmConnector standIn;
-            standIn.name = fAdapter.renderName;
-            standIn.connected = true;
-            fAdapter.connectors.push_back(standIn);
+            DrmConnector connector;
+            connector.name = fAdapter.renderName;
+            connector.connected = true;
+            fAdapter.connectors.push_back(connector);
         }
     }
 
@@ -206,13 +206,16 @@ public:
     }
 
 private:
+    // The driver's figure, else half of the physical memory for an integrated adapter.
     std::uint64_t SharedMemory() const
     {
         if (fAdapter.sharedBytes)
             return *fAdapter.sharedBytes;
-        const bool maker = fAdapter.vendor == kVendorIntel || fAdapter.vendor == kVendorAMD;
+        const bool mayBeIntegrated =
+            fAdapter.vendor == kVendorIntel || fAdapter.vendor == kVendorAMD;
         std::uint64_t installed = 0;
-        if (!maker || fAdapter.dedicatedBytes.value_or(0) != 0 || !PhysicalMemory(installed))
+        if (!mayBeIntegrated || fAdapter.dedicatedBytes.value_or(0) != 0 ||
+            !PhysicalMemory(installed))
             return 0;
         return installed / 2;
     }
@@ -231,7 +234,7 @@ public:
     }
 
 private:
-    const std::shared_ptr<const std::vector<DrmAdapter>> fAdapters = KnownDrmAdapters();
+    const std::shared_ptr<const std::vector<DrmAdapter>> fAdapters = CachedDrmAdapters();
 };
 
 class LinuxSource : public AdapterSource {

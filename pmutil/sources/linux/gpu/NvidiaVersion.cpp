@@ -13,7 +13,7 @@ namespace {
 
 constexpr int kFirstYear = 1990; // no driver is older
 
-// The zones of the driver's own builders, in minutes east of Greenwich.
+// The time zones in the driver's build dates, in minutes east of UTC.
 struct Zone {
     const char* name;
     int minutes;

@@ -1,4 +1,4 @@
-// Numbers as the kernel prints them.
+// Parses numbers that the kernel prints.
 #pragma once
 
 #include <cstdint>
@@ -6,14 +6,15 @@
 
 namespace pmutil {
 
-// A line that is one number and nothing else, in decimal or hexadecimal with "0x". False, with
-// `number` left alone, for anything else, for a sign and for what 64 bits don't hold.
+// Parses a line that is a single number, decimal or hexadecimal with "0x". Returns false, with
+// `number` unchanged, for any other text, for a sign and on overflow.
 bool ParseSystemNumber(const std::string& line, std::uint64_t& number);
 
-// The first line of that file under the system root as such a number.
+// Parses the first line of a file under the system root in the same way.
 bool ReadSystemNumber(const std::string& path, std::uint64_t& number);
 
-// MemTotal of the text of /proc/meminfo, in bytes.
+// Parses MemTotal in the text of /proc/meminfo, in bytes. Returns false, with `bytes` unchanged, if
+// it is missing or malformed.
 bool ParseMemoryTotal(const std::string& meminfo, std::uint64_t& bytes);
 
 } // namespace pmutil

@@ -15,7 +15,7 @@ DrmAdapter OnlyAdapter()
     return adapters.size() == 1 ? adapters[0] : DrmAdapter();
 }
 
-TEST(DrmAdaptersTest, AModesSizeIsInItsName)
+TEST(DrmAdaptersTest, AModesSizeIsParsedFromItsName)
 {
     std::uint32_t width = 0;
     std::uint32_t height = 0;
@@ -27,7 +27,7 @@ TEST(DrmAdaptersTest, AModesSizeIsInItsName)
     EXPECT_EQ(height, 576U);
 }
 
-TEST(DrmAdaptersTest, OtherTextsAreNoModes)
+TEST(DrmAdaptersTest, OtherTextsAreNotModes)
 {
     for (const char* mode : {"", "x", "1920", "1920x", "x1080", "0x1080", "1920x0", "-1x1", "1x-1",
                              "65537x1", "1x65537", "99999999999x1", "1920x1080p", "1920 x 1080"}) {
@@ -91,7 +91,7 @@ TEST(DrmAdaptersTest, ACardWithoutADriverHasNoDriverStrings)
     EXPECT_EQ(OnlyAdapter().driverVersion, "");
 }
 
-TEST(DrmAdaptersTest, TheNvidiaDriverTellsItsVersionAndDate)
+TEST(DrmAdaptersTest, TheNvidiaDriverReportsVersionAndDate)
 {
     const AdapterTree tree("nvidia-no-drm");
     EXPECT_EQ(OnlyAdapter().driverVersion, "550.54.15");
@@ -100,7 +100,7 @@ TEST(DrmAdaptersTest, TheNvidiaDriverTellsItsVersionAndDate)
     EXPECT_EQ(OnlyAdapter().driverVersion, "550.54.16");
 }
 
-TEST(DrmAdaptersTest, TheNvidiaDriversEntryStandsInForARenderNode)
+TEST(DrmAdaptersTest, TheNvidiaDriversEntryReplacesARenderNode)
 {
     const AdapterTree tree("nvidia-no-drm");
     EXPECT_TRUE(OnlyAdapter().renders);
@@ -109,7 +109,7 @@ TEST(DrmAdaptersTest, TheNvidiaDriversEntryStandsInForARenderNode)
     EXPECT_FALSE(OnlyAdapter().renders);
 }
 
-TEST(DrmAdaptersTest, ATransportsDriverIsNotTheCards)
+TEST(DrmAdaptersTest, TheDriverIsThatBelowTheTransport)
 {
     const AdapterTree tree("virtio-gpu");
     EXPECT_EQ(OnlyAdapter().driver, "virtio_gpu");
@@ -117,8 +117,8 @@ TEST(DrmAdaptersTest, ATransportsDriverIsNotTheCards)
     EXPECT_EQ(OnlyAdapter().driver, "virtio_pci");
 }
 
-// As a driver has it that makes its nodes for the virtio device itself.
-TEST(DrmAdaptersTest, NorIsItWhereTheNodesBelongToTheDeviceBelow)
+// Some drivers make the nodes for the virtio device.
+TEST(DrmAdaptersTest, TheDriverIsThatBelowTheTransportIfItHasTheNodes)
 {
     const AdapterTree tree("virtio-gpu");
     for (const std::string node : {"card0", "renderD128"}) {
@@ -132,7 +132,7 @@ TEST(DrmAdaptersTest, NorIsItWhereTheNodesBelongToTheDeviceBelow)
     EXPECT_EQ(OnlyAdapter().driver, "virtio_gpu");
 }
 
-TEST(DrmAdaptersTest, AFirmwareFramebuffersDriverIsNotTheCards)
+TEST(DrmAdaptersTest, AFirmwareFramebuffersDriverIsIgnored)
 {
     for (const char* name : {"nvidia-firmware", "nvidia-firmware-drm"}) {
         const AdapterTree tree(name);
@@ -146,13 +146,13 @@ TEST(DrmAdaptersTest, AFirmwareFramebuffersDriverIsNotTheCards)
 
 const char kArc[] = "/sys/bus/pci/devices/0000:03:00.0/";
 
-TEST(DrmAdaptersTest, TheDriverTellsAnIntelCardsMemory)
+TEST(DrmAdaptersTest, AnIntelCardsMemoryIsQueriedFromItsDriver)
 {
     const AdapterTree tree("intel-arc-i915");
     EXPECT_EQ(OnlyAdapter().dedicatedBytes, 17062428672U);
 }
 
-TEST(DrmAdaptersTest, WithoutItsAnswerTheBarDoes)
+TEST(DrmAdaptersTest, WithoutAnAnswerTheBarIsUsed)
 {
     const AdapterTree tree("intel-arc-i915");
     tree.remove("/dev/dri/renderD128.i915");
@@ -161,14 +161,14 @@ TEST(DrmAdaptersTest, WithoutItsAnswerTheBarDoes)
     EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
 }
 
-TEST(DrmAdaptersTest, ASleepingCardsAnswerIsNotTaken)
+TEST(DrmAdaptersTest, ASuspendedCardIsNotQueried)
 {
     const AdapterTree tree("intel-arc-i915");
     tree.write(std::string(kArc) + "power/runtime_status", "suspended\n");
     EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{16} << 30);
 }
 
-TEST(DrmAdaptersTest, AnAnswerOfNoMemoryIsTakenAtItsWord)
+TEST(DrmAdaptersTest, AnAnswerOfZeroIsAccepted)
 {
     const AdapterTree tree("intel-integrated");
     EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
@@ -176,8 +176,8 @@ TEST(DrmAdaptersTest, AnAnswerOfNoMemoryIsTakenAtItsWord)
     EXPECT_FALSE(OnlyAdapter().dedicatedBytes);
 }
 
-// A virtual machine may have a card where processors have their graphics.
-TEST(DrmAdaptersTest, SensorsTellACardWhereGraphicsOfAProcessorWouldBe)
+// In a virtual machine a discrete card may have the address of integrated graphics.
+TEST(DrmAdaptersTest, SensorsIdentifyADiscreteCardAtTheIntegratedAddress)
 {
     const AdapterTree tree("intel-integrated");
     tree.remove("/dev/dri/renderD128.i915");
@@ -185,14 +185,14 @@ TEST(DrmAdaptersTest, SensorsTellACardWhereGraphicsOfAProcessorWouldBe)
     EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{256} << 20);
 }
 
-TEST(DrmAdaptersTest, IntelsElsewhereAreCards)
+TEST(DrmAdaptersTest, IntelAdaptersElsewhereAreDiscrete)
 {
     const AdapterTree tree("intel-arc-closed");
     tree.remove(std::string(kArc) + "hwmon");
     EXPECT_EQ(OnlyAdapter().dedicatedBytes, std::uint64_t{256} << 20);
 }
 
-TEST(DrmAdaptersTest, TheBarIsNoMeasureOfOtherMakersCards)
+TEST(DrmAdaptersTest, TheBarIsNotUsedForOtherVendors)
 {
     const AdapterTree tree("nouveau");
     tree.remove("/dev/dri/renderD128.nouveau");
@@ -202,7 +202,7 @@ TEST(DrmAdaptersTest, TheBarIsNoMeasureOfOtherMakersCards)
     EXPECT_FALSE(OnlyAdapter().sharedBytes);
 }
 
-TEST(DrmAdaptersTest, ABoardsOwnRendererIsAnAdapterWithoutIds)
+TEST(DrmAdaptersTest, AnAdapterOutsidePciHasNoIds)
 {
     const AdapterTree tree("soc-panfrost");
     const std::vector<DrmAdapter> adapters = ReadDrmAdapters();
@@ -214,16 +214,16 @@ TEST(DrmAdaptersTest, ABoardsOwnRendererIsAnAdapterWithoutIds)
     EXPECT_EQ(adapters[1].renderName, "renderD128");
 }
 
-TEST(DrmAdaptersTest, WhatIsKnownIsReadOnce)
+TEST(DrmAdaptersTest, TheListIsCached)
 {
     const AdapterTree tree("amd-discrete");
-    const auto known = KnownDrmAdapters();
-    EXPECT_EQ(KnownDrmAdapters(), known);
+    const auto known = CachedDrmAdapters();
+    EXPECT_EQ(CachedDrmAdapters(), known);
     tree.refresh();
-    EXPECT_NE(KnownDrmAdapters(), known);
+    EXPECT_NE(CachedDrmAdapters(), known);
 }
 
-TEST(DrmAdaptersTest, BrokenFilesCostTheirFieldsOnly)
+TEST(DrmAdaptersTest, BrokenFilesAffectTheirFieldsOnly)
 {
     const AdapterTree tree("unreadable");
     const std::vector<DrmAdapter> adapters = ReadDrmAdapters();
@@ -240,7 +240,7 @@ TEST(DrmAdaptersTest, BrokenFilesCostTheirFieldsOnly)
     EXPECT_EQ(adapters[1].driver, "gone");
 }
 
-TEST(DrmAdaptersTest, AConnectorThatVanishedIsGoneAndOneThatDoesntTellIsKept)
+TEST(DrmAdaptersTest, ARemovedConnectorIsDroppedAndAnUnknownOneIsKept)
 {
     const AdapterTree tree("unreadable");
     const std::vector<DrmConnector> connectors = ReadDrmAdapters().at(1).connectors;

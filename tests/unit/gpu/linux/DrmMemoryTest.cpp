@@ -50,65 +50,66 @@ std::string XeHead(std::uint32_t count)
     return Bytes(head);
 }
 
-TEST(DrmMemoryTest, I915sLocalRegionsAreTheCards)
+TEST(DrmMemoryTest, I915DeviceRegionsAreDedicated)
 {
-    EXPECT_EQ(MemoryInAnswer("i915", I915Head(2) + I915Region(0, 32 * kGiB) + I915Region(1, 4)),
-              4U);
-    EXPECT_EQ(MemoryInAnswer("i915", I915Head(3) + I915Region(0, 32 * kGiB) + I915Region(1, kGiB) +
-                                         I915Region(1, kGiB)),
+    EXPECT_EQ(
+        ParseDedicatedMemory("i915", I915Head(2) + I915Region(0, 32 * kGiB) + I915Region(1, 4)),
+        4U);
+    EXPECT_EQ(ParseDedicatedMemory("i915", I915Head(3) + I915Region(0, 32 * kGiB) +
+                                               I915Region(1, kGiB) + I915Region(1, kGiB)),
               2 * kGiB);
 }
 
-TEST(DrmMemoryTest, XesVramRegionsAreTheCards)
+TEST(DrmMemoryTest, XeVramRegionsAreDedicated)
 {
-    EXPECT_EQ(MemoryInAnswer("xe", XeHead(3) + XeRegionOf(0, 32 * kGiB) + XeRegionOf(1, kGiB) +
-                                       XeRegionOf(1, kGiB)),
+    EXPECT_EQ(ParseDedicatedMemory("xe", XeHead(3) + XeRegionOf(0, 32 * kGiB) +
+                                             XeRegionOf(1, kGiB) + XeRegionOf(1, kGiB)),
               2 * kGiB);
 }
 
-TEST(DrmMemoryTest, SystemMemoryAloneIsNoneOfItsOwn)
+TEST(DrmMemoryTest, SystemMemoryOnlyIsZero)
 {
-    EXPECT_EQ(MemoryInAnswer("i915", I915Head(1) + I915Region(0, 32 * kGiB)), 0U);
-    EXPECT_EQ(MemoryInAnswer("xe", XeHead(1) + XeRegionOf(0, 32 * kGiB)), 0U);
+    EXPECT_EQ(ParseDedicatedMemory("i915", I915Head(1) + I915Region(0, 32 * kGiB)), 0U);
+    EXPECT_EQ(ParseDedicatedMemory("xe", XeHead(1) + XeRegionOf(0, 32 * kGiB)), 0U);
 }
 
-TEST(DrmMemoryTest, RadeonAndNouveauGiveOneFigure)
+TEST(DrmMemoryTest, RadeonAndNouveauReportOneFigure)
 {
     drm_radeon_gem_info info{};
     info.vram_size = 2 * kGiB;
     info.vram_visible = kGiB;
-    EXPECT_EQ(MemoryInAnswer("radeon", Bytes(info)), 2 * kGiB);
+    EXPECT_EQ(ParseDedicatedMemory("radeon", Bytes(info)), 2 * kGiB);
     NouveauParameter parameter{};
     parameter.param = kNouveauFbSize;
     parameter.value = 6 * kGiB;
-    EXPECT_EQ(MemoryInAnswer("nouveau", Bytes(parameter)), 6 * kGiB);
+    EXPECT_EQ(ParseDedicatedMemory("nouveau", Bytes(parameter)), 6 * kGiB);
     parameter.param = kNouveauFbSize + 1;
-    EXPECT_FALSE(MemoryInAnswer("nouveau", Bytes(parameter)));
+    EXPECT_FALSE(ParseDedicatedMemory("nouveau", Bytes(parameter)));
 }
 
-TEST(DrmMemoryTest, AnAnswerThatIsCutShortIsNone)
+TEST(DrmMemoryTest, ATruncatedAnswerIsRejected)
 {
     const std::string whole = I915Head(2) + I915Region(0, kGiB) + I915Region(1, kGiB);
     for (std::size_t length = 0; length != whole.size(); ++length)
-        EXPECT_FALSE(MemoryInAnswer("i915", whole.substr(0, length))) << length;
-    EXPECT_FALSE(MemoryInAnswer("xe", XeHead(1)));
-    EXPECT_FALSE(MemoryInAnswer("radeon", std::string(23, '\1')));
-    EXPECT_FALSE(MemoryInAnswer("nouveau", std::string(15, '\1')));
-    EXPECT_FALSE(MemoryInAnswer("i915", I915Head(0xFFFFFFFFU) + I915Region(1, kGiB)));
+        EXPECT_FALSE(ParseDedicatedMemory("i915", whole.substr(0, length))) << length;
+    EXPECT_FALSE(ParseDedicatedMemory("xe", XeHead(1)));
+    EXPECT_FALSE(ParseDedicatedMemory("radeon", std::string(23, '\1')));
+    EXPECT_FALSE(ParseDedicatedMemory("nouveau", std::string(15, '\1')));
+    EXPECT_FALSE(ParseDedicatedMemory("i915", I915Head(0xFFFFFFFFU) + I915Region(1, kGiB)));
 }
 
-TEST(DrmMemoryTest, NoRegionsAndMoreThan64BitsAreNoAnswer)
+TEST(DrmMemoryTest, NoRegionsAndOverflowAreRejected)
 {
-    EXPECT_FALSE(MemoryInAnswer("i915", I915Head(0)));
-    EXPECT_FALSE(MemoryInAnswer("xe", XeHead(0)));
-    EXPECT_FALSE(
-        MemoryInAnswer("xe", XeHead(2) + XeRegionOf(1, ~std::uint64_t{0}) + XeRegionOf(1, 1)));
+    EXPECT_FALSE(ParseDedicatedMemory("i915", I915Head(0)));
+    EXPECT_FALSE(ParseDedicatedMemory("xe", XeHead(0)));
+    EXPECT_FALSE(ParseDedicatedMemory("xe", XeHead(2) + XeRegionOf(1, ~std::uint64_t{0}) +
+                                                XeRegionOf(1, 1)));
 }
 
-TEST(DrmMemoryTest, OtherDriversGiveNone)
+TEST(DrmMemoryTest, OtherDriversAreUnknown)
 {
-    EXPECT_FALSE(MemoryInAnswer("amdgpu", std::string(100, '\1')));
-    EXPECT_FALSE(MemoryInAnswer("", ""));
+    EXPECT_FALSE(ParseDedicatedMemory("amdgpu", std::string(100, '\1')));
+    EXPECT_FALSE(ParseDedicatedMemory("", ""));
 }
 
 const char kNothing[] = "0x0000000000000000 0x0000000000000000 0x0000000000000000\n";
@@ -123,13 +124,13 @@ TEST(DrmMemoryTest, TheLargestPrefetchableBarCounts)
               16 * kGiB);
 }
 
-TEST(DrmMemoryTest, OtherRangesAreNoAperture)
+TEST(DrmMemoryTest, OtherRangesAreIgnored)
 {
     EXPECT_EQ(LargestPrefetchableBar(""), 0U);
     EXPECT_EQ(LargestPrefetchableBar(kNothing), 0U);
-    // Registers, and ports.
+    // Registers and ports.
     EXPECT_EQ(LargestPrefetchableBar("0x0 0x3fffffff 0x140204\n0x0 0xff 0x40101\n"), 0U);
-    // The ROM, and what the function lends to its virtual ones, are no BARs of its own.
+    // The lines after the sixth are the ROM and the BARs of virtual functions.
     std::string lines;
     for (int i = 0; i != 6; ++i)
         lines += kNothing;

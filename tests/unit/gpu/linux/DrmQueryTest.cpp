@@ -1,4 +1,4 @@
-// The questions, put to a kernel that answers as the real drivers do.
+// The queries against a fake kernel that behaves like the real drivers.
 #include "linux/gpu/DrmQuery.h"
 
 #include <cerrno>
@@ -21,15 +21,15 @@ using ::testing::IsEmpty;
 
 constexpr int kNode = 7;
 
-// What is behind the node, and what was asked of it.
+// The state of the fake kernel and the recorded calls.
 struct Kernel {
     bool nodeOpens = true;
-    int failures = 0; // the next calls that fail with `error`
+    int failures = 0; // the number of next calls that fail with `error`
     int error = EINTR;
-    std::string answer;    // what the driver has to tell
-    std::string secondary; // what it has to tell when it is asked again, if not the same
+    std::string answer;
+    std::string secondary; // the answer to the second call; empty: the same
     std::vector<std::string> opened;
-    int asked = 0;
+    int ioctls = 0;
     int closed = 0;
 };
 Kernel gKernel;
@@ -45,7 +45,7 @@ const std::string& NextAnswer(bool again)
     return again && !gKernel.secondary.empty() ? gKernel.secondary : gKernel.answer;
 }
 
-// As query_memregion_info: a length of 0 asks for the length; a failure is a negative length.
+// Like query_memregion_info: a length of 0 queries the length; a failure is a negative length.
 int AnswerI915(void* argument)
 {
     auto* query = static_cast<drm_i915_query*>(argument);
@@ -67,7 +67,7 @@ int AnswerI915(void* argument)
     return 0;
 }
 
-// As query_mem_regions: a size of 0 asks for the size, any other must be that one.
+// Like query_mem_regions: a size of 0 queries the size; any other must equal it.
 int AnswerXe(void* argument)
 {
     auto* query = static_cast<XeDeviceQuery*>(argument);
@@ -99,7 +99,7 @@ int AnswerInPlace(void* argument, std::size_t size)
 int Ioctl(int node, unsigned long request, void* argument)
 {
     EXPECT_EQ(node, kNode);
-    ++gKernel.asked;
+    ++gKernel.ioctls;
     if (gKernel.failures > 0) {
         --gKernel.failures;
         errno = gKernel.error;
@@ -131,7 +131,7 @@ constexpr DrmCalls kCalls = {Open, Ioctl, Close};
 
 std::string Ask(const std::string& driver)
 {
-    return AskDrmNode(kCalls, "renderD128", driver);
+    return QueryDrmNode(kCalls, "renderD128", driver);
 }
 
 class DrmQueryTest : public ::testing::TestWithParam<std::pair<const char*, std::size_t>> {
@@ -145,23 +145,23 @@ protected:
     const char* driver() const { return GetParam().first; }
 };
 
-TEST_P(DrmQueryTest, TheAnswerComesAsTheKernelWroteIt)
+TEST_P(DrmQueryTest, TheAnswerIsReturnedUnchanged)
 {
-    EXPECT_TRUE(AnswersOnDrmNode(driver()));
+    EXPECT_TRUE(HasDrmQuery(driver()));
     EXPECT_EQ(Ask(driver()), gKernel.answer);
     EXPECT_THAT(gKernel.opened, ElementsAre("/dev/dri/renderD128"));
     EXPECT_EQ(gKernel.closed, 1);
 }
 
-TEST_P(DrmQueryTest, ANodeThatCantBeOpenedGivesNone)
+TEST_P(DrmQueryTest, ANodeThatCannotBeOpenedIsEmpty)
 {
     gKernel.nodeOpens = false;
     EXPECT_EQ(Ask(driver()), "");
-    EXPECT_EQ(gKernel.asked, 0);
+    EXPECT_EQ(gKernel.ioctls, 0);
     EXPECT_EQ(gKernel.closed, 0);
 }
 
-TEST_P(DrmQueryTest, ACallThatIsBrokenOffIsMadeAgain)
+TEST_P(DrmQueryTest, AnInterruptedCallIsRepeated)
 {
     gKernel.failures = 2;
     EXPECT_EQ(Ask(driver()), gKernel.answer);
@@ -170,29 +170,29 @@ TEST_P(DrmQueryTest, ACallThatIsBrokenOffIsMadeAgain)
     EXPECT_EQ(Ask(driver()), gKernel.answer);
 }
 
-TEST_P(DrmQueryTest, ButNotForEver)
+TEST_P(DrmQueryTest, AnInterruptedCallIsRepeatedAtMost16Times)
 {
     gKernel.failures = 1000;
     EXPECT_EQ(Ask(driver()), "");
     EXPECT_GT(gKernel.failures, 900);
 }
 
-TEST_P(DrmQueryTest, AFailureIsNoAnswer)
+TEST_P(DrmQueryTest, AFailureIsEmpty)
 {
     gKernel.failures = 1;
     gKernel.error = EACCES;
     EXPECT_EQ(Ask(driver()), "");
-    EXPECT_EQ(gKernel.asked, 1);
+    EXPECT_EQ(gKernel.ioctls, 1);
     EXPECT_EQ(gKernel.closed, 1);
 }
 
-TEST_P(DrmQueryTest, ADriverWithNothingToTellGivesNone)
+TEST_P(DrmQueryTest, AnEmptyAnswerIsEmpty)
 {
     gKernel.answer.clear();
     EXPECT_EQ(Ask(driver()), "");
 }
 
-TEST_P(DrmQueryTest, MoreThanAnyCardHasIsNoAnswer)
+TEST_P(DrmQueryTest, AnAnswerAboveTheLimitIsEmpty)
 {
     gKernel.answer = std::string(100000, 'x');
     EXPECT_EQ(Ask(driver()), "");
@@ -204,7 +204,7 @@ INSTANTIATE_TEST_SUITE_P(Drivers, DrmQueryTest,
                                            std::make_pair("radeon", std::size_t{24}),
                                            std::make_pair("nouveau", std::size_t{16})));
 
-TEST(DrmQueriesTest, RegionsThatChangeBetweenTheTwoQuestionsAreNoAnswer)
+TEST(DrmQueriesTest, AnAnswerThatChangesBetweenTheCallsIsEmpty)
 {
     for (const char* driver : {"i915", "xe"}) {
         gKernel = Kernel();
@@ -216,23 +216,23 @@ TEST(DrmQueriesTest, RegionsThatChangeBetweenTheTwoQuestionsAreNoAnswer)
     }
 }
 
-TEST(DrmQueriesTest, OtherDriversAreNotAsked)
+TEST(DrmQueriesTest, OtherDriversAreNotQueried)
 {
     gKernel = Kernel();
     for (const char* driver : {"", "amdgpu", "nvidia", "i9155"}) {
-        EXPECT_FALSE(AnswersOnDrmNode(driver));
+        EXPECT_FALSE(HasDrmQuery(driver));
         EXPECT_EQ(Ask(driver), "");
     }
     EXPECT_THAT(gKernel.opened, IsEmpty());
 }
 
-TEST(DrmQueriesTest, ARecordedMachineAnswersFromAFile)
+TEST(DrmQueriesTest, ARecordedMachinesAnswerIsReadFromAFile)
 {
     const AdapterTree tree("empty");
-    EXPECT_EQ(AskDrmNode("renderD128", "i915"), "");
+    EXPECT_EQ(QueryDrmNode("renderD128", "i915"), "");
     tree.write("/dev/dri/renderD128.i915", std::string("a\0b", 3));
-    EXPECT_EQ(AskDrmNode("renderD128", "i915"), std::string("a\0b", 3));
-    EXPECT_EQ(AskDrmNode("renderD128", "xe"), "");
+    EXPECT_EQ(QueryDrmNode("renderD128", "i915"), std::string("a\0b", 3));
+    EXPECT_EQ(QueryDrmNode("renderD128", "xe"), "");
 }
 
 } // namespace
