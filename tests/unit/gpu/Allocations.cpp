@@ -13,7 +13,7 @@ thread_local bool gArmed = false;
 thread_local std::size_t gLeft = 0;
 std::atomic<std::size_t> gLargeBlocks{0};
 
-// Stands before each block.
+// Precedes each block.
 struct alignas(std::max_align_t) Header {
     std::size_t size;
 };

@@ -1,4 +1,4 @@
-// The two measurements: every OpenCL call they make, what they log and what they give.
+// The two OpenCL measurements: their calls, log lines and results.
 #include <cstdlib>
 #include <initializer_list>
 #include <memory>
@@ -26,8 +26,8 @@ using Lines = std::vector<std::string>;
 
 constexpr char kRequirement[] = "Failed requirement: ciErrNum == CL_SUCCESS";
 
-// Counters of copies that take the given nanoseconds, all in the first copy of each batch of ten.
-// They don't begin at 0, as those of real devices don't.
+// Counters for batches of ten copies that take the given nanoseconds in all; the first copy takes
+// all the time. Like those of real devices they don't begin at 0.
 auto BatchesOf(cl_ulong nanoseconds)
 {
     return [nanoseconds](int event) {
@@ -62,7 +62,7 @@ protected:
     pmutil::GPUImplWin impl;
 };
 
-// A whole bandwidth measurement that ends after one batch.
+// The calls of a bandwidth measurement that ends after one batch.
 const Lines kBandwidthCalls = {
     "clGetDeviceInfo(device 21, 4145, 8)",
     "clCreateContext(4228=7, device 21, null, null)",
@@ -118,7 +118,7 @@ const Lines kBandwidthCalls = {
     "clReleaseContext(context 1)",
 };
 
-// A whole compute measurement.
+// The calls of a compute measurement.
 const Lines kComputeCalls = {
     "clGetDeviceInfo(device 21, 4145, 8)",
     "clCreateContext(4228=7, device 21, null, null)",
@@ -139,13 +139,13 @@ const Lines kComputeCalls = {
     "clReleaseContext(context 1)",
 };
 
-// What a failing call does to the rest of a measurement.
-enum class After { Nothing, ReleaseContext, ReleaseQueueAndContext, GoesOn };
+// The calls that follow a failed call.
+enum class After { Nothing, ReleaseContext, ReleaseQueueAndContext, Continues };
 
-// The calls that are made when the call with that index fails.
+// The expected calls if the call with that index fails.
 Lines CallsUpTo(const Lines& whole, std::size_t index, After after)
 {
-    if (after == After::GoesOn)
+    if (after == After::Continues)
         return whole;
     Lines calls(whole.begin(), whole.begin() + static_cast<std::ptrdiff_t>(index) + 1);
     if (after == After::ReleaseQueueAndContext)
@@ -155,7 +155,7 @@ Lines CallsUpTo(const Lines& whole, std::size_t index, After after)
     return calls;
 }
 
-// What a failing call of the bandwidth measurement leads to, by its index in kBandwidthCalls.
+// By the index of the failed call in kBandwidthCalls.
 After AfterBandwidthFailure(std::size_t index)
 {
     if (index <= 1) // platform, context
@@ -166,10 +166,10 @@ After AfterBandwidthFailure(std::size_t index)
         return After::ReleaseQueueAndContext;
     if (index >= 6 && index <= 15) // copies
         return After::ReleaseQueueAndContext;
-    return After::GoesOn;
+    return After::Continues;
 }
 
-// The same of the compute measurement, by the index in kComputeCalls.
+// By the index of the failed call in kComputeCalls.
 After AfterComputeFailure(std::size_t index)
 {
     if (index <= 1)
@@ -178,7 +178,7 @@ After AfterComputeFailure(std::size_t index)
         return After::ReleaseContext;
     if (index <= 10) // program, build, kernel, buffer, both arguments, run, wait
         return After::ReleaseQueueAndContext;
-    return After::GoesOn;
+    return After::Continues;
 }
 
 TEST_F(CLMeasurementsTest, BandwidthMakesExactlyTheseCalls)
@@ -196,7 +196,7 @@ TEST_F(CLMeasurementsTest, BandwidthMakesTheSameCallsWithLoggingOn)
     EXPECT_THAT(cl.calls, ElementsAreArray(kBandwidthCalls));
 }
 
-TEST_F(CLMeasurementsTest, BandwidthStopsOrGoesOnAtEachFailingCallAsItShould)
+TEST_F(CLMeasurementsTest, BandwidthStopsOrContinuesAfterEachFailedCall)
 {
     const std::pair<bool, cl_int> cases[] = {
         {false, CL_OUT_OF_RESOURCES}, {true, CL_OUT_OF_RESOURCES}, {false, 1}};
@@ -214,7 +214,7 @@ TEST_F(CLMeasurementsTest, BandwidthStopsOrGoesOnAtEachFailingCallAsItShould)
             const After after = AfterBandwidthFailure(index);
             if (index <= 2) {
                 EXPECT_THROW(impl.GetCLBandwidth(), QGF::LogicalException);
-            } else if (after == After::GoesOn) {
+            } else if (after == After::Continues) {
                 EXPECT_NO_THROW(impl.GetCLBandwidth());
             } else {
                 EXPECT_THROW(impl.GetCLBandwidth(), std::runtime_error);
@@ -233,8 +233,8 @@ TEST_F(CLMeasurementsTest, BatchesOfAFifthOfASecondAreFive)
     EXPECT_EQ(CountCalls("clFinish"), 7);
 }
 
-// Ten copies that take 0.02 s each add up to just less than 0.2 s, and five such batches to just
-// less than 1 s, so that a sixth one runs. Sums of binary fractions are exact.
+// As doubles, ten copies of 0.02 s add up to slightly less than 0.2 s, and five such batches to
+// slightly less than 1 s, so a sixth one runs. Sums of binary fractions are exact.
 TEST_F(CLMeasurementsTest, EvenCopiesAddUpAsDoublesDo)
 {
     const struct {
@@ -276,7 +276,7 @@ TEST_F(CLMeasurementsTest, ASlowDeviceEndsAfterTheBatchThatExceedsTheSecond)
     EXPECT_EQ(CountCalls("clEnqueueCopyBuffer"), 10);
 }
 
-TEST_F(CLMeasurementsTest, CountersThatStandStillGiveZeroAfterTenBatches)
+TEST_F(CLMeasurementsTest, ConstantCountersGiveZeroAfterTenBatches)
 {
     const CapturedLog log(pmutil::gGPUAssay);
     cl.counters = [](int) { return std::pair<cl_ulong, cl_ulong>{5, 5}; };
@@ -286,7 +286,7 @@ TEST_F(CLMeasurementsTest, CountersThatStandStillGiveZeroAfterTenBatches)
         EXPECT_EQ(line.find("BW="), std::string::npos) << line;
 }
 
-TEST_F(CLMeasurementsTest, TheBestBatchWins)
+TEST_F(CLMeasurementsTest, TheFastestBatchCounts)
 {
     // 0.5 s, then 0.125 s, then 0.5 s.
     cl.counters = [](int event) {
@@ -304,7 +304,7 @@ TEST_F(CLMeasurementsTest, EveryCopyOfABatchCounts)
     EXPECT_EQ(CountCalls("clEnqueueCopyBuffer"), 10);
 }
 
-TEST_F(CLMeasurementsTest, CountersThatRunBackwardsWrapAround)
+TEST_F(CLMeasurementsTest, DecreasingCountersWrapAround)
 {
     cl.counters = [](int event) { return std::pair<cl_ulong, cl_ulong>{event == 1 ? 1 : 0, 0}; };
     EXPECT_DOUBLE_EQ(impl.GetCLBandwidth(), 335544320.0 / 18446744073.709551615);
@@ -324,7 +324,7 @@ TEST_F(CLMeasurementsTest, BandwidthReleasesEverythingButTheEventsOfEarlierBatch
     EXPECT_THAT(cl.calls, testing::Contains("clReleaseEvent(event 50)"));
 }
 
-TEST_F(CLMeasurementsTest, ExceptionsOutOfReleasesCostNothing)
+TEST_F(CLMeasurementsTest, ExceptionsOfReleasesAreIgnored)
 {
     cl.throwing = {"clReleaseCommandQueue", "clReleaseContext", "clReleaseEvent",
                    "clReleaseMemObject"};
@@ -344,7 +344,7 @@ TEST_F(CLMeasurementsTest, ASecondBandwidthMeasurementMeasuresAgain)
     EXPECT_EQ(cl.calls.size(), 2 * kBandwidthCalls.size());
 }
 
-// The seconds at the end of a scope differ from run to run.
+// Removes the durations at the end of scopes.
 Lines WithoutDurations(Lines lines)
 {
     for (std::string& line : lines) {
@@ -355,10 +355,10 @@ Lines WithoutDurations(Lines lines)
     return lines;
 }
 
-// A log whose lines stand among the calls, so that the order of both shows.
-class JournalLog : public CapturedLog {
+// Adds the log lines to the recorded calls, to check the order of both.
+class InterleavedLog : public CapturedLog {
 public:
-    explicit JournalLog(FakeOpenCL& cl) : CapturedLog(pmutil::gGPUAssay), fCL(cl) {}
+    explicit InterleavedLog(FakeOpenCL& cl) : CapturedLog(pmutil::gGPUAssay), fCL(cl) {}
     void Write(const char* data, std::size_t size) override
     {
         CapturedLog::Write(data, size);
@@ -384,13 +384,13 @@ Lines Calls(const Lines& whole, std::ptrdiff_t first, std::ptrdiff_t last)
     return {whole.begin() + first, whole.begin() + last + 1};
 }
 
-TEST_F(CLMeasurementsTest, TheJournalOfABandwidthMeasurement)
+TEST_F(CLMeasurementsTest, OrderOfCallsAndLogLinesOfBandwidth)
 {
     const std::string whole = "GPUImplHardware::DoGetCLBandwidth";
     const std::string check = "GPUImplHardware::checkBandwidthCL";
     const Lines& calls = kBandwidthCalls;
     cl.counters = BatchesOf(1000000000);
-    const JournalLog log(cl);
+    const InterleavedLog log(cl);
     impl.GetCLBandwidth();
     EXPECT_THAT(
         cl.calls,
@@ -421,13 +421,13 @@ TEST_F(CLMeasurementsTest, TheJournalOfABandwidthMeasurement)
         })));
 }
 
-TEST_F(CLMeasurementsTest, TheJournalOfAComputeMeasurement)
+TEST_F(CLMeasurementsTest, OrderOfCallsAndLogLinesOfCompute)
 {
     const std::string whole = "GPUImplHardware::DoGetCLCompute";
     const std::string measure = "GPUImplHardware::MeasureCLCompute";
     const Lines& calls = kComputeCalls;
     cl.counters = [](int) { return std::pair<cl_ulong, cl_ulong>{1000, 250001000}; };
-    const JournalLog log(cl);
+    const InterleavedLog log(cl);
     impl.GetCLCompute();
     EXPECT_THAT(cl.calls, ElementsAreArray(Joined({
                               {"BEGIN " + whole},
@@ -464,7 +464,7 @@ TEST_F(CLMeasurementsTest, EachOfTenBatchesLogsItsFirstCopy)
                              "80 of 100, totalSeconds=0.4", "90 of 100, totalSeconds=0.45"));
 }
 
-TEST_F(CLMeasurementsTest, TheLastOfTenBatchesMayBeTheBest)
+TEST_F(CLMeasurementsTest, TheLastOfTenBatchesMayBeTheFastest)
 {
     cl.counters = [](int event) {
         return std::pair<cl_ulong, cl_ulong>{0, event == 91       ? 62500000
@@ -475,7 +475,7 @@ TEST_F(CLMeasurementsTest, TheLastOfTenBatchesMayBeTheBest)
     EXPECT_EQ(CountCalls("clEnqueueCopyBuffer"), 100);
 }
 
-TEST_F(CLMeasurementsTest, ComputeKeepsNoNumbersBehind)
+TEST_F(CLMeasurementsTest, ComputeFreesItsData)
 {
     const std::size_t before = assay_test::LargeBlocks();
     impl.GetCLCompute();
@@ -489,7 +489,7 @@ TEST_F(CLMeasurementsTest, ComputeKeepsNoNumbersBehind)
     }
 }
 
-TEST_F(CLMeasurementsTest, BandwidthLogsEachStepBeforeItIsTaken)
+TEST_F(CLMeasurementsTest, BandwidthLogsEachStepBeforeItsCall)
 {
     const CapturedLog log(pmutil::gGPUAssay);
     cl.counters = BatchesOf(500000000);
@@ -539,8 +539,8 @@ TEST_F(CLMeasurementsTest, NegativeVerbosityLogsWithoutScopes)
     }
 }
 
-// The last line that is logged before the call with that index of the bandwidth measurement.
-TEST_F(CLMeasurementsTest, TheLogNamesTheBandwidthCallThatIsAboutToBeMade)
+// Rows: the index of the failed call and the last line that is logged before it.
+TEST_F(CLMeasurementsTest, TheLastLogLineNamesTheFailedBandwidthCall)
 {
     const std::pair<std::size_t, const char*> rows[] = {
         {1, "GPUImplHardware::DoGetCLBandwidth: QGF::OCL::Context context(properties, *iDev);"},
@@ -577,7 +577,7 @@ TEST_F(CLMeasurementsTest, ComputeMakesTheSameCallsWithLoggingOn)
     EXPECT_THAT(cl.calls, ElementsAreArray(kComputeCalls));
 }
 
-TEST_F(CLMeasurementsTest, ComputeStopsOrGoesOnAtEachFailingCallAsItShould)
+TEST_F(CLMeasurementsTest, ComputeStopsOrContinuesAfterEachFailedCall)
 {
     const std::pair<bool, cl_int> cases[] = {
         {false, CL_INVALID_WORK_GROUP_SIZE}, {true, CL_INVALID_WORK_GROUP_SIZE}, {false, 1}};
@@ -594,7 +594,7 @@ TEST_F(CLMeasurementsTest, ComputeStopsOrGoesOnAtEachFailingCallAsItShould)
             const After after = AfterComputeFailure(index);
             if (index <= 2) {
                 EXPECT_THROW(impl.GetCLCompute(), QGF::LogicalException);
-            } else if (after == After::GoesOn) {
+            } else if (after == After::Continues) {
                 EXPECT_NO_THROW(impl.GetCLCompute());
             } else {
                 EXPECT_THROW(impl.GetCLCompute(), std::runtime_error);
@@ -605,7 +605,7 @@ TEST_F(CLMeasurementsTest, ComputeStopsOrGoesOnAtEachFailingCallAsItShould)
     }
 }
 
-TEST_F(CLMeasurementsTest, ComputeThatTakesNoTimeScoresZero)
+TEST_F(CLMeasurementsTest, ComputeWithoutDurationScoresZero)
 {
     cl.counters = [](int) { return std::pair<cl_ulong, cl_ulong>{77, 77}; };
     EXPECT_EQ(impl.GetCLCompute(), 0.0);
@@ -647,7 +647,7 @@ TEST_F(CLMeasurementsTest, TheKernelTextIsOneLineWithSevenTabsAndTwoBlanksBetwee
     EXPECT_EQ(cl.source.size(), 331U);
 }
 
-TEST_F(CLMeasurementsTest, TheKernelWorksOnTheGeneratorsNextNumbers)
+TEST_F(CLMeasurementsTest, TheKernelProcessesTheNextRandomNumbers)
 {
     std::srand(1); // the state that a process starts with
     impl.GetCLCompute();
@@ -670,7 +670,7 @@ TEST_F(CLMeasurementsTest, TheKernelsArgumentsAreTheBufferAndItsLength)
     EXPECT_EQ(cl.kernelArguments[1], CLValue(cl_uint{1048576}).bytes);
 }
 
-TEST_F(CLMeasurementsTest, ComputeLogsWhatItDoes)
+TEST_F(CLMeasurementsTest, ComputeLogsEachStep)
 {
     const CapturedLog log(pmutil::gGPUAssay);
     cl.counters = [](int) { return std::pair<cl_ulong, cl_ulong>{0, 250000000}; };

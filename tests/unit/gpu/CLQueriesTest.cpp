@@ -1,4 +1,4 @@
-// What is asked of an OpenCL device, and how its answers become report values.
+// The queries of an OpenCL device and the values made of their results.
 #include <new>
 #include <stdexcept>
 #include <utility>
@@ -22,8 +22,8 @@ using pmutil::GPUImplWin;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// More than any object may have.
-constexpr std::size_t kHalfOfAll = std::size_t{1} << 63U;
+// Bytes; larger than any object.
+constexpr std::size_t kHalfOfAddressSpace = std::size_t{1} << 63U;
 
 // The text of the std::runtime_error that `action` throws; empty if it throws none.
 template <typename Action>
@@ -94,7 +94,7 @@ TEST_F(CLQueriesTest, NameAndVendorKeepQuotesNewlinesAndForeignBytes)
     EXPECT_EQ(impl.GetCLName(), "a \"b\"\n\xFF\xFE");
 }
 
-TEST_F(CLQueriesTest, AFailingNameOrVendorPassesTheLibrarysExceptionOn)
+TEST_F(CLQueriesTest, AFailedNameOrVendorThrowsTheLibrarysException)
 {
     answers()[CL_DEVICE_NAME] = Failing();
     answers()[CL_DEVICE_VENDOR] = Failing();
@@ -129,7 +129,7 @@ TEST_F(CLQueriesTest, VendorIdIsThePropertysValue)
     EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceInfo(device 21, 4097, 4)"));
 }
 
-TEST_F(CLQueriesTest, AFailingMemoryOrVendorIdPassesTheLibrarysExceptionOn)
+TEST_F(CLQueriesTest, AFailedMemoryOrVendorIdThrowsTheLibrarysException)
 {
     answers()[CL_DEVICE_GLOBAL_MEM_SIZE] = Failing();
     answers()[CL_DEVICE_VENDOR_ID] = Failing();
@@ -137,7 +137,7 @@ TEST_F(CLQueriesTest, AFailingMemoryOrVendorIdPassesTheLibrarysExceptionOn)
     EXPECT_THROW(impl.GetCLVendorID(), QGF::LogicalException);
 }
 
-TEST_F(CLQueriesTest, DriverVersionIsAskedForItsSizeFirst)
+TEST_F(CLQueriesTest, DriverVersionQueriesItsSizeFirst)
 {
     EXPECT_EQ(impl.GetCLDriverVersion(), "390.77");
     EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceInfo(device 21, 4141, 0)",
@@ -163,7 +163,7 @@ TEST_F(CLQueriesTest, UnterminatedDriverVersionIsRead)
     EXPECT_EQ(impl.GetCLDriverVersion(), "1.0");
 }
 
-TEST_F(CLQueriesTest, DriverVersionThatFailsOnEitherCallIsAFailure)
+TEST_F(CLQueriesTest, AFailureOfEitherCallForTheDriverVersionThrows)
 {
     answers()[CL_DRIVER_VERSION].sizeStatus = CL_OUT_OF_RESOURCES;
     EXPECT_EQ(ErrorOf([&] { impl.GetCLDriverVersion(); }), "clGetDeviceInfo failed");
@@ -179,9 +179,9 @@ TEST_F(CLQueriesTest, ALongDriverVersionIsReadWhole)
     EXPECT_EQ(impl.GetCLDriverVersion().size(), 3U * 1024 * 1024);
 }
 
-TEST_F(CLQueriesTest, ADriverVersionForWhichThereIsNoRoomIsTheAllocationsFailure)
+TEST_F(CLQueriesTest, ADriverVersionTooLongToAllocateThrowsBadAlloc)
 {
-    for (const std::size_t claimed : {kHalfOfAll, ~std::size_t{0}}) {
+    for (const std::size_t claimed : {kHalfOfAddressSpace, ~std::size_t{0}}) {
         cl.calls.clear();
         answers()[CL_DRIVER_VERSION].claimed = claimed;
         EXPECT_THROW(impl.GetCLDriverVersion(), std::bad_alloc) << claimed;
@@ -226,7 +226,7 @@ TEST_F(CLQueriesTest, UnterminatedDeviceVersionLosesItsLastByte)
     EXPECT_EQ(impl.GetCLDeviceVersion(), "2.");
 }
 
-TEST_F(CLQueriesTest, DeviceVersionThatFailsOnEitherCallIsAFailure)
+TEST_F(CLQueriesTest, AFailureOfEitherCallForTheDeviceVersionThrows)
 {
     answers()[CL_DEVICE_VERSION].sizeStatus = CL_OUT_OF_RESOURCES;
     EXPECT_EQ(ErrorOf([&] { impl.GetCLDeviceVersion(); }),
@@ -245,10 +245,10 @@ TEST_F(CLQueriesTest, ALongDeviceVersionIsReadWhole)
     EXPECT_EQ(impl.GetCLDeviceVersion().size(), 3U * 1024 * 1024);
 }
 
-TEST_F(CLQueriesTest, ADeviceVersionForWhichThereIsNoRoomIsTheAllocationsFailure)
+TEST_F(CLQueriesTest, ADeviceVersionTooLongToAllocateThrowsBadAlloc)
 {
-    // A text one byte shorter than no bytes has no room either.
-    for (const std::size_t claimed : {std::size_t{0}, kHalfOfAll, ~std::size_t{0}}) {
+    // A size of 0 wraps around, since the length is one byte less.
+    for (const std::size_t claimed : {std::size_t{0}, kHalfOfAddressSpace, ~std::size_t{0}}) {
         cl.calls.clear();
         answers()[CL_DEVICE_VERSION].claimed = claimed;
         EXPECT_THROW(impl.GetCLDeviceVersion(), std::bad_alloc) << claimed;
@@ -263,7 +263,7 @@ struct VersionRow {
     const char* cudaVersion;
 };
 
-// The version text of a platform, and what it is split into.
+// The version text of a platform and its two parts.
 const VersionRow kVersionRows[] = {
     {"OpenCL 1.2 CUDA 8.0.0", "1.2", "8.0.0"},
     {"OpenCL 1.2 some platform", "1.2 some platform", ""},
@@ -298,7 +298,7 @@ TEST_F(CLQueriesTest, PlatformVersionEndsAtTheFirstZeroByte)
     EXPECT_FALSE(impl.GetCUDASupported());
 }
 
-TEST_F(CLQueriesTest, VersionSplitAsksTheDevicesOwnPlatform)
+TEST_F(CLQueriesTest, VersionsComeFromTheDevicesPlatform)
 {
     EXPECT_EQ(impl.GetCUDAVersion(), "8.0.0");
     EXPECT_THAT(cl.calls, ElementsAre("clGetDeviceInfo(device 21, 4145, 8)",
@@ -306,7 +306,7 @@ TEST_F(CLQueriesTest, VersionSplitAsksTheDevicesOwnPlatform)
                                       "clGetPlatformInfo(platform 7, 2305, 22)"));
 }
 
-TEST_F(CLQueriesTest, AFailingPlatformPassesTheLibrarysExceptionOn)
+TEST_F(CLQueriesTest, AFailedPlatformThrowsTheLibrarysException)
 {
     answers()[CL_DEVICE_PLATFORM] = Failing();
     EXPECT_THROW(impl.GetCLPlatformVersion(), QGF::LogicalException);
@@ -324,20 +324,20 @@ TEST_F(CLQueriesTest, SharedMemoryMeansIntegrated)
     EXPECT_TRUE(impl.IsIntegratedCLGPU());
 }
 
-TEST_F(CLQueriesTest, AFailingIntegratedQueryIsFalseAndNotReported)
+TEST_F(CLQueriesTest, AFailedIntegratedQueryIsFalseAndNotReported)
 {
     answers()[CL_DEVICE_HOST_UNIFIED_MEMORY] = Failing();
     EXPECT_FALSE(impl.IsIntegratedCLGPU());
     for (const cl_int status : {CL_INVALID_VALUE, 1}) {
         answers()[CL_DEVICE_HOST_UNIFIED_MEMORY] =
-            CLValue(cl_bool{CL_TRUE}); // written all the same
+            CLValue(cl_bool{CL_TRUE}); // the failed call writes it
         answers()[CL_DEVICE_HOST_UNIFIED_MEMORY].valueStatus = status;
         EXPECT_FALSE(impl.IsIntegratedCLGPU()) << status;
     }
     EXPECT_THAT(failures.texts(), IsEmpty());
 }
 
-// No status but 0 is a success: nothing says that failures are negative.
+// Every status but 0 is a failure, not only the negative ones.
 TEST_F(CLQueriesTest, APositiveStatusIsAFailureToo)
 {
     for (const bool ofSize : {true, false}) {
@@ -362,7 +362,7 @@ TEST_F(CLQueriesTest, TheReservedValueIsZero)
     EXPECT_THAT(cl.calls, IsEmpty());
 }
 
-TEST_F(CLQueriesTest, EachQuestionIsAFreshQuery)
+TEST_F(CLQueriesTest, ResultsAreNotCached)
 {
     EXPECT_EQ(impl.GetCLName(), "Some device");
     answers()[CL_DEVICE_NAME] = CLText("Another");
@@ -434,8 +434,8 @@ TEST_F(CLEnumerationTest, RecordsHaveNoAdapterData)
     EXPECT_EQ(gpus[0]->impl->GetGLDriverExtra(), "");
 }
 
-// Even where the object that lists them has a context.
-TEST(CLEnumerationDeathTest, ARecordAskedAnOpenGLQuestionTripsTheAssertion)
+// Also if the factory has a context.
+TEST(CLEnumerationDeathTest, AnOpenGLQueryOfARecordFailsTheAssertion)
 {
     FakeOpenCL cl;
     cl.platforms = {{1, {}, {{1, CL_DEVICE_TYPE_GPU, {}}}, CL_SUCCESS, {}}};
@@ -449,14 +449,14 @@ TEST(CLEnumerationDeathTest, ARecordAskedAnOpenGLQuestionTripsTheAssertion)
     EXPECT_DEATH(gpus[0]->impl->HasGLNPOTSupport(), "px != 0");
 }
 
-TEST_F(CLEnumerationTest, TheFactoryItselfGetsNoDevice)
+TEST_F(CLEnumerationTest, TheFactoryGetsNoDevice)
 {
     cl.platforms = {{1, {}, {MakeDevice(1, CL_DEVICE_TYPE_GPU, "a")}, CL_SUCCESS, {}}};
     factory.GetCLGPUs();
     EXPECT_EQ(factory.device.id(), nullptr);
 }
 
-TEST_F(CLEnumerationTest, AFailureOfOnePlatformReachesTheCaller)
+TEST_F(CLEnumerationTest, AFailureOfOnePlatformThrows)
 {
     cl.platforms = {{1, {}, {MakeDevice(1, CL_DEVICE_TYPE_GPU, "a")}, CL_SUCCESS, {}},
                     {2, {}, {}, CL_OUT_OF_HOST_MEMORY, {}}};

@@ -71,7 +71,7 @@ TEST_F(DXGIDataTest, ADefaultRecordIsAllZero)
     EXPECT_FALSE(data.IsIntegrated());
 }
 
-TEST_F(DXGIDataTest, TheRecordAnswersFromItsDescriptor)
+TEST_F(DXGIDataTest, TheRecordReturnsItsDescriptor)
 {
     pmutil::AdapterDescriptor descriptor = MakeAdapter(u"Card", 11, 22).descriptor;
     descriptor.DedicatedVideoMemory = 3 * kGB;
@@ -149,14 +149,14 @@ TEST_F(DXGIDataTest, TheDisplayDeviceTextIsEscaped)
     EXPECT_EQ(Printed(QGF::OGL::DisplayDeviceKey()), "{ DeviceName= DeviceString= DisplayID=}");
 }
 
-TEST_F(DXGIDataTest, NoAdaptersGiveAnEmptyListAndNoLine)
+TEST_F(DXGIDataTest, NoAdaptersAreAnEmptyListAndNoLine)
 {
     EXPECT_THAT(GetAllDevices(), IsEmpty());
     EXPECT_THAT(fLog.Lines(), IsEmpty());
     EXPECT_THAT(fScript.calls, ElementsAre("CreateFactory", "EnumAdapters 0", "~factory"));
 }
 
-TEST_F(DXGIDataTest, EveryObjectIsReleasedInTurn)
+TEST_F(DXGIDataTest, ObjectsAreReleasedInOrder)
 {
     fScript.adapters = {MakeAdapter(u"One", 1, 10), MakeAdapter(u"Two", 2, 20)};
     EXPECT_EQ(GetAllDevices().size(), 2U);
@@ -220,7 +220,7 @@ TEST_F(DXGIDataTest, EveryValueButZeroIsAttached)
     EXPECT_EQ(fLog.Lines().back(), "adapter[0] displays: 5");
 }
 
-TEST_F(DXGIDataTest, AnOutputThatAFailedCallGivesDoesNotCount)
+TEST_F(DXGIDataTest, AnOutputOfAFailedCallDoesNotCount)
 {
     fScript.adapters = {MakeAdapter(u"One", 1, 10)};
     fScript.results["EnumOutputs 0 0"] = kFail;
@@ -240,7 +240,7 @@ TEST_F(DXGIDataTest, ASuccessWithoutAnOutputEndsTheOutputs)
     EXPECT_EQ(fScript.CountCalls("EnumOutputs 0 2"), 0U);
 }
 
-TEST_F(DXGIDataTest, AnAdapterThatAFailedCallGivesIsNotListed)
+TEST_F(DXGIDataTest, AnAdapterOfAFailedCallIsNotListed)
 {
     fScript.adapters = {MakeAdapter(u"One", 1, 10), MakeAdapter(u"Two", 2, 20)};
     fScript.results["EnumAdapters 1"] = kFail;
@@ -335,7 +335,7 @@ TEST_F(DXGIDataTest, AGetDescFailureOnTheThirdAdapterKeepsTheFirstTwo)
     EXPECT_EQ(fScript.CountCalls("~factory"), 1U);
 }
 
-TEST_F(DXGIDataTest, AnExceptionThatIsNoStandardOneIsLoggedWithoutText)
+TEST_F(DXGIDataTest, AnUnknownExceptionIsLoggedWithoutText)
 {
     fScript.adapters = {MakeAdapter(u"One", 1, 10)};
     fScript.throws["EnumAdapters 1"] = [] { throw 5; };
@@ -370,10 +370,10 @@ TEST_F(DXGIDataTest, DedicatedMemoryIsComparedSigned)
 {
     EXPECT_TRUE(Sized(0x8086, 0x80000000U * kMB).IsIntegrated());
     EXPECT_FALSE(Sized(0x8086, 0x7FFFFFFFU * kMB).IsIntegrated());
-    EXPECT_TRUE(Sized(0x8086, 0x100000000U * kMB).IsIntegrated()); // cut to 32 bits: 0
+    EXPECT_TRUE(Sized(0x8086, 0x100000000U * kMB).IsIntegrated()); // truncated to 32 bits: 0
 }
 
-TEST_F(DXGIDataTest, NVIDIAAndUnknownVendorsAreDiscreteWhateverTheirMemory)
+TEST_F(DXGIDataTest, NVIDIAAndUnknownVendorsAreAlwaysDiscrete)
 {
     EXPECT_FALSE(Sized(0x10DE, 0).IsIntegrated());
     EXPECT_FALSE(Sized(0, 0).IsIntegrated());
@@ -382,7 +382,7 @@ TEST_F(DXGIDataTest, NVIDIAAndUnknownVendorsAreDiscreteWhateverTheirMemory)
                                           "fAdapterDesc.VendorId=6900"));
 }
 
-TEST_F(DXGIDataTest, SharedMemoryIsCappedAtAQuarterAndAtTwoGigabytes)
+TEST_F(DXGIDataTest, SharedMemoryIsLimitedToAQuarterAndToTwoGigabytes)
 {
     fScript.physicalMemory = 16 * kGB;
     EXPECT_EQ(Sized(0x8086, 64 * kMB, 0, 4 * kGB).GetMemoryMB(), 2048U);
@@ -394,14 +394,14 @@ TEST_F(DXGIDataTest, SharedMemoryIsCappedAtAQuarterAndAtTwoGigabytes)
                             "DXGI RAM=2147483648=2048MB"));
 }
 
-TEST_F(DXGIDataTest, AQuarterOfASmallMachineCounts)
+TEST_F(DXGIDataTest, SharedMemoryOfASmallMachineIsAQuarter)
 {
     fScript.physicalMemory = 2 * kGB;
     EXPECT_EQ(Sized(0x8086, 64 * kMB, 0, 4 * kGB).GetMemoryMB(), 576U);
     EXPECT_EQ(fLog.Lines().back(), "DXGI RAM=603979776=576MB");
 }
 
-TEST_F(DXGIDataTest, AQuarterIsCutToWholeBytes)
+TEST_F(DXGIDataTest, AQuarterIsTruncatedToWholeBytes)
 {
     fScript.physicalMemory = 4194307;
     Sized(0x8086, 0, 0, 4 * kGB).GetMemoryMB();
@@ -416,7 +416,7 @@ TEST_F(DXGIDataTest, TheSmallerOfSharedAndUsableMemoryIsAdded)
     EXPECT_EQ(Sized(0x1002, 64 * kMB, 0, 100 * kMB).GetMemoryMB(), 164U);
 }
 
-TEST_F(DXGIDataTest, BothDedicatedSizesCountBesideTheSharedOne)
+TEST_F(DXGIDataTest, BothDedicatedSizesAreAddedToTheSharedSize)
 {
     fScript.physicalMemory = 16 * kGB;
     EXPECT_EQ(Sized(0x8086, 64 * kMB, 32 * kMB, 100 * kMB).GetMemoryMB(), 196U);
@@ -424,7 +424,7 @@ TEST_F(DXGIDataTest, BothDedicatedSizesCountBesideTheSharedOne)
     EXPECT_EQ(Sized(0x10DE, 64 * kMB, 32 * kMB, 100 * kMB).GetMemoryMB(), 96U);
 }
 
-TEST_F(DXGIDataTest, ADiscreteCardAsksForNoPhysicalMemory)
+TEST_F(DXGIDataTest, ADiscreteCardDoesNotQueryPhysicalMemory)
 {
     fScript.knowsPhysicalMemory = false;
     EXPECT_EQ(Sized(0x1002, 2 * kGB, 0, 4 * kGB).GetMemoryMB(), 2048U);
@@ -432,12 +432,12 @@ TEST_F(DXGIDataTest, ADiscreteCardAsksForNoPhysicalMemory)
     EXPECT_THAT(fLog.Lines(), ElementsAre("DXGI RAM=2147483648=2048MB"));
 }
 
-TEST_F(DXGIDataTest, ADiscreteFigureIsNotCapped)
+TEST_F(DXGIDataTest, ADiscreteSizeIsNotLimited)
 {
     EXPECT_EQ(Sized(0x10DE, 80 * kGB).GetMemoryMB(), 81920U);
 }
 
-TEST_F(DXGIDataTest, MegabytesAreCutTo32Bits)
+TEST_F(DXGIDataTest, MegabytesAreTruncatedTo32Bits)
 {
     EXPECT_EQ(Sized(0x10DE, 0xFFFFFFFFFFFFFFFFU).GetMemoryMB(), 0xFFFFFFFFU);
     EXPECT_EQ(fLog.Lines().back(), "DXGI RAM=18446744073709551615=4294967295MB");
@@ -451,7 +451,7 @@ TEST_F(DXGIDataTest, ATotalOfExactlyOneGigabyteTakesNoSharedMemory)
     EXPECT_THAT(fScript.calls, IsEmpty());
 }
 
-TEST_F(DXGIDataTest, WithoutSharedMemoryTheClassIsNotAsked)
+TEST_F(DXGIDataTest, WithoutSharedMemoryTheCardIsNotClassified)
 {
     EXPECT_EQ(Sized(0x8086, 64 * kMB).GetMemoryMB(), 64U);
     EXPECT_THAT(fLog.Lines(), ElementsAre("DXGI RAM=67108864=64MB"));
@@ -465,13 +465,13 @@ TEST_F(DXGIDataTest, ASmallDiscreteCardIsClassifiedAndTakesNoSharedMemory)
     EXPECT_THAT(fScript.calls, IsEmpty());
 }
 
-TEST_F(DXGIDataTest, UnknownPhysicalMemoryThrowsWithoutALineOfItsOwn)
+TEST_F(DXGIDataTest, UnknownPhysicalMemoryThrowsAndPrintsNothing)
 {
     fScript.knowsPhysicalMemory = false;
     testing::internal::CaptureStderr();
     try {
         Sized(0x8086, 64 * kMB, 0, 4 * kGB).GetMemoryMB();
-        ADD_FAILURE() << "nothing was thrown";
+        ADD_FAILURE() << "no exception";
     } catch (const std::runtime_error& error) {
         EXPECT_STREQ(error.what(), "GlobalMemoryStatusEx failed");
     }

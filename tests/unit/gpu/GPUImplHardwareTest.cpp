@@ -31,11 +31,11 @@ using testing::StartsWith;
 
 constexpr std::uint32_t kUnknownName = 0x87FC;
 
-// What the question throws: the text of a standard exception.
-std::string Thrown(const std::function<void()>& question)
+// The text of the standard exception that `query` throws.
+std::string Thrown(const std::function<void()>& query)
 {
     try {
-        question();
+        query();
     } catch (const std::exception& error) {
         return error.what();
     }
@@ -52,13 +52,13 @@ protected:
 
     FakeDevice& Device() { return fGL.devices[0]; }
 
-    // What the question writes to standard error.
-    static std::string Told(const std::function<void()>& question)
+    // What `query` writes to standard error.
+    static std::string StandardErrorOf(const std::function<void()>& query)
     {
         testing::internal::CaptureStderr();
         try {
-            question();
-        } catch (const std::exception&) { // the text is asked for elsewhere
+            query();
+        } catch (const std::exception&) { // other tests check the text
         }
         return testing::internal::GetCapturedStderr();
     }
@@ -77,7 +77,7 @@ TEST_F(GPUImplHardwareTest, AQueryIsFollowedByOneErrorCheckInsideTheDevicesConte
     EXPECT_THAT(fLog.Lines(), IsEmpty());
 }
 
-TEST_F(GPUImplHardwareTest, TheContextThatWasCurrentIsRestored)
+TEST_F(GPUImplHardwareTest, ThePreviousContextIsRestored)
 {
     QGF::OGL::ContextOffscreen other(fGL.devices[1].key);
     other.makeCurrent();
@@ -88,7 +88,7 @@ TEST_F(GPUImplHardwareTest, TheContextThatWasCurrentIsRestored)
                                        "makeCurrent fake1"));
 }
 
-TEST_F(GPUImplHardwareTest, TheContextThatWasCurrentIsRestoredAfterAFailureToo)
+TEST_F(GPUImplHardwareTest, ThePreviousContextIsRestoredAfterAFailure)
 {
     QGF::OGL::ContextOffscreen other(fGL.devices[1].key);
     other.makeCurrent();
@@ -99,7 +99,7 @@ TEST_F(GPUImplHardwareTest, TheContextThatWasCurrentIsRestoredAfterAFailureToo)
     EXPECT_EQ(QGF::OGL::Context::Current(), &other);
 }
 
-TEST_F(GPUImplHardwareTest, EachQuestionIsAskedAfresh)
+TEST_F(GPUImplHardwareTest, ResultsAreNotCached)
 {
     EXPECT_EQ(fImpl.GetGLVendor(), "Fake Vendor");
     Device().strings[kGLVendor] = "Another";
@@ -109,11 +109,11 @@ TEST_F(GPUImplHardwareTest, EachQuestionIsAskedAfresh)
 TEST_F(GPUImplHardwareTest, NameAndRendererAreTheRendererText)
 {
     EXPECT_EQ(fImpl.GetGLRenderer(), "Fake Renderer 0");
-    EXPECT_EQ(fImpl.GetGLName(), ""); // the adapter's description, and there is no adapter
+    EXPECT_EQ(fImpl.GetGLName(), ""); // the adapter's description; there is no adapter
     EXPECT_STREQ(fImpl.GLGetString(kGLVersion), "4.1 Fake");
 }
 
-TEST_F(GPUImplHardwareTest, ANullTextPassesThroughAndMakesNoString)
+TEST_F(GPUImplHardwareTest, ANullTextIsReturnedAndFailsTheStringQueries)
 {
     Device().strings[kGLVendor] = std::nullopt;
     Device().strings[kGLRenderer] = std::nullopt;
@@ -170,13 +170,13 @@ TEST_F(GPUImplHardwareTest, NamesAreLoggedSignedAndTheStatusUnsigned)
                     "returns 2147483648"));
 }
 
-TEST_F(GPUImplHardwareTest, TheFailureIsToldWithoutAPlace)
+TEST_F(GPUImplHardwareTest, TheFailureIsReportedWithoutFileAndLine)
 {
-    EXPECT_EQ(Told([this] { fImpl.GLGetString(kUnknownName); }),
+    EXPECT_EQ(StandardErrorOf([this] { fImpl.GLGetString(kUnknownName); }),
               "Failed requirement: glStatus == GL_NO_ERROR\n");
 }
 
-TEST_F(GPUImplHardwareTest, LoggingSwitchedOffChangesNothingButTheLine)
+TEST_F(GPUImplHardwareTest, WithLoggingOffOnlyTheLineIsMissing)
 {
     fLog.SetOn(false);
     std::int32_t result = 0;
@@ -186,7 +186,7 @@ TEST_F(GPUImplHardwareTest, LoggingSwitchedOffChangesNothingButTheLine)
     EXPECT_EQ(fLog.Text(), "");
 }
 
-TEST_F(GPUImplHardwareTest, OneErrorIsTakenFromTheQueueAtATime)
+TEST_F(GPUImplHardwareTest, OneErrorIsReadPerQuery)
 {
     Device().errors = {0x501, 0x502};
     EXPECT_THROW(fImpl.GetGLVendor(), std::runtime_error);
@@ -213,7 +213,7 @@ TEST_F(GPUImplHardwareTest, TheRectangleTextureSizeIsUnsigned)
     EXPECT_EQ(fImpl.GetGLRectTextureSize(), 4294967295U);
 }
 
-TEST_F(GPUImplHardwareTest, ARectangleTextureSizeThatOpenGLRejectsIsAFailureAndNotZero)
+TEST_F(GPUImplHardwareTest, ARejectedRectangleTextureSizeThrows)
 {
     Device().integers.clear();
     EXPECT_EQ(Thrown([this] { fImpl.GetGLRectTextureSize(); }),
@@ -222,13 +222,13 @@ TEST_F(GPUImplHardwareTest, ARectangleTextureSizeThatOpenGLRejectsIsAFailureAndN
                 ElementsAre("GPUImplHardware::DoGLGetIntegerv(34040): glGetError() returns 1280"));
 }
 
-TEST_F(GPUImplHardwareTest, TheInterceptorIsToldTheModule)
+TEST_F(GPUImplHardwareTest, TheInterceptorGetsTheModule)
 {
     const auto module = HasSubstr("(called from pmutil/sources/all/GPUImplHardware:");
     std::int32_t result = 0;
     Device().missing = {"glGetString", "glGetIntegerv", "glGetProgramivARB", "glGetError",
                         "glClearColor"};
-    // The table is filled when a context is current for the first time.
+    // The table is filled by the first makeCurrent.
     fImpl.context = boost::make_shared<QGF::OGL::ContextOffscreen>(Device().key);
     EXPECT_THAT(Thrown([&] { fImpl.GLGetString(kGLVendor); }),
                 AllOf(StartsWith("glGetString is not offered"), module));
@@ -246,7 +246,7 @@ TEST_F(GPUImplHardwareTest, TheInterceptorIsToldTheModule)
                 AllOf(StartsWith("glGetError is not offered"), module));
 }
 
-TEST_F(GPUImplHardwareTest, ExtensionsAreAskedOfTheDevicesOwnContext)
+TEST_F(GPUImplHardwareTest, ExtensionsAreThoseOfTheDevicesContext)
 {
     Device().strings[kGLVersion] = "1.2";
     Device().extensions = {"GL_ARB_vertex_program"};
@@ -257,7 +257,7 @@ TEST_F(GPUImplHardwareTest, ExtensionsAreAskedOfTheDevicesOwnContext)
     EXPECT_EQ(fGL.calls.back(), "release fake0");
 }
 
-TEST_F(GPUImplHardwareTest, NonPowerOfTwoSupportIsItsExtension)
+TEST_F(GPUImplHardwareTest, NonPowerOfTwoSupportFollowsTheExtension)
 {
     Device().strings[kGLVersion] = "1.5";
     EXPECT_FALSE(fImpl.HasGLNPOTSupport());
@@ -279,13 +279,13 @@ TEST_F(GPUImplHardwareTest, NonPowerOfTwoSupportIsCoreFromVersionTwoOn)
     }
 }
 
-TEST_F(GPUImplHardwareTest, AMissingExtensionManagerIsAFailure)
+TEST_F(GPUImplHardwareTest, AMissingExtensionManagerThrows)
 {
-    const std::string told = Told([] {
+    const std::string standardError = StandardErrorOf([] {
         EXPECT_EQ(Thrown([] { pmutil::RequireExtensions(nullptr); }),
                   "QGF::OGL::ExtensionManager::Instance() returned NULL");
     });
-    EXPECT_EQ(told, "QGF::OGL::ExtensionManager::Instance() returned NULL\n");
+    EXPECT_EQ(standardError, "QGF::OGL::ExtensionManager::Instance() returned NULL\n");
 }
 
 struct VersionCase {
@@ -317,8 +317,8 @@ INSTANTIATE_TEST_SUITE_P(Ladder, GLVersionTest,
                                          VersionCase{"4.0", "4.0"}, VersionCase{"4.1", "4.1"},
                                          VersionCase{"4.6 (Compatibility Profile)", "4.1"}));
 
-// What is claimed needn't be in steps, and each answer stands for itself.
-TEST(NewestGLVersionTest, TheFirstThatIsSupportedDecides)
+// A newer version doesn't imply an older one.
+TEST(NewestGLVersionTest, TheFirstSupportedVersionIsReturned)
 {
     const std::pair<std::set<int>, const char*> rows[] = {
         {{12}, "4.1"},  {{11}, "4.0"},       {{10}, "3.3"},    {{9}, "3.2"},    {{8}, "3.1"},
@@ -327,21 +327,21 @@ TEST(NewestGLVersionTest, TheFirstThatIsSupportedDecides)
         {{1}, nullptr}, {{13, 56}, nullptr}, {{}, nullptr},
     };
     for (const auto& [supported, expected] : rows) {
-        std::vector<int> asked;
+        std::vector<int> queried;
         const char* const text =
             pmutil::NewestGLVersion([&, &all = supported](QGF::OGL::OpenGLExtension version) {
-                asked.push_back(static_cast<int>(version));
-                return all.count(asked.back()) != 0;
+                queried.push_back(static_cast<int>(version));
+                return all.count(queried.back()) != 0;
             });
         SCOPED_TRACE(testing::PrintToString(supported));
         EXPECT_STREQ(text, expected);
-        EXPECT_TRUE(std::is_sorted(asked.rbegin(), asked.rend()));
-        EXPECT_EQ(asked.front(), 12);
-        EXPECT_EQ(std::count(asked.begin(), asked.end(), 1), 0);
+        EXPECT_TRUE(std::is_sorted(queried.rbegin(), queried.rend()));
+        EXPECT_EQ(queried.front(), 12);
+        EXPECT_EQ(std::count(queried.begin(), queried.end(), 1), 0);
     }
 }
 
-TEST_F(GPUImplHardwareTest, TheImagingSubsetAloneIsNoVersion)
+TEST_F(GPUImplHardwareTest, TheImagingSubsetIsNotAVersion)
 {
     Device().strings[kGLVersion] = "1.1";
     Device().extensions = {"GL_ARB_imaging"};
@@ -358,7 +358,7 @@ TEST_F(GPUImplHardwareTest, TheLibrarysOwnExceptionsPassThrough)
     EXPECT_THROW(fImpl.HasGLNPOTSupport(), QGF::LogicalException);
 }
 
-// The trials.
+// The tests by trial: shaders and framebuffer.
 
 std::size_t TextSize(const char* const* texts, int count)
 {
@@ -374,13 +374,13 @@ std::uint64_t TextHash(const char* const* texts, int count)
     std::uint64_t hash = 0xcbf29ce484222325;
     for (int i = 0; i < count; ++i) {
         const std::string text = texts[i];
-        for (std::size_t k = 0; k <= text.size(); ++k) // the zero included
+        for (std::size_t k = 0; k <= text.size(); ++k) // with the terminating zero
             hash = (hash ^ static_cast<unsigned char>(text.c_str()[k])) * 0x100000001b3;
     }
     return hash;
 }
 
-TEST(TestShadersTest, TheEntriesAreKeptToTheLetter)
+TEST(TestShadersTest, TheEntriesAreUnchanged)
 {
     EXPECT_EQ(std::size(pmutil::kTestVertexShader), 13U);
     EXPECT_EQ(std::size(pmutil::kTestFragmentShader), 76U);
@@ -420,8 +420,8 @@ TEST_F(GPUImplHardwareTest, BothShadersAreCompiledAndLinkedAndNothingIsDrawn)
     EXPECT_THAT(fLog.Lines(), IsEmpty());
 }
 
-// The trial asks for no error, and leaves what the driver raises to the next question.
-TEST_F(GPUImplHardwareTest, AnErrorOfTheCompileTrialStaysInTheQueue)
+// The compile test doesn't call glGetError, so the next query reports the driver's error.
+TEST_F(GPUImplHardwareTest, AnErrorOfTheCompileTestStaysInTheQueue)
 {
     Device().onCall["glLinkProgram"] = [this] { Device().errors = {0x502}; };
     EXPECT_TRUE(fImpl.CompileProgramGLSL());
@@ -432,26 +432,26 @@ TEST_F(GPUImplHardwareTest, AnErrorOfTheCompileTrialStaysInTheQueue)
                 ElementsAre("GPUImplHardware::DoGLGetString(7936): glGetError() returns 1282"));
 }
 
-TEST_F(GPUImplHardwareTest, ARejectedFragmentShaderAnswersFalseWithTheTextInTheLog)
+TEST_F(GPUImplHardwareTest, ARejectedFragmentShaderIsFalseAndLogged)
 {
     Device().fragmentCompiles = false;
     Device().log = "0:7: syntax error";
-    EXPECT_EQ(Told([this] { EXPECT_FALSE(fImpl.CompileProgramGLSL()); }), "");
+    EXPECT_EQ(StandardErrorOf([this] { EXPECT_FALSE(fImpl.CompileProgramGLSL()); }), "");
     EXPECT_THAT(fLog.Lines(), ElementsAre(AllOf(StartsWith("DoCompileProgramGLSL: "),
                                                 HasSubstr("0:7: syntax error"))));
     EXPECT_EQ(QGF::OGL::Context::Current(), nullptr);
     EXPECT_EQ(Device().objects, 0);
-    EXPECT_EQ(fImpl.GetGLVendor(), "Fake Vendor"); // the device goes on answering
+    EXPECT_EQ(fImpl.GetGLVendor(), "Fake Vendor"); // further queries work
 }
 
-TEST_F(GPUImplHardwareTest, ARejectedVertexShaderAnswersFalse)
+TEST_F(GPUImplHardwareTest, ARejectedVertexShaderIsFalse)
 {
     Device().vertexCompiles = false;
     EXPECT_FALSE(fImpl.CompileProgramGLSL());
     EXPECT_EQ(fGL.callsOf("glCompileShader").size(), 1U);
 }
 
-TEST_F(GPUImplHardwareTest, AFailedLinkAnswersFalse)
+TEST_F(GPUImplHardwareTest, AFailedLinkIsFalseAndLogged)
 {
     Device().links = false;
     Device().log = "too many instructions";
@@ -460,26 +460,26 @@ TEST_F(GPUImplHardwareTest, AFailedLinkAnswersFalse)
                                                 HasSubstr("too many instructions"))));
 }
 
-TEST_F(GPUImplHardwareTest, TrialsSayNothingWithLoggingOff)
+TEST_F(GPUImplHardwareTest, TestsPrintNothingWithLoggingOff)
 {
     fLog.SetOn(false);
     Device().framebufferStatus = 0;
     for (bool FakeDevice::*works :
          {&FakeDevice::vertexCompiles, &FakeDevice::fragmentCompiles, &FakeDevice::links}) {
         Device().*works = false;
-        const std::string told = Told([this] {
+        const std::string standardError = StandardErrorOf([this] {
             testing::internal::CaptureStdout();
             EXPECT_NO_THROW(EXPECT_FALSE(fImpl.CompileProgramGLSL()));
             EXPECT_NO_THROW(EXPECT_FALSE(fImpl.GLFramebufferOK()));
             EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
         });
         Device().*works = true;
-        EXPECT_EQ(told, "");
+        EXPECT_EQ(standardError, "");
     }
     EXPECT_EQ(fLog.Text(), "");
 }
 
-TEST_F(GPUImplHardwareTest, AContextThatIsLostFailsBothTrials)
+TEST_F(GPUImplHardwareTest, ALostContextFailsBothTests)
 {
     Device().onMakeCurrent = [] { throw QGF::LogicalException("lost"); };
     EXPECT_FALSE(fImpl.CompileProgramGLSL());
@@ -487,7 +487,7 @@ TEST_F(GPUImplHardwareTest, AContextThatIsLostFailsBothTrials)
     EXPECT_THAT(fLog.Lines(), ElementsAre("DoCompileProgramGLSL: lost", "DoGLFramebufferOK: lost"));
 }
 
-TEST_F(GPUImplHardwareTest, AnExceptionThatIsNoStandardOnePassesThroughTheTrials)
+TEST_F(GPUImplHardwareTest, AnUnknownExceptionPassesThroughTheTests)
 {
     Device().onCall["glCreateProgram"] = [] { throw 1; };
     Device().onCall["glClear"] = [] { throw 2; };
@@ -514,30 +514,30 @@ TEST_F(GPUImplHardwareTest, TheFramebufferIsClearedUnboundAndCheckedOnce)
                             "glDeleteFramebuffers(1,2)", "glDeleteTextures(1,1)", "release fake0"));
 }
 
-TEST_F(GPUImplHardwareTest, AnErrorOfTheClearShowsUpAsTheFirstInTheQueue)
+TEST_F(GPUImplHardwareTest, AnErrorOfTheClearIsReportedAsTheFirstInTheQueue)
 {
     Device().onCall["glClear"] = [this] { Device().errors = {0x506, 0x501}; };
-    EXPECT_EQ(Told([this] { EXPECT_FALSE(fImpl.GLFramebufferOK()); }), "");
+    EXPECT_EQ(StandardErrorOf([this] { EXPECT_FALSE(fImpl.GLFramebufferOK()); }), "");
     EXPECT_THAT(fLog.Lines(), ElementsAre("DoGLFramebufferOK: glGetError() returns 1286"));
     EXPECT_THAT(Device().errors, ElementsAre(0x501U));
     EXPECT_EQ(Device().objects, 0);
 }
 
-TEST_F(GPUImplHardwareTest, AnErrorOfTheClearColorShowsUpAfterTheUnbind)
+TEST_F(GPUImplHardwareTest, AnErrorOfTheClearColorIsReportedAfterTheUnbind)
 {
     Device().onCall["glClearColor"] = [this] { Device().errors = {0x502}; };
     EXPECT_FALSE(fImpl.GLFramebufferOK());
     EXPECT_THAT(fLog.Lines(), ElementsAre("DoGLFramebufferOK: glGetError() returns 1282"));
 }
 
-TEST_F(GPUImplHardwareTest, TheTrialsStatusIsLoggedSigned)
+TEST_F(GPUImplHardwareTest, TheFramebufferStatusIsLoggedSigned)
 {
     Device().onCall["glClear"] = [this] { Device().errors = {0xFFFFFFFF}; };
     EXPECT_FALSE(fImpl.GLFramebufferOK());
     EXPECT_THAT(fLog.Lines(), ElementsAre("DoGLFramebufferOK: glGetError() returns -1"));
 }
 
-TEST_F(GPUImplHardwareTest, AnIncompleteFramebufferAnswersFalse)
+TEST_F(GPUImplHardwareTest, AnIncompleteFramebufferIsFalse)
 {
     Device().framebufferStatus = 0x8CDD;
     EXPECT_FALSE(fImpl.GLFramebufferOK());
@@ -545,7 +545,7 @@ TEST_F(GPUImplHardwareTest, AnIncompleteFramebufferAnswersFalse)
     EXPECT_EQ(Device().objects, 0);
 }
 
-TEST_F(GPUImplHardwareTest, ATextureThatTheDriverRefusesAnswersFalseAndLeavesNoErrorBehind)
+TEST_F(GPUImplHardwareTest, ARejectedTextureIsFalseAndLeavesNoError)
 {
     Device().onCall["glTexImage2D"] = [this] {
         Device().errors = {0x505};
@@ -559,7 +559,7 @@ TEST_F(GPUImplHardwareTest, ATextureThatTheDriverRefusesAnswersFalseAndLeavesNoE
     EXPECT_NO_THROW(fImpl.GLGetString(kGLVendor));
 }
 
-TEST_F(GPUImplHardwareTest, AFailingTextureAnswersFalse)
+TEST_F(GPUImplHardwareTest, AFailedTextureIsFalse)
 {
     Device().makesObjects = false;
     EXPECT_FALSE(fImpl.GLFramebufferOK());
@@ -568,7 +568,7 @@ TEST_F(GPUImplHardwareTest, AFailingTextureAnswersFalse)
                                           StartsWith("DoCompileProgramGLSL: ")));
 }
 
-// Answers that the base alone gives.
+// The base class without adapter data.
 
 class BareHardware : public pmutil::GPUImplHardware {
 private:
@@ -579,7 +579,7 @@ private:
     std::uint32_t DoGetGLRendererID() override { return 0; }
 };
 
-TEST_F(GPUImplHardwareTest, TheBaseKnowsNoDriverAndNoIntegratedDevice)
+TEST_F(GPUImplHardwareTest, TheBaseReportsNoDriverAndNoIntegratedDevice)
 {
     BareHardware bare;
     EXPECT_EQ(bare.GetGLDriver(), "");
@@ -598,50 +598,50 @@ TEST_F(GPUImplHardwareTest, TheBasesNameIsTheRendererText)
     EXPECT_EQ(bare.GetGLRenderer(), "Fake Renderer 0");
 }
 
-// A question without a context.
+// Queries without a context.
 
-struct GLQuestion {
+struct GLQuery {
     const char* name;
-    void (*ask)(pmutil::GPUImpl&);
+    void (*run)(pmutil::GPUImpl&);
 };
 
-void PrintTo(const GLQuestion& question, std::ostream* out)
+void PrintTo(const GLQuery& query, std::ostream* out)
 {
-    *out << question.name;
+    *out << query.name;
 }
 
-class GPUImplHardwareDeathTest : public testing::TestWithParam<GLQuestion> {};
+class GPUImplHardwareDeathTest : public testing::TestWithParam<GLQuery> {};
 
-TEST_P(GPUImplHardwareDeathTest, ANullContextTripsTheAssertion)
+TEST_P(GPUImplHardwareDeathTest, ANullContextFailsTheAssertion)
 {
     GPUImplWin impl;
-    EXPECT_DEATH(GetParam().ask(impl), "px != 0");
+    EXPECT_DEATH(GetParam().run(impl), "px != 0");
 }
 
 INSTANTIATE_TEST_SUITE_P(
     Questions, GPUImplHardwareDeathTest,
     testing::Values(
-        GLQuestion{"GLVersion", [](pmutil::GPUImpl& impl) { impl.GetGLVersion(); }},
-        GLQuestion{"GLVendor", [](pmutil::GPUImpl& impl) { impl.GetGLVendor(); }},
-        GLQuestion{"GLRenderer", [](pmutil::GPUImpl& impl) { impl.GetGLRenderer(); }},
-        GLQuestion{"GLRectTextureSize", [](pmutil::GPUImpl& impl) { impl.GetGLRectTextureSize(); }},
-        GLQuestion{"GLNPOTSupport", [](pmutil::GPUImpl& impl) { impl.HasGLNPOTSupport(); }},
-        GLQuestion{"CompileProgramGLSL", [](pmutil::GPUImpl& impl) { impl.CompileProgramGLSL(); }},
-        GLQuestion{"GLFramebufferOK", [](pmutil::GPUImpl& impl) { impl.GLFramebufferOK(); }},
-        GLQuestion{"GLGetString", [](pmutil::GPUImpl& impl) { impl.GLGetString(kGLVendor); }},
-        GLQuestion{"GLGetIntegerv",
-                   [](pmutil::GPUImpl& impl) {
-                       std::int32_t result = 0;
-                       impl.GLGetIntegerv(1, &result);
-                   }},
-        GLQuestion{"GLGetProgramivARB",
-                   [](pmutil::GPUImpl& impl) {
-                       std::int32_t result = 0;
-                       impl.GLGetProgramivARB(1, 2, &result);
-                   }},
-        GLQuestion{
+        GLQuery{"GLVersion", [](pmutil::GPUImpl& impl) { impl.GetGLVersion(); }},
+        GLQuery{"GLVendor", [](pmutil::GPUImpl& impl) { impl.GetGLVendor(); }},
+        GLQuery{"GLRenderer", [](pmutil::GPUImpl& impl) { impl.GetGLRenderer(); }},
+        GLQuery{"GLRectTextureSize", [](pmutil::GPUImpl& impl) { impl.GetGLRectTextureSize(); }},
+        GLQuery{"GLNPOTSupport", [](pmutil::GPUImpl& impl) { impl.HasGLNPOTSupport(); }},
+        GLQuery{"CompileProgramGLSL", [](pmutil::GPUImpl& impl) { impl.CompileProgramGLSL(); }},
+        GLQuery{"GLFramebufferOK", [](pmutil::GPUImpl& impl) { impl.GLFramebufferOK(); }},
+        GLQuery{"GLGetString", [](pmutil::GPUImpl& impl) { impl.GLGetString(kGLVendor); }},
+        GLQuery{"GLGetIntegerv",
+                [](pmutil::GPUImpl& impl) {
+                    std::int32_t result = 0;
+                    impl.GLGetIntegerv(1, &result);
+                }},
+        GLQuery{"GLGetProgramivARB",
+                [](pmutil::GPUImpl& impl) {
+                    std::int32_t result = 0;
+                    impl.GLGetProgramivARB(1, 2, &result);
+                }},
+        GLQuery{
             "Extension",
             [](pmutil::GPUImpl& impl) { impl.GLIsExtensionSupported(QGF::OGL::GL_VERSION_1_2); }}),
-    [](const testing::TestParamInfo<GLQuestion>& question) { return question.param.name; });
+    [](const testing::TestParamInfo<GLQuery>& query) { return query.param.name; });
 
 } // namespace

@@ -55,7 +55,7 @@ WMIData MakeWMI(const std::string& name, const std::string& version)
 
 class GPUImplWinTest : public testing::Test {
 protected:
-    // Display devices of these device strings.
+    // Makes display devices with these device strings.
     void SetDevices(const std::vector<std::string>& deviceStrings)
     {
         fGL.devices.clear();
@@ -137,7 +137,7 @@ TEST_F(GPUImplWinTest, ContextsAreMadeInOrderWithALineBeforeEachRiskyCall)
     EXPECT_EQ(fStandardError, "");
 }
 
-TEST_F(GPUImplWinTest, OfDevicesWithOneDeviceStringTheLastOneStays)
+TEST_F(GPUImplWinTest, OfDevicesWithOneDeviceStringTheLastOneIsKept)
 {
     SetDevices({"Card", "Card"});
     const ContextsByDeviceString contexts = CreateContexts();
@@ -185,7 +185,7 @@ TEST_F(GPUImplWinTest, AnyExceptionOfContextCreationIsCaught)
     EXPECT_EQ(fStandardError, "ContextOffscreen exception caught and ignored.\n");
 }
 
-TEST_F(GPUImplWinTest, StandardErrorIsToldWithLoggingOffToo)
+TEST_F(GPUImplWinTest, FailuresGoToStandardErrorWithLoggingOff)
 {
     fLog.SetOn(false);
     SetDevices({"A"});
@@ -203,7 +203,7 @@ TEST_F(GPUImplWinTest, NoDisplayDevicesGiveNoContexts)
 
 // The look-up by name.
 
-TEST_F(GPUImplWinTest, TheFirstOfThatExactNameIsFound)
+TEST_F(GPUImplWinTest, TheFirstWithTheExactNameIsFound)
 {
     GPUImplWins impls;
     for (const char16_t* const name : {u"Card", u"card", u"Card 2", u"Card"}) {
@@ -221,7 +221,7 @@ TEST_F(GPUImplWinTest, TheFirstOfThatExactNameIsFound)
     EXPECT_EQ(pmutil::FindImplByName(impls.end(), impls.end(), "Card"), impls.end());
 }
 
-// The join, on data alone.
+// The join, on data only.
 
 class JoinTest : public GPUImplWinTest {
 protected:
@@ -233,7 +233,7 @@ protected:
         return contexts;
     }
 
-    // The lines of the join itself.
+    // The log lines of the join.
     std::vector<std::string> Lines() const
     {
         std::vector<std::string> lines = fLog.Lines();
@@ -245,7 +245,7 @@ private:
     std::size_t fSkipped = 0;
 };
 
-TEST_F(JoinTest, OneDXGIRecordAndOneWMIRowOfOneNameGiveOneObject)
+TEST_F(JoinTest, ADXGIRecordAndAWMIRowOfOneNameMakeOneObject)
 {
     const auto contexts = Contexts({"Card"});
     const auto impls =
@@ -259,7 +259,7 @@ TEST_F(JoinTest, OneDXGIRecordAndOneWMIRowOfOneNameGiveOneObject)
     EXPECT_THAT(Lines(), IsEmpty());
 }
 
-TEST_F(JoinTest, TwoWMIRowsOfOneNameAndNoDXGIRecordGiveTwoObjectsOnOneContext)
+TEST_F(JoinTest, TwoWMIRowsOfOneNameMakeTwoObjectsOnOneContext)
 {
     const auto contexts = Contexts({"Card"});
     const auto impls =
@@ -270,7 +270,7 @@ TEST_F(JoinTest, TwoWMIRowsOfOneNameAndNoDXGIRecordGiveTwoObjectsOnOneContext)
     EXPECT_EQ(impls[0]->context, impls[1]->context);
 }
 
-TEST_F(JoinTest, TwoWMIRowsOfOneNameAndADXGIRecordGiveTheLaterRow)
+TEST_F(JoinTest, OfTwoWMIRowsOfOneNameTheLaterJoinsTheDXGIRecord)
 {
     const auto contexts = Contexts({"Card"});
     WMIData first = MakeWMI("Card", "1");
@@ -283,7 +283,7 @@ TEST_F(JoinTest, TwoWMIRowsOfOneNameAndADXGIRecordGiveTheLaterRow)
     EXPECT_EQ(impls[0]->fWMI.fName, "Card");
 }
 
-TEST_F(JoinTest, TwoDXGIRecordsOfOneNameGiveOneObjectWithTheLater)
+TEST_F(JoinTest, OfTwoDXGIRecordsOfOneNameTheLaterIsKept)
 {
     const auto contexts = Contexts({"Card"});
     const auto impls =
@@ -293,7 +293,7 @@ TEST_F(JoinTest, TwoDXGIRecordsOfOneNameGiveOneObjectWithTheLater)
     EXPECT_EQ(impls[0]->GetGLRendererID(), 20U);
 }
 
-TEST_F(JoinTest, TheOrderIsDXGIsAndThenThatOfWhatWMIAloneKnows)
+TEST_F(JoinTest, TheOrderIsDXGIThenWMIOnlyDevices)
 {
     const auto contexts = Contexts({"A", "B", "C", "D"});
     const auto impls =
@@ -339,9 +339,9 @@ TEST_F(JoinTest, AQuoteMatchesOnTheWMISideOnly)
     EXPECT_THAT(Lines(), ElementsAre("QGF Device for DXGI A \\\"B\\\" not found"));
 }
 
-// The whole.
+// GetGPUs.
 
-TEST_F(GPUImplWinTest, ADeviceThatEverySourceKnowsIsComplete)
+TEST_F(GPUImplWinTest, ADeviceInAllSourcesIsComplete)
 {
     SetDevices({"Card"});
     SetAdapters({u"Card"});
@@ -382,7 +382,7 @@ TEST_F(GPUImplWinTest, TheSystemsListsAreReadBeforeAnyContextExists)
     EXPECT_EQ(fScript.calls[1], "Initialize"); // WMI's turn comes before DXGI's
 }
 
-TEST_F(GPUImplWinTest, NoDisplayDevicesGiveNothingThoughTheListsAreFull)
+TEST_F(GPUImplWinTest, WithoutDisplayDevicesTheListIsEmpty)
 {
     SetAdapters({u"One"});
     SetRows({u"One", u"Two"});
@@ -393,7 +393,7 @@ TEST_F(GPUImplWinTest, NoDisplayDevicesGiveNothingThoughTheListsAreFull)
     EXPECT_THAT(fLog.Lines(), Not(Contains(kNothingMatches)));
 }
 
-TEST_F(GPUImplWinTest, OneContextThatMatchesNothingIsTheLastResort)
+TEST_F(GPUImplWinTest, AContextWithoutAMatchIsTheLastResort)
 {
     SetDevices({"Software"});
     SetAdapters({u"Card"});
@@ -414,9 +414,9 @@ TEST_F(GPUImplWinTest, OneContextThatMatchesNothingIsTheLastResort)
     EXPECT_EQ(fStandardError, "");
 }
 
-TEST_F(GPUImplWinTest, OfTwoContextsThatMatchNothingTheSmallerDeviceStringIsUsed)
+TEST_F(GPUImplWinTest, OfTwoContextsWithoutAMatchTheSmallerDeviceStringIsUsed)
 {
-    SetDevices({"b", "B", "BB"}); // bytes decide: capitals first, the shorter first
+    SetDevices({"b", "B", "BB"}); // byte order: capitals first, the shorter first
     const auto gpus = GetGPUs();
     ASSERT_EQ(gpus.size(), 1U);
     EXPECT_EQ(gpus[0]->impl->GetGLRenderer(), "Fake Renderer 1");
@@ -429,7 +429,7 @@ TEST_F(GPUImplWinTest, AWMIRowOnlyGivesDriverStringsAndNoName)
     SetDevices({"Card"});
     SetRows({u"Card"});
     fScript.adapters = {MakeAdapter(u"Card", 0x10DE, 0x20)};
-    fScript.adapters[0].outputs.clear(); // no display: WMI takes its ids, DXGI drops it
+    fScript.adapters[0].outputs.clear(); // no display: WMI uses its ids, DXGI drops it
     const auto gpus = GetGPUs();
     ASSERT_EQ(gpus.size(), 1U);
     EXPECT_EQ(gpus[0]->GetName(), "");
@@ -477,7 +477,7 @@ TEST_F(GPUImplWinTest, AContextLivesAsLongAsItsDevice)
     EXPECT_EQ(fGL.devices[0].contexts, 0);
 }
 
-TEST_F(GPUImplWinTest, FailedListsLeaveTheLastResort)
+TEST_F(GPUImplWinTest, FailedListsFallBackToTheLastResort)
 {
     SetDevices({"Card"});
     SetAdapters({u"Card"});
@@ -492,7 +492,7 @@ TEST_F(GPUImplWinTest, FailedListsLeaveTheLastResort)
                               static_cast<const char*>(kNothingMatches)}));
 }
 
-TEST_F(GPUImplWinTest, AnExceptionOfTheEnumerationIsToldAndLeavesAnEmptyList)
+TEST_F(GPUImplWinTest, AnExceptionOfTheEnumerationIsReportedAndLeavesAnEmptyList)
 {
     SetAdapters({u"Card"});
     fGL.onDisplayDevices = [] { throw 3; };
@@ -501,7 +501,7 @@ TEST_F(GPUImplWinTest, AnExceptionOfTheEnumerationIsToldAndLeavesAnEmptyList)
     EXPECT_EQ(fLog.Lines().back(), "DoGetGPUs fails with exception");
 }
 
-TEST_F(GPUImplWinTest, AnExceptionOfTheEnumerationIsToldWithLoggingOffToo)
+TEST_F(GPUImplWinTest, AnExceptionOfTheEnumerationIsReportedWithLoggingOff)
 {
     fLog.SetOn(false);
     fGL.onDisplayDevices = [] { throw std::bad_alloc(); };
@@ -510,26 +510,26 @@ TEST_F(GPUImplWinTest, AnExceptionOfTheEnumerationIsToldWithLoggingOffToo)
     EXPECT_EQ(fLog.Text(), "");
 }
 
-// What GetGPUs gives and says when one of its allocations fails, for each of them.
-struct Shortage {
+// The result of GetGPUs if one of its allocations fails.
+struct AllocationFailure {
     std::vector<std::string> names;
-    std::string told;
-    bool hasContext; // one was made before
+    std::string standardError;
+    bool hasContext; // a context was made before the failure
 };
 
-class ShortageTest : public GPUImplWinTest {
+class AllocationFailureTest : public GPUImplWinTest {
 protected:
-    ShortageTest()
+    AllocationFailureTest()
     {
         fLog.SetOn(false);
-        // The fakes record releases in destructors, which mustn't fail.
+        // The fakes record releases in destructors, which must not fail.
         fScript.calls.reserve(1000);
         fGL.calls.reserve(1000);
     }
 
-    std::vector<Shortage> EveryShortage()
+    std::vector<AllocationFailure> EveryAllocationFailure()
     {
-        std::vector<Shortage> shortages;
+        std::vector<AllocationFailure> results;
         for (std::size_t number = 0;; ++number) {
             fScript.calls.clear();
             fGL.reset();
@@ -543,37 +543,38 @@ protected:
                 gpus = factory.GetGPUs();
                 hasFailed = failing.HasFailed();
             }
-            Shortage shortage{
+            AllocationFailure result{
                 {}, testing::internal::GetCapturedStderr(), !fGL.callsOf("create").empty()};
             if (!hasFailed)
-                return shortages;
+                return results;
             for (const auto& gpu : gpus)
-                shortage.names.push_back(gpu->GetName());
-            shortages.push_back(shortage);
+                result.names.push_back(gpu->GetName());
+            results.push_back(result);
         }
     }
 };
 
-TEST_F(ShortageTest, AFailureInTheMidstOfTheListKeepsWhatIsListed)
+TEST_F(AllocationFailureTest, AFailureKeepsTheDevicesListedBefore)
 {
     SetDevices({"A", "B"});
     SetAdapters({u"A", u"B"});
     std::size_t kept = 0;
-    for (const Shortage& shortage : EveryShortage()) {
-        if (shortage.told != "DoGetGPUs fails with exception\n" || !shortage.hasContext)
+    for (const AllocationFailure& result : EveryAllocationFailure()) {
+        if (result.standardError != "DoGetGPUs fails with exception\n" || !result.hasContext)
             continue;
-        ASSERT_EQ(shortage.names.size(), 1U);
-        kept += shortage.names[0] == "A" ? 1U : 0U;
+        ASSERT_EQ(result.names.size(), 1U);
+        kept += result.names[0] == "A" ? 1U : 0U;
     }
     EXPECT_GT(kept, 0U);
 }
 
-TEST_F(ShortageTest, AFailureOfTheLastResortIsSilent)
+TEST_F(AllocationFailureTest, AFailureOfTheLastResortIsSilent)
 {
     SetDevices({"Software"});
     std::size_t silent = 0;
-    for (const Shortage& shortage : EveryShortage())
-        silent += shortage.hasContext && shortage.names.empty() && shortage.told.empty() ? 1U : 0U;
+    for (const AllocationFailure& result : EveryAllocationFailure())
+        silent +=
+            result.hasContext && result.names.empty() && result.standardError.empty() ? 1U : 0U;
     EXPECT_GT(silent, 0U);
 }
 
@@ -585,7 +586,7 @@ TEST_F(GPUImplWinTest, AMachineWithoutOpenGLHasNoDevices)
     EXPECT_EQ(fStandardError, "");
 }
 
-TEST_F(GPUImplWinTest, ClassificationIsDXGIs)
+TEST_F(GPUImplWinTest, ClassificationIsThatOfDXGI)
 {
     GPUImplWin impl;
     EXPECT_FALSE(impl.IsIntegratedGLGPU());
@@ -603,7 +604,7 @@ protected:
         fImpl.context = boost::make_shared<QGF::OGL::ContextOffscreen>(fGL.devices[0].key);
     }
 
-    // The DXGI side: a discrete card of that vendor.
+    // Sets the DXGI record to a discrete card of that vendor.
     void SetDXGI(std::uint32_t vendorID, std::uint64_t megabytes)
     {
         fImpl.fDXGI.fAdapterDesc.VendorId = vendorID;
@@ -648,7 +649,7 @@ TEST_F(GLMemoryTest, AQueryBelowTheWMIFigureChangesNothing)
     EXPECT_EQ(GetMemoryMB(), 4095U);
 }
 
-TEST_F(GLMemoryTest, TheVendorIsDXGIsAlone)
+TEST_F(GLMemoryTest, TheVendorIsThatOfDXGI)
 {
     SetDXGI(pmutil::kVendorIntel, 200);
     fImpl.fWMI.fVendorID = pmutil::kVendorNVIDIA;
@@ -661,8 +662,8 @@ TEST_F(GLMemoryTest, TheVendorIsDXGIsAlone)
     EXPECT_THAT(fGL.callsOf("glGetIntegerv"), ElementsAre("glGetIntegerv(0x9047)"));
 }
 
-// Keeps the block that a query is handed, and fills all of it.
-class BlockKeeper : public GPUImplWin {
+// Records the block that is passed to a query and overwrites all of it.
+class RecordingImpl : public GPUImplWin {
 public:
     std::array<std::int32_t, 4> block{};
 
@@ -674,7 +675,7 @@ private:
     }
 };
 
-// Leaves other values than zeroes where the next call's variables lie.
+// Fills the stack below with non-zero bytes, where the next call has its variables.
 __attribute__((noinline)) void DirtyStack()
 {
     volatile unsigned char block[8192];
@@ -685,7 +686,7 @@ __attribute__((noinline)) void DirtyStack()
 TEST_F(GLMemoryTest, AVendorsQueryFillsABlockOfFourZeroes)
 {
     for (const std::uint32_t vendorID : {pmutil::kVendorAMD, pmutil::kVendorNVIDIA}) {
-        BlockKeeper impl;
+        RecordingImpl impl;
         impl.block.fill(-1);
         impl.fDXGI.fAdapterDesc.VendorId = vendorID;
         DirtyStack();
@@ -694,7 +695,7 @@ TEST_F(GLMemoryTest, AVendorsQueryFillsABlockOfFourZeroes)
     }
 }
 
-TEST_F(GLMemoryTest, TheLargerOfBothFiguresWins)
+TEST_F(GLMemoryTest, TheLargerFigureIsReturned)
 {
     SetDXGI(0x1234, 3000);
     fImpl.fWMI.fAdapterRAM = static_cast<std::uint32_t>(2000 * kMB);
@@ -735,7 +736,7 @@ TEST_F(GLMemoryTest, AnNVIDIAQueryThatThrowsAnythingLeavesTheWMIFigureAndOneLine
                                           "DXGI RAM=0=0MB", "wmiVRAM=512 dxgiVRAM=0"));
 }
 
-TEST_F(GLMemoryTest, ANegativeAnswerIsSignExtendedAndComparedUnsigned)
+TEST_F(GLMemoryTest, ANegativeValueIsSignExtendedAndComparedUnsigned)
 {
     SetDXGI(pmutil::kVendorNVIDIA, 100);
     fGL.devices[0].integers[kNVIDIAQuery] = {-1};
@@ -743,7 +744,7 @@ TEST_F(GLMemoryTest, ANegativeAnswerIsSignExtendedAndComparedUnsigned)
     EXPECT_EQ(fLog.Lines().back(), "wmiVRAM=4294967295 dxgiVRAM=100");
 }
 
-TEST_F(GLMemoryTest, UnknownPhysicalMemoryLeavesTheOperation)
+TEST_F(GLMemoryTest, UnknownPhysicalMemoryThrows)
 {
     SetDXGI(pmutil::kVendorIntel, 64);
     fImpl.fDXGI.fAdapterDesc.SharedSystemMemory = 1024 * kMB;
@@ -751,14 +752,14 @@ TEST_F(GLMemoryTest, UnknownPhysicalMemoryLeavesTheOperation)
     testing::internal::CaptureStderr();
     try {
         fImpl.GetGLMemoryMB();
-        ADD_FAILURE() << "nothing was thrown";
+        ADD_FAILURE() << "no exception";
     } catch (const std::runtime_error& error) {
         EXPECT_STREQ(error.what(), "GlobalMemoryStatusEx failed");
     }
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
-TEST_F(GLMemoryTest, ADeviceWithoutAnyRecordHasTheWMIFigureAlone)
+TEST_F(GLMemoryTest, ADeviceWithoutRecordsReportsTheWMIFigure)
 {
     EXPECT_EQ(GetMemoryMB(), 0U);
     fImpl.fWMI.fAdapterRAM = static_cast<std::uint32_t>(256 * kMB);

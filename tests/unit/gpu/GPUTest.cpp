@@ -12,7 +12,7 @@ namespace {
 using testing::Return;
 using testing::StrictMock;
 
-// The private operations behind the probe interface.
+// Mocks the private operations of the probe interface.
 class MockImpl : public pmutil::GPUImpl {
 public:
     MOCK_METHOD(GLGPUs, DoGetGPUs, (), (override));
@@ -53,7 +53,7 @@ public:
     MOCK_METHOD(bool, DoIsIntegratedCLGPU, (), (override));
 };
 
-// A strict mock: each question of a record reaches one operation and no other.
+// A strict mock: each query of a record calls one operation and no other.
 class GPUTest : public testing::Test {
 protected:
     boost::shared_ptr<StrictMock<MockImpl>> fImpl = boost::make_shared<StrictMock<MockImpl>>();
@@ -61,7 +61,7 @@ protected:
     pmutil::CLGPU fCL{fImpl};
 };
 
-TEST_F(GPUTest, AnOpenGLRecordForwardsEachQuestion)
+TEST_F(GPUTest, AnOpenGLRecordForwardsEachQuery)
 {
     EXPECT_CALL(*fImpl, DoGetGLVersion()).WillOnce(Return("version"));
     EXPECT_EQ(fGL.GetVersion(), "version");
@@ -79,7 +79,7 @@ TEST_F(GPUTest, AnOpenGLRecordForwardsEachQuestion)
     EXPECT_TRUE(fGL.IsIntegrated());
 }
 
-TEST_F(GPUTest, AnOpenCLRecordForwardsEachQuestion)
+TEST_F(GPUTest, AnOpenCLRecordForwardsEachQuery)
 {
     EXPECT_CALL(*fImpl, DoGetCLPlatformVersion()).WillOnce(Return("version"));
     EXPECT_EQ(fCL.GetVersion(), "version");
@@ -151,7 +151,7 @@ TEST_F(GPUTest, TheReservedFieldOfAnOpenCLRecordIsMinusOne)
     EXPECT_EQ(fCL.fReserved, -1);
 }
 
-TEST_F(GPUTest, AFailureOfAProbePassesThroughTheRecord)
+TEST_F(GPUTest, AnExceptionOfAProbePassesThroughTheRecord)
 {
     EXPECT_CALL(*fImpl, DoGetGLName()).WillOnce(testing::Throw(std::runtime_error("gone")));
     EXPECT_THROW(fGL.GetName(), std::runtime_error);
@@ -167,7 +167,7 @@ TEST_F(GPUTest, ARecordKeepsItsImplementationAlive)
     EXPECT_EQ(impl.use_count(), 3); // several records share one
 }
 
-TEST(GPUDeathTest, ARecordWithoutAnImplementationTripsTheAssertion)
+TEST(GPUDeathTest, ARecordWithoutAnImplementationFailsTheAssertion)
 {
     const pmutil::GLGPU gl(nullptr);
     const pmutil::CLGPU cl(nullptr);

@@ -22,7 +22,7 @@ using testing::IsSupersetOf;
 
 class WMIDataTest : public testing::Test {
 protected:
-    // One row by itself, for the readers.
+    // A single row, for the property readers.
     std::unique_ptr<pmutil::AdapterRow> OnlyRow(const ScriptedRow& row)
     {
         fScript.rows = {row};
@@ -47,7 +47,7 @@ protected:
     std::string fStandardError;
 };
 
-TEST_F(WMIDataTest, ARecordThatNeverMetARowSaysQuestionMarks)
+TEST_F(WMIDataTest, ARecordWithoutARowHasQuestionMarks)
 {
     const WMIData data;
     EXPECT_EQ(data.fAdapterRAM, 0U);
@@ -85,7 +85,7 @@ TEST_F(WMIDataTest, ARowFillsEveryField)
     EXPECT_THAT(fLog.Lines(), IsEmpty());
 }
 
-TEST_F(WMIDataTest, PropertiesThatCannotBeReadLeaveEmptyStrings)
+TEST_F(WMIDataTest, UnreadablePropertiesAreEmptyStrings)
 {
     const auto row = OnlyRow({});
     const WMIData data(*row, 0, 0);
@@ -107,7 +107,7 @@ TEST_F(WMIDataTest, PropertiesThatCannotBeReadLeaveEmptyStrings)
                     "WIData::GetProperty L\"DriverDate\": hr=-2147217406, type=0"));
 }
 
-TEST_F(WMIDataTest, AdapterRAMTakesThe32BitsAsTheyStand)
+TEST_F(WMIDataTest, AdapterRAMIsReadAsUnsigned)
 {
     ScriptedRow properties = MakeRow(u"Card");
     properties[u"AdapterRAM"] = {IntegerValue(-1048576)}; // 4095 MB
@@ -115,10 +115,10 @@ TEST_F(WMIDataTest, AdapterRAMTakesThe32BitsAsTheyStand)
     EXPECT_EQ(WMIData(*row, 0, 0).GetMemoryMB(), 0xFFF00000U);
 }
 
-TEST_F(WMIDataTest, GetIntPropertyLeavesItsOutputAloneWhenItRefuses)
+TEST_F(WMIDataTest, GetIntPropertyKeepsItsOutputOnFailure)
 {
     ScriptedRow properties = MakeRow(u"Card");
-    properties[u"AdapterRAM"] = {TextValue(u"4096")}; // could be converted, and isn't
+    properties[u"AdapterRAM"] = {TextValue(u"4096")}; // a text isn't converted
     const auto row = OnlyRow(properties);
     std::uint32_t out = 77;
     EXPECT_FALSE(pmutil::GetIntProperty(*row, out));
@@ -126,8 +126,8 @@ TEST_F(WMIDataTest, GetIntPropertyLeavesItsOutputAloneWhenItRefuses)
     EXPECT_THAT(fLog.Lines(), ElementsAre("WIData::GetProperty L\"AdapterRAM\": hr=0, type=8"));
 }
 
-// Neighbours of the two accepted types, and these as arrays, vectors and references.
-TEST_F(WMIDataTest, NoOtherTypeIsTaken)
+// Types next to the two accepted ones, and these as arrays, vectors and references.
+TEST_F(WMIDataTest, NoOtherTypeIsAccepted)
 {
     constexpr std::uint16_t kVector = 0x1000;
     constexpr std::uint16_t kArray = 0x2000;
@@ -167,7 +167,7 @@ TEST_F(WMIDataTest, NoOtherTypeIsTaken)
     }
 }
 
-TEST_F(WMIDataTest, GetStrPropertyLeavesItsOutputAloneWhenItRefuses)
+TEST_F(WMIDataTest, GetStrPropertyKeepsItsOutputOnFailure)
 {
     ScriptedRow properties;
     properties[u"Name"] = {IntegerValue(5)};
@@ -182,7 +182,7 @@ TEST_F(WMIDataTest, GetStrPropertyLeavesItsOutputAloneWhenItRefuses)
                             "WIData::GetProperty L\"Caption\": hr=-2147467259, type=8"));
 }
 
-TEST_F(WMIDataTest, TheDeviceNameIsAskedThroughTheInterface)
+TEST_F(WMIDataTest, TheDeviceNameIsAVirtualCall)
 {
     class Renamed : public WMIData {
     public:
@@ -192,7 +192,7 @@ TEST_F(WMIDataTest, TheDeviceNameIsAskedThroughTheInterface)
     EXPECT_EQ(static_cast<const pmutil::GPUData&>(data).GetDeviceName(), "another");
 }
 
-TEST_F(WMIDataTest, APropertyReadWithAnotherKindOfSuccessCounts)
+TEST_F(WMIDataTest, APropertyReadWithAnotherSuccessCodeIsAccepted)
 {
     ScriptedRow properties;
     properties[u"Name"] = {TextValue(u"Card"), kFalse};
@@ -202,7 +202,7 @@ TEST_F(WMIDataTest, APropertyReadWithAnotherKindOfSuccessCounts)
     EXPECT_EQ(out, "Card");
 }
 
-TEST_F(WMIDataTest, TheNameOfARefusedPropertyIsEscaped)
+TEST_F(WMIDataTest, TheNameOfAFailedPropertyIsEscaped)
 {
     const auto row = OnlyRow({});
     std::string out;
@@ -213,7 +213,7 @@ TEST_F(WMIDataTest, TheNameOfARefusedPropertyIsEscaped)
                             "WIData::GetProperty L\"<NULL>\": hr=-2147217406, type=0"));
 }
 
-TEST_F(WMIDataTest, NarrowPropertyKeepsPrintableASCIIAndNothingElse)
+TEST_F(WMIDataTest, NarrowPropertyKeepsPrintableASCIIOnly)
 {
     EXPECT_EQ(pmutil::NarrowProperty(u""), "");
     EXPECT_EQ(pmutil::NarrowProperty(u" ~"), " ~");
@@ -292,7 +292,7 @@ TEST_F(WMIDataTest, ThePropertyNamesAreThoseOfTheClass)
                                          "VideoProcessor"}));
 }
 
-TEST_F(WMIDataTest, AllPropertiesRunTogetherWithoutAGap)
+TEST_F(WMIDataTest, AllPropertiesAreConcatenatedWithoutASeparator)
 {
     ScriptedRow properties;
     properties[u"Name"] = {TextValue(u"Card\u00AE")};
@@ -306,7 +306,7 @@ TEST_F(WMIDataTest, AllPropertiesRunTogetherWithoutAGap)
                               "WIData::GetProperty L\"VideoProcessor\": hr=-2147217406, type=0"}));
 }
 
-TEST_F(WMIDataTest, NoRowsGiveAnEmptyListAndNoLine)
+TEST_F(WMIDataTest, NoRowsAreAnEmptyListAndNoLine)
 {
     EXPECT_THAT(GetAllDevices(), IsEmpty());
     EXPECT_THAT(fLog.Lines(), IsEmpty());
@@ -328,7 +328,7 @@ TEST_F(WMIDataTest, TheFactoryIsMadeFirstAndReleasedLast)
                             "~service", "~factory"));
 }
 
-TEST_F(WMIDataTest, AnInitialisationThatHappenedBeforeCountsAsSuccess)
+TEST_F(WMIDataTest, ARepeatedInitialisationCountsAsSuccess)
 {
     fScript.rows = {MakeRow(u"Card")};
     fScript.results["Initialize"] = kFalse;
@@ -405,7 +405,7 @@ TEST_F(WMIDataTest, RowsBeforeAFailedNextAreKept)
     EXPECT_EQ(fScript.CountCalls("~factory"), 1U);
 }
 
-TEST_F(WMIDataTest, AnExceptionThatIsNoStandardOneIsLoggedWithoutText)
+TEST_F(WMIDataTest, AnUnknownExceptionIsLoggedWithoutText)
 {
     fScript.throws["ConnectServer"] = [] { throw 0x8007000EL; };
     EXPECT_THAT(GetAllDevices(), IsEmpty());
@@ -450,7 +450,7 @@ TEST_F(WMIDataTest, AQueryWithoutAnEnumeratorSkipsTheLoopAndCleansUp)
     EXPECT_THAT(fLog.Lines(), IsEmpty());
 }
 
-TEST_F(WMIDataTest, ARowWithAnOddStatusIsKeptAndLogged)
+TEST_F(WMIDataTest, ARowWithAnUnknownStatusIsKeptAndLogged)
 {
     const std::string odd[] = {"Degraded", "ok",     "error",    "ERROR", "OK ",    "OKAY",     "O",
                                " OK",      "Errors", "Error OK", "Erro",  " Error", "Pred Fail"};
@@ -502,7 +502,7 @@ TEST_F(WMIDataTest, AdapterRAMOfTypeNullLogsItsTypeAndKeepsTheRow)
     EXPECT_THAT(fLog.Lines(), ElementsAre("WIData::GetProperty L\"AdapterRAM\": hr=0, type=1"));
 }
 
-TEST_F(WMIDataTest, TheRowBehindADroppedOneGetsTheIdsOfTheFirstRawAdapter)
+TEST_F(WMIDataTest, TheRowAfterADroppedOneGetsTheIdsOfTheFirstRawAdapter)
 {
     ScriptedRow broken = MakeRow(u"Broken");
     broken[u"Status"] = {TextValue(u"Error")};
@@ -541,7 +541,7 @@ TEST_F(WMIDataTest, SurplusRowsGetIdsOfZero)
     EXPECT_THAT(fLog.Lines(), IsEmpty());
 }
 
-TEST_F(WMIDataTest, TheResultOfTheRawAdaptersGetDescIsNotTested)
+TEST_F(WMIDataTest, TheResultOfTheRawAdaptersGetDescIsIgnored)
 {
     fScript.rows = {MakeRow(u"One")};
     fScript.adapters = {MakeAdapter(u"One", 1, 10)};
@@ -552,7 +552,7 @@ TEST_F(WMIDataTest, TheResultOfTheRawAdaptersGetDescIsNotTested)
     EXPECT_EQ(devices[0].GetDeviceID(), 10U);
 }
 
-TEST_F(WMIDataTest, IdsComeFromACallThatSucceedsAndGivesAnAdapter)
+TEST_F(WMIDataTest, IdsNeedASuccessfulCallWithAnAdapter)
 {
     fScript.rows = {MakeRow(u"One"), MakeRow(u"Two"), MakeRow(u"Three")};
     fScript.adapters = {MakeAdapter(u"One", 1, 10), MakeAdapter(u"Two", 2, 20),

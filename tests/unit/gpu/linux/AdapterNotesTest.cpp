@@ -1,4 +1,4 @@
-// Every file of a tree is one that some driver really writes: the notes beside the tree name it.
+// Every file of a tree must be one that a real driver writes: the tree's notes name the source.
 #include <algorithm>
 #include <filesystem>
 #include <set>
@@ -15,7 +15,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// A line of notes.txt; tests/data/adapters/README.md tells its form.
+// A line of notes.txt; tests/data/adapters/README.md describes the form.
 struct Note {
     std::string pattern;
     std::vector<std::string> source; // driver, source file, function, version
@@ -49,7 +49,7 @@ bool Covers(const Note& note, const std::string& path)
     return fnmatch(note.pattern.c_str(), path.c_str(), 0) == 0;
 }
 
-// Files, links and the folders that are there for their own sake, below the root.
+// The files, links and empty folders below the root.
 std::vector<std::string> Entries(const std::string& root)
 {
     std::vector<std::string> paths;
@@ -85,7 +85,7 @@ TEST_P(AdapterNotesTest, EveryNoteNamesDriverFileFunctionAndVersion)
         for (const std::string& part : note.source)
             EXPECT_NE(part, "") << note.pattern;
         EXPECT_NE(note.source[3].find_first_of("0123456789"), std::string::npos) << note.pattern;
-        // A note that covers everything says nothing.
+        // A note that covers everything is useless.
         EXPECT_FALSE(Covers(note, "sys/devices/pci0000:00/0000:00:02.0/lmem_total_bytes"))
             << note.pattern;
     }

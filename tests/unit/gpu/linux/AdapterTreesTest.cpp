@@ -1,5 +1,5 @@
-// Whole machines: what the join makes of each tree, and that no damage to one does more than cost
-// what was damaged.
+// Whole machines: the devices that the join makes of each tree, and that a damaged file affects no
+// other adapter.
 #include <algorithm>
 #include <cstdio>
 #include <filesystem>
@@ -33,7 +33,7 @@ using ::testing::IsEmpty;
 using ::testing::IsSubsetOf;
 using ::testing::Not;
 
-// Where a context can be made: on what has a DRM node, and on the NVIDIA driver's cards.
+// The places where a context can be made: adapters with a DRM node and the NVIDIA driver's cards.
 std::set<std::string> PlacesWithDriver()
 {
     std::set<std::string> places;
@@ -84,13 +84,13 @@ std::string TreeName(const ::testing::TestParamInfo<std::string>& tree)
 
 class AdapterTreesTest : public ::testing::TestWithParam<std::string> {};
 
-TEST_P(AdapterTreesTest, TheJoinMakesOfItWhatIsExpected)
+TEST_P(AdapterTreesTest, TheJoinGivesTheExpectedDevices)
 {
     const AdapterTree tree(GetParam());
     EXPECT_EQ(DescribeMachine(), ReadAdapterData(GetParam(), "expected.txt"));
 }
 
-TEST_P(AdapterTreesTest, ItsReadMeSaysWhereItIsFrom)
+TEST_P(AdapterTreesTest, ItsReadMeNamesItsOrigin)
 {
     EXPECT_THAT(ReadAdapterData(GetParam(), "README.md"),
                 AnyOf(HasSubstr("\nWritten after"), HasSubstr("\nRecorded with")));
@@ -125,7 +125,7 @@ constexpr Damage kDamages[] = {
 
 class DamagedTreeTest : public ::testing::TestWithParam<std::string> {};
 
-// Every file in turn comes to harm in every way. What was read of the other adapters stays.
+// Damages each file in each way. The other adapters must stay.
 TEST_P(DamagedTreeTest, DamageToOneFileCostsNoMoreThanItsAdapter)
 {
     const AdapterTree tree(GetParam());
@@ -148,13 +148,13 @@ TEST_P(DamagedTreeTest, DamageToOneFileCostsNoMoreThanItsAdapter)
     }
 }
 
-// These have every kind of file.
+// Together these trees have every kind of file.
 INSTANTIATE_TEST_SUITE_P(Trees, DamagedTreeTest,
                          ::testing::Values("hybrid-laptop", "intel-arc-xe", "radeon", "server-bmc",
                                            "soc-beside-pci"),
                          TreeName);
 
-// Watches a tree while it is read.
+// Records which files of a tree are opened and whether it is changed, by inotify.
 class Watch {
 public:
     explicit Watch(const std::string& root) : fFd(inotify_init1(IN_NONBLOCK | IN_CLOEXEC))
@@ -169,8 +169,7 @@ public:
     Watch& operator=(const Watch&) = delete;
 
     bool valid() const { return fValid; }
-    // The names of the files opened, and whether anything changed.
-    std::set<std::string> opened;
+    std::set<std::string> opened; // file names
     bool changed = false;
 
     void collect()
@@ -199,7 +198,7 @@ private:
     bool fValid = true;
 };
 
-// The files that wake no card; DrmAdapters.cpp and AdapterName.cpp tell why.
+// The files that don't wake a suspended card; DrmAdapters.cpp and AdapterName.cpp give the reasons.
 const std::set<std::string>& HarmlessFiles()
 {
     static const std::set<std::string> gFiles = {"class",
@@ -224,31 +223,31 @@ const std::set<std::string>& HarmlessFiles()
     return gFiles;
 }
 
-// Without the answers that drivers give on nodes: SleepingCardTest has those.
-std::set<std::string> WithoutAnswers(std::set<std::string> files)
+// Removes the recorded answers of drivers, which SuspendedCardTest checks.
+std::set<std::string> WithoutRecordedAnswers(std::set<std::string> files)
 {
     for (auto file = files.begin(); file != files.end();)
         file = file->compare(0, 7, "renderD") == 0 ? files.erase(file) : std::next(file);
     return files;
 }
 
-TEST_P(AdapterTreesTest, ReadingItOpensOnlyFilesThatWakeNoCardAndChangesNothing)
+TEST_P(AdapterTreesTest, OnlyHarmlessFilesAreOpenedAndNothingIsChanged)
 {
     const AdapterTree tree(GetParam());
     Watch watch(tree.root());
     if (!watch.valid())
-        GTEST_SKIP() << "this machine can't watch folders";
+        GTEST_SKIP() << "inotify can't watch all folders on this machine";
     Join();
     watch.collect();
     EXPECT_FALSE(watch.changed);
-    EXPECT_THAT(WithoutAnswers(watch.opened), IsSubsetOf(HarmlessFiles()));
+    EXPECT_THAT(WithoutRecordedAnswers(watch.opened), IsSubsetOf(HarmlessFiles()));
     if (!QGF::DisplayAdapters().empty())
         EXPECT_THAT(watch.opened, AnyOf(Contains("vendor"), Contains("uevent")));
     if (GetParam() == "hybrid-laptop")
         EXPECT_THAT(watch.opened, Not(Contains("information")));
 }
 
-// What a recorded machine has as a file is an answer that takes opening the node.
+// Reading a recorded answer stands for opening the node of a real machine.
 std::set<std::string> NodesOpened(const AdapterTree& tree)
 {
     Watch watch(tree.root());
@@ -261,12 +260,12 @@ std::set<std::string> NodesOpened(const AdapterTree& tree)
     return nodes;
 }
 
-TEST(SleepingCardTest, ANodeIsOpenedOnlyWhileItsCardIsAwake)
+TEST(SuspendedCardTest, ANodeIsOpenedOnlyWhileItsCardIsActive)
 {
     const AdapterTree tree("intel-arc-xe");
     const std::string status = "/sys/bus/pci/devices/0000:03:00.0/power/runtime_status";
     if (!Watch(tree.root()).valid())
-        GTEST_SKIP() << "this machine can't watch folders";
+        GTEST_SKIP() << "inotify can't watch all folders on this machine";
     EXPECT_THAT(NodesOpened(tree), ElementsAre("renderD128.xe"));
     for (const char* state :
          {"suspended", "suspending", "resuming", "error", "unsupported", "", "activity"}) {
@@ -277,16 +276,16 @@ TEST(SleepingCardTest, ANodeIsOpenedOnlyWhileItsCardIsAwake)
     EXPECT_THAT(NodesOpened(tree), IsEmpty());
 }
 
-TEST(SleepingCardTest, OneOfTwoCardsAwakeIsAsked)
+TEST(SuspendedCardTest, OnlyTheActiveOneOfTwoCardsIsQueried)
 {
     const AdapterTree tree("intel-arc-asleep");
     if (!Watch(tree.root()).valid())
-        GTEST_SKIP() << "this machine can't watch folders";
-    tree.write("/dev/dri/renderD129.i915", "what a sleeping card would say");
+        GTEST_SKIP() << "inotify can't watch all folders on this machine";
+    tree.write("/dev/dri/renderD129.i915", "the answer of a suspended card");
     EXPECT_THAT(NodesOpened(tree), ElementsAre("renderD128.i915"));
 }
 
-// A device's lines as a row of the table.
+// Makes a row of the table from the lines of a device.
 std::string Row(const std::string& device)
 {
     static const std::regex gForm("name=(.*)\nvendor=(.*) device=(.*)\ndriver=(.*) version=(.*) "
@@ -310,7 +309,7 @@ std::vector<std::string> Rows(const std::string& description)
     return rows;
 }
 
-// Prints what each machine must report beside what it does.
+// Prints a table of the expected and the reported values of each machine.
 TEST(AdapterTableTest, EveryMachineReportsWhatIsExpected)
 {
     std::size_t machines = 0;

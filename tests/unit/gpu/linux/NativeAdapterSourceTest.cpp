@@ -138,14 +138,14 @@ TEST(NativeAdapterSourceTest, ADescriptorHasIdsAndSizes)
     EXPECT_EQ(descriptor.SharedSystemMemory, 16767705088U);
 }
 
-TEST(NativeAdapterSourceTest, WhatThePartMayMapIsShared)
+TEST(NativeAdapterSourceTest, TheMappableMemoryIsShared)
 {
     const AdapterTree tree("amd-integrated");
     EXPECT_EQ(FirstDescriptor().SharedSystemMemory, std::uint64_t{7680} << 20);
     EXPECT_EQ(FirstDescriptor().DedicatedVideoMemory, std::uint64_t{64} << 20);
 }
 
-TEST(NativeAdapterSourceTest, ElseAnIntegratedPartSharesHalfOfTheMachinesMemory)
+TEST(NativeAdapterSourceTest, OtherwiseAnIntegratedPartSharesHalfOfTheMemory)
 {
     const AdapterTree tree("intel-integrated");
     EXPECT_EQ(FirstDescriptor().DedicatedVideoMemory, 0U);
@@ -154,7 +154,7 @@ TEST(NativeAdapterSourceTest, ElseAnIntegratedPartSharesHalfOfTheMachinesMemory)
     EXPECT_EQ(FirstDescriptor().SharedSystemMemory, 0U);
 }
 
-TEST(NativeAdapterSourceTest, OtherCardsShareNothing)
+TEST(NativeAdapterSourceTest, OtherCardsHaveNoSharedMemory)
 {
     for (const char* name : {"intel-arc-i915", "nvidia-drm", "virtio-gpu"}) {
         const AdapterTree tree(name);
@@ -162,7 +162,7 @@ TEST(NativeAdapterSourceTest, OtherCardsShareNothing)
     }
 }
 
-// The names of the adapter's outputs, with a '*' behind those that show the desktop.
+// The names of the adapter's outputs; '*' marks those that are attached to the desktop.
 std::string Outputs(std::uint32_t index)
 {
     std::unique_ptr<AdapterFactory> factory;
@@ -216,7 +216,7 @@ TEST(NativeAdapterSourceTest, ACardThatRendersWithoutConnectorsHasOneOutput)
     EXPECT_EQ(Outputs(2), "renderD129* ");
 }
 
-TEST(NativeAdapterSourceTest, TheNvidiaDriversEntryIsSuchAnOutputToo)
+TEST(NativeAdapterSourceTest, TheNvidiaDriversEntryIsAnOutput)
 {
     const AdapterTree tree("nvidia-no-drm");
     EXPECT_EQ(Outputs(0), "nvidia* ");
@@ -235,7 +235,7 @@ TEST(NativeAdapterSourceTest, ACardThatRendersWithoutADisplayHasOneMoreOutput)
     EXPECT_EQ(DXGIData::GetAllDevices().size(), 1U);
 }
 
-TEST(NativeAdapterSourceTest, WithADisplayItHasNone)
+TEST(NativeAdapterSourceTest, ACardWithADisplayHasNoExtraOutput)
 {
     const AdapterTree tree("amd-discrete");
     EXPECT_EQ(Outputs(0), "DP-1* DP-2 HDMI-A-1* ");
@@ -251,7 +251,7 @@ TEST(NativeAdapterSourceTest, ACardOfAVirtualMachineHasARowButNoOutput)
     EXPECT_EQ(DXGIData::GetAllDevices().size(), 1U);
 }
 
-TEST(NativeAdapterSourceTest, AConnectorThatDoesntTellIsAnOutputThatFails)
+TEST(NativeAdapterSourceTest, AConnectorOfUnknownStateIsAnOutputThatFails)
 {
     const AdapterTree tree("unreadable");
     EXPECT_EQ(Outputs(1), "? HDMI-A-1* ");
@@ -272,7 +272,7 @@ TEST(NativeAdapterSourceTest, PhysicalMemoryIsTheRecordedMachines)
                          static_cast<std::uint64_t>(sysconf(_SC_PAGESIZE)));
 }
 
-TEST(NativeAdapterSourceTest, TheConnectionNeedsNothing)
+TEST(NativeAdapterSourceTest, TheConnectionAlwaysSucceeds)
 {
     const auto service = NativeAdapterSource().CreateManagementService();
     EXPECT_EQ(service->Initialize(), 0);

@@ -49,7 +49,7 @@ TEST(NvidiaVersionTest, EveryMonthHasItsNumber)
     }
 }
 
-TEST(NvidiaVersionTest, AnUnknownZoneIsNoDate)
+TEST(NvidiaVersionTest, AnUnknownZoneIsRejected)
 {
     const NvidiaVersion found =
         ParseNvidiaVersion("NVRM version: x  1.2  Sat Aug 19 01:15:15 XYZ 2023\n");
@@ -64,7 +64,7 @@ TEST(NvidiaVersionTest, AModuleWithoutADate)
     EXPECT_EQ(found.date, "");
 }
 
-TEST(NvidiaVersionTest, PartsOutOfRangeAreNoDate)
+TEST(NvidiaVersionTest, ADateOutOfRangeIsRejected)
 {
     for (const char* date :
          {"Aug 0 01:15:15 UTC 2023", "Aug 32 01:15:15 UTC 2023", "Aug 19 24:15:15 UTC 2023",

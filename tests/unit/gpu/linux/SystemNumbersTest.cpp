@@ -20,7 +20,7 @@ TEST(SystemNumbersTest, ReadsDecimalAndHexadecimal)
     EXPECT_EQ(number, UINT64_MAX);
 }
 
-TEST(SystemNumbersTest, RefusesEverythingElse)
+TEST(SystemNumbersTest, RejectsOtherTexts)
 {
     for (const char* line : {"", "0x", "-1", "+1", " 1", "1 ", "1 bytes", "10de", "0xg", "x10",
                              "18446744073709551616", "0x10000000000000000", "1.5", "--"}) {
@@ -32,7 +32,7 @@ TEST(SystemNumbersTest, RefusesEverythingElse)
     EXPECT_FALSE(ParseSystemNumber(std::string("1\0", 2), number));
 }
 
-TEST(SystemNumbersTest, ReadsTheFirstLineOfAFile)
+TEST(SystemNumbersTest, ReadsTheFirstLine)
 {
     const AdapterTree tree("empty");
     tree.write("/a", "0x1002\nmore\n");
@@ -51,7 +51,7 @@ TEST(SystemNumbersTest, MemoryTotalIsInBytes)
     EXPECT_EQ(bytes, 1024U);
 }
 
-TEST(SystemNumbersTest, AMemoryTotalThatIsNoneIsRefused)
+TEST(SystemNumbersTest, AMalformedMemoryTotalIsRejected)
 {
     for (const char* text : {"", "MemTotal:", "MemTotal: kB", "MemTotal: 1 MB", "MemTotal: x kB",
                              "MemTotal: 18446744073709551615 kB", "MemFree: 1 kB"}) {
