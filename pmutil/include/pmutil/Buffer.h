@@ -1,10 +1,10 @@
-// A channel over a block of memory: its own, which may grow, or one that belongs to someone else.
+// A channel over a block of memory: an owned block, which may grow, or the caller's block.
 //
-// Position <= data size <= capacity, and the dirty range lies within the data. All sizes and
-// positions are in bytes. A failed operation leaves the buffer as it was (Attach tells the one
-// exception), and memory that can't be had throws std::bad_alloc. CopyOut, CopyIn, Grow and
-// SetCapacity to another size throw std::runtime_error "pmutil::Channel not open" after Close;
-// Attach and assignment open the buffer again.
+// Invariants: position <= data size <= capacity; the dirty range is within the data. All sizes and
+// positions are in bytes. A failed operation leaves the buffer unchanged, except Attach. If memory
+// can't be allocated, std::bad_alloc is thrown. After Close, the operations CopyOut, CopyIn, Grow
+// and SetCapacity to another size throw std::runtime_error "pmutil::Channel not open"; Attach and
+// assignment open the buffer again.
 #pragma once
 
 #include <cstdint>
@@ -15,57 +15,57 @@ namespace pmutil {
 
 class Buffer : public RandomAccess {
 public:
-    // An empty buffer with a block of its own, which grows as it is written to.
+    // Makes an empty, growable buffer with an owned block.
     explicit Buffer(std::uint64_t capacity);
 
-    // Wraps the caller's block, all of which counts as data; the block must outlive this object.
+    // Wraps the caller's block; all of it counts as data. The block must outlive this object.
     // Throws std::runtime_error "Buffer: null buf with positive size".
     Buffer(void* block, std::uint64_t size);
 
-    // A copy owns its block, and grows if the original does. What was put back with Unread stays
-    // with the original. The copy of a closed buffer is closed, and so is that of a buffer without
-    // capacity.
+    // A copy owns its block and is growable if the original is. Bytes of Unread aren't copied. The
+    // copy of a closed buffer or of a buffer without capacity is closed.
     Buffer(const Buffer& other);
     Buffer& operator=(const Buffer& other);
     ~Buffer() override;
 
-    // Copies `nbytes` from the position on and moves it. Throws std::runtime_error
-    // "Buffer: CopyOut nbytes too large" if the data end before that.
+    // Copies `nbytes` bytes at the position to `bytes` and advances the position. Throws
+    // std::runtime_error "Buffer: CopyOut nbytes too large" if fewer bytes of data are left.
     void CopyOut(void* bytes, std::uint64_t nbytes);
 
-    // Copies `nbytes` to the position and moves it, growing if need be. Throws XUnderrun with a
-    // count of 0 if they don't fit a buffer that doesn't grow.
+    // Copies `nbytes` bytes to the position and advances it; a growable buffer grows if necessary.
+    // Throws XUnderrun with count 0 if the bytes don't fit and the buffer isn't growable.
     void CopyIn(const void* bytes, std::uint64_t nbytes);
 
-    // SetState and SetOffset set the position, and with it forget what was put back with Unread.
-    // Each setter throws std::runtime_error, SetState std::invalid_argument, if the buffer would
-    // contradict itself: "Buffer::SetState: bad args", "Buffer: bad endOfData param",
-    // "Buffer: bad offset param", "Buffer: bad dirty bounds".
+    // SetState and SetOffset set the position and drop the bytes of Unread. If a setter would break
+    // an invariant, it throws std::runtime_error, SetState std::invalid_argument:
+    // "Buffer::SetState: bad args", "Buffer: bad endOfData param", "Buffer: bad offset param",
+    // "Buffer: bad dirty bounds".
     void SetState(std::uint64_t offset, std::uint64_t endOfData, std::uint64_t dirtyBegin,
                   std::uint64_t dirtyEnd);
     void SetEndOfData(std::uint64_t end);
     void SetOffset(std::uint64_t offset);
 
-    // What was written since lies between the bounds: a write widens the range and nothing but
-    // this operation narrows it. It starts out at 0.
+    // Sets the range of bytes written since then. It is 0 to 0 at first; a write widens it, and
+    // only this operation narrows it.
     void SetDirtyBounds(std::uint64_t begin, std::uint64_t end);
 
-    // Drops the present block and wraps another, as the constructor does. A null one is reported as
-    // a failed requirement, "Failed requirement: buf != NULL", which throws std::runtime_error; if
-    // `size` is not 0 the old block is gone by then, and the buffer empty and closed. What was put
-    // back with Unread came out of the old block and is forgotten.
+    // Releases the present block and wraps another, like the constructor. Drops the bytes of
+    // Unread. For a null block, reports "Failed requirement: buf != NULL", which throws
+    // std::runtime_error; if `size` isn't 0, the old block has been released and the buffer is
+    // empty and closed.
     void Attach(void* block, std::uint64_t size);
 
-    // Makes room for `extra` more bytes, rounded up to whole pages of 4096. Throws
+    // Enlarges the capacity by `extra` bytes and rounds it up to a multiple of 4096. Throws
     // std::runtime_error "not IsGrowable" and "cannot Grow Buffer that large".
     void Grow(std::uint64_t extra);
 
-    // Reallocates to exactly `capacity`. Throws std::runtime_error
+    // Reallocates the block to `capacity` bytes. Throws std::runtime_error
     // "Buffer: ownership is required for this operation" and
     // "shrinking Buffer would invalidate data".
     void SetCapacity(std::uint64_t capacity);
 
-    // Throws std::runtime_error "Buffer: ownership is required for this operation".
+    // Throws std::runtime_error "Buffer: ownership is required for this operation" if the block
+    // isn't owned.
     void RequireOwnership() const;
 
     std::uint64_t GetOffset() const { return fOffset; }
@@ -76,7 +76,8 @@ public:
     bool IsOwned() const { return (fFlags & kOwned) != 0; }
     bool IsGrowable() const { return (fFlags & kGrowable) != 0; }
 
-    // The block, null once closed; valid until the buffer grows, closes or changes its block.
+    // Returns the block, null after Close. Valid until the buffer grows, closes or changes its
+    // block.
     const unsigned char* GetData() const { return fData; }
 
 protected:
@@ -90,7 +91,7 @@ protected:
     void BinioSeekRelative(std::int64_t delta) override;
     void BinioSeekEnd() override;
 
-    // Cuts data and block at the position; at full capacity does nothing at all.
+    // Truncates data and block at the position. Does nothing if the position is at the capacity.
     void BinioSetEOF() override;
 
 private:
@@ -100,7 +101,7 @@ private:
     static bool IsConsistent(const void* data, std::uint64_t offset, std::uint64_t endOfData,
                              std::uint64_t capacity, std::uint64_t dirtyBegin,
                              std::uint64_t dirtyEnd);
-    // Closing leaves sizes and flags as they are, so that they alone don't tell.
+    // Close leaves sizes and flags unchanged, so a closed buffer needs a flag of its own.
     void RequireNotClosed() const;
     void FreeBlock();
     void Reallocate(std::uint64_t capacity, std::uint64_t nbytesToKeep);

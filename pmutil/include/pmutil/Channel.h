@@ -1,10 +1,10 @@
-// The root of the byte streams: what can be opened and closed.
+// The base class of the byte streams: open and closed state, and the target of forwarding.
 //
-// A channel either does its own work, or stands over a target channel and forwards to it. Callers
-// use the public operations, which check; a channel that does its own work overrides the `Binio`
-// operations, and the `Do` operations where it needs a say above them (pushback, buffering).
+// A channel either implements its operations or forwards them to a target channel. Callers use the
+// public operations, which check their preconditions. An implementing channel overrides the `Binio`
+// operations, and the `Do` operations for what is above them (pushback, buffering).
 //
-// Channels have no locks: an object serves one thread at a time.
+// Channels have no locks: use an object from one thread at a time.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -13,22 +13,21 @@ namespace pmutil {
 
 class Channel {
 public:
-    // Forwards to `target`, which may be null. With `own` set the target is deleted with this
-    // object.
+    // Forwards to `target`, which may be null. If `own` is true, this object deletes the target.
     explicit Channel(Channel* target = nullptr, bool own = false);
     virtual ~Channel();
     Channel(const Channel&) = delete;
     Channel& operator=(const Channel&) = delete;
 
-    // Closes an open channel; a closed one stays as it is.
+    // Closes the channel. Does nothing if it is closed.
     void Close();
 
-    // Throws std::runtime_error "pmutil binio function override required" if the channel neither
-    // has a target nor does its own work.
+    // Throws std::runtime_error "pmutil binio function override required" if the channel has
+    // neither a target nor an implementation.
     bool IsOpen() const;
 
-    // Replaces the target. An owned target that is replaced by another one is deleted, whatever
-    // still forwards to it; the same target once more keeps the ownership that it has.
+    // Replaces the target. An owned target is deleted if another one replaces it, even if other
+    // channels forward to it. If `target` is the present one, its ownership doesn't change.
     void SetTarget(Channel* target, bool own);
 
 protected:
@@ -40,8 +39,8 @@ protected:
     // Throws std::runtime_error "pmutil::Channel not open" unless IsOpen().
     void RequireOpen() const;
 
-    // Throws std::runtime_error "pmutil binio function override required" unless `target` exists
-    // and is the one that this channel forwards to.
+    // Throws std::runtime_error "pmutil binio function override required" if `target` is null or
+    // not the target of this channel.
     void RequireTarget(const Channel* target) const;
 
     Channel* GetTarget() const { return fTarget; }

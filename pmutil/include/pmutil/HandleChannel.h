@@ -1,5 +1,5 @@
-// The channel over an operating-system file or pipe handle, as far as it is the same everywhere.
-// PosixHandle and WinHandle are its two forms; each brings a `Platform` with the system's calls.
+// A channel over an operating-system file or pipe handle. PosixHandle and WinHandle are its two
+// instances; each has a `Platform` with the system calls.
 #pragma once
 
 #include <cstdint>
@@ -22,55 +22,53 @@ inline constexpr int kTruncateExisting = 1;
 inline constexpr int kOpenAlways = 2;
 inline constexpr int kCreateAlways = 3;
 
-// From where a seek counts.
 enum class SeekOrigin { kBegin, kCurrent, kEnd };
 
-// Failed system calls throw std::runtime_error with the call's name. A read of a pipe whose other
-// end is closed is the end of the data; a write to one fails. A transfer above the system's limit
-// comes back short.
+// A failed system call throws std::runtime_error with the call's name. A read from a pipe whose
+// other end is closed returns 0, the end of the data; a write to it fails. A transfer above the
+// system's limit returns a smaller count.
 template <typename Platform>
 class HandleChannel : public RandomAccess {
 public:
     using Handle = typename Platform::Handle;
     using Path = typename Platform::Path;
 
-    // With `owned` set the handle is closed with this object, and the file at `path`, if one is
-    // given, deleted then. The handle is taken as it is; objects on one handle must agree on which
-    // of them owns it.
+    // If `owned` is true, the destructor closes the handle and deletes the file at `path`, unless
+    // that is null. The handle isn't duplicated: only one object may own it.
     HandleChannel(Handle handle, bool owned, const Path* path = nullptr);
     ~HandleChannel() override;
 
-    // Lets go of the present handle, as the destructor does, and takes another. What was put back
-    // with Unread came from the old one and is forgotten.
+    // Releases the present handle like the destructor and sets another. Drops the bytes of Unread.
     void Reset(Handle handle, bool owned, const Path* path = nullptr);
 
     Handle GetHandle() const { return fHandle; }
 
-    // Opens a file; its handle is owned, and never inherited by a child process. With
-    // `deleteOnClose` the file is deleted when the channel closes.
-    // Throws std::invalid_argument "OpenFile: bad access flags" and "OpenFile: bad creation flags"
-    // before the file is touched.
+    // Opens a file. The channel owns the handle; child processes don't inherit it. If
+    // `deleteOnClose` is true, the file is deleted when the channel is closed. Throws
+    // std::invalid_argument "OpenFile: bad access flags" or "OpenFile: bad creation flags" before
+    // the file is accessed.
     static boost::shared_ptr<HandleChannel> OpenFile(const Path& path, int access, int creation,
                                                      bool deleteOnClose);
 
-    // An empty file of its own, open for reading and writing, deleted when the channel closes.
+    // Makes a new empty file, open for reading and writing; it is deleted when the channel is
+    // closed.
     static boost::shared_ptr<HandleChannel> MakeTemporaryFile(const Path& prefix);
 
-    // Where temporary files go.
+    // Returns the directory of temporary files.
     static Path GetTemporaryDirectory();
 
-    // Makes an empty file with a name of its own in that directory, and gives its path. The caller
+    // Makes an empty file with a unique name in that directory and returns its path. The caller
     // deletes it.
     static Path MakeTemporaryFileName(const Path& prefix);
 
-    // The process's standard channels, made on first use and alive until the process ends. They
-    // don't own their handles, but Close on one closes it for the whole process.
+    // The process's standard channels, made on first use and never destroyed. They don't own their
+    // handles, but Close closes the handle for the whole process.
     static Reader& GetStandardInput();
     static Writer& GetStandardOutput();
     static Writer& GetStandardError();
 
 protected:
-    // Closes the handle whether it is owned or not.
+    // Closes the handle even if it isn't owned.
     void BinioClose() override;
     bool BinioIsOpen() const override;
     std::uint64_t BinioReadSome(void* bytes, std::uint64_t nbytes) override;

@@ -1,8 +1,8 @@
-// The channel over a file descriptor.
+// A channel over a file descriptor.
 //
-// A failed call throws std::runtime_error with its name and the system's own text, such as
-// "open failed: No such file or directory". An interrupted call is repeated. A write to a pipe
-// without a reader throws and raises no SIGPIPE, whatever the process does with that signal.
+// A failed call throws std::runtime_error with its name and the system's text, such as
+// "open failed: No such file or directory". Interrupted calls are repeated. A write to a pipe
+// without a reader throws and raises no SIGPIPE, whatever the signal's disposition is.
 #pragma once
 
 #include <cstdint>
@@ -12,10 +12,10 @@
 
 namespace pmutil {
 
-// The system's calls on a bare descriptor. Descriptors opened here close on exec.
+// The system calls. Descriptors opened here have close-on-exec set.
 struct PosixCalls {
     using Handle = int;
-    using Path = std::string; // bytes as the system takes them; UTF-8 by custom
+    using Path = std::string; // bytes; UTF-8 by convention
 
     static constexpr const char* kName = "PosixHandle";
     static constexpr Handle GetInvalid() { return -1; }
@@ -32,7 +32,8 @@ struct PosixCalls {
     static std::uint64_t SeekAndTell(Handle handle, std::int64_t offset, SeekOrigin origin);
     static void SetEndOfFile(Handle handle);
 
-    // TMPDIR, or /tmp where that isn't set.
+    // Returns TMPDIR; /tmp if it isn't set or the process runs with other privileges than the user
+    // (secure_getenv).
     static Path GetTemporaryDirectory();
     static Path MakeTemporaryFileName(const Path& prefix);
 

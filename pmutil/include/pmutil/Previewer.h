@@ -1,10 +1,10 @@
-// Reads ahead on a Reader and puts everything back: a look at what comes, without taking it.
+// Reads ahead on a Reader and then puts the bytes back.
 //
 //     Previewer preview(reader);
 //     const std::uint64_t count = preview.ReadSome(magic, sizeof magic);
 //     preview.End(); // the reader delivers the same bytes again
 //
-// While it is active, direct reads of the reader fail. Serves the reader's thread, and must not
+// While it is active, direct reads of the reader fail. Use it on the reader's thread; it must not
 // outlive the reader.
 #pragma once
 
@@ -17,18 +17,18 @@ namespace pmutil {
 
 class Previewer {
 public:
-    // Throws std::runtime_error "Reader: Previewer already active" if one is.
+    // Throws std::runtime_error "Reader: Previewer already active" if the reader has one.
     explicit Previewer(Reader& reader);
 
-    // Ends the preview if End didn't; what can't be put back is lost without a word.
+    // Calls End; bytes that can't be put back are lost silently.
     ~Previewer();
     Previewer(const Previewer&) = delete;
     Previewer& operator=(const Previewer&) = delete;
 
-    // As Reader::ReadSome. Throws std::runtime_error "Previewer: preview ended" after End.
+    // Like Reader::ReadSome. Throws std::runtime_error "Previewer: preview ended" after End.
     std::uint64_t ReadSome(void* bytes, std::uint64_t nbytes);
 
-    // Puts back what was read. Throws what Reader::EndPreview throws. A second call does nothing.
+    // Puts back the bytes read. Throws what Reader::EndPreview throws. A second call does nothing.
     void End();
 
 private:

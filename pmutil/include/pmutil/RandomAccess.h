@@ -1,4 +1,4 @@
-// A channel that reads, writes and seeks, and whose end can be set: a file, or memory.
+// A channel that can be read, written, positioned and truncated: a file or memory.
 #pragma once
 
 #include "pmutil/Reader.h"
@@ -9,19 +9,19 @@ namespace pmutil {
 
 class RandomAccess : public Reader, public Writer, public Seeker {
 public:
-    // Forwards all capabilities to `target`, which may be null, and owns it with `own` set.
+    // Forwards to `target`, which may be null; owns it if `own` is true.
     explicit RandomAccess(RandomAccess* target = nullptr, bool own = false);
     ~RandomAccess() override;
 
-    // As Channel::SetTarget, for all capabilities at once.
+    // Replaces the target of all capabilities, as Channel::SetTarget does.
     void SetRandomAccess(RandomAccess* target, bool own);
 
-    // Ends the data at the current position. Throws std::runtime_error "pmutil::Channel not open"
-    // on a closed channel, and what the channel below throws.
+    // Sets the end of the data to the current position. Throws std::runtime_error
+    // "pmutil::Channel not open" on a closed channel, and what the target throws.
     void SetEOF();
 
 protected:
-    // What was read before and put back isn't what stands at the new position.
+    // A seek drops the bytes of Unread, which belong to the old position.
     void DoSeek(std::uint64_t position) override;
     void DoSeekRelative(std::int64_t delta) override;
     void DoSeekEnd() override;

@@ -1,4 +1,4 @@
-// A channel that gives bytes, and takes some of them back.
+// A channel that can be read. Bytes can be put back.
 #pragma once
 
 #include <cstdint>
@@ -13,61 +13,61 @@ class Previewer;
 
 class Reader : public virtual Channel {
 public:
-    // Forwards to `reader`, which may be null, and owns it with `own` set.
+    // Forwards to `reader`, which may be null; owns it if `own` is true.
     explicit Reader(Reader* reader = nullptr, bool own = false);
     ~Reader() override;
 
-    // As Channel::SetTarget, for the whole object.
+    // Replaces the target, as Channel::SetTarget does.
     void SetReader(Reader* reader, bool own);
 
-    // Each throws std::runtime_error "pmutil::Channel not open" on a closed channel, and what the
-    // channel below throws.
+    // The operations below throw std::runtime_error "pmutil::Channel not open" on a closed channel,
+    // and what the target throws.
 
-    // Reads at most `nbytes`, perhaps fewer, and returns how many; 0 at the end of the data. Bytes
-    // that were put back come first and alone, in a call of their own. Throws std::runtime_error
-    // "direct read while preview active", and std::logic_error "read returned more than asked" if
-    // the channel below oversteps.
+    // Reads at most `nbytes` bytes and returns the count, which may be smaller; 0 at the end of the
+    // data. If bytes were put back, returns only those. Throws std::runtime_error "direct read
+    // while preview active", and std::logic_error "read returned more than asked" if the target
+    // returns a larger count.
     std::uint64_t ReadSome(void* bytes, std::uint64_t nbytes);
 
-    // Reads exactly `nbytes` and returns true. If the data end before that, returns false, and what
-    // came is put back for the next read. Throws as ReadSome does, but "direct read while preview
-    // active" as a std::logic_error.
+    // Reads exactly `nbytes` bytes and returns true. If the data end before that, puts the bytes
+    // back and returns false. Throws as ReadSome does, but "direct read while preview active" as
+    // std::logic_error.
     bool ReadAll(void* bytes, std::uint64_t nbytes);
 
-    // Puts bytes back: the next read delivers them. They take the place of what was put back
-    // earlier and not yet read again. What was put back, here or by ReadAll or a preview, is
-    // forgotten when the channel is closed, forwards to another reader, or moves its position
-    // otherwise than by reading and writing; a preview across that puts nothing back.
+    // Puts bytes back: the next read returns them. They replace bytes that were put back before and
+    // not read since. Bytes that were put back, here, by ReadAll or by a preview, are dropped when
+    // the channel is closed, gets another target, or is positioned by a seek; a preview that is
+    // active at that time puts nothing back.
     void Unread(const void* bytes, std::uint64_t nbytes);
 
-    // The Reader's side of a preview; see Previewer for the use of it.
+    // The operations that Previewer uses.
 
-    // While a preview is active only ReadPreview reads. Throws std::runtime_error
+    // Starts a preview; until its end only ReadPreview may read. Throws std::runtime_error
     // "Reader: Previewer already active".
     void BeginPreview(Previewer& previewer);
 
     // ReadSome for the active preview.
     std::uint64_t ReadPreview(void* bytes, std::uint64_t nbytes);
 
-    // Ends the preview and puts back what it read, `data` in full. Throws std::runtime_error
-    // "Buffer: bad offset param" if the buffer's state is not valid, and
-    // "Buffer: offset would be negative" if the bytes can't have come out of what was put back
-    // before; the preview is over all the same.
+    // Ends the preview and puts back all of `data`, the bytes it read. Throws std::runtime_error
+    // "Buffer: bad offset param" if the buffer's state is invalid, and
+    // "Buffer: offset would be negative" if `data` is longer than the bytes that were put back and
+    // read since; the preview has ended also then.
     void EndPreview(std::unique_ptr<Buffer> data);
 
 protected:
     virtual std::uint64_t DoReadSome(void* bytes, std::uint64_t nbytes);
     virtual std::uint64_t BinioReadSome(void* bytes, std::uint64_t nbytes);
 
-    // Told that `nbytes` bytes were put back.
+    // Called after `nbytes` bytes were put back.
     virtual void DoUnread(std::uint64_t nbytes);
 
-    // The next byte, 0 to 255, or 0xFFFFFFFF at the end of the data.
+    // Returns the next byte, 0 to 255, or 0xFFFFFFFF at the end of the data.
     virtual std::uint32_t DoReadByte();
 
     void DoClose() override;
 
-    // Forgets what was put back, and what an active preview has read.
+    // Drops the bytes that were put back and those that an active preview has read.
     void DropPushback();
 
 private:

@@ -9,15 +9,15 @@ namespace pmutil {
 
 class Seeker : public virtual Channel {
 public:
-    // Forwards to `seeker`, which may be null, and owns it with `own` set.
+    // Forwards to `seeker`, which may be null; owns it if `own` is true.
     explicit Seeker(Seeker* seeker = nullptr, bool own = false);
     ~Seeker() override;
 
-    // As Channel::SetTarget, for the whole object.
+    // Replaces the target, as Channel::SetTarget does.
     void SetSeeker(Seeker* seeker, bool own);
 
-    // Each throws std::runtime_error "pmutil::Channel not open" on a closed channel, and what the
-    // channel below throws for a position that it can't take.
+    // The operations below throw std::runtime_error "pmutil::Channel not open" on a closed channel,
+    // and what the target throws for an invalid position.
     std::uint64_t Tell();
     void Seek(std::uint64_t position);
     void SeekRelative(std::int64_t delta);

@@ -20,8 +20,8 @@ public:
 template <typename T>
 class Stackable;
 
-// A pointer to an object on the stack, with a share of the stack itself, so that the stack
-// outlives the last statement that uses it during process exit. May be empty.
+// A pointer to an object on the stack. It shares ownership of the stack, so that the stack outlives
+// the last user at process exit. May be empty.
 template <typename T>
 class StackableHolder {
 public:
@@ -39,7 +39,7 @@ private:
     T* fObject = nullptr;
 };
 
-// While an object of class T lives, it stands on the stack of live T.
+// The constructor pushes the object onto the stack of live T; the destructor removes it.
 template <typename T>
 class Stackable : public StackableBase {
 public:
@@ -54,7 +54,7 @@ public:
         fStack->erase(std::remove(fStack->begin(), fStack->end(), this), fStack->end());
     }
 
-    // The youngest live object; an empty holder if there is none.
+    // Returns the youngest live object; an empty holder if there is none.
     static StackableHolder<T> Top()
     {
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
@@ -63,7 +63,7 @@ public:
         return StackableHolder<T>(std::move(stack), top);
     }
 
-    // The object that became current just before `object`; null if there is none.
+    // Returns the object that was pushed before `object`; null if there is none.
     static T* Below(const T* object)
     {
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
@@ -73,10 +73,10 @@ public:
                                                               : static_cast<T*>(*(found - 1));
     }
 
-    // Guards the stack. Taken inside the log mutex and never the other way round.
+    // Guards the stack. Lock order: the log mutex first.
     static boost::recursive_mutex& Mutex()
     {
-        static boost::recursive_mutex& mutex = *new boost::recursive_mutex; // outlives all users
+        static boost::recursive_mutex& mutex = *new boost::recursive_mutex; // never destroyed
         return mutex;
     }
 
@@ -85,7 +85,7 @@ protected:
     {
         boost::lock_guard<boost::recursive_mutex> lock(Mutex());
         fStack = Instances();
-        // Not yet a T: it is turned into one only when it is asked for.
+        // The T isn't constructed yet: Top and Below convert the pointer later.
         fStack->push_back(this);
     }
 
@@ -93,7 +93,7 @@ private:
     static Stack Instances()
     {
         static const Stack& stack = *new Stack(boost::make_shared<std::vector<Stackable<T>*>>());
-        return stack; // outlives all users
+        return stack; // never destroyed
     }
 
     Stack fStack;

@@ -1,4 +1,4 @@
-// The channel over a Windows handle.
+// A channel over a Windows handle.
 //
 // A failed call throws std::runtime_error with its name, such as "CreateFileW failed".
 #pragma once
@@ -10,7 +10,7 @@
 
 namespace pmutil {
 
-// The system's calls on a bare handle.
+// The system calls.
 struct WinCalls {
     using Handle = void*;
     using Path = std::wstring;
@@ -22,8 +22,8 @@ struct WinCalls {
     static void Close(Handle handle);
     static void Delete(const Path& path);
 
-    // Shared for reading, writing and deleting, and not inherited by children. `access` and
-    // `creation` are valid flags of OpenFile.
+    // Opens a file, shared for reading, writing and deleting, and not inherited by child processes.
+    // `access` and `creation` must be valid flags of OpenFile.
     static Handle Open(const Path& path, int access, int creation);
     static std::uint64_t Read(Handle handle, void* bytes, std::uint64_t nbytes);
     static std::uint64_t Write(Handle handle, const void* bytes, std::uint64_t nbytes);
@@ -31,7 +31,7 @@ struct WinCalls {
     static std::uint64_t SeekAndTell(Handle handle, std::int64_t offset, SeekOrigin origin);
     static void SetEndOfFile(Handle handle);
 
-    // The user's folder for temporary files.
+    // Returns the user's folder for temporary files.
     static Path GetTemporaryDirectory();
     static Path MakeTemporaryFileName(const Path& prefix);
 

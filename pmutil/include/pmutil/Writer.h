@@ -1,4 +1,4 @@
-// A channel that takes bytes.
+// A channel that can be written.
 #pragma once
 
 #include <cstdint>
@@ -9,23 +9,23 @@ namespace pmutil {
 
 class Writer : public virtual Channel {
 public:
-    // Forwards to `writer`, which may be null, and owns it with `own` set.
+    // Forwards to `writer`, which may be null; owns it if `own` is true.
     explicit Writer(Writer* writer = nullptr, bool own = false);
     ~Writer() override;
 
-    // As Channel::SetTarget, for the whole object.
+    // Replaces the target, as Channel::SetTarget does.
     void SetWriter(Writer* writer, bool own);
 
-    // Each throws std::runtime_error "pmutil::Channel not open" on a closed channel, and what the
-    // channel below throws.
+    // The operations below throw std::runtime_error "pmutil::Channel not open" on a closed channel,
+    // and what the target throws.
 
-    // Writes at least one byte and at most `nbytes`, and returns how many; 0 only for 0. Throws
-    // std::logic_error "DoWriteSome should never return 0 if nbytes > 0" if the channel below takes
-    // nothing.
+    // Writes at least one and at most `nbytes` bytes and returns the count; returns 0 only if
+    // `nbytes` is 0. Throws std::logic_error "DoWriteSome should never return 0 if nbytes > 0" if
+    // the target writes nothing.
     std::uint64_t WriteSome(const void* bytes, std::uint64_t nbytes);
 
-    // Writes all bytes; after a failure those written so far stay written. Throws std::logic_error
-    // "WriteFunc should never return 0" if the channel below takes nothing.
+    // Writes all bytes. After a failure a part of them may have been written. Throws
+    // std::logic_error "WriteFunc should never return 0" if the target writes nothing.
     void WriteAll(const void* bytes, std::uint64_t nbytes);
 
     void Flush();

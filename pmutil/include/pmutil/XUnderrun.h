@@ -1,4 +1,4 @@
-// Reports a transfer that came up short.
+// Thrown for a transfer of fewer bytes than requested.
 #pragma once
 
 #include <cstdint>
@@ -10,7 +10,7 @@ namespace pmutil {
 // The message is "I/O underrun, actual count=" and the count.
 class XUnderrun : public std::runtime_error {
 public:
-    // `count` bytes were transferred; they are kept if `bytes` points to them.
+    // `count` bytes were transferred. If `bytes` isn't null, they are copied from there.
     explicit XUnderrun(std::uint64_t count, const void* bytes = nullptr);
     ~XUnderrun() override;
 

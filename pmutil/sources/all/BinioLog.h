@@ -1,4 +1,4 @@
-// The switch of the log statements about handles and pipes.
+// Enables the log statements about handles and pipes.
 #pragma once
 
 #include "pmutil/PMLogging.h"

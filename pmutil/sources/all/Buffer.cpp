@@ -15,8 +15,8 @@ namespace pmutil {
 
 namespace {
 
-constexpr std::uint64_t kPage = 0x1000;
-constexpr std::uint64_t kLargest = std::numeric_limits<std::uint64_t>::max();
+constexpr std::uint64_t kPage = 0x1000; // bytes
+constexpr std::uint64_t kMaxCapacity = std::numeric_limits<std::uint64_t>::max();
 constexpr std::uint32_t kNoByte = 0xFFFFFFFF;
 
 constexpr char kBadState[] = "Buffer::SetState: bad args";
@@ -29,7 +29,7 @@ unsigned char* Allocate(std::uint64_t size)
     return new unsigned char[static_cast<std::size_t>(size)];
 }
 
-// memcpy, which may not be called with null even for nothing.
+// Calls memcpy, which must not get null pointers even for 0 bytes.
 void Copy(void* to, const void* from, std::uint64_t nbytes)
 {
     if (nbytes > 0)
@@ -50,7 +50,7 @@ Buffer::Buffer(void* block, std::uint64_t size)
 }
 
 Buffer::Buffer(const Buffer& other)
-    // NOLINTBEGIN(readability-redundant-member-init): GCC wants a copy to name its bases.
+    // NOLINTBEGIN(readability-redundant-member-init): GCC requires the bases in a copy constructor.
     : Channel(),
       RandomAccess(),
       // NOLINTEND(readability-redundant-member-init)
@@ -215,11 +215,11 @@ void Buffer::Grow(std::uint64_t extra)
 {
     if (!IsGrowable())
         throw std::runtime_error("not IsGrowable");
-    if (extra > kLargest - fCapacity)
+    if (extra > kMaxCapacity - fCapacity)
         throw std::runtime_error("cannot Grow Buffer that large");
     RequireNotClosed();
     std::uint64_t wanted = fCapacity + extra;
-    if (wanted <= kLargest - (kPage - 1))
+    if (wanted <= kMaxCapacity - (kPage - 1))
         wanted = (wanted + (kPage - 1)) / kPage * kPage;
     Reallocate(wanted, fEndOfData);
 }
@@ -292,12 +292,12 @@ void Buffer::BinioSeek(std::uint64_t position)
 
 void Buffer::BinioSeekRelative(std::int64_t delta)
 {
-    // Unsigned negation, since the lowest signed number has no positive counterpart.
+    // Negate as unsigned, since the negation of the lowest signed number overflows.
     const auto magnitude =
         delta < 0 ? 0 - static_cast<std::uint64_t>(delta) : static_cast<std::uint64_t>(delta);
     if (delta < 0 && magnitude > fOffset)
         throw std::runtime_error("Buffer: offset would be negative");
-    if (delta > 0 && magnitude > kLargest - fOffset)
+    if (delta > 0 && magnitude > kMaxCapacity - fOffset)
         throw std::runtime_error("Buffer: seek past EOF");
     Seek(delta < 0 ? fOffset - magnitude : fOffset + magnitude);
 }

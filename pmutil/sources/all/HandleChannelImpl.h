@@ -1,4 +1,4 @@
-// The body of HandleChannel, for the platform sources that instantiate it.
+// The implementation of HandleChannel, for the platform sources that instantiate it.
 #pragma once
 
 #include <algorithm>
@@ -53,7 +53,7 @@ auto HandleChannel<Platform>::OpenFile(const Path& path, int access, int creatio
         throw std::invalid_argument("OpenFile: bad access flags");
     if (creation < kOpenExisting || creation > kCreateAlways)
         throw std::invalid_argument("OpenFile: bad creation flags");
-    // Made first, so that no failure can come between the handle and its owner.
+    // Make the owner first, so that a failed allocation can't leak the handle.
     boost::shared_ptr<HandleChannel> channel(new HandleChannel(Platform::GetInvalid(), false));
     Path deletePath = deleteOnClose ? path : Path();
     channel->fHandle = Platform::Open(path, access, creation);
@@ -87,7 +87,7 @@ auto HandleChannel<Platform>::MakeTemporaryFileName(const Path& prefix) -> Path
     return Platform::MakeTemporaryFileName(prefix);
 }
 
-// The standard channels are never destroyed: what still writes during process exit finds them.
+// The standard channels are never destroyed, so that they can be used during process exit.
 template <typename Platform>
 Reader& HandleChannel<Platform>::GetStandardInput()
 {
@@ -143,7 +143,7 @@ std::uint64_t HandleChannel<Platform>::BinioTell()
 template <typename Platform>
 void HandleChannel<Platform>::BinioSeek(std::uint64_t position)
 {
-    // Positions above the signed range turn negative, which the system refuses.
+    // Positions above the signed range become negative, which the system rejects.
     Platform::Seek(fHandle, static_cast<std::int64_t>(position), SeekOrigin::kBegin);
 }
 

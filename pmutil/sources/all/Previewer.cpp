@@ -9,9 +9,9 @@ namespace pmutil {
 
 namespace {
 
-// How far one read may go: what it reads needs a place in the collection beforehand, since nothing
-// may go wrong between the reader and the collection.
-constexpr std::uint64_t kLongestRead = 0x10000;
+// Bytes. The memory for the bytes of a read is allocated before the read, so that no byte is lost
+// if the allocation fails.
+constexpr std::uint64_t kMaxReadSize = 0x10000;
 
 } // namespace
 
@@ -32,7 +32,7 @@ std::uint64_t Previewer::ReadSome(void* bytes, std::uint64_t nbytes)
 {
     if (fCollected == nullptr)
         throw std::runtime_error("Previewer: preview ended");
-    const std::uint64_t wanted = std::min(nbytes, kLongestRead);
+    const std::uint64_t wanted = std::min(nbytes, kMaxReadSize);
     const std::uint64_t capacity = fCollected->GetCapacity();
     if (capacity - fCollected->GetOffset() < wanted)
         fCollected->Grow(std::max(wanted, capacity));

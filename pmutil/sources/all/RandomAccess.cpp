@@ -48,7 +48,7 @@ void RandomAccess::DoSetEOF()
 
 void RandomAccess::BinioSetEOF()
 {
-    // Null for a target that has no end to set; RequireTarget refuses it.
+    // Null if the target isn't a RandomAccess; RequireTarget then throws.
     auto* const target = dynamic_cast<RandomAccess*>(GetTarget());
     RequireTarget(target);
     if (target != nullptr)

@@ -109,7 +109,7 @@ void Reader::EndPreview(std::unique_ptr<Buffer> data)
     if (std::exchange(fPreviewIsStale, false))
         return;
     if (fPushback != nullptr) {
-        // The bytes came out of it, so they are still there.
+        // The preview read its bytes from the pushback, which still has them.
         fPushback->SeekRelative(-static_cast<std::int64_t>(data->GetEndOfData()));
         return;
     }
@@ -156,7 +156,7 @@ void Reader::DoClose()
 void Reader::DropPushback()
 {
     fPushback.reset();
-    // Within a preview's own read there is no previewer, and what was stale stays it.
+    // During ReadPreview fPreviewer is null, and fPreviewIsStale doesn't change.
     if (fPreviewer != nullptr)
         fPreviewIsStale = true;
 }

@@ -7,7 +7,7 @@ namespace pmutil {
 
 void ThrowFailed(const CallFailure& failure, const std::string& path)
 {
-    // A path with a zero byte ends there, so that the text after it can be seen.
+    // Truncate the path at a zero byte, which would end the text for most readers.
     // NOLINTNEXTLINE(readability-redundant-string-cstr)
     throw std::runtime_error(std::string(failure.call) + " failed: " + path.c_str() +
                              (path.empty() ? "" : ": ") +

@@ -1,11 +1,11 @@
-// Failures of the system's calls.
+// Failures of system calls.
 #pragma once
 
 #include <string>
 
 namespace pmutil {
 
-// A failed call before it is known for whom it was made.
+// A failed call and its errno, thrown where the path for the failure text isn't known.
 struct CallFailure {
     const char* call;
     int error;

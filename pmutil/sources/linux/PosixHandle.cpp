@@ -15,10 +15,11 @@ namespace pmutil {
 
 namespace {
 
-// What the kernel moves in one call; it refuses sizes beyond the signed range outright.
-constexpr std::uint64_t kMostPerCall = 0x7FFFF000;
+// The kernel transfers at most this many bytes per call (MAX_RW_COUNT) and rejects sizes above the
+// signed range.
+constexpr std::uint64_t kMaxBytesPerCall = 0x7FFFF000;
 
-// Read and write for all: the process's file mode creation mask takes away from it.
+// Read and write for all, less the process's umask.
 constexpr ::mode_t kFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IWGRP | S_IROTH | S_IWOTH;
 
 [[noreturn]] void ThrowCallFailed(const char* call, int error)
@@ -56,8 +57,8 @@ int GetWhence(SeekOrigin origin)
     return SEEK_END;
 }
 
-// Keeps SIGPIPE from the calling thread, and swallows the one that a write raises meanwhile. The
-// process's disposition of the signal, which belongs to the host, stays as it is.
+// Blocks SIGPIPE on the calling thread, and removes the one that a write raises meanwhile. The
+// signal's disposition, which belongs to the host application, doesn't change.
 class PipeSignalBlock {
 public:
     PipeSignalBlock()
@@ -77,7 +78,8 @@ public:
     PipeSignalBlock(const PipeSignalBlock&) = delete;
     PipeSignalBlock& operator=(const PipeSignalBlock&) = delete;
 
-    void Swallow()
+    // Removes the pending SIGPIPE, unless one was pending before.
+    void ClearPending()
     {
         if (fWasPending)
             return;
@@ -95,7 +97,7 @@ private:
 
 void PosixCalls::Close(Handle handle)
 {
-    // Not repeated when interrupted: the descriptor is gone by then.
+    // Don't repeat an interrupted close: the descriptor has been released.
     ::close(handle);
 }
 
@@ -107,8 +109,8 @@ void PosixCalls::Delete(const Path& path)
 PosixCalls::Handle PosixCalls::Open(const Path& path, int access, int creation)
 {
     static constexpr char kCall[] = "open";
-    // A path with a zero byte would open another file, and a truncation without the right to write
-    // is carried out all the same.
+    // Reject a path with a zero byte, which would open another file, and truncation without write
+    // access, which the kernel would carry out.
     if (path.find('\0') != Path::npos || (access == kOpenRead && creation == kTruncateExisting))
         ThrowCallFailed(kCall, EINVAL);
     const Handle handle = RetryInterrupted(
@@ -125,7 +127,7 @@ PosixCalls::Handle PosixCalls::Open(const Path& path, int access, int creation)
 
 std::uint64_t PosixCalls::Read(Handle handle, void* bytes, std::uint64_t nbytes)
 {
-    const std::size_t wanted = std::min(nbytes, kMostPerCall);
+    const std::size_t wanted = std::min(nbytes, kMaxBytesPerCall);
     const ::ssize_t count = RetryInterrupted([&] { return ::read(handle, bytes, wanted); });
     if (count < 0)
         ThrowCallFailed("read", errno);
@@ -134,13 +136,13 @@ std::uint64_t PosixCalls::Read(Handle handle, void* bytes, std::uint64_t nbytes)
 
 std::uint64_t PosixCalls::Write(Handle handle, const void* bytes, std::uint64_t nbytes)
 {
-    const std::size_t wanted = std::min(nbytes, kMostPerCall);
+    const std::size_t wanted = std::min(nbytes, kMaxBytesPerCall);
     PipeSignalBlock block;
     const ::ssize_t count = RetryInterrupted([&] { return ::write(handle, bytes, wanted); });
     const int error = errno;
-    // A reader that goes in the middle of a write raises the signal too, and cuts the count short.
+    // If the reader closes during the write, the count is short and the signal is raised too.
     if (count < 0 ? error == EPIPE : static_cast<std::size_t>(count) < wanted)
-        block.Swallow();
+        block.ClearPending();
     if (count < 0)
         ThrowCallFailed("write", error);
     return static_cast<std::uint64_t>(count);
@@ -168,8 +170,8 @@ void PosixCalls::SetEndOfFile(Handle handle)
 
 PosixCalls::Path PosixCalls::GetTemporaryDirectory()
 {
-    const char* const directory = ::secure_getenv("TMPDIR"); // NOLINT(concurrency-mt-unsafe): the
-                                                             // environment is only read
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): the environment is only read
+    const char* const directory = ::secure_getenv("TMPDIR");
     return directory != nullptr && *directory != '\0' ? directory : "/tmp";
 }
 
