@@ -1,6 +1,6 @@
-// Named debug values: process-wide integers, looked up by name, that govern logging and a few
-// delays. Nothing outside the process sets them; a value is 0 (or its declared initial) until the
-// program itself writes it.
+// Named debug values: process-wide integers, looked up by name, that control logging and a few
+// delays. They can't be set from outside the process; a value is 0, or its declared initial value,
+// until the program writes it.
 #pragma once
 
 #include <atomic>
@@ -12,8 +12,8 @@ namespace pmutil {
 //
 //     DebugValue gLog{"ConsoleAppLog", 0};
 //
-// Two records with one name share one value. `name` must outlive the process's use of it; a string
-// literal does.
+// Records with the same name share one value. `name` must stay valid until the process ends; use a
+// string literal.
 struct DebugValue {
     const char* name;
     std::int32_t initial;
@@ -26,38 +26,38 @@ struct DebugValue {
     DebugValue& operator=(const DebugValue&) = delete;
 };
 
-// The value behind a record, to be read and written directly from any thread.
+// A debug value. Any thread may read and write it.
 using DebugInteger = std::atomic<std::int32_t>;
 
-// The name under which a process would be handed such values from outside. Nothing reads it.
+// Reserved as the name for setting debug values from outside. Unused.
 inline constexpr char kDebugFlagsName[] = "AssayDebugFlags";
 
 namespace detail {
-// Slot 0 is never assigned, so 100 names fit. It isn't 0, so that a record that isn't resolved yet
-// reads as one that may be set.
+// Slot 0 belongs to records that aren't resolved yet, so 100 names fit. Its value is not 0, so that
+// MayBeSet returns true for such records.
 inline constexpr std::int32_t kDebugValueSlots = 101;
 extern DebugInteger gDebugValues[kDebugValueSlots];
 
-// False if the value behind the record is known to be 0. What a log statement costs while it is
-// off.
+// Returns false if the record's value is known to be 0. This is the whole cost of a disabled log
+// statement.
 inline bool MayBeSet(const DebugValue& record)
 {
     const std::int32_t index = record.index.load(std::memory_order_acquire);
     return gDebugValues[index].load(std::memory_order_relaxed) != 0;
 }
 
-// The slow road of GetDebugValue: finds or makes the name's slot under the log mutex.
+// The slow path of GetDebugValue: finds or assigns the name's slot under the log mutex.
 DebugInteger& ResolveDebugValue(DebugValue& record);
 
-// Lets names be resolved from now on; called by InitLogging with the log mutex held.
+// Enables the resolution of names. InitLogging calls it with the log mutex held.
 void PrepareDebugValues();
 } // namespace detail
 
-// The integer that `record` names. A load and a test once the name is resolved; the first call
-// after InitLogging resolves it under the log mutex and stores the record's initial value.
+// Returns the value that `record` names. The first call after InitLogging resolves the name under
+// the log mutex and stores the record's initial value; later calls cost a load and a test.
 //
-// Before InitLogging, and for every name beyond the hundredth, the result is one shared overflow
-// integer, and nothing is cached. The reference stays valid until the process ends.
+// Before InitLogging, and for all names beyond the hundredth, returns a shared overflow value; the
+// record then stays unresolved. The reference is valid until the process ends.
 inline DebugInteger& GetDebugValue(DebugValue& record)
 {
     const std::int32_t index = record.index.load(std::memory_order_acquire);

@@ -1,15 +1,15 @@
-// Turns typed values into text, with one default format per C type and the means to replace it:
-// per call, or in a formatter's table. An unsigned number is taken for a bit pattern and shown in
-// hexadecimal.
+// Formats typed values. Each C type has a default format, which can be replaced per call or in a
+// formatter's table. Unsigned numbers are formatted in hexadecimal.
 //
 //     std::string text;
 //     Fmt::ToText(text, 10u);         // 0x0000000a
 //     Fmt::ToText(text, 10u, "%u");   // 10
 //
-// Formats are printf's, except that one for bool is a double string (kFormatYesNo) and one for char
-// a function. A format that doesn't fit its type is the caller's fault, as with printf.
+// Formats are those of printf, except for bool (two zero-terminated texts, such as kFormatNoYes)
+// and char (a function). A format that doesn't match its type is undefined behaviour, as with
+// printf.
 //
-// Any thread may format; make and destroy formatters, and change tables, while no other one does.
+// Any thread may format. Don't make, destroy or change formatters while another thread uses any.
 #pragma once
 
 #include <cstdint>
@@ -47,25 +47,26 @@ public:
         kKinds
     };
 
-    // The format of a char: writes `value` to `out`, quoted with `quote`.
+    // The format of a char: appends `value` to `out`, quoted with `quote`.
     using CharFormat = void (*)(std::string& out, char value, char quote);
 
-    // Starts out with the default formats, and joins the process's chain of formatters behind its
-    // head.
+    // Sets the default formats and inserts the formatter after the head of the process's list of
+    // formatters.
     Fmt();
     virtual ~Fmt();
     Fmt(const Fmt&) = delete;
     Fmt& operator=(const Fmt&) = delete;
 
-    // The head of the chain, whose table serves callers without a formatter: one static formatter.
+    // Returns the head of the list, a static formatter. ToText and CodeToText use its table.
     static Fmt& GetHead();
 
-    // Replaces an entry of the table, for every kind but kChar. The text must outlive its use.
+    // Replaces an entry of the table. `format` must outlive the formatter. Does nothing for kChar;
+    // use the second form.
     void SetFormat(Kind kind, const char* format);
     void SetFormat(CharFormat format);
 
-    // Replaces `out` by the text of a value; a null format stands for the table's. A null string
-    // gives "<NULL>", whatever the format.
+    // Sets `out` to the text of a value. If `format` is null, the table's format is used. A null
+    // string is "<NULL>" in any format.
     void Format(std::string& out, bool value, const char* format = nullptr);
     void Format(std::string& out, char value, CharFormat format = nullptr);
     void Format(std::string& out, signed char value, const char* format = nullptr);
@@ -83,10 +84,10 @@ public:
     void Format(std::string& out, const char* value, const char* format = nullptr);
     void Format(std::string& out, const void* value, const char* format = nullptr);
 
-    // The characters of a four-character code, highest byte first, between single quotes.
+    // Sets `out` to the characters of a four-character code, highest byte first, in single quotes.
     void FormatCode(std::string& out, std::uint32_t value);
 
-    // The same with the head of the chain.
+    // The same with the head of the list.
     template <typename T>
     static void ToText(std::string& out, T value)
     {
@@ -99,8 +100,8 @@ public:
     }
     static void CodeToText(std::string& out, std::uint32_t value);
 
-    // The default formats. That of pointers is the one of unsigned long long, unless the platform
-    // set another before.
+    // The default formats. For pointers it is that of unsigned long long, unless
+    // SetPlatformPointerFormat has set another.
     static const char* GetBoolFormat();
     static CharFormat GetCharFormat();
     static const char* GetSCharFormat();
@@ -118,12 +119,12 @@ public:
     static const char* GetCStringFormat();
     static const char* GetPointerFormat();
 
-    // Sets the default for pointers, for formatters made from now on; null goes back. A format of
-    // the %p kind gets the pointer, any other one an unsigned long long.
+    // Sets the default format of pointers for formatters made later; null restores the initial one.
+    // A %p format gets the pointer, any other format an unsigned long long.
     static void SetPlatformPointerFormat(const char* format);
 
-    // A format text for decimal output in columns wide enough for every signed integer of `bytes`
-    // bytes, 1 to 8: MakeDecimalFormat(4, "") gives "%11d".
+    // Returns a decimal format whose width fits every signed integer of `bytes` bytes, 1 to 8:
+    // MakeDecimalFormat(4, "") returns "%11d".
     static std::string MakeDecimalFormat(int bytes, const char* lengthModifier);
 
 protected:

@@ -1,4 +1,4 @@
-// printf-style formatting into strings.
+// printf-style formatting to strings.
 #pragma once
 
 #include <cstdarg>
@@ -16,11 +16,11 @@ namespace pmutil {
 #define PMUTIL_PRINTF(formatIndex, firstArgument)
 #endif
 
-// A printf-style format and its arguments as a string of any length.
+// Format the arguments to a string of any length. Return an empty string if the C library fails.
 std::string FormatString(const char* format, ...) PMUTIL_PRINTF(1, 2);
 std::string FormatStringV(const char* format, std::va_list arguments) PMUTIL_PRINTF(1, 0);
 
-// A format text for hexadecimal output of an integer of `bytes` bytes: MakeHexFormat(4, "l") gives
+// Returns a hexadecimal format for an integer of `bytes` bytes: MakeHexFormat(4, "l") returns
 // "0x%08lx".
 std::string MakeHexFormat(int bytes, const char* lengthModifier);
 

@@ -1,4 +1,4 @@
-// Where log lines go: the concrete loggers.
+// The concrete loggers.
 #pragma once
 
 #include <cstdio>
@@ -8,7 +8,7 @@
 
 namespace pmutil {
 
-// Swallows everything; stands in when no other logger lives. Its name is "PMNullLogger".
+// Discards all lines. Used if there is no other logger. Its name is "PMNullLogger".
 class PMNullLogger : public PMLogger {
 public:
     PMNullLogger();
@@ -18,9 +18,9 @@ public:
     void Write(const char* data, std::size_t size) override;
 };
 
-// Writes to a C stream, flushed after each line. Named "stdout", "stderr" or "FILE*". The stream is
-// not owned; a null one swallows everything. A line that the stream refuses is lost, and doesn't
-// turn up in front of what is written to the stream later.
+// Writes to a C stream and flushes it after each line. Its name is "stdout", "stderr" or "FILE*".
+// The stream is not owned; with a null stream all lines are discarded. A line whose write fails is
+// discarded and not retried.
 class PMStdioLogger : public PMLogger {
 public:
     explicit PMStdioLogger(std::FILE* stream);
@@ -32,10 +32,9 @@ private:
     std::FILE* fFile;
 };
 
-// Writes to standard output in the form of a comment of the report: each line begins with "# ". A
-// line goes out in one piece when it is flushed, at the latest when the logger is destroyed. If
-// standard output takes only a part of it, the next line, of the log or of the report, begins on a
-// line of its own (PutLine).
+// Writes to standard output as comments of the report: each line begins with "# ". A line is
+// written in one call when it is flushed, at the latest by the destructor. If only a part of it is
+// written, the next line, of the log or of the report, starts on a new line (PutLine).
 class AssayLogger : public PMStdioLogger {
 public:
     AssayLogger();
@@ -48,18 +47,19 @@ private:
     std::string fLine;
 };
 
-// Writes to a file in the user's desktop folder, "pmlog.txt" for a null name; the bare name in the
-// current directory if there is no such folder. The file is open only for the length of a line, so
-// that what was logged is on disk if the process dies at the next statement. It begins anew with
-// the first logger of the process that uses it; a logger that wrote nothing leaves no empty file.
-// A file that can't be opened costs the line, and is told once per logger on standard error. A
-// path that can't be told in narrow characters costs it too: Write throws a boost::system error
-// with the text "boost::filesystem::path codecvt to string".
+// Writes to a file in the user's desktop folder, or in the current directory if there is no such
+// folder. The file is opened for each line and closed after it, so that the line is on disk if the
+// process crashes next. The first logger of the process on a path deletes an older file there; a
+// logger that wrote nothing leaves no empty file. If the file can't be opened, the line is lost and
+// the failure is reported on standard error, once per logger. If the path can't be converted to
+// narrow characters, Write throws a boost::system error with the text "boost::filesystem::path
+// codecvt to string".
 class PMFileLogger : public PMLogger {
 public:
+    // `name` is the file's name; null is "pmlog.txt".
     explicit PMFileLogger(const char* name);
 
-    // The same in another folder; an empty one stands for the current directory.
+    // The same in another folder; an empty folder is the current directory.
     PMFileLogger(const std::wstring& folder, const char* name);
     ~PMFileLogger() override;
     void Flush() override;
@@ -73,7 +73,7 @@ private:
     std::FILE* fFile = nullptr;
     std::wstring fPath;
     bool fLineLost = false;
-    bool fOpenFailureTold = false;
+    bool fOpenFailureReported = false;
 };
 
 } // namespace pmutil

@@ -1,7 +1,7 @@
-// The owner of one running thread, who may give up waiting for it and let it go.
+// Owns a running thread, which can be joined with a timeout or abandoned.
 //
-// A process-wide registry, which outlives everything, keeps the abandoned threads' objects alive.
-// One ManagedThread is used by one thread at a time.
+// A process-wide registry, which is never destroyed, keeps the objects of abandoned threads alive.
+// Use a ManagedThread from one thread at a time.
 #pragma once
 
 #include <cstddef>
@@ -17,37 +17,39 @@ struct ManagedThreadRegistry;
 
 class ManagedThread {
 public:
-    // `name` is a label for log lines; null stands for an empty one.
+    // `name` is a label for log lines; null is an empty label.
     explicit ManagedThread(const char* name = nullptr);
 
-    // Abandons a thread that is still held; never blocks.
+    // Abandons the thread, if one is held; never blocks.
     ~ManagedThread();
     ManagedThread(const ManagedThread&) = delete;
     ManagedThread& operator=(const ManagedThread&) = delete;
 
-    // Abandons the thread held, and takes ownership of `thread`, which may be null.
+    // Abandons the present thread and takes ownership of `thread`, which may be null.
     void Assign(boost::thread* thread);
 
-    // Waits up to `seconds` for the thread to end. True if it ended and is held no more; false if
-    // it didn't, if no thread is held, or if the caller is that thread. Call it without a lock that
-    // the thread needs.
+    // Waits up to `seconds` for the thread to end. Returns true if it has ended; it is then no
+    // longer held. Returns false on a timeout, if no thread is held, or if the caller is that
+    // thread. Don't hold a lock that the thread needs.
     bool TimedJoin(double seconds);
 
-    // The same without a limit.
+    // Waits for the thread to end, without a limit. Does nothing if no thread is held.
     void Join();
 
-    // Lets go of the thread, which runs on and stays registered until the process ends.
+    // Releases the thread without waiting. It keeps running and stays registered until the process
+    // ends.
     void Abandon();
 
     bool HoldsThread() const { return fThread != nullptr; }
 
-    // A share of the thread held, empty if none is. A thread that is joined while somebody has one
-    // stays registered.
+    // Returns the thread held, empty if there is none. If a caller still shares it when it is
+    // joined, the thread stays registered.
     boost::shared_ptr<boost::thread> GetThread() const { return fThread; }
 
+    // Replaces the label.
     void SetName(const char* name);
 
-    // How many threads are registered: those held, and those abandoned. Any thread may ask.
+    // Returns the number of registered threads, held and abandoned ones. Any thread may call it.
     static std::size_t GetRegisteredThreadCount();
 
 private:

@@ -1,5 +1,5 @@
-// Command-line options of the form -name=value, taken apart in one way for the child that performs
-// them and for the host that predicts what they do.
+// Parses command-line options of the form -name=value, for the child that performs them and for the
+// host that predicts their effect.
 #pragma once
 
 #include <cstdint>
@@ -13,12 +13,12 @@ struct Option {
     std::string fValue;
 };
 
-// The name and the value of "-name=value"; nothing if there is no hyphen in front or no "=". The
-// first "=" counts. A value inside double quotes is without them.
+// Splits "-name=value" at the first "=". Returns nothing without a leading hyphen or without "=".
+// Removes double quotes around the value.
 std::optional<Option> SplitOption(const std::string& argument);
 
-// The number at the start of the text, in C's notation: decimal, "0x" hexadecimal or "0" octal.
-// Clamped to 32 bits on every platform; 0 if there is none.
+// Parses the integer at the start of the text: decimal, hexadecimal with "0x" or octal with "0".
+// Clamps it to 32 bits. Returns 0 if the text doesn't start with a number.
 std::int32_t ParseInteger(const std::string& text);
 
 } // namespace pmutil

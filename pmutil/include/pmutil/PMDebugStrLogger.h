@@ -1,4 +1,4 @@
-// The logger of the debugger's output stream. Exists on Windows only.
+// Logs to the debugger's output stream. Windows only.
 #pragma once
 
 #include <string>
@@ -7,8 +7,8 @@
 
 namespace pmutil {
 
-// Hands each piece of a line to the debugger as a text of its own: prefix, message and line end,
-// which is a carriage return and a newline. Its name is "DebugStr".
+// Passes each part of a line to the debugger as a text of its own: prefix, message and line end,
+// which is "\r\n". Its name is "DebugStr".
 class PMDebugStrLogger : public PMLogger {
 public:
     PMDebugStrLogger();

@@ -1,7 +1,7 @@
-// Logging. The most recently constructed live logger is the current one, and every log statement
-// of the process writes to it. Whether a statement logs at all is decided by a named debug value.
+// Logging. The most recently made live logger is the current one; all log statements of the process
+// write to it. A named debug value enables or disables a statement.
 //
-// Any thread may log. The log mutex makes each line whole.
+// Any thread may log. The log mutex keeps the lines of several threads apart.
 #pragma once
 
 #include <atomic>
@@ -19,46 +19,46 @@
 
 namespace pmutil {
 
-// Formats and assembles lines; a sink derives from it and supplies Write. A logger is made and
-// destroyed on any thread, but only while no other thread logs, makes or destroys one: it is the
-// current logger before its sink is complete.
+// The base class of the loggers: formats and assembles lines; a sink implements Write. Make and
+// destroy a logger on any thread, but only while no other thread logs, makes or destroys one: it
+// becomes the current logger before the sink's constructor has run.
 class PMLogger : public Stackable<PMLogger> {
 public:
-    // Becomes the current logger. If logging has started, the logger that was current until now
-    // gets the line "Activating new logger NAME"; its failure to write it is ignored.
+    // Becomes the current logger. After InitLogging, writes the line "Activating new logger NAME"
+    // to the previous logger; a failure of that is ignored.
     explicit PMLogger(const std::string& name);
     ~PMLogger() override;
 
-    // True here, whatever the level; all callers pass 0.
+    // Returns true. All callers pass level 0.
     virtual bool IsEnabled(int level);
 
-    // The text behind the last "\" or "/" that has something behind it; empty for null.
+    // Returns the text after the last "\" or "/" that is followed by a character; empty for null.
     virtual std::string GetBaseName(const char* path);
 
-    // Assembles and writes one line: prefix, formatted message, a line end unless the text has one
-    // already, then Flush. Holds the log mutex.
+    // Writes one line: prefix, formatted message, and a line end unless the message has one; then
+    // calls Flush. Holds the log mutex.
     virtual void Log(const char* file, int line, const char* format, std::va_list arguments)
         PMUTIL_PRINTF(4, 0);
 
-    // "NNNNN.YYYY.MM.DD_HH:MM:SS.mmm(+S.mmm)[tid=T] ": line number, universal time, seconds since
-    // this logger's previous line (0 for its first), thread name or id. Counts the line. The place
-    // isn't shown here; overrides may.
+    // Returns "NNNNN.YYYY.MM.DD_HH:MM:SS.mmm(+S.mmm)[tid=T] ": line number, universal time, seconds
+    // since this logger's previous line (0 for its first), thread name or id. Increments the line
+    // number. Doesn't use `file` and `line`; overrides may.
     virtual std::string GetPrefix(const char* file, int line);
 
-    // Empty, and not used by Log.
+    // Returns an empty text. Log doesn't use it.
     virtual std::string GetSuffix();
 
-    // Called at the end of each line, with the log mutex held. Does nothing here.
+    // Called after each line, with the log mutex held. Does nothing.
     virtual void Flush();
 
-    // "\n" here.
+    // Returns "\n".
     virtual std::string GetLineEnd();
 
-    // The sink's output operation. Called with the log mutex held.
+    // Writes a part of a line. Called with the log mutex held.
     virtual void Write(const char* data, std::size_t size) = 0;
 
-    // The timed entry points that callers use; each only forwards to the operation of its purpose:
-    // IsEnabled at level 0, Log, GetLineEnd (whose text it gives, without writing it) and Write.
+    // Forward to IsEnabled(0), Log, GetLineEnd and Write, and add their time to GetLogTime. Callers
+    // use these. WriteLineEnd only returns the text.
     bool IsEnabledWrapper();
     void LogPrintf(const char* file, int line, const char* format, ...) PMUTIL_PRINTF(4, 5);
     std::string WriteLineEnd();
@@ -72,26 +72,26 @@ private:
     std::string fName;
 };
 
-// The current logger together with a share of the stack it stands on; empty before InitLogging.
-// Doesn't keep the logger alive: hold it for one statement only.
+// The current logger. Shares ownership of the stack, not of the logger: hold it for one statement
+// only. Empty before InitLogging.
 using LoggerHolder = StackableHolder<PMLogger>;
 
-// Starts logging, once per process: before it statements write nothing and debug values are not
-// resolved. A second call does nothing.
+// Starts logging. Before that, log statements write nothing and debug values aren't resolved.
+// Further calls do nothing.
 void InitLogging();
 
-// The logger on top of the stack, a PMNullLogger made on demand if the stack is empty; an empty
-// holder before InitLogging.
+// Returns the current logger; if there is none, a PMNullLogger. Before InitLogging, returns an
+// empty holder.
 LoggerHolder GetCurrentLogger();
 
-// Serialises log lines and the registry of debug values. Recursive, so a sink may log.
+// Guards log lines and the registry of debug values. Recursive, so that a sink may log.
 boost::recursive_mutex& GetLogMutex();
 
-// Total seconds that the process spent in logging, nested calls counted once.
+// Returns the seconds that the process has spent in logging; nested calls count once.
 double GetLogTime();
 
-// Logs "BEGIN NAME" now and "END NAME, duration=SECONDS" at the end of the scope, if the current
-// logger is enabled then. `file` must outlive the scope.
+// Logs "BEGIN NAME" and, at the end of the scope, "END NAME, duration=SECONDS", if the current
+// logger is enabled at that time. `file` must outlive the scope.
 class PMLogScope {
 public:
     PMLogScope(const std::string& name, const char* file, int line);
@@ -106,7 +106,8 @@ private:
     std::string fName;
 };
 
-// The depth of indented log output. Nothing indents by itself. Any thread.
+// The depth of indented log output, for callers that insert it into their messages. Any thread may
+// use it.
 class LogIndent {
 public:
     void Increment() { ++fDepth; }
@@ -117,16 +118,16 @@ private:
 
     std::atomic<std::int32_t> fDepth{0};
 };
-// Writes one blank fewer than the depth.
+// Writes depth - 1 blanks.
 std::ostream& operator<<(std::ostream& out, const LogIndent& indent);
 extern LogIndent gLogIndent;
 
 namespace detail {
-// Inserts a statement's message, whatever its type, into a stream.
+// Inserts a statement's message into a stream; `message` points to the statement's functor.
 using MessageInserter = void (*)(std::ostream& out, const void* message);
 
-// The slow road of a log statement: if the debug value is set and the current logger is enabled,
-// assembles the message under the log mutex and writes it as one line. Swallows every exception.
+// The slow path of a log statement: if the debug value is set and the current logger is enabled,
+// assembles the message under the log mutex and writes it as one line. Ignores all exceptions.
 void WriteStatement(DebugValue& record, const char* file, int line, MessageInserter insert,
                     const void* message) noexcept;
 
@@ -140,8 +141,8 @@ void LogStatement(DebugValue& record, const char* file, int line, const Message&
 }
 } // namespace detail
 
-// A log statement: PM_LOG(gLog, "wmiNumDevices=" << count). While the debug value is 0, nothing of
-// the message is evaluated. A message that throws costs the line, nothing else.
+// A log statement: PM_LOG(gLog, "wmiNumDevices=" << count). While the debug value is 0, the message
+// isn't evaluated. If the message throws, the line is lost and the exception is ignored.
 #define PM_LOG(debugValue, ...)                                                                    \
     do {                                                                                           \
         if (::pmutil::detail::MayBeSet(debugValue))                                                \

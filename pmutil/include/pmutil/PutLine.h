@@ -1,5 +1,5 @@
-// Lines on a C stream that may fail at any byte: a full disk, a pipe that doesn't wait for its
-// reader.
+// Writes lines to a C stream on which a write may fail after any byte: a full disk, or a
+// non-blocking pipe.
 #pragma once
 
 #include <cstddef>
@@ -10,13 +10,12 @@
 
 namespace pmutil {
 
-// Writes `line`, which ends in a line end, by one call of put(text), which returns how many of the
-// text's bytes `stream` took. Returns false if it didn't take all; the line is lost then. If it
-// took a part, the next line begins with a line end, so that it stands on a line of its own. The
-// stream's error indicator stays set until then, so that all writers of lines share that state.
+// Writes `line`, which must end with a line end, by one call of put(text), which returns the number
+// of bytes that were written. Returns false if not all were written; the line is then lost. If a
+// part was written, the next call writes a line end first, so that the next line starts on a new
+// line. Until then the stream's error indicator stays set, so that all callers see that state.
 //
-// The stream must be unbuffered for that: a buffered one takes any line whole, and fails when it is
-// flushed.
+// The stream must be unbuffered: a buffered stream accepts the whole line and fails at the flush.
 template <typename Put>
 bool PutLine(std::FILE* stream, std::string line, const Put& put)
 {
@@ -24,10 +23,10 @@ bool PutLine(std::FILE* stream, std::string line, const Put& put)
     if (wasCut)
         line.insert(0, 1, '\n');
     std::clearerr(stream);
-    const std::size_t taken = put(line);
-    if (taken == line.size())
+    const std::size_t written = put(line);
+    if (written == line.size())
         return true;
-    const bool isCut = wasCut ? taken != 1 : taken != 0;
+    const bool isCut = wasCut ? written != 1 : written != 0;
     if (!isCut)
         DiscardUnwritten(stream);
     return false;

@@ -1,28 +1,28 @@
-// The one form in which a violated condition is reported.
+// Reports violated conditions.
 #pragma once
 
 namespace pmutil {
 
-// Receives the text of a violated requirement; null stands for a missing text.
+// Gets the text of a violated requirement; may be null.
 using FailureHandler = void (*)(const char* text);
 
-// The file text of a caller that doesn't tell where it is: RequirementFailed leaves the place out.
+// The file text of a caller without a source position: RequirementFailed leaves the position out.
 inline constexpr char kNoFile[] = "<NULL>";
 
 // Reports a violated condition: calls the failure handler with "file(line): message", or with the
-// message alone when `file` is null or kNoFile; "<NULL>" stands for a null message. Then throws
-// std::runtime_error with that text if `shouldThrow` is set, and returns otherwise. The handler is
-// called first, so that a failure is seen even where the exception is swallowed.
+// message only if `file` is null or kNoFile. A null message prints as "<NULL>". Then throws
+// std::runtime_error with that text if `shouldThrow` is true, else returns. The handler is called
+// first, so that the failure is reported even if the exception is ignored.
 void RequirementFailed(const char* file, int line, const char* message, bool shouldThrow);
 
-// Replaces the process's failure handler and returns the one before it; null restores the default,
-// which writes the text and a line end to standard error. Set it before any thread starts.
+// Replaces the process's failure handler and returns the previous one; null restores the default,
+// which writes the text and a line end to standard error. Call it before any thread starts.
 FailureHandler SetFailureHandler(FailureHandler handler);
 
-// The handler in force, never null.
+// Returns the current handler, never null.
 FailureHandler GetFailureHandler();
 
-// Calls the handler in force.
+// Calls the current handler.
 void CallFailureHandler(const char* text);
 
 } // namespace pmutil

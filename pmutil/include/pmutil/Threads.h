@@ -1,5 +1,5 @@
-// Names of threads, as log lines show them. The table lives as long as the process; an entry is
-// never removed, so a thread id that the system reuses inherits the old name until it is set again.
+// Thread names for log lines. The table of names is never destroyed and entries are never removed,
+// so a thread whose id is reused has the old name until it is named.
 #pragma once
 
 #include <cstdint>
@@ -7,17 +7,16 @@
 
 namespace pmutil {
 
-// Names the calling thread, for log lines and, where the platform has one, for the debugger.
-// Naming it again replaces the name.
+// Sets the name of the calling thread, for log lines and for ShowThreadName.
 void SetCurrentThreadName(const std::string& name);
 
-// The calling thread's name, or its id text if it was never named.
+// Returns the calling thread's name, or its id text if it has none.
 std::string GetCurrentThreadName();
 
-// The operating system's id of the calling thread as MakeThreadIDString writes it.
+// Returns MakeThreadIDString of the calling thread's id.
 std::string GetCurrentThreadIDString();
 
-// An id in lower-case hexadecimal without a prefix; "{Not-any-thread}" for 0.
+// Returns the id in lower-case hexadecimal without a prefix; "{Not-any-thread}" for 0.
 std::string MakeThreadIDString(std::uint64_t number);
 
 } // namespace pmutil

@@ -20,11 +20,11 @@ namespace {
 DebugInteger gOverflow{0};
 bool gPrepared = false; // guarded by the log mutex
 
-// Under the log mutex. Gives 0 if the name is known no more than it fits.
+// Returns 0 if the name is new and all slots are assigned. Call it with the log mutex held.
 std::int32_t FindOrAddSlot(const DebugValue& record)
 {
     using Slots = std::map<std::string, std::int32_t, std::less<>>;
-    static Slots& slots = *new Slots; // outlives all users
+    static Slots& slots = *new Slots; // never destroyed
     const auto known = slots.find(record.name);
     if (known != slots.end())
         return known->second;

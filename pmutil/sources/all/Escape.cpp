@@ -15,7 +15,7 @@ struct ShortForm {
     char letter;
 };
 
-// Written and read alike; the backslash, which stands for itself, is needed for writing only.
+// For both directions. Reading doesn't need the entry of the backslash, which stands for itself.
 constexpr ShortForm kShortForms[] = {{8, 'b'},  {9, 't'},  {10, 'n'},
                                      {12, 'f'}, {13, 'r'}, {'\\', '\\'}};
 
@@ -39,8 +39,8 @@ int DigitValue(unsigned code)
     return -1;
 }
 
-// True for most of any text, and told without asking the locale: it is a blank or graphic in all of
-// them.
+// Returns true for printable ASCII that needs no escape, which is graphic in all locales. This
+// avoids isgraph() for most characters.
 bool IsPlain(unsigned code, unsigned quote)
 {
     return code >= 0x20 && code <= 0x7e && code != '\\' && code != quote;
@@ -63,7 +63,7 @@ std::string EscapeAll(std::basic_string_view<Char> text, char quote)
     return out;
 }
 
-// True if the text's last character is a quote that no backslash takes the meaning from.
+// Returns whether the text's last character is a quote that isn't escaped by a backslash.
 template <typename Char>
 bool EndsWithBareQuote(std::basic_string_view<Char> text, Char quote)
 {

@@ -7,7 +7,7 @@
 #include "pmutil/Escape.h"
 #include "pmutil/Format.h"
 
-// The formats are the callers' and the table's, and never literals here.
+// Formats come from callers and from the table.
 #pragma GCC diagnostic ignored "-Wformat-nonliteral"
 
 namespace pmutil {
@@ -24,7 +24,7 @@ constexpr char kStringQuote = 0x22;
 
 const char* gPlatformPointerFormat = nullptr;
 
-// printf into `out`; texts of usual length cost no further allocation.
+// printf to `out`. Texts below 256 bytes need no allocation besides `out`.
 template <typename T>
 void Print(std::string& out, const char* format, T value)
 {
@@ -36,7 +36,7 @@ void Print(std::string& out, const char* format, T value)
         out = FormatString(format, value);
 }
 
-// "%d" and its longer forms, by far the most used formats, without printf.
+// "%d", "%ld" and "%lld", the most used formats, without printf.
 template <typename T>
 void AssignDecimal(std::string& out, T value)
 {
@@ -52,15 +52,14 @@ void WriteQuotedChar(std::string& out, char value, char quote)
     out += quote;
 }
 
-// Stands for itself between double quotes in every locale: a graphic character of ASCII, or a
-// blank.
+// Returns whether the character needs no escape between double quotes: printable ASCII, which is
+// graphic in all locales, without the double quote and the backslash.
 constexpr bool IsPlain(char character)
 {
     return character >= ' ' && character <= '~' && character != kStringQuote && character != '\\';
 }
 
-// Appends `text`, escaped for double quotes. Plain characters, which is nearly all of them, go in
-// runs.
+// Appends `text`, escaped for double quotes. Copies runs of plain characters at once.
 void AppendEscaped(std::string& out, const char* text)
 {
     for (;;) {
@@ -74,7 +73,7 @@ void AppendEscaped(std::string& out, const char* text)
     }
 }
 
-// The letter that ends the first conversion of a format; 0 if it has none.
+// Returns the letter of a format's first conversion; 0 if it has none.
 char GetConversion(const char* format)
 {
     for (const char* at = std::strchr(format, '%'); at != nullptr; at = std::strchr(at + 1, '%')) {
@@ -129,8 +128,7 @@ Fmt::~Fmt()
 
 Fmt& Fmt::GetHead()
 {
-    // Never destroyed, so that formatters and statements that outlive this source's statics find
-    // it.
+    // Never destroyed: it must outlive all formatters.
     static Fmt& head = *new Fmt(AsHead());
     return head;
 }
@@ -301,7 +299,7 @@ const char* Fmt::GetLongFormat()
 
 const char* Fmt::GetULongFormat()
 {
-    // Four bytes wide everywhere, however long the type is here.
+    // At least 8 digits on all platforms, also if the type has 8 bytes.
     static const std::string format = MakeHexFormat(4, "l");
     return format.c_str();
 }
@@ -344,8 +342,8 @@ void Fmt::SetPlatformPointerFormat(const char* format)
 
 std::string Fmt::MakeDecimalFormat(int bytes, const char* lengthModifier)
 {
-    const auto largest = static_cast<long long>((1ULL << (8 * bytes - 1)) - 1);
-    const std::size_t width = FormatString("%lld", largest).size() + 1;
+    const auto max = static_cast<long long>((1ULL << (8 * bytes - 1)) - 1);
+    const std::size_t width = FormatString("%lld", max).size() + 1;
     return FormatString("%%%d%sd", static_cast<int>(width), lengthModifier);
 }
 
@@ -466,7 +464,7 @@ void Fmt::FormatFourCC(std::string& out, std::uint32_t value)
         const std::uint32_t code = (value >> shift) & 0xFF;
         if (code == 0)
             break;
-        // Escaped for double quotes and set between single ones: that is how these codes look.
+        // Escaped for double quotes although the quotes around are single. Keep that format.
         EscapeCharacter(out, code, kStringQuote, 1);
     }
     out += kCharQuote;

@@ -8,7 +8,8 @@ namespace pmutil {
 
 namespace {
 
-// The C library's length for the text, which is in `buffer` only if it fits; negative on failure.
+// Returns the length of the text as vsnprintf does; `buffer` has all of it only if it fits.
+// Negative on failure.
 PMUTIL_PRINTF(3, 0)
 int TryFormat(char* buffer, std::size_t size, const char* format, std::va_list arguments)
 {
@@ -23,7 +24,7 @@ int TryFormat(char* buffer, std::size_t size, const char* format, std::va_list a
 
 std::string FormatStringV(const char* format, std::va_list arguments)
 {
-    // What every log statement asks for; the C library takes its time over it.
+    // The format of all log statements; vsnprintf is slower.
     if (std::strcmp(format, "%s") == 0) {
         std::va_list again;
         va_copy(again, arguments);
@@ -40,7 +41,7 @@ std::string FormatStringV(const char* format, std::va_list arguments)
     for (int growths = 0; length >= 0 && growths < kMaxGrowths; ++growths) {
         std::string text(static_cast<std::size_t>(length), '\0');
         length = TryFormat(text.data(), text.size() + 1, format, arguments);
-        // Only a value that changes between the attempts takes more than one growth.
+        // A second attempt is needed only if another thread changes an argument meanwhile.
         if (length >= 0 && static_cast<std::size_t>(length) <= text.size()) {
             text.resize(static_cast<std::size_t>(length));
             return text;

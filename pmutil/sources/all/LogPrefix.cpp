@@ -10,9 +10,9 @@ namespace pmutil {
 
 namespace {
 
-// The prefix is most of what a log line costs, and printf takes several times as long for it.
+// The prefix is most of the cost of a log line; printf needs several times as long for it.
 
-// The last `width` decimal digits of a number.
+// Writes the last `width` decimal digits of a number.
 char* PutDigits(char* out, unsigned number, int width)
 {
     for (int digit = width - 1; digit >= 0; --digit, number /= 10)
@@ -20,7 +20,7 @@ char* PutDigits(char* out, unsigned number, int width)
     return out + width;
 }
 
-// As "%05lu" does.
+// Appends "%05lu".
 void AppendLineNumber(std::string& out, std::uint32_t number)
 {
     char digits[std::numeric_limits<std::uint32_t>::digits10 + 1];
@@ -31,7 +31,7 @@ void AppendLineNumber(std::string& out, std::uint32_t number)
     out.append(digits, end);
 }
 
-// As "%06.3f" does: zeros come between the sign and the digits.
+// Appends "%06.3f"; zeros are inserted after the sign.
 void AppendSeconds(std::string& out, double seconds)
 {
     char digits[std::numeric_limits<double>::max_exponent10 + 8];

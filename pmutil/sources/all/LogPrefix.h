@@ -1,4 +1,4 @@
-// The text in front of each log line.
+// The prefix of log lines.
 #pragma once
 
 #include <cstdint>
@@ -6,8 +6,8 @@
 
 namespace pmutil {
 
-// "NNNNN.YYYY.MM.DD_HH:MM:SS.mmm(+S.mmm)[tid=T] " for a moment in seconds since 1970-01-01,
-// truncated to milliseconds, and the seconds since the line before.
+// Returns "NNNNN.YYYY.MM.DD_HH:MM:SS.mmm(+S.mmm)[tid=T] ". `seconds` is the time since 1970-01-01
+// UTC, printed truncated to milliseconds; `delta` is the time in seconds since the previous line.
 std::string MakeLogPrefix(std::uint32_t lineNumber, double seconds, double delta,
                           const std::string& thread);
 

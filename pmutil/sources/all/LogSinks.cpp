@@ -39,7 +39,7 @@ std::wstring JoinPath(const std::wstring& folder, const std::string& name)
     return folder.empty() ? file : folder + kSeparator + file;
 }
 
-// Removes the file at that path, if it is one and the condition holds for it.
+// Removes the regular file at that path if the condition holds for it.
 template <typename Condition>
 void RemoveIf(const std::wstring& file, const Condition& condition) noexcept
 {
@@ -49,14 +49,14 @@ void RemoveIf(const std::wstring& file, const Condition& condition) noexcept
         if (boost::filesystem::is_regular_file(path, failed) && condition(path))
             boost::filesystem::remove(path, failed);
     } catch (...) {
-        // A path that can't be told in narrow characters is Write's to report.
+        // Write reports a path that can't be converted to narrow characters.
     }
 }
 
-// True for the first logger of the process on that path. Under the log mutex.
+// Returns true for the first logger of the process on that path. Call it with the log mutex held.
 bool ClaimPath(const std::wstring& path)
 {
-    static std::set<std::wstring>& paths = *new std::set<std::wstring>; // outlives all users
+    static std::set<std::wstring>& paths = *new std::set<std::wstring>; // never destroyed
     return paths.insert(path).second;
 }
 
@@ -84,7 +84,7 @@ PMStdioLogger::~PMStdioLogger() = default;
 void PMStdioLogger::Flush()
 {
     const LogTimer timer;
-    // On a stream shared with the report a lost line must not make later ones fail.
+    // The report may use the same stream: a lost log line must not make later lines fail.
     if (fFile != nullptr && std::fflush(fFile) != 0)
         DiscardUnwritten(fFile);
 }
@@ -103,7 +103,7 @@ AssayLogger::~AssayLogger()
     try {
         AssayLogger::Flush();
     } catch (...) {
-        // What was left is lost, as on a stream that fails.
+        // The rest of the line is lost, as after a failed write.
     }
 }
 
@@ -152,8 +152,8 @@ PMFileLogger::~PMFileLogger()
 bool PMFileLogger::Open()
 {
     fFile = OpenSharedAppend(NativePath(fPath).string(GetPathCodecvt()));
-    if (fFile == nullptr && !fOpenFailureTold) {
-        fOpenFailureTold = true;
+    if (fFile == nullptr && !fOpenFailureReported) {
+        fOpenFailureReported = true;
         std::fprintf(stderr, "PMFileLogger: the log file %s can't be opened\n",
                      NativePath(fPath).string(GetPathCodecvt()).c_str());
     }
@@ -173,7 +173,7 @@ void PMFileLogger::Flush()
 void PMFileLogger::Write(const char* data, std::size_t size)
 {
     const LogTimer timer;
-    // A line whose first piece is lost is lost whole.
+    // If the first part of a line is lost, discard the rest of the line.
     if (fLineLost || (fFile == nullptr && !Open())) {
         fLineLost = true;
         return;

@@ -1,10 +1,10 @@
-// Measures how long the process spends in logging.
+// Measures the time that the process spends in logging.
 #pragma once
 
 namespace pmutil {
 
-// Stands at the head of every entry point of the logging system. The outermost one of nested calls
-// adds the time of its scope to what GetLogTime gives.
+// Make one at the start of each entry point of the logging system. The outermost of nested timers
+// adds the time of its scope to GetLogTime.
 class LogTimer {
 public:
     LogTimer();

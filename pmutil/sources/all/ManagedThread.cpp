@@ -16,7 +16,7 @@
 
 namespace pmutil {
 
-// One entry for each thread that was started and not yet joined.
+// One entry for each thread that was started and not joined.
 struct ManagedThreadRegistry {
     std::vector<boost::shared_ptr<boost::thread>> threads;
     std::size_t count = 0;
@@ -39,8 +39,7 @@ ManagedThreadRegistry& GetRegistry()
     return registry;
 }
 
-// How long a join may take until `deadline`, with one millisecond on top so that it doesn't end
-// too early.
+// Returns the time until `deadline`, plus one millisecond so that the join doesn't end too early.
 boost::posix_time::time_duration GetJoinTime(const boost::posix_time::ptime& deadline)
 {
     const auto left = deadline - boost::get_system_time();
@@ -56,7 +55,7 @@ struct ThreadNameTable {
     boost::mutex mutex;
     std::vector<Entry> entries;
 
-    // With the mutex held; null if the thread was never named.
+    // Returns null if the thread has no name. Call it with the mutex held.
     Entry* Find(const std::string& key)
     {
         const auto found = std::find_if(entries.begin(), entries.end(),
@@ -67,7 +66,7 @@ struct ThreadNameTable {
 
 ThreadNameTable& GetThreadNameTable()
 {
-    static ThreadNameTable& table = *new ThreadNameTable; // outlives all threads
+    static ThreadNameTable& table = *new ThreadNameTable; // never destroyed
     return table;
 }
 
@@ -132,7 +131,7 @@ void ManagedThread::Assign(boost::thread* thread)
 
 bool ManagedThread::TimedJoin(double seconds)
 {
-    // A thread that waits for itself would wait for ever.
+    // A thread that joins itself would wait forever.
     if (fThread == nullptr || fThread->get_id() == boost::this_thread::get_id())
         return false;
     const boost::posix_time::ptime deadline = boost::get_system_time() + ToWaitDuration(seconds);

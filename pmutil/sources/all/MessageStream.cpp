@@ -9,7 +9,7 @@ namespace pmutil {
 namespace {
 
 // Appends to a string that can be read without a copy.
-class TextBuffer : public std::streambuf {
+class StringBuffer : public std::streambuf {
 public:
     std::string text;
 
@@ -31,7 +31,7 @@ protected:
 
 class MessageStream::Stream {
 public:
-    // What copyfmt from a new stream does, without its look-up of all facets.
+    // Does the same as copyfmt from a new stream, without its look-up of all facets.
     void Reset()
     {
         fBuffer.text.clear();
@@ -49,11 +49,11 @@ public:
     const char* Text() const { return fBuffer.text.c_str(); }
 
 private:
-    TextBuffer fBuffer;
+    StringBuffer fBuffer;
     std::ostream fOut{&fBuffer};
 };
 
-// The stream that waits for the next message, if none uses it.
+// The cached stream; null while a message uses it.
 MessageStream::Stream*& MessageStream::Spare()
 {
     static Stream* spare = nullptr;

@@ -1,4 +1,4 @@
-// The string stream in which a log message is assembled.
+// The string stream for the assembly of a log message.
 #pragma once
 
 #include <memory>
@@ -6,9 +6,9 @@
 
 namespace pmutil {
 
-// An empty stream with default formatting. Made, used and destroyed with the log mutex held: as
-// making a stream costs more than most messages, one stream serves all messages that aren't
-// assembled within another.
+// An empty stream with default formatting. Make, use and destroy it with the log mutex held. One
+// stream is cached for all messages that aren't nested, since making a stream costs more than
+// most messages.
 class MessageStream {
 public:
     MessageStream();
@@ -18,7 +18,7 @@ public:
 
     std::ostream& Out();
 
-    // What was written so far; valid until more is.
+    // Returns the text written so far; valid until the next write.
     const char* Text();
 
 private:

@@ -21,7 +21,7 @@ std::optional<Option> SplitOption(const std::string& argument)
 
 std::int32_t ParseInteger(const std::string& text)
 {
-    // Read in 64 bits and clamped, so that the result doesn't depend on the width of a long here.
+    // Parse 64 bits and clamp, so that the result doesn't depend on the width of a long.
     char* end = nullptr;
     const long long value = std::strtoll(text.c_str(), &end, 0);
     if (end != nullptr) {

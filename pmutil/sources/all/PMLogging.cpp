@@ -19,7 +19,7 @@ using LogLock = boost::lock_guard<boost::recursive_mutex>;
 
 std::atomic<bool> gLoggingStarted{false};
 
-// Logs one line to whatever logger is current now, and lets no exception out.
+// Logs one line to the current logger and ignores all exceptions.
 template <typename InsertMessage>
 void LogToCurrent(const char* file, int line, const InsertMessage& insertMessage) noexcept
 {
@@ -32,7 +32,7 @@ void LogToCurrent(const char* file, int line, const InsertMessage& insertMessage
         insertMessage(message.Out());
         logger->LogPrintf(file, line, "%s", message.Text());
     } catch (...) {
-        // Logging never changes what the program does.
+        // A failure of logging must not affect the program.
     }
 }
 
@@ -48,7 +48,7 @@ std::ostream& operator<<(std::ostream& out, const LogIndent& indent)
 
 boost::recursive_mutex& GetLogMutex()
 {
-    static boost::recursive_mutex& mutex = *new boost::recursive_mutex; // outlives all users
+    static boost::recursive_mutex& mutex = *new boost::recursive_mutex; // never destroyed
     return mutex;
 }
 
@@ -69,7 +69,7 @@ LoggerHolder GetCurrentLogger()
     LoggerHolder top = PMLogger::Top();
     if (top)
         return top;
-    // It stands on the stack before it is complete: nobody may look there meanwhile.
+    // Hold the stack's mutex, since the null logger is on the stack before it is complete.
     const LogLock logLock(GetLogMutex());
     const LogLock stackLock(PMLogger::Mutex());
     if (!PMLogger::Top())
@@ -85,7 +85,7 @@ PMLogger::PMLogger(const std::string& name) : fName(name)
         if (PMLogger* const previous = Below(this))
             previous->LogPrintf(__FILE__, __LINE__, "Activating new logger %s", fName.c_str());
     } catch (...) {
-        // This logger is made all the same.
+        // The previous logger's failure doesn't affect this one.
     }
 }
 
@@ -183,7 +183,7 @@ PMLogScope::PMLogScope(const std::string& name, const char* file, int line)
     : fStartTime(GetClockSeconds()), fFile(file), fLine(line), fName(name)
 {
     LogToCurrent(fFile, fLine, [this](std::ostream& out) { out << "BEGIN " << fName; });
-    fStartTime = GetClockSeconds(); // the duration leaves out the line just written
+    fStartTime = GetClockSeconds(); // exclude the time of the line above
 }
 
 PMLogScope::~PMLogScope()
@@ -200,7 +200,7 @@ void detail::WriteStatement(DebugValue& record, const char* file, int line, Mess
         if (GetDebugValue(record) == 0)
             return;
     } catch (...) {
-        return; // a name that can't be resolved is a statement that doesn't log
+        return; // the name can't be resolved: don't log
     }
     LogToCurrent(file, line, [&](std::ostream& out) { insert(out, message); });
 }

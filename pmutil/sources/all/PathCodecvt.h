@@ -1,13 +1,13 @@
-// How wide paths become the narrow ones that the C library takes.
+// The conversion of wide paths to the narrow paths of the C library.
 #pragma once
 
 #include <boost/filesystem/path.hpp>
 
 namespace pmutil {
 
-// The platform's conversion between wide and narrow path characters. It asks no environment
-// variable for a locale, which Boost's own default does. On Windows a path that the code page of
-// the narrow calls can't represent is an error, and not another path.
+// Returns the platform's conversion between wide and narrow path characters. Unlike Boost's default
+// it reads no environment variable. On Windows, a path that the code page of the narrow calls can't
+// represent is an error.
 const boost::filesystem::path::codecvt_type& GetPathCodecvt();
 
 } // namespace pmutil

@@ -1,5 +1,5 @@
-// The end of a thread, which any number of threads may wait for, and threads that release their
-// task when they end.
+// Waiting for the end of a thread, by any number of threads, and threads that destroy their task
+// when it has run.
 #pragma once
 
 #include <memory>
@@ -13,20 +13,20 @@
 
 namespace pmutil {
 
-// Unlike a join, which is for one thread at a time.
+// The end of a thread. Unlike with a join, several threads may wait.
 class ThreadEnd {
 public:
-    // For the thread: its first and its last statement.
+    // The thread calls Begin first and End last.
     void Begin();
     void End();
 
     bool HasEnded() const;
 
-    // Waits up to `seconds` for the end. False if it doesn't come: at once on the thread itself,
-    // and as soon as the thread is given up.
+    // Waits up to `seconds` for the end and returns whether the thread has ended. Returns at once
+    // on the thread itself and after GiveUp.
     bool Await(double seconds) const;
 
-    // Ends all waits, now and later.
+    // Ends all present and later waits.
     void GiveUp();
 
 private:
@@ -37,8 +37,8 @@ private:
     bool fGivenUp = false;
 };
 
-// Starts a thread on a copy of `task`, which is destroyed when it has run, as the thread's object
-// may stay registered for ever. `end`, unless empty, is set after that.
+// Starts a thread that calls a copy of `task` and then destroys the copy, since the thread's object
+// may stay registered until the process ends. After that, `end`, if not empty, is set.
 template <typename Task>
 std::unique_ptr<boost::thread> StartThread(const Task& task,
                                            const boost::shared_ptr<ThreadEnd>& end = nullptr)

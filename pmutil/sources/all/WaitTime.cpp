@@ -9,8 +9,8 @@ namespace pmutil {
 
 namespace {
 
-// Beyond this a wait has no end that anybody could see, and dates would overflow.
-constexpr double kLongestWait = 100.0 * 365 * 24 * 60 * 60;
+// Seconds. A longer wait counts as infinite; dates would overflow.
+constexpr double kMaxWait = 100.0 * 365 * 24 * 60 * 60;
 
 } // namespace
 
@@ -29,11 +29,11 @@ boost::posix_time::time_duration ToWaitDuration(double seconds)
 {
     if (std::isnan(seconds))
         return boost::posix_time::not_a_date_time;
-    if (seconds > kLongestWait)
+    if (seconds > kMaxWait)
         return boost::posix_time::pos_infin;
-    if (seconds < -kLongestWait)
+    if (seconds < -kMaxWait)
         return boost::posix_time::neg_infin;
-    // NOLINTNEXTLINE(bugprone-incorrect-roundings): negative times are all the same to a wait
+    // NOLINTNEXTLINE(bugprone-incorrect-roundings): all negative times end a wait at once
     const auto milliseconds = static_cast<std::int64_t>(seconds * 1000.0 + 0.5);
     return boost::posix_time::microseconds(milliseconds * 1000);
 }

@@ -1,18 +1,18 @@
-// Seconds as the supervision of children counts them, and Boost's durations.
+// The clock of waits, and the conversion of seconds to Boost's durations.
 #pragma once
 
 #include <boost/date_time/posix_time/posix_time_types.hpp>
 
 namespace pmutil {
 
-// A monotonic clock with the system's best resolution.
+// Returns a monotonic clock in seconds, with the system's best resolution.
 double GetWaitClock();
 
-// Seconds from now until `deadline`, never below 0.
+// Returns the seconds from now until `deadline`, never below 0.
 double GetTimeLeft(double deadline);
 
-// Rounded to milliseconds. What no calendar holds becomes an infinite duration, and what is no
-// number the special value for no valid time.
+// Converts seconds, rounded to milliseconds. Times beyond 100 years become infinite durations, NaN
+// becomes not_a_date_time.
 boost::posix_time::time_duration ToWaitDuration(double seconds);
 
 } // namespace pmutil

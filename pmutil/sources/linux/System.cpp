@@ -33,10 +33,10 @@ void ForgetThreadNumber()
     gThreadNumber = 0;
 }
 
-// Boost's facet writes code units that aren't characters as if they were.
+// Rejects surrogates and codes above U+10FFFF, which Boost's facet would encode.
 class PathFacet : public boost::filesystem::detail::utf8_codecvt_facet {
 public:
-    PathFacet() : utf8_codecvt_facet(1) {} // the reference that keeps locales from deleting it
+    PathFacet() : utf8_codecvt_facet(1) {} // 1: a locale doesn't delete it
 
 protected:
     result do_out(std::mbstate_t& state, const wchar_t* from, const wchar_t* fromEnd,
@@ -56,7 +56,7 @@ private:
     }
 };
 
-// Empty if the password database doesn't know the user.
+// Empty if the user isn't in the password database.
 std::string GetHomeFolder()
 {
     std::vector<char> buffer(1024);
@@ -78,8 +78,8 @@ std::string GetNarrowDesktopFolder()
     return named.empty() ? home + "/Desktop" : named;
 }
 
-// At a soft limit of 1 the kernel dumps no core, neither to a file nor to the program that
-// core_pattern names, which is how desktops raise their crash dialogs. 0 prevents files only.
+// With a soft limit of 1 the kernel dumps no core, neither to a file nor to the program of
+// core_pattern, which opens the crash dialogs of desktops. A limit of 0 prevents files only.
 void PreventCoreDump()
 {
     rlimit limit{};
@@ -88,19 +88,19 @@ void PreventCoreDump()
     const rlimit none{1, std::max<rlim_t>(limit.rlim_max, 1)};
     if (setrlimit(RLIMIT_CORE, &none) == 0)
         return;
-    limit.rlim_cur = 0; // a hard limit of 0, which only a privileged process may raise
+    limit.rlim_cur = 0; // the hard limit is 0, and only a privileged process may raise it
     setrlimit(RLIMIT_CORE, &limit);
 }
 
-// What the process was started with comes from whoever started it, and survives exec.
+// Resets signal dispositions and the signal mask, which are inherited through exec.
 void PrepareSignals()
 {
-    // A write to a pipe without reader, beyond a size limit or to the terminal of another job must
-    // neither end nor stop the process: the first two fail, the last one succeeds.
+    // With these ignored, a write to a pipe without a reader and a write beyond the file-size limit
+    // fail, and a write to the terminal of another job succeeds.
     for (const int number : {SIGPIPE, SIGXFSZ, SIGTTOU})
         std::signal(number, SIG_IGN);
-    // Crashes must show as such, and drivers wait for the helpers that they start. A handler stays:
-    // it is a sanitizer's.
+    // A crash must end the process, and drivers wait for their child processes. Keep a handler: it
+    // belongs to a sanitizer.
     for (const int number : {SIGABRT, SIGBUS, SIGCHLD, SIGFPE, SIGILL, SIGSEGV, SIGSYS, SIGTRAP}) {
         struct sigaction action = {};
         if (sigaction(number, nullptr, &action) == 0 && action.sa_handler == SIG_IGN)
@@ -111,9 +111,9 @@ void PrepareSignals()
     pthread_sigmask(SIG_SETMASK, &none, nullptr);
 }
 
-// A file that a driver opens would get the number of a closed standard stream, and with it the
-// report. What takes the place exists everywhere and fails every read and write with EBADF, as the
-// closed stream did.
+// Without this, a file that a driver opens would get the number of a closed standard stream, and
+// the report would be written to it. An O_PATH descriptor fails reads and writes with EBADF, like a
+// closed stream.
 void OccupyClosedStreams()
 {
     for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream)
@@ -132,8 +132,8 @@ double GetClockSeconds()
 
 std::uint64_t GetCurrentThreadNumber()
 {
-    // A system call per log line would cost more than the rest of the prefix. A forked child's
-    // thread has another number than its parent's.
+    // Cached, since a system call per log line would cost more than the rest of the prefix. A fork
+    // changes the number.
     static const int registered = pthread_atfork(nullptr, nullptr, ForgetThreadNumber);
     if (gThreadNumber != 0 && registered == 0)
         return gThreadNumber;
@@ -143,8 +143,8 @@ std::uint64_t GetCurrentThreadNumber()
 
 void ShowThreadName(const std::string& name)
 {
-    constexpr std::size_t kMaxBytes = 15;
-    // The first thread's name is the process's, by which people look for it.
+    constexpr std::size_t kMaxBytes = 15; // the kernel's limit
+    // Don't rename the first thread: its name is the process's name.
     if (GetCurrentThreadNumber() != static_cast<std::uint64_t>(getpid()))
         pthread_setname_np(pthread_self(), name.substr(0, kMaxBytes).c_str());
 }
@@ -196,8 +196,7 @@ void PrepareConsoleProcess()
 
 const boost::filesystem::path::codecvt_type& GetPathCodecvt()
 {
-    static const boost::filesystem::path::codecvt_type& facet =
-        *new PathFacet; // outlives all users
+    static const boost::filesystem::path::codecvt_type& facet = *new PathFacet; // never destroyed
     return facet;
 }
 

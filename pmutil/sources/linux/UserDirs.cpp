@@ -25,7 +25,7 @@ bool Skip(std::string_view& text, std::string_view expected)
     return true;
 }
 
-// The path behind the opening quote; empty if the line isn't one.
+// Returns the path after the opening quote; empty if the line is malformed.
 std::string ReadPath(std::string_view text, const std::string& home)
 {
     std::string path;

@@ -1,4 +1,4 @@
-// The desktop folder by the XDG user directories.
+// The desktop folder of the XDG user directories.
 #pragma once
 
 #include <iosfwd>
@@ -6,8 +6,9 @@
 
 namespace pmutil {
 
-// The XDG_DESKTOP_DIR of the text of a user-dirs.dirs file: an absolute path, or one under `home`
-// that begins with "$HOME/". Empty if the text names none. The last entry counts.
+// Returns XDG_DESKTOP_DIR of a user-dirs.dirs file: an absolute path, or one that begins with
+// "$HOME/", which is replaced by `home`. Empty if there is none. If there are several entries, the
+// last one counts.
 std::string FindDesktopDir(std::istream& userDirs, const std::string& home);
 
 } // namespace pmutil
