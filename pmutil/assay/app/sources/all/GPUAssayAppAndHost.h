@@ -1,4 +1,4 @@
-// The root that the application and the tester share.
+// The common base class of the application and the tester.
 #pragma once
 
 namespace assay {

@@ -1,6 +1,6 @@
 // The sequencer: runs the fixed sequence of tests, writes the report through the application and
-// counts a step after each test. At a chosen step it fails on purpose, so that a host can see how
-// it copes with a child that dies in the middle of a report. Main thread only; one Run per object.
+// counts a step after each test. It can be set to fail at a step, so that a host can be tested with
+// a child that dies in the middle of a report. Main thread only; one Run per object.
 #pragma once
 
 #include <cstdint>
@@ -19,16 +19,16 @@ public:
     using GLGPU = pmutil::GLGPU;
     using CLGPU = pmutil::CLGPU;
 
-    // The application isn't owned and outlives the tester.
+    // The application isn't owned and must outlive the tester.
     explicit GPUAssayTester(GPUAssayApp* app);
     ~GPUAssayTester() override;
 
-    // The whole sequence. Throws what a test outside RunTest throws; the rest of the sequence is
-    // skipped then.
+    // Runs the sequence. Throws what a test outside RunTest throws; the rest of the sequence is
+    // then skipped.
     void Run();
 
     // The top-level operations, in the order of the sequence. Each writes its lines and takes a
-    // step, but for DoRunQGFOCLInitialize, which does neither.
+    // step; DoRunQGFOCLInitialize does neither.
     virtual void DoRunStart();
     virtual void DoRunQGFCoreInitialize();
     virtual void DoRunQGFOGLInitialize();
@@ -39,25 +39,26 @@ public:
     virtual void DoRunCLEnumerate();
     virtual void DoRunCLTests();
 
-    // Counts a step. Throws std::runtime_error "programmed failure" (by Crash) at every step from
-    // fCrashAfter on, and "Programmed throw" at exactly fThrowAfter. Steps count from 0. Tests take
-    // their steps directly: an override is asked for the last step of Run alone.
+    // Counts a step, from 0. At step fCrashAfter and every later one, calls Crash, which throws
+    // std::runtime_error "programmed failure"; at step fThrowAfter, throws "Programmed throw". Only
+    // the last step of Run calls an override; tests call GPUAssayTester::Step.
     virtual void Step();
 
-    // What a programmed crash does: throws. An override may end the process in another way; should
-    // it return, this one is performed.
+    // Performs a programmed crash: throws. An override may end the process in another way; if it
+    // returns, this implementation is called.
     virtual void Crash();
 
-    // Local time, "YYYY-MM-DD_HH:MM:SS". Throws std::runtime_error "could not convert calendar time
-    // to local time".
+    // Returns the local time "YYYY-MM-DD_HH:MM:SS". Throws std::runtime_error "could not convert
+    // calendar time to local time".
     virtual std::string GetTimestamp();
     virtual void DoRunTimestamp(const std::string& key);
 
-    // Applies the test to each entry. An entry whose test throws is told on standard error, counted
-    // in fFailures and taken off the list; nothing is thrown.
+    // Runs the test for each entry. If the test throws, reports the failure on standard error,
+    // counts it in fFailures and removes the entry from the list. Throws nothing.
     virtual void RunTest(GPUEntries& entries, const GPUTest& test);
 
-    // One key of one OpenGL device each: one line, one step. What the probe throws passes through.
+    // Each reports one key of an OpenGL device: one line, one step. Exceptions of the probe pass
+    // through.
     virtual void DoRunGLVersion(std::string tag, GLGPU& gpu);
     virtual void DoRunGLName(std::string tag, GLGPU& gpu);
     virtual void DoRunIsIntegratedGLGPU(std::string tag, GLGPU& gpu);
@@ -74,8 +75,8 @@ public:
     virtual void DoRunCanCompileProgramGLSL(std::string tag, GLGPU& gpu);
     virtual void DoRunGLFrameBufferOK(std::string tag, GLGPU& gpu);
 
-    // One key of one OpenCL device each, in the same manner. DoRunCUDAVersion takes its step also
-    // where it has nothing to print.
+    // Each reports one key of an OpenCL device in the same way. DoRunCUDAVersion prints no line if
+    // there is no CUDA version, but takes its step.
     virtual void DoRunCLPlatformVersion(std::string tag, CLGPU& gpu);
     virtual void DoRunCLName(std::string tag, CLGPU& gpu);
     virtual void DoRunIsIntegratedCLGPU(std::string tag, CLGPU& gpu);
@@ -88,9 +89,10 @@ public:
     virtual void DoRunCLBandwidth(std::string tag, CLGPU& gpu);
     virtual void DoRunCLDeviceVersion(std::string tag, CLGPU& gpu);
 
-    // Queries by number: a line with the number behind each name, then the answer. One step, but
-    // none for the string: the steps of a run are counted on that footing. `count` is how many
-    // integers the query answers. A string that OpenGL doesn't give (null) throws std::logic_error.
+    // Each queries a named constant: prints a "gputag" line with the number of each name, then the
+    // result. Each takes one step except DoRunGLGetString, which takes none. `count` is the number
+    // of integers that the query returns. If glGetString returns null, throws std::logic_error
+    // "glGetString returns no text for NAME".
     virtual void DoRunGLGetString(std::string tag, GLGPU& gpu, const char* name, std::int32_t code);
     virtual void DoRunGLGetIntegerv(std::string tag, GLGPU& gpu, const char* name,
                                     std::int32_t code, std::uint64_t count);
@@ -114,8 +116,7 @@ protected:
     // Writes a line of the report and takes a step.
     void Report(const std::string& line);
 
-    // What the enumerations do with the object that they make for the purpose: ask it for its
-    // devices, report their number and put them under test.
+    // Enumerate the devices of `factory`, report their number and set the list of entries.
     void EnumerateGL(pmutil::GPUImpl& factory);
     void EnumerateCL(pmutil::GPUImpl& factory);
 };

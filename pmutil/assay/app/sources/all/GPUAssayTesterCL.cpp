@@ -23,7 +23,7 @@ pmutil::DebugValue gGPUAssayOCLDelay{"GPUAssayOCLDelay", 0};
 
 void SpinSeconds(double seconds)
 {
-    // No sleep: the processor must not have gone idle when the measurement begins.
+    // Don't sleep: the processor must not be idle when the measurement begins.
     const double deadline = pmutil::GetClockSeconds() + seconds;
     while (pmutil::GetClockSeconds() < deadline) {
     }

@@ -16,7 +16,7 @@ namespace assay {
 
 namespace {
 
-// 1 if the check passes and 0 if it throws; a failure is told in the log only.
+// Returns 1 if the check passes and 0 if it throws. A failure is only logged.
 template <typename Check>
 int Passes(const char* failure, Check check)
 {

@@ -1,4 +1,4 @@
-// Queries by number, each with the numbers behind its names.
+// Queries of named constants, each with the "gputag" lines of its names.
 #include <stdexcept>
 #include <utility>
 #include <vector>
@@ -17,7 +17,7 @@ std::string CodeLine(const char* name, std::int32_t code)
     return ValueLine(TaggedKey("gputag", name), code);
 }
 
-// "[1, 2, 3]". The opening bracket belongs to the first value: without one the list is "]".
+// Returns "[1, 2, 3]". The opening bracket is written with the first value: an empty list is "]".
 std::string ListText(const std::vector<std::int32_t>& values)
 {
     std::ostringstream list;
@@ -38,7 +38,7 @@ void GPUAssayTester::DoRunGLGetString(std::string tag, GLGPU& gpu, const char* n
     Print(CodeLine(name, code));
     const char* const text = gpu.impl->GLGetString(static_cast<std::uint32_t>(code));
     if (text == nullptr)
-        throw std::logic_error(std::string("glGetString gives no text for ") + name);
+        throw std::logic_error(std::string("glGetString returns no text for ") + name);
     Print(TextLine(IndexedKey(std::move(tag), "glGetString", name), text));
 }
 

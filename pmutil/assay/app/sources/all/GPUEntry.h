@@ -1,4 +1,4 @@
-// A device under test, as the tester's lists hold it.
+// A device under test, the element of the tester's lists.
 #pragma once
 
 #include <list>
@@ -10,8 +10,8 @@
 
 namespace assay {
 
-// `tag` is "glgpu[N]" or "clgpu[N]" with the index that the device had when it was enumerated; it
-// never changes. `gpu` is a GLGPU or a CLGPU, according to the list that the entry lies in.
+// `tag` is "glgpu[N]" or "clgpu[N]" with the device's index in the enumeration; it never changes.
+// `gpu` is a GLGPU or a CLGPU, depending on the list.
 struct GPUEntry {
     std::string tag;
     boost::shared_ptr<pmutil::GPU> gpu;

@@ -1,6 +1,5 @@
-// Units of work for GPUAssayTester::RunTest: an object says what to do for one device, and RunTest
-// applies it to every device of a list. Test objects are temporaries of RunTest's caller; they own
-// nothing, and the names in them must outlive them.
+// Tests for GPUAssayTester::RunTest, which runs an object for every device of a list. The objects
+// are temporaries of RunTest's caller. They don't own their names.
 #pragma once
 
 #include <cstdint>
@@ -16,12 +15,12 @@ public:
     GPUTest(const GPUTest&) = delete;
     GPUTest& operator=(const GPUTest&) = delete;
 
-    // Performs the test for one device. Throws std::bad_cast if the device or the tester isn't of
-    // the kind that the test is for; a null device trips the shared pointer's own assertion.
+    // Runs the test for one device. Throws std::bad_cast if the device or the tester has another
+    // type than the test needs; a null device fails the shared pointer's assertion.
     virtual void Run(GPUAssayTester& tester, const GPUEntry& entry) const = 0;
 };
 
-// Asks for an OpenGL string.
+// Queries an OpenGL string.
 class GLStringTest : public GPUTest {
 public:
     GLStringTest(const char* testName, std::int32_t testCode) : name(testName), code(testCode) {}
@@ -31,7 +30,7 @@ public:
     const std::int32_t code;
 };
 
-// Asks for `count` OpenGL integers.
+// Queries `count` OpenGL integers.
 class IntegervTest : public GPUTest {
 public:
     IntegervTest(const char* testName, std::int32_t testCode, std::uint64_t testCount)
@@ -44,7 +43,7 @@ public:
     const std::uint64_t count;
 };
 
-// Asks for `count` limits of fragment programs.
+// Queries `count` limits of fragment programs.
 class ProgramvTest : public GPUTest {
 public:
     ProgramvTest(const char* testName, std::int32_t testCode, std::uint64_t testCount)
@@ -57,7 +56,7 @@ public:
     const std::uint64_t count;
 };
 
-// Asks whether an OpenGL extension is there.
+// Queries whether an OpenGL extension is supported.
 class ExtensionTest : public GPUTest {
 public:
     ExtensionTest(const char* testName, std::int32_t testID) : name(testName), id(testID) {}
@@ -67,7 +66,7 @@ public:
     const std::int32_t id;
 };
 
-// Calls an operation of the tester, for devices of type Device.
+// Calls an operation of the tester for a device of type Device.
 template <typename Tester, typename Device>
 class TestFunc : public GPUTest {
 public:

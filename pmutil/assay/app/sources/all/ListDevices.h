@@ -1,4 +1,4 @@
-// From the records of an enumeration to the entries of a tester's list.
+// Makes the entries of a tester's list from the records of an enumeration.
 #pragma once
 
 #include <string>
@@ -7,7 +7,7 @@
 
 namespace assay {
 
-// One entry per record in the same order, tagged "prefix[index]".
+// Returns one entry per record in the same order, tagged "prefix[index]".
 template <typename Records>
 GPUEntries ListDevices(const std::string& prefix, const Records& records)
 {

@@ -20,9 +20,9 @@ bool WriteLine(std::ostream& out, std::FILE* file, const std::string& text) noex
         if (isWhole && buffer.pubsync() == 0)
             return true;
         if (isWhole)
-            pmutil::DiscardUnwritten(file); // it was buffered, and how much got out nobody knows
+            pmutil::DiscardUnwritten(file); // a part of the buffer may have been written
     } catch (...) {
-        // The line is lost like any other that can't be written.
+        // The line is lost, as after a failed write.
     }
     return false;
 }

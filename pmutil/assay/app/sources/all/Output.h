@@ -13,13 +13,13 @@ inline const char* TextOrNull(const char* text)
     return text != nullptr ? text : "<NULL>";
 }
 
-// Takes the buffer from standard output, so that a line that it doesn't take whole is known to be
-// cut. Call it before the first output.
+// Makes standard output unbuffered, so that WriteLine detects a line that is written only in part.
+// Call it before the first output.
 void PrepareOutput();
 
-// Writes the text and a line end in one piece to `out` and flushes it. `file` is the C stream
-// behind `out`. If that fails the line is lost, the result is false, and the next line is tried
-// afresh; it begins with a line end if a part of this one got out. Never throws.
+// Writes the text and a line end in one call to `out` and flushes it. `file` is the C stream of
+// `out`. Returns false if that fails; the line is then lost. If a part of it was written, the next
+// line begins with a line end. Never throws.
 bool WriteLine(std::ostream& out, std::FILE* file, const std::string& text) noexcept;
 
 } // namespace assay

@@ -9,7 +9,7 @@ class PixmereAssay : public GPUAssayApp {
 public:
     ~PixmereAssay() override;
 
-    // The one application of the process; it lives until the process ends. Run it once.
+    // Returns the application of the process, which lives until the process ends. Run it once.
     static PixmereAssay& Instance();
 
     GPUAssayTester* CreateTester() override;

@@ -1,5 +1,5 @@
-// The tester of this program: the sequence with the tester's name, a battery of OpenGL constants
-// and extensions, and the OpenCL compute figure.
+// The tester of this program: adds to the sequence the tester's name, a battery of OpenGL constants
+// and extensions, and the OpenCL compute score.
 #pragma once
 
 #include "GPUAssayTester.h"

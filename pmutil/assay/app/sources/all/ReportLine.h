@@ -1,5 +1,5 @@
-// The report's line forms. Values take a stream's default formatting: plain decimals, bools as 0 or
-// 1, six significant digits; text is written raw between double quotes.
+// The forms of report lines. Values have the default format of streams: plain decimals, bools as 0
+// or 1, six significant digits. Texts are written unescaped between double quotes.
 #pragma once
 
 #include <sstream>

@@ -1,10 +1,10 @@
-// The outermost frame of the program.
+// The outermost exception handler of the program.
 #pragma once
 
 namespace assay {
 
-// What run() returns, or 4 for whatever it throws, of which nothing is told: whoever throws here
-// could no longer say anything either.
+// Returns the result of run(), or 4 if it throws. The exception isn't reported: it comes from a
+// failed report of another one.
 template <typename Run>
 int RunToStatus(const Run& run) noexcept
 {

@@ -6,9 +6,9 @@
 
 namespace assay {
 
-// Stores in `available` what isAvailable() answers, and calls initialize() if that is true.
-// Whatever one of them throws ends here without a word, and leaves `available` as it is: a library
-// that doesn't start shows by what the OpenCL half finds.
+// Sets `available` to isAvailable() and, if that is true, calls initialize(). Exceptions of both
+// are ignored silently. If initialize() throws, `available` stays true: the enumeration of the
+// OpenCL half then shows the failure.
 template <typename IsAvailable, typename Initialize>
 void StartOpenCL(bool& available, const IsAvailable& isAvailable, const Initialize& initialize)
 {
@@ -19,7 +19,7 @@ void StartOpenCL(bool& available, const IsAvailable& isAvailable, const Initiali
             initialize();
         }
     } catch (...) {
-        // As told above.
+        // Ignored, as described above.
     }
 }
 

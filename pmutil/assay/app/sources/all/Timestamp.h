@@ -1,4 +1,4 @@
-// Points of time in the report.
+// Timestamps of the report.
 #pragma once
 
 #include <ctime>
@@ -6,8 +6,8 @@
 
 namespace assay {
 
-// A calendar time as local time, "YYYY-MM-DD_HH:MM:SS". Throws std::runtime_error "could not
-// convert calendar time to local time".
+// Formats a calendar time as local time, "YYYY-MM-DD_HH:MM:SS". Throws std::runtime_error "could
+// not convert calendar time to local time".
 std::string LocalTimeText(std::time_t calendarTime);
 
 } // namespace assay
