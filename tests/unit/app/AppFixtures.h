@@ -1,5 +1,5 @@
-// What the tests of the application share: an application that keeps its lines, a device that
-// answers from a table, and testers that enumerate such devices.
+// Fixtures of the application's tests: an application that records its lines, a fake device, and
+// testers that enumerate fake devices.
 #pragma once
 
 #include <functional>
@@ -25,7 +25,7 @@ inline Lines operator+(Lines left, const Lines& right)
     return left;
 }
 
-// Puts a buffer in the place of a standard stream's for the length of a scope.
+// Replaces the buffer of a standard stream for a scope.
 class RedirectStream {
 public:
     RedirectStream(std::ostream& stream, std::streambuf* buffer)
@@ -40,9 +40,10 @@ private:
     std::streambuf* fPrevious;
 };
 
-// Collects what goes to standard error, the application's own lines and the tester's direct ones.
+// Captures standard error: the lines of the application and those that the tester writes directly.
 class CapturedStderr {
 public:
+    // Returns the lines since the last call.
     Lines Take()
     {
         Lines lines;
@@ -58,7 +59,7 @@ private:
     RedirectStream fRedirect{std::cerr, fText.rdbuf()};
 };
 
-// An application that keeps the lines of its report. Its tester comes from `makeTester`.
+// An application that records the lines of its report. `makeTester` makes its tester.
 class TestApp : public GPUAssayApp {
 public:
     std::int32_t RunWith(const Lines& options)
@@ -75,16 +76,16 @@ public:
     Lines out;
 };
 
-// A device that answers with the name of the question, or with numbers of its own, and throws where
-// `failures` says so. It also serves as factory of the records in `gl` and `cl`.
+// A fake device: a text query returns its own name, a number query a fixed number. As a factory it
+// returns the records in `gl` and `cl`.
 class FakeGPUImpl : public pmutil::GPUImpl {
 public:
-    // What a question throws, by the name of the operation.
+    // Functions that throw the failure of a query, by the query's name.
     std::map<std::string, std::function<void()>> failures;
-    // Operations in the order in which they were asked.
-    Lines asked;
+    // The names of the queries, in order.
+    Lines queries;
 
-    std::string suffix; // behind each text
+    std::string suffix; // appended to each text
     bool cudaSupported = true;
     bool truth = true;
     std::string cudaVersion = "4.2";
@@ -97,37 +98,37 @@ public:
     CLGPUs cl;
 
 private:
-    void Ask(const std::string& name)
+    void Record(const std::string& name)
     {
-        asked.push_back(name);
+        queries.push_back(name);
         const auto failure = failures.find(name);
         if (failure != failures.end())
             failure->second();
     }
     std::string Text(const char* name)
     {
-        Ask(name);
+        Record(name);
         return name + suffix;
     }
     std::uint32_t Number(const char* name, std::uint32_t value)
     {
-        Ask(name);
+        Record(name);
         return value;
     }
     bool Truth(const char* name)
     {
-        Ask(name);
+        Record(name);
         return truth;
     }
 
     GLGPUs DoGetGPUs() override
     {
-        Ask("GPUs");
+        Record("GPUs");
         return gl;
     }
     CLGPUs DoGetCLGPUs() override
     {
-        Ask("CLGPUs");
+        Record("CLGPUs");
         return cl;
     }
     std::string DoGetGLVersion() override { return Text("GLVersion"); }
@@ -147,25 +148,25 @@ private:
     bool DoGLFramebufferOK() override { return Truth("GLFrameBufferOK"); }
     const char* DoGLGetString(std::uint32_t name) override
     {
-        Ask("GLGetString " + std::to_string(name));
+        Record("GLGetString " + std::to_string(name));
         return shadingLanguage;
     }
     void DoGLGetIntegerv(std::uint32_t name, std::int32_t* result) override
     {
-        Ask("GLGetIntegerv " + std::to_string(name));
+        Record("GLGetIntegerv " + std::to_string(name));
         if (result != nullptr)
             *result = integer;
     }
     void DoGLGetProgramivARB(std::uint32_t target, std::uint32_t code,
                              std::int32_t* result) override
     {
-        Ask("GLGetProgramivARB " + std::to_string(target) + " " + std::to_string(code));
+        Record("GLGetProgramivARB " + std::to_string(target) + " " + std::to_string(code));
         if (result != nullptr)
             *result = integer;
     }
     bool DoGLIsExtensionSupported(QGF::OGL::OpenGLExtension extension) override
     {
-        Ask("GLIsExtensionSupported " + std::to_string(static_cast<std::int32_t>(extension)));
+        Record("GLIsExtensionSupported " + std::to_string(static_cast<std::int32_t>(extension)));
         return truth;
     }
     bool DoIsIntegratedGLGPU() override { return Truth("IsIntegratedGLGPU"); }
@@ -177,22 +178,22 @@ private:
     std::string DoGetCLDriverVersion() override { return Text("CLDriverVersion"); }
     bool DoGetCUDASupported() override
     {
-        Ask("CUDASupported");
+        Record("CUDASupported");
         return cudaSupported;
     }
     std::string DoGetCUDAVersion() override
     {
-        Ask("CUDAVersion");
+        Record("CUDAVersion");
         return cudaVersion;
     }
     double DoGetCLBandwidth() override
     {
-        Ask("CLBandwidth");
+        Record("CLBandwidth");
         return bandwidth;
     }
     double DoGetCLCompute() override
     {
-        Ask("CLCompute");
+        Record("CLCompute");
         return compute;
     }
     std::uint64_t DoGetCLReserved() override { return 0; }
@@ -202,7 +203,7 @@ private:
 
 using FakeGPU = boost::shared_ptr<FakeGPUImpl>;
 
-// The devices of a machine, for a tester without a driver.
+// The fake devices of a machine.
 struct FakeMachine {
     std::vector<FakeGPU> gl;
     std::vector<FakeGPU> cl;
@@ -219,7 +220,7 @@ struct FakeMachine {
     }
 };
 
-// A tester of type Base on a fake machine: the library checks pass, and the enumerations find the
+// A tester of type Base on a fake machine: the library checks pass, and the enumerations return the
 // machine's devices.
 template <typename Base>
 class FakeTester : public Base {
@@ -246,7 +247,7 @@ public:
     }
     std::string GetTimestamp() override { return "2031-02-03_04:05:06"; }
 
-    // For tests of one operation.
+    // Public, for the tests of these operations.
     using Base::EnumerateCL;
     using Base::EnumerateGL;
 

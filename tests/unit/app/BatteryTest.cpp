@@ -1,4 +1,4 @@
-// The keys of each device, one after the other and all together.
+// The keys of a device, each by itself and in whole runs.
 #include <stdexcept>
 
 #include <gmock/gmock.h>
@@ -17,7 +17,7 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::StartsWith;
 
-// A key test: the question it asks, and the line it prints of a FakeGPUImpl.
+// A key test: its query, and the line it prints for a FakeGPUImpl.
 struct KeyRow {
     const char* operation;
     const char* line;
@@ -55,7 +55,7 @@ constexpr KeyRow kCLKeys[] = {
     {"CLBandwidth", "CLBandwidth=1.23457e+09"},
 };
 
-// The battery's lines of a FakeGPUImpl: the tag's place is marked by a "@".
+// The battery's lines for a FakeGPUImpl; "@" stands for the tag.
 const std::vector<Lines> kBattery = {
     {"gputag.GL_SHADING_LANGUAGE_VERSION=35724",
      "@.glGetString[GL_SHADING_LANGUAGE_VERSION]=\"4.60\""},
@@ -103,14 +103,14 @@ std::string Tag(const char* kind, std::size_t index)
     return std::string(kind) + "[" + std::to_string(index) + "]";
 }
 
-// One thing that a run does: prints its lines and takes a step, on behalf of a device or of none.
+// An event of a run: lines and a step, for a device or for none.
 struct Event {
-    int device; // 0, 1, ... over both kinds; -1 for none
+    int device; // 0, 1, ... through both kinds; -1 for none
     Lines lines;
     bool step = true;
 };
 
-// The run of a PixmereTester as a plain list, from the tables of this file.
+// The events of a PixmereTester's run, from the tables of this file.
 std::vector<Event> PixmereRun(std::size_t gl, std::size_t cl)
 {
     std::vector<Event> run = {{-1, {}},
@@ -148,7 +148,7 @@ struct Outcome {
     std::int32_t status = 0;
 };
 
-// What a run gives if its steps fail as told.
+// Predicts the outcome of a run with these programmed failures; -1 for none.
 Outcome Predict(const std::vector<Event>& run, std::int64_t crashAfter, std::int64_t throwAfter)
 {
     Outcome outcome;
@@ -195,7 +195,7 @@ TEST_P(WholeRun, IsComplete)
     ExpectRun(FakeMachine(gl, cl), "", Predict(PixmereRun(gl, cl), -1, -1));
 }
 
-TEST_P(WholeRun, CrashesAsTheStepsPredict)
+TEST_P(WholeRun, CrashesAtEachStep)
 {
     const std::vector<Event> run = PixmereRun(gl, cl);
     const auto last = static_cast<std::int64_t>(run.size());
@@ -204,7 +204,7 @@ TEST_P(WholeRun, CrashesAsTheStepsPredict)
                   Predict(run, step, -1));
 }
 
-TEST_P(WholeRun, ThrowsAsTheStepsPredict)
+TEST_P(WholeRun, ThrowsAtEachStep)
 {
     const std::vector<Event> run = PixmereRun(gl, cl);
     const auto last = static_cast<std::int64_t>(run.size());
@@ -226,7 +226,7 @@ TEST(WholeRunSteps, OneDeviceOfEachKindTakesFiftySeven)
     EXPECT_EQ(app.GetTester()->fFailures, 0);
 }
 
-TEST(GLKeys, EachFailingOneCostsItsDeviceTheRest)
+TEST(GLKeys, EachFailureSkipsTheRestOfItsDevice)
 {
     for (const KeyRow& failing : kGLKeys) {
         CapturedStderr err;
@@ -251,7 +251,7 @@ TEST(GLKeys, EachFailingOneCostsItsDeviceTheRest)
     }
 }
 
-TEST(CLKeys, EachFailingOneCostsItsDeviceTheRest)
+TEST(CLKeys, EachFailureSkipsTheRestOfItsDevice)
 {
     Lines operations;
     for (const KeyRow& key : kCLKeys)
@@ -294,7 +294,7 @@ protected:
     FakeTester<PixmereTester> tester{&app, {}};
 };
 
-TEST_F(OneDevice, TextIsPrintedRaw)
+TEST_F(OneDevice, TextIsPrintedUnescaped)
 {
     impl->suffix = "\"a\\b\nc\xFF";
     tester.DoRunGLVendor("glgpu[0]", *gl);
@@ -338,7 +338,7 @@ TEST_F(OneDevice, DoublesHaveSixSignificantDigits)
                             "t.CLBandwidth=1e+300", "t.CLCompute=1e+300"));
 }
 
-TEST_F(OneDevice, TheFetchComesBeforeTheLine)
+TEST_F(OneDevice, TheQueryPrecedesTheLine)
 {
     impl->failures["GLName"] = [] { throw std::runtime_error("bad"); };
     EXPECT_THROW(tester.DoRunGLName("t", *gl), std::runtime_error);
@@ -346,32 +346,32 @@ TEST_F(OneDevice, TheFetchComesBeforeTheLine)
     EXPECT_EQ(tester.fStep, 0U);
 }
 
-TEST_F(OneDevice, CUDAVersionIsPrintedOnlyWhereThereIsOne)
+TEST_F(OneDevice, CUDAVersionIsPrintedOnlyIfThereIsOne)
 {
     tester.DoRunCUDAVersion("t", *cl);
     EXPECT_THAT(app.out, ElementsAre("t.CUDAVersion=\"4.2\""));
-    EXPECT_THAT(impl->asked, ElementsAre("CUDASupported", "CUDAVersion"));
+    EXPECT_THAT(impl->queries, ElementsAre("CUDASupported", "CUDAVersion"));
     EXPECT_EQ(tester.fStep, 1U);
 
     app.out.clear();
-    impl->asked.clear();
+    impl->queries.clear();
     impl->cudaVersion = "";
     tester.DoRunCUDAVersion("t", *cl);
     EXPECT_THAT(app.out, IsEmpty());
     EXPECT_EQ(tester.fStep, 2U);
 
-    impl->asked.clear();
+    impl->queries.clear();
     impl->cudaSupported = false;
     tester.DoRunCUDAVersion("t", *cl);
     EXPECT_THAT(app.out, IsEmpty());
-    EXPECT_THAT(impl->asked, ElementsAre("CUDASupported"));
+    EXPECT_THAT(impl->queries, ElementsAre("CUDASupported"));
     EXPECT_EQ(tester.fStep, 3U);
 }
 
 // Keeps the text of log lines.
-class KeepingLogger : public pmutil::PMLogger {
+class RecordingLogger : public pmutil::PMLogger {
 public:
-    KeepingLogger() : PMLogger("keeping") {}
+    RecordingLogger() : PMLogger("keeping") {}
     std::string GetPrefix(const char*, int) override { return ""; }
     void Write(const char* data, std::size_t size) override { text.append(data, size); }
     std::string text;
@@ -380,7 +380,7 @@ public:
 TEST_F(OneDevice, TheBandwidthMeasurementIsALogScope)
 {
     pmutil::InitLogging();
-    const KeepingLogger logger;
+    const RecordingLogger logger;
     std::string atMeasurement;
     impl->failures["CLBandwidth"] = [&] { atMeasurement = logger.text; };
 
@@ -399,7 +399,7 @@ TEST_F(OneDevice, TheBandwidthMeasurementIsALogScope)
                                      "t.CLBandwidth=1.23457e+09"));
 }
 
-TEST_F(OneDevice, TheDelayIsSpentBeforeTheMeasurement)
+TEST_F(OneDevice, TheDelayPrecedesTheMeasurement)
 {
     pmutil::InitLogging();
     static pmutil::DebugValue delay{"GPUAssayOCLDelay", 0};
@@ -420,11 +420,11 @@ TEST_F(OneDevice, GetStringPrintsItsCodeFirstAndTakesNoStep)
 {
     tester.DoRunGLGetString("t", *gl, "GL_NAME", 35724);
     EXPECT_THAT(app.out, ElementsAre("gputag.GL_NAME=35724", "t.glGetString[GL_NAME]=\"4.60\""));
-    EXPECT_THAT(impl->asked, ElementsAre("GLGetString 35724"));
+    EXPECT_THAT(impl->queries, ElementsAre("GLGetString 35724"));
     EXPECT_EQ(tester.fStep, 0U);
 }
 
-TEST_F(OneDevice, AMissingStringIsAFailure)
+TEST_F(OneDevice, ANullStringThrows)
 {
     impl->shadingLanguage = nullptr;
     EXPECT_THROW(tester.DoRunGLGetString("t", *gl, "GL_NAME", 1), std::logic_error);
@@ -467,7 +467,7 @@ TEST_F(OneDevice, GetProgramivPrintsItsCodesBeforeTheQuery)
     EXPECT_EQ(tester.fStep, 0U);
 }
 
-TEST_F(OneDevice, ExtensionPrintsItsIdBeforeTheQuestion)
+TEST_F(OneDevice, ExtensionPrintsItsIdBeforeTheQuery)
 {
     impl->failures["GLIsExtensionSupported 9"] = [] { throw std::runtime_error("bad"); };
     EXPECT_THROW(tester.DoRunExtension("t", *gl, "E", 9), std::runtime_error);
@@ -477,18 +477,19 @@ TEST_F(OneDevice, ExtensionPrintsItsIdBeforeTheQuestion)
     EXPECT_EQ(tester.fStep, 1U);
 }
 
-TEST_F(OneDevice, QueriesAskForWhatTheyNeed)
+TEST_F(OneDevice, TestsCallTheirQuery)
 {
     const GPUEntry entry{"t", gl};
     GLStringTest("S", 1).Run(tester, entry);
     IntegervTest("I", 2, 1).Run(tester, entry);
     ProgramvTest("P", 3, 1).Run(tester, entry);
     ExtensionTest("E", 4).Run(tester, entry);
-    EXPECT_THAT(impl->asked, ElementsAre("GLGetString 1", "GLGetIntegerv 2",
-                                         "GLGetProgramivARB 34820 3", "GLIsExtensionSupported 4"));
+    EXPECT_THAT(impl->queries,
+                ElementsAre("GLGetString 1", "GLGetIntegerv 2", "GLGetProgramivARB 34820 3",
+                            "GLIsExtensionSupported 4"));
 }
 
-TEST_F(OneDevice, QueriesRefuseTheWrongKindOfDevice)
+TEST_F(OneDevice, TestsRejectTheWrongTypeOfDevice)
 {
     const GPUEntry entry{"t", cl};
     EXPECT_THROW(GLStringTest("S", 1).Run(tester, entry), std::bad_cast);
@@ -498,7 +499,7 @@ TEST_F(OneDevice, QueriesRefuseTheWrongKindOfDevice)
     EXPECT_THAT(app.out, IsEmpty());
 }
 
-TEST_F(OneDevice, TestFuncRefusesTheWrongKindOfTester)
+TEST_F(OneDevice, TestFuncRejectsTheWrongTypeOfTester)
 {
     GPUAssayTester plain(&app);
     const TestFunc<PixmereTester, pmutil::CLGPU> compute(&PixmereTester::DoRunCLCompute);
@@ -507,7 +508,7 @@ TEST_F(OneDevice, TestFuncRefusesTheWrongKindOfTester)
     EXPECT_THAT(app.out, ElementsAre("t.CLCompute=32"));
 }
 
-TEST_F(OneDevice, AMissingDeviceTripsTheAssertion)
+TEST_F(OneDevice, AMissingDeviceFailsTheAssertion)
 {
     const GPUEntry nothing{"t", nullptr};
     EXPECT_DEATH(GLStringTest("S", 1).Run(tester, nothing), "px != 0");
@@ -516,7 +517,7 @@ TEST_F(OneDevice, AMissingDeviceTripsTheAssertion)
     EXPECT_DEATH(ExtensionTest("E", 1).Run(tester, nothing), "px != 0");
 }
 
-TEST_F(OneDevice, TestsReachOverridesOfTheTester)
+TEST_F(OneDevice, TestsCallOverridesOfTheTester)
 {
     class Tester : public GPUAssayTester {
     public:
@@ -561,7 +562,7 @@ TEST(Battery, ThePlainTesterHasNone)
     }
 }
 
-TEST(Battery, ADeviceThatFailedInItStaysOut)
+TEST(Battery, ADeviceThatFailsInItIsRemoved)
 {
     CapturedStderr err;
     const FakeMachine machine(2, 0, false);
@@ -576,7 +577,7 @@ TEST(Battery, ADeviceThatFailedInItStaysOut)
 
 TEST(Battery, WorksOnACopyOfTheList)
 {
-    // Keeps the size of the tester's own list at each test of the battery.
+    // Records the size of the tester's own list at each test of the battery.
     class Tester : public FakeTester<PixmereTester> {
     public:
         using FakeTester<PixmereTester>::FakeTester;
@@ -596,7 +597,7 @@ TEST(Battery, WorksOnACopyOfTheList)
     EXPECT_THAT(tester.fGLGPUs, IsEmpty());
 }
 
-TEST(Battery, ADeviceThatFailedBeforeIsAbsent)
+TEST(Battery, ADeviceThatFailedBeforeIsNotTested)
 {
     const CapturedStderr err;
     const FakeMachine machine(1, 0, false);
@@ -625,7 +626,7 @@ TEST(Enumerate, ReplacesTheListAndKeepsTheOrder)
     EXPECT_THAT(tags, ElementsAre("glgpu[0]", "glgpu[1]", "glgpu[2]", "clgpu[0]", "clgpu[1]"));
 }
 
-TEST(Enumerate, AFailureEndsTheRunBeforeItsLine)
+TEST(Enumerate, AnExceptionEndsTheRunBeforeItsLine)
 {
     TestApp app;
     FakeTester<GPUAssayTester> tester(&app, {});

@@ -15,7 +15,7 @@ constexpr std::int32_t kMin = std::numeric_limits<std::int32_t>::min();
 
 class CommandLine : public testing::Test {
 protected:
-    // What parsing leaves over.
+    // Returns the arguments that parsing leaves.
     Lines Parse(const Lines& options)
     {
         GPUAssayApp::Arguments arguments(options.begin(), options.end());
@@ -77,13 +77,13 @@ TEST_F(CommandLine, StderrPrintsAtOnce)
     EXPECT_THAT(app.out, IsEmpty());
 }
 
-TEST_F(CommandLine, CommentPrintsBehindItsPrefix)
+TEST_F(CommandLine, CommentPrintsItsPrefix)
 {
     EXPECT_THAT(Parse({"-comment=x", "-comment="}), IsEmpty());
     EXPECT_THAT(app.out, ElementsAre("# x", "# "));
 }
 
-TEST_F(CommandLine, FurtherEqualSignsBelongToTheValue)
+TEST_F(CommandLine, OnlyTheFirstEqualSignSplits)
 {
     Parse({"-stdout=a=b", "-stdout==", "-stdout=a=\"b\""});
     EXPECT_THAT(app.out, ElementsAre("a=b", "=", "a=\"b\""));
@@ -102,7 +102,7 @@ TEST_F(CommandLine, LaterValuesReplaceEarlierOnes)
     EXPECT_EQ(app.GetVerbose(), 2);
 }
 
-TEST_F(CommandLine, KeepsWhatItDoesNotKnowInOrder)
+TEST_F(CommandLine, KeepsUnknownArgumentsInOrder)
 {
     EXPECT_THAT(Parse({"foo", "-bogus", "-stdout=x", "--help", "-crashAfter", "-help=1", "-", "",
                        "-=", "-foo=1", "/stdout=x", "-Stdout=x", "-stdou=x", "-stdout x"}),
@@ -111,7 +111,7 @@ TEST_F(CommandLine, KeepsWhatItDoesNotKnowInOrder)
     EXPECT_THAT(app.out, ElementsAre("x"));
 }
 
-TEST_F(CommandLine, EveryNameWithoutAValueIsLeftOver)
+TEST_F(CommandLine, ANameWithoutAValueIsUnknown)
 {
     const Lines bare = {"-crashAfter", "-throwAfter", "-app",     "-stdout",  "-stderr",
                         "-exit",       "-verbose",    "-timeout", "-comment", "-hang"};
@@ -125,7 +125,7 @@ TEST_F(CommandLine, HelpEndsParsingAtOnce)
     EXPECT_THAT(app.out, ElementsAre("a"));
 }
 
-TEST_F(CommandLine, ParseArgumentTellsWhetherItTookTheArgument)
+TEST_F(CommandLine, ParseArgumentReturnsWhetherItIsAnOption)
 {
     EXPECT_TRUE(ParseOne("-hang=1"));
     EXPECT_FALSE(ParseOne("hang=1"));
@@ -215,7 +215,7 @@ public:
     std::string file;
 };
 
-TEST(CommandLineOverrides, AreHonoured)
+TEST(CommandLineOverrides, AreCalled)
 {
     ExtendedApp app;
     GPUAssayApp::Arguments arguments = {"-colour=red", "-file", "-stdout=name", "-stdout=x", "y"};

@@ -33,13 +33,13 @@ const Lines kUsage = {"usage: ", "    -help {show this message}",
                       "    -comment=line_of_comment {outputs '# line_of_comment'}",
                       "    -hang=N {before exit, sleep for N milliseconds}"};
 
-// A tester whose sequence is one call.
+// A tester whose sequence is a single call.
 class OneCallTester : public GPUAssayTester {
 public:
     OneCallTester(GPUAssayApp* app, std::function<void(GPUAssayTester&)> call)
         : GPUAssayTester(app), fCall(std::move(call))
     {}
-    // First of the sequence; what it throws ends the run.
+    // The first operation of the sequence; an exception ends the run.
     void DoRunStart() override { fCall(*this); }
     void DoRunQGFCoreInitialize() override {}
     void DoRunQGFOGLInitialize() override {}
@@ -56,7 +56,7 @@ class AppRun : public testing::Test {
 protected:
     void TearDown() override { pmutil::GetDebugValue(pmutil::gGPUAssay) = 0; }
 
-    // Lets the sequence call `call`.
+    // Makes the sequence call `call`.
     void InSequence(const std::function<void(GPUAssayTester&)>& call)
     {
         app.makeTester = [call](GPUAssayApp* owner) { return new OneCallTester(owner, call); };
@@ -115,14 +115,14 @@ TEST_F(AppRun, ExitIsClampedToThirtyTwoBits)
     EXPECT_EQ(app.RunWith({"-exit=4294967295"}), std::numeric_limits<std::int32_t>::max());
 }
 
-TEST_F(AppRun, AFailedTestBeatsExit)
+TEST_F(AppRun, AFailedTestOverridesExit)
 {
     InSequence([](GPUAssayTester& tester) { tester.fFailures = 1; });
     EXPECT_EQ(app.RunWith({"-exit=7"}), 2);
     EXPECT_THAT(err.Take(), IsEmpty());
 }
 
-TEST_F(AppRun, AUsageErrorBeatsExit)
+TEST_F(AppRun, AUsageErrorOverridesExit)
 {
     InSequence([](GPUAssayTester&) {});
     EXPECT_EQ(app.RunWith({"-exit=7", "-foo"}), 3);
@@ -135,7 +135,7 @@ TEST_F(AppRun, AnUnknownOptionPrintsTheUsageAndNoReport)
     EXPECT_EQ(err.Take(), Lines{"Usage exception: usage"} + kUsage);
 }
 
-TEST_F(AppRun, EveryMalformedCommandLineGetsTheSame)
+TEST_F(AppRun, AllMalformedCommandLinesPrintTheSame)
 {
     for (const char* bad :
          {"-help", "-help=1", "--help", "foo", "-crashAfter", "", "-", "-foo=1"}) {
@@ -159,7 +159,7 @@ TEST_F(AppRun, HelpStopsAtOnce)
     EXPECT_EQ(err.Take(), Lines{"Usage exception: usage"} + kUsage);
 }
 
-TEST_F(AppRun, TellsALogicalException)
+TEST_F(AppRun, ReportsALogicalException)
 {
     InSequence([](GPUAssayTester&) { throw QGF::LogicalException("no driver"); });
     EXPECT_EQ(app.RunWith({"-exit=7"}), 2);
@@ -167,28 +167,28 @@ TEST_F(AppRun, TellsALogicalException)
     EXPECT_THAT(app.out, IsEmpty());
 }
 
-TEST_F(AppRun, TellsAnInternalExceptionAsAnyOther)
+TEST_F(AppRun, ReportsAnInternalExceptionAsAStandardOne)
 {
     InSequence([](GPUAssayTester&) { throw QGF::InternalException("file", 3, "a == b"); });
     EXPECT_EQ(app.RunWith({}), 2);
     EXPECT_THAT(err.Take(), ElementsAre("exception: file(3): a == b"));
 }
 
-TEST_F(AppRun, TellsAStandardException)
+TEST_F(AppRun, ReportsAStandardException)
 {
     InSequence([](GPUAssayTester&) { throw std::bad_cast(); });
     EXPECT_EQ(app.RunWith({}), 2);
     EXPECT_THAT(err.Take(), ElementsAre("exception: std::bad_cast"));
 }
 
-TEST_F(AppRun, TellsAnUnknownException)
+TEST_F(AppRun, ReportsAnUnknownException)
 {
     InSequence([](GPUAssayTester&) { throw 5; });
     EXPECT_EQ(app.RunWith({}), 2);
     EXPECT_THAT(err.Take(), ElementsAre("unknown exception"));
 }
 
-TEST_F(AppRun, NamesANullText)
+TEST_F(AppRun, PrintsANullText)
 {
     InSequence([](GPUAssayTester&) { throw NullMessage(); });
     EXPECT_EQ(app.RunWith({}), 2);
@@ -225,7 +225,7 @@ TEST_F(AppRun, ThrowAfterZeroThrowsAtTheFirstStep)
     EXPECT_THAT(err.Take(), ElementsAre("exception: Programmed throw"));
 }
 
-TEST_F(AppRun, HandsTheStepSettingsToTheTester)
+TEST_F(AppRun, PassesTheStepSettingsToTheTester)
 {
     std::uint32_t crashAfter = 0;
     std::int32_t throwAfter = 0;
@@ -258,7 +258,7 @@ TEST_F(AppRun, VerboseReachesTheDebugValueBeforeTheTesterIsMade)
     EXPECT_EQ(seen, 3);
 }
 
-// Counts what Run calls.
+// Records the operations that Run calls.
 class CountingApp : public TestApp {
 public:
     void Init() override
@@ -319,7 +319,7 @@ public:
     void Term() override { throw std::runtime_error("term"); }
 };
 
-TEST_F(AppRun, AFailureOfTermIsAFailureOfTheRun)
+TEST_F(AppRun, AnExceptionOfTermFailsTheRun)
 {
     FailingTermApp failing;
     failing.makeTester = [](GPUAssayApp* owner) {
@@ -329,14 +329,14 @@ TEST_F(AppRun, AFailureOfTermIsAFailureOfTheRun)
     EXPECT_THAT(err.Take(), ElementsAre("exception: term"));
 }
 
-TEST_F(AppRun, AFailedRunStartsAnew)
+TEST_F(AppRun, AFailedRunCanBeRepeated)
 {
     EXPECT_EQ(app.RunWith({"-exit=7", "-foo"}), 3);
     InSequence([](GPUAssayTester&) {});
     EXPECT_EQ(app.RunWith({}), 0);
 }
 
-TEST_F(AppRun, UsageLinesGoThroughTheOverride)
+TEST_F(AppRun, UsageLinesComeFromTheOverride)
 {
     class ShortUsage : public TestApp {
     public:
@@ -347,7 +347,7 @@ TEST_F(AppRun, UsageLinesGoThroughTheOverride)
     EXPECT_THAT(err.Take(), ElementsAre("Usage exception: usage", "just so"));
 }
 
-TEST_F(AppRun, ALogicalExceptionIsTriedFirst)
+TEST_F(AppRun, ALogicalExceptionIsCaughtFirst)
 {
     class EarlyFailure : public TestApp {
     public:
@@ -359,7 +359,7 @@ TEST_F(AppRun, ALogicalExceptionIsTriedFirst)
     EXPECT_THAT(err.Take(), ElementsAre("QGF::LogicalException: early"));
 }
 
-TEST(App, FallsBackOnThePlainTester)
+TEST(App, FallsBackToThePlainTester)
 {
     TestApp app; // makes no tester of its own
     const boost::shared_ptr<GPUAssayTester> tester = app.GetTester();
@@ -375,7 +375,7 @@ TEST(App, TheDefaultTesterIsThePlainOne)
     EXPECT_EQ(typeid(*app.GetTester()), typeid(GPUAssayTester));
 }
 
-TEST(App, RunFallsBackOnThePlainTester)
+TEST(App, RunFallsBackToThePlainTester)
 {
     const CapturedStderr err;
     TestApp app;
@@ -383,7 +383,7 @@ TEST(App, RunFallsBackOnThePlainTester)
     EXPECT_EQ(typeid(*app.GetTester()), typeid(GPUAssayTester));
 }
 
-TEST(App, StepSettingsAreTheTestersOnceItExists)
+TEST(App, StepSettingsAreThoseOfTheTesterIfItExists)
 {
     TestApp app;
     app.SetCrashAfter(5);
@@ -404,7 +404,7 @@ TEST(App, StepSettingsAreTheTestersOnceItExists)
     EXPECT_EQ(app.GetThrowAfter(), 10);
 }
 
-TEST(App, OptionsReachATesterThatExists)
+TEST(App, OptionsSetAnExistingTester)
 {
     TestApp app;
     GPUAssayTester& tester = *app.GetTester();
@@ -423,29 +423,29 @@ TEST(App, MakesAnAssayLoggerOnce)
     EXPECT_EQ(app.GetLogger(), logger);
 }
 
-// Puts its end on record.
+// Records its destruction.
 template <typename Base>
-class Ending : public Base {
+class DestructionRecorder : public Base {
 public:
     template <typename... Arguments>
-    Ending(Lines& ends, std::string name, Arguments&&... arguments)
+    DestructionRecorder(Lines& ends, std::string name, Arguments&&... arguments)
         : Base(std::forward<Arguments>(arguments)...), fEnds(ends), fName(std::move(name))
     {}
-    ~Ending() override { fEnds.push_back(fName); }
+    ~DestructionRecorder() override { fEnds.push_back(fName); }
 
 private:
     Lines& fEnds;
     std::string fName;
 };
 
-TEST(App, TheTesterGoesBeforeTheLogger)
+TEST(App, TheTesterIsDestroyedBeforeTheLogger)
 {
     class EndingApp : public TestApp {
     public:
         explicit EndingApp(Lines& ends) : fEnds(ends) {}
         pmutil::PMLogger* CreateLogger() override
         {
-            return new Ending<pmutil::AssayLogger>(fEnds, "logger");
+            return new DestructionRecorder<pmutil::AssayLogger>(fEnds, "logger");
         }
 
     private:
@@ -455,7 +455,7 @@ TEST(App, TheTesterGoesBeforeTheLogger)
     {
         EndingApp app(ends);
         app.makeTester = [&ends](GPUAssayApp* owner) {
-            return new Ending<GPUAssayTester>(ends, "tester", owner);
+            return new DestructionRecorder<GPUAssayTester>(ends, "tester", owner);
         };
         app.GetTester();
         app.GetLogger();
@@ -463,27 +463,27 @@ TEST(App, TheTesterGoesBeforeTheLogger)
     EXPECT_THAT(ends, ElementsAre("tester", "logger"));
 }
 
-TEST(App, TheTestersOpenCLDevicesGoBeforeTheOthers)
+TEST(App, TheOpenCLDevicesAreDestroyedBeforeTheOthers)
 {
     Lines ends;
     {
         TestApp app;
         GPUAssayTester tester(&app);
         tester.fGLGPUs.push_back(
-            {"gl", MakeGL(boost::make_shared<Ending<FakeGPUImpl>>(ends, "gl"))});
+            {"gl", MakeGL(boost::make_shared<DestructionRecorder<FakeGPUImpl>>(ends, "gl"))});
         tester.fCLGPUs.push_back(
-            {"cl", MakeCL(boost::make_shared<Ending<FakeGPUImpl>>(ends, "cl"))});
+            {"cl", MakeCL(boost::make_shared<DestructionRecorder<FakeGPUImpl>>(ends, "cl"))});
     }
     EXPECT_THAT(ends, ElementsAre("cl", "gl"));
 }
 
-TEST(App, AnExceptionThatEscapesTheRunIsStatus4)
+TEST(App, AnEscapedExceptionIsStatus4)
 {
     EXPECT_EQ(RunToStatus([] { return 7; }), 7);
     CapturedStderr err;
     EXPECT_EQ(RunToStatus([]() -> int { throw std::bad_alloc(); }), 4);
     EXPECT_EQ(RunToStatus([]() -> int { throw 1; }), 4);
-    // A usage text that can't be made, on the way to status 3.
+    // The usage text of status 3 throws.
     class Speechless : public TestApp {
         void Usage(Arguments& /*lines*/) override { throw std::runtime_error("speechless"); }
     };
@@ -491,7 +491,7 @@ TEST(App, AnExceptionThatEscapesTheRunIsStatus4)
     EXPECT_THAT(err.Take(), ElementsAre("Usage exception: usage"));
 }
 
-TEST(App, TheRootHasNothingButADestructor)
+TEST(App, TheBaseHasOnlyADestructor)
 {
     EXPECT_TRUE(std::is_abstract_v<GPUAssayAppAndHost>);
     EXPECT_TRUE(std::has_virtual_destructor_v<GPUAssayAppAndHost>);
@@ -499,13 +499,13 @@ TEST(App, TheRootHasNothingButADestructor)
     EXPECT_TRUE((std::is_base_of_v<GPUAssayAppAndHost, GPUAssayTester>));
 }
 
-TEST(App, TheUsageExceptionSaysUsage)
+TEST(App, TheUsageExceptionHasItsText)
 {
     EXPECT_STREQ(GPUAssayApp::UsageException().what(), "usage");
     EXPECT_TRUE((std::is_base_of_v<std::runtime_error, GPUAssayApp::UsageException>));
 }
 
-TEST(App, PixmereAssayIsOneAndBringsThePixmereTester)
+TEST(App, PixmereAssayIsASingletonWithThePixmereTester)
 {
     PixmereAssay& app = PixmereAssay::Instance();
     EXPECT_EQ(&app, &PixmereAssay::Instance());

@@ -19,7 +19,7 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// What a step throws; empty for nothing.
+// The text of the exception that a step throws; empty for none.
 std::string StepFailure(GPUAssayTester& tester)
 {
     try {
@@ -30,7 +30,7 @@ std::string StepFailure(GPUAssayTester& tester)
     return "";
 }
 
-TEST(Step, StartsSilent)
+TEST(Step, InitialValues)
 {
     TestApp app;
     GPUAssayTester tester(&app);
@@ -66,7 +66,7 @@ TEST(Step, ThrowsAtExactlyOneStep)
     EXPECT_EQ(StepFailure(tester), "");
 }
 
-TEST(Step, TheCrashWinsOverTheThrow)
+TEST(Step, TheCrashPrecedesTheThrow)
 {
     TestApp app;
     GPUAssayTester tester(&app);
@@ -97,7 +97,7 @@ public:
     int crashes = 0;
 };
 
-TEST(Step, NeverContinuesPastACrashThatReturns)
+TEST(Step, ACrashThatReturnsIsFollowedByTheBaseCrash)
 {
     TestApp app;
     SurvivingTester tester(&app);
@@ -164,11 +164,11 @@ TEST(Timestamp, IsLocalTimeZeroFilled)
     EXPECT_EQ(LocalTimeText(std::mktime(&parts)), "2031-12-31_23:59:58");
 }
 
-TEST(Timestamp, TellsATimeThatIsNoLocalTime)
+TEST(Timestamp, ThrowsForATimeOutOfRange)
 {
     try {
         LocalTimeText(std::numeric_limits<std::time_t>::max());
-        FAIL() << "converted";
+        FAIL() << "no exception";
     } catch (const std::runtime_error& exception) {
         EXPECT_STREQ(exception.what(), "could not convert calendar time to local time");
     }
@@ -228,7 +228,7 @@ protected:
             tags.push_back(entry.tag);
         return tags;
     }
-    // Lets the entry of that tag throw.
+    // Makes the test of the entry with that tag throw.
     template <typename Exception>
     void FailAt(const std::string& failing, const Exception& exception)
     {
@@ -263,7 +263,7 @@ TEST_F(RunTestTest, WalksTheListInOrder)
     EXPECT_THAT(err.Take(), IsEmpty());
 }
 
-TEST_F(RunTestTest, TakesAFailedEntryOffAndGoesOn)
+TEST_F(RunTestTest, RemovesAFailedEntryAndContinues)
 {
     FailAt("b", std::runtime_error("bad"));
     EXPECT_THAT(seen, ElementsAre("a", "b", "c"));
@@ -282,7 +282,7 @@ TEST_F(RunTestTest, TheFirstAndTheLastMayFail)
     EXPECT_THAT(err.Take(), ElementsAre("exception: bad", "exception: worse"));
 }
 
-TEST_F(RunTestTest, TellsEachKindOfException)
+TEST_F(RunTestTest, ReportsEachKindOfException)
 {
     FailAt("a", QGF::LogicalException("no context"));
     FailAt("b", QGF::InternalException("f", 1, "x"));
@@ -293,28 +293,28 @@ TEST_F(RunTestTest, TellsEachKindOfException)
     EXPECT_THAT(Tags(), IsEmpty());
 }
 
-TEST_F(RunTestTest, NamesANullText)
+TEST_F(RunTestTest, PrintsANullText)
 {
     FailAt("a", NullLogical());
     FailAt("b", NullStandard());
     EXPECT_THAT(err.Take(), ElementsAre("QGF::LogicalException: <NULL>", "exception: <NULL>"));
 }
 
-TEST_F(RunTestTest, DoesNotGoThroughStderr)
+TEST_F(RunTestTest, DoesNotCallStderr)
 {
     class Muted : public TestApp {
     public:
-        void DoStderr(const std::string&) override { ++told; }
-        int told = 0;
+        void DoStderr(const std::string&) override { ++lines; }
+        int lines = 0;
     };
     Muted muted;
     GPUAssayTester other(&muted);
     other.RunTest(entries, CallTest([](const GPUEntry&) { throw std::runtime_error("bad"); }));
-    EXPECT_EQ(muted.told, 0);
+    EXPECT_EQ(muted.lines, 0);
     EXPECT_THAT(err.Take(), ElementsAre("exception: bad", "exception: bad", "exception: bad"));
 }
 
-TEST_F(RunTestTest, SurvivesAFailingStandardError)
+TEST_F(RunTestTest, IgnoresAFailedStandardError)
 {
     struct Broken : std::streambuf {
     } broken;
@@ -322,12 +322,12 @@ TEST_F(RunTestTest, SurvivesAFailingStandardError)
         const RedirectStream redirect(std::cerr, &broken);
         FailAt("a", std::runtime_error("lost"));
     }
-    FailAt("b", std::runtime_error("told"));
-    EXPECT_THAT(err.Take(), ElementsAre("exception: told"));
+    FailAt("b", std::runtime_error("reported"));
+    EXPECT_THAT(err.Take(), ElementsAre("exception: reported"));
     EXPECT_EQ(tester.fFailures, 2);
 }
 
-TEST_F(RunTestTest, AWrongKindOfDeviceIsAFailure)
+TEST_F(RunTestTest, AWrongTypeOfDeviceIsAFailure)
 {
     entries.clear();
     entries.push_back({"cl", MakeCL(boost::make_shared<FakeGPUImpl>())});
@@ -349,9 +349,9 @@ TEST_F(RunTestTest, ReleasesAFailedDevice)
 }
 
 // Keeps the text of log lines.
-class KeepingLogger : public pmutil::PMLogger {
+class RecordingLogger : public pmutil::PMLogger {
 public:
-    KeepingLogger() : PMLogger("keeping") {}
+    RecordingLogger() : PMLogger("keeping") {}
     std::string GetPrefix(const char*, int) override { return ""; }
     void Write(const char* data, std::size_t size) override { text.append(data, size); }
     std::string text;
@@ -360,7 +360,7 @@ public:
 TEST_F(RunTestTest, LogsATerminatedDeviceWhenVerbose)
 {
     pmutil::InitLogging();
-    const KeepingLogger logger;
+    const RecordingLogger logger;
     pmutil::GetDebugValue(pmutil::gGPUAssay) = 0;
     FailAt("a", std::runtime_error("bad"));
     EXPECT_EQ(logger.text, "");

@@ -1,4 +1,4 @@
-// The library checks and the enumerations, over a scripted OpenGL and a scripted OpenCL.
+// The library checks and the enumerations, with a fake OpenGL and a fake OpenCL.
 #include <stdexcept>
 
 #include <gmock/gmock.h>
@@ -23,7 +23,7 @@ class LibraryChecks : public testing::Test {
 protected:
     void TearDown() override { QGF::Core::ReplaceLoaderCheck(nullptr); }
 
-    // The report line and the log lines of one check, which takes one step.
+    // Checks the report line and the log lines of a check, and that it takes one step.
     void ExpectCheck(void (GPUAssayTester::*check)(), const std::string& line, const Lines& logged)
     {
         TestApp app;
@@ -45,7 +45,7 @@ constexpr auto kCore = &GPUAssayTester::DoRunQGFCoreInitialize;
 constexpr auto kOGL = &GPUAssayTester::DoRunQGFOGLInitialize;
 constexpr auto kContext = &GPUAssayTester::DoRunOGLContextCreate;
 
-// The OpenGL half of the sequence alone.
+// Runs only the OpenGL half of the sequence.
 class OGLTester : public GPUAssayTester {
 public:
     using GPUAssayTester::GPUAssayTester;
@@ -59,7 +59,7 @@ public:
     const char* message() const noexcept override { return nullptr; }
 };
 
-TEST_F(LibraryChecks, PassWhereEverythingWorks)
+TEST_F(LibraryChecks, PassIfEverythingWorks)
 {
     FakeOpenGL gl;
     ExpectCheck(kCore, "QGFCoreInitialized=1", {});
@@ -104,7 +104,7 @@ TEST_F(LibraryChecks, ContextFailsWithALineInTheLogOnly)
     EXPECT_THAT(err.Take(), IsEmpty());
 }
 
-TEST_F(LibraryChecks, TheContextGoesToTheFirstDeviceAndAwayAtOnce)
+TEST_F(LibraryChecks, TheContextIsMadeOnTheFirstDeviceAndDestroyed)
 {
     FakeOpenGL gl(2);
     TestApp app;
@@ -113,7 +113,7 @@ TEST_F(LibraryChecks, TheContextGoesToTheFirstDeviceAndAwayAtOnce)
     EXPECT_THAT(gl.callsOf("destroy"), ElementsAre("destroy fake0"));
 }
 
-TEST_F(LibraryChecks, AProgrammedFailureComesBehindTheLine)
+TEST_F(LibraryChecks, AProgrammedFailureFollowsTheLine)
 {
     FakeOpenGL gl;
     for (const auto check : {kCore, kOGL, kContext}) {
@@ -125,7 +125,7 @@ TEST_F(LibraryChecks, AProgrammedFailureComesBehindTheLine)
     }
 }
 
-TEST_F(LibraryChecks, EveryOneFailingLeavesTheSequenceRunning)
+TEST_F(LibraryChecks, AllFailuresLeaveTheSequenceRunning)
 {
     FakeOpenGL gl(0);
     QGF::Core::ReplaceLoaderCheck([] { throw QGF::LogicalException("no loader"); });
@@ -139,13 +139,13 @@ TEST_F(LibraryChecks, EveryOneFailingLeavesTheSequenceRunning)
     EXPECT_THAT(err.Take(), IsEmpty());
 }
 
-TEST_F(LibraryChecks, EveryOneFailingDoesNotKeepTheDevicesAway)
+TEST_F(LibraryChecks, AllFailuresLeaveTheEnumerationWorking)
 {
     FakeOpenGL gl(2);
     QGF::Core::ReplaceLoaderCheck([] { throw QGF::LogicalException("no loader"); });
-    int asked = 0;
-    gl.onDisplayDevices = [&asked] { // fails the start of OpenGL and the trial context
-        if (++asked <= 2)
+    int calls = 0;
+    gl.onDisplayDevices = [&calls] { // fails the initialization of OpenGL and the context check
+        if (++calls <= 2)
             throw QGF::LogicalException("not yet");
     };
     assay_test::ScriptedAdapters adapters;
@@ -178,7 +178,7 @@ TEST_F(LibraryChecks, OCLPrintsNothingAndTakesNoStep)
                                : Lines{});
 }
 
-TEST_F(LibraryChecks, OCLStaysAvailableIfItsStartFails)
+TEST_F(LibraryChecks, OCLStaysAvailableIfItsInitializationFails)
 {
     TestApp app;
     CapturedLog log(pmutil::gGPUAssay);
@@ -195,7 +195,7 @@ TEST_F(LibraryChecks, OCLStaysAvailableIfItsStartFails)
     EXPECT_THAT(err.Take(), IsEmpty());
 }
 
-TEST_F(LibraryChecks, OCLIsStartedWhereItIsAvailableOnly)
+TEST_F(LibraryChecks, OCLIsInitializedOnlyIfAvailable)
 {
     CapturedLog log(pmutil::gGPUAssay);
     int starts = 0;
@@ -219,7 +219,7 @@ TEST_F(LibraryChecks, OCLIsStartedWhereItIsAvailableOnly)
     EXPECT_THAT(err.Take(), IsEmpty());
 }
 
-TEST(GLEnumeration, FindsEachDeviceOfTheMachine)
+TEST(GLEnumeration, ListsTheDevicesOfTheMachine)
 {
     FakeOpenGL gl(2);
     assay_test::ScriptedAdapters adapters;
@@ -240,7 +240,7 @@ TEST(GLEnumeration, FindsEachDeviceOfTheMachine)
     EXPECT_EQ(gl.devices[0].contexts + gl.devices[1].contexts, 0);
 }
 
-// An OpenCL of one platform with two graphics processors, or of none.
+// A fake OpenCL with one platform that has two GPUs, or with a failing list of platforms.
 class ScriptedOpenCL {
 public:
     explicit ScriptedOpenCL(cl_int platformStatus)
@@ -285,7 +285,7 @@ private:
 
 cl_int ScriptedOpenCL::gPlatformStatus = CL_SUCCESS;
 
-TEST(CLEnumeration, FindsEachDeviceOfTheMachine)
+TEST(CLEnumeration, ListsTheDevicesOfTheMachine)
 {
     const ScriptedOpenCL opencl(CL_SUCCESS);
     TestApp app;
@@ -299,7 +299,7 @@ TEST(CLEnumeration, FindsEachDeviceOfTheMachine)
     EXPECT_NE(tester.fCLGPUs.front().gpu->impl, tester.fCLGPUs.back().gpu->impl);
 }
 
-TEST(CLEnumeration, NoPlatformIsNoDevice)
+TEST(CLEnumeration, NoPlatformMeansNoDevice)
 {
     constexpr cl_int kPlatformNotFound = -1001;
     const ScriptedOpenCL opencl(kPlatformNotFound);
@@ -312,7 +312,7 @@ TEST(CLEnumeration, NoPlatformIsNoDevice)
     EXPECT_EQ(tester.fStep, 1U);
 }
 
-TEST(CLEnumeration, AFailingPlatformEndsTheRun)
+TEST(CLEnumeration, AFailedPlatformEndsTheRun)
 {
     const ScriptedOpenCL opencl(CL_OUT_OF_HOST_MEMORY);
     TestApp app;

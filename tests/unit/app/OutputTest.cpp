@@ -12,10 +12,10 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// Refuses its first `refusals` characters or flushes, then keeps what it gets.
+// The first `failures` writes and flushes fail; later ones are recorded.
 class UnreliableBuffer : public std::stringbuf {
 public:
-    explicit UnreliableBuffer(int refusals) : fRefusals(refusals) {}
+    explicit UnreliableBuffer(int failures) : fFailures(failures) {}
 
 protected:
     std::streamsize xsputn(const char* text, std::streamsize size) override
@@ -28,11 +28,11 @@ protected:
     }
 
 private:
-    bool Refuse() { return fRefusals > 0 && fRefusals-- > 0; }
-    int fRefusals;
+    bool Refuse() { return fFailures > 0 && fFailures-- > 0; }
+    int fFailures;
 };
 
-// Takes everything and can't write any of it out.
+// Accepts all writes; all flushes fail.
 class UnflushableBuffer : public std::stringbuf {
 protected:
     int sync() override { return -1; }
@@ -43,7 +43,7 @@ protected:
     int_type overflow(int_type) override { throw std::runtime_error("broken"); }
 };
 
-// Keeps each write apart, and counts the flushes.
+// Records each write separately and counts the flushes.
 class WritesBuffer : public std::streambuf {
 public:
     Lines writes;
@@ -67,10 +67,10 @@ protected:
     }
 };
 
-// An application on the real standard output stream.
+// An application with the real standard output stream.
 class PlainApp : public GPUAssayApp {};
 
-TEST(Output, TextOrNullNamesANullPointer)
+TEST(Output, TextOrNullOfANullPointer)
 {
     EXPECT_STREQ(TextOrNull("x"), "x");
     EXPECT_STREQ(TextOrNull(nullptr), "<NULL>");
@@ -89,7 +89,7 @@ TEST(Output, StdoutWritesTheTextAndALineEnd)
     EXPECT_EQ(buffer.str(), "key=\"a\"b\"\n\n# text\n");
 }
 
-// What dies between two writes must not leave half a line.
+// If the process dies between two writes, half a line would be left.
 TEST(Output, ALineIsOneWriteAndOneFlush)
 {
     PlainApp app;
@@ -121,7 +121,7 @@ TEST(Output, ALineMayHoldAnyByte)
     EXPECT_EQ(buffer.str(), text + "\n");
 }
 
-TEST(Output, ALostLineIsToldAndTheNextOneTriedAfresh)
+TEST(Output, ALostLineIsReportedAndTheNextOneIsWritten)
 {
     PlainApp app;
     CapturedStderr err;
@@ -135,7 +135,7 @@ TEST(Output, ALostLineIsToldAndTheNextOneTriedAfresh)
     EXPECT_THAT(err.Take(), ElementsAre("DoStdout failed"));
 }
 
-TEST(Output, AFailingFlushLosesTheLineToo)
+TEST(Output, AFailedFlushLosesTheLine)
 {
     PlainApp app;
     CapturedStderr err;
@@ -148,7 +148,7 @@ TEST(Output, AFailingFlushLosesTheLineToo)
     EXPECT_THAT(err.Take(), ElementsAre("DoStdout failed", "DoStdout failed"));
 }
 
-TEST(Output, AThrowingStreamLosesTheLineToo)
+TEST(Output, AThrowingStreamLosesTheLine)
 {
     PlainApp app;
     CapturedStderr err;
@@ -169,7 +169,7 @@ TEST(Output, StderrWritesTheTextAndALineEnd)
     EXPECT_THAT(err.Take(), ElementsAre("one", "two"));
 }
 
-TEST(Output, StderrTriesOnceMoreAndNeverThrows)
+TEST(Output, StderrRetriesOnceAndNeverThrows)
 {
     PlainApp app;
     UnreliableBuffer once(1);
@@ -190,19 +190,19 @@ TEST(Output, StderrTriesOnceMoreAndNeverThrows)
 }
 
 // Overrides of the three operations.
-class OddApp : public GPUAssayApp {
+class ThrowingApp : public GPUAssayApp {
 public:
     void DoComment(const std::string& text) override { Stdout("; " + text); }
     void DoStdout(const std::string& text) override
     {
         if (text == "bad")
-            throw 1; // NOLINT(hicpp-exception-baseclass): anything may be thrown here
+            throw 1; // NOLINT(hicpp-exception-baseclass): not a std::exception on purpose
         out.push_back(text);
     }
     void DoStderr(const std::string& text) override
     {
         if (throwFromStderr)
-            throw 2; // NOLINT(hicpp-exception-baseclass): anything may be thrown here
+            throw 2; // NOLINT(hicpp-exception-baseclass): not a std::exception on purpose
         err.push_back(text);
     }
 
@@ -211,9 +211,9 @@ public:
     Lines err;
 };
 
-TEST(Output, OverridesAreHonoured)
+TEST(Output, OverridesAreCalled)
 {
-    OddApp app;
+    ThrowingApp app;
     app.Comment("c");
     app.Stdout("bad");
     app.Stderr("e");
@@ -221,9 +221,9 @@ TEST(Output, OverridesAreHonoured)
     EXPECT_THAT(app.err, ElementsAre("DoStdout failed", "e"));
 }
 
-TEST(Output, ThrowingStderrOverrideFallsBackOnTheStream)
+TEST(Output, AThrowingStderrOverrideFallsBackToTheStream)
 {
-    OddApp app;
+    ThrowingApp app;
     app.throwFromStderr = true;
     CapturedStderr err;
     app.Stderr("text");

@@ -442,7 +442,7 @@ TEST_F(WMIDataTest, NothingIsLoggedWithLoggingOff)
 
 TEST_F(WMIDataTest, AQueryWithoutAnEnumeratorSkipsTheLoopAndCleansUp)
 {
-    fScript.givesRows = false;
+    fScript.returnsRows = false;
     EXPECT_THAT(GetAllDevices(), IsEmpty());
     EXPECT_THAT(fScript.calls, ElementsAre("CreateFactory", "Initialize", "CreateLocator",
                                            "ConnectServer", "SetProxyBlanket", "QueryAdapters",
@@ -568,7 +568,7 @@ TEST_F(WMIDataTest, IdsNeedASuccessfulCallWithAnAdapter)
 
 TEST_F(WMIDataTest, WithoutAFactoryTheIdsStayZero)
 {
-    fScript.givesFactory = false;
+    fScript.returnsFactory = false;
     fScript.rows = {MakeRow(u"One")};
     fScript.adapters = {MakeAdapter(u"One", 1, 10)};
     const auto devices = GetAllDevices();
