@@ -49,13 +49,13 @@ void Write(const fs::path& path, const std::string& text, std::ios::openmode mod
         throw std::runtime_error("can't write " + path.string());
 }
 
-// What stands behind "NAME" and a separator on a line of a tree.
-std::string Behind(const std::string& line, std::size_t separator, std::size_t length)
+// Returns the unescaped rest of a line after a separator of `length` characters.
+std::string RestAfter(const std::string& line, std::size_t separator, std::size_t length)
 {
     return Unescape(line.substr(std::min(separator + length, line.size())));
 }
 
-// Unpacks the lines of a tree; tests/data/adapters/README.md tells what they mean.
+// Unpacks the lines of a tree; tests/data/adapters/README.md describes them.
 void Unpack(std::istream& tree, const fs::path& root)
 {
     fs::path folder = root;
@@ -75,11 +75,11 @@ void Unpack(std::istream& tree, const fs::path& root)
             else if (kind == " =")
                 Write(file, "", std::ios::trunc);
             else if (kind.compare(0, 3, " = ") == 0)
-                Write(file, Behind(kind, 0, 3) + "\n", std::ios::trunc);
+                Write(file, RestAfter(kind, 0, 3) + "\n", std::ios::trunc);
             else if (kind.compare(0, 3, " :=") == 0)
-                Write(file, Behind(kind, 0, 4), std::ios::trunc);
+                Write(file, RestAfter(kind, 0, 4), std::ios::trunc);
             else
-                throw std::runtime_error("a tree has the line " + line);
+                throw std::runtime_error("malformed line in a tree: " + line);
         }
     }
 }
@@ -90,7 +90,7 @@ AdapterTree::AdapterTree(const std::string& name)
 {
     std::ifstream tree(kData + name + "/tree.txt", std::ios::binary);
     if (!tree)
-        throw std::runtime_error("no tree " + name);
+        throw std::runtime_error("unknown tree " + name);
     std::string folder = (fs::temp_directory_path() / "adapters-XXXXXX").string();
     if (!mkdtemp(folder.data()))
         throw std::runtime_error("can't make " + folder);
@@ -151,6 +151,6 @@ std::string ReadAdapterData(const std::string& tree, const std::string& file)
     std::ostringstream text;
     text << in.rdbuf();
     if (!in)
-        throw std::runtime_error("no " + file + " of tree " + tree);
+        throw std::runtime_error("can't read " + file + " of tree " + tree);
     return text.str();
 }

@@ -1,11 +1,11 @@
-// A machine's files as the kernel shows them, unpacked from tests/data/adapters for one test.
+// The kernel's files of a recorded machine, unpacked from tests/data/adapters for one test.
 #pragma once
 
 #include <string>
 #include <vector>
 
-// Unpacks tests/data/adapters/NAME/tree.txt into a folder of its own and makes that the system
-// root. The destructor brings the real root back and removes the folder.
+// Unpacks tests/data/adapters/NAME/tree.txt to a temporary folder and makes that the system root.
+// The destructor restores the real root and removes the folder.
 class AdapterTree {
 public:
     explicit AdapterTree(const std::string& name);
@@ -16,24 +16,24 @@ public:
     // The unpacked folder.
     const std::string& root() const { return fRoot; }
 
-    // The paths of the unpacked files, with the root.
+    // Returns the full paths of the unpacked files, sorted.
     std::vector<std::string> files() const;
 
-    // Writes a file below the root, its folder too, and lets the next question look afresh.
+    // Writes a file below the root and makes its folder if necessary; then calls refresh.
     void write(const std::string& path, const std::string& text) const;
 
-    // Removes what is at that path below the root, and lets the next question look afresh.
+    // Removes a file or folder below the root; then calls refresh.
     void remove(const std::string& path) const;
 
-    // Makes the next question look at the adapters afresh.
+    // Makes cached adapter data stale.
     void refresh() const;
 
 private:
     std::string fRoot;
 };
 
-// The names of the trees, sorted.
+// Returns the names of the trees, sorted.
 std::vector<std::string> AdapterTreeNames();
 
-// A file of a tree's folder in tests/data/adapters.
+// Returns the text of a file in a tree's folder in tests/data/adapters.
 std::string ReadAdapterData(const std::string& tree, const std::string& file);

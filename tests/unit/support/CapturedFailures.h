@@ -1,4 +1,4 @@
-// Keeps what requirement checks report, in place of standard error.
+// Records the failures that requirement checks report; they don't go to standard error.
 #pragma once
 
 #include <string>

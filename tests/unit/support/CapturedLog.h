@@ -1,4 +1,4 @@
-// A logger that keeps what is logged while it lives, and turns the program's log statements on.
+// A logger that records lines and enables log statements while it lives.
 #pragma once
 
 #include <string>
@@ -9,9 +9,10 @@
 
 namespace assay_test {
 
-// Lines come without a prefix. Only one at a time; the debug value is 0 again at its end.
+// Lines have no prefix. Make only one at a time. The destructor sets the debug value to 0.
 class CapturedLog : public pmutil::PMLogger {
 public:
+    // Sets `governing`, the debug value of the log statements, to 1.
     explicit CapturedLog(pmutil::DebugValue& governing)
         : PMLogger("CapturedLog"), fGoverning(Started(governing))
     {
@@ -22,7 +23,7 @@ public:
     std::string GetPrefix(const char* /*file*/, int /*line*/) override { return std::string(); }
     void Write(const char* data, std::size_t size) override { fText.append(data, size); }
 
-    // Whether statements log at all.
+    // Enables or disables the log statements.
     void SetOn(bool on) { fGoverning = on ? 1 : 0; }
 
     const std::string& Text() const { return fText; }

@@ -1,5 +1,5 @@
-// An OpenCL that records what it is asked and answers what a test says. One may live at a time;
-// while it does, it is the process's OpenCL.
+// A fake OpenCL that records its calls and returns what a test sets. While one lives, it replaces
+// the process's OpenCL. Make only one at a time.
 #pragma once
 
 #include <algorithm>
@@ -19,15 +19,15 @@
 
 namespace assay_test {
 
-// What a driver answers to the question for one text or value.
+// A driver's result for a query.
 struct CLAnswer {
     std::string bytes;
-    std::optional<std::size_t> claimed; // the size it claims instead of the bytes' own
-    cl_int sizeStatus = CL_SUCCESS;     // of the call that asks for the size only
-    cl_int valueStatus = CL_SUCCESS;    // of the call that asks for the bytes
+    std::optional<std::size_t> claimed; // the reported size; empty: that of `bytes`
+    cl_int sizeStatus = CL_SUCCESS;     // of the call that queries only the size
+    cl_int valueStatus = CL_SUCCESS;    // of the call that queries the bytes
 };
 
-// A C string as OpenCL gives it: with its terminating zero.
+// A text with its terminating zero, as OpenCL returns it.
 inline CLAnswer CLText(const std::string& text)
 {
     return {text + '\0', {}, CL_SUCCESS, CL_SUCCESS};
@@ -53,7 +53,7 @@ struct CLFakePlatform {
     std::map<cl_platform_info, CLAnswer> answers;
     std::vector<CLFakeDevice> devices;
     cl_int devicesStatus = CL_SUCCESS;
-    std::optional<cl_uint> claimedDevices; // the count it claims when only that is asked for
+    std::optional<cl_uint> claimedDevices; // the reported count; empty: that of `devices`
 };
 
 class FakeOpenCL {
@@ -95,28 +95,28 @@ public:
     cl_int platformsStatus = CL_SUCCESS;
     std::optional<cl_uint> claimedPlatforms;
 
-    // Start and end of the event with that number, counted from 1 in the order of their creation.
+    // Returns start and end of an event by its number, counted from 1 in the order of creation.
     std::function<std::pair<cl_ulong, cl_ulong>(int event)> counters = [](int) {
         return std::pair<cl_ulong, cl_ulong>{0, 0};
     };
 
-    // The call with that index in `calls` fails with the status and does nothing else.
+    // The statuses of failing calls, by their index in `calls`. A failing call does nothing else.
     std::map<std::size_t, cl_int> failing;
 
-    // Calls by these names throw a std::runtime_error.
+    // The names of calls that throw a std::runtime_error.
     std::set<std::string> throwing;
 
-    // Each call with its arguments, in order.
+    // The calls with their arguments, in order.
     std::vector<std::string> calls;
 
-    // Objects by kind ("context", "queue", "buffer", "program", "kernel", "event").
+    // The number of objects by kind ("context", "queue", "buffer", "program", "kernel", "event").
     std::map<std::string, int> created;
     std::map<std::string, int> released;
 
-    // What the program was made of, and what the last buffer with content was filled with.
+    // The source text of the program and the content of the last buffer that was made with one.
     std::string source;
     std::vector<float> content;
-    // The bytes of each kernel argument by index.
+    // The bytes of the kernel arguments, by index.
     std::map<cl_uint, std::string> kernelArguments;
 
     static cl_device_id DeviceID(std::uintptr_t id) { return ToHandle<cl_device_id>(id); }
@@ -129,11 +129,11 @@ private:
         return current;
     }
 
-    // Handles are small numbers, so that the record can show them.
+    // Handles are small numbers, which are recorded in the calls; they are never dereferenced.
     template <typename Handle>
     static Handle ToHandle(std::uintptr_t number)
     {
-        return reinterpret_cast<Handle>(number); // NOLINT(performance-no-int-to-ptr): as told above
+        return reinterpret_cast<Handle>(number); // NOLINT(performance-no-int-to-ptr)
     }
     template <typename Handle>
     static std::uintptr_t Number(Handle handle)
@@ -191,7 +191,7 @@ private:
             return CL_INVALID_VALUE;
         const CLAnswer& answer = found->second;
         const cl_int status = value != nullptr ? answer.valueStatus : answer.sizeStatus;
-        // A driver may have written before it fails.
+        // A driver may write the value before it fails.
         if (value != nullptr)
             std::memcpy(value, answer.bytes.data(), std::min(size, answer.bytes.size()));
         if (status != CL_SUCCESS)
@@ -434,7 +434,7 @@ private:
         return status;
     }
 
-    // Zero-filled: a call that nobody expects ends the test.
+    // Unused entries are null, so that an unexpected call crashes.
     QGF::OCL::FunctionTable fTable{};
 };
 

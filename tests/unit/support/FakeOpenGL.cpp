@@ -20,7 +20,7 @@ constexpr std::uint32_t kCompileStatus = 0x8B81;
 constexpr std::uint32_t kLinkStatus = 0x8B82;
 constexpr std::uint32_t kInfoLogLength = 0x8B84;
 
-// The kind of each shader made.
+// The kinds of the shaders, by id.
 std::map<std::uint32_t, std::uint32_t> gShaderKinds;
 
 std::string Hex(std::uint32_t value)
@@ -38,7 +38,8 @@ std::string Dec(T value)
     return text.str();
 }
 
-// Records the call, runs what the test set for it, and gives the device it goes to.
+// Records the call, calls the test's function for it, and returns the device of the current
+// context.
 FakeDevice& Enter(const char* name, const std::vector<std::string>& arguments)
 {
     std::string call = std::string(name) + "(";

@@ -1,5 +1,5 @@
-// An adapter source that a test fills. It records every operation and every release in order, and
-// fails or throws where it is told to.
+// A fake adapter source that a test fills. It records all operations and releases in order, and
+// fails or throws where the test sets it.
 #pragma once
 
 #include <algorithm>
@@ -51,7 +51,7 @@ struct ScriptedProperty {
 
 using ScriptedRow = std::map<std::u16string, ScriptedProperty>;
 
-// A complete row that the system says is well.
+// A complete row with Status "OK".
 inline ScriptedRow MakeRow(const std::u16string& name)
 {
     return {
@@ -88,7 +88,7 @@ inline ScriptedOutput MakeOutput(bool attached)
 struct ScriptedAdapter {
     pmutil::AdapterDescriptor descriptor;
     std::vector<ScriptedOutput> outputs;
-    pmutil::ResultCode result = 0; // of GetDesc, which fills the descriptor all the same
+    pmutil::ResultCode result = 0; // of GetDesc, which fills the descriptor also on failure
 };
 
 // An adapter with one attached display.
@@ -103,12 +103,12 @@ inline ScriptedAdapter MakeAdapter(std::u16string_view description, std::uint32_
     return adapter;
 }
 
-// While it lives it is the adapter source in force.
+// While it lives, it is the current adapter source.
 //
 // Calls are recorded as "Initialize", "Next", "Get Name", "EnumAdapters 0", "GetDesc 0",
 // "EnumOutputs 0 1", "GetDesc 0 1" and so on, releases as "~factory", "~service", "~rows", "~row",
-// "~adapter 0" and "~output 0 1". `results` and `throws` are keyed by such a text, for every call
-// of it, or by the text and "#k" for its k-th call, counted from 1.
+// "~adapter 0" and "~output 0 1". The keys of `results` and `throws` are such texts, for all calls
+// with that text, or a text and "#k" for its k-th call, counted from 1.
 class ScriptedAdapters : public pmutil::AdapterSource {
 public:
     ScriptedAdapters() { pmutil::ReplaceAdapterSource(this); }
@@ -120,10 +120,10 @@ public:
     std::vector<ScriptedAdapter> adapters;
     std::uint64_t physicalMemory = 0;
     bool knowsPhysicalMemory = true;
-    bool givesFactory = true; // else CreateFactory succeeds with none
-    bool givesRows = true;    // else QueryAdapters succeeds with none
-    // Calls, by such a text, that give their object against their result: none with success, one
-    // with a failure.
+    bool returnsFactory = true; // if false, CreateFactory succeeds without a factory
+    bool returnsRows = true;    // if false, QueryAdapters succeeds without rows
+    // The texts of calls whose object doesn't match their result: a success without an object, or a
+    // failure with one.
     std::set<std::string> contrary;
     std::map<std::string, pmutil::ResultCode> results;
     std::map<std::string, std::function<void()>> throws;
@@ -138,7 +138,7 @@ public:
     pmutil::ResultCode CreateFactory(std::unique_ptr<pmutil::AdapterFactory>& factory) override
     {
         const pmutil::ResultCode result = Record("CreateFactory", 0);
-        if (!pmutil::Failed(result) && givesFactory)
+        if (!pmutil::Failed(result) && returnsFactory)
             factory = std::make_unique<Factory>(*this);
         return result;
     }
@@ -156,7 +156,7 @@ public:
         return knowsPhysicalMemory;
     }
 
-    // Puts the call on record and tells how it ends.
+    // Records the call and returns its result, `natural` unless the test has set another.
     pmutil::ResultCode Record(const std::string& call, pmutil::ResultCode natural)
     {
         calls.push_back(call);
@@ -169,14 +169,14 @@ public:
         return natural;
     }
 
-    // Whether the call hands its object out.
-    bool Gives(const std::string& call, pmutil::ResultCode result) const
+    // Returns whether the call returns an object.
+    bool ReturnsObject(const std::string& call, pmutil::ResultCode result) const
     {
         return pmutil::Failed(result) == (contrary.count(call) != 0);
     }
 
 private:
-    // Puts its end on record.
+    // Records its destruction.
     class Tracked {
     public:
         Tracked(ScriptedAdapters& script, std::string name)
@@ -244,7 +244,7 @@ private:
         pmutil::ResultCode QueryAdapters(std::unique_ptr<pmutil::AdapterRows>& enumerator) override
         {
             const pmutil::ResultCode result = Record("QueryAdapters");
-            if (!pmutil::Failed(result) && fTracked.Script().givesRows)
+            if (!pmutil::Failed(result) && fTracked.Script().returnsRows)
                 enumerator = std::make_unique<Rows>(fTracked.Script());
             return result;
         }
@@ -292,7 +292,7 @@ private:
             const bool exists = index < fAdapter.outputs.size();
             const pmutil::ResultCode result =
                 script.Record("EnumOutputs " + place, exists ? 0 : kNoMore);
-            if (script.Gives("EnumOutputs " + place, result) && exists)
+            if (script.ReturnsObject("EnumOutputs " + place, result) && exists)
                 output = std::make_unique<Output>(script, place, fAdapter.outputs[index]);
             return result;
         }
@@ -314,7 +314,7 @@ private:
             const bool exists = index < script.adapters.size();
             const pmutil::ResultCode result =
                 script.Record("EnumAdapters " + place, exists ? 0 : kNoMore);
-            if (script.Gives("EnumAdapters " + place, result) && exists)
+            if (script.ReturnsObject("EnumAdapters " + place, result) && exists)
                 adapter = std::make_unique<ListedAdapter>(script, place, script.adapters[index]);
             return result;
         }
