@@ -1,5 +1,5 @@
-# The scripted OpenCL driver: an installable driver that any OpenCL loader takes. Point the loader to
-# it with OCL_ICD_VENDORS=<build folder>/drivers/opencl.
+# The scripted OpenCL driver, an installable client driver for any OpenCL loader. Select it with
+# OCL_ICD_VENDORS=<build folder>/drivers/opencl.
 add_library(scripted_opencl MODULE scripted_opencl/Model.cpp scripted_opencl/OpenCL.cpp)
 target_link_libraries(scripted_opencl PRIVATE assay_options scripted_common)
 set_target_properties(scripted_opencl PROPERTIES

@@ -1,6 +1,6 @@
-# Drivers for Windows. OpenCL.dll misbehaves as ASSAY_MISBEHAVE says as soon as it is asked for
-# platforms; it has each entry point that the program looks for. planted.dll tells on standard error
-# that it was loaded, under whatever name it lies there.
+# Drivers for Windows. OpenCL.dll has all entry points that the program looks up; each of them
+# misbehaves as ASSAY_MISBEHAVE says. planted.dll prints a line to standard error when it is loaded;
+# tests copy it under the names of other libraries.
 set(table ${CMAKE_SOURCE_DIR}/qgf/include/qgf/OCLFunctionTable.h)
 set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${table})
 file(READ ${table} text)

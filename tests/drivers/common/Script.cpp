@@ -23,12 +23,12 @@ namespace {
 
 constexpr int kBadScript = 125;
 
-[[noreturn]] void Refuse(const std::string& file, int line, const std::string& problem)
+[[noreturn]] void EndWithError(const std::string& file, int line, const std::string& problem)
 {
     std::ostringstream text;
     text << "scripted driver: " << file << ":" << line << ": " << problem << "\n";
     const std::string whole = text.str();
-    // Ends without the host's exit handlers: the run is void.
+    // Don't run the exit handlers: the run is invalid.
     if (::write(STDERR_FILENO, whole.data(), whole.size()) < 0)
         std::_Exit(kBadScript);
     std::_Exit(kBadScript);
@@ -45,7 +45,8 @@ int HexDigit(char c)
     return -1;
 }
 
-// Reads the quoted text that begins behind text[at - 1] and leaves `at` behind its closing quote.
+// Reads the quoted text that begins after the quote at text[at - 1], and sets `at` to the position
+// after its closing quote.
 std::string ReadQuoted(const std::string& text, std::size_t& at, const std::string& file, int line)
 {
     std::string result;
@@ -68,19 +69,19 @@ std::string ReadQuoted(const std::string& text, std::size_t& at, const std::stri
                 const int high = at < text.size() ? HexDigit(text[at]) : -1;
                 const int low = at + 1 < text.size() ? HexDigit(text[at + 1]) : -1;
                 if (high < 0 || low < 0)
-                    Refuse(file, line, "\\x needs two hexadecimal digits");
+                    EndWithError(file, line, "\\x needs two hexadecimal digits");
                 c = static_cast<char>(static_cast<unsigned char>(high * 16 + low));
                 at += 2;
                 break;
             }
             default:
-                Refuse(file, line, "unknown escape in a text");
+                EndWithError(file, line, "unknown escape in a text");
             }
         }
         result += c;
     }
     if (at == text.size())
-        Refuse(file, line, "a text lacks its closing quote");
+        EndWithError(file, line, "a text lacks its closing quote");
     ++at;
     return result;
 }
@@ -106,7 +107,7 @@ std::vector<Word> SplitLine(const std::string& text, const std::string& file, in
     return words;
 }
 
-// False once nobody reads any more.
+// Returns false if a write fails, as after the reader has closed the pipe.
 bool WriteAll(int file, const std::string& text)
 {
     std::size_t done = 0;
@@ -121,7 +122,7 @@ bool WriteAll(int file, const std::string& text)
 
 void Flood(int file, const std::string& line, std::int64_t lines)
 {
-    // Many short lines in one write.
+    // Write many short lines at once.
     constexpr std::size_t kChunk = 65536;
     std::string chunk;
     for (std::int64_t i = 0; i < lines; ++i) {
@@ -182,7 +183,7 @@ std::int64_t Line::TakeNumber(const char* what, const Names& names)
     const Word& word = Take(what);
     const auto value = ToNumber(word.text, names);
     if (!value || word.quoted)
-        Fail("\"" + word.text + "\" is no number or known name; expected " + what);
+        Fail("\"" + word.text + "\" is not a number or a known name; expected " + what);
     return *value;
 }
 
@@ -194,7 +195,7 @@ std::optional<std::string> Line::TakeText(const char* what)
     do {
         std::int64_t count = 1;
         if (TakeIf("repeat"))
-            count = TakeNumber("a count behind repeat");
+            count = TakeNumber("a count after repeat");
         const Word& word = Take(what);
         if (!word.quoted)
             Fail(std::string("expected ") + what + " in quotes, or null");
@@ -206,14 +207,14 @@ std::optional<std::string> Line::TakeText(const char* what)
 
 void Line::Fail(const std::string& problem) const
 {
-    Refuse(fFile, fNumber, problem);
+    EndWithError(fFile, fNumber, problem);
 }
 
 std::vector<Line> ReadScript(const std::string& path)
 {
     std::ifstream in(path, std::ios::binary);
     if (!in)
-        Refuse(path, 0, "can't be read");
+        EndWithError(path, 0, "can't be read");
     std::vector<Line> lines;
     std::string text;
     for (int number = 1; std::getline(in, text); ++number) {
@@ -249,7 +250,7 @@ std::string Quoted(const char* text, std::optional<std::size_t> size)
 
 struct Monitor::Rule {
     std::string name;                                // empty for any call
-    std::vector<std::optional<std::int64_t>> values; // of the leading arguments
+    std::vector<std::optional<std::int64_t>> values; // the leading arguments; nothing matches all
     std::optional<int> device;
     std::uint64_t first = 1;
     std::uint64_t last = UINT64_MAX;
@@ -294,7 +295,7 @@ struct Monitor::Rule {
 
 struct Monitor::State {
     std::mutex mutex;
-    std::vector<std::shared_ptr<Rule>> rules; // never removed: texts of theirs are given away
+    std::vector<std::shared_ptr<Rule>> rules; // never removed: effects point to their texts
     std::uint64_t calls = 0;
     int record = -1;
 };
@@ -311,7 +312,7 @@ void Monitor::RecordTo(const std::string& path)
 {
     const int opened = ::open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0666);
     if (opened < 0)
-        Refuse(path, 0, "can't be opened as a record");
+        EndWithError(path, 0, "can't be opened as a record");
     fState->record = opened;
 }
 
@@ -338,7 +339,7 @@ void Monitor::AddRule(Line& line, const Line::Names& names)
             if (value != "*") {
                 number = ToNumber(value, names);
                 if (!number)
-                    line.Fail("\"" + value + "\" is no number or known name");
+                    line.Fail("\"" + value + "\" is not a number or a known name");
             }
             rule.values.push_back(number);
         }
@@ -376,7 +377,7 @@ void Monitor::AddRule(Line& line, const Line::Names& names)
         rule.text = line.TakeText("the text to print").value_or("");
     } else if (action == "text") {
         rule.kind = Rule::Kind::Text;
-        rule.text = line.TakeText("the text to give").value_or("");
+        rule.text = line.TakeText("the text to return").value_or("");
     } else if (action == "flood") {
         rule.kind = Rule::Kind::Flood;
         rule.number = line.TakeNumber("the number of a file descriptor");
@@ -387,14 +388,14 @@ void Monitor::AddRule(Line& line, const Line::Names& names)
         line.Fail("unknown action \"" + action + "\"");
     }
     if (!line.AtEnd())
-        line.Fail("words are left behind the action");
+        line.Fail("unexpected words after the action");
     rule.file = line.File();
     rule.line = line.Number();
     fState->rules.push_back(std::make_shared<Rule>(std::move(rule)));
 }
 
 Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>& arguments,
-                      Gives gives)
+                      Result result)
 {
     std::vector<std::shared_ptr<const Rule>> due;
     {
@@ -412,9 +413,10 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
                 line << ' ' << argument.text;
             line << '\n';
             const std::string text = line.str();
-            // One write a call, before its effect: a crash leaves this call last.
+            // Write the call in one piece before its effect, so that it is the last one after a
+            // crash.
             if (::write(fState->record, text.data(), text.size()) < 0)
-                Refuse("record", 0, std::strerror(errno));
+                EndWithError("record", 0, std::strerror(errno));
         }
         for (const std::shared_ptr<Rule>& rule : fState->rules) {
             if (rule->Matches(name, device, arguments)) {
@@ -430,9 +432,9 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
         const Rule& rule = *each;
         switch (rule.kind) {
         case Rule::Kind::Crash: {
-            // A page that no process has; not null itself, which sanitizers catch before it faults.
-            volatile std::uintptr_t nowhere = 64;
-            *reinterpret_cast<int*>(nowhere) = 1; // NOLINT(performance-no-int-to-ptr)
+            // The first page is never mapped. Not null, which sanitizers report before the fault.
+            volatile std::uintptr_t unmapped = 64;
+            *reinterpret_cast<int*>(unmapped) = 1; // NOLINT(performance-no-int-to-ptr)
             break;
         }
         case Rule::Kind::Abort:
@@ -470,13 +472,13 @@ Effect Monitor::Enter(const char* name, int device, const std::vector<Argument>&
             effect.returns = rule.number;
             break;
         case Rule::Kind::Claim:
-            if (gives != Gives::Number && gives != Gives::TextAndSize)
-                Refuse(rule.file, rule.line, std::string(name) + " gives no number");
+            if (result != Result::Number && result != Result::TextAndSize)
+                EndWithError(rule.file, rule.line, std::string(name) + " returns no number");
             effect.claim = rule.number;
             break;
         case Rule::Kind::Text:
-            if (gives != Gives::Text && gives != Gives::TextAndSize)
-                Refuse(rule.file, rule.line, std::string(name) + " gives no text");
+            if (result != Result::Text && result != Result::TextAndSize)
+                EndWithError(rule.file, rule.line, std::string(name) + " returns no text");
             effect.text = &rule.text;
             break;
         }

@@ -1,8 +1,8 @@
-// What the scripted drivers share: the lines of a script, the rules ("at ...") in it, and the
-// record of calls. tests/drivers/README.md tells the language.
+// The common parts of the scripted drivers: the lines of a script, its rules ("at ...") and the
+// record of calls. tests/drivers/README.md describes the language.
 //
-// A script that can't be read is a mistake of the test's author: it is told on standard error with
-// file and line, and the process ends with status 125.
+// An error in a script is printed to standard error with file and line, and the process ends with
+// status 125.
 #pragma once
 
 #include <cstdint>
@@ -14,7 +14,7 @@
 
 namespace scripted {
 
-// A word of a script line: bare, or a quoted text with its escapes already resolved.
+// A word of a script line: a bare word, or a quoted text without its escapes.
 struct Word {
     std::string text;
     bool quoted = false;
@@ -28,20 +28,20 @@ public:
     {}
 
     bool AtEnd() const { return fNext == fWords.size(); }
-    // Takes the next word; its absence is an error that names `what`.
+    // Reads the next word. If there is none, the script's error names `what`.
     const Word& Take(const char* what);
-    // Takes the next word if it is this bare one.
+    // Reads the next word if it is this bare word, and returns whether it is.
     bool TakeIf(const char* bare);
-    // Takes a number: decimal, hexadecimal with 0x, or a name that `names` knows.
+    // Reads a number: decimal, hexadecimal with 0x, or a name that `names` resolves.
     using Names = std::function<std::optional<std::int64_t>(const std::string&)>;
     std::int64_t TakeNumber(const char* what, const Names& names = {});
-    // Takes a text: "...", or `repeat N "..."`, or several of them joined by +. `null` gives
-    // nothing.
+    // Reads a text: "...", or `repeat N "..."`, or several of them joined by +. Returns nothing for
+    // `null`.
     std::optional<std::string> TakeText(const char* what);
-    // Where the line stands.
+    // The line's position.
     const std::string& File() const { return fFile; }
     int Number() const { return fNumber; }
-    // Ends the process with `problem`.
+    // Ends the process with an error in this line.
     [[noreturn]] void Fail(const std::string& problem) const;
 
 private:
@@ -51,28 +51,27 @@ private:
     std::size_t fNext = 0;
 };
 
-// All lines of a file that hold a word; comments are gone.
+// Returns the lines of a file without comments and empty lines.
 std::vector<Line> ReadScript(const std::string& path);
 
-// An argument of a call, as the record shows it and as a rule matches it.
+// An argument of a call: its text in the record, and the number that rules compare.
 struct Argument {
     std::string text;
     std::optional<std::int64_t> number;
 };
 
-// What an "at" line does to the calls that it matches. Crashes, exits, throws and the like are done
-// by Enter itself and never reach the driver's entry point.
+// The effect of rules on a call. Enter itself performs crashes, exits, exceptions and the like.
 struct Effect {
     std::optional<std::int64_t> error;   // the call fails with this error code
-    std::optional<std::int64_t> returns; // the call gives this and does nothing else
-    std::optional<std::int64_t> claim;   // the number or size that the call tells
-    const std::string* text = nullptr;   // the text that the call gives; stays
+    std::optional<std::int64_t> returns; // the call returns this and does nothing else
+    std::optional<std::int64_t> claim;   // the number or size that the call reports
+    const std::string* text = nullptr;   // the text that the call returns; never freed
 };
 
-// What a caller gets from a call, as far as rules change it.
-enum class Gives { Neither, Number, Text, TextAndSize };
+// The kind of a call's result, as far as rules can replace it.
+enum class Result { Other, Number, Text, TextAndSize };
 
-// The rules of a script, the counters of calls that they go by, and the record. Thread-safe.
+// The rules of a script with their counters of calls, and the record. Thread-safe.
 class Monitor {
 public:
     Monitor();
@@ -80,16 +79,16 @@ public:
     Monitor(const Monitor&) = delete;
     Monitor& operator=(const Monitor&) = delete;
 
-    // Takes the rest of an "at" line.
+    // Adds the rule of an "at" line.
     void AddRule(Line& line, const Line::Names& names);
-    // From now on appends each call to that file.
+    // Appends the following calls to that file.
     void RecordTo(const std::string& path);
 
-    // An entry point was called, on that device (negative if it concerns none). Does to the process
-    // what the rules say, or throws what they say; else gives what is left to do. A rule with a
-    // `claim` or a `text` for a call that gives none is a mistake of the script.
+    // Records a call of an entry point on a device (negative for none) and applies the rules: ends
+    // or blocks the process, throws, or returns the effect that the caller has to perform. A rule
+    // with a `claim` or a `text` for a call with another kind of result is an error in the script.
     Effect Enter(const char* name, int device, const std::vector<Argument>& arguments,
-                 Gives gives = Gives::Neither);
+                 Result result = Result::Other);
 
 private:
     struct Rule;
@@ -97,7 +96,7 @@ private:
     std::unique_ptr<State> fState;
 };
 
-// Quotes and escapes a text for the record: one line whatever it holds, "null" for null.
+// Quotes and escapes a text for the record, so that it is on one line; "null" for null.
 std::string Quoted(const char* text, std::optional<std::size_t> size = {});
 
 } // namespace scripted

@@ -1,5 +1,5 @@
-// Every entry point of the library: misbehaves in the program that calls it, as ASSAY_MISBEHAVE
-// says, else fails.
+// The function of all entry points of the library: misbehaves as ASSAY_MISBEHAVE says, else returns
+// CL_OUT_OF_HOST_MEMORY.
 #include <cstdlib>
 
 #include "win/Misbehave.h"

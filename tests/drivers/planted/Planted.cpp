@@ -1,5 +1,5 @@
-// Says that it was loaded. No driver: whoever loads it took a file from a place that anyone may
-// write to.
+// Prints a line when it is loaded. A program that loads it has loaded a library from a folder that
+// anyone may write to.
 #include <windows.h>
 
 extern "C" BOOL WINAPI DllMain(HINSTANCE /*module*/, DWORD reason, void* /*reserved*/)

@@ -1,4 +1,4 @@
-// What the two halves of the scripted driver share.
+// The common parts of the driver's EGL and OpenGL halves.
 #pragma once
 
 #include <deque>
@@ -14,7 +14,7 @@
 
 namespace scripted {
 
-// The objects of one OpenGL context, as far as the driver keeps track of them.
+// The objects of an OpenGL context.
 struct GLState {
     struct Shader {
         std::uint32_t kind = 0;
@@ -53,14 +53,14 @@ struct SurfaceObject {
     int number = 0;
 };
 
-// The calling thread's context; null if there is none.
+// Returns the calling thread's context; null if there is none.
 ContextObject* CurrentContext();
 
-// The OpenGL entry point of that name; null if there is none.
+// Returns the OpenGL entry point of that name; null if there is none.
 using Entry = __eglMustCastToProperFunctionPointerType;
 Entry FindGL(const std::string& name);
 
-// Arguments as the record shows them.
+// Arguments for the record.
 inline Argument Enum(std::uint32_t value)
 {
     static const char kDigits[] = "0123456789ABCDEF";

@@ -16,21 +16,21 @@ thread_local EGLSurface tSurface = nullptr;
 thread_local EGLint tError = EGL_SUCCESS;
 thread_local EGLenum tAPI = EGL_OPENGL_ES_API;
 
-// All objects ever made: handles stay comparable, and numbers in the record tell one from another.
+// All objects that were made. They are never freed, so that handles and numbers stay unique.
 struct Objects {
     std::mutex mutex;
     std::vector<std::unique_ptr<DisplayObject>> displays; // one per device
     std::vector<std::unique_ptr<ContextObject>> contexts;
     std::vector<std::unique_ptr<SurfaceObject>> surfaces;
     std::vector<const ContextObject*> deadContexts;
-    char config = 0; // its address is the only configuration
+    char config = 0; // its address is the handle of the only configuration
 };
 
-Objects& TheObjects()
+Objects& GetObjects()
 {
     static Objects* const kObjects = [] {
         auto* objects = new Objects;
-        for (std::size_t i = 0; i < TheModel().devices.size(); ++i) {
+        for (std::size_t i = 0; i < GetModel().devices.size(); ++i) {
             objects->displays.push_back(std::make_unique<DisplayObject>());
             objects->displays.back()->device = static_cast<int>(i);
         }
@@ -39,10 +39,10 @@ Objects& TheObjects()
     return *kObjects;
 }
 
-// The device handles are the addresses of the model's devices.
+// A device handle is the address of the model's device.
 int DeviceOf(const void* handle)
 {
-    const std::vector<Device>& devices = TheModel().devices;
+    const std::vector<Device>& devices = GetModel().devices;
     for (std::size_t i = 0; i < devices.size(); ++i)
         if (&devices[i] == handle)
             return static_cast<int>(i);
@@ -59,12 +59,12 @@ T* Find(std::vector<std::unique_ptr<T>>& all, const void* handle)
 
 DisplayObject* DisplayOf(EGLDisplay handle)
 {
-    return Find(TheObjects().displays, handle);
+    return Find(GetObjects().displays, handle);
 }
 
 ContextObject* ContextOf(EGLContext handle)
 {
-    Objects& objects = TheObjects();
+    Objects& objects = GetObjects();
     ContextObject* context = Find(objects.contexts, handle);
     const auto dead = std::find(objects.deadContexts.begin(), objects.deadContexts.end(), context);
     return dead == objects.deadContexts.end() ? context : nullptr;
@@ -92,12 +92,12 @@ Argument DeviceArgument(const void* handle)
 }
 Argument ContextArgument(EGLContext handle)
 {
-    const ContextObject* context = Find(TheObjects().contexts, handle);
+    const ContextObject* context = Find(GetObjects().contexts, handle);
     return Named("context", context == nullptr ? 0 : context->number, context != nullptr);
 }
 Argument SurfaceArgument(EGLSurface handle)
 {
-    const SurfaceObject* surface = Find(TheObjects().surfaces, handle);
+    const SurfaceObject* surface = Find(GetObjects().surfaces, handle);
     return Named("surface", surface == nullptr ? 0 : surface->number, surface != nullptr);
 }
 
@@ -116,24 +116,24 @@ Argument AttributesArgument(const T* attributes)
     return {text + "]", {}};
 }
 
-// A call's rules, and its success as EGL counts it.
+// A call with the effect of the rules, and EGL's error state.
 struct Call {
     Effect effect;
 
     Call(const char* name, int device, const std::vector<Argument>& arguments,
-         Gives gives = Gives::Neither)
-        : effect(TheModel().monitor.Enter(name, device, arguments, gives))
+         Result result = Result::Other)
+        : effect(GetModel().monitor.Enter(name, device, arguments, result))
     {
         if (effect.claim)
             effect.returns = effect.claim;
-        // The error stays as it is while it is asked for.
+        // eglGetError must not reset the error before it returns it.
         if (std::strcmp(name, "eglGetError") != 0)
             tError = EGL_SUCCESS;
         if (effect.error)
             tError = static_cast<EGLint>(*effect.error);
     }
     bool Over() const { return effect.error || effect.returns || effect.text != nullptr; }
-    // The text of a call that is over.
+    // The text that the rules return; null for none.
     const char* Text() const { return effect.text != nullptr ? effect.text->c_str() : nullptr; }
     EGLBoolean Answer() const
     {
@@ -159,14 +159,14 @@ const char* TextOf(const Texts& texts, std::int64_t name, EGLint errorIfUnknown)
 
 DisplayObject* DefaultDisplay()
 {
-    const auto index = static_cast<std::size_t>(TheModel().defaultDevice);
-    std::vector<std::unique_ptr<DisplayObject>>& displays = TheObjects().displays;
+    const auto index = static_cast<std::size_t>(GetModel().defaultDevice);
+    std::vector<std::unique_ptr<DisplayObject>>& displays = GetObjects().displays;
     return index < displays.size() ? displays[index].get() : nullptr;
 }
 
 bool OffersClient(const char* extension)
 {
-    return HoldsWord(TheModel().clientExtensions.value_or(""), extension);
+    return HoldsWord(GetModel().clientExtensions.value_or(""), extension);
 }
 
 EGLDisplay PlatformDisplay(const Call& call, EGLenum platform, void* native)
@@ -176,7 +176,7 @@ EGLDisplay PlatformDisplay(const Call& call, EGLenum platform, void* native)
     if (platform == EGL_PLATFORM_DEVICE_EXT && OffersClient("EGL_EXT_platform_device")) {
         const int device = DeviceOf(native);
         if (device >= 0)
-            return TheObjects().displays[static_cast<std::size_t>(device)].get();
+            return GetObjects().displays[static_cast<std::size_t>(device)].get();
     } else if (platform == EGL_PLATFORM_SURFACELESS_MESA &&
                OffersClient("EGL_MESA_platform_surfaceless")) {
         return DefaultDisplay();
@@ -185,7 +185,7 @@ EGLDisplay PlatformDisplay(const Call& call, EGLenum platform, void* native)
     return nullptr;
 }
 
-// Gives the display if it is one and is initialized.
+// Returns the display if the handle is valid and the display is initialized, else null.
 const DisplayObject* Ready(EGLDisplay handle)
 {
     const DisplayObject* display = DisplayOf(handle);
@@ -200,23 +200,23 @@ const DisplayObject* Ready(EGLDisplay handle)
 
 bool OffersDisplay(const DisplayObject& display, const char* extension)
 {
-    const Device& device = TheModel().devices[static_cast<std::size_t>(display.device)];
+    const Device& device = GetModel().devices[static_cast<std::size_t>(display.device)];
     const auto list = device.displayTexts.find(EGL_EXTENSIONS);
     return list != device.displayTexts.end() && HoldsWord(list->second.value_or(""), extension);
 }
 
 EGLBoolean QueryDevices(EGLint size, EGLDeviceEXT* devices, EGLint* count)
 {
-    const Call call("eglQueryDevicesEXT", -1, {Number(size)}, Gives::Number);
+    const Call call("eglQueryDevicesEXT", -1, {Number(size)}, Result::Number);
     if (call.Over()) {
-        // `return N` claims N devices.
+        // `return N` reports N devices.
         if (call.effect.returns && count != nullptr)
             *count = static_cast<EGLint>(*call.effect.returns);
         return call.effect.error ? EGL_FALSE : EGL_TRUE;
     }
     if (count == nullptr || (devices != nullptr && size <= 0))
         return Fail(EGL_BAD_PARAMETER);
-    std::vector<Device>& all = TheModel().devices;
+    std::vector<Device>& all = GetModel().devices;
     *count = static_cast<EGLint>(all.size());
     if (devices != nullptr) {
         *count = std::min(*count, size);
@@ -230,14 +230,14 @@ const char* QueryDeviceString(EGLDeviceEXT handle, EGLint name)
 {
     const int device = DeviceOf(handle);
     const Call call("eglQueryDeviceStringEXT", device,
-                    {DeviceArgument(handle), Enum(static_cast<std::uint32_t>(name))}, Gives::Text);
+                    {DeviceArgument(handle), Enum(static_cast<std::uint32_t>(name))}, Result::Text);
     if (call.Over())
         return call.Text();
     if (device < 0) {
         Fail(EGL_BAD_DEVICE_EXT);
         return nullptr;
     }
-    return TextOf(TheModel().devices[static_cast<std::size_t>(device)].deviceTexts, name,
+    return TextOf(GetModel().devices[static_cast<std::size_t>(device)].deviceTexts, name,
                   EGL_BAD_PARAMETER);
 }
 
@@ -259,9 +259,9 @@ EGLBoolean QueryDisplayAttribute(EGLDisplay handle, EGLint attribute, EGLAttrib*
         return EGL_FALSE;
     if (attribute != EGL_DEVICE_EXT)
         return Fail(EGL_BAD_ATTRIBUTE);
-    // The handle as EGL hands it out, in an integer.
+    // The handle as an integer.
     *value =
-        reinterpret_cast<EGLAttrib>(&TheModel().devices[static_cast<std::size_t>(display->device)]);
+        reinterpret_cast<EGLAttrib>(&GetModel().devices[static_cast<std::size_t>(display->device)]);
     return EGL_TRUE;
 }
 
@@ -296,12 +296,13 @@ EGLAPI EGLint EGLAPIENTRY eglGetError(void)
 EGLAPI const char* EGLAPIENTRY eglQueryString(EGLDisplay handle, EGLint name)
 {
     const Call call("eglQueryString", DeviceOfDisplay(handle),
-                    {DisplayArgument(handle), Enum(static_cast<std::uint32_t>(name))}, Gives::Text);
+                    {DisplayArgument(handle), Enum(static_cast<std::uint32_t>(name))},
+                    Result::Text);
     if (call.Over())
         return call.Text();
     if (handle == EGL_NO_DISPLAY) {
-        if (name == EGL_EXTENSIONS && TheModel().clientExtensions)
-            return TheModel().clientExtensions->c_str();
+        if (name == EGL_EXTENSIONS && GetModel().clientExtensions)
+            return GetModel().clientExtensions->c_str();
         if (name == EGL_VERSION)
             return "1.5 Scripted";
         Fail(EGL_BAD_DISPLAY);
@@ -310,7 +311,7 @@ EGLAPI const char* EGLAPIENTRY eglQueryString(EGLDisplay handle, EGLint name)
     const DisplayObject* display = Ready(handle);
     if (display == nullptr)
         return nullptr;
-    return TextOf(TheModel().devices[static_cast<std::size_t>(display->device)].displayTexts, name,
+    return TextOf(GetModel().devices[static_cast<std::size_t>(display->device)].displayTexts, name,
                   EGL_BAD_PARAMETER);
 }
 
@@ -338,9 +339,9 @@ EGLAPI EGLBoolean EGLAPIENTRY eglInitialize(EGLDisplay handle, EGLint* major, EG
         return Fail(EGL_BAD_DISPLAY);
     display->initialized = true;
     if (major != nullptr)
-        *major = TheModel().eglMajor;
+        *major = GetModel().eglMajor;
     if (minor != nullptr)
-        *minor = TheModel().eglMinor;
+        *minor = GetModel().eglMinor;
     return EGL_TRUE;
 }
 
@@ -384,7 +385,7 @@ EGLAPI EGLBoolean EGLAPIENTRY eglGetConfigs(EGLDisplay handle, EGLConfig* config
         return EGL_FALSE;
     *count = 1;
     if (configs != nullptr && size > 0)
-        configs[0] = &TheObjects().config;
+        configs[0] = &GetObjects().config;
     return EGL_TRUE;
 }
 
@@ -393,9 +394,9 @@ EGLAPI EGLBoolean EGLAPIENTRY eglChooseConfig(EGLDisplay handle, const EGLint* a
 {
     const Call call("eglChooseConfig", DeviceOfDisplay(handle),
                     {DisplayArgument(handle), AttributesArgument(attributes), Number(size)},
-                    Gives::Number);
+                    Result::Number);
     if (call.Over()) {
-        // `return N` claims N configurations and gives none.
+        // `return N` reports N configurations and returns none.
         if (call.effect.returns && count != nullptr)
             *count = static_cast<EGLint>(*call.effect.returns);
         return call.effect.error ? EGL_FALSE : EGL_TRUE;
@@ -404,7 +405,7 @@ EGLAPI EGLBoolean EGLAPIENTRY eglChooseConfig(EGLDisplay handle, const EGLint* a
         return EGL_FALSE;
     *count = 1;
     if (configs != nullptr && size > 0)
-        configs[0] = &TheObjects().config;
+        configs[0] = &GetObjects().config;
     return EGL_TRUE;
 }
 
@@ -453,7 +454,7 @@ EGLAPI EGLContext EGLAPIENTRY eglCreateContext(EGLDisplay handle, EGLConfig conf
         Fail(EGL_BAD_MATCH);
         return EGL_NO_CONTEXT;
     }
-    Objects& objects = TheObjects();
+    Objects& objects = GetObjects();
     const std::lock_guard<std::mutex> lock(objects.mutex);
     objects.contexts.push_back(std::make_unique<ContextObject>());
     objects.contexts.back()->device = display->device;
@@ -470,7 +471,7 @@ EGLAPI EGLBoolean EGLAPIENTRY eglDestroyContext(EGLDisplay handle, EGLContext co
     const ContextObject* object = ContextOf(context);
     if (object == nullptr)
         return Fail(EGL_BAD_CONTEXT);
-    Objects& objects = TheObjects();
+    Objects& objects = GetObjects();
     const std::lock_guard<std::mutex> lock(objects.mutex);
     objects.deadContexts.push_back(object);
     return EGL_TRUE;
@@ -484,7 +485,7 @@ EGLAPI EGLSurface EGLAPIENTRY eglCreatePbufferSurface(EGLDisplay handle, EGLConf
     const DisplayObject* display = call.Over() ? nullptr : Ready(handle);
     if (display == nullptr)
         return EGL_NO_SURFACE;
-    Objects& objects = TheObjects();
+    Objects& objects = GetObjects();
     const std::lock_guard<std::mutex> lock(objects.mutex);
     objects.surfaces.push_back(std::make_unique<SurfaceObject>());
     objects.surfaces.back()->device = display->device;
@@ -498,7 +499,7 @@ EGLAPI EGLBoolean EGLAPIENTRY eglDestroySurface(EGLDisplay handle, EGLSurface su
                     {DisplayArgument(handle), SurfaceArgument(surface)});
     if (call.Over())
         return call.Answer();
-    return Find(TheObjects().surfaces, surface) == nullptr ? Fail(EGL_BAD_SURFACE) : EGL_TRUE;
+    return Find(GetObjects().surfaces, surface) == nullptr ? Fail(EGL_BAD_SURFACE) : EGL_TRUE;
 }
 
 EGLAPI EGLBoolean EGLAPIENTRY eglMakeCurrent(EGLDisplay handle, EGLSurface draw, EGLSurface read,
@@ -562,7 +563,7 @@ EGLAPI EGLBoolean EGLAPIENTRY eglReleaseThread(void)
 EGLAPI __eglMustCastToProperFunctionPointerType EGLAPIENTRY eglGetProcAddress(const char* name)
 {
     const Call call("eglGetProcAddress", tContext == nullptr ? -1 : tContext->device, {Text(name)});
-    const std::vector<std::string>& absent = TheModel().absent;
+    const std::vector<std::string>& absent = GetModel().absent;
     if (call.Over() || std::find(absent.begin(), absent.end(), name) != absent.end())
         return nullptr;
     static const std::map<std::string, Entry> kEntries = {

@@ -1,4 +1,4 @@
-// The OpenGL half: what a context is asked, and the objects made in it.
+// The OpenGL half: the queries and objects of a context.
 #include <algorithm>
 #include <cstdio>
 #include <cstring>
@@ -15,18 +15,18 @@ namespace {
 
 Device& DeviceOfContext(const ContextObject& context)
 {
-    return TheModel().devices[static_cast<std::size_t>(context.device)];
+    return GetModel().devices[static_cast<std::size_t>(context.device)];
 }
 
-// A call in the current context, its rules applied. Without a context there is nothing that a
-// driver could do, and an error of the script ends the call like one of the driver's own.
+// A call in the current context with the effect of the rules. A call without a context does
+// nothing.
 struct Call {
     ContextObject* context = CurrentContext();
     Effect effect;
 
-    Call(const char* name, const std::vector<Argument>& arguments, Gives gives = Gives::Neither)
-        : effect(TheModel().monitor.Enter(name, context == nullptr ? -1 : context->device,
-                                          arguments, gives))
+    Call(const char* name, const std::vector<Argument>& arguments, Result result = Result::Other)
+        : effect(GetModel().monitor.Enter(name, context == nullptr ? -1 : context->device,
+                                          arguments, result))
     {
         if (effect.claim)
             effect.returns = effect.claim;
@@ -37,7 +37,7 @@ struct Call {
     {
         return context == nullptr || effect.error || effect.returns || effect.text != nullptr;
     }
-    // The text of a call that is over.
+    // The text that the rules return; null for none.
     const GLubyte* Text() const
     {
         return effect.text != nullptr ? reinterpret_cast<const GLubyte*>(effect.text->c_str())
@@ -72,7 +72,7 @@ const GLubyte* AsBytes(const char* text)
 
 const GLubyte* GetString(GLenum name)
 {
-    const Call call("glGetString", {Enum(name)}, Gives::Text);
+    const Call call("glGetString", {Enum(name)}, Result::Text);
     if (call.Over())
         return call.Text();
     const Texts& texts = call.Model().glTexts;
@@ -86,14 +86,14 @@ const GLubyte* GetString(GLenum name)
 
 const GLubyte* GetStringi(GLenum name, GLuint index)
 {
-    const Call call("glGetStringi", {Enum(name), Number(index)}, Gives::Text);
+    const Call call("glGetStringi", {Enum(name), Number(index)}, Result::Text);
     if (call.Over())
         return call.Text();
     if (name != GL_EXTENSIONS) {
         call.Error(GL_INVALID_ENUM);
         return nullptr;
     }
-    // Kept for the life of the process, as the caller may expect.
+    // Never freed: the caller may keep the pointer.
     static auto* const kNames = new std::map<const Device*, std::vector<std::string>>;
     std::vector<std::string>& names = (*kNames)[&call.Model()];
     if (names.empty())
@@ -107,7 +107,7 @@ const GLubyte* GetStringi(GLenum name, GLuint index)
 
 GLenum GetError()
 {
-    const Call call("glGetError", {}, Gives::Number);
+    const Call call("glGetError", {}, Result::Number);
     if (call.effect.returns)
         return static_cast<GLenum>(*call.effect.returns);
     if (call.context == nullptr || call.GL().errors.empty())
@@ -117,7 +117,7 @@ GLenum GetError()
     return error;
 }
 
-// The version that the device's GL_VERSION begins with; 0.0 if it begins with none.
+// Parses the version at the start of the device's GL_VERSION; 0.0 if there is none.
 std::pair<GLint, GLint> Version(const Device& device)
 {
     int major = 0;
@@ -131,7 +131,7 @@ std::pair<GLint, GLint> Version(const Device& device)
 
 void GetIntegerv(GLenum name, GLint* result)
 {
-    const Call call("glGetIntegerv", {Enum(name)}, Gives::Number);
+    const Call call("glGetIntegerv", {Enum(name)}, Result::Number);
     if (call.Over()) {
         if (call.effect.returns)
             *result = static_cast<GLint>(call.Answer());
@@ -153,7 +153,7 @@ void GetIntegerv(GLenum name, GLint* result)
 
 void GetProgramivARB(GLenum target, GLenum name, GLint* result)
 {
-    const Call call("glGetProgramivARB", {Enum(target), Enum(name)}, Gives::Number);
+    const Call call("glGetProgramivARB", {Enum(target), Enum(name)}, Result::Number);
     if (call.Over()) {
         if (call.effect.returns)
             *result = static_cast<GLint>(call.Answer());
@@ -200,7 +200,7 @@ void Clear(GLbitfield mask)
 
 GLuint CreateShader(GLenum kind)
 {
-    const Call call("glCreateShader", {Enum(kind)}, Gives::Number);
+    const Call call("glCreateShader", {Enum(kind)}, Result::Number);
     if (call.Over())
         return static_cast<GLuint>(call.Answer());
     if (kind != GL_VERTEX_SHADER && kind != GL_FRAGMENT_SHADER) {
@@ -260,7 +260,7 @@ void CompileShader(GLuint shader)
     object->log = log.value_or("");
 }
 
-// What the queries of a shader's or a program's log answer.
+// The length of a log, with the terminating zero; 0 for an empty log.
 GLint LogLength(const std::string& log)
 {
     return log.empty() ? 0 : static_cast<GLint>(log.size() + 1);
@@ -280,7 +280,7 @@ void CopyLog(const std::string& log, GLsizei size, GLsizei* length, GLchar* text
 
 void GetShaderiv(GLuint shader, GLenum name, GLint* result)
 {
-    const Call call("glGetShaderiv", {Number(shader), Enum(name)}, Gives::Number);
+    const Call call("glGetShaderiv", {Number(shader), Enum(name)}, Result::Number);
     if (call.effect.returns)
         *result = static_cast<GLint>(call.Answer());
     const GLState::Shader* object = call.Over() ? nullptr : ShaderOf(call, shader);
@@ -312,14 +312,14 @@ void GetShaderInfoLog(GLuint shader, GLsizei size, GLsizei* length, GLchar* text
 void DeleteShader(GLuint shader)
 {
     const Call call("glDeleteShader", {Number(shader)});
-    // A shader that is attached lives on until its program goes; nothing asks for it any more.
+    // An attached shader would live until its program is deleted; no call uses it until then.
     if (!call.Over() && shader != 0)
         ShaderOf(call, shader);
 }
 
 GLuint CreateProgram()
 {
-    const Call call("glCreateProgram", {}, Gives::Number);
+    const Call call("glCreateProgram", {}, Result::Number);
     if (call.Over())
         return static_cast<GLuint>(call.Answer());
     const GLuint id = call.GL().nextID++;
@@ -351,7 +351,7 @@ void LinkProgram(GLuint program)
 
 void GetProgramiv(GLuint program, GLenum name, GLint* result)
 {
-    const Call call("glGetProgramiv", {Number(program), Enum(name)}, Gives::Number);
+    const Call call("glGetProgramiv", {Number(program), Enum(name)}, Result::Number);
     if (call.effect.returns)
         *result = static_cast<GLint>(call.Answer());
     const GLState::Program* object = call.Over() ? nullptr : ProgramOf(call, program);
@@ -386,7 +386,7 @@ void DeleteProgram(GLuint program)
 
 void GenTextures(GLsizei count, GLuint* ids)
 {
-    const Call call("glGenTextures", {Number(count)}, Gives::Number);
+    const Call call("glGenTextures", {Number(count)}, Result::Number);
     for (GLsizei i = 0; i < count; ++i) {
         ids[i] = call.Over() ? static_cast<GLuint>(call.Answer()) : call.GL().nextID++;
         if (!call.Over())
@@ -450,7 +450,7 @@ void DeleteTextures(GLsizei count, const GLuint* ids)
 
 void GenFramebuffers(GLsizei count, GLuint* ids)
 {
-    const Call call("glGenFramebuffers", {Number(count)}, Gives::Number);
+    const Call call("glGenFramebuffers", {Number(count)}, Result::Number);
     for (GLsizei i = 0; i < count; ++i) {
         ids[i] = call.Over() ? static_cast<GLuint>(call.Answer()) : call.GL().nextID++;
         if (!call.Over())
@@ -486,7 +486,7 @@ void FramebufferTexture2D(GLenum target, GLenum attachment, GLenum textureTarget
 
 GLenum CheckFramebufferStatus(GLenum target)
 {
-    const Call call("glCheckFramebufferStatus", {Enum(target)}, Gives::Number);
+    const Call call("glCheckFramebufferStatus", {Enum(target)}, Result::Number);
     return call.Over() ? static_cast<GLenum>(call.Answer()) : FramebufferStatus(call.GL());
 }
 

@@ -104,7 +104,7 @@ std::vector<std::int32_t> TakeIntegers(Line& line)
     return values;
 }
 
-// Lines that stand before the first `device`, or anywhere.
+// Reads a directive for the whole driver. Returns false for others.
 bool ReadGlobal(Model& model, const std::string& verb, Line& line)
 {
     if (verb == "record") {
@@ -200,9 +200,9 @@ void ReadModel(Model& model)
 
 } // namespace
 
-Model& TheModel()
+Model& GetModel()
 {
-    // Never freed: the host may call into the driver from its own exit handlers.
+    // Never freed: the driver may be called from exit handlers.
     static Model* const kModel = [] {
         auto* model = new Model;
         ReadModel(*model);

@@ -1,6 +1,5 @@
-// The devices that a script describes, as the EGL and the OpenGL half of the scripted driver see
-// them. Read once, at the driver's first call, from the file that ASSAY_SCRIPTED_EGL names; without
-// that there is one device with the defaults.
+// The devices that a script describes, for the driver's EGL and OpenGL halves. The driver's first
+// call reads the file that ASSAY_SCRIPTED_EGL names; without it there is one default device.
 #pragma once
 
 #include <cstdint>
@@ -13,13 +12,13 @@
 
 namespace scripted {
 
-// A text by its EGL or OpenGL name; an entry without a text stands for a null pointer.
+// Texts by EGL or OpenGL name; nullopt stands for a null pointer.
 using Texts = std::map<std::int64_t, std::optional<std::string>>;
 
 struct Device {
     Texts deviceTexts;  // eglQueryDeviceStringEXT
     Texts displayTexts; // eglQueryString
-    Texts glTexts;      // glGetString; GL_EXTENSIONS is also what glGetStringi indexes
+    Texts glTexts;      // glGetString; glGetStringi splits GL_EXTENSIONS
     std::map<std::int64_t, std::vector<std::int32_t>> integers;      // glGetIntegerv
     std::map<std::int64_t, std::vector<std::int32_t>> programLimits; // glGetProgramivARB
     std::optional<std::string> vertexLog;   // set: the vertex shader doesn't compile
@@ -33,16 +32,16 @@ struct Model {
     std::int32_t eglMajor = 1;
     std::int32_t eglMinor = 5;
     std::vector<Device> devices;
-    std::vector<std::string> absent; // entry points that the driver hasn't got
+    std::vector<std::string> absent; // entry points that the driver lacks
     Monitor monitor;
 };
 
-Model& TheModel();
+Model& GetModel();
 
-// The number of an EGL or OpenGL name that scripts may use in the place of a number.
+// Returns the number of an EGL or OpenGL name that scripts may use instead of a number.
 std::optional<std::int64_t> NumberOf(const std::string& name);
 
-// True if the blank-separated list holds the word.
+// Returns whether the blank-separated list has the word.
 bool HoldsWord(const std::string& list, const std::string& word);
 
 } // namespace scripted

@@ -1,4 +1,4 @@
-// What OpenCL's handles point to. The loader finds the entry points by the first member.
+// The objects of OpenCL handles. The loader finds the entry points by the first member.
 #pragma once
 
 #include <cstdint>
@@ -15,10 +15,10 @@
 
 namespace scripted {
 
-const cl_icd_dispatch* TheDispatch();
+const cl_icd_dispatch* GetDispatch();
 
 struct Handle {
-    const cl_icd_dispatch* dispatch = TheDispatch();
+    const cl_icd_dispatch* dispatch = GetDispatch();
     int number = 0; // counted by kind, in the order of creation
     int device = -1;
 };

@@ -107,7 +107,7 @@ const std::map<std::string, std::int64_t> kNames = {
 
 #undef SCRIPTED_NAME
 
-// A C string as OpenCL gives it.
+// A text with its terminating zero.
 Answer Terminated(const std::string& text)
 {
     return {text + '\0', {}};
@@ -173,8 +173,8 @@ std::vector<std::int64_t> TakeNumbers(Line& line, const char* what)
     return numbers;
 }
 
-// Takes a line that answers a question, of the device or platform that was named last.
-bool TakeAnswer(const std::string& directive, Line& line, Answers& answers)
+// Reads a property of the last device or platform. Returns false for other directives.
+bool ReadAnswer(const std::string& directive, Line& line, Answers& answers)
 {
     const bool isText = directive == "text" || directive == "bytes";
     if (!isText && directive != "uint" && directive != "ulong" && directive != "claim" &&
@@ -196,7 +196,7 @@ bool TakeAnswer(const std::string& directive, Line& line, Answers& answers)
     return true;
 }
 
-bool TakeDeviceLine(const std::string& directive, Line& line, Device& device)
+bool ReadDeviceLine(const std::string& directive, Line& line, Device& device)
 {
     if (directive == "copy-ns")
         device.copyNanoseconds = TakeNumbers(line, "nanoseconds");
@@ -207,7 +207,7 @@ bool TakeDeviceLine(const std::string& directive, Line& line, Device& device)
     else if (directive == "real-time")
         device.realTime = true;
     else
-        return TakeAnswer(directive, line, device.answers);
+        return ReadAnswer(directive, line, device.answers);
     return true;
 }
 
@@ -238,19 +238,19 @@ void ReadModel(Model& model, const std::string& path)
             device->type = TakeType(line);
         } else if (device == nullptr && answers == nullptr) {
             line.Fail("\"" + directive + "\" before the first platform or device");
-        } else if (device != nullptr ? !TakeDeviceLine(directive, line, *device)
-                                     : !TakeAnswer(directive, line, *answers)) {
+        } else if (device != nullptr ? !ReadDeviceLine(directive, line, *device)
+                                     : !ReadAnswer(directive, line, *answers)) {
             line.Fail("unknown directive \"" + directive + "\"");
         }
         if (!line.AtEnd())
-            line.Fail("words are left at the end");
+            line.Fail("unexpected words at the end");
     }
 }
 
 Model* MakeModel()
 {
-    auto* const model = new Model; // the process keeps it to its end
-    // NOLINTNEXTLINE(concurrency-mt-unsafe): nobody changes the variables of a process under test
+    auto* const model = new Model; // never freed: the driver may be called from exit handlers
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): the program under test doesn't change its environment
     if (const char* const path = std::getenv("ASSAY_SCRIPTED_OPENCL"); path != nullptr && *path)
         ReadModel(*model, path);
     else
@@ -260,7 +260,7 @@ Model* MakeModel()
 
 } // namespace
 
-Model& TheModel()
+Model& GetModel()
 {
     static Model* const model = MakeModel();
     return *model;

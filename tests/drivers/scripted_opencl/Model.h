@@ -1,5 +1,5 @@
-// The platforms and devices that a script describes. Read once, at the driver's first call, from
-// the file that ASSAY_SCRIPTED_OPENCL names; without that there is one platform with one GPU.
+// The platforms and devices that a script describes. The driver's first call reads the file that
+// ASSAY_SCRIPTED_OPENCL names; without it there is one platform with one GPU.
 #pragma once
 
 #include <cstdint>
@@ -14,10 +14,10 @@
 
 namespace scripted {
 
-// What a question for a text or a number is answered with.
+// The result of a query for a text or a number.
 struct Answer {
     std::string bytes;
-    std::optional<std::uint64_t> claim; // the size that is told in place of the bytes' own
+    std::optional<std::uint64_t> claim; // the reported size; empty: that of `bytes`
 };
 
 using Answers = std::map<std::int64_t, Answer>;
@@ -26,9 +26,9 @@ struct Device {
     cl_device_id handle = nullptr; // null for a device whose id is a null pointer
     std::int64_t type = CL_DEVICE_TYPE_GPU;
     Answers answers;
-    std::vector<std::int64_t> copyNanoseconds{10000000}; // of one copy after the other, in turns
+    std::vector<std::int64_t> copyNanoseconds{10000000}; // of the copies, used in turn
     std::vector<std::int64_t> kernelNanoseconds{250000000};
-    std::uint64_t clock = 1000000000; // what its counters show
+    std::uint64_t clock = 1000000000; // the value of the profiling counters
     bool realTime = false;            // whether clFinish takes as long as the commands
     std::size_t copies = 0;
     std::size_t kernels = 0;
@@ -37,21 +37,21 @@ struct Device {
 struct Platform {
     cl_platform_id handle = nullptr;
     Answers answers;
-    std::vector<int> devices; // numbers in the model
+    std::vector<int> devices; // indices in the model
     std::optional<std::uint32_t> claimedDevices;
 };
 
 struct Model {
-    // Handles point into these.
+    // Deques, since handles point to the elements.
     std::deque<Platform> platforms;
     std::deque<Device> devices;
     std::optional<std::uint32_t> claimedPlatforms;
     Monitor monitor;
 };
 
-Model& TheModel();
+Model& GetModel();
 
-// The number of an OpenCL name that scripts may use in the place of a number.
+// Returns the number of an OpenCL name that scripts may use instead of a number.
 std::optional<std::int64_t> NumberOf(const std::string& name);
 
 } // namespace scripted

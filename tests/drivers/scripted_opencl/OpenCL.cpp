@@ -1,4 +1,4 @@
-// The driver's entry points, as an installable driver offers them to an OpenCL loader.
+// The entry points of an installable client driver.
 #include <algorithm>
 #include <chrono>
 #include <cstdio>
@@ -17,7 +17,7 @@ namespace {
 
 constexpr int kMissingEntryPoint = 125;
 
-// How an argument stands in the record and what rules compare it with.
+// Arguments for the record and for rules.
 Argument Number(std::int64_t number)
 {
     return {std::to_string(number), number};
@@ -47,7 +47,7 @@ int DeviceOf(const Handle* handle)
     return handle != nullptr ? handle->device : -1;
 }
 
-// What a call that gives a status gives in place of doing its work, if anything.
+// Returns the status of a call that the rules replace; nothing if they don't.
 std::optional<cl_int> StatusOf(const Effect& effect)
 {
     if (effect.error)
@@ -59,10 +59,11 @@ std::optional<cl_int> StatusOf(const Effect& effect)
 
 std::optional<cl_int> Enter(const char* name, int device, const std::vector<Argument>& arguments)
 {
-    return StatusOf(TheModel().monitor.Enter(name, device, arguments));
+    return StatusOf(GetModel().monitor.Enter(name, device, arguments));
 }
 
-// Objects stay: handles remain comparable, and what was leaked is no affair of the process's end.
+// All objects that were made. They are never freed, so that handles stay unique and leak checkers
+// don't report objects that the program didn't release.
 template <typename Object>
 std::deque<Object>& All()
 {
@@ -70,11 +71,11 @@ std::deque<Object>& All()
     return *all;
 }
 
-// The same for a call that makes an object; makes it if nothing is to go wrong.
+// Enters a call that makes an object, and makes it unless the rules replace the call.
 template <typename Object>
 Object* Make(const char* name, int device, const std::vector<Argument>& arguments, cl_int* status)
 {
-    const Effect effect = TheModel().monitor.Enter(name, device, arguments);
+    const Effect effect = GetModel().monitor.Enter(name, device, arguments);
     if (status != nullptr)
         *status = static_cast<cl_int>(effect.error.value_or(CL_SUCCESS));
     if (effect.error)
@@ -87,8 +88,8 @@ Object* Make(const char* name, int device, const std::vector<Argument>& argument
     return &made;
 }
 
-cl_int Tell(const Answers& answers, std::int64_t name, std::size_t size, void* value,
-            std::size_t* actualSize, const Effect& effect)
+cl_int CopyAnswer(const Answers& answers, std::int64_t name, std::size_t size, void* value,
+                  std::size_t* actualSize, const Effect& effect)
 {
     const auto found = answers.find(name);
     if (found == answers.end())
@@ -96,7 +97,7 @@ cl_int Tell(const Answers& answers, std::int64_t name, std::size_t size, void* v
     Answer answer = found->second;
     if (effect.text != nullptr) {
         answer.bytes = *effect.text + '\0';
-        // So that what has room for less gets as much as fits.
+        // With a reported size, a smaller buffer gets the part that fits.
         answer.claim = answer.bytes.size();
     }
     if (effect.claim)
@@ -111,9 +112,9 @@ cl_int Tell(const Answers& answers, std::int64_t name, std::size_t size, void* v
     return CL_SUCCESS;
 }
 
-// Gives a list the way OpenCL's two-call queries do.
+// Returns a list as OpenCL's two-call queries do.
 template <typename Item>
-void TellList(const std::vector<Item>& items, std::optional<std::uint32_t> claim, cl_uint count,
+void CopyList(const std::vector<Item>& items, std::optional<std::uint32_t> claim, cl_uint count,
               Item* list, cl_uint* actualCount, const Effect& effect)
 {
     if (effect.claim)
@@ -127,9 +128,9 @@ void TellList(const std::vector<Item>& items, std::optional<std::uint32_t> claim
 
 cl_int CL_API_CALL GetPlatformIDs(cl_uint count, cl_platform_id* platforms, cl_uint* actualCount)
 {
-    Model& model = TheModel();
+    Model& model = GetModel();
     const Effect effect =
-        model.monitor.Enter("clIcdGetPlatformIDsKHR", -1, {Number(count)}, Gives::Number);
+        model.monitor.Enter("clIcdGetPlatformIDsKHR", -1, {Number(count)}, Result::Number);
     if (const auto status = StatusOf(effect))
         return *status;
     std::vector<cl_platform_id> all;
@@ -137,7 +138,7 @@ cl_int CL_API_CALL GetPlatformIDs(cl_uint count, cl_platform_id* platforms, cl_u
         all.push_back(platform.handle);
     if (all.empty() && !model.claimedPlatforms)
         return CL_PLATFORM_NOT_FOUND_KHR;
-    TellList(all, model.claimedPlatforms, count, platforms, actualCount, effect);
+    CopyList(all, model.claimedPlatforms, count, platforms, actualCount, effect);
     return CL_SUCCESS;
 }
 
@@ -145,26 +146,26 @@ cl_int CL_API_CALL GetPlatformInfo(cl_platform_id platform, cl_platform_info nam
                                    void* value, std::size_t* actualSize)
 {
     const Effect effect =
-        TheModel().monitor.Enter("clGetPlatformInfo", -1,
+        GetModel().monitor.Enter("clGetPlatformInfo", -1,
                                  {Object("platform", platform), Enumerant(name),
                                   Number(static_cast<std::int64_t>(size)), Pointer(value)},
-                                 Gives::TextAndSize);
+                                 Result::TextAndSize);
     if (const auto status = StatusOf(effect))
         return *status;
-    for (const Platform& each : TheModel().platforms)
+    for (const Platform& each : GetModel().platforms)
         if (each.handle == platform)
-            return Tell(each.answers, name, size, value, actualSize, effect);
+            return CopyAnswer(each.answers, name, size, value, actualSize, effect);
     return CL_INVALID_PLATFORM;
 }
 
 cl_int CL_API_CALL GetDeviceIDs(cl_platform_id platform, cl_device_type type, cl_uint count,
                                 cl_device_id* devices, cl_uint* actualCount)
 {
-    Model& model = TheModel();
+    Model& model = GetModel();
     const Effect effect = model.monitor.Enter(
         "clGetDeviceIDs", -1,
         {Object("platform", platform), Enumerant(static_cast<std::int64_t>(type)), Number(count)},
-        Gives::Number);
+        Result::Number);
     if (const auto status = StatusOf(effect))
         return *status;
     for (const Platform& each : model.platforms) {
@@ -178,7 +179,7 @@ cl_int CL_API_CALL GetDeviceIDs(cl_platform_id platform, cl_device_type type, cl
         }
         if (found.empty() && !each.claimedDevices)
             return CL_DEVICE_NOT_FOUND;
-        TellList(found, each.claimedDevices, count, devices, actualCount, effect);
+        CopyList(found, each.claimedDevices, count, devices, actualCount, effect);
         return CL_SUCCESS;
     }
     return CL_INVALID_PLATFORM;
@@ -188,15 +189,15 @@ cl_int CL_API_CALL GetDeviceInfo(cl_device_id device, cl_device_info name, std::
                                  void* value, std::size_t* actualSize)
 {
     const Effect effect =
-        TheModel().monitor.Enter("clGetDeviceInfo", DeviceOf(device),
+        GetModel().monitor.Enter("clGetDeviceInfo", DeviceOf(device),
                                  {Object("device", device), Enumerant(name),
                                   Number(static_cast<std::int64_t>(size)), Pointer(value)},
-                                 Gives::TextAndSize);
+                                 Result::TextAndSize);
     if (const auto status = StatusOf(effect))
         return *status;
-    for (const Device& each : TheModel().devices)
+    for (const Device& each : GetModel().devices)
         if (device != nullptr && each.handle == device)
-            return Tell(each.answers, name, size, value, actualSize, effect);
+            return CopyAnswer(each.answers, name, size, value, actualSize, effect);
     return CL_INVALID_DEVICE;
 }
 
@@ -323,7 +324,7 @@ cl_int CL_API_CALL SetKernelArg(cl_kernel kernel, cl_uint index, std::size_t siz
 
 using HostClock = std::chrono::steady_clock;
 
-// When the commands of all queues are through, as far as they take real time.
+// The time when the commands of all devices with `real-time` have finished.
 HostClock::time_point& BusyUntil()
 {
     static HostClock::time_point busyUntil = HostClock::now();
@@ -335,12 +336,12 @@ void WaitForCommands()
     std::this_thread::sleep_until(BusyUntil());
 }
 
-// Lets a device work on a command and shows that on its counters.
+// Runs a command: advances the device's clock and sets the event's counters.
 void Run(cl_event event, int number, bool isCopy)
 {
     if (event == nullptr || number < 0)
         return;
-    Device& device = TheModel().devices[static_cast<std::size_t>(number)];
+    Device& device = GetModel().devices[static_cast<std::size_t>(number)];
     const std::vector<std::int64_t>& durations =
         isCopy ? device.copyNanoseconds : device.kernelNanoseconds;
     std::size_t& count = isCopy ? device.copies : device.kernels;
@@ -352,7 +353,7 @@ void Run(cl_event event, int number, bool isCopy)
         BusyUntil() = std::max(BusyUntil(), HostClock::now()) + std::chrono::nanoseconds(duration);
 }
 
-// An enqueueing call is the making of an event, whose status it returns.
+// Makes the event of an enqueueing call and runs the command.
 cl_int Enqueue(const char* name, const Handle* queue, const std::vector<Argument>& arguments,
                bool isCopy, cl_event* event)
 {
@@ -415,10 +416,10 @@ cl_int CL_API_CALL ReleaseEvent(cl_event event)
 cl_int CL_API_CALL GetEventProfilingInfo(cl_event event, cl_profiling_info name, std::size_t size,
                                          void* value, std::size_t* actualSize)
 {
-    const Effect effect = TheModel().monitor.Enter(
+    const Effect effect = GetModel().monitor.Enter(
         "clGetEventProfilingInfo", DeviceOf(event),
         {Object("event", event), Enumerant(name), Number(static_cast<std::int64_t>(size))},
-        Gives::Number);
+        Result::Number);
     if (const auto status = StatusOf(effect))
         return *status;
     if (event == nullptr)
@@ -447,10 +448,10 @@ cl_int CL_API_CALL Flush(cl_command_queue queue)
     return Enter("clFlush", DeviceOf(queue), {Object("queue", queue)}).value_or(CL_SUCCESS);
 }
 
-// Stands wherever this driver has nothing.
+// The entry point of all functions that the driver lacks.
 void MissingEntryPoint()
 {
-    static const char kText[] = "scripted driver: an OpenCL entry point that it lacks was called\n";
+    static const char kText[] = "scripted driver: call of a missing OpenCL entry point\n";
     if (::write(STDERR_FILENO, kText, sizeof kText - 1) >= 0)
         ::_exit(kMissingEntryPoint);
     ::_exit(kMissingEntryPoint);
@@ -460,7 +461,7 @@ cl_icd_dispatch MakeDispatch()
 {
     cl_icd_dispatch dispatch{};
     static_assert(sizeof dispatch % sizeof(&MissingEntryPoint) == 0);
-    // The table is nothing but pointers to functions.
+    // The table has only function pointers.
     auto* const slots = reinterpret_cast<void (**)()>(&dispatch);
     std::fill_n(slots, sizeof dispatch / sizeof *slots, MissingEntryPoint);
 
@@ -492,7 +493,7 @@ cl_icd_dispatch MakeDispatch()
 
 } // namespace
 
-const cl_icd_dispatch* TheDispatch()
+const cl_icd_dispatch* GetDispatch()
 {
     static const cl_icd_dispatch dispatch = MakeDispatch();
     return &dispatch;
@@ -500,7 +501,7 @@ const cl_icd_dispatch* TheDispatch()
 
 } // namespace scripted
 
-// What a loader finds by name.
+// The functions that a loader looks up by name.
 #define SCRIPTED_EXPORT extern "C" __attribute__((visibility("default")))
 
 SCRIPTED_EXPORT cl_int CL_API_CALL clIcdGetPlatformIDsKHR(cl_uint count, cl_platform_id* platforms,
