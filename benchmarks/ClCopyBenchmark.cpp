@@ -1,6 +1,6 @@
-// Copies inside a device's own memory, timed by the host's clock: what the report's CLBandwidth,
-// which goes by the device's own counters, is held against. One benchmark a GPU, in the report's
-// order and with its tags.
+// Copies inside a device's memory, timed by the host's clock, for comparison with the report's
+// CLBandwidth, which uses the device's counters. One benchmark per GPU, in the report's order and
+// with its tags.
 #include <cstdint>
 #include <cstdlib>
 #include <iostream>
@@ -13,7 +13,7 @@
 namespace {
 
 constexpr std::size_t kBufferBytes = 0x1000000;
-// Long enough that the way to the device and back doesn't count.
+// Long enough that the latency of the commands doesn't matter.
 constexpr int kCopiesPerBatch = 200;
 
 void Require(cl_int status, const char* call)
@@ -62,7 +62,7 @@ void Copy(benchmark::State& state, const QGF::OCL::Device& device)
     const QGF::OCL::CommandQueue queue(context, device, false, false);
     const Buffer source(context, CL_MEM_READ_ONLY);
     const Buffer destination(context, CL_MEM_WRITE_ONLY);
-    CopyBatch(queue, source, destination); // lets the driver place the buffers
+    CopyBatch(queue, source, destination); // makes the driver allocate the buffers
     for ([[maybe_unused]] auto _ : state)
         CopyBatch(queue, source, destination);
     // Each copy reads and writes.

@@ -10,7 +10,7 @@ namespace {
 
 constexpr std::int64_t kSize = 1 << 20;
 
-// Mostly plain text, as adapter names are, with something to escape in every line.
+// Mostly plain text, like adapter names, with characters to escape in every line.
 std::string MakeText()
 {
     const std::string line = "Graphics adapter \"7\"\tof the second bus, revision a1\xC3\xA9\n";

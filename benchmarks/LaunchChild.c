@@ -1,4 +1,4 @@
-/* The child of the launch benchmarks: writes as many bytes as its argument says, and ends. */
+/* The child of the launch benchmarks: writes the number of bytes in its argument and exits. */
 #include <stdlib.h>
 #include <unistd.h>
 

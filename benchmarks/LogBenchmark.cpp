@@ -1,4 +1,4 @@
-// What a log statement costs: while it is off, and when it writes a line.
+// The cost of a log statement: disabled, and writing a line.
 #include <atomic>
 #include <cstdio>
 #include <cstdlib>
@@ -81,7 +81,7 @@ void BareLine(benchmark::State& state)
 }
 BENCHMARK(BareLine);
 
-// The logger's own part: a line whose message is a text already.
+// The logger without the assembly of the message.
 void LoggerLine(benchmark::State& state)
 {
     pmutil::InitLogging();
@@ -95,7 +95,7 @@ void LoggerLine(benchmark::State& state)
 }
 BENCHMARK(LoggerLine);
 
-// The whole statement, its message assembled in a stream.
+// The whole statement with the assembly of the message.
 void Statement(benchmark::State& state)
 {
     pmutil::InitLogging();

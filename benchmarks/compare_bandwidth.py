@@ -1,12 +1,12 @@
 #!/usr/bin/env python3
-"""Holds the report's CLBandwidth of each OpenCL GPU, which goes by the device's counters, against the
+"""Compares the report's CLBandwidth of each OpenCL GPU, which uses the device's counters, with the
 same copy timed by the host's clock.
 
 usage: compare_bandwidth.py [--build FOLDER] [--benchmarks FOLDER] [--scripted]
 
-FOLDERs: of the program's build (build/linux) and of the benchmarks' (build/benchmarks). --scripted
-takes the tests' scripted driver in place of the machine's: its commands take real time, and its
-counters are exact. The status is 1 if a GPU is off by more than 5 %.
+FOLDER: the build of the program (build/linux) and of the benchmarks (build/benchmarks). --scripted
+uses the tests' scripted driver, whose commands take real time and whose counters are exact. The exit
+status is 1 if a GPU differs by more than 5 %.
 """
 
 import argparse
@@ -23,7 +23,7 @@ TOLERANCE = 0.05
 
 
 def reported(program, environment):
-    """Bytes a second by GPU, and its name."""
+    """Bytes per second and name, by GPU."""
     report = subprocess.run([program], env=environment, stdout=subprocess.PIPE, check=False,
                             encoding="utf-8", errors="replace").stdout
     rates = dict(re.findall(r"^(clgpu\[\d+\])\.CLBandwidth=(\S+)$", report, re.MULTILINE))
@@ -32,7 +32,7 @@ def reported(program, environment):
 
 
 def measured(program, environment):
-    """The best of five repetitions by GPU, as the report has the best batch."""
+    """The best of five repetitions, by GPU; the report has the best batch."""
     output = subprocess.run(
         [program, "--benchmark_repetitions=5", "--benchmark_min_time=0.2",
          "--benchmark_format=json"],
@@ -65,12 +65,12 @@ def main():
         by_clock = measured(options.benchmarks.resolve() / "bin" / "cl_copy_benchmark", environment)
 
     if not by_counters:
-        print("no OpenCL GPU has a CLBandwidth here")
+        print("no OpenCL GPU with a CLBandwidth")
     worst = 0.0
     for tag, (rate, name) in by_counters.items():
         ratio = rate / by_clock[tag]
         worst = max(worst, abs(ratio - 1))
-        print(f"{tag} {name}: counters {rate:.4g}, host clock {by_clock[tag]:.4g} bytes a second, "
+        print(f"{tag} {name}: counters {rate:.4g}, host clock {by_clock[tag]:.4g} bytes/s, "
               f"ratio {ratio:.3f} (goal: within 5 %)")
     return int(worst > TOLERANCE)
 

@@ -1,4 +1,4 @@
-// Each parser of the system's files takes any bytes, and gives nothing that its caller can't use.
+// Feeds any bytes to the parsers of the system's files and checks that their results are valid.
 #include <cstdint>
 #include <cstdlib>
 #include <string>
@@ -38,7 +38,7 @@ void CheckNames(const std::string& text)
 void CheckMemory(const std::string& text)
 {
     for (const char* driver : {"i915", "xe", "radeon", "nouveau", "amdgpu"}) {
-        // Each answer needs 16 bytes at least, and each of its figures has a place of its own.
+        // Each driver's answer has at least 16 bytes.
         Require(!pmutil::ParseDedicatedMemory(driver, text) || text.size() >= 16);
     }
     Require(pmutil::LargestPrefetchableBar(text) != 1);

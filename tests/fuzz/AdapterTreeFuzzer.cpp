@@ -1,5 +1,5 @@
-// A whole machine whose files hold any bytes: the join never fails, and every adapter keeps a name
-// that all lists agree on.
+// Fills the files of a recorded machine with any bytes and checks that the join never fails and
+// that every adapter has the same unique name in all lists.
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
@@ -30,7 +30,7 @@ std::vector<std::string> ReadAll(const std::vector<std::string>& files)
     return texts;
 }
 
-// A machine's files: what they held at first, and what they hold now.
+// A machine's files with their original and their current contents.
 struct Machine {
     explicit Machine(const std::string& name)
         : tree(name), files(tree.files()), originals(ReadAll(files)), current(originals)
@@ -42,8 +42,8 @@ struct Machine {
     std::vector<std::string> current;
 };
 
-// Cuts the input into the contents of the files: each of them keeps its own where its first byte is
-// even, so that most of the machine stays sound.
+// Splits the input into the contents of the files. A file whose first byte is even keeps its
+// original content, so that most of the machine stays intact.
 void Spread(Machine& machine, const std::uint8_t* data, std::size_t size)
 {
     const std::vector<std::string>& files = machine.files;
@@ -70,7 +70,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size)
 {
-    // One with a sleeping card, and those with answers on nodes or devices outside PCI.
+    // Machines with a suspended card, with recorded driver answers, and with devices outside PCI.
     static Machine gMachines[] = {Machine("hybrid-laptop"),   Machine("intel-arc-asleep"),
                                   Machine("intel-two-tiles"), Machine("radeon"),
                                   Machine("nouveau"),         Machine("soc-beside-pci")};

@@ -1,6 +1,6 @@
-// Feeds command lines to the application's parser: arguments separated by line ends. Whatever comes
-// in, options take effect in their order, the rest is left over in its order, and only "-help"
-// throws.
+// Feeds command lines to the application's parser, with the arguments separated by line ends.
+// Checks that options take effect in order, that other arguments are left in order, and that only
+// "-help" throws.
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
@@ -20,7 +20,7 @@ void Require(bool condition)
         std::abort();
 }
 
-// Keeps what options print.
+// Records the lines that options print.
 class QuietApp : public GPUAssayApp {
 public:
     void DoStdout(const std::string& text) override { out.push_back(text); }
@@ -44,7 +44,8 @@ bool IsOption(const std::string& argument)
                        [&](const char* prefix) { return StartsWith(argument, prefix); });
 }
 
-// What a "-stdout=", "-comment=" or "-stderr=" prints, told apart from the parser's own way.
+// Returns the line that a "-stdout=", "-comment=" or "-stderr=" prints, worked out independently of
+// the parser.
 std::string Printed(const std::string& argument)
 {
     std::string value = argument.substr(argument.find('=') + 1);

@@ -1,5 +1,6 @@
-// Any bytes as a report: what is made of it is valid, and the way back is exact. Any JSON as a
-// document: read, or refused with a text.
+// Any bytes as a report: checks that the documents made of it are valid and that reading them back
+// gives the same report. Any bytes as a document: checks that they are read or rejected with a
+// text.
 #include <cstdint>
 #include <cstdlib>
 #include <sstream>

@@ -1,5 +1,5 @@
-// The report's reader takes any bytes, in pieces of any size, and loses none but those that its
-// limits refuse.
+// Feeds any bytes in pieces of any size to the report's reader, and checks that it loses only bytes
+// beyond its limits.
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
@@ -33,8 +33,7 @@ struct Outcome {
     std::uint64_t fLost;
 };
 
-// `pieces`: the sizes of the pieces, one after the other and from the first again; all at once if
-// there are none.
+// `pieces` are the sizes of the pieces, used in turn; if empty, all data is one piece.
 Outcome Read(std::string_view data, const ReportReader::Limits& limits, std::string_view pieces)
 {
     ReportReader reader(limits);
@@ -58,7 +57,7 @@ Outcome Read(std::string_view data, const ReportReader::Limits& limits, std::str
 
 void CheckLine(const ReportLine& line, const ReportReader::Limits& limits)
 {
-    // A quoted value over several lines keeps to the limit without their ends.
+    // A quoted value of several lines may exceed the limit by its line ends.
     Require(line.fText.size() <= 3 * limits.fMaxLineBytes + 2);
     const ReportLine again = assay_host::ReadLine(line.fText, line.fLineEnd, line.fCut);
     Require(IsSame(again, line));

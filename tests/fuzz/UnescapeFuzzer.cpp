@@ -1,4 +1,4 @@
-// Unescaping takes any input, and gives back whatever escaping wrote.
+// Checks that unescaping accepts any input and reverses escaping.
 #include <cstdint>
 #include <cstdlib>
 #include <string>
