@@ -1,5 +1,5 @@
-// Listing the adapters of a machine with eight equal cards, against bare reads of the files that it
-// opens: what is above them must stay below 5 ms.
+// Listing the adapters of a machine with eight equal cards, compared with plain reads of the same
+// files. Goal: at most 5 ms longer.
 #include <algorithm>
 #include <fstream>
 #include <set>
@@ -19,7 +19,7 @@ namespace {
 
 const char kMachine[] = "nvidia-eight";
 
-// One listing: the names, the rows with their raw adapters, and the adapters again.
+// Lists the adapters once: the names, the rows with their raw adapters, and the adapters again.
 void EnumerateEightCards(benchmark::State& state)
 {
     const AdapterTree tree(kMachine);
@@ -27,14 +27,14 @@ void EnumerateEightCards(benchmark::State& state)
         tree.refresh();
         if (pmutil::WMIData::GetAllDevices().size() != 8 ||
             pmutil::DXGIData::GetAllDevices().size() != 8) {
-            state.SkipWithError("eight cards aren't eight devices");
+            state.SkipWithError("not eight devices");
             break;
         }
     }
 }
 BENCHMARK(EnumerateEightCards);
 
-// The files of which the listing takes something, each read once.
+// Returns the files that the listing reads.
 std::vector<std::string> FilesRead(const AdapterTree& tree)
 {
     static const std::set<std::string> gRead = {

@@ -1,4 +1,4 @@
-// A Buffer against memcpy, and ReadAll through a pipe against a bare loop of reads.
+// Buffer compared with memcpy, and ReadAll from a pipe compared with a plain loop of reads.
 #include <cstring>
 #include <string>
 #include <thread>
@@ -18,7 +18,7 @@ constexpr std::size_t kBlock = 64 * 1024;
 constexpr std::size_t kBlocks = 64;
 constexpr std::int64_t kPipeBytes = 64 << 20;
 
-// Each side moves 64 blocks of 64 KiB out of, or into, 4 MiB of memory.
+// The memory of both sides of a comparison: 64 blocks of 64 KiB, and one block to copy to or from.
 class Blocks {
 public:
     unsigned char* At(std::size_t block) { return fAll.data() + block * kBlock; }
@@ -82,7 +82,7 @@ void BufferWrite(benchmark::State& state)
 }
 BENCHMARK(BufferWrite);
 
-// Fills a pipe from a thread; `read` takes all of it out, block by block.
+// Fills a pipe from a thread; `read` reads it to the end with the given block.
 template <typename Read>
 void Pump(benchmark::State& state, Read read)
 {
@@ -90,7 +90,7 @@ void Pump(benchmark::State& state, Read read)
     for (auto _ : state) {
         int ends[2];
         if (::pipe2(ends, O_CLOEXEC) != 0) {
-            state.SkipWithError("no pipe");
+            state.SkipWithError("pipe2 failed");
             return;
         }
         std::thread writer([end = ends[1]] {

@@ -1,4 +1,4 @@
-// Formatting an int and a short text: Fmt, snprintf into a string, and {fmt}.
+// Formatting an int and a short text with Fmt, compared with snprintf into a string and with {fmt}.
 #include <cstdio>
 #include <string>
 

@@ -1,14 +1,15 @@
 #!/usr/bin/env python3
-"""Times the program without its two measurements against `clinfo` on the same OpenCL driver, and
-tells where the OpenCL half's own time goes.
+"""Compares the time of the program without its two measurements with that of `clinfo` on the same
+OpenCL driver, and prints the time of each stage of the OpenCL part.
 
 usage: compare_clinfo.py [--build FOLDER] [--runs N] [--own] [--json FILE]
 
-Figures are medians in milliseconds of wall and of processor time. The program finds no OpenGL, since
-clinfo doesn't ask for it, and one OpenCL GPU: Mesa's software device presented as one, or the
-machine's own with --own. The run is made to fail at the step before the first measurement. The own
-time is what the stages take on the scripted driver of the tests, which answers at once; the compute
-measurement's is mostly the filling of its buffer with a million numbers of the C library's generator.
+Values are medians of wall time and of processor time in milliseconds. OpenGL is hidden from the
+program, since clinfo doesn't query it. The OpenCL GPU is Mesa's software device presented as a GPU, or
+with --own the machine's. The run is made to fail at the step before the first measurement. The
+program's own time is that of the stages on the scripted driver of the tests, which returns at once; the
+compute measurement's is mostly spent on filling its buffer with a million numbers of the C library's
+generator.
 """
 
 import argparse
@@ -22,11 +23,11 @@ from compare_eglinfo import TREE, medians, show
 
 GOAL_OWN_MS = 2.0
 
-# A run that fails at this step, and what it has done by then beyond the stage before.
+# A step to fail at, and what the run has done up to there since the stage before.
 STAGES = [
     (6, "everything before OpenCL"),
     (7, "loads the library, lists platforms and devices"),
-    (17, "ten questions"),
+    (17, "ten queries"),
     (18, "bandwidth measurement"),
     (19, "compute measurement"),
 ]
@@ -70,12 +71,12 @@ def main():
         if peer:
             ratios = (whole[0] / peer[0][0], whole[1] / peer[0][1])
             show(peer[0], "clinfo on the same driver")
-            show(ratios, "assay / clinfo (goal: no more than 1)")
+            show(ratios, "assay / clinfo (goal: at most 1)")
             results.update(clinfo_ms=peer[0], ratios=ratios)
         else:
             print("clinfo isn't installed")
 
-        print("\nOn a driver that answers at once:")
+        print("\nOn a driver that returns at once:")
         stages = medians([([program, f"-crashAfter={step}"], scripted) for step, _ in STAGES],
                          options.runs)
         before = stages[0]

@@ -1,17 +1,17 @@
 #!/usr/bin/env python3
-"""Times the whole program against `eglinfo -B` on the same driver, and tells where its own time goes.
+"""Compares the time of the program with that of `eglinfo -B` on the same driver, and prints the time
+of each stage.
 
 usage: compare_eglinfo.py [--build FOLDER] [--runs N] [--json FILE]
 
-Both are started alternately and to their end, with standard output and error to /dev/null; figures
-are medians in milliseconds, of wall time and of processor time (which a busy machine disturbs
-less). OpenCL is hidden from the program, since eglinfo doesn't ask for it. The
-program does more than eglinfo: it compiles shaders and renders. eglinfo tries every platform that
-EGL knows.
+Both are run alternately, with standard output and error to /dev/null. Values are medians in
+milliseconds of wall time and of processor time, which varies less on a busy machine. OpenCL is hidden
+from the program, since eglinfo doesn't query it. The program does more than eglinfo: it compiles
+shaders and renders. eglinfo tries every platform that EGL supports.
 
-The program's own time is what it takes beyond /bin/true on the scripted driver of the tests, which
-answers at once. The stages come from programmed failures: a run that fails at a step is a
-run up to there.
+The program's own time is its time on the scripted driver of the tests, which returns at once, minus
+that of /bin/true. The stages are measured with programmed failures: a run that fails at a step ends
+there.
 """
 
 import argparse
@@ -28,22 +28,22 @@ TREE = Path(__file__).resolve().parents[1]
 
 GOAL_OWN_MS = 2.0
 
-# A run that fails at this step, and what it has done by then with one GPU: the work of a step comes
-# before the step.
+# A step to fail at, and what the run has done up to there with one GPU. The work of a step is done
+# before the step is counted.
 STAGES = [
     (0, "process start, libraries, options"),
-    (5, "the three checks: loads EGL, makes and drops a context"),
+    (5, "the three checks: loads EGL, creates and destroys a context"),
     (6, "enumeration: adapters, a context on each device"),
-    (19, "thirteen questions"),
+    (19, "thirteen queries"),
     (20, "shaders: compile, link"),
     (21, "framebuffer: texture, clear"),
-    (41, "the battery: twenty-one questions"),
+    (41, "the battery: twenty-one queries"),
     (-1, "the rest, and the exit"),
 ]
 
 
 def time_once(command, environment):
-    """Wall and processor time of one run."""
+    """Runs the command; returns its wall time and its processor time in milliseconds."""
     null = os.open(os.devnull, os.O_RDWR)
     try:
         start = time.perf_counter()
@@ -60,9 +60,9 @@ def time_once(command, environment):
 
 
 def medians(jobs, runs):
-    """The medians of each (command, environment), all of them run alternately."""
+    """Runs each (command, environment) alternately; returns the median times of each."""
     taken = [[] for _ in jobs]
-    for _ in range(2):  # not counted: files come into memory
+    for _ in range(2):  # not counted: these load the files into memory
         for command, environment in jobs:
             time_once(command, environment)
     for _ in range(runs):
@@ -85,7 +85,7 @@ def print_stages(title, cumulative):
     for (_, name), now in zip(STAGES, cumulative):
         show((now[0] - before[0], now[1] - before[1]), name)
         before = now
-    show(cumulative[-1], "in all")
+    show(cumulative[-1], "total")
 
 
 def main():
@@ -122,7 +122,7 @@ def main():
         if peer:
             ratios = (whole[0] / peer[0][0], whole[1] / peer[0][1])
             show(peer[0], "eglinfo -B on the same driver")
-            show(ratios, "assay / eglinfo (goal: no more than 1)")
+            show(ratios, "assay / eglinfo (goal: at most 1)")
             results.update(eglinfo_ms=peer[0], ratios=ratios)
         else:
             print("eglinfo isn't installed (package mesa-utils-bin)")
@@ -136,7 +136,7 @@ def main():
                                    options.runs)
         own = (stages[-1][0] - nothing[0], stages[-1][1] - nothing[1])
         print()
-        print_stages("On a driver that answers at once:", stages)
+        print_stages("On a driver that returns at once:", stages)
         show(nothing, "/bin/true")
         show(own, f"assay's own time (goal: under {GOAL_OWN_MS:g})")
         results.update(scripted_stages_ms=stages, own_ms=own)

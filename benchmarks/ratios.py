@@ -1,13 +1,12 @@
 #!/usr/bin/env python3
-"""Runs the benchmark programs in one go and prints ratios of median times, and differences between
-them, against their goals.
+"""Runs the benchmark programs and prints ratios and differences of median times with their goals.
 
 usage: ratios.py FOLDER-OF-THE-PROGRAMS [REPETITIONS]
 
-The repetitions of a program's benchmarks are interleaved, so that a machine that is busy for a
-while slows both sides of a ratio. Times are processor times of the measuring thread, but for what
-a program does with others: those are times by the clock, and mean something on an idle machine
-only. The status is 1 if a goal is missed.
+The repetitions of a program's benchmarks are interleaved, so that load on the machine slows both sides
+of a ratio. Times are processor times of the measuring thread, except for benchmarks with several
+threads or processes: those are wall times, and reliable only on an idle machine. The status is 1 if a
+goal is missed.
 """
 
 import json
@@ -16,7 +15,7 @@ import subprocess
 import sys
 from pathlib import Path
 
-# program, what is measured, what it is measured against, most the ratio may be (None: no goal)
+# program, benchmark, baseline, maximum ratio (None: no goal)
 RATIOS = [
     ("log_benchmark", "OffStatement", "LoadAndTest", 1.05),
     ("log_benchmark", "LoggerLine", "BareLine", 3.0),
@@ -33,7 +32,7 @@ RATIOS = [
     ("channel_benchmark", "PipeReadAll/real_time", "PipeBareReads/real_time", 1.05),
 ]
 
-# The same by the clock.
+# The same with wall times.
 CLOCK_RATIOS = [
     ("launch_benchmark", "LaunchAndWait/real_time", "BareSpawn/real_time", 1.5),
     ("launch_resident_benchmark", "LaunchAndWait/real_time", "BareSpawn/real_time", 1.5),
@@ -41,14 +40,14 @@ CLOCK_RATIOS = [
     ("launch_benchmark", "PumpTask/real_time", "PumpBareReadsOfAWidePipe/real_time", 1 / 0.95),
 ]
 
-# program, what is measured, what it is measured against, most nanoseconds it may take longer
+# program, benchmark, baseline, maximum difference in nanoseconds
 DIFFERENCES = [
     ("adapter_benchmark", "EnumerateEightCards", "ReadTheirFiles", 5_000_000),
 ]
 
 
 def medians(program: Path, repetitions: int) -> dict[str, dict[str, float]]:
-    """Nanoseconds of each benchmark of the program, as cpu_time and as real_time."""
+    """Returns the nanoseconds of each benchmark of the program, as cpu_time and as real_time."""
     output = subprocess.run(
         [
             program,
