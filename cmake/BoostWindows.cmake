@@ -1,8 +1,9 @@
-# Boost for Windows: the packaged headers (WindowsHeaders), and the compiled libraries built here from the distribution's own source of the same version
-# (ASSAY_BOOST_SOURCE, filled by scripts/fetch-boost-source).
+# Boost for Windows: the packaged headers (WindowsHeaders), and the compiled libraries, built here from
+# the source of the same version in the distribution (ASSAY_BOOST_SOURCE, filled by
+# scripts/fetch-boost-source).
 set(ASSAY_BOOST_SOURCE ${CMAKE_SOURCE_DIR}/build/deps/boost CACHE PATH "Unpacked Boost source")
 if(NOT EXISTS ${ASSAY_BOOST_SOURCE}/libs/thread/src)
-  message(FATAL_ERROR "No Boost source in ${ASSAY_BOOST_SOURCE}: run scripts/build windows, which fetches it")
+  message(FATAL_ERROR "No Boost source in ${ASSAY_BOOST_SOURCE}: run scripts/build windows to fetch it")
 endif()
 
 set(libs ${ASSAY_BOOST_SOURCE}/libs)

@@ -1,4 +1,4 @@
-# What the build needs from outside the tree.
+# The libraries that the build requires.
 set(THREADS_PREFER_PTHREAD_FLAG ON)
 find_package(Threads REQUIRED)
 if(WIN32)

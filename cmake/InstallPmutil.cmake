@@ -18,7 +18,7 @@ install(FILES ${CMAKE_CURRENT_BINARY_DIR}/pmutilConfig.cmake
   ${CMAKE_CURRENT_BINARY_DIR}/pmutilConfigVersion.cmake
   DESTINATION ${package_dir} COMPONENT pmutil)
 
-# The .pc file finds its prefix from where it lies, so that the folder can be moved.
+# The .pc file has its prefix relative to itself, so that the installation can be moved.
 file(RELATIVE_PATH prefix_from_pc /usr/${CMAKE_INSTALL_LIBDIR}/pkgconfig /usr)
 configure_file(${CMAKE_SOURCE_DIR}/cmake/pmutil.pc.in ${CMAKE_CURRENT_BINARY_DIR}/pmutil.pc @ONLY)
 install(FILES ${CMAKE_CURRENT_BINARY_DIR}/pmutil.pc

@@ -3,7 +3,7 @@ if(ASSAY_SANITIZE)
   add_compile_options(-fsanitize=${ASSAY_SANITIZE} -fno-omit-frame-pointer -g)
   add_link_options(-fsanitize=${ASSAY_SANITIZE})
   if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
-    # Instrumented standard library code (std::regex) makes GCC see what isn't there.
+    # GCC reports false positives in instrumented standard library code (std::regex).
     add_compile_options(-Wno-maybe-uninitialized)
   endif()
   if(ASSAY_SANITIZE MATCHES "undefined")

@@ -1,5 +1,5 @@
-# Headers of the distribution that are the same on every platform, for the cross-compiler: reached
-# through a folder that holds only links to them, so that no Linux header comes along.
+# The distribution's headers that are the same on every platform, for the cross-compiler. The include
+# folder has only links to them, so that no other header of Linux is found.
 set(folder ${CMAKE_BINARY_DIR}/include)
 file(MAKE_DIRECTORY ${folder})
 foreach(library boost CL CLI fmt nlohmann)
@@ -8,7 +8,7 @@ endforeach()
 add_library(windows_headers INTERFACE)
 target_include_directories(windows_headers SYSTEM INTERFACE ${folder})
 
-# What find_package gives on Linux, for the libraries that are headers only.
+# The targets that find_package defines on Linux for header-only libraries.
 foreach(target nlohmann_json::nlohmann_json CLI11::CLI11)
   add_library(${target} INTERFACE IMPORTED)
   target_link_libraries(${target} INTERFACE windows_headers)

@@ -1,5 +1,5 @@
-# assay_windows_resources(TARGET DESCRIPTION): a version resource, and for a program a manifest.
-# Nothing on other platforms.
+# assay_windows_resources(TARGET DESCRIPTION) adds a version resource, and to a program a manifest. Does
+# nothing on other platforms.
 function(assay_windows_resources target description)
   if(NOT WIN32)
     return()
@@ -18,7 +18,7 @@ function(assay_windows_resources target description)
     set(file_type 2)
   endif()
   configure_file(${folder}/resources.rc.in ${made}/resources.rc @ONLY)
-  # A library of its own, so that the C++ compiler's options don't reach the resource compiler.
+  # A separate library, so that the resource compiler doesn't get the options of the C++ compiler.
   add_library(${target}_resources OBJECT ${made}/resources.rc)
   if(manifest)
     set_source_files_properties(${made}/resources.rc PROPERTIES
