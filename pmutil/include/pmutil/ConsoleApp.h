@@ -1,19 +1,19 @@
-// Supervises one console child program: launches it on a thread of its own, has its output pumped,
-// lets a caller wait with a timeout, kills it, and keeps how it ended. One launch at a time, any
-// number in turn.
+// Supervises one console child program: launches it on a separate thread, has its output read,
+// waits for it with a timeout, kills it, and stores how it ended. One launch at a time; any number
+// of launches in sequence.
 //
-// Failures on the threads of a launch are stored, oldest first, and each wait of the client throws
-// one of them (consoleapp::Exception).
+// Failures on the threads of a launch are stored in order. Each wait of the client throws the
+// oldest one (consoleapp::Exception).
 //
-// Clients derive from it if they want the notifications, and drive it through ConsoleAppLauncher.
-// Hold it by boost::shared_ptr.
+// Clients use it through ConsoleAppLauncher, and derive from it to get notifications. Hold it by
+// boost::shared_ptr.
 //
-// One Launcher serves all launches in turn, as long as the thread of each ends. If the thread of a
-// launch that was given up still runs at the next launch, it keeps the launcher that it has, so
-// that it reaches only its own child, and the next launch gets a new one.
+// All launches use one Launcher as long as the thread of each ends. If the thread of a launch that
+// was given up still runs at the next launch, that thread keeps its launcher, so that it can reach
+// only its own child, and the next launch gets a new one.
 //
-// A boost::thread interruption ends Launch, Wait, Kill and GetState as a failure does. Reset can't
-// be interrupted: the request stays pending.
+// A boost::thread interruption ends Launch, Wait, Kill and GetState like a failure. Reset can't be
+// interrupted: the request stays pending.
 #pragma once
 
 #include <atomic>
@@ -36,8 +36,8 @@ namespace pmutil {
 
 class ThreadEnd;
 
-// Makes a launcher of the kind that an application launches with; never an empty one. Called by
-// ConsoleApp::Launch with the application's lock held.
+// Returns a new launcher for an application; never null. Called by ConsoleApp::Launch with the
+// application's lock held.
 using LauncherFactory = std::function<boost::shared_ptr<Launcher>()>;
 
 class ConsoleApp {
@@ -46,73 +46,75 @@ public:
 
     ConsoleApp();
 
-    // Resets. A child that still runs goes on unless it was killed.
+    // Resets. Doesn't kill a child that still runs.
     virtual ~ConsoleApp();
     ConsoleApp(const ConsoleApp&) = delete;
     ConsoleApp& operator=(const ConsoleApp&) = delete;
 
     // For the client.
 
-    // Starts the child and returns when it runs or has ended, or after the short wait, whatever
-    // comes first. Throws std::runtime_error "ConsoleApp: must be idle" and leaves a running launch
-    // alone; after any other failure, which it throws, the object is Idle. One of them is
-    // "ConsoleApp: the launcher still serves a launch that was given up", for an application
-    // without a LauncherFactory.
+    // Starts the child. Returns when the child runs or has ended, or after the short wait,
+    // whichever comes first. Throws std::runtime_error "ConsoleApp: must be idle" without effect on
+    // a running launch. Throws any other failure and leaves the object Idle, among them
+    // "ConsoleApp: the launcher still serves a launch that was given up" for an application without
+    // a LauncherFactory.
     void Launch(const boost::shared_ptr<consoleapp::ExecutionData>& data,
                 const LaunchParams& params);
 
-    // Waits for the end of the child. Finished, Crashed or Killed: it has ended, and the object is
-    // Idle again; `*exitCode`, unless null, gets the code, 0 after a crash or a kill. Timeout: it
-    // goes on, and so may the caller, with another Wait or a Kill; unless the launcher's thread was
-    // given up, which leaves the object Idle. Idle: there was nothing to wait for, or another
-    // thread has seen the launch to its end meanwhile; a newer launch isn't waited for. Throws the
-    // oldest stored failure and leaves the object Idle.
+    // Waits for the end of the child. Returns
+    // - Finished, Crashed or Killed if the child has ended. The object is Idle again. `*exitCode`,
+    //   unless null, is set to the exit code, or to 0 after a crash or a kill.
+    // - Timeout if the child still runs. The caller may call Wait again, or Kill. If the launcher's
+    //   thread was given up, the object is Idle.
+    // - Idle if there is no launch, or if another thread has ended the launch meanwhile. Doesn't
+    //   wait for a newer launch.
+    // Throws the oldest stored failure and leaves the object Idle.
     //
-    // The join of the launcher's thread must fit into the wait too. A client that polls with a wait
-    // of 0 seconds may find the child ended but that thread still busy, and gets Timeout, an Idle
-    // object and no code.
+    // The timeout includes the join of the launcher's thread. With a timeout of 0 seconds, the
+    // child may have ended while that thread is still busy: the result is Timeout, the object is
+    // Idle and the exit code is lost.
     //
-    // A failure of an output task, or an interruption, doesn't end the child: this waits for its
-    // end, up to the limit, before it throws. The launch is given up then.
+    // A failure of an output task, or an interruption, doesn't end the child: Wait waits for its
+    // end, up to the timeout, and then throws. The launch is given up.
     State Wait(int* exitCode, double maxWaitSeconds);
 
-    // Asks for the child's end if it is Running or the last wait ran out; doesn't wait for it.
-    // Waits up to the short wait for a stable state before. Throws the oldest stored failure.
+    // Waits up to the short wait for a stable state. Then kills the child if it is Running or if
+    // the last wait timed out; doesn't wait for its end. Throws the oldest stored failure.
     //
-    // While the start lasts longer than the short wait there may be no child to kill yet: the call
-    // is lost then, the launch goes on, and the client must call again.
+    // If the start takes longer than the short wait, there may be no child yet. Then the call has
+    // no effect, the launch continues, and the client must call again.
     void Kill();
 
-    // Waits up to `maxWaitSeconds` for a stable state; Timeout if none came. Throws the oldest
-    // stored failure.
+    // Waits up to `maxWaitSeconds` for a stable state. Returns Timeout if there was none. Throws
+    // the oldest stored failure.
     State GetState(double maxWaitSeconds);
 
-    // Back to Idle whatever it was doing. Waits up to the short wait for the launcher's thread to
-    // end, and not at all if the caller is that thread. The child isn't killed.
+    // Sets the object to Idle. Waits up to the short wait for the end of the launcher's thread,
+    // unless called on that thread. Doesn't kill the child.
     void Reset();
 
-    // A bit for each thread of the launch that runs, at the place of its TaskID. Needs a launch,
-    // and both output tasks alive.
+    // Returns a mask of the running threads of the launch; the bit number is the TaskID. Requires a
+    // launch whose output tasks both exist.
     unsigned GetTasksRunning();
 
-    // The child's standard input; only with LaunchParams::fKeepStdin, from Running on. A write
-    // blocks while the pipe is full, and so do all other operations meanwhile, without a limit:
-    // Wait, Kill and Reset too. Throw std::runtime_error "pmutil::Channel not open" and what
-    // the channel throws; a null text throws std::invalid_argument
-    // "ConsoleApp::WritelnAppStdin str=nullptr".
+    // Write to and close the child's standard input. Require LaunchParams::fKeepStdin, and a child
+    // that is Running. A write blocks while the pipe is full, and with it all other functions of
+    // the object, also Wait, Kill and Reset, without a timeout. Throw std::runtime_error
+    // "pmutil::Channel not open" and the failures of the channel. A null text throws
+    // std::invalid_argument "ConsoleApp::WritelnAppStdin str=nullptr".
     void CloseAppStdin();
     void WriteAppStdin(const unsigned char* data, std::size_t nbytes);
     void WritelnAppStdin(const char* str);
     void WritelnAppStdin(const std::string& str);
 
-    // 10 s, 1 s and 0.1 s, unless debug values say otherwise.
+    // 10 s, 1 s and 0.1 s unless changed by debug values.
     static double GetDefaultWaitSeconds();
     static double GetShortWaitSeconds();
     static double GetDefaultStateWaitSeconds();
 
-    // For the threads of a launch, through ConsoleAppAccessor. `launch` is the one that the caller
-    // belongs to; null stands for the present one. The notifications of a launch that was given up
-    // throw consoleapp::Exception "no console app"; no failure or fault is thrown to its threads.
+    // For the threads of a launch, through ConsoleAppAccessor. `launch` is the caller's launch, or
+    // null for the current one. In a launch that was given up, the notifications throw
+    // consoleapp::Exception "no console app", and the ThrowIf functions do nothing.
 
     void NotifyLaunching(TaskID who, const consoleapp::ExecutionData* launch = nullptr);
     void NotifyLaunched(TaskID who, const consoleapp::ExecutionData* launch = nullptr);
@@ -130,16 +132,16 @@ public:
     void ThrowIfInjected(TaskID who, Fault fault, const char* caller,
                          const consoleapp::ExecutionData* launch = nullptr);
 
-    // Arms a fault, which fires once; call it before Launch.
+    // Makes one operation of the next launch fail, once. Call before Launch.
     void SetInjectedFault(Fault fault) { fInjectedFault = fault; }
 
 protected:
-    // Without `makeLauncher` there is no other launcher than `launcher`: Launch fails as long as
-    // the thread of a launch that was given up still runs, since both would reach the same child.
+    // Without `makeLauncher`, all launches use `launcher`, and Launch fails as long as the thread
+    // of a launch that was given up still runs, since both would reach the same child.
     explicit ConsoleApp(const boost::shared_ptr<Launcher>& launcher,
                         LauncherFactory makeLauncher = nullptr);
 
-    // Called on the threads of a launch, without a lock, so that they may call back in. An
+    // Called on the threads of a launch without a lock, so that they may call this object. An
     // exception is a failure of the launch.
     virtual void OnLaunching();
     virtual void OnRunning();
@@ -148,7 +150,8 @@ protected:
     virtual void OnFinished(int exitCode);
     virtual void OnReserved();
 
-    // The link of the present or latest launch; empty before the first, and after Reset.
+    // Returns the data of the current or latest launch; null before the first launch and after
+    // Reset.
     boost::shared_ptr<consoleapp::ExecutionData> GetExecutionData();
 
     State GetStateLocked(Lock& lock, double maxWaitSeconds);
@@ -158,7 +161,7 @@ protected:
 private:
     using LaunchNumber = std::uint64_t;
 
-    void ReadyLauncherLocked();
+    void PrepareLauncherLocked();
     bool HasEventLocked() const;
     LaunchNumber GetLaunchNumber();
     State WaitForEnd(LaunchNumber launch, int& exitCode, double deadline);
@@ -199,9 +202,9 @@ private:
     boost::shared_ptr<ThreadEnd> fThreadEnd;     // of fLauncherThread, while that holds a thread
     boost::shared_ptr<ThreadEnd> fGivenUpThread; // of the latest thread that was given up
 
-    // Held to join fLauncherThread once it has ended, or to give it up; never to wait for its end.
-    // Taken before fMutex. Launch alone sets fLauncherThread without it, but with fMutex, while
-    // the state is Idle: no other thread uses it then.
+    // Locked to join fLauncherThread after its end or to give it up, never while waiting for its
+    // end. Locked before fMutex. Only Launch sets fLauncherThread without this lock, but with
+    // fMutex, while the state is Idle and no other thread uses it.
     boost::mutex fJoinMutex;
 };
 

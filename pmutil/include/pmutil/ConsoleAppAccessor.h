@@ -1,5 +1,5 @@
-// The guarded way to a ConsoleApp for everything that may outlive it: each use looks first whether
-// it is still there. One object serves one thread; a thread gets a copy of its own.
+// Access to a ConsoleApp for objects that may outlive it: each function checks first whether the
+// application still exists. Use an object on one thread only; copy it for another.
 #pragma once
 
 #include <cstddef>
@@ -21,22 +21,23 @@ public:
     ConsoleAppAccessor& operator=(const ConsoleAppAccessor& other);
     virtual ~ConsoleAppAccessor();
 
-    // Each operation that needs the application throws consoleapp::Exception "no ExecutionData"
-    // before a launch and "no console app" when the application is gone or was reset.
+    // Every function that requires the application throws consoleapp::Exception "no ExecutionData"
+    // before a launch, and "no console app" if the application was destroyed or reset.
 
     boost::shared_ptr<ConsoleApp> GetConsoleApp() const;
     boost::shared_ptr<consoleapp::ExecutionData> GetExecutionData() const;
 
-    // Throws consoleapp::Exception "no output task" if the task is gone.
+    // Throws consoleapp::Exception "no output task" if the task was destroyed.
     boost::shared_ptr<OutputTask> GetOutputTask(OutputChannel channel) const;
 
-    // The thread's id and this party, such as "1f2e(app.stdout)".
+    // Returns the current thread's id and this party, such as "1f2e(app.stdout)".
     std::string GetThreadLabel() const;
 
-    // The application's state, Idle if there is none. Waits for the default state wait, whatever
-    // the argument.
+    // Returns the application's state, Idle if there is none. Waits up to the default state wait
+    // and ignores the argument.
     State GetState(double maxWaitSeconds);
 
+    // As those of ConsoleApp.
     void Reset();
     void Launch(const boost::shared_ptr<consoleapp::ExecutionData>& data,
                 const LaunchParams& params);
@@ -50,17 +51,17 @@ public:
     void ThrowIfInjected(Fault fault, const char* caller);
     void SetInjectedFault(Fault fault);
 
-    // Stores a failure for the client; if the application is gone, the log is all that tells of it.
+    // Stores a failure for the client. If the application doesn't exist, only logs it.
     void NotifyFailure(const consoleapp::Exception& exc) noexcept;
 
-    // For the launcher; another party gets std::runtime_error
+    // For the launcher. For another party they throw std::runtime_error
     // "ConsoleAppAccessor::GetConsoleAppFor wrong TaskID".
     void NotifyLaunching();
     void NotifyLaunched();
     void NotifyRunning(const LaunchResult& result);
     void NotifyFinished(int exitCode, State state);
 
-    // For the output channels; another party gets std::runtime_error
+    // For the output channels. For another party they throw std::runtime_error
     // "ConsoleAppAccessor::GetConsoleAppIf condition not ok".
     void NotifyOutputTaskBegin();
     void NotifyOutputTaskEnd();

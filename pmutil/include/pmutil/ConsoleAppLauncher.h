@@ -1,5 +1,5 @@
-// The client's way to launch a console program: gathers the application and what to launch, and
-// drives the launch. Used from the client's thread.
+// Launches a console program for a client: holds the application and the parameters of the launch.
+// Use it on the client's thread.
 //
 //     ConsoleAppLauncher launcher;
 //     launcher.SetConsoleApp(boost::make_shared<ConsoleApp>());
@@ -8,7 +8,7 @@
 //     if (launcher.LaunchAndWait(&exitCode, 10.0) == State::kTimeout)
 //         launcher.Kill();
 //
-// A launcher that launched and was not waited for until the end can't be copied or changed.
+// After a launch, it can't be copied or changed until a Wait has returned the end of the child.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -37,12 +37,12 @@ public:
     boost::shared_ptr<ConsoleApp> GetConsoleApp() const;
 
     // Throws std::runtime_error "ConsoleAppLauncher::Launch: already launched" and
-    // "ConsoleAppLauncher: no ConsoleApp", and what ConsoleApp::Launch throws; after that it counts
-    // as launched until Wait, which answers Idle.
+    // "ConsoleAppLauncher: no ConsoleApp", and the failures of ConsoleApp::Launch; after the latter
+    // the object counts as launched until Wait, which returns Idle.
     void Launch();
 
-    // As ConsoleApp's, but Idle before a launch. Any result but Timeout makes this object ready for
-    // the next launch.
+    // As those of ConsoleApp; Wait returns Idle before a launch. After any result but Timeout the
+    // object can launch again.
     State Wait(int* exitCode, double maxWaitSeconds);
     State LaunchAndWait(int* exitCode, double maxWaitSeconds);
     void Kill();

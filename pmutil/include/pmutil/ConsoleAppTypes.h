@@ -1,5 +1,4 @@
-// What the parties of a supervised launch say to each other: who they are, in which state the
-// launch is, what is to be launched, and what failed.
+// The types of a supervised launch: its parties, its states, its parameters and its failures.
 #pragma once
 
 #include <cstdint>
@@ -28,11 +27,11 @@ enum class TaskID : std::int32_t {
     kLauncher = 3
 };
 
-// The parties that consume the child's output. Every operation that takes one throws
+// The parties that read the child's output. Every function with such a parameter throws
 // std::runtime_error "invalid OutputChannel" for any other value.
 enum class OutputChannel : std::int32_t { kStdout = 1, kStderr = 2 };
 
-// Arrays indexed by TaskID, of which the entries for the two output channels are used.
+// The size of arrays indexed by TaskID in which only the two output channels are used.
 inline constexpr int kOutputSlots = 3;
 
 enum class State : std::int32_t {
@@ -49,7 +48,7 @@ enum class State : std::int32_t {
     kTimeout = 9
 };
 
-// True for the states at which a wait for a state ends: Idle, Running, Finished, Crashed, Killed.
+// Returns whether a wait for a state ends at `state`: Idle, Running, Finished, Crashed or Killed.
 bool IsStable(State state);
 
 // The points of a launch that can be made to fail.
@@ -66,33 +65,33 @@ enum class Fault : std::int32_t {
     kLauncherKill = 9
 };
 
-// Each prints under its name, such as "Launcher", and an unknown value as "TaskID(7)".
+// Print the name of the value, such as "Launcher", and an unknown value as "TaskID(7)".
 std::ostream& operator<<(std::ostream& out, TaskID id);
 std::ostream& operator<<(std::ostream& out, OutputChannel channel);
 std::ostream& operator<<(std::ostream& out, State state);
 std::ostream& operator<<(std::ostream& out, Fault fault);
 
-// The channel as an index and as a party, checked.
+// Convert between a channel, its index and its party.
 int GetOutputIndex(OutputChannel channel);
 TaskID GetTaskID(OutputChannel channel);
 OutputChannel GetOutputChannel(TaskID id);
 
-// What to launch, and who consumes its output.
-// NOLINTNEXTLINE(bugprone-reserved-identifier): the compiler's own, which copies the array
+// The program to launch, and the tasks that read its output.
+// NOLINTNEXTLINE(bugprone-reserved-identifier): in code that the compiler generates for the array
 class LaunchParams {
 public:
     LaunchParams() = default;
     LaunchParams(boost::shared_ptr<OutputTask> stdoutTask, boost::shared_ptr<OutputTask> stderrTask,
                  std::deque<std::string> args, std::wstring program);
 
-    // Empty if nobody consumes the channel: its pipe is closed then once the child runs, so that a
-    // child that writes to it fails to, or on Linux dies of SIGPIPE.
+    // Without a task, the channel's pipe is closed as soon as the child runs: the child's writes
+    // fail, and on Linux SIGPIPE ends it by default.
     boost::shared_ptr<OutputTask> GetOutputTask(OutputChannel channel) const;
     void SetOutputTask(OutputChannel channel, boost::shared_ptr<OutputTask> task);
 
     std::wstring fProgram;         // the program's path
     std::deque<std::string> fArgs; // its arguments, without the program's name
-    bool fKeepStdin = false;       // the client writes to the child's standard input
+    bool fKeepStdin = false;       // keep the child's standard input open for the client
 
 private:
     boost::shared_ptr<OutputTask> fOutputTasks[kOutputSlots];
@@ -100,8 +99,8 @@ private:
 
 namespace consoleapp {
 
-// A failure of one party of a launch. The text is the party's name, ": " and the message, or
-// "<nullptr>" for a null one.
+// A failure of one party of a launch. The text is the party's name, ": " and the message
+// ("<nullptr>" for a null message).
 class Exception : public std::runtime_error {
 public:
     Exception(TaskID id, const char* message);
@@ -112,8 +111,8 @@ private:
     TaskID fTaskID;
 };
 
-// The link by which the threads of one launch reach the application and the output tasks. It keeps
-// neither alive. Any thread may use it.
+// The reference of the threads of one launch to the application and the output tasks. Owns neither.
+// Any thread may use it.
 class ExecutionData {
 public:
     ExecutionData(boost::weak_ptr<ConsoleApp> app, boost::weak_ptr<OutputTask> stdoutTask,
@@ -121,17 +120,17 @@ public:
     ExecutionData(const ExecutionData&) = delete;
     ExecutionData& operator=(const ExecutionData&) = delete;
 
-    // Empty if the application is gone or was reset. Clearing it gives the launch up, and with it a
-    // start that is not over yet.
+    // Returns null if the application was destroyed or reset. ClearConsoleApp gives the launch up;
+    // a start that isn't over fails.
     boost::shared_ptr<ConsoleApp> GetConsoleApp() const;
     void ClearConsoleApp();
     bool HasConsoleApp() const;
 
-    // Empty if the task is gone.
+    // Returns null if the task was destroyed.
     boost::shared_ptr<OutputTask> GetOutputTask(OutputChannel channel) const;
     void SetOutputTask(OutputChannel channel, boost::weak_ptr<OutputTask> task);
 
-    // Ended by the launcher's thread.
+    // The launcher's thread ends the start.
     LaunchStart& GetStart() { return fStart; }
 
 private:

@@ -1,5 +1,5 @@
-// The start of one launch: from the call until the child runs and its output tasks were seen
-// running, or until it fails. Any thread may use it.
+// The start of one launch: lasts until the child and its output tasks run, or until the launch
+// fails. Any thread may use it.
 #pragma once
 
 #include <boost/thread/condition_variable.hpp>
@@ -12,13 +12,14 @@ public:
     enum class Result {
         kPending, // not over yet
         kRunning, // the child runs, or has run
-        kFailed   // the launch failed or was given up before
+        kFailed   // the launch failed or was given up before the child ran
     };
 
-    // Waits up to `maxWaitSeconds` for the end of the start; infinity: without limit.
+    // Waits up to `maxWaitSeconds` for the end of the start, without a limit for infinity. Returns
+    // kPending on timeout.
     Result Await(double maxWaitSeconds) const;
 
-    // Ends the start, and all waits for it. A start ends once: later calls change nothing.
+    // Ends the start and all waits for it. Later calls have no effect.
     void End(Result result);
 
 private:

@@ -1,5 +1,5 @@
-// The platform's side of a launch: starts a program with its standard streams on pipes, waits for
-// it, kills it.
+// The system calls of a launch: starts a program with pipes as its standard streams, waits for it,
+// kills it.
 #pragma once
 
 #include <deque>
@@ -22,8 +22,8 @@ struct LaunchResult { // NOLINT(bugprone-reserved-identifier): clang's name for 
 // How a child ended.
 enum WaitResult : int { kEndedNormally = 0, kEndedByCrash = 1, kEndedByKill = 2 };
 
-// Serves one launch at a time, and any number in turn: Wait and Kill mean the latest child.
-// Failures throw std::runtime_error with the name of the system's call.
+// One launch at a time, any number in sequence: Wait and Kill apply to the latest child. A failure
+// throws std::runtime_error with the name of the system call.
 class Launcher {
 public:
     Launcher() = default;
@@ -31,26 +31,25 @@ public:
     Launcher(const Launcher&) = delete;
     Launcher& operator=(const Launcher&) = delete;
 
-    // Starts the program. The child gets the environment and the current directory of this process,
-    // and the other ends of three new pipes, which this process doesn't keep.
+    // Starts the program. The child inherits the environment and the current directory, and gets
+    // the other ends of three new pipes; this process closes those.
     virtual LaunchResult Launch(const std::wstring& program,
                                 const std::deque<std::string>& args) = 0;
 
-    // Waits without limit until the child ends. `exitCode` gets its code, 0 to 255, if it ended
-    // normally, and is left alone otherwise.
+    // Waits without a limit for the end of the child. Sets `*exitCode` to its exit code, 0 to 255,
+    // only if it ended normally.
     virtual WaitResult Wait(int* exitCode) = 0;
 
-    // Ends the child by force; one that is gone already is no error. Any thread may call it, and
-    // more than once.
+    // Kills the child; does nothing if it has ended. Any thread may call it, also repeatedly.
     virtual void Kill() = 0;
 };
 
-// The launcher of this platform.
+// Returns a new launcher of this platform.
 boost::shared_ptr<Launcher> MakeLauncher();
 
-// What ended the latest child of this platform's launcher, if it was no exit code of 0 to 255:
-// "signal 11 (Segmentation fault)" or "code 0xC0000005". Empty before the end was waited for, and
-// for any other launcher. Any thread may ask.
+// Returns what ended the latest child of a launcher of this platform, such as "signal 11
+// (Segmentation fault)" or "code 0xC0000005". Empty after an exit code of 0 to 255, before Wait has
+// returned, and for other launchers. Any thread may call it.
 std::string GetTerminationText(const Launcher& launcher);
 
 } // namespace pmutil

@@ -1,7 +1,7 @@
-// Starts, awaits and kills children by posix_spawn and process descriptors.
+// Launches, waits for and kills children with posix_spawn and process descriptors.
 //
-// The child gets default signal dispositions, an empty signal mask, and no descriptor but its three
-// pipes. Its end by a signal counts as a crash, or as killed if Kill was called.
+// The child has default signal dispositions, an empty signal mask, and no descriptors but its three
+// pipes. If a signal ends it, it crashed, or was killed if Kill was called.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -15,27 +15,27 @@ class ChildProcess;
 
 class LauncherPosix : public Launcher {
 public:
-    // The process group of a child. A signal that a process sends to its own group (kill(0, ...))
-    // reaches the host too where the child has the host's group, as by default.
+    // The process group of a child. In the host's group, which is the default, a signal that the
+    // child sends to its group (kill(0, ...)) also reaches the host.
     enum class Group { kOfHost, kOwn };
 
     explicit LauncherPosix(Group group = Group::kOfHost);
     ~LauncherPosix() override;
 
-    // `program` is used in UTF-8, without a search; arguments are passed byte by byte. A failed
-    // start throws with the call, the path and the system's text:
-    // "posix_spawn failed: /bin/thing: No such file or directory". So it does where the host
-    // ignores SIGCHLD, and the system would throw away how children end.
+    // Converts `program` to UTF-8 and doesn't search the PATH; passes the arguments unchanged. If
+    // the start fails, throws std::runtime_error with the call, the path and the system's text,
+    // such as "posix_spawn failed: /bin/thing: No such file or directory". Fails also if the host
+    // ignores SIGCHLD, since the system then discards the exit statuses of children.
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override;
 
-    // Throws std::runtime_error "waitid failed: No child processes" where something else in the
-    // host has reaped the child, such as a handler that waits for any child, however early. A Kill
-    // signals nothing from then on: the child's number may be another process's.
+    // Throws std::runtime_error "waitid failed: No child processes" if other code of the host has
+    // reaped the child, such as a handler that waits for any child. After that Kill sends no
+    // signal, because the process id may belong to another process.
     WaitResult Wait(int* exitCode) override;
     void Kill() override;
 
-    // The number of the signal that ended the latest child; 0 if none did, or the child wasn't
-    // waited for yet.
+    // Returns the number of the signal that ended the latest child; 0 if none did, or before Wait
+    // has returned.
     int GetTermSignal() const;
 
 private:
@@ -45,7 +45,7 @@ private:
 
     const Group fGroup;
     mutable boost::mutex fMutex;
-    boost::shared_ptr<ChildProcess> fChild; // that of the latest launch
+    boost::shared_ptr<ChildProcess> fChild; // of the latest launch
 };
 
 } // namespace pmutil

@@ -1,13 +1,14 @@
-// Starts, awaits and kills children by CreateProcessW.
+// Launches, waits for and kills children with CreateProcessW.
 //
-// The child inherits its three pipes and no other handle, inheritable or not.
+// The child inherits its three pipes and no other handle.
 //
 // A child that ends with a code of 256 or more crashed, or was killed if Kill was called.
 //
-// Each argument is put in double quotation marks, or in apostrophes if it holds a double quotation
-// mark and no apostrophe; the quote inside gets a backslash. The usual C runtime, in the child,
-// knows nothing of apostrophes and takes backslashes before a quotation mark for its own, so that
-// an argument with quotation marks, or with a backslash at its end, arrives changed.
+// Each argument is enclosed in double quotation marks, or in apostrophes if it has a double
+// quotation mark and no apostrophe; the same quote inside is escaped by a backslash. The usual C
+// runtime of a child doesn't support apostrophes, and treats backslashes before a quotation mark as
+// escapes. Therefore the child gets a different argument if it has quotation marks or ends with a
+// backslash.
 #pragma once
 
 #include <atomic>
@@ -22,15 +23,16 @@ public:
     LauncherWin();
     ~LauncherWin() override;
 
-    // `program` goes first on the command line as it stands: one with blanks must come quoted.
+    // Begins the command line with `program` unchanged: the caller must quote a path with blanks.
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override;
     WaitResult Wait(int* exitCode) override;
     void Kill() override;
 
-    // The code with which the latest child ended, whatever it says; 0 before it was waited for.
+    // Returns the code with which the latest child ended, also after a crash or a kill; 0 before
+    // Wait has returned.
     std::uint32_t GetRawExitCode() const { return fRawExitCode; }
 
-    // The command line that Launch makes.
+    // Returns the command line that Launch uses.
     static std::wstring MakeCommandLine(const std::wstring& program,
                                         const std::deque<std::string>& args);
 

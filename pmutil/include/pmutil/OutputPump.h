@@ -1,8 +1,8 @@
-// An output task that hands what the child writes to a function.
+// An output task that passes the child's output to a function.
 //
-// It reads until the end of the data, and doesn't return before the start of the launch is over,
-// however early the child ends. A client with a task of its own calls AwaitStart at the end of
-// DoRun for the same effect.
+// Its DoRun reads until the end of the data, and doesn't return before the start of the launch is
+// over, even if the child ends early. A client's own task must call AwaitStart at the end of DoRun
+// instead.
 #pragma once
 
 #include <cstddef>
@@ -13,22 +13,22 @@
 
 namespace pmutil {
 
-// Takes a channel's bytes, block by block as they come, and an empty block at the end of the data.
-// The block lasts as long as the call. Called on the channel's own thread; if one function takes
-// both channels, two threads call it at the same time.
+// Consumes a channel's bytes in blocks as they arrive, and an empty block at the end of the data.
+// The block is valid during the call. Called on the channel's thread; a function for both channels
+// is called by two threads at the same time.
 //
-// While it runs, nothing is read: a child that fills the pipe waits. An exception closes the pipe;
-// it is stored as a failure of the launch, "stdout: " and its text, which the client's next wait
-// throws. A task that was given up goes on to call the function as long as bytes come: it must own
-// what it uses.
+// Nothing is read during the call: a child that fills the pipe waits. If the function throws, the
+// pipe is closed, and "stdout: " and the text are stored as a failure of the launch, which the
+// client's next wait throws. A task that was given up continues to call the function as long as
+// bytes arrive, so the function must own the objects that it uses.
 using TakeBytes = std::function<void(std::string_view block)>;
 
-// Takes a line without its end.
+// Consumes a line without its end.
 using TakeLine = std::function<void(std::string_view line)>;
 
 class OutputPump : public OutputTask {
 public:
-    // An empty function drops the bytes.
+    // With an empty function, discards the bytes.
     explicit OutputPump(TakeBytes take);
 
 protected:
@@ -40,10 +40,10 @@ private:
     const TakeBytes fTake;
 };
 
-// A function for OutputPump that hands on whole lines, as soon as their end has come. A line ends
-// with "\n" or "\r\n", and the last one at the end of the data at the latest. A longer line than
-// `maxBytes` (at least 1) comes in pieces of that size. The result serves one channel; its copies
-// share the begun line.
+// Returns a function for OutputPump that calls `take` with each line as soon as it is complete. A
+// line ends with "\n" or "\r\n", or at the end of the data. A line longer than `maxBytes` (at least
+// 1) is split into pieces of that size. Use the result for one channel; its copies share the
+// incomplete line.
 TakeBytes ByLine(TakeLine take, std::size_t maxBytes = std::size_t{1} << 20);
 
 } // namespace pmutil

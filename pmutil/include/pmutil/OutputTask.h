@@ -1,10 +1,9 @@
-// The consumer of one output channel of a child. Clients override DoRun, which reads from
-// GetReader() until the end of the data.
+// Reads one output channel of a child. Clients override DoRun, which reads from GetReader() until
+// the end of the data.
 //
-// The launch looks for the task to be running before it goes on, and fails with "never started" if
-// DoRun has come and gone by then, which a child that ends at once may bring about. So a DoRun
-// calls AwaitStart once it has read everything. OutputPump does all this for a function that takes
-// the bytes.
+// The launch waits until the task runs, and fails with "never started" if DoRun has returned
+// before, which may happen if the child ends at once. Therefore DoRun must call AwaitStart after
+// reading. OutputPump does this and passes the bytes to a function.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -22,26 +21,26 @@ public:
     OutputTask(TaskID channel, boost::shared_ptr<consoleapp::ExecutionData> data,
                boost::shared_ptr<Reader> reader);
 
-    // Throw std::runtime_error "OutputTask::AssignLocked: task is running" if `other` is.
+    // Throw std::runtime_error "OutputTask::AssignLocked: task is running" if `other` is running.
     OutputTask(const OutputTask& other);
     OutputTask& operator=(const OutputTask& other);
     ~OutputTask() override;
 
-    // Readies the task for a launch. Throws std::runtime_error "OutputTask::Prepare: task is
-    // running", and changes nothing, until Run has returned: a task whose DoRun was given up serves
-    // no other launch before.
+    // Prepares the task for a launch. Throws std::runtime_error "OutputTask::Prepare: task is
+    // running" without effect until Run has returned, also in a launch that was given up.
     void Prepare(OutputChannel channel, boost::shared_ptr<consoleapp::ExecutionData> data,
                  boost::shared_ptr<Reader> reader);
 
-    // DoBegin, DoRun and DoEnd in turn; closes the reader in any case. With a launch, throws
-    // consoleapp::Exception "no output task" if the task was readied for another, or discarded.
+    // Calls DoBegin, DoRun and DoEnd; closes the reader also after an exception. With a launch,
+    // throws consoleapp::Exception "no output task" if the task was prepared for another one, or
+    // discarded.
     void Run(const consoleapp::ExecutionData* launch = nullptr);
 
-    // Closes the reader if the task was readied for this launch and Run wasn't called since; a Run
-    // for this launch that comes later is refused.
+    // Closes the reader if the task was prepared for this launch and Run wasn't called since. A
+    // later Run for this launch throws.
     void Discard(const consoleapp::ExecutionData* launch) noexcept;
 
-    // Whether the task runs. Waits up to `maxWaitSeconds` for one that doesn't.
+    // Waits up to `maxWaitSeconds` until the task runs. Returns whether it does.
     bool IsRunning(double maxWaitSeconds);
     void SetIsRunning(bool value);
 
@@ -51,11 +50,11 @@ protected:
     virtual void DoEnd(Lock& lock);
     virtual void CloseReader(Lock& lock);
 
-    // The parent's end of the pipe; empty before a launch and after it.
+    // Returns the parent's end of the pipe; null before and after a launch.
     boost::shared_ptr<Reader> GetReader();
 
-    // Returns when the start of the launch that the task serves is over: the child runs, or the
-    // launch has failed or was given up. At once without a launch.
+    // Waits until the start of the task's launch is over: until the child runs, or until the launch
+    // fails or is given up. Returns at once without a launch.
     void AwaitStart();
 
     bool IsRunningLocked(Lock& lock, double maxWaitSeconds);
@@ -65,8 +64,8 @@ private:
 
     boost::shared_ptr<Reader> fReader;
     bool fIsRunning = false;
-    bool fIsReadied = false; // from Prepare until Run
-    bool fIsInRun = false;   // from the begin of Run until it returns
+    bool fIsPrepared = false; // from Prepare until Run
+    bool fIsInRun = false;    // from the begin of Run until it returns
 };
 
 } // namespace pmutil

@@ -1,5 +1,5 @@
-// A ConsoleApp for clients without notifications of their own. Any thread may wait for the start of
-// a launch to be over, for example before it writes to the child's standard input.
+// A ConsoleApp for clients that need no notifications. Any thread may wait for the end of the
+// start, for example before it writes to the child's standard input.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -10,19 +10,18 @@ namespace pmutil {
 
 class StartAwareApp : public ConsoleApp {
 public:
-    // Launches with the platform's launcher.
+    // Uses the platform's launcher.
     StartAwareApp();
 
-    // Launches with `launcher`; `makeLauncher` makes another one where a launch that was given up
-    // still uses it.
+    // Uses `launcher`, or a new one of `makeLauncher` if a launch that was given up still uses it.
     explicit StartAwareApp(const boost::shared_ptr<Launcher>& launcher,
                            LauncherFactory makeLauncher = nullptr);
 
-    // Waits up to `maxWaitSeconds` (infinity: without limit) for the end of the latest launch's
-    // start: kRunning once OnRunning has returned, kFailed if the launch failed or was given up
-    // before, kPending if the time ran out. kFailed at once if there is no launch: before the first
-    // one, and after a Reset or a Launch that threw. Throws nothing that a launch has stored, and
-    // changes no state. Any thread may call.
+    // Waits up to `maxWaitSeconds` (infinity: without a limit) for the end of the latest launch's
+    // start. Returns kRunning after OnRunning has returned, kFailed if the launch failed or was
+    // given up before that, and kPending on timeout. Returns kFailed at once if there is no launch:
+    // before the first one, and after Reset or a Launch that threw. Doesn't throw stored failures
+    // and doesn't change the state. Any thread may call it.
     consoleapp::LaunchStart::Result AwaitStart(double maxWaitSeconds);
 };
 

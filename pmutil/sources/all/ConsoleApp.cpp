@@ -24,14 +24,14 @@ using JoinLock = boost::lock_guard<boost::mutex>;
 
 namespace {
 
-// The names tell how each value becomes seconds.
+// The names say how each value is converted to seconds.
 DebugValue gDefaultWaitSecondsMinus10{"ConsoleAppDefaultWaitSecondsMinus10", 0};
 DebugValue gShortWaitSecondsMinusOne{"ConsoleAppShortWaitSecondsMinusOne", 0};
 DebugValue gDefaultStateWaitSecondsTimesTenMinus1{"ConsoleAppDefaultStateWaitSecondsTimesTenMinus1",
                                                   0};
 
-// More than a thread needs to exit after its ThreadEnd was set.
-constexpr double kThreadExitSeconds = 10.0;
+// The maximum time between the end of a ThreadEnd and the exit of its thread, far above the usual.
+constexpr double kMaxThreadExitSeconds = 10.0;
 
 constexpr char kNotOpen[] = "pmutil::Channel not open";
 
@@ -40,13 +40,13 @@ const char* GetText(const std::exception* exc)
     return exc != nullptr ? exc->what() : "?";
 }
 
-// Whether a launch wasn't given up; null stands for the present one.
+// Returns false if the launch was given up. Null is the current launch.
 bool IsLinked(const ExecutionData* launch)
 {
     return launch == nullptr || launch->HasConsoleApp();
 }
 
-// The threads of the launch reach neither the application nor the tasks any more.
+// Removes the access of the launch's threads to the application and to the tasks.
 void Unlink(const boost::shared_ptr<ExecutionData>& data)
 {
     if (data == nullptr)
@@ -77,7 +77,7 @@ ConsoleApp::~ConsoleApp()
     try {
         Reset();
     } catch (...) {
-        // The members' destructors let go of what is left.
+        // The members' destructors release the rest.
     }
 }
 
@@ -101,11 +101,12 @@ void ConsoleApp::Launch(const boost::shared_ptr<ExecutionData>& data, const Laun
     Lock lock(fMutex);
     if (fState != State::kIdle)
         throw std::runtime_error("ConsoleApp: must be idle");
-    ReadyLauncherLocked();
+    PrepareLauncherLocked();
     const LaunchNumber launch = ++fLaunchNumber;
     try {
         SetStateLocked(lock, State::kLaunching);
-        // A pump of the last launch may go on though its launcher's thread was joined.
+        // An output task of the last launch may still run, even if the launcher's thread was
+        // joined.
         if (fExecutionData != data)
             Unlink(fExecutionData);
         fExecutionData = data;
@@ -133,8 +134,8 @@ void ConsoleApp::Launch(const boost::shared_ptr<ExecutionData>& data, const Laun
     }
 }
 
-// Makes a new fLauncher if a launch that was given up still uses the present one.
-void ConsoleApp::ReadyLauncherLocked()
+// Replaces fLauncher if a launch that was given up still uses it.
+void ConsoleApp::PrepareLauncherLocked()
 {
     if (fGivenUpThread != nullptr && !fGivenUpThread->HasEnded()) {
         if (!fMakeLauncher)
@@ -150,7 +151,7 @@ void ConsoleApp::LaunchHandleException(Lock& lock, const std::exception* exc,
 {
     PM_LOG(gConsoleAppLog, "ConsoleApp::LaunchHandleException exc="
                                << GetText(exc) << " joinWaitSEconds=" << joinWaitSeconds);
-    // An interruption would take the failure's place.
+    // An interruption would replace the failure.
     const boost::this_thread::disable_interruption uninterrupted;
     lock.unlock();
     bool joined = false;
@@ -197,16 +198,17 @@ ConsoleApp::LaunchNumber ConsoleApp::GetLaunchNumber()
     return fLaunchNumber;
 }
 
-// The last part of Wait, after which the object is Idle; false if the launcher's thread won't end.
+// The last part of Wait: joins the launcher's thread and sets the state to Idle. Returns false if
+// the thread didn't end and was given up.
 bool ConsoleApp::JoinAfterEnd(LaunchNumber launch, double deadline)
 {
-    if (IsOver(launch)) // another thread's wait was first
+    if (IsOver(launch)) // another thread has joined it
         return true;
     const double joinWait = std::min(GetTimeLeft(deadline), GetShortWaitSeconds());
     PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread.TimedJoin(" << joinWait << ")");
     const bool ended = AwaitThreadEnd(launch, joinWait);
     const JoinLock joinLock(fJoinMutex);
-    // If another thread joined it or gave it up, the end that was seen counts all the same.
+    // If another thread has joined it or given it up, the child's end is still reported.
     if (HoldsThread(launch) && (!ended || !JoinEndedThread(launch))) {
         PM_LOG(gConsoleAppLog, "ConsoleApp::Wait fLauncherThread never finished");
         GiveThreadUp();
@@ -217,23 +219,23 @@ bool ConsoleApp::JoinAfterEnd(LaunchNumber launch, double deadline)
     return true;
 }
 
-// Whether the launcher's thread of this launch was neither joined nor given up. With fJoinMutex
-// held, true stays true.
+// Returns whether the launcher's thread of this launch was neither joined nor given up. While
+// fJoinMutex is locked, true doesn't change.
 bool ConsoleApp::HoldsThread(LaunchNumber launch)
 {
     const Lock lock(fMutex);
     return fLaunchNumber == launch && fThreadEnd != nullptr;
 }
 
-// Whether another thread has joined or reset the launch already.
+// Returns whether another thread has joined or reset the launch.
 bool ConsoleApp::IsOver(LaunchNumber launch)
 {
     const Lock lock(fMutex);
     return fLaunchNumber != launch || fState == State::kIdle;
 }
 
-// Waits for the end of the launcher's thread of this launch; false if it doesn't end, or isn't
-// held. No lock is held meanwhile, so that any number of threads may wait.
+// Waits for the end of the launcher's thread of this launch. Returns false if it didn't end, or if
+// there is none. Holds no lock while waiting, so that any number of threads can wait.
 bool ConsoleApp::AwaitThreadEnd(LaunchNumber launch, double seconds)
 {
     boost::shared_ptr<ThreadEnd> end;
@@ -245,21 +247,22 @@ bool ConsoleApp::AwaitThreadEnd(LaunchNumber launch, double seconds)
     return end != nullptr && end->Await(seconds);
 }
 
-// With fJoinMutex held, after AwaitThreadEnd. False if the thread isn't held any more.
+// Requires fJoinMutex locked and a successful AwaitThreadEnd. Returns false if another thread has
+// joined it or given it up.
 bool ConsoleApp::JoinEndedThread(LaunchNumber launch)
 {
     if (!HoldsThread(launch))
         return false;
     const boost::this_thread::disable_interruption uninterrupted;
-    if (!fLauncherThread.TimedJoin(kThreadExitSeconds))
+    if (!fLauncherThread.TimedJoin(kMaxThreadExitSeconds))
         return false;
     const Lock lock(fMutex);
     fThreadEnd.reset();
     return true;
 }
 
-// With fJoinMutex held: the launcher's thread goes on with its launcher, and no thread waits for
-// it.
+// Requires fJoinMutex locked. The launcher's thread continues with its launcher; no thread waits
+// for its end any more.
 void ConsoleApp::GiveThreadUp()
 {
     fLauncherThread.Abandon();
@@ -271,8 +274,7 @@ void ConsoleApp::GiveThreadUp()
     fThreadEnd.reset();
 }
 
-// The first part of Wait: Finished, Crashed, Killed, of which the first has a code, or Idle, or
-// Timeout if none came.
+// The first part of Wait. Returns Finished, Crashed or Killed with the exit code, Idle, or Timeout.
 State ConsoleApp::WaitForEnd(LaunchNumber launch, int& exitCode, double deadline)
 {
     Lock lock(fMutex);
@@ -303,7 +305,7 @@ State ConsoleApp::WaitForEnd(LaunchNumber launch, int& exitCode, double deadline
     }
 }
 
-// True if something came that a wait that just ran out of time must not lose.
+// Returns whether there is an event that a wait must report even if it has just timed out.
 bool ConsoleApp::HasEventLocked() const
 {
     return HasEnded(fState) || fState == State::kIdle || !fFailures.empty();
@@ -378,7 +380,7 @@ State ConsoleApp::GetStateLocked(Lock& lock, double maxWaitSeconds)
         const auto duration = ToWaitDuration(GetTimeLeft(deadline));
         const bool woken = !duration.is_not_a_date_time() && fCond.timed_wait(lock, duration);
         if (fLaunchNumber != launch)
-            return State::kIdle; // what was waited for is over
+            return State::kIdle; // the launch that this waits for is over
         if (woken || IsStable(fState) || !fFailures.empty())
             continue;
         PM_LOG(gConsoleAppLog, "ConsoleApp::GetStateLocked timeout, fState=" << fState);
@@ -405,10 +407,10 @@ void ConsoleApp::Reset()
     ResetLaunch(GetLaunchNumber());
 }
 
-// Does nothing if a newer launch has come.
+// Does nothing after a newer launch.
 void ConsoleApp::ResetLaunch(LaunchNumber launch)
 {
-    // It must come to its end: the next launch needs an Idle object.
+    // It must complete: the next launch requires an Idle object.
     const boost::this_thread::disable_interruption uninterrupted;
     boost::shared_ptr<ExecutionData> data;
     {
@@ -483,8 +485,8 @@ void ConsoleApp::WritelnAppStdin(const std::string& str)
     WriteAppStdin(reinterpret_cast<const unsigned char*>(line.data()), line.size());
 }
 
-// Reset unlinks a launch before it takes the mutex to set the state: what passes here before that
-// still belongs to the launch, and Reset overwrites it; what comes later is refused.
+// Reset unlinks a launch before it locks the mutex to set the state. A notification that passes
+// this check before that is overwritten by Reset; a later one throws.
 void ConsoleApp::RequireLinkedLocked(const Lock& /*lock*/, TaskID who,
                                      const ExecutionData* launch) const
 {

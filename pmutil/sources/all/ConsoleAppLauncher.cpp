@@ -23,7 +23,7 @@ ConsoleAppLauncher::ConsoleAppLauncher(const ConsoleAppLauncher& other) : Consol
 ConsoleAppLauncher& ConsoleAppLauncher::operator=(const ConsoleAppLauncher& other)
 {
     if (this != &other) {
-        // The copy is made under the other's lock, and refused after its launch.
+        // The copy constructor locks the other, and throws if it has launched.
         // NOLINTNEXTLINE(performance-unnecessary-copy-initialization)
         const ConsoleAppLauncher copy(other);
         const boost::lock_guard<boost::mutex> lock(fMutex);

@@ -1,4 +1,4 @@
-// The switch of all log statements about launched children.
+// Enables the log statements about launched children.
 #pragma once
 
 #include "pmutil/PMLogging.h"

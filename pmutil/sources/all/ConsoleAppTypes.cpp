@@ -11,11 +11,11 @@ namespace pmutil {
 
 namespace {
 
-// The states of this mask, by value, are stable.
+// The mask of stable states; the bit number is the state's value.
 constexpr unsigned kStableStates = 0x169;
-constexpr unsigned kMostStable = 8;
+constexpr unsigned kMaxStableState = 8;
 
-// Prints an enumerator whose names stand in `names`, beginning with that of the value `first`.
+// Prints the name of an enumerator; names[0] is that of the value `first`.
 template <std::size_t count>
 std::ostream& Print(std::ostream& out, const char* type, const char* const (&names)[count],
                     int first, int value)
@@ -37,7 +37,7 @@ std::string MakeText(TaskID id, const char* message)
 bool IsStable(State state)
 {
     const auto value = static_cast<unsigned>(state);
-    return value <= kMostStable && (kStableStates >> value & 1) != 0;
+    return value <= kMaxStableState && (kStableStates >> value & 1) != 0;
 }
 
 std::ostream& operator<<(std::ostream& out, TaskID id)

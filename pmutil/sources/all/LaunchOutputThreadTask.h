@@ -1,4 +1,4 @@
-// The body of an output thread: runs the channel's OutputTask and stores what goes wrong.
+// The function of an output thread: runs the channel's OutputTask and stores its failure.
 #pragma once
 
 #include "pmutil/ConsoleAppAccessor.h"

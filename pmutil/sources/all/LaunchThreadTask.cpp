@@ -34,7 +34,8 @@ State GetEndState(int result)
     }
 }
 
-// The outputs first: when the child sees the end of its input, those without a task are closed.
+// Releases the outputs first, so that those without a task are closed when the child reads the end
+// of its input.
 void ReleaseEnds(LaunchResult& result)
 {
     for (boost::shared_ptr<Reader>& reader : result.fAppOutput)
@@ -86,15 +87,15 @@ void LaunchThreadTask::operator()()
             task->Discard(fExecutionData.get());
 }
 
-// A start that is not over by now has failed: the output tasks may end.
+// Ends a start that isn't over as failed, so that the output tasks can end.
 void LaunchThreadTask::EndStart()
 {
     if (fExecutionData != nullptr)
         fExecutionData->GetStart().End(LaunchStart::Result::kFailed);
 }
 
-// `mustKill` tells whether the child was started and not yet seen to end. `result` outlives a
-// failure: a child that must be killed doesn't see the end of its input before.
+// Sets `mustKill` while the child runs. `result` belongs to the caller, so that after a failure the
+// child doesn't read the end of its input before it is killed.
 void LaunchThreadTask::RunLaunch(bool& mustKill, LaunchResult& result, Threads& threads)
 {
     NotifyLaunching();
@@ -116,8 +117,8 @@ void LaunchThreadTask::RunLaunch(bool& mustKill, LaunchResult& result, Threads& 
     NotifyRunning(result);
     data->GetStart().End(LaunchStart::Result::kRunning);
 
-    // This thread keeps no end of a pipe: the child sees the end of its input when the client's
-    // writer goes, and a reader's owner decides alone when it is closed.
+    // Release this thread's references to the pipes: the child's input ends when the client closes
+    // its writer, and each reader is closed by its task.
     ReleaseEnds(result);
 
     ThrowIfInjected(Fault::kLauncherWait, "LauncherWait");
@@ -149,7 +150,7 @@ void LaunchThreadTask::StartOutputTask(OutputChannel channel,
                                << channel << "]=" << reader.use_count());
     if (task->IsRunning(ConsoleApp::GetShortWaitSeconds()))
         return;
-    // A failure of the output thread says more.
+    // Prefer the failure of the output thread.
     ThrowIfFailurePending();
     std::ostringstream text;
     text << "LauncherTask: output task " << channel << " never started";
@@ -162,7 +163,7 @@ void LaunchThreadTask::CleanupLaunchThreadTask(bool mustKill, LaunchResult& resu
 {
     PM_LOG(gConsoleAppLog, "LaunchThreadTask::CleanupLaunchThreadTask mustKill=" << mustKill);
     if (mustKill) {
-        // The child must go even if the application, and with it a fault, has gone before.
+        // Kill the child even if the application no longer exists; then there is no fault either.
         const boost::shared_ptr<ConsoleApp> app = GetExecutionData()->GetConsoleApp();
         if (app != nullptr)
             app->ThrowIfInjected(fTaskID, Fault::kLauncherKill, "LauncherKill",

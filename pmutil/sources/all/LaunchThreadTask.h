@@ -1,4 +1,4 @@
-// The body of the launcher thread, which sees a launch from start to end.
+// The function of the launcher's thread: runs a launch from start to end.
 #pragma once
 
 #include "pmutil/ConsoleAppAccessor.h"

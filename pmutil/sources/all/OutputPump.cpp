@@ -13,10 +13,10 @@ namespace {
 
 constexpr std::size_t kBlockBytes = std::size_t{1} << 16;
 
-// Cuts blocks into lines.
-class LineCutter {
+// Splits blocks into lines.
+class LineSplitter {
 public:
-    LineCutter(TakeLine take, std::size_t maxBytes)
+    LineSplitter(TakeLine take, std::size_t maxBytes)
         : fTake(std::move(take)), fMaxBytes(std::max<std::size_t>(maxBytes, 1))
     {}
 
@@ -31,41 +31,42 @@ public:
             TakeToEnd(block.substr(0, end));
             block.remove_prefix(end + 1);
         }
-        // The last byte stays, in case it belongs to the line's end.
-        fBegun.append(block);
-        fBegun.erase(0, fBegun.size() - HandOnPieces(fBegun, fMaxBytes + 1).size());
+        // Keep one byte more than a piece: it may be the "\r" of the line's end.
+        fPartialLine.append(block);
+        const std::size_t rest = TakePieces(fPartialLine, fMaxBytes + 1).size();
+        fPartialLine.erase(0, fPartialLine.size() - rest);
     }
 
 private:
     void TakeToEnd(std::string_view text)
     {
-        std::string begun = std::exchange(fBegun, {});
-        if (!begun.empty())
-            text = begun.append(text);
+        std::string line = std::exchange(fPartialLine, {});
+        if (!line.empty())
+            text = line.append(text);
         if (!text.empty() && text.back() == '\r')
             text.remove_suffix(1);
-        HandOn(text);
+        TakeWholeLine(text);
     }
 
     void TakeRest()
     {
-        const std::string rest = std::exchange(fBegun, {});
+        const std::string rest = std::exchange(fPartialLine, {});
         if (!rest.empty())
-            HandOn(rest);
+            TakeWholeLine(rest);
     }
 
-    void HandOn(std::string_view line)
+    void TakeWholeLine(std::string_view line)
     {
-        const std::string_view last = HandOnPieces(line, fMaxBytes);
-        const bool wasCut = std::exchange(fIsCut, false);
-        if (!wasCut || !last.empty())
+        const std::string_view last = TakePieces(line, fMaxBytes);
+        const bool wasSplit = std::exchange(fIsSplit, false);
+        if (!wasSplit || !last.empty())
             fTake(last);
     }
 
-    // Until no more than `maxRest` bytes are left, which it returns.
-    std::string_view HandOnPieces(std::string_view line, std::size_t maxRest)
+    // Passes on pieces of the line until at most `maxRest` bytes are left; returns these.
+    std::string_view TakePieces(std::string_view line, std::size_t maxRest)
     {
-        for (; line.size() > maxRest; fIsCut = true) {
+        for (; line.size() > maxRest; fIsSplit = true) {
             fTake(line.substr(0, fMaxBytes));
             line.remove_prefix(fMaxBytes);
         }
@@ -74,8 +75,8 @@ private:
 
     const TakeLine fTake;
     const std::size_t fMaxBytes;
-    std::string fBegun;  // a line without its end so far
-    bool fIsCut = false; // a piece of that line was handed on
+    std::string fPartialLine; // the bytes of a line whose end hasn't arrived
+    bool fIsSplit = false;    // a piece of that line was passed on
 };
 
 } // namespace
@@ -104,7 +105,7 @@ void OutputPump::Pump()
         try {
             count = reader->ReadSome(block.data(), block.size());
         } catch (...) {
-            fTake({}); // nothing more comes
+            fTake({}); // the end of the data
             throw;
         }
         fTake({block.data(), static_cast<std::size_t>(count)});
@@ -115,8 +116,8 @@ void OutputPump::Pump()
 
 TakeBytes ByLine(TakeLine take, std::size_t maxBytes)
 {
-    const auto cutter = boost::make_shared<LineCutter>(std::move(take), maxBytes);
-    return [cutter](std::string_view block) { cutter->Take(block); };
+    const auto splitter = boost::make_shared<LineSplitter>(std::move(take), maxBytes);
+    return [splitter](std::string_view block) { splitter->Take(block); };
 }
 
 } // namespace pmutil

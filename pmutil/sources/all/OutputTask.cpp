@@ -29,7 +29,7 @@ OutputTask::OutputTask(const OutputTask& other) : OutputTask()
 OutputTask& OutputTask::operator=(const OutputTask& other)
 {
     if (this != &other) {
-        // The copy is made under the other's lock, and refused while it runs.
+        // The copy constructor locks the other, and throws if it is running.
         // NOLINTNEXTLINE(performance-unnecessary-copy-initialization)
         const OutputTask copy(other);
         const boost::lock_guard<boost::mutex> lock(fMutex);
@@ -60,7 +60,7 @@ void OutputTask::Prepare(OutputChannel channel, boost::shared_ptr<ExecutionData>
     fTaskID = id;
     fExecutionData.swap(data);
     fReader.swap(reader);
-    fIsReadied = true;
+    fIsPrepared = true;
 }
 
 void OutputTask::Run(const ExecutionData* launch)
@@ -70,7 +70,7 @@ void OutputTask::Run(const ExecutionData* launch)
         PM_LOG(gConsoleAppLog, "OutputTask::Run " << fTaskID);
         if (launch != nullptr && launch != fExecutionData.get())
             throw consoleapp::Exception(fTaskID, "no output task");
-        fIsReadied = false;
+        fIsPrepared = false;
         fIsInRun = true;
     }
     try {
@@ -105,12 +105,12 @@ void OutputTask::Discard(const ExecutionData* launch) noexcept
 {
     try {
         Lock lock(fMutex);
-        if (!fIsReadied || launch == nullptr || launch != fExecutionData.get())
+        if (!fIsPrepared || launch == nullptr || launch != fExecutionData.get())
             return;
         fExecutionData.reset();
         CloseReader(lock);
     } catch (...) {
-        // The reader closes with its owner.
+        // The reader's owner closes it.
     }
 }
 

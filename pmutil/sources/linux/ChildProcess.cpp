@@ -19,10 +19,10 @@ namespace pmutil {
 
 namespace {
 
-// How long Kill waits for the end of a child that nobody waits for, to reap it.
-constexpr int kReapMilliseconds = 1000;
+// The maximum time that Kill waits for the end of a child without a waiter, to reap it.
+constexpr int kMaxReapMilliseconds = 1000;
 
-// The C library's own are missing from older ones, and not meant for C++ in others.
+// System calls, because older C libraries lack the functions, and some declare them not for C++.
 int OpenPidfd(::pid_t pid)
 {
     return static_cast<int>(::syscall(SYS_pidfd_open, pid, 0));
@@ -33,8 +33,8 @@ int SendSignal(int pidfd, int number)
     return static_cast<int>(::syscall(SYS_pidfd_send_signal, pidfd, number, nullptr, 0));
 }
 
-// True once the process of `pidfd` has ended, waiting up to `milliseconds`, or without a limit
-// for -1.
+// Waits up to `milliseconds`, or without a limit for -1, for the end of the process. Returns
+// whether it has ended.
 bool PollEnd(int pidfd, int milliseconds)
 {
     pollfd poll{pidfd, POLLIN, 0};
@@ -47,20 +47,20 @@ bool PollEnd(int pidfd, int milliseconds)
     return result > 0;
 }
 
-// Whether it is a child of this process that wasn't reaped yet.
+// Returns whether the id is a child of this process that wasn't reaped.
 bool IsOwnChild(idtype_t type, int id)
 {
     siginfo_t info = {};
     return ::waitid(type, static_cast<id_t>(id), &info, WEXITED | WNOHANG | WNOWAIT) == 0;
 }
 
-// Children that no thread waits for any more. They are reaped at times, so that none stays a zombie
-// for long.
+// Children that no thread waits for. They are reaped from time to time, so that they don't stay
+// zombies.
 class Orphans {
 public:
     static Orphans& Get()
     {
-        static Orphans& orphans = *new Orphans; // threads may outlive statics
+        static Orphans& orphans = *new Orphans; // never destroyed: threads may use it until the end
         return orphans;
     }
 
@@ -101,7 +101,7 @@ ChildProcess::~ChildProcess()
         Orphans::Get().Add(fPidfd);
         Orphans::Get().Reap();
     } catch (...) {
-        // Without memory for it, an ended child stays a zombie until this process ends.
+        // Out of memory: the child stays a zombie until this process ends.
     }
 }
 
@@ -149,7 +149,7 @@ void ChildProcess::Kill()
         return;
     if (SendSignal(fPidfd->GetHandle(), SIGKILL) != 0 && errno != ESRCH)
         ThrowFailed({"pidfd_send_signal", errno});
-    if (!fHasWaiter && PollEnd(fPidfd->GetHandle(), kReapMilliseconds))
+    if (!fHasWaiter && PollEnd(fPidfd->GetHandle(), kMaxReapMilliseconds))
         ReapLocked();
 }
 
@@ -159,7 +159,7 @@ int ChildProcess::GetTermSignal() const
     return fEnd.si_code == CLD_KILLED || fEnd.si_code == CLD_DUMPED ? fEnd.si_status : 0;
 }
 
-// The one place where the process is taken off the system's list. It has ended.
+// Reaps the child, which has ended, and closes the descriptor.
 void ChildProcess::ReapLocked()
 {
     if (!fPidfd->IsOpen())

@@ -1,5 +1,5 @@
-// A child of this process, addressed by its process descriptor, so that no signal can reach another
-// process that has got its number since.
+// A child of this process. Signals are sent to its process descriptor, so that they can't reach
+// another process with the same process id.
 #pragma once
 
 #include <sys/types.h>
@@ -13,41 +13,41 @@
 
 namespace pmutil {
 
-// Wait is for one thread; any may call the rest.
+// Only one thread may call Wait; any thread may call the other functions.
 class ChildProcess {
 public:
     ChildProcess();
 
-    // A child that wasn't waited for is left to itself, and reaped by a later ReapOrphans.
+    // Doesn't end a child that wasn't waited for; a later ReapOrphans reaps it.
     ~ChildProcess();
     ChildProcess(const ChildProcess&) = delete;
     ChildProcess& operator=(const ChildProcess&) = delete;
 
-    // Called once, with a process just started. Where something else in this process has reaped the
-    // child already, the number may be another process's by now: the child is lost then, which Wait
-    // reports, and nothing is signalled. Throws CallFailure if the child can't be followed, and
-    // ends it before.
+    // Takes a child that was just started. Call once. If other code of this process has reaped the
+    // child already, `pid` may be another process: then the child is lost, Wait throws and no
+    // signal is sent. If the descriptor can't be opened, kills the child and throws CallFailure.
     void Adopt(::pid_t pid);
 
     // Throws std::runtime_error, "waitid failed: No child processes" for a lost child.
     WaitResult Wait(int* exitCode);
     void Kill();
 
-    // The number of the signal that ended it; 0 if none did, or its end isn't known.
+    // Returns the number of the signal that ended the child; 0 if none did, or if its end is
+    // unknown.
     int GetTermSignal() const;
 
 private:
     void ReapLocked();
 
     mutable boost::mutex fMutex;
-    boost::shared_ptr<PosixHandle> fPidfd; // closed once the end is known
-    bool fHasWaiter = false;               // from then on only the waiter reaps
+    boost::shared_ptr<PosixHandle> fPidfd; // closed when the child was reaped
+    bool fHasWaiter = false;               // Wait was called; only Wait reaps from then on
     bool fKilled = false;
-    int fError = 0; // why the end will never be known
+    int fError = 0; // errno if the child couldn't be reaped
     siginfo_t fEnd{};
 };
 
-// Reaps the children that nobody waited for and that have ended since.
+// Reaps the children that have ended and whose ChildProcess was destroyed before a Wait.
 void ReapOrphans();
 
 } // namespace pmutil

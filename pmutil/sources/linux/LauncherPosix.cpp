@@ -25,14 +25,15 @@ namespace pmutil {
 
 namespace {
 
-// More than the usual pipe holds, for a child that writes much; what the system allows everybody.
-// Only standard output gets it: a user's pipes share an allowance.
-constexpr int kPipeBytes = 1 << 20;
+// The size of the pipe of standard output, for children that write much: the default of
+// /proc/sys/fs/pipe-max-size. The other pipes keep the usual size, because there is a limit for all
+// pipes of a user.
+constexpr int kOutputPipeBytes = 1 << 20;
 
-// Descriptors below are the child's standard streams, and in its way.
-constexpr int kFirstFree = 3;
+// The first descriptor after the standard streams.
+constexpr int kMinOtherDescriptor = 3;
 
-// One end for the parent and one for the child.
+// A pipe with one end for the parent and one for the child.
 struct ChildPipe {
     boost::shared_ptr<PosixHandle> reader;
     boost::shared_ptr<PosixHandle> writer;
@@ -50,7 +51,7 @@ struct ChildPipe {
 
     void Enlarge() const
     {
-        ::fcntl(writer->GetHandle(), F_SETPIPE_SZ, kPipeBytes); // a smaller pipe does as well
+        ::fcntl(writer->GetHandle(), F_SETPIPE_SZ, kOutputPipeBytes); // optional: ignore a failure
     }
 
 private:
@@ -59,19 +60,20 @@ private:
         return boost::make_shared<PosixHandle>(PosixCalls::GetInvalid(), false);
     }
 
-    // A host without standard streams of its own gets their numbers for the pipe.
+    // In a host whose standard streams are closed, the pipe may get their numbers, which the
+    // child's streams would overwrite.
     static void MoveUp(PosixHandle& end)
     {
-        if (end.GetHandle() >= kFirstFree)
+        if (end.GetHandle() >= kMinOtherDescriptor)
             return;
-        const int moved = ::fcntl(end.GetHandle(), F_DUPFD_CLOEXEC, kFirstFree);
+        const int moved = ::fcntl(end.GetHandle(), F_DUPFD_CLOEXEC, kMinOtherDescriptor);
         if (moved < 0)
             throw CallFailure{"fcntl", errno};
         end.Reset(moved, true);
     }
 };
 
-// What posix_spawn is told about the child's descriptors, signals and process group.
+// The arguments of posix_spawn for the child's descriptors, signals and process group.
 class SpawnOptions {
 public:
     SpawnOptions()
@@ -96,8 +98,11 @@ public:
         Check(::posix_spawn_file_actions_adddup2(&fActions, end.GetHandle(), stream));
     }
 
-    // After all SetStream.
-    void CloseOthers() { Check(::posix_spawn_file_actions_addclosefrom_np(&fActions, kFirstFree)); }
+    // Call after SetStream.
+    void CloseOthers()
+    {
+        Check(::posix_spawn_file_actions_addclosefrom_np(&fActions, kMinOtherDescriptor));
+    }
 
     void ResetSignals()
     {
@@ -110,7 +115,8 @@ public:
         AddFlags(POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSIGMASK);
     }
 
-    void MakeGroup() { AddFlags(POSIX_SPAWN_SETPGROUP); } // numbered as the child, by default
+    // The default group id is the child's process id.
+    void MakeGroup() { AddFlags(POSIX_SPAWN_SETPGROUP); }
 
     const posix_spawn_file_actions_t* GetActions() const { return &fActions; }
     const posix_spawnattr_t* GetAttributes() const { return &fAttributes; }
@@ -148,9 +154,9 @@ void RequireNoZeroByte(const std::string& text)
         throw CallFailure{"posix_spawn", EINVAL};
 }
 
-// Where the host has the system throw away how children end, nobody could tell how this one did,
-// and its number could be another process's before it has a descriptor.
-void RequireEndsAreKept(const std::string& path)
+// Fails if the host makes the system discard the exit statuses of children: the child couldn't be
+// waited for, and its process id could be reused before its descriptor is opened.
+void RequireWaitableChildren(const std::string& path)
 {
     struct sigaction action = {};
     if (::sigaction(SIGCHLD, nullptr, &action) == 0 &&
@@ -189,7 +195,7 @@ LaunchResult LauncherPosix::Launch(const std::wstring& program, const std::deque
 
 LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std::string>& args)
 {
-    RequireEndsAreKept(path);
+    RequireWaitableChildren(path);
     RequireNoZeroByte(path);
     std::vector<char*> argv;
     argv.push_back(const_cast<char*>(path.c_str()));
@@ -215,14 +221,14 @@ LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std:
     if (fGroup == Group::kOwn)
         options.MakeGroup();
 
-    // Made first, so that no failure can come between the process and its owner.
+    // Allocate it first, so that no failure can leave the new process without an owner.
     const auto child = boost::make_shared<ChildProcess>();
     ::pid_t pid = 0;
     const int failure = ::posix_spawn(&pid, path.c_str(), options.GetActions(),
                                       options.GetAttributes(), argv.data(), ::environ);
     if (failure != 0)
         throw CallFailure{"posix_spawn", failure};
-    // The child has its ends; the room is wanted for its process descriptor.
+    // Close the child's ends before Adopt, which needs a free descriptor.
     for (const auto& end : {input.reader, output.writer, error.writer})
         end->Close();
     child->Adopt(pid);

@@ -17,8 +17,8 @@ namespace pmutil {
 
 namespace {
 
-// Codes from here on are no exit codes but say that, and how, a process was ended.
-constexpr DWORD kFirstCrashCode = 256;
+// Larger codes are those of exceptions and of TerminateProcess.
+constexpr DWORD kMaxExitCode = 255;
 constexpr UINT kKilledCode = 257;
 
 [[noreturn]] void ThrowFailed(const char* call)
@@ -26,7 +26,7 @@ constexpr UINT kKilledCode = 257;
     throw std::runtime_error(std::string(call) + " failed");
 }
 
-// One end for the parent and one for the child, both inheritable at first.
+// A pipe with one end for the parent and one for the child. Both are inheritable at first.
 struct ChildPipe {
     boost::shared_ptr<WinHandle> reader;
     boost::shared_ptr<WinHandle> writer;
@@ -53,8 +53,8 @@ void KeepFromChild(const WinHandle& end)
         ThrowFailed("SetHandleInformation");
 }
 
-// The handles that a child gets, of all that could be inherited: another launch's ends among them,
-// while that one makes its own child.
+// The list of the handles that a child inherits. Without it, the child would inherit all
+// inheritable handles, among them the pipes of a simultaneous launch.
 class HandleList {
 public:
     explicit HandleList(const STARTUPINFOW& startup)
@@ -89,8 +89,7 @@ private:
 
 LauncherWin::LauncherWin() = default;
 
-// The handles of a process and its thread stay open until this process ends, so that a Kill at any
-// time finds them valid.
+// The handles of a process and its thread are never closed, so that Kill is valid at any time.
 LauncherWin::~LauncherWin() = default;
 
 std::wstring LauncherWin::MakeCommandLine(const std::wstring& program,
@@ -173,7 +172,7 @@ WaitResult LauncherWin::Wait(int* exitCode)
     if (::GetExitCodeProcess(process, &code) == 0)
         ThrowFailed("GetExitCodeProcess");
     fRawExitCode = code;
-    if (code < kFirstCrashCode) {
+    if (code <= kMaxExitCode) {
         *exitCode = static_cast<int>(code);
         return kEndedNormally;
     }
@@ -195,7 +194,7 @@ boost::shared_ptr<Launcher> MakeLauncher()
 std::string GetTerminationText(const Launcher& launcher)
 {
     const auto* const own = dynamic_cast<const LauncherWin*>(&launcher);
-    if (own == nullptr || own->GetRawExitCode() < kFirstCrashCode)
+    if (own == nullptr || own->GetRawExitCode() <= kMaxExitCode)
         return {};
     std::ostringstream text;
     text << "code 0x" << std::hex << std::uppercase << std::setw(8) << std::setfill('0')
