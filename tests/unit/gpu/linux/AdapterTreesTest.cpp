@@ -93,7 +93,7 @@ TEST_P(AdapterTreesTest, TheJoinGivesTheExpectedDevices)
 TEST_P(AdapterTreesTest, ItsReadMeNamesItsOrigin)
 {
     EXPECT_THAT(ReadAdapterData(GetParam(), "README.md"),
-                AnyOf(HasSubstr("\nWritten after"), HasSubstr("\nRecorded with")));
+                AnyOf(HasSubstr("\nWritten from"), HasSubstr("\nRecorded with")));
 }
 
 using Damage = void (*)(const std::string& path);
