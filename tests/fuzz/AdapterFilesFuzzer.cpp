@@ -1,8 +1,8 @@
 // Feeds any bytes to the parsers of the system's files and checks that their results are valid.
 #include <cstdint>
-#include <cstdlib>
 #include <string>
 
+#include "Require.h"
 #include "linux/gpu/DrmAdapters.h"
 #include "linux/gpu/DrmMemory.h"
 #include "linux/gpu/NvidiaVersion.h"
@@ -13,12 +13,6 @@
 #include "qgf/qgf_core/linux/Uevent.h"
 
 namespace {
-
-void Require(bool holds)
-{
-    if (!holds)
-        std::abort();
-}
 
 bool IsOneLine(const std::string& text)
 {

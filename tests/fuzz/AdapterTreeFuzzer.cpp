@@ -2,23 +2,17 @@
 // that every adapter has the same unique name in all lists.
 #include <algorithm>
 #include <cstdint>
-#include <cstdlib>
 #include <fstream>
 #include <iterator>
 #include <string>
 #include <vector>
 
+#include "Require.h"
 #include "pmutil_gpu/GPUImplWin.h"
 #include "qgf/AdapterName.h"
 #include "support/AdapterTree.h"
 
 namespace {
-
-void Require(bool holds)
-{
-    if (!holds)
-        std::abort();
-}
 
 std::vector<std::string> ReadAll(const std::vector<std::string>& files)
 {

@@ -3,22 +3,16 @@
 // "-help" throws.
 #include <algorithm>
 #include <cstdint>
-#include <cstdlib>
 #include <string>
 #include <vector>
 
 #include "GPUAssayApp.h"
 #include "GPUAssayTester.h"
+#include "Require.h"
 
 namespace {
 
 using assay::GPUAssayApp;
-
-void Require(bool condition)
-{
-    if (!condition)
-        std::abort();
-}
 
 // Records the lines that options print.
 class QuietApp : public GPUAssayApp {

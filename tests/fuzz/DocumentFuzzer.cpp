@@ -2,7 +2,6 @@
 // gives the same report. Any bytes as a document: checks that they are read or rejected with a
 // text.
 #include <cstdint>
-#include <cstdlib>
 #include <sstream>
 #include <stdexcept>
 #include <string>
@@ -10,6 +9,7 @@
 
 #include <nlohmann/json.hpp>
 
+#include "Require.h"
 #include "report/Diff.h"
 #include "report/JsonDocument.h"
 #include "report/ReportReader.h"
@@ -19,12 +19,6 @@ namespace {
 
 using namespace assay_host;
 using Json = nlohmann::ordered_json;
-
-void Require(bool holds)
-{
-    if (!holds)
-        std::abort();
-}
 
 Report ReadReport(std::string_view text)
 {

@@ -2,10 +2,10 @@
 // beyond its limits.
 #include <algorithm>
 #include <cstdint>
-#include <cstdlib>
 #include <string_view>
 #include <vector>
 
+#include "Require.h"
 #include "report/LineForm.h"
 #include "report/Report.h"
 #include "report/ReportReader.h"
@@ -15,12 +15,6 @@ namespace {
 using assay_host::Report;
 using assay_host::ReportLine;
 using assay_host::ReportReader;
-
-void Require(bool holds)
-{
-    if (!holds)
-        std::abort();
-}
 
 bool IsSame(const ReportLine& a, const ReportLine& b)
 {

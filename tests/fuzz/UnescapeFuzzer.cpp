@@ -1,18 +1,12 @@
 // Checks that unescaping accepts any input and reverses escaping.
 #include <cstdint>
-#include <cstdlib>
 #include <string>
 #include <string_view>
 
+#include "Require.h"
 #include "pmutil/Escape.h"
 
 namespace {
-
-void Require(bool holds)
-{
-    if (!holds)
-        std::abort();
-}
 
 std::u16string Widen(std::string_view text)
 {

@@ -8,6 +8,7 @@
 #include "pmutil/PMLogging.h"
 #include "pmutil/System.h"
 #include "pmutil_gpu/GPUImplHardware.h"
+#include "support/CapturedLog.h"
 
 namespace assay {
 namespace {
@@ -285,8 +286,6 @@ TEST(CLKeys, EachFailureSkipsTheRestOfItsDevice)
 
 class OneDevice : public testing::Test {
 protected:
-    void TearDown() override { pmutil::GetDebugValue(pmutil::gGPUAssay) = 0; }
-
     FakeGPU impl = boost::make_shared<FakeGPUImpl>();
     boost::shared_ptr<pmutil::GLGPU> gl = MakeGL(impl);
     boost::shared_ptr<pmutil::CLGPU> cl = MakeCL(impl);
@@ -368,33 +367,23 @@ TEST_F(OneDevice, CUDAVersionIsPrintedOnlyIfThereIsOne)
     EXPECT_EQ(tester.fStep, 3U);
 }
 
-// Keeps the text of log lines.
-class RecordingLogger : public pmutil::PMLogger {
-public:
-    RecordingLogger() : PMLogger("keeping") {}
-    std::string GetPrefix(const char*, int) override { return ""; }
-    void Write(const char* data, std::size_t size) override { text.append(data, size); }
-    std::string text;
-};
-
 TEST_F(OneDevice, TheBandwidthMeasurementIsALogScope)
 {
-    pmutil::InitLogging();
-    const RecordingLogger logger;
+    const assay_test::CapturedLog log(pmutil::gGPUAssay);
     std::string atMeasurement;
-    impl->failures["CLBandwidth"] = [&] { atMeasurement = logger.text; };
+    impl->failures["CLBandwidth"] = [&] { atMeasurement = log.Text(); };
 
     for (const std::int32_t quiet : {0, -1}) {
         pmutil::GetDebugValue(pmutil::gGPUAssay) = quiet;
         tester.DoRunCLBandwidth("t", *cl);
-        EXPECT_EQ(logger.text, "") << quiet;
+        EXPECT_EQ(log.Text(), "") << quiet;
     }
 
     pmutil::GetDebugValue(pmutil::gGPUAssay) = 1;
     tester.DoRunCLBandwidth("t", *cl);
     EXPECT_EQ(atMeasurement, "BEGIN GPUAssayTester::DoRunCLBandwidth\n");
-    EXPECT_THAT(logger.text, StartsWith("BEGIN GPUAssayTester::DoRunCLBandwidth\n"
-                                        "END GPUAssayTester::DoRunCLBandwidth, duration="));
+    EXPECT_THAT(log.Text(), StartsWith("BEGIN GPUAssayTester::DoRunCLBandwidth\n"
+                                       "END GPUAssayTester::DoRunCLBandwidth, duration="));
     EXPECT_THAT(app.out, ElementsAre("t.CLBandwidth=1.23457e+09", "t.CLBandwidth=1.23457e+09",
                                      "t.CLBandwidth=1.23457e+09"));
 }

@@ -10,8 +10,8 @@
 #include "AppFixtures.h"
 #include "GPUTest.h"
 #include "Timestamp.h"
-#include "pmutil/PMLogging.h"
 #include "pmutil_gpu/GPUImplHardware.h"
+#include "support/CapturedLog.h"
 
 namespace assay {
 namespace {
@@ -348,26 +348,15 @@ TEST_F(RunTestTest, ReleasesAFailedDevice)
     EXPECT_EQ(gpu.use_count(), 1);
 }
 
-// Keeps the text of log lines.
-class RecordingLogger : public pmutil::PMLogger {
-public:
-    RecordingLogger() : PMLogger("keeping") {}
-    std::string GetPrefix(const char*, int) override { return ""; }
-    void Write(const char* data, std::size_t size) override { text.append(data, size); }
-    std::string text;
-};
-
 TEST_F(RunTestTest, LogsATerminatedDeviceWhenVerbose)
 {
-    pmutil::InitLogging();
-    const RecordingLogger logger;
-    pmutil::GetDebugValue(pmutil::gGPUAssay) = 0;
+    assay_test::CapturedLog log(pmutil::gGPUAssay);
+    log.SetOn(false);
     FailAt("a", std::runtime_error("bad"));
-    EXPECT_EQ(logger.text, "");
-    pmutil::GetDebugValue(pmutil::gGPUAssay) = 1;
+    EXPECT_EQ(log.Text(), "");
+    log.SetOn(true);
     FailAt("b", std::runtime_error("bad"));
-    pmutil::GetDebugValue(pmutil::gGPUAssay) = 0;
-    EXPECT_EQ(logger.text, "Testing terminated for b\n");
+    EXPECT_EQ(log.Text(), "Testing terminated for b\n");
 }
 
 TEST(Sequence, CallsItsOperationsInOrder)
