@@ -50,7 +50,7 @@ Bytes LocalMemory(const std::string& answer, std::size_t headSize, std::size_t c
 
 Bytes ParseI915(const std::string& answer)
 {
-    drm_i915_query_memory_regions head{};
+    drm_i915_query_memory_regions head; // not {}: it ends in a zero-size array, an extension
     if (!ReadAt(answer, 0, head))
         return std::nullopt;
     return LocalMemory<drm_i915_memory_region_info>(
