@@ -30,7 +30,7 @@ call :check 1 "a child that ends early is told as one"
 if "%1"=="quick" goto end
 set command=%host% torture
 call :check 0 "a failure at every step is as predicted"
-for %%t in (pmutil qgf gpu app report host) do call :unit %%t
+for %%t in (pmutil qgf gpu app report supervise output) do call :unit %%t
 
 :end
 if %failed%==0 (echo All checks passed.) else (echo Some checks failed; %log% tells more.)
