@@ -1,9 +1,9 @@
-# What the scripts share; sourced, never run.
+# Functions that the scripts share. Source it; don't run it.
 set -euo pipefail
 cd "$(dirname "${BASH_SOURCE[0]}")/.."
 mkdir -p build
 
-# say TEXT: one line of progress on standard error.
+# say TEXT: prints a line on standard error.
 say() { printf '%s\n' "$*" >&2; }
 
 die() {
@@ -11,7 +11,7 @@ die() {
     exit 1
 }
 
-# as_root COMMAND...: runs it as root, through sudo where that is needed.
+# as_root COMMAND...: runs it as root, with sudo if necessary.
 as_root() {
     if [ "$(id -u)" = 0 ]; then
         "$@"
@@ -22,7 +22,7 @@ as_root() {
     fi
 }
 
-# quietly LOG COMMAND...: runs it with its output in build/logs/LOG, which is shown if it fails.
+# quietly LOG COMMAND...: runs it with its output in build/logs/LOG. Prints the log if it fails.
 quietly() {
     local log=build/logs/$1
     shift
@@ -33,7 +33,7 @@ quietly() {
     fi
 }
 
-# timed WHAT COMMAND...: says what is being done and how long it took.
+# timed WHAT COMMAND...: runs it, and prints WHAT before and the time after.
 timed() {
     local what=$1 start=$SECONDS
     shift

@@ -1,9 +1,9 @@
 @echo off
-rem Tries the programs on this machine: one line for each check, "ok" or "FAIL". Nothing is installed
-rem or changed, and no window should come up.
+rem Tests the programs on this machine and prints one line for each check, "ok" or "FAIL". Installs and
+rem changes nothing. No window should open.
 rem
 rem usage: check.cmd [quick]
-rem   quick  leaves out the unit tests and the failures at every step, which take minutes
+rem   quick  skips the unit tests and the failures at every step, which take minutes
 setlocal
 set here=%~dp0
 set host="%here%assay-host.exe"
@@ -17,15 +17,15 @@ call :check 0 "assay-host starts"
 set command=%host% run
 call :check 0 "assay prints a whole report"
 set command=%host% run -- -bogus
-call :check 2 "a usage error is told as one"
+call :check 2 "a usage error is reported"
 set command=%host% run -- "-stdout=a b\" -exit=5 "-comment=c"
-call :check 0 "options reach assay as they are"
+call :check 0 "options reach assay unchanged"
 
 for %%h in (access-violation fast-fail stack-overflow) do call :crash %%h
 set command=%host% run --assay %child% --timeout 5 -- die hang
-call :check 4 "a child that hangs is ended, and told as one"
+call :check 4 "a child that hangs is killed and reported"
 set command=%host% run --assay %child% --timeout 60 -- die exit
-call :check 1 "a child that ends early is told as one"
+call :check 1 "a child that ends early is reported"
 
 if "%1"=="quick" goto end
 set command=%host% torture
@@ -33,12 +33,12 @@ call :check 0 "a failure at every step is as predicted"
 for %%t in (pmutil qgf gpu app report supervise output) do call :unit %%t
 
 :end
-if %failed%==0 (echo All checks passed.) else (echo Some checks failed; %log% tells more.)
+if %failed%==0 (echo All checks passed.) else (echo Some checks failed; see %log%.)
 exit /b %failed%
 
 :crash
 set command=%host% run --assay %child% --timeout 60 -- die %1
-call :check 3 "a crash is told as one: %1"
+call :check 3 "a crash is reported: %1"
 goto :eof
 
 :unit
@@ -46,7 +46,7 @@ set command="%here%check\%1_tests.exe" --gtest_brief=1
 call :check 0 "unit tests of %1"
 goto :eof
 
-rem Runs the command; its status must be the first argument, the second says what is checked.
+rem Runs the command. The first argument is the expected status, the second the text of the check.
 :check
 echo == %~2 >>%log%
 %command% >>%log% 2>&1 <nul
@@ -55,7 +55,7 @@ echo status %status% >>%log%
 if %status%==%1 (
     echo ok    %~2
 ) else (
-    echo FAIL  %~2: status %status% in place of %1
+    echo FAIL  %~2: status %status% instead of %1
     set failed=1
 )
 goto :eof

@@ -86,7 +86,7 @@ def test_check_script_names_what_fails(package, tmp_path):
     run = run_under_wine("/c", "check.cmd", "quick", program="cmd.exe", cwd=broken,
                          **NO_OPENCL_PLATFORM)
     assert run.status == 1
-    assert "FAIL  assay prints a whole report: status 1 in place of 0" in run.lines
+    assert "FAIL  assay prints a whole report: status 1 instead of 0" in run.lines
     assert "ok    assay-host starts" in run.lines
 
 
