@@ -1,4 +1,4 @@
-// What the child asks of its platform.
+// The platform's part of the child. child.cpp describes the words that these functions implement.
 #pragma once
 
 #include <cstddef>

@@ -1,21 +1,21 @@
-// The child of the supervision tests: does what its arguments say, one after the other.
+// The child of the supervision tests. Executes its arguments one after the other:
 //
 //   out TEXT, err TEXT     writes a line
-//   part TEXT              writes to standard error without the end of a line
+//   part TEXT              writes to standard error without a line end
 //   exit CODE              ends with the code
 //   sleep MILLISECONDS
 //   echo                   copies standard input to standard output until it ends
-//   flood BYTES            writes that much to standard output
-//   abort                  dies of it
-//   die HOW                the same in the ways of broken drivers (Windows only)
-//   args ...               writes the rest of the arguments, each in hexadecimal, and ends; on
-//                          Windows as the C runtime takes the command line apart, in UTF-8
+//   flood BYTES            writes this many bytes to standard output
+//   abort                  crashes
+//   die HOW                ends as Misbehave() does (Windows only)
+//   args ...               writes the other arguments, each in hexadecimal, and ends; on Windows as
+//                          the C runtime parses the command line, in UTF-8
 //   close                  closes standard output and standard error
-//   spawn MILLISECONDS     starts a grandchild that sleeps, with this child's streams
-//   heir                   starts a grandchild with this child's streams that does echo
+//   spawn MILLISECONDS     starts a grandchild with this child's streams that sleeps
+//   heir                   starts a grandchild with this child's streams that executes echo
 //   line                   writes its command line, each character in hexadecimal (Windows only)
-//   pipes                  writes how many ends of pipes it has
-//   state                  writes the descriptors it has and its signal state (Linux only)
+//   pipes                  writes the number of pipe ends that it has open
+//   state                  writes its open descriptors and its signal state (Linux only)
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>

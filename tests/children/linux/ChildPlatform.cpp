@@ -11,7 +11,7 @@
 
 namespace {
 
-constexpr int kDescriptors = 1024; // all that could be open
+constexpr int kMaxDescriptors = 1024; // more than any test opens
 
 } // namespace
 
@@ -66,7 +66,7 @@ int CountPipes()
 {
     int count = 0;
     struct stat status = {};
-    for (int descriptor = 0; descriptor < kDescriptors; ++descriptor)
+    for (int descriptor = 0; descriptor < kMaxDescriptors; ++descriptor)
         count += ::fstat(descriptor, &status) == 0 && S_ISFIFO(status.st_mode);
     return count;
 }
@@ -74,7 +74,7 @@ int CountPipes()
 void WriteState()
 {
     std::printf("descriptors");
-    for (int descriptor = 0; descriptor < kDescriptors; ++descriptor)
+    for (int descriptor = 0; descriptor < kMaxDescriptors; ++descriptor)
         if (::fcntl(descriptor, F_GETFD) != -1)
             std::printf(" %d", descriptor);
     std::printf("\n");

@@ -10,7 +10,7 @@
 
 #include "win/Misbehave.h"
 
-// The C runtime's own, which no header has: it takes the wide command line apart.
+// A function of the C runtime that no header declares: it parses the wide command line.
 struct StartupInfo {
     int newMode;
 };
@@ -39,7 +39,7 @@ namespace {
 
 LONG WINAPI EndAtException(EXCEPTION_POINTERS* /*pointers*/)
 {
-    return EXCEPTION_EXECUTE_HANDLER; // Wine asks its debugger otherwise
+    return EXCEPTION_EXECUTE_HANDLER; // otherwise Wine starts its debugger
 }
 
 } // namespace
@@ -47,8 +47,8 @@ LONG WINAPI EndAtException(EXCEPTION_POINTERS* /*pointers*/)
 void PrepareStreams()
 {
     ::SetUnhandledExceptionFilter(EndAtException);
-    ULONG stackForIt = 64 * 1024; // which a stack overflow leaves to it
-    ::SetThreadStackGuarantee(&stackForIt);
+    ULONG stackBytes = 64 * 1024; // for the filter, after a stack overflow
+    ::SetThreadStackGuarantee(&stackBytes);
     ::SetErrorMode(SEM_FAILCRITICALERRORS | SEM_NOGPFAULTERRORBOX);
     ::_setmode(0, _O_BINARY);
     ::_setmode(1, _O_BINARY);
@@ -106,7 +106,7 @@ void WriteCommandLine()
 
 int CountPipes()
 {
-    // An inherited handle has its parent's number, which grows with the launches of a process.
+    // An inherited handle has the same value as the parent's, which grows with each launch.
     constexpr ULONG_PTR kMaxHandle = 1 << 15;
     int count = 0;
     for (ULONG_PTR handle = 4; handle < kMaxHandle; handle += 4)

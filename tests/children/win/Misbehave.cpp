@@ -8,15 +8,16 @@
 
 namespace {
 
-// FAST_FAIL_FATAL_APP_EXIT, as the interrupt that Windows ends a process at without a last word.
+// Raises the interrupt of __fastfail with FAST_FAIL_FATAL_APP_EXIT: Windows ends the process
+// without calling any handler.
 void FastFail()
 {
     constexpr int kFatalAppExit = 7;
     asm volatile("int $0x29" : : "c"(kFatalAppExit));
 }
 
-// Fills the stack. Each call looks at the array of the one above, so that none can stand for all.
-// The array is large, so that the overflow is met with room left for what handles it: Wine needs
+// Overflows the stack. Each call reads the array of its caller, so that the compiler can't merge
+// the frames. The array is large, so that stack is left for the handler of the overflow: Wine needs
 // some.
 int Descend(const volatile char* above) // NOLINT(misc-no-recursion): on purpose
 {

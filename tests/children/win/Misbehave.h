@@ -1,8 +1,8 @@
-// What a broken driver may do to its process.
+// Ends a process in the ways of broken drivers.
 #pragma once
 
 #include <string>
 
-// access-violation, abort, assert, terminate, fast-fail, stack-overflow, exit (with the status 0)
-// or hang; anything else does nothing.
+// Accepts access-violation, abort, assert, terminate, fast-fail, stack-overflow, exit (with the
+// status 0) and hang. Returns for any other text.
 void Misbehave(const std::string& how);
