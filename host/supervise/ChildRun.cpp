@@ -7,8 +7,9 @@
 #include <boost/filesystem/operations.hpp>
 #include <boost/make_shared.hpp>
 
+#include "pmutil/ChildCommand.h"
 #include "pmutil/ConsoleAppLauncher.h"
-#include "supervise/ChildCommand.h"
+#include "supervise/ChildLauncher.h"
 #include "supervise/ErrorLines.h"
 #include "supervise/EventQueue.h"
 #include "supervise/Judge.h"
@@ -78,7 +79,8 @@ private:
                                                 ErrorLines::kMaxBytes);
         fLaunch.SetConsoleApp(app);
         try {
-            const ChildCommand command = MakeChildCommand(fOptions.fProgram, fOptions.fArgs);
+            const pmutil::ChildCommand command =
+                pmutil::MakeChildCommand(fOptions.fProgram, fOptions.fArgs);
             fLaunch.SetLaunchParams(
                 pmutil::LaunchParams(fOutTask, fErrTask, command.fArgs, command.fProgram));
             fLaunch.Launch();

@@ -18,7 +18,7 @@
 #include "TestChild.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/Reader.h"
-#include "supervise/ChildCommand.h"
+#include "supervise/ChildLauncher.h"
 #include "support/Waits.h"
 
 namespace assay_host {

@@ -3,10 +3,10 @@
 
 #include <string>
 
-namespace assay_host {
+namespace pmutil {
 
 // Returns the argument in quotation marks, so that CommandLineToArgvW and the C runtime parse it
 // back unchanged. It must not contain zeros.
 std::wstring Quote(const std::wstring& argument);
 
-} // namespace assay_host
+} // namespace pmutil

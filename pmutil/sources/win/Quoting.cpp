@@ -1,6 +1,6 @@
-#include "supervise/win/Quoting.h"
+#include "win/Quoting.h"
 
-namespace assay_host {
+namespace pmutil {
 
 // A backslash is literal except before a quotation mark, where two backslashes mean one.
 std::wstring Quote(const std::wstring& argument)
@@ -17,4 +17,4 @@ std::wstring Quote(const std::wstring& argument)
     return result + L'"';
 }
 
-} // namespace assay_host
+} // namespace pmutil

@@ -1,16 +1,10 @@
-#include "supervise/ChildCommand.h"
+#include "supervise/ChildLauncher.h"
 
 #include <boost/make_shared.hpp>
-#include <boost/nowide/convert.hpp>
 
 #include "pmutil/LauncherPosix.h"
 
 namespace assay_host {
-
-ChildCommand MakeChildCommand(const std::string& program, const std::vector<std::string>& args)
-{
-    return {boost::nowide::widen(program), {args.begin(), args.end()}};
-}
 
 boost::shared_ptr<pmutil::Launcher> MakeChildLauncher()
 {

@@ -1,4 +1,4 @@
-#include "supervise/win/Quoting.h"
+#include "win/Quoting.h"
 
 #include <windows.h>
 
@@ -12,10 +12,10 @@
 #include <boost/nowide/convert.hpp>
 
 #include "TestChild.h"
+#include "pmutil/ChildCommand.h"
 #include "pmutil/LauncherWin.h"
-#include "supervise/ChildCommand.h"
 
-namespace assay_host {
+namespace pmutil {
 namespace {
 
 using Texts = std::vector<std::wstring>;
@@ -101,7 +101,7 @@ void CheckWithTheShell(const std::wstring& line, const Texts& texts)
     ASSERT_EQ(received, texts);
 }
 
-std::string ReadRest(pmutil::Reader& reader)
+std::string ReadRest(Reader& reader)
 {
     std::string all;
     char block[4096];
@@ -125,17 +125,17 @@ Texts DecodeLines(const std::string& hexadecimal)
 
 Texts LaunchTestChild(const std::wstring& program)
 {
-    pmutil::LauncherWin launcher;
-    const pmutil::LaunchResult ends = launcher.Launch(program, {});
+    LauncherWin launcher;
+    const LaunchResult ends = launcher.Launch(program, {});
     const std::string out = ReadRest(*ends.fAppOutput[1]);
     int exitCode = -1;
-    EXPECT_EQ(launcher.Wait(&exitCode), pmutil::kEndedNormally);
+    EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally);
     return DecodeLines(out);
 }
 
 void CheckWithAChild(const std::wstring& line, const Texts& texts)
 {
-    ASSERT_EQ(LaunchTestChild(Quote(boost::nowide::widen(TEST_CHILD)) + L" args" + line), texts);
+    ASSERT_EQ(LaunchTestChild(Quote(TEST_CHILD) + L" args" + line), texts);
 }
 
 TEST(Quoting, DoublesOnlyTheBackslashesThatNeedIt)
@@ -177,10 +177,11 @@ TEST(ChildCommand, HoldsTheWholeCommandLine)
 TEST(ChildCommand, ReachesTheChildAsItIs)
 {
     const ChildCommand command =
-        MakeChildCommand(TEST_CHILD, {"args", "-stdout=a\\", "-exit=5", "-comment=a\"b", "\u00e9"});
+        MakeChildCommand(boost::nowide::narrow(TEST_CHILD),
+                         {"args", "-stdout=a\\", "-exit=5", "-comment=a\"b", "\u00e9"});
     EXPECT_EQ(LaunchTestChild(command.fProgram),
               (Texts{L"-stdout=a\\", L"-exit=5", L"-comment=a\"b", L"\u00e9"}));
 }
 
 } // namespace
-} // namespace assay_host
+} // namespace pmutil

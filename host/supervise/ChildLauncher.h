@@ -1,0 +1,14 @@
+// How the supervised child is started.
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+
+#include "pmutil/Launcher.h"
+
+namespace assay_host {
+
+// The launcher of this platform. On Linux its child is in a process group of its own, so that a
+// signal that the child sends to its group doesn't reach this process.
+boost::shared_ptr<pmutil::Launcher> MakeChildLauncher();
+
+} // namespace assay_host

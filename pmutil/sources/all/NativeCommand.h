@@ -1,0 +1,11 @@
+// The platform's part of ChildCommand.
+#pragma once
+
+#include "pmutil/ChildCommand.h"
+
+namespace pmutil {
+
+// As MakeChildCommand, of texts without a zero.
+ChildCommand MakeNativeCommand(const std::string& program, const std::vector<std::string>& args);
+
+} // namespace pmutil
