@@ -159,7 +159,7 @@ private:
 int Run(const RunChoice& choice)
 {
     GuardProcess();
-    const auto stop = std::make_shared<StopRequest>();
+    const auto stop = std::make_shared<pmutil::StopRequest>();
     WatchForInterrupt(stop);
     const auto writer = std::make_shared<WriterThread>(
         choice.fOutput.empty() ? OpenStandardOutput() : OpenFile(choice.fOutput),

@@ -42,7 +42,7 @@ std::string ShowCommand(const RunOutcome& outcome)
 
 class Torturer {
 public:
-    Torturer(const TortureChoice& choice, WriterThread& writer, StopRequest& stop)
+    Torturer(const TortureChoice& choice, WriterThread& writer, pmutil::StopRequest& stop)
         : fChoice(choice), fOptions(MakeChildOptions(choice.fChild)), fWriter(writer), fStop(stop)
     {}
 
@@ -109,7 +109,7 @@ private:
     const TortureChoice& fChoice;
     const ChildOptions fOptions;
     WriterThread& fWriter;
-    StopRequest& fStop;
+    pmutil::StopRequest& fStop;
     const Clock::time_point fStart = Clock::now();
     std::optional<StepRules> fRules;
     std::size_t fRuns = 0;
@@ -120,7 +120,7 @@ private:
 int Torture(const TortureChoice& choice)
 {
     GuardProcess();
-    const auto stop = std::make_shared<StopRequest>();
+    const auto stop = std::make_shared<pmutil::StopRequest>();
     WatchForInterrupt(stop);
     const auto writer =
         std::make_shared<WriterThread>(OpenStandardOutput(), [stop] { stop->Raise(); });

@@ -29,7 +29,7 @@ using std::chrono::milliseconds;
 
 class Supervision {
 public:
-    Supervision(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
+    Supervision(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
                 boost::shared_ptr<pmutil::Launcher> launcher, const RunTimes& times)
         : fTimes(times),
           fOptions(options),
@@ -42,10 +42,8 @@ public:
         fOutcome.fCommand.insert(fOutcome.fCommand.end(), options.fArgs.begin(),
                                  options.fArgs.end());
         fOutcome.fTimeoutSeconds = options.fTimeoutSeconds;
-        fStop.SetListener([queue = fQueue] { queue->Wake(); });
     }
 
-    ~Supervision() { fStop.SetListener({}); }
     Supervision(const Supervision&) = delete;
     Supervision& operator=(const Supervision&) = delete;
 
@@ -269,13 +267,14 @@ private:
     const RunTimes fTimes;
     const ChildOptions& fOptions;
     RunObserver& fObserver;
-    StopRequest& fStop;
+    pmutil::StopRequest& fStop;
     const boost::shared_ptr<pmutil::Launcher> fPlatformLauncher;
     const boost::shared_ptr<EventQueue> fQueue = boost::make_shared<EventQueue>();
     const boost::shared_ptr<WatchedLauncher> fLauncher =
         boost::make_shared<WatchedLauncher>(fPlatformLauncher, fQueue);
     boost::shared_ptr<PumpTask> fOutTask;
     boost::shared_ptr<PumpTask> fErrTask;
+    const pmutil::StopListener fListener{fStop, [queue = fQueue] { queue->Wake(); }};
     ProcessTree fTree;
     pmutil::ConsoleAppLauncher fLaunch;
 
@@ -299,12 +298,12 @@ private:
 
 } // namespace
 
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop)
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop)
 {
     return RunChild(options, observer, stop, MakeChildLauncher());
 }
 
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
                     const boost::shared_ptr<pmutil::Launcher>& launcher, const RunTimes& times)
 {
     return Supervision(options, observer, stop, launcher, times).Run();

@@ -9,9 +9,9 @@
 #include <boost/shared_ptr.hpp>
 
 #include "pmutil/Launcher.h"
+#include "pmutil/StopRequest.h"
 #include "report/ReportReader.h"
 #include "report/RunOutcome.h"
-#include "supervise/StopRequest.h"
 
 namespace assay_host {
 
@@ -54,11 +54,11 @@ struct RunTimes {
 // outcome.
 //
 // Raising `stop` kills the child at once, with the verdict interrupted; if it was raised before, no
-// child is started. This function uses the listener of `stop` while it runs.
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop);
+// child is started.
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop);
 
 // The same with another launcher, used for this run alone, and with other times.
-RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, StopRequest& stop,
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
                     const boost::shared_ptr<pmutil::Launcher>& launcher,
                     const RunTimes& times = {});
 

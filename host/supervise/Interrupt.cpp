@@ -13,7 +13,7 @@ namespace {
 
 struct Notes {
     std::mutex fMutex;
-    std::shared_ptr<StopRequest> fStop;
+    std::shared_ptr<pmutil::StopRequest> fStop;
     std::function<void()> fEnd;
     int fCount = 0;
 };
@@ -37,7 +37,7 @@ void NoteInterrupt()
         notes.fStop->Raise();
 }
 
-void SetInterruptStop(std::shared_ptr<StopRequest> stop)
+void SetInterruptStop(std::shared_ptr<pmutil::StopRequest> stop)
 {
     Notes& notes = GetNotes();
     const std::lock_guard<std::mutex> lock(notes.fMutex);

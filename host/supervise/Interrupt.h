@@ -5,7 +5,7 @@
 #include <functional>
 #include <memory>
 
-#include "supervise/StopRequest.h"
+#include "pmutil/StopRequest.h"
 
 namespace assay_host {
 
@@ -17,7 +17,7 @@ void PrepareSignals();
 // From now on an interrupt raises `stop`, on a thread of its own, instead of ending this process. A
 // signal that was ignored when the process started, such as SIGHUP under nohup, stays ignored. Call
 // once in a process.
-void WatchForInterrupt(std::shared_ptr<StopRequest> stop);
+void WatchForInterrupt(std::shared_ptr<pmutil::StopRequest> stop);
 
 // From now on an interrupt calls `end` instead, on the same thread. Returns the number of
 // interrupts so far. Any thread may call.

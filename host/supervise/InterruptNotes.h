@@ -3,12 +3,12 @@
 
 #include <memory>
 
-#include "supervise/StopRequest.h"
+#include "pmutil/StopRequest.h"
 
 namespace assay_host {
 
 // Sets the request that an interrupt raises. Any thread may call.
-void SetInterruptStop(std::shared_ptr<StopRequest> stop);
+void SetInterruptStop(std::shared_ptr<pmutil::StopRequest> stop);
 
 // Reports an interrupt. Any thread may call; a signal handler must not.
 void NoteInterrupt();

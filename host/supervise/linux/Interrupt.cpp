@@ -22,7 +22,7 @@ void PrepareSignals()
     ::pthread_sigmask(SIG_SETMASK, &none, nullptr);
 }
 
-void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
+void WatchForInterrupt(std::shared_ptr<pmutil::StopRequest> stop)
 {
     SetInterruptStop(std::move(stop));
     // The run continues in the background of a terminal.

@@ -26,7 +26,7 @@ BOOL WINAPI TakeEvent(DWORD event)
 
 void PrepareSignals() {}
 
-void WatchForInterrupt(std::shared_ptr<StopRequest> stop)
+void WatchForInterrupt(std::shared_ptr<pmutil::StopRequest> stop)
 {
     SetInterruptStop(std::move(stop));
     ::SetConsoleCtrlHandler(TakeEvent, TRUE);

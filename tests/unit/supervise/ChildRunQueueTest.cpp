@@ -180,7 +180,7 @@ protected:
 
     const boost::shared_ptr<FedLauncher> fLauncher = boost::make_shared<FedLauncher>();
     ChildOptions fOptions;
-    StopRequest fStop;
+    pmutil::StopRequest fStop;
     RunTimes fTimes;
     RunTimes::Clock::time_point fNow{std::chrono::seconds(1)};
     std::function<void()> fOnLine;

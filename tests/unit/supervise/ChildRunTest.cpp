@@ -92,7 +92,7 @@ public:
             fOnTick();
     }
 
-    std::shared_ptr<StopRequest> fStop = std::make_shared<StopRequest>();
+    std::shared_ptr<pmutil::StopRequest> fStop = std::make_shared<pmutil::StopRequest>();
     int fStarts = 0;
     int fTicks = 0;
     int fStopAtTick = 0;

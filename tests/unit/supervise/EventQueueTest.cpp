@@ -45,5 +45,33 @@ TEST(EventQueue, CloseEndsTheWaitOfAPush)
     EXPECT_TRUE(pusher.timed_join(boost::posix_time::seconds(60)));
 }
 
+// These would wait for hours without Wake.
+TEST(EventQueue, IsWokenWhileItWaits)
+{
+    EventQueue queue;
+    boost::thread other([&queue] {
+        boost::this_thread::sleep(boost::posix_time::milliseconds(50));
+        queue.Wake();
+    });
+    EXPECT_FALSE(queue.Pop(std::chrono::hours(5)));
+    other.join();
+}
+
+TEST(EventQueue, KeepsAWakeForTheNextWait)
+{
+    EventQueue queue;
+    queue.Wake();
+    EXPECT_FALSE(queue.Pop(std::chrono::hours(5)));
+}
+
+TEST(EventQueue, LosesNoEventToAWake)
+{
+    EventQueue queue;
+    queue.Wake();
+    queue.Push({Event::Kind::kChildEnd, {}, {}});
+    EXPECT_TRUE(queue.Pop(std::chrono::hours(5)));
+    EXPECT_FALSE(queue.Pop(std::chrono::milliseconds(0)));
+}
+
 } // namespace
 } // namespace assay_host
