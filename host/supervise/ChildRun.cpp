@@ -9,15 +9,15 @@
 
 #include "pmutil/ChildCommand.h"
 #include "pmutil/ConsoleAppLauncher.h"
+#include "pmutil/OutputPump.h"
+#include "pmutil/StartAwareApp.h"
 #include "supervise/ChildLauncher.h"
 #include "supervise/ErrorLines.h"
 #include "supervise/EventQueue.h"
 #include "supervise/Judge.h"
 #include "supervise/Paths.h"
 #include "supervise/ProcessTree.h"
-#include "supervise/PumpTask.h"
-#include "supervise/SupervisedApp.h"
-#include "supervise/WatchedLauncher.h"
+#include "supervise/StreamFeed.h"
 
 namespace assay_host {
 
@@ -27,15 +27,25 @@ using Clock = RunTimes::Clock;
 using Seconds = RunTimes::Seconds;
 using std::chrono::milliseconds;
 
+boost::shared_ptr<pmutil::OutputTask> MakePump(const boost::shared_ptr<StreamFeed>& feed)
+{
+    return boost::make_shared<pmutil::OutputPump>(
+        [feed](std::string_view block) { feed->Take(block); });
+}
+
 class Supervision {
 public:
     Supervision(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
-                boost::shared_ptr<pmutil::Launcher> launcher, const RunTimes& times)
+                const boost::shared_ptr<pmutil::Launcher>& launcher, const RunTimes& times)
         : fTimes(times),
           fOptions(options),
           fObserver(observer),
           fStop(stop),
-          fPlatformLauncher(std::move(launcher)),
+          fLauncher(boost::make_shared<pmutil::TrackingLauncher>(
+              launcher,
+              [queue = fQueue] {
+                  queue->Push({Event::Kind::kChildEnd, {}, {}});
+              })),
           fReader(options.fLimits)
     {
         fOutcome.fCommand.push_back(options.fProgram);
@@ -70,17 +80,12 @@ public:
 private:
     bool Launch()
     {
-        const auto app = boost::make_shared<SupervisedApp>(fLauncher);
-        fOutTask = boost::make_shared<PumpTask>(pmutil::OutputChannel::kStdout, app, fQueue,
-                                                fOptions.fLimits.fMaxBytes);
-        fErrTask = boost::make_shared<PumpTask>(pmutil::OutputChannel::kStderr, app, fQueue,
-                                                ErrorLines::kMaxBytes);
-        fLaunch.SetConsoleApp(app);
+        fLaunch.SetConsoleApp(boost::make_shared<pmutil::StartAwareApp>(fLauncher));
         try {
             const pmutil::ChildCommand command =
                 pmutil::MakeChildCommand(fOptions.fProgram, fOptions.fArgs);
-            fLaunch.SetLaunchParams(
-                pmutil::LaunchParams(fOutTask, fErrTask, command.fArgs, command.fProgram));
+            fLaunch.SetLaunchParams(pmutil::LaunchParams(MakePump(fOut), MakePump(fErr),
+                                                         command.fArgs, command.fProgram));
             fLaunch.Launch();
         } catch (const std::exception& exc) {
             NoteStartFailure(exc.what());
@@ -252,14 +257,12 @@ private:
             // How the child ended is known without it.
         }
         fEvidence.fEnd = fLauncher->GetEnd();
-        if (fEvidence.fEnd && fEvidence.fEnd->fResult != pmutil::kEndedNormally)
-            fEvidence.fTermination = pmutil::GetTerminationText(*fPlatformLauncher);
         if (!fTreeEnded)
             fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
         fLeftBehind = fLeftBehind || (!fEnded && fEvidence.fStartFailure.empty()) ||
                       (fEnded && fOpenStreams > 0);
-        fOutcome.fLostOutputBytes = fReader.GetLostByteCount() + fOutTask->GetDroppedByteCount();
-        fOutcome.fLostErrorBytes = fErrorLines.GetLostByteCount() + fErrTask->GetDroppedByteCount();
+        fOutcome.fLostOutputBytes = fReader.GetLostByteCount() + fOut->GetDroppedByteCount();
+        fOutcome.fLostErrorBytes = fErrorLines.GetLostByteCount() + fErr->GetDroppedByteCount();
     }
 
     double GetSeconds() const { return Seconds(fTimes.fNow() - fStart).count(); }
@@ -268,12 +271,12 @@ private:
     const ChildOptions& fOptions;
     RunObserver& fObserver;
     pmutil::StopRequest& fStop;
-    const boost::shared_ptr<pmutil::Launcher> fPlatformLauncher;
     const boost::shared_ptr<EventQueue> fQueue = boost::make_shared<EventQueue>();
-    const boost::shared_ptr<WatchedLauncher> fLauncher =
-        boost::make_shared<WatchedLauncher>(fPlatformLauncher, fQueue);
-    boost::shared_ptr<PumpTask> fOutTask;
-    boost::shared_ptr<PumpTask> fErrTask;
+    const boost::shared_ptr<pmutil::TrackingLauncher> fLauncher;
+    const boost::shared_ptr<StreamFeed> fOut = boost::make_shared<StreamFeed>(
+        pmutil::OutputChannel::kStdout, fQueue, fOptions.fLimits.fMaxBytes);
+    const boost::shared_ptr<StreamFeed> fErr = boost::make_shared<StreamFeed>(
+        pmutil::OutputChannel::kStderr, fQueue, ErrorLines::kMaxBytes);
     const pmutil::StopListener fListener{fStop, [queue = fQueue] { queue->Wake(); }};
     ProcessTree fTree;
     pmutil::ConsoleAppLauncher fLaunch;

@@ -36,7 +36,7 @@ bool HasStatus(const Evidence& evidence, std::int64_t status)
 {
     if (evidence.fEnd->fResult == pmutil::kEndedNormally)
         return evidence.fEnd->fExitCode == status;
-    return evidence.fTermination == fmt::format("code 0x{:08X}", status);
+    return evidence.fEnd->fTerminationText == fmt::format("code 0x{:08X}", status);
 }
 
 // Returns where the report stopped, as the end of a sentence.
@@ -112,8 +112,8 @@ void Judge(const Evidence& evidence, RunOutcome& outcome)
     const bool endedByItself = evidence.fEnd && evidence.fEnd->fResult == pmutil::kEndedNormally;
     if (endedByItself)
         outcome.fExitStatus = evidence.fEnd->fExitCode;
-    else
-        outcome.fTermination = evidence.fTermination;
+    else if (evidence.fEnd)
+        outcome.fTermination = evidence.fEnd->fTerminationText;
 
     if (evidence.fEnd && evidence.fEnd->fResult != pmutil::kEndedByKill &&
         IsComplete(evidence, outcome)) {

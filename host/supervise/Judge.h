@@ -6,10 +6,10 @@
 #include <string>
 #include <vector>
 
+#include "pmutil/TrackingLauncher.h"
 #include "report/ReportLine.h"
 #include "report/RunOutcome.h"
 #include "report/SequenceReader.h"
-#include "supervise/WatchedLauncher.h"
 
 namespace assay_host {
 
@@ -49,9 +49,8 @@ enum class KillReason { kNone, kTimeout, kInterrupt };
 
 // What was observed of a run.
 struct Evidence {
-    std::string fStartFailure;    // why the child could not be started; empty if it was
-    std::optional<ChildEnd> fEnd; // empty if the child's end was not observed
-    std::string fTermination;     // what ended the child, if it didn't end by itself
+    std::string fStartFailure;            // why the child could not be started; empty if it was
+    std::optional<pmutil::ChildEnd> fEnd; // empty if the child's end was not observed
     KillReason fKillReason = KillReason::kNone;
     ReportProgress fReport;
 };

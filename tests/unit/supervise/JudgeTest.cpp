@@ -18,7 +18,7 @@ struct Case {
     std::string fReport;
     std::vector<std::string> fErrors;
     std::vector<std::string> fArgs;
-    std::optional<ChildEnd> fEnd;
+    std::optional<pmutil::ChildEnd> fEnd;
     KillReason fKillReason = KillReason::kNone;
     std::string fTermination{};
 
@@ -30,7 +30,8 @@ struct Case {
             evidence.fReport.Add(line);
         evidence.fEnd = fEnd;
         evidence.fKillReason = fKillReason;
-        evidence.fTermination = fTermination;
+        if (evidence.fEnd)
+            evidence.fEnd->fTerminationText = fTermination;
         RunOutcome outcome;
         outcome.fCommand = {"assay"};
         outcome.fCommand.insert(outcome.fCommand.end(), fArgs.begin(), fArgs.end());
@@ -41,9 +42,9 @@ struct Case {
     }
 };
 
-ChildEnd Ended(int status)
+pmutil::ChildEnd Ended(int status)
 {
-    return {pmutil::kEndedNormally, status};
+    return {pmutil::kEndedNormally, status, {}};
 }
 
 const std::string kWhole = "assayStart=\"x\"\nassayEnd=\"y\"\n";
@@ -62,7 +63,7 @@ TEST(Judge, CallsAWholeReportWithTheRequestedStatusComplete)
 
 TEST(Judge, AcceptsALargeRequestedStatus)
 {
-    Case large{kWhole, {}, {"-exit=300"}, ChildEnd{pmutil::kEndedByCrash, 0}};
+    Case large{kWhole, {}, {"-exit=300"}, pmutil::ChildEnd{pmutil::kEndedByCrash, 0, {}}};
     char code[sizeof "code 0x00000000"];
     std::snprintf(code, sizeof code, "code 0x%08X", static_cast<unsigned>(GetReportedStatus(300)));
     large.fTermination = code;
@@ -107,7 +108,7 @@ TEST(Judge, DetectsAUsageErrorByStatusAndText)
 
 TEST(Judge, DistinguishesCrashHangAndInterrupt)
 {
-    Case died{kBroken, {}, {}, ChildEnd{pmutil::kEndedByCrash, 0}};
+    Case died{kBroken, {}, {}, pmutil::ChildEnd{pmutil::kEndedByCrash, 0, {}}};
     died.fTermination = "signal 11 (Segmentation fault)";
     EXPECT_EQ(died.Judge().fVerdict, Verdict::kCrashed);
     EXPECT_EQ(died.Judge().fTermination, died.fTermination);

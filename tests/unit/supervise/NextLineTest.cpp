@@ -63,8 +63,7 @@ RunOutcome JudgeCrash(const ReportProgress& progress)
 {
     Evidence evidence;
     evidence.fReport = progress;
-    evidence.fEnd = ChildEnd{pmutil::kEndedByCrash, 0};
-    evidence.fTermination = "signal 11";
+    evidence.fEnd = pmutil::ChildEnd{pmutil::kEndedByCrash, 0, "signal 11"};
     RunOutcome outcome;
     outcome.fCommand = {"assay"};
     Judge(evidence, outcome);
