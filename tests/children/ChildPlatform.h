@@ -14,5 +14,6 @@ void DieOf(const std::string& how);
 void CloseOutputs();
 void SpawnGrandchild(const std::vector<std::string>& command); // of words without blanks
 void WriteCommandLine();
+std::string GetOwnPath();
 int CountPipes();
 void WriteState();

@@ -14,6 +14,7 @@
 //   spawn MILLISECONDS     starts a grandchild with this child's streams that sleeps
 //   heir                   starts a grandchild with this child's streams that executes echo
 //   line                   writes its command line, each character in hexadecimal (Windows only)
+//   self                   writes the path of its program
 //   pipes                  writes the number of pipe ends that it has open
 //   state                  writes its open descriptors and its signal state (Linux only)
 #include <chrono>
@@ -96,6 +97,9 @@ int main(int argc, char** argv)
         } else if (word == "line") {
             WriteCommandLine();
             return 0;
+        } else if (word == "self") {
+            std::printf("%s\n", GetOwnPath().c_str());
+            std::fflush(stdout);
         } else if (word == "pipes") {
             std::printf("pipes %d\n", CountPipes());
             std::fflush(stdout);

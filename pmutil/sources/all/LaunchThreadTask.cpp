@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "all/ConsoleAppLog.h"
+#include "all/EndState.h"
 #include "all/LaunchOutputThreadTask.h"
 #include "all/ThreadEnd.h"
 #include "pmutil/OutputTask.h"
@@ -19,20 +20,6 @@ using consoleapp::LaunchStart;
 namespace {
 
 constexpr OutputChannel kChannels[] = {OutputChannel::kStdout, OutputChannel::kStderr};
-
-State GetEndState(int result)
-{
-    switch (result) {
-    case kEndedNormally:
-        return State::kFinished;
-    case kEndedByCrash:
-        return State::kCrashed;
-    case kEndedByKill:
-        return State::kKilled;
-    default:
-        return State::kUndefined;
-    }
-}
 
 // Releases the outputs first, so that those without a task are closed when the child reads the end
 // of its input.

@@ -62,6 +62,12 @@ void SpawnGrandchild(const std::vector<std::string>& command)
 
 void WriteCommandLine() {}
 
+std::string GetOwnPath()
+{
+    char path[4096] = {};
+    return ::readlink("/proc/self/exe", path, sizeof path - 1) < 0 ? "" : path;
+}
+
 int CountPipes()
 {
     int count = 0;

@@ -104,6 +104,13 @@ void WriteCommandLine()
     std::fflush(stdout);
 }
 
+std::string GetOwnPath()
+{
+    char path[MAX_PATH] = {};
+    ::GetModuleFileNameA(nullptr, path, MAX_PATH);
+    return path;
+}
+
 int CountPipes()
 {
     // An inherited handle has the same value as the parent's, which grows with each launch.

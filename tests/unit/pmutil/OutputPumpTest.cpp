@@ -178,7 +178,6 @@ TEST_F(PumpedLaunch, PumpsStayUntilTheStartIsOver)
 TEST_F(PumpedLaunch, PumpsEndWithAStartThatFails)
 {
     const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
-    const DebugValueSetter longWaits("ConsoleAppShortWaitSecondsMinusOne", 1000);
     fApp->fThrowIn = "OnRunning";
     try {
         Launch();
@@ -211,7 +210,7 @@ TEST_F(PumpedLaunch, AFunctionThatFailsIsAFailureOfItsChannel)
 // As a client does it, with a child that dies before the launch looks at its tasks.
 TEST(PumpedChild, MayCrashAtOnce)
 {
-    const DebugValueSetter longWaits("ConsoleAppShortWaitSecondsMinusOne", 60);
+    const LongShortWait longWait;
     for (int round = 0; round < 100; ++round) {
         std::string out;
         const auto app = boost::make_shared<StartAwareApp>();

@@ -1,50 +1,61 @@
+// Arguments on a Windows command line, against those that take one apart.
 #include "win/Quoting.h"
 
 #include <windows.h>
 
 #include <shellapi.h>
 
+#include <cstdlib>
 #include <functional>
 #include <gtest/gtest.h>
 #include <random>
-#include <sstream>
 
 #include <boost/nowide/convert.hpp>
 
+#include "../HexLines.h"
 #include "TestChild.h"
-#include "pmutil/ChildCommand.h"
-#include "pmutil/LauncherWin.h"
+#include "pmutil/RunProgram.h"
 
-namespace pmutil {
+using namespace pmutil;
+
 namespace {
 
 using Texts = std::vector<std::wstring>;
+using Tell = std::function<void(const std::wstring& text)>;
 
-// Difficult characters. The last ones have no meaning to a parser of command lines.
+// The hard characters; of the last ones a command line's parser knows none.
 const Texts kHard = {L" ", L"\t", L"\"", L"\\", L"\u00e9", L"%", L"^", L"\u65e5", L"\U0001F600"};
-// One character for each way in which a parser can treat it.
+// One for each way in which a parser can take a character.
 const Texts kKinds(kHard.begin(), kHard.begin() + 5);
 
-// Calls `act` with every text of up to `length` parts, including the empty one.
-void ForEachText(const Texts& parts, int length,
-                 const std::function<void(const std::wstring&)>& act)
+bool IsLong()
 {
-    Texts texts = {L""};
-    act(L"");
-    for (int round = 0; round < length; ++round) {
-        Texts longer;
-        longer.reserve(texts.size() * parts.size());
-        for (const std::wstring& text : texts) {
-            for (const std::wstring& part : parts) {
-                longer.push_back(text + part);
-                act(longer.back());
-            }
-        }
-        texts.swap(longer);
+    const char* const wanted = std::getenv("ASSAY_LONG_TESTS"); // NOLINT(concurrency-mt-unsafe):
+                                                                // the environment is only read
+    return wanted != nullptr && std::string(wanted) == "1";
+}
+
+void ForEachLonger(std::wstring& text, const Texts& parts, int length, const Tell& tell)
+{
+    tell(text);
+    if (length == 0)
+        return;
+    const std::size_t size = text.size();
+    for (const std::wstring& part : parts) {
+        text += part;
+        ForEachLonger(text, parts, length - 1, tell);
+        text.resize(size);
     }
 }
 
-void ForRandomTexts(int count, int maxParts, const std::function<void(const std::wstring&)>& act)
+// Tells every text of up to `length` of the parts, the empty one included.
+void ForEachText(const Texts& parts, int length, const Tell& tell)
+{
+    std::wstring text;
+    ForEachLonger(text, parts, length, tell);
+}
+
+void ForRandomTexts(int count, int maxParts, const Tell& tell)
 {
     std::mt19937 random(20260119);
     for (int round = 0; round < count; ++round) {
@@ -53,14 +64,14 @@ void ForRandomTexts(int count, int maxParts, const std::function<void(const std:
         for (unsigned part = 0; part < parts; ++part)
             text += random() % 4 == 0 ? std::wstring(1, static_cast<wchar_t>('a' + random() % 26))
                                       : kHard[random() % kHard.size()];
-        act(text);
+        tell(text);
     }
 }
 
-// Collects texts, and checks them together when a command line is full.
+// Collects texts, and has them looked at together whenever a command line is full.
 class Batch {
 public:
-    using Check = std::function<void(const std::wstring& line, const Texts& texts)>;
+    using Check = std::function<void(const Texts& texts)>;
 
     explicit Batch(Check check) : fCheck(std::move(check)) {}
     ~Batch() { Flush(); }
@@ -70,10 +81,10 @@ public:
     void Add(const std::wstring& text)
     {
         constexpr std::size_t kMaxLine = 30'000;
-        const std::wstring quoted = Quote(text);
-        if (fLine.size() + quoted.size() > kMaxLine)
+        const std::size_t size = Quote(text).size() + 1;
+        if (fSize + size > kMaxLine)
             Flush();
-        fLine += L' ' + quoted;
+        fSize += size;
         fTexts.push_back(text);
     }
 
@@ -81,61 +92,39 @@ private:
     void Flush()
     {
         if (!fTexts.empty())
-            fCheck(fLine, fTexts);
-        fLine.clear();
+            fCheck(fTexts);
+        fSize = 0;
         fTexts.clear();
     }
 
     const Check fCheck;
-    std::wstring fLine;
+    std::size_t fSize = 0;
     Texts fTexts;
 };
 
-void CheckWithTheShell(const std::wstring& line, const Texts& texts)
+void CheckWithTheShell(const Texts& texts)
 {
+    std::wstring line = L"program";
+    for (const std::wstring& text : texts)
+        line += L' ' + Quote(text);
     int count = 0;
-    wchar_t** const parsed = ::CommandLineToArgvW((L"program" + line).c_str(), &count);
+    wchar_t** const parsed = ::CommandLineToArgvW(line.c_str(), &count);
     ASSERT_NE(parsed, nullptr);
     const Texts received(parsed + 1, parsed + count);
     ::LocalFree(parsed);
     ASSERT_EQ(received, texts);
 }
 
-std::string ReadRest(Reader& reader)
+// By the way that clients launch.
+void CheckWithAChild(const Texts& texts)
 {
-    std::string all;
-    char block[4096];
-    while (const auto count = reader.ReadSome(block, sizeof block))
-        all.append(block, count);
-    return all;
-}
-
-Texts DecodeLines(const std::string& hexadecimal)
-{
-    Texts result;
-    std::istringstream lines(hexadecimal);
-    for (std::string line; std::getline(lines, line);) {
-        std::string text;
-        for (std::size_t at = 0; at + 1 < line.size(); at += 2)
-            text += static_cast<char>(std::stoi(line.substr(at, 2), nullptr, 16));
-        result.push_back(boost::nowide::widen(text));
-    }
-    return result;
-}
-
-Texts LaunchTestChild(const std::wstring& program)
-{
-    LauncherWin launcher;
-    const LaunchResult ends = launcher.Launch(program, {});
-    const std::string out = ReadRest(*ends.fAppOutput[1]);
-    int exitCode = -1;
-    EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally);
-    return DecodeLines(out);
-}
-
-void CheckWithAChild(const std::wstring& line, const Texts& texts)
-{
-    ASSERT_EQ(LaunchTestChild(Quote(TEST_CHILD) + L" args" + line), texts);
+    std::vector<std::string> args = {"args"};
+    for (const std::wstring& text : texts)
+        args.push_back(boost::nowide::narrow(text));
+    const RunResult run = RunProgram(boost::nowide::narrow(TEST_CHILD), args);
+    ASSERT_EQ(run.fEnd, State::kFinished);
+    args.erase(args.begin());
+    ASSERT_EQ(DecodeHexLines(run.fOutput), args);
 }
 
 TEST(Quoting, DoublesOnlyTheBackslashesThatNeedIt)
@@ -148,13 +137,14 @@ TEST(Quoting, DoublesOnlyTheBackslashesThatNeedIt)
     EXPECT_EQ(Quote(L"a\\\"b"), L"\"a\\\\\\\"b\"");
 }
 
-// The hard characters that aren't among the kinds are the same to a parser as the last kind.
+// The hard characters that aren't among the kinds are the same to a parser as the last kind. With
+// ASSAY_LONG_TESTS=1 every text of eight is tried all the same.
 TEST(Quoting, TheShellReadsBackEveryText)
 {
     Batch batch(CheckWithTheShell);
     const auto add = [&](const std::wstring& text) { batch.Add(text); };
     ForEachText(kKinds, 8, add);
-    ForEachText(kHard, 6, add);
+    ForEachText(kHard, IsLong() ? 8 : 6, add);
     ForRandomTexts(20'000, 200, add);
 }
 
@@ -162,26 +152,9 @@ TEST(Quoting, TheRuntimeOfAChildReadsBackEveryText)
 {
     Batch batch(CheckWithAChild);
     const auto add = [&](const std::wstring& text) { batch.Add(text); };
-    ForEachText(kKinds, 6, add);
-    ForEachText(kHard, 4, add);
+    ForEachText(kKinds, IsLong() ? 8 : 6, add);
+    ForEachText(kHard, IsLong() ? 6 : 4, add);
     ForRandomTexts(2'000, 200, add);
 }
 
-TEST(ChildCommand, HoldsTheWholeCommandLine)
-{
-    const ChildCommand command = MakeChildCommand("C:\\a folder\\p\u00e9.exe", {"", "a\"b", "c\\"});
-    EXPECT_EQ(command.fProgram, L"\"C:\\a folder\\p\u00e9.exe\" \"\" \"a\\\"b\" \"c\\\\\"");
-    EXPECT_TRUE(command.fArgs.empty());
-}
-
-TEST(ChildCommand, ReachesTheChildAsItIs)
-{
-    const ChildCommand command =
-        MakeChildCommand(boost::nowide::narrow(TEST_CHILD),
-                         {"args", "-stdout=a\\", "-exit=5", "-comment=a\"b", "\u00e9"});
-    EXPECT_EQ(LaunchTestChild(command.fProgram),
-              (Texts{L"-stdout=a\\", L"-exit=5", L"-comment=a\"b", L"\u00e9"}));
-}
-
 } // namespace
-} // namespace pmutil

@@ -1,0 +1,23 @@
+// What the test child's "args" writes: each argument in hexadecimal on a line.
+#pragma once
+
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace pmutil {
+
+inline std::vector<std::string> DecodeHexLines(const std::string& hexadecimal)
+{
+    std::vector<std::string> result;
+    std::istringstream lines(hexadecimal);
+    for (std::string line; std::getline(lines, line);) {
+        std::string text;
+        for (std::size_t at = 0; at + 1 < line.size(); at += 2)
+            text += static_cast<char>(std::stoi(line.substr(at, 2), nullptr, 16));
+        result.push_back(text);
+    }
+    return result;
+}
+
+} // namespace pmutil
