@@ -7,6 +7,7 @@
 #include <pmutil/LogSinks.h>
 #include <pmutil/PMLogging.h>
 #include <pmutil/Previewer.h>
+#include <pmutil/RunProgram.h>
 
 namespace {
 
@@ -28,6 +29,9 @@ int main()
         preview.ReadSome(text.data(), 2);
     }
     if (!buffer.ReadAll(text.data(), 5))
+        return 1;
+    const pmutil::RunResult run = pmutil::RunProgram("/bin/sh", {"-c", "echo hello; exit 7"});
+    if (run.fEnd != pmutil::State::kFinished || run.fExitCode != 7 || run.fOutput != "hello\n")
         return 1;
     std::string quoted;
     pmutil::Fmt::ToText(quoted, text.c_str());
