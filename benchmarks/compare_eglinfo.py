@@ -2,12 +2,14 @@
 """Compares the time of the program with that of `eglinfo -B` on the same driver, and prints the time
 of each stage.
 
-usage: compare_eglinfo.py [--build FOLDER] [--runs N] [--json FILE]
+usage: compare_eglinfo.py [--build FOLDER] [--floor PROGRAM] [--runs N] [--json FILE]
 
 Both are run alternately, with standard output and error to /dev/null. Values are medians in
 milliseconds of wall time and of processor time, which varies less on a busy machine. OpenCL is hidden
 from the program, since eglinfo doesn't query it. The program does more than eglinfo: it compiles
-shaders and renders. eglinfo tries every platform that EGL supports.
+shaders and renders. eglinfo tries every platform that EGL supports. The fair comparison is egl_floor,
+a C program that makes the program's own calls and nothing else; scripts/build benchmarks makes it.
+Before it is timed, both must make the same calls with the same arguments on the scripted driver.
 
 The program's own time is its time on the scripted driver of the tests, which returns at once, minus
 that of /bin/true. The stages are measured with programmed failures: a run that fails at a step ends
@@ -19,6 +21,7 @@ import json
 import os
 import shutil
 import statistics
+import subprocess
 import sys
 import tempfile
 import time
@@ -27,6 +30,7 @@ from pathlib import Path
 TREE = Path(__file__).resolve().parents[1]
 
 GOAL_OWN_MS = 2.0
+GOAL_FLOOR_RATIO = 1.05
 
 # A step to fail at, and what the run has done up to there with one GPU. The work of a step is done
 # before the step is counted.
@@ -71,6 +75,27 @@ def medians(jobs, runs):
     return [tuple(statistics.median(column) for column in zip(*each)) for each in taken]
 
 
+def calls_of(program, environment, folder):
+    """The calls that a program makes of the scripted driver, with their arguments."""
+    record = folder / "record"
+    script = folder / "recording-script"
+    script.write_text(f"record {record}\ndevice\nsoftware\n")
+    record.unlink(missing_ok=True)
+    subprocess.run([program], check=True, stdout=subprocess.DEVNULL,
+                   env=dict(environment, ASSAY_SCRIPTED_EGL=str(script)))
+    return [line.split(" ", 2)[2] for line in record.read_text().splitlines()]
+
+
+def check_same_calls(program, floor, environment, folder):
+    ours = calls_of(program, environment, folder)
+    theirs = calls_of(floor, environment, folder)
+    if ours != theirs:
+        number = next((i for i, (one, other) in enumerate(zip(ours, theirs)) if one != other),
+                      min(len(ours), len(theirs)))
+        sys.exit(f"egl_floor makes other calls than the program from call {number + 1} on:\n"
+                 f"  program: {ours[number:number + 3]}\n  egl_floor: {theirs[number:number + 3]}")
+
+
 def stage_jobs(program, environment):
     return [([program, f"-crashAfter={step}"], environment) for step, _ in STAGES]
 
@@ -91,6 +116,8 @@ def print_stages(title, cumulative):
 def main():
     parser = argparse.ArgumentParser(description=__doc__.split("\n", maxsplit=1)[0])
     parser.add_argument("--build", type=Path, default=TREE / "build" / "linux")
+    parser.add_argument("--floor", type=Path,
+                        default=TREE / "build" / "benchmarks" / "bin" / "egl_floor")
     parser.add_argument("--runs", type=int, default=20)
     parser.add_argument("--json", type=Path)
     options = parser.parse_args()
@@ -112,17 +139,31 @@ def main():
             real, LD_LIBRARY_PATH=f"{options.build.resolve() / 'drivers' / 'egl'}:{hidden}",
             ASSAY_SCRIPTED_EGL=str(script))
 
+        floor = str(options.floor.resolve()) if options.floor.exists() else None
+        if floor is not None:
+            check_same_calls(program, floor, scripted, Path(folder))
         jobs = [([program], real), ([true], real)]
+        if floor is not None:
+            jobs.append(([floor], real))
         if eglinfo is not None:
             jobs.append(([eglinfo, "-B"], dict(os.environ)))
-        whole, nothing, *peer = medians(jobs, options.runs)
+        whole, nothing, *others = medians(jobs, options.runs)
+        bare = others[:1] if floor is not None else []
+        peer = others[len(bare):]
         print(f"medians of {options.runs} runs, in milliseconds\n\n     wall  processor")
         show(whole, "assay on this machine's driver")
         results.update(assay_ms=whole, true_ms=nothing)
+        if bare:
+            ratios = (whole[0] / bare[0][0], whole[1] / bare[0][1])
+            show(bare[0], "egl_floor: the same calls from C")
+            show(ratios, f"assay / egl_floor (goal: at most {GOAL_FLOOR_RATIO:g})")
+            results.update(floor_ms=bare[0], floor_ratios=ratios)
+        else:
+            print("egl_floor isn't built (scripts/build benchmarks)")
         if peer:
             ratios = (whole[0] / peer[0][0], whole[1] / peer[0][1])
             show(peer[0], "eglinfo -B on the same driver")
-            show(ratios, "assay / eglinfo (goal: at most 1)")
+            show(ratios, "assay / eglinfo, which does less")
             results.update(eglinfo_ms=peer[0], ratios=ratios)
         else:
             print("eglinfo isn't installed (package mesa-utils-bin)")

@@ -1,0 +1,15 @@
+// The program's test shaders, for the C program that makes its calls.
+#pragma once
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+extern const int floor_vertex_shader_count;
+extern const char* const* const floor_vertex_shader;
+extern const int floor_fragment_shader_count;
+extern const char* const* const floor_fragment_shader;
+
+#ifdef __cplusplus
+}
+#endif
