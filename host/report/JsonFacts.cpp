@@ -70,6 +70,7 @@ Json MakeWarnings(const std::vector<Warning>& warnings)
             {"code", warning.fCode},
             {"device", MakeTag(warning.fTag)},
             {"text", EncodeBytes(warning.fText)},
+            {"cause", warning.fCause.empty() ? Json() : Json(EncodeBytes(warning.fCause))},
         });
     return array;
 }

@@ -29,6 +29,17 @@ bool StartsWith(std::string_view text, std::string_view start)
     return text.substr(0, start.size()) == start;
 }
 
+struct FailedTrial {
+    const char* fKey;
+    const char* fReason;
+    const char* fText;
+};
+constexpr FailedTrial kFailedTrials[] = {
+    {"CanCompileProgramGLSL", "shader-trial-failed",
+     "a realistic pair of shaders does not compile"},
+    {"GLFrameBufferOK", "framebuffer-trial-failed", "no framebuffer could be drawn to"},
+};
+
 // How one device came through the trials of its interface.
 struct Trial {
     const DeviceAnswers* fDevice;
@@ -178,18 +189,15 @@ private:
 
     Trial MakeTrial(const DeviceAnswers& device) const
     {
-        const auto fails = [&device](const char* reason, const char* text) {
-            return Trial{&device, reason, fmt::format("{}: {}", device.fTag, text)};
-        };
-        if (device.GetValue("CanCompileProgramGLSL") == "0")
-            return fails("shader-trial-failed", "a realistic pair of shaders does not compile");
-        if (device.GetValue("GLFrameBufferOK") == "0")
-            return fails("framebuffer-trial-failed", "no framebuffer could be drawn to");
+        for (const auto& [key, reason, text] : kFailedTrials)
+            if (device.GetValue(key) == "0")
+                return MakeFailure(device, reason, text, key);
         // What only describes a device may fail after its last trial.
         const char* const last = fKind == DeviceKind::kOpenGL ? "GLFrameBufferOK" : "CLCompute";
         if (!device.Find(last))
-            return device.fFailed ? fails("device-failed", "a test failed")
-                                  : fails("no-trial", "no answer came from its trials");
+            return device.fFailed
+                       ? MakeFailure(device, "device-failed", "a test failed", last)
+                       : MakeFailure(device, "no-trial", "its trials have no answer", last);
         return {&device, nullptr, {}};
     }
 
@@ -204,7 +212,8 @@ private:
         if (std::count(fOutcome.fErrorLines.begin(), fOutcome.fErrorLines.end(), kContextFailure))
             return {Usability::kBroken,
                     "context-failed",
-                    "No OpenGL context could be created on any display device.",
+                    "No OpenGL context could be created on any display device" +
+                        GetCauseText("OGLContextCreated") + ".",
                     {}};
         if (Is("QGFOGLInitialized", "0") && !fOutcome.FindCause("QGFOGLInitialized").empty()) {
             const std::string cause = fOutcome.FindCause("QGFOGLInitialized");
@@ -217,6 +226,20 @@ private:
                         {}};
         }
         return {Usability::kAbsent, "no-device", fmt::format("{} has no device.", name), {}};
+    }
+
+    // ": CAUSE", or nothing.
+    std::string GetCauseText(const std::string& key) const
+    {
+        const std::string cause = fOutcome.FindCause(key);
+        return cause.empty() ? cause : ": " + ShowBytes(cause);
+    }
+
+    Trial MakeFailure(const DeviceAnswers& device, const char* reason, const char* text,
+                      const char* key) const
+    {
+        return {&device, reason,
+                fmt::format("{}: {}{}", device.fTag, text, GetCauseText(device.fTag + "." + key))};
     }
 
     static Usable Unknown(const char* reason, std::string text)

@@ -33,6 +33,11 @@ constexpr Check kTrials[] = {
      "no complete framebuffer object could be created and drawn to"},
 };
 
+std::string FindCause(const RunOutcome& outcome, const std::string& key)
+{
+    return ShowBytes(outcome.FindCause(key));
+}
+
 void WarnOfSoftware(Warnings& warnings, const DeviceAnswers& device)
 {
     const std::string text = FindSoftwareText(device);
@@ -76,7 +81,7 @@ void WarnOfMeasurement(Warnings& warnings, const DeviceAnswers& device, const ch
                          GetUnknownText(unknown))});
 }
 
-void WarnOfFailure(Warnings& warnings, const DeviceAnswers& device)
+void WarnOfFailure(Warnings& warnings, const DeviceAnswers& device, const RunOutcome& outcome)
 {
     if (!device.fFailed)
         return;
@@ -84,20 +89,23 @@ void WarnOfFailure(Warnings& warnings, const DeviceAnswers& device)
         std::find_if(device.fAnswers.begin(), device.fAnswers.end(), [](const Answer& answer) {
             return answer.fMissing == Missing::kDeviceFailed;
         });
-    warnings.push_back({"device-failed", device.fTag,
-                        failed == device.fAnswers.end()
-                            ? "a test failed"
-                            : fmt::format("a test failed: no answer from {} on", failed->fKey)});
+    if (failed == device.fAnswers.end())
+        warnings.push_back({"device-failed", device.fTag, "a test failed"});
+    else
+        warnings.push_back({"device-failed", device.fTag,
+                            fmt::format("a test failed: no answer from {} on", failed->fKey),
+                            FindCause(outcome, failed->fKnown->GetKey(device.fTag))});
 }
 
-void WarnOfDevice(Warnings& warnings, const DeviceAnswers& device)
+void WarnOfDevice(Warnings& warnings, const DeviceAnswers& device, const RunOutcome& outcome)
 {
     WarnOfSoftware(warnings, device);
     for (const Check& trial : kTrials)
         if (device.GetValue(trial.fKey) == "0")
-            warnings.push_back({trial.fCode, device.fTag, trial.fText});
+            warnings.push_back({trial.fCode, device.fTag, trial.fText,
+                                FindCause(outcome, device.fTag + "." + trial.fKey)});
     WarnOfAdapter(warnings, device);
-    WarnOfFailure(warnings, device);
+    WarnOfFailure(warnings, device, outcome);
     WarnOfMeasurement(warnings, device, "CLBandwidth", "the copy bandwidth");
     WarnOfMeasurement(warnings, device, "CLCompute", "the compute score");
 }
@@ -106,7 +114,12 @@ void WarnOfDevice(Warnings& warnings, const DeviceAnswers& device)
 
 std::string GetWarningText(const Warning& warning)
 {
-    return warning.fTag.empty() ? warning.fText : warning.fTag + ": " + warning.fText;
+    std::string text = warning.fTag.empty() ? warning.fText : warning.fTag + ": " + warning.fText;
+    if (warning.fCause.empty())
+        return text;
+    if (text.back() == '.')
+        text.pop_back();
+    return text + ": " + warning.fCause;
 }
 
 std::vector<Warning> GetWarnings(const Answers& answers, const RunOutcome& outcome)
@@ -129,13 +142,13 @@ std::vector<Warning> GetWarnings(const Answers& answers, const RunOutcome& outco
             std::find_if(answers.fReport.begin(), answers.fReport.end(),
                          [&check](const Answer& row) { return row.fKey == check.fKey; });
         if (answer->fLine && answer->fLine->fValue == "0")
-            warnings.push_back({check.fCode, "", check.fText});
+            warnings.push_back({check.fCode, "", check.fText, FindCause(outcome, check.fKey)});
     }
     if (answers.fDevicesLeftOut > 0)
         warnings.push_back({"devices-left-out", "",
                             fmt::format("{} more devices are left out.", answers.fDevicesLeftOut)});
     for (const DeviceAnswers& device : answers.fDevices)
-        WarnOfDevice(warnings, device);
+        WarnOfDevice(warnings, device, outcome);
     return warnings;
 }
 

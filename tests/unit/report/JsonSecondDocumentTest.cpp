@@ -103,11 +103,13 @@ TEST(JsonSecondDocument, HasWarningsAndCauses)
                                        .Set("glgpu[0].GLRenderer", "\"softpipe\"")
                                        .GetText(),
                                    outcome);
-    EXPECT_EQ(document["warnings"],
-              Json::parse(R"([{"code": "no-default-context", "device": null, "text": )"
-                          R"("No OpenGL context could be created on the first display device."}, )"
-                          R"({"code": "software", "device": "glgpu[0]", "text": )"
-                          R"("software renderer, no graphics hardware: softpipe"}])"));
+    EXPECT_EQ(
+        document["warnings"],
+        Json::parse(R"([{"code": "no-default-context", "device": null, "text": )"
+                    R"("No OpenGL context could be created on the first display device.", )"
+                    R"("cause": "\\xFE"}, )"
+                    R"({"code": "software", "device": "glgpu[0]", "text": )"
+                    R"("software renderer, no graphics hardware: softpipe", "cause": null}])"));
     EXPECT_EQ(document["outcome"]["causes"],
               Json::parse(R"([{"key": "OGLContextCreated", "text": "\uF7FE"}])"));
     EXPECT_EQ(document["devices"][0]["software"], Json::parse(R"({"known": true, "flag": true})"));

@@ -77,6 +77,25 @@ TEST(Warnings, AreNoneForAGoodMachine)
     EXPECT_THAT(Warn(""), IsEmpty());
 }
 
+TEST(Warnings, NameTheirCause)
+{
+    RunOutcome outcome;
+    outcome.fCauses = {{"OGLContextCreated", "eglGetError is missing\x1B"},
+                       {"glgpu[0].CanCompileProgramGLSL", "no"},
+                       {"glgpu[0].glGetIntegerv[GL_MAX_DRAW_BUFFERS]", "returns 1282"}};
+    EXPECT_THAT(Warn(Sample(1, 0)
+                         .Set("OGLContextCreated", "0")
+                         .Set("glgpu[0].CanCompileProgramGLSL", "0")
+                         .Fail("glgpu[0]", "glGetIntegerv[GL_MAX_DRAW_BUFFERS]")
+                         .GetText(),
+                     outcome),
+                ElementsAre("No OpenGL context could be created on the first display device: "
+                            "eglGetError is missing\\x1B",
+                            "glgpu[0]: a realistic pair of shaders does not compile and link: no",
+                            "glgpu[0]: a test failed: no answer from "
+                            "glGetIntegerv[GL_MAX_DRAW_BUFFERS] on: returns 1282"));
+}
+
 TEST(Warnings, NameEachSoftwareRenderer)
 {
     for (const char* name :
