@@ -164,7 +164,8 @@ int Run(const RunChoice& choice)
     const auto writer = std::make_shared<WriterThread>(
         choice.fOutput.empty() ? OpenStandardOutput() : OpenFile(choice.fOutput),
         [stop] { stop->Raise(); });
-    const ChildOptions options = MakeChildOptions(choice.fChild);
+    ChildOptions options = MakeChildOptions(choice.fChild);
+    options.fKeepCauses = true;
     Session session(choice, *writer);
     std::vector<std::string> command = {options.fProgram};
     command.insert(command.end(), options.fArgs.begin(), options.fArgs.end());

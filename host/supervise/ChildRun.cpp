@@ -11,6 +11,9 @@
 #include "pmutil/ConsoleAppLauncher.h"
 #include "pmutil/OutputPump.h"
 #include "pmutil/StartAwareApp.h"
+#include "report/Causes.h"
+#include "report/LineForm.h"
+#include "report/LogFilter.h"
 #include "supervise/ChildLauncher.h"
 #include "supervise/ErrorLines.h"
 #include "supervise/EventQueue.h"
@@ -31,6 +34,13 @@ boost::shared_ptr<pmutil::OutputTask> MakePump(const boost::shared_ptr<StreamFee
 {
     return boost::make_shared<pmutil::OutputPump>(
         [feed](std::string_view block) { feed->Take(block); });
+}
+
+bool HasVerbosity(const std::vector<std::string>& args)
+{
+    constexpr char kOption[] = "-verbose=";
+    return std::any_of(args.begin(), args.end(),
+                       [&](const std::string& arg) { return arg.rfind(kOption, 0) == 0; });
 }
 
 class Supervision {
@@ -83,7 +93,7 @@ private:
         fLaunch.SetConsoleApp(boost::make_shared<pmutil::StartAwareApp>(fLauncher));
         try {
             const pmutil::ChildCommand command =
-                pmutil::MakeChildCommand(fOptions.fProgram, fOptions.fArgs);
+                pmutil::MakeChildCommand(fOptions.fProgram, GetArgs());
             fLaunch.SetLaunchParams(pmutil::LaunchParams(MakePump(fOut), MakePump(fErr),
                                                          command.fArgs, command.fProgram));
             fLaunch.Launch();
@@ -166,10 +176,46 @@ private:
             break;
         case Event::Kind::kBytes:
             if (event.fChannel == pmutil::OutputChannel::kStdout)
-                TakeLines(fReader.Feed(event.fBytes));
+                TakeOutput(event.fBytes);
             else
                 TakeErrorLines(fErrorLines.Feed(event.fBytes));
         }
+    }
+
+    // The log goes first, so that a -verbose= of the arguments would count.
+    std::vector<std::string> GetArgs() const
+    {
+        std::vector<std::string> args = fOptions.fArgs;
+        if (fAddsLog)
+            args.insert(args.begin(), "-verbose=1");
+        return args;
+    }
+
+    void TakeOutput(const std::string& bytes)
+    {
+        if (fAddsLog)
+            TakePieces(fLog.Feed(bytes));
+        else
+            TakeLines(fReader.Feed(bytes));
+    }
+
+    void TakePieces(const std::vector<LogFilter::Piece>& pieces)
+    {
+        for (const LogFilter::Piece& piece : pieces)
+            if (piece.fIsLog)
+                TakeLogLine(piece.fText);
+            else
+                TakeLines(fReader.Feed(piece.fText));
+    }
+
+    void TakeLogLine(const std::string& text)
+    {
+        constexpr std::size_t kMaxCauses = 100;
+        std::string cause = FindCauseText(GetLogText(text));
+        if (!cause.empty() && fOutcome.fCauses.size() < kMaxCauses)
+            fOutcome.fCauses.push_back(
+                {fEvidence.fReport.GetSequence().GetNextKey(), std::move(cause)});
+        fEvidence.fReport.Add(ReadLine(text, "\n", false));
     }
 
     void TakeLines(const std::vector<ReportLine>& lines)
@@ -246,6 +292,8 @@ private:
         while (const std::optional<Event> event = fQueue->Pop(milliseconds(0)))
             Take(*event);
         fQueue->Close();
+        if (fAddsLog)
+            TakePieces(fLog.Finish());
         TakeLines(fReader.Finish());
         TakeErrorLines(fErrorLines.Finish());
         if (!fEnded)
@@ -281,6 +329,8 @@ private:
     ProcessTree fTree;
     pmutil::ConsoleAppLauncher fLaunch;
 
+    const bool fAddsLog = fOptions.fKeepCauses && !HasVerbosity(fOptions.fArgs);
+    LogFilter fLog;
     ReportReader fReader;
     ErrorLines fErrorLines;
     Evidence fEvidence;

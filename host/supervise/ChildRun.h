@@ -19,6 +19,10 @@ struct ChildOptions {
     std::string fProgram; // its path
     std::vector<std::string> fArgs;
     double fTimeoutSeconds = 60; // 0: no limit
+    // Asks the child for its log by -verbose=1, unless the arguments have a -verbose= of their own,
+    // and takes the causes of failures from it. The lines of that log are no part of the report and
+    // reach no observer.
+    bool fKeepCauses = false;
     ReportReader::Limits fLimits;
 };
 

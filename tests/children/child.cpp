@@ -1,5 +1,6 @@
 // The child of the supervision tests. Executes its arguments one after the other:
 //
+//   -verbose=1             nothing: assay-host adds it
 //   out TEXT, err TEXT     writes a line
 //   part TEXT              writes to standard error without a line end
 //   exit CODE              ends with the code
@@ -69,6 +70,8 @@ int main(int argc, char** argv)
     for (int index = 1; index < argc; ++index) {
         const std::string word = argv[index];
         const auto next = [&] { return index + 1 < argc ? argv[++index] : ""; };
+        if (word == "-verbose=1")
+            continue;
         if (word == "out") {
             std::fprintf(stdout, "%s\n", next());
             std::fflush(stdout);

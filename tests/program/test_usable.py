@@ -49,7 +49,7 @@ class Failure:
 FAILURES = {
     "none": Failure(),
     # OpenGL: the library, the display devices, the contexts
-    "no EGL library": Failure(egl="absent", opengl=("absent", "no-device", None)),
+    "no EGL library": Failure(egl="absent", opengl=("absent", "no-library", None)),
     "no display device": Failure(gl="at eglQueryDevicesEXT claim 0\nat eglInitialize return 0\n",
                                  opengl=("absent", "no-device", None)),
     "no display": Failure(gl="at eglInitialize return 0\n",
@@ -183,6 +183,38 @@ def test_each_form_and_each_need(tmp_path, name):
         assert any(line.split()[:1] == [label] and f" {answer[0]}{device}: " in line
                    for line in shown.text.splitlines())
         assert shown.status == NEEDED[answer[0]]
+
+
+# The key of a failure, and what the log says of it.
+CAUSES = {
+    "no EGL library": ("QGFOGLInitialized", "libEGL.so.1 can't be opened"),
+    "no context": ("OGLContextCreated", "EGL_BAD_ALLOC (0x3003)"),
+    "shader does not compile": ("glgpu[0].CanCompileProgramGLSL", "no"),
+    "framebuffer is not complete": ("glgpu[0].GLFrameBufferOK", "The framebuffer is not complete"),
+    "query fails before the trials": ("glgpu[0].GLVendor", "glGetError() returns 1282"),
+}
+
+
+@pytest.mark.parametrize("name", CAUSES)
+def test_the_cause_reaches_the_reader(tmp_path, name):
+    key, text = CAUSES[name]
+    hosted = run(tmp_path, FAILURES[name], "--format", "json")
+    document = validate_document(hosted.out)
+    assert [cause for cause in document["outcome"]["causes"]
+            if cause["key"] == key and text in cause["text"]]
+    assert [warning for warning in document["warnings"]
+            if warning["cause"] is not None and text in warning["cause"]]
+    # The log is no part of the report.
+    assert {line["kind"] for line in document["lines"]} == {"value"}
+    shown = " ".join(run(tmp_path, FAILURES[name]).text.split())
+    assert text in shown
+    # One who asks for the log, or for none, gets that.
+    loud = Failure(**{**FAILURES[name].__dict__, "child": ("-verbose=1",)})
+    document = validate_document(run(tmp_path, loud, "--format", "json").out)
+    assert {line["kind"] for line in document["lines"]} == {"value", "comment"}
+    silent = Failure(**{**FAILURES[name].__dict__, "child": ("-verbose=0",)})
+    document = validate_document(run(tmp_path, silent, "--format", "json").out)
+    assert document["outcome"]["causes"] == []
 
 
 def test_the_first_schema(tmp_path):

@@ -1,0 +1,67 @@
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "TestChild.h"
+#include "supervise/ChildRun.h"
+
+namespace assay_host {
+namespace {
+
+class Lines : public RunObserver {
+public:
+    void OnLine(const ReportLine& line, double /*seconds*/) override
+    {
+        fLines.push_back(line.fText);
+    }
+
+    std::vector<std::string> fLines;
+};
+
+const std::string kPrefix = "# 00004.2026.11.21_10:49:36.366(+00.000)[tid=462f] ";
+const std::string kFailure =
+    kPrefix + "Cannot create default ContextOffscreen: eglGetError is not offered";
+
+RunOutcome RunWith(bool keepCauses, std::vector<std::string> args, Lines& lines)
+{
+    ChildOptions options;
+    options.fProgram = TEST_CHILD;
+    options.fArgs = std::move(args);
+    options.fTimeoutSeconds = 0;
+    options.fKeepCauses = keepCauses;
+    pmutil::StopRequest stop;
+    return RunChild(options, lines, stop);
+}
+
+TEST(Causes, AreTakenFromTheLogThatIsAskedFor)
+{
+    Lines lines;
+    const RunOutcome outcome = RunWith(true,
+                                       {"out", "QGFOGLInitialized=1", "out", kFailure, "out",
+                                        "OGLContextCreated=0", "out", kPrefix + "last"},
+                                       lines);
+    EXPECT_EQ(outcome.FindCause("OGLContextCreated"), "eglGetError is not offered");
+    EXPECT_EQ(outcome.fCauses.size(), 1U);
+    EXPECT_EQ(lines.fLines,
+              (std::vector<std::string>{"QGFOGLInitialized=1", "OGLContextCreated=0"}));
+    EXPECT_EQ(outcome.fLastLogLine, kPrefix + "last");
+    EXPECT_EQ(outcome.fCommand[1], "out"); // what was asked for
+}
+
+TEST(Causes, AreLeftWhereNobodyAsks)
+{
+    Lines lines;
+    EXPECT_TRUE(RunWith(false, {"out", kFailure}, lines).fCauses.empty());
+    EXPECT_EQ(lines.fLines, std::vector<std::string>{kFailure});
+}
+
+TEST(Causes, AreLeftToArgumentsThatSetTheLog)
+{
+    Lines lines;
+    EXPECT_TRUE(RunWith(true, {"-verbose=1", "out", kFailure}, lines).fCauses.empty());
+    EXPECT_EQ(lines.fLines, std::vector<std::string>{kFailure});
+}
+
+} // namespace
+} // namespace assay_host
