@@ -14,7 +14,8 @@ std::string MakeUtcText(std::int64_t seconds)
     const boost::gregorian::date epoch(1970, 1, 1);
     const std::int64_t maxDays = (boost::gregorian::date(9999, 12, 31) - epoch).days();
     const std::int64_t time = std::clamp<std::int64_t>(seconds, 0, maxDays * kDay + kDay - 1);
-    const boost::gregorian::date date = epoch + boost::gregorian::days(time / kDay);
+    const boost::gregorian::date date =
+        epoch + boost::gregorian::days(static_cast<long>(time / kDay));
     const std::int64_t rest = time % kDay;
     return fmt::format("{:04}-{:02}-{:02}T{:02}:{:02}:{:02}Z", static_cast<int>(date.year()),
                        date.month().as_number(), date.day().as_number(), rest / 3600,
