@@ -6,7 +6,7 @@ files), and the report must show their values.
 
 from dataclasses import dataclass, field
 
-from clmodel import CL_KEYS, cl_test
+from clmodel import CL_KEYS, cl_test, escaped, quoted
 
 # The constants of the battery, and their codes.
 BATTERY_INTEGERS = [
@@ -43,18 +43,6 @@ KEYS = [
     "GLDriverVersion", "GLRectTextureSize", "GLRenderer", "GLRendererID", "HasGLNPOTSupport",
     "GLDriver", "GLDriverDate", "CanCompileProgramGLSL", "GLFrameBufferOK",
 ]
-
-
-def quoted(text):
-    return f'"{text}"'
-
-
-def escaped(text):
-    """The text as a literal of a driver script."""
-    data = text.encode("utf-8", "surrogateescape")
-    return '"' + "".join(
-        chr(byte) if 0x20 <= byte < 0x7F and byte not in b'"\\' else f"\\x{byte:02X}"
-        for byte in data) + '"'
 
 
 @dataclass

@@ -3,8 +3,9 @@ one GPU or the child, but never garble the report."""
 
 import pytest
 
+from clmodel import escaped
 from harness import ended_by
-from model import Gpu, check, escaped, predict
+from model import Gpu, check, predict
 
 MEBIBYTE = 1 << 20
 
