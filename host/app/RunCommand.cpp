@@ -7,6 +7,7 @@
 #include "app/Commands.h"
 #include "app/FindAssay.h"
 #include "facts/Environment.h"
+#include "facts/FileVersion.h"
 #include "output/Delivery.h"
 #include "output/Output.h"
 #include "output/Terminal.h"
@@ -46,13 +47,14 @@ ReportLine RestoreLine(const ReportLine& kept)
     return ReadLine(kept.fText, kept.fLineEnd, kept.fCut);
 }
 
-RunFacts MakeFacts(const RunChoice& choice)
+RunFacts MakeFacts(const RunChoice& choice, const std::string& program)
 {
     RunFacts facts;
     facts.fHostVersion = ASSAY_VERSION;
-    facts.fChildVersion = {{}, "its file does not name one"};
-    if (choice.fFormat != Format::kText)
+    if (choice.fFormat != Format::kText) {
+        facts.fChildVersion = GetFileVersion(program);
         facts.fEnvironment = GetEnvironment(choice.fIdentify);
+    }
     return facts;
 }
 
@@ -71,8 +73,8 @@ int GetStatus(Need need, const Report& report, const RunOutcome& outcome)
 // Collects the report, and passes lines and events to the writer at once.
 class Session : public RunObserver {
 public:
-    Session(const RunChoice& choice, WriterThread& writer)
-        : fChoice(choice), fWriter(writer), fFacts(MakeFacts(choice))
+    Session(const RunChoice& choice, const std::string& program, WriterThread& writer)
+        : fChoice(choice), fWriter(writer), fFacts(MakeFacts(choice, program))
     {}
 
     void Start(const std::vector<std::string>& command)
@@ -166,7 +168,7 @@ int Run(const RunChoice& choice)
         [stop] { stop->Raise(); });
     ChildOptions options = MakeChildOptions(choice.fChild);
     options.fKeepCauses = true;
-    Session session(choice, *writer);
+    Session session(choice, options.fProgram, *writer);
     std::vector<std::string> command = {options.fProgram};
     command.insert(command.end(), options.fArgs.begin(), options.fArgs.end());
     session.Start(command);

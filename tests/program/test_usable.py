@@ -8,7 +8,7 @@ from dataclasses import dataclass
 import pytest
 
 from calls import FullMachine
-from harness import BUILD, PROGRAM_AT_ROOT
+from harness import BUILD, PROGRAM, PROGRAM_AT_ROOT
 from hosting import host_run
 from validate import validate_document, validate_events
 
@@ -233,3 +233,14 @@ def test_the_machine_is_named_on_request(tmp_path):
         environment = validate_document(hosted.out)["environment"]
         assert environment["host"]["known"] == known
         assert environment["kernel"]["known"]
+
+
+def test_the_childs_version(tmp_path):
+    """Read from its file, also of a child that can't run to its end."""
+    for name, program in (("crash in the copy", PROGRAM), ("no child", "/no/such/program")):
+        failure = Failure(**{**FAILURES[name].__dict__, "program": program})
+        versions = validate_document(run(tmp_path, failure, "--format", "json").out)["versions"]
+        if program == PROGRAM:
+            assert versions["assay"] == versions["assay-host"]
+        else:
+            assert versions["assay"] == {"known": False, "reason": "its file can't be read"}
