@@ -4,7 +4,7 @@ and every entry point occurs.
 
 If a fault ends the run: the output up to the call is that of an undisturbed run, the documented table
 has the call in the row of the last line, and the run ends as the fault does; for assay-host this is the
-verdict, the reason and the status.
+verdict, the reason and the status, and the library that the call belongs to is broken and no other.
 
 If the run continues after a fault: the output up to the call is that of an undisturbed run; after it
 there are only keys that are due, in order, with values of the right form; a text is a prefix of the
@@ -25,7 +25,7 @@ import pytest
 
 from calls import LastLines, PREFIX, calls_of, without_calls
 from clmodel import cl_values_of
-from faults import FAULTS, RESULTS
+from faults import FAULTS, RESULTS, library_of
 from harness import STAMP, Run, ended_by, split_lines, text_of
 from hosting import STATUSES, report_bytes
 from model import check, predict
@@ -142,9 +142,22 @@ def check_hosted(table, pair, bare, hosted):
     if ends is not None or pair.fault.ends == "_exit":
         last = outcome["lastLogLine"] or outcome["lastReportLine"]
         table.check(pair.call.name, PREFIX.sub("", last))
+        if pair.fault.ends is not None:
+            check_usable(pair, document)
     assert document["report"]["whole"] == whole
     assert hosted.err == b""
     assert hosted.status == STATUSES[outcome["verdict"]]
+
+
+def check_usable(pair, document):
+    """What can be used after a fault that ended the run, by the library of the call alone."""
+    answers = [document["usable"][name]["answer"] for name in ("opengl", "opencl")]
+    if document["report"]["whole"]:
+        assert answers == ["hardware", "hardware"]
+    elif library_of(pair.call.name) == "cl":
+        assert answers == ["hardware", "broken"]
+    else:
+        assert answers == ["broken", "unknown"]
 
 
 def run_pair(sweep, table, pair):
