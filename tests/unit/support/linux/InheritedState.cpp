@@ -1,0 +1,75 @@
+#include "support/InheritedState.h"
+
+#include <cerrno>
+#include <csignal>
+#include <cstdlib>
+#include <fcntl.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+namespace {
+
+void DoNothing(int /*signal*/) {}
+
+// Whoever ignores one of these wants the tests to survive it. A handler doesn't reach the programs
+// that the tests start.
+bool IsFromTheUser(int number)
+{
+    return number == SIGHUP || number == SIGINT || number == SIGQUIT;
+}
+
+void ResetSignals()
+{
+    for (int number = 1; number <= SIGRTMAX; ++number) {
+        struct sigaction action = {};
+        if (::sigaction(number, nullptr, &action) != 0 || action.sa_handler != SIG_IGN)
+            continue;
+        action = {};
+        action.sa_handler = IsFromTheUser(number) ? DoNothing : SIG_DFL;
+        action.sa_flags = SA_RESTART;
+        ::sigaction(number, &action, nullptr);
+    }
+    sigset_t none;
+    ::sigemptyset(&none);
+    ::sigprocmask(SIG_SETMASK, &none, nullptr);
+}
+
+// A descriptor that a test opens must not become a standard stream.
+void OpenStandardStreams()
+{
+    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) {
+        if (::fcntl(stream, F_GETFD) < 0)
+            ::open("/dev/null", O_RDWR); // NOLINT: no O_CLOEXEC, as any standard stream
+    }
+}
+
+// Leaves the place to a process that does what the first one must, and goes on in its child.
+void LeaveFirstPlace()
+{
+    if (::getpid() != 1)
+        return;
+    const ::pid_t child = ::fork();
+    if (child <= 0)
+        return;
+    int status = 0;
+    for (;;) {
+        int each = 0;
+        const ::pid_t ended = ::wait(&each);
+        if (ended == child)
+            status = each;
+        else if (ended > 0 || errno == EINTR)
+            continue;
+        else
+            break;
+    }
+    std::_Exit(WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status));
+}
+
+} // namespace
+
+void DropInheritedState()
+{
+    ResetSignals();
+    OpenStandardStreams();
+    LeaveFirstPlace();
+}
