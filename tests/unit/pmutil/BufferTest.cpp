@@ -534,7 +534,7 @@ TEST(Buffer, SeekRelative)
 
 TEST(Buffer, SeekRelativePast64BitsNamesTheEnd)
 {
-    // No allocation is this long; only the bounds are looked at.
+    // No allocation is this long; only the bounds are checked.
     char byte = 0;
     Buffer buffer(&byte, kLargest);
     buffer.Seek(kLargest - 5);

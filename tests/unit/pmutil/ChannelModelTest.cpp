@@ -1,4 +1,4 @@
-// Random operations on a Buffer, compared at each step with a model that is too plain to be wrong.
+// Random operations on a Buffer, compared at each step with a simple model.
 #include <algorithm>
 #include <array>
 #include <gtest/gtest.h>
@@ -18,14 +18,14 @@ namespace {
 constexpr int kOperations = 1'000'000;
 constexpr std::uint64_t kMost = 20'000; // keeps the blocks small, and the growth frequent
 
-// What went wrong, by text; empty for nothing.
+// The text of an error; empty if there is none.
 using Outcome = std::string;
 
 class Model {
 public:
     explicit Model(std::uint64_t capacity) : fBytes(capacity, kUnknown) {}
 
-    static constexpr int kUnknown = -1; // a byte that nobody wrote
+    static constexpr int kUnknown = -1; // a byte that was never written
 
     std::vector<int> fBytes;
     std::uint64_t fOffset = 0, fEnd = 0, fDirtyBegin = 0, fDirtyEnd = 0;
@@ -148,7 +148,7 @@ public:
 private:
     std::uint64_t Below(std::uint64_t limit) { return fRandom() % limit; }
 
-    // Mostly small, now and then large, and often one of the buffer's own bounds or next to one.
+    // Mostly small, sometimes large, and often at or next to a bound of the buffer.
     std::uint64_t Size()
     {
         switch (Below(8)) {
@@ -189,7 +189,7 @@ private:
         }
     }
 
-    // `read` gives the count; what it read is compared with the model's.
+    // `read` returns the count. The bytes are compared with the model's.
     template <typename Read>
     void CheckRead(std::uint64_t size, Read read)
     {
@@ -208,7 +208,7 @@ private:
         ExpectBytes(expected, actual.data());
     }
 
-    // Reads ahead with pieces of random size and looks whether all of it comes again.
+    // Reads ahead in pieces of random size, and checks that all bytes are read again.
     void CheckPreview()
     {
         Previewer preview(fBuffer);
@@ -223,7 +223,7 @@ private:
             fSeen.insert(fSeen.end(), expected.begin(), expected.end());
         }
         preview.End();
-        // What came out of the pushback is back there, and what came from the buffer now is.
+        // The bytes of the pushback are there again, followed by those read from the buffer.
         if (copy.fPushback)
             fSeen.clear();
         else

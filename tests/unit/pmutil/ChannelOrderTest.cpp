@@ -1,4 +1,4 @@
-// In which order, and how often, channels check what they must.
+// The order and the number of the checks of channels.
 #include <gtest/gtest.h>
 
 #include "FakeChannel.h"
@@ -7,7 +7,7 @@
 
 namespace {
 
-// Counts how often it is asked whether it is open.
+// Counts the calls of IsOpen.
 class CountingChannel : public FakeChannel {
 public:
     mutable int fAsked = 0;

@@ -17,7 +17,7 @@ namespace {
 constexpr char kOverrideRequired[] = "pmutil binio function override required";
 constexpr char kNotOpen[] = "pmutil::Channel not open";
 
-// Open, and without any other operation of its own.
+// A channel that is open and implements no other operation.
 class OnlyOpen : public RandomAccess {
 protected:
     bool BinioIsOpen() const override { return true; }

@@ -1,4 +1,4 @@
-// Consumers of a real child's output.
+// Output tasks that collect a real child's output.
 #pragma once
 
 #include <atomic>
@@ -17,7 +17,7 @@
 
 namespace pmutil {
 
-// The platform's launcher, which tells when a child is killed.
+// The platform's launcher, which reports the kill of a child.
 class WatchedLauncher : public Launcher {
 public:
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override
@@ -41,7 +41,7 @@ private:
     const boost::shared_ptr<Launcher> fPlatform = MakeLauncher();
 };
 
-// Lets the tasks of a launch stay until the launch is through its start.
+// Keeps the tasks of a launch running until the start of the launch is over.
 class StartedApp : public ConsoleApp {
 public:
     StartedApp() : StartedApp(boost::make_shared<WatchedLauncher>()) {}
@@ -50,7 +50,7 @@ public:
         fLauncher->fOnKill = [] {};
     }
 
-    // Until the child runs, or is killed since the launch failed.
+    // Waits until the child runs, or is killed because the launch failed.
     void AwaitStart()
     {
         boost::unique_lock<boost::mutex> lock(fStartMutex);
@@ -90,7 +90,7 @@ private:
     bool fStarted = false;
 };
 
-// Reads everything, and doesn't return before the launch is through its start.
+// Reads everything, and returns after the start of the launch is over.
 class CollectingTask : public OutputTask {
 public:
     explicit CollectingTask(boost::weak_ptr<StartedApp> app) : fApp(std::move(app)) {}

@@ -1,5 +1,4 @@
-// Failures of a launch: the list of them, the faults that bring them about, and what the client
-// sees.
+// Failures of a launch: their list, the injected faults, and the client's view.
 #include <gmock/gmock.h>
 
 #include "ConsoleAppFixture.h"
@@ -35,7 +34,7 @@ TEST_F(FailureList, IsThrownByEachKindOfWait)
     EXPECT_TRUE(ThrowsFailure("stdout: stored", [&] { fApp->Wait(nullptr, kLong); }));
     OpenTasks();
     fail();
-    const NoShortWait noWait; // for a launch that nobody ends
+    const NoShortWait noWait; // for a launch that doesn't end
     EXPECT_TRUE(ThrowsFailure("stdout: stored", [&] { fApp->Launch(fData, fParams); }))
         << "one that was stored before";
     EXPECT_EQ(Peek(), State::kIdle);
@@ -138,7 +137,7 @@ TEST_F(InjectedFault, NotifyRunningOfTheLauncherKillsTheChild)
 TEST_F(InjectedFault, LauncherWaitOfTheLauncherKillsTheChild)
 {
     fApp->SetInjectedFault(Fault::kLauncherWait);
-    // The launch is through by then, unless the client's thread is slow to see it.
+    // The launch has ended by then, unless the client's thread is slow.
     EXPECT_TRUE(ThrowsFailure("Launcher: LauncherWait", [&] {
         Launch();
         fApp->Wait(nullptr, kLong);
@@ -190,7 +189,7 @@ TEST_F(InjectedFault, LauncherKillOfTheLauncherEndsTheCleanUp)
         << "both output threads are let go";
 }
 
-// The faults of the output threads fire for the first of them that comes.
+// The faults of the output threads fire in the first thread that reaches them.
 class OutputFault : public ConsoleAppFixture, public testing::WithParamInterface<OutputChannel> {
 protected:
     OutputFault()
@@ -275,7 +274,7 @@ TEST_F(Situation, AnOutputTaskDoesNotStartInTheShortWait)
             gate->Await();
     };
     const NoShortWait noWait;
-    // Launch waits as long as the thread of the launch does; either may be first.
+    // Launch and the thread of the launch wait for the same time; either may be first.
     EXPECT_TRUE(ThrowsFailure("Launcher: LauncherTask: output task stdout never started", [&] {
         Launch();
         fApp->Wait(nullptr, kLong);

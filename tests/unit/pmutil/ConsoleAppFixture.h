@@ -1,4 +1,4 @@
-// An application over a fake launcher, with tasks that run as long as the test lets them.
+// An application with a fake launcher, and tasks that run until the test ends them.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -22,7 +22,7 @@ protected:
         fParams.SetOutputTask(OutputChannel::kStdout, fStdout);
         fParams.SetOutputTask(OutputChannel::kStderr, fStderr);
         fParams.fProgram = L"program";
-        // As a real child's output, that of a killed one ends.
+        // The output of a killed child ends, as with a real one.
         fLauncher->fOnKill = [out = fStdout, err = fStderr] {
             out->fGate.Open();
             err->fGate.Open();
@@ -58,7 +58,7 @@ protected:
         fApp->Launch(fData, fParams);
     }
 
-    // Launches, and returns when the launcher's thread waits for the child.
+    // Launches, and returns once the launcher's thread waits for the child.
     void LaunchUntilItWaits()
     {
         const int waits = fLauncher->fWaits;
@@ -66,21 +66,21 @@ protected:
         EXPECT_TRUE(Eventually([&] { return fLauncher->fWaits > waits; }));
     }
 
-    // Kill waits first for another state than Timeout, and none comes.
+    // Kill first waits for a state other than Timeout, which doesn't come.
     void KillAtTimeout()
     {
         const NoShortWait noWait;
         fApp->Kill();
     }
 
-    // Lets the child and its output end.
+    // Ends the child and its output.
     void End(WaitResult result, int exitCode = 0)
     {
         OpenTasks();
         fLauncher->End(result, exitCode);
     }
 
-    // Whether a launch goes well.
+    // Whether a launch succeeds.
     testing::AssertionResult RunsClean()
     {
         try {
@@ -101,12 +101,12 @@ protected:
     const ThreadsEnd fNoThreadIsLeft; // which the next test would count
     const LongShortWait fLongShortWait;
     boost::shared_ptr<FakeLauncher> fLauncher = boost::make_shared<FakeLauncher>();
-    // The one fake serves as a new launcher too.
+    // The same fake is used as a new launcher.
     boost::shared_ptr<RecordingApp> fApp =
         boost::make_shared<RecordingApp>(fLauncher, [this] { return fLauncher; });
     boost::shared_ptr<PatientTask> fStdout = boost::make_shared<PatientTask>();
     boost::shared_ptr<PatientTask> fStderr = boost::make_shared<PatientTask>();
-    boost::shared_ptr<Gate> fGate = boost::make_shared<Gate>(); // for what a test wants to hold up
+    boost::shared_ptr<Gate> fGate = boost::make_shared<Gate>(); // for a test to block something
     boost::shared_ptr<consoleapp::ExecutionData> fData;
     LaunchParams fParams;
 };

@@ -148,7 +148,7 @@ TEST_F(ConsoleAppTest, WaitGivesTheLaunchersThreadUpIfItWillNotEnd)
     End(kEndedNormally, 3);
     int exitCode = -1;
     {
-        // The thread hangs before it comes to a short wait.
+        // The thread hangs before a short wait.
         const NoShortWait noWait;
         EXPECT_EQ(fApp->Wait(&exitCode, kLong), State::kTimeout);
     }
@@ -332,7 +332,7 @@ TEST_F(ConsoleAppTest, DestructionWhileRunningReturns)
         const NoShortWait noWait;
         fApp.reset();
     }
-    // The launcher's thread may be in a notification, and is the last owner then.
+    // The launcher's thread may be in a notification, and then is the last owner.
     EXPECT_TRUE(Eventually([&] { return fData->GetConsoleApp() == nullptr; }));
 }
 
@@ -351,7 +351,7 @@ TEST_F(ConsoleAppTest, EachOfTwoThreadsThatWaitLearnsTheEnd)
         int informed = 0;
         for (int index = 0; index < 2; ++index) {
             if (ends[index] == State::kIdle)
-                continue; // came when the other was through
+                continue; // came after the other had finished
             ++informed;
             EXPECT_EQ(ends[index], State::kFinished);
             EXPECT_EQ(exitCodes[index], 5);

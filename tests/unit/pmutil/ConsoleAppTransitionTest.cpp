@@ -1,4 +1,4 @@
-// The states of a launch: each way from one to another, and what is called, with which lock, on it.
+// The states of a launch: every transition, with its calls and locks.
 #include <gmock/gmock.h>
 
 #include "ConsoleAppFixture.h"
@@ -9,7 +9,7 @@ using testing::ElementsAre;
 
 namespace {
 
-// The states in the order in which they were set, as the log tells.
+// The states in the order in which they were set, by the log.
 class StateLog {
 public:
     std::vector<std::string> Get() const
@@ -37,7 +37,7 @@ TEST_F(StateSequence, OfALaunchThatEndsByItself)
     Launch();
     End(kEndedNormally);
     fApp->Wait(nullptr, kLong);
-    // Both Launch and the launcher's thread say that it launches.
+    // Both Launch and the launcher's thread log Launching.
     EXPECT_THAT(log.Get(),
                 ElementsAre("Launching", "Launching", "Launched", "Running", "Finished", "Idle"));
 }
@@ -97,7 +97,7 @@ TEST_F(StateSequence, OfALaunchThatFails)
 // From each state.
 class Transition : public ConsoleAppFixture, public testing::WithParamInterface<State> {
 protected:
-    // Whether the event leads to `expected`, which a look at an unstable state shows as Timeout.
+    // Whether the event leads to `expected`. GetState returns Timeout for an unstable state.
     template <typename Event>
     void ExpectState(const Event& event, State expected)
     {
@@ -174,7 +174,7 @@ TEST_P(Transition, Kill)
     const NoShortWait noWait;
     fApp->SetState(GetParam());
     fApp->Kill();
-    // An unstable state has run out of time first, and Timeout counts like Running.
+    // The wait for an unstable state timed out first, and Timeout counts as Running.
     const bool kills = !IsStable(GetParam()) || GetParam() == State::kRunning;
     EXPECT_EQ(fLauncher->fKills, kills ? 1 : 0);
     EXPECT_EQ(Peek(), kills ? State::kTimeout : GetParam()) << "Killing is not stable";
@@ -198,7 +198,7 @@ TEST_F(Notification, EachComesOnceWithoutTheLock)
     Launch();
     End(kEndedNormally, 7);
     EXPECT_EQ(fApp->Wait(nullptr, kLong), State::kFinished);
-    const auto events = fApp->Events(); // one that found the lock held would say so
+    const auto events = fApp->Events(); // marks an event with the lock held
     EXPECT_THAT(events, testing::UnorderedElementsAre("OnLaunching", "begin stdout", "begin stderr",
                                                       "OnRunning", "end stdout", "end stderr",
                                                       "OnFinished 7"));

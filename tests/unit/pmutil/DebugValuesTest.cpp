@@ -41,7 +41,7 @@ TEST_F(DebugValuesTest, InitialValueIsStoredAtTheFirstResolutionOnly)
 
 TEST_F(DebugValuesTest, RecordsWithOneNameShareTheValue)
 {
-    const std::string name = "DebugValuesTest.shared"; // not the same pointer
+    const std::string name = "DebugValuesTest.shared"; // a different pointer
     static DebugValue first{"DebugValuesTest.shared", 0};
     DebugValue second{name.c_str(), 0};
     EXPECT_EQ(&GetDebugValue(first), &GetDebugValue(second));
@@ -118,7 +118,7 @@ TEST(DebugValuesDeathTest, TheHundredAndFirstNameGetsTheOverflowSlot)
             REQUIRE_SO(&GetDebugValue(*records[number]) == &overflow);
             REQUIRE_SO(records[number]->index == 0);
         }
-        REQUIRE_SO(overflow == 0); // no initial value is stored there
+        REQUIRE_SO(overflow == 0); // the initial value is not stored there
         DebugValue again{"name50", 1};
         REQUIRE_SO(&GetDebugValue(again) == &GetDebugValue(*records[50])); // known names resolve
     });

@@ -71,12 +71,12 @@ TEST(EscapeTest, HighBytesFollowTheLocalesIsgraph)
     EXPECT_EQ(Escaped(200, '"', 2), "\\x00c8");
 }
 
-// A locale of the C library for as long as it lives; the first that there is.
+// Sets a locale of the C library, the first that exists, until it is destroyed.
 class Latin1 {
 public:
     Latin1()
     {
-#ifdef ASSAY_TEST_LOCALES // a folder with locales that the build has made
+#ifdef ASSAY_TEST_LOCALES // a folder with locales that the build made
         ::setenv("LOCPATH", ASSAY_TEST_LOCALES, 1);
 #endif
         for (const char* const name : {"en_US.ISO-8859-1", "de_DE.ISO-8859-1", ".1252"})
@@ -130,7 +130,7 @@ TEST(EscapeDeathTest, SizeOtherThan1Or2IsAProgrammingError)
         "size == 1");
 }
 
-// Unescapes one character and tells what is left.
+// Unescapes one character, and returns the rest too.
 template <typename Char>
 std::pair<unsigned, std::size_t> Unescaped(std::basic_string_view<Char> text, int size)
 {
@@ -187,7 +187,7 @@ TEST(UnescapeTest, OneWideCharacter)
     EXPECT_EQ(Unescaped<char16_t>(u"\\n", 2), Result(10, 0));
     EXPECT_EQ(Unescaped<char16_t>(u"\\\u1234", 2), Result(0x1234, 0));
     EXPECT_EQ(Unescaped<char16_t>(u"\\", 2), Result('\\', 0));
-    // A code unit whose low byte is a digit is none.
+    // A code unit whose low byte is a digit is not a digit.
     EXPECT_EQ(Unescaped<char16_t>(u"\\x4\u0131", 2), Result(4, 1));
 }
 
@@ -218,7 +218,7 @@ TEST(EscapeTest, EveryByteComesBack)
     std::string all;
     for (int code = 0; code < 256; ++code)
         all += static_cast<char>(code);
-    all += "f\\x41"; // digits behind an escaped byte, and an escape as text
+    all += "f\\x41"; // digits after an escaped byte, and an escape as text
     for (const char quote : {'"', '\''})
         EXPECT_EQ(UnescapeQuoted(quote + EscapeText(all, quote) + quote), all);
 }

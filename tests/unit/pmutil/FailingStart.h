@@ -13,10 +13,10 @@
 
 namespace pmutil {
 
-// The launcher's thread would wait the whole short wait for such a task, and fail the launch with
-// "never started" if the other failure came only after that. In the first launch after this was
-// made the launcher's thread looks for the task of the channel when the failure of its thread is
-// stored, and once only: the order never depends on how long anything takes.
+// The launcher's thread waits the whole short wait for such a task, and fails the launch with
+// "never started" if the other failure comes only after that. In the first launch after the
+// construction, the launcher's thread checks for the task of the channel when the failure of its
+// thread is stored, and only once: the order doesn't depend on time.
 class FailingStart : public PMLogger {
 public:
     explicit FailingStart(std::string channel)

@@ -1,4 +1,4 @@
-// A channel that records what was asked of it and answers from a script.
+// A channel that records its calls and answers from a script.
 #pragma once
 
 #include <algorithm>
@@ -18,13 +18,13 @@ public:
             ++*fDestroyed;
     }
 
-    // The calls so far, in words.
+    // The calls so far, as text.
     std::vector<std::string> fCalls;
-    // What reads deliver, one piece per call at most.
+    // The data of reads, at most one piece per call.
     std::deque<std::string> fPieces;
     std::string fWritten;
     std::uint64_t fMostPerWrite = UINT64_MAX;
-    // Reads claim this much more than was asked for.
+    // Reads claim this many bytes more than requested.
     std::uint64_t fExcess = 0;
     bool fOpen = true;
     int* fDestroyed = nullptr;

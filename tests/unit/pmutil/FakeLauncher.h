@@ -1,4 +1,4 @@
-// A launcher without processes, a task and an application that record what happens to them.
+// A launcher without processes, and a task and an application that record their calls.
 #pragma once
 
 #include <algorithm>
@@ -84,7 +84,7 @@ public:
         fCond.notify_all();
     }
 
-    // A kill may come a little after the failure that brings it about is told.
+    // A kill may come shortly after the failure that causes it is reported.
     bool AwaitKills(int kills)
     {
         return Eventually([&] { return fKills >= kills; }) && fKills == kills;
@@ -110,7 +110,7 @@ public:
     std::atomic<int> fKills{0};
 };
 
-// Something that threads wait for; closed at first.
+// An event that threads wait for. Initially closed.
 class Gate {
 public:
     void Open() { Set(true); }
@@ -168,7 +168,7 @@ public:
         return std::count(events.begin(), events.end(), event);
     }
 
-    // True if the calling thread, or another, holds the lock for that long.
+    // Whether any thread, or the calling one, holds the lock for this time.
     bool IsLocked(double seconds = kLong)
     {
         const auto done = boost::make_shared<std::atomic<bool>>(false);
@@ -185,7 +185,7 @@ public:
         return locked;
     }
 
-    // To be called when the lock is free again.
+    // Call when the lock is free again.
     void JoinAskers()
     {
         for (boost::thread& asker : fAskers)

@@ -1,5 +1,4 @@
-// Every kind of value has an entry of its own in the table, and an operation of its own to
-// override.
+// Every kind of value has its own entry in the table, and its own virtual operation.
 #include <gtest/gtest.h>
 
 #include "pmutil/Fmt.h"
@@ -16,7 +15,7 @@ std::string Text(Fmt& fmt, T value)
     return text;
 }
 
-// The texts of one value of each kind but char, in the order of the table.
+// The texts of one value of each kind except char, in the order of the table.
 std::vector<std::string> AllTexts(Fmt& fmt)
 {
     const int target = 0;
@@ -47,7 +46,7 @@ TEST(FmtTable, AnEntryServesItsOwnKindAlone)
     const auto defaults = AllTexts(untouched);
     for (std::size_t changed = 0; changed < std::size(kKinds); ++changed) {
         Fmt fmt;
-        fmt.SetFormat(kKinds[changed], "own\0own"); // of use for bool too
+        fmt.SetFormat(kKinds[changed], "own\0own"); // valid for bool too
         const auto texts = AllTexts(fmt);
         for (std::size_t kind = 0; kind < std::size(kKinds); ++kind)
             EXPECT_EQ(texts[kind], kind == changed ? "own" : defaults[kind])
@@ -55,7 +54,7 @@ TEST(FmtTable, AnEntryServesItsOwnKindAlone)
     }
 }
 
-// Tells which of its operations was called.
+// Records which of its operations was called.
 class Telling : public Fmt {
 protected:
     void FormatPointer(std::string& out, const void*, const char*) override { out = "Pointer"; }

@@ -1,4 +1,4 @@
-// Checks in a process of their own, in which logging hasn't started and no debug value is known.
+// Runs checks in a new process, in which logging hasn't started and no debug value is resolved.
 #pragma once
 
 #include <cstdio>

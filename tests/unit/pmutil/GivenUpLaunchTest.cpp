@@ -1,4 +1,4 @@
-// Launches that are given up, and what they and those after them see of each other.
+// Abandoned launches, and their effects on later launches.
 #include <gmock/gmock.h>
 
 #include "CollectingTask.h"
@@ -17,7 +17,7 @@ constexpr char kJoinsStdout[] = "CleanupLaunchThreadTask: joining output task th
 
 class GivenUpLaunch : public ConsoleAppFixture {
 protected:
-    // The first launch is fLauncher's, and the one after it, if it needs one, fSecond's.
+    // The first launch uses fLauncher, and the next one, if it needs a launcher, fSecond.
     GivenUpLaunch()
     {
         fApp = boost::make_shared<RecordingApp>(fLauncher, [this] {
@@ -37,7 +37,7 @@ protected:
             task->fGate.Open();
     }
 
-    // Whose tasks go on meanwhile.
+    // Abandons a launch whose tasks continue.
     void GiveUp()
     {
         {
@@ -56,7 +56,7 @@ protected:
         fParams.SetOutputTask(OutputChannel::kStderr, fStderr);
     }
 
-    // Holds a thread of the launch in a notification until the gate opens.
+    // Blocks a thread of the launch in a notification until the gate opens.
     void HoldIn(const std::string& event)
     {
         fApp->fOnEvent = [gate = fGate, event](const std::string& now) {
@@ -65,7 +65,7 @@ protected:
         };
     }
 
-    // Whether a log line that begins so comes.
+    // Waits for a log line with this beginning, and returns whether it came.
     bool AwaitLine(const std::string& begin)
     {
         return Eventually([&] {
@@ -116,7 +116,7 @@ TEST_F(GivenUpLaunch, IsNotReachedByTheKillOfTheNext)
     EXPECT_EQ(fSecond->fKills, 1);
     EXPECT_EQ(fLauncher->fKills, 0);
     EXPECT_EQ(fApp->Wait(nullptr, kLong), State::kKilled);
-    // Once the old thread has ended its launcher's turn doesn't come back.
+    // After the old thread has ended, its launcher is not used again.
     fLauncher->End(kEndedNormally);
     Launch();
     EXPECT_EQ(fSecond->fLaunches, 2);
@@ -202,7 +202,7 @@ TEST_F(GivenUpLaunch, ItsPumpHasNoSayInTheNextEvenIfItsEndWasSeen)
     {
         const NoShortWait noWait;
         fLauncher->End(kEndedNormally, 7);
-        for (int pump = 0; pump < 2; ++pump) // each gives its failure to a GetState
+        for (int pump = 0; pump < 2; ++pump) // a GetState throws each one's failure
             EXPECT_TRUE(Eventually([&] {
                 try {
                     Peek();
@@ -277,7 +277,7 @@ TEST_F(GivenUpLaunch, ClosesTheReaderOfATaskWhoseThreadHangsBeforeIt)
     HoldIn("begin stdout");
     const NoShortWait noWait;
     const auto fail = [&] {
-        Launch(); // sees the failure if that is fast
+        Launch(); // throws if the failure is already there
         EXPECT_TRUE(fLauncher->AwaitKills(1));
         fApp->Wait(nullptr, kLong);
     };
@@ -304,7 +304,7 @@ TEST_F(GivenUpLaunch, AWaiterThatSawTheEndKeepsTheCode)
 TEST_F(GivenUpLaunch, AWaiterThatSawTheEndKeepsTheCodeWhenTheWaitOfAnotherFails)
 {
     HoldIn("OnFinished 7");
-    for (int round = 0; round < 50; ++round) { // either may be the one who joins
+    for (int round = 0; round < 50; ++round) { // either thread may join
         fGate->Close();
         ForgetLines();
         Launch();
@@ -364,7 +364,7 @@ TEST_F(GivenUpLaunch, OneOutputThreadWillNotEnd)
 {
     const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
     std::optional<NoShortWait> noWait;
-    // The thread of standard output ends when it is waited for, and the other one doesn't.
+    // The thread of standard output ends when it is joined; the other one doesn't.
     fApp->fOnEvent = [&](const std::string& event) {
         if (event != "end stdout")
             return;
@@ -383,7 +383,7 @@ TEST_F(GivenUpLaunch, OneOutputThreadWillNotEnd)
     EXPECT_TRUE(fStderr->IsRunning(0.0));
 }
 
-// The clean-up takes two short waits then, and the client's wait for it only one.
+// The clean-up then takes two short waits, and the client waits for it only one.
 TEST_F(GivenUpLaunch, TheClientIsFirstToGiveUpWhenNoOutputThreadEnds)
 {
     const std::size_t threads = ManagedThread::GetRegisteredThreadCount();
@@ -410,7 +410,7 @@ TEST_F(GivenUpLaunch, ResetDoesNotWaitForAnotherThreadsWait)
         }
     });
     fApp->NotifyFailure(Exception(TaskID::kClient, "ouch"));
-    EXPECT_TRUE(AwaitLine("TimedJoin(")); // as long as its own limit
+    EXPECT_TRUE(AwaitLine("TimedJoin(")); // with the client's own limit
     std::atomic<bool> done{false};
     boost::thread resetter([&] {
         {
@@ -468,7 +468,7 @@ TEST_F(GivenUpLaunch, TwoInterruptsOfALaunchLeaveItIdle)
     client.interrupt();
     EXPECT_TRUE(AwaitLine("ConsoleApp::LaunchHandleException exc=?"));
     client.interrupt();
-    fGate->Open(); // the thread of the launch comes to its end
+    fGate->Open(); // the thread of the launch ends
     client.join();
     EXPECT_TRUE(interrupted);
     EXPECT_EQ(Peek(), State::kIdle);
@@ -534,7 +534,7 @@ TEST_P(FailedLaunch, KillsTheChildBeforeItsInputEnds)
 
 TEST_P(FailedLaunch, LeavesNoDescriptorOfARealChild)
 {
-    // A thread that is given up keeps handles on Windows, so that none may be.
+    // An abandoned thread keeps handles on Windows, so that none may be abandoned.
     const auto fail = [] {
         RealLaunch launch({"sleep", "60000"});
         launch.app->SetInjectedFault(GetParam());

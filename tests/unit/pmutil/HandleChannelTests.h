@@ -1,4 +1,4 @@
-// The tests that every platform's handle channel passes: instantiate the suite with a type that has
+// The tests of every platform's handle channel. Instantiate the suite with a type that has
 // `Channel`, the channel's class, and `Calls`, its platform; `MakePipe(read, write)`;
 // `Exists(path)`; `PathOf(handle)`; and the texts of failed calls, `kOpenFailed` and so on.
 #pragma once

@@ -1,5 +1,5 @@
-// What happens in a launch, in the order in which it happens to each party: log lines, calls of the
-// platform's launcher, notifications and the steps of the output tasks.
+// The events of a launch, in order for each party: log lines, calls of the platform's launcher,
+// notifications and the steps of the output tasks.
 #pragma once
 
 #include <boost/thread/condition_variable.hpp>
@@ -19,15 +19,15 @@
 
 namespace pmutil {
 
-// A logger that takes entries from other sources too. Threads tell who they are with their first
-// line; the thread that makes it is the client.
+// A logger that accepts entries from other sources too. The first line of a thread identifies it;
+// the thread that constructs the journal is the client.
 class Journal : public PMLogger {
 public:
     using Entries = std::vector<std::string>;
 
     Journal() : PMLogger("journal") { fParties[boost::this_thread::get_id()] = "Client"; }
 
-    // For any other thread, before its first entry: ids come again when threads have ended.
+    // For any other thread, before its first entry: thread ids are reused.
     void Enter(const std::string& party)
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
@@ -62,13 +62,13 @@ public:
             GetLogMutex().lock();
     }
 
-    // The same, until the party has an entry that begins so.
+    // The same, until the party has an entry with this beginning.
     void AwaitWithoutLogMutex(const std::string& party, const std::string& begin)
     {
         WithoutLogMutex([&] { Await(party, begin); });
     }
 
-    // An entry of the calling thread. Measured times are left out.
+    // Adds an entry of the calling thread. Measured times are removed.
     void Add(const std::string& entry)
     {
         static const std::regex measured("(waitSeconds=|TimedJoin\\()[1-9][0-9.e+]*");
@@ -77,7 +77,7 @@ public:
         fCond.notify_all();
     }
 
-    // What happened to that party since the last call.
+    // Returns the entries of the party since the last call.
     Entries Take(const std::string& party)
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
@@ -88,7 +88,7 @@ public:
         return fresh;
     }
 
-    // Until the party has that many entries that begin so, taken or not.
+    // Waits until the party has this many entries with this beginning, whether or not returned.
     void Await(const std::string& party, const std::string& begin, int count = 1)
     {
         boost::unique_lock<boost::mutex> lock(fMutex);

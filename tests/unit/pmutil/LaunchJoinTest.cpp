@@ -1,4 +1,4 @@
-// The last part of a wait: the launcher's thread is joined or given up by one thread at a time.
+// The end of a wait: one thread at a time joins or abandons the launcher's thread.
 #include <algorithm>
 
 #include "ConsoleAppFixture.h"
@@ -20,7 +20,7 @@ protected:
         End(kEndedNormally);
     }
 
-    // Launches a child that ends, with a launcher's thread that doesn't.
+    // Launches a child that ends, while the launcher's thread doesn't.
     void LaunchAndEnd()
     {
         fApp->fOnEvent = [gate = fGate](const std::string& event) {
@@ -38,7 +38,7 @@ protected:
     const ThreadsEnd fThreadsEnd;
 };
 
-// Time enough for a thread that nothing holds up. One that is held up needs none.
+// Enough time for a thread that isn't blocked. A blocked one needs none.
 void LetOthersRun()
 {
     const double end = GetWaitClock() + 0.2;
@@ -52,7 +52,8 @@ TEST_F(LaunchJoin, OneOfTwoWaitsGivesTheThreadUpAndTheOtherKeepsTheCode)
     State otherEnd = State::kUndefined;
     int otherCode = -1;
     boost::thread other;
-    // The first wait stops where it gives the thread up; the other one comes as far as it can.
+    // The first wait is blocked where it abandons the thread; the other one proceeds as far as
+    // possible.
     fJournal.fOnLine = [&](const std::string& line) {
         if (line != kGivesUp || other.joinable())
             return;

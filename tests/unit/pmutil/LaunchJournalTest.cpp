@@ -1,5 +1,5 @@
-// The whole journal of launches, to the letter: what each party logs, calls and is notified of, in
-// one order. Every thread is held where another's next entry could come before or after its own.
+// The complete journal of launches: the log lines, calls and notifications of each party, in order.
+// Every thread is blocked where another one's next entry could come before or after its own.
 #include <gmock/gmock.h>
 
 #include "FakeLauncher.h"
@@ -14,7 +14,7 @@ namespace {
 
 using Entries = Journal::Entries;
 
-constexpr char kReleased[] = "released"; // an entry of the client, for what waits for the test
+constexpr char kReleased[] = "released"; // an entry of the client that a test adds
 constexpr char kNoFailures[] = "ConsoleApp::ThrowIfFailurePendingLocked numFailures=0";
 
 Entries operator+(Entries entries, const Entries& more)
@@ -23,7 +23,7 @@ Entries operator+(Entries entries, const Entries& more)
     return entries;
 }
 
-// A look at the state that finds it so, in the pass of that number.
+// The entries of GetState in this pass, with this result.
 Entries Look(const std::string& state, int pass = 0)
 {
     return {"ConsoleApp::GetStateLocked nloops=" + std::to_string(pass) + " fState=" + state,
@@ -96,7 +96,7 @@ protected:
         fParams.fProgram = L"program";
         EXPECT_THAT(fJournal.Take("Client"), ElementsAreArray({"ConsoleApp::ConsoleApp()"}));
 
-        // The client sees each state of the launch.
+        // The client gets each state of the launch.
         Hold("launcher.Launch", "Client", "ConsoleApp::GetStateLocked nloops=1");
         Hold("begin stdout", "Client", "ConsoleApp::GetStateLocked nloops=2");
         Hold("OnRunning", "Client", "ConsoleApp::GetStateLocked nloops=3");
@@ -121,8 +121,7 @@ protected:
         int count;
     };
 
-    // Keeps the thread to which `event` happens there until the party has come to the entry. Only
-    // before the launch.
+    // Blocks the thread of `event` there until the party has the entry. Call before the launch.
     void Hold(const std::string& event, const std::string& party, const std::string& entry,
               int count = 1)
     {
@@ -147,7 +146,7 @@ protected:
         fApp->Launch(fData, fParams);
     }
 
-    // Launches, and takes what belongs to that from the client's and the launcher's journal.
+    // Launches, and takes the entries of the start from the client's and the launcher's journal.
     void LaunchUntilItWaits()
     {
         Launch();
@@ -209,7 +208,7 @@ protected:
                 "NotifyFailureLocked: exc=Launcher: output task thread abandoned"};
     }
 
-    // The end of a thread of a launch that was given up.
+    // The entries of the end of a thread of an abandoned launch.
     static Entries MissesTheApp(const std::string& party)
     {
         return {"ConsoleAppAccessor::NotifyFailure exc=" + party +
@@ -261,7 +260,7 @@ protected:
                                      "ConsoleApp::Wait returns " + state};
     }
 
-    // Keeps the thread there until the test lets it go, whatever it would wait for else.
+    // Blocks the thread there until the test releases it.
     void HoldUntilReleased(const std::string& event) { fHolds[event] = {{"Client", kReleased, 1}}; }
 
     const DebugValueSetter fLog{"ConsoleAppLog", 1};
@@ -277,7 +276,7 @@ protected:
     const ThreadsEnd fThreadsEnd;
 };
 
-// How a child ends, and what all parties make of it.
+// How a child ends, and the entries of all parties.
 struct End {
     const char* name;
     WaitResult result;
@@ -295,7 +294,7 @@ TEST_P(LaunchEnd, IsJournaledWhole)
     const End& end = GetParam();
     Hold(end.notification, "Client", "ConsoleApp::Wait fLauncherThread.TimedJoin(");
     LaunchUntilItWaits();
-    // The end comes when the client sleeps, and the thread's when the client has seen it.
+    // The child ends while the client sleeps, and the thread after the client has seen it.
     boost::thread child([&] {
         fJournal.Await("Client", "ConsoleApp::Wait fState=Running");
         fLauncher->End(end.result, end.code);
@@ -365,7 +364,7 @@ TEST_F(LaunchJournal, OfAFaultWhileTheChildRuns)
 {
     fApp->SetInjectedFault(Fault::kLauncherWait);
     Hold("OnRunning", "Client", "ConsoleApp::Wait fState=Running");
-    // The tasks' threads take a failure too.
+    // The tasks' threads throw a pending failure too.
     for (const std::string run : {"DoRun stdout", "DoRun stderr"})
         Hold(run, "Client", "ThrowIfFailurePendingLocked throwing");
     Launch();
@@ -422,7 +421,7 @@ TEST_F(LaunchJournal, OfAWaitThatRunsOutOfTime)
     EXPECT_EQ(fApp->Wait(nullptr, kLong), State::kFinished);
 }
 
-// The launcher's thread waits for the child, and nobody for it any more.
+// The launcher's thread waits for the child, and no thread waits for it any more.
 TEST_F(LaunchJournal, OfAWaitThatGivesALaunchUp)
 {
     LaunchUntilItWaits();
@@ -545,7 +544,7 @@ TEST_F(LaunchJournal, OfATaskThatNeverStarts)
             Entries{"NotifyFailureLocked: fFailures.size()=2", "CloseReader locked"}));
 }
 
-// A task that has come and gone counts as one that never started.
+// A task that has already ended counts as one that never started.
 TEST_F(LaunchJournal, OfATaskThatEndsBeforeAnybodyLooks)
 {
     fHolds["launcher.Launch"] = {{"Client", "ConsoleApp::GetStateLocked timeout", 1}};

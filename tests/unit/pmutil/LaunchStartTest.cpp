@@ -1,4 +1,4 @@
-// The start of a launch, and who waits for its end.
+// Waiting for the end of the start of a launch.
 #include "pmutil/LaunchStart.h"
 
 #include <gmock/gmock.h>
@@ -45,7 +45,7 @@ TEST(LaunchStart, EndsWithTheLaunchThatIsGivenUp)
     EXPECT_EQ(data.GetStart().Await(kEndless), Result::kFailed);
 }
 
-// A StartAwareApp whose OnRunning waits, or fails, as a test wants it.
+// A StartAwareApp whose OnRunning can wait or fail.
 class HeldApp : public StartAwareApp {
 public:
     using StartAwareApp::StartAwareApp;

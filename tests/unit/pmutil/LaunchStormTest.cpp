@@ -1,4 +1,4 @@
-// Many launches of real children, and what is left of them.
+// Many launches of real children, and a check for leaks.
 #include <atomic>
 #include <boost/thread/barrier.hpp>
 #include <chrono>
@@ -17,7 +17,7 @@ class LaunchStorm : public testing::Test {
 protected:
     LaunchStorm()
     {
-        // What the first one leaves open is used again by all others.
+        // Objects that the first one leaves open are reused by all others.
         RealLaunch first({"exit", "0"});
         first.launcher.LaunchAndWait(nullptr, kLong);
         fOpen = CountOpenThings();
@@ -176,7 +176,7 @@ TEST(SimultaneousLaunches, HoldNoPipesOfEachOther)
             EXPECT_TRUE(Eventually([&] { return child.Text().find('\n') != std::string::npos; }));
             EXPECT_EQ(child.Text(), "pipes 3\n");
         }
-        // Each ends with its own input, and its output with it, while the rest live.
+        // Each child and its output end with its own input, while the others run.
         for (PipedChild& child : children) {
             child.CloseInput();
             EXPECT_TRUE(Eventually([&] { return child.IsAtEnd(); }));

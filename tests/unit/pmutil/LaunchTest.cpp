@@ -53,7 +53,7 @@ TEST(Launch, HangingChildTimesOutAndIsKilled)
     EXPECT_TRUE(ThrowsRuntimeError("ConsoleAppLauncher::Launch: already launched",
                                    [&] { launch.launcher.Launch(); }));
     {
-        const NoShortWait noWait; // no other state comes
+        const NoShortWait noWait; // the state doesn't change
         launch.launcher.Kill();
     }
     EXPECT_EQ(launch.launcher.Wait(&exitCode, kLong), State::kKilled);
@@ -92,7 +92,7 @@ TEST(Launch, WritingToAChildThatHasGoneRaises)
     launch.launcher.Launch();
     launch.app->AwaitStart();
     const std::string text(1 << 16, 'x');
-    // What the pipe still takes, it takes.
+    // The first writes may still go into the pipe.
     EXPECT_THROW(for (int line = 0; line < 10'000; ++line) launch.app->WritelnAppStdin(text),
                  std::runtime_error);
     EXPECT_EQ(launch.launcher.Wait(nullptr, kLong), State::kFinished);
@@ -103,7 +103,7 @@ TEST(Launch, ChildThatNeverReadsItsInputBlocksTheWriterUntilItEnds)
     RealLaunch launch({"sleep", "200", "exit", "3"}, true);
     launch.launcher.Launch();
     launch.app->AwaitStart();
-    const std::string text(16 << 20, 'x'); // more than any pipe takes
+    const std::string text(16 << 20, 'x'); // more than any pipe holds
     EXPECT_THROW(launch.app->WritelnAppStdin(text), std::runtime_error);
     int exitCode = -1;
     EXPECT_EQ(launch.launcher.Wait(&exitCode, kLong), State::kFinished);
@@ -143,7 +143,7 @@ TEST(Launch, GrandchildThatHoldsThePipesIsGivenUp)
     // The grandchild reads its input, which is the child's, to its end.
     RealLaunch launch({"heir", "exit", "0"}, true);
     launch.launcher.Launch();
-    // Both pumps hang, and the launcher's thread with them.
+    // Both pumps hang, and therefore the launcher's thread.
     journal.Await("Launcher", "CleanupLaunchThreadTask: joining output task thread for stdout");
     {
         const NoShortWait noWait;
@@ -151,7 +151,7 @@ TEST(Launch, GrandchildThatHoldsThePipesIsGivenUp)
     }
     EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
     EXPECT_GT(ManagedThread::GetRegisteredThreadCount(), threads);
-    // The reset has closed the input, so that the grandchild ends, and with it the pumps.
+    // Reset has closed the input, so that the grandchild and then the pumps end.
     EXPECT_TRUE(
         Eventually([&] { return !launch.out->IsRunning(0.0) && !launch.err->IsRunning(0.0); }));
     EXPECT_EQ(launch.launcher.Wait(nullptr, 0.0), State::kIdle) << "nothing left to wait for";
@@ -186,7 +186,7 @@ TEST(Launch, ATaskServesOneLaunchAfterTheOther)
     EXPECT_EQ(launch.out->Text(), "two\n");
 }
 
-// Every fault against every kind of child.
+// Every fault with every kind of child.
 class FaultMatrix : public testing::TestWithParam<std::tuple<Fault, const char*>> {
 protected:
     struct Kind {
@@ -213,7 +213,7 @@ protected:
 
     static Fault GetFault() { return std::get<0>(GetParam()); }
 
-    // Up to which point of the launch the fault comes.
+    // The latest point of the launch at which the fault fires.
     static bool BeforeTheStart()
     {
         return GetFault() == Fault::kNotifyLaunching || GetFault() == Fault::kLauncherLaunch;
@@ -228,7 +228,7 @@ protected:
         return BeforeTheStart() || (KillsTheChild() && GetFault() != Fault::kLauncherWait);
     }
 
-    // The texts of which one is thrown; none if the launch goes well.
+    // The possible texts of the exception; none if the launch succeeds.
     static std::vector<std::string> GetFailures()
     {
         std::ostringstream fault;
@@ -243,7 +243,7 @@ protected:
         case Fault::kNotifyOutputTaskBegin:
             return {"stdout: NotifyOutputTaskBegin"};
         case Fault::kNotifyOutputTaskEnd:
-            // For the channel that is through first.
+            // For the channel that ends first.
             return {"stdout: NotifyOutputTaskEnd", "stderr: NotifyOutputTaskEnd"};
         default:
             return {"Launcher: " + fault.str()};
@@ -273,7 +273,7 @@ TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
                 launch.launcher.Kill();
             } catch (const Exception& exc) {
                 failure = exc.what();
-                const NoShortWait noWait; // no other state comes
+                const NoShortWait noWait; // the state doesn't change
                 launch.launcher.Kill();   // fires once
             }
             killed = true;
@@ -292,7 +292,7 @@ TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
         EXPECT_EQ(result, kind.end);
         EXPECT_EQ(exitCode, kind.exitCode);
     } else {
-        // A failure of an output thread may come when the code is known already.
+        // A failure of an output thread may come when the exit code is already known.
         EXPECT_TRUE(exitCode == -1 ||
                     (GetFault() == Fault::kNotifyOutputTaskEnd && exitCode == kind.exitCode))
             << exitCode;
@@ -301,7 +301,7 @@ TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
     EXPECT_EQ(launch.app->GetState(0.0), State::kIdle);
     EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads) << "nothing was given up";
 
-    // The child has gone: this wait doesn't last.
+    // The child has ended: this wait is short.
     WatchedLauncher& platform = launch.app->GetLauncher();
     EXPECT_EQ(platform.fLaunches, BeforeTheStart() ? 0 : 1);
     if (!BeforeTheStart() && kind.endless) {

@@ -1,4 +1,4 @@
-// The bodies of the threads of a launch, run to their end on a thread of their own.
+// The functions of the threads of a launch, run on a thread of the test.
 #include <gmock/gmock.h>
 
 #include "ConsoleAppFixture.h"
@@ -16,7 +16,7 @@ namespace {
 
 class ThreadBody : public ConsoleAppFixture {
 protected:
-    // All failures, in their order; takes them off the list.
+    // Removes and returns all failures, in order.
     std::vector<std::string> TakeFailures()
     {
         std::vector<std::string> failures;
@@ -46,7 +46,7 @@ protected:
 
 class OutputThread : public ThreadBody {
 protected:
-    // Does something in DoRun.
+    // Calls a function in DoRun.
     class Task : public OutputTask {
     public:
         std::function<void()> fDo;
@@ -183,7 +183,7 @@ TEST_F(LauncherThread, SeesALaunchFromStartToEnd)
     EXPECT_EQ(fLauncher->fOutput[2].use_count(), 1);
 }
 
-// Records in which order the ends of the pipes are released.
+// Records the order in which the ends of the pipes are released.
 class WatchedEnds : public FakeLauncher {
 public:
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override

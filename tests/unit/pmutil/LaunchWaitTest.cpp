@@ -1,5 +1,5 @@
-// The waits of a supervised application: what wakes them, how long they may last and what a look
-// finds. A wait is made far longer than the test lasts, so that only what wakes it can end it.
+// The waits of a supervised application: what wakes them, their limits and their results. The limit
+// of a wait is far longer than the test, so that only a wake ends it.
 #include <gmock/gmock.h>
 
 #include "ConsoleAppFixture.h"
@@ -13,7 +13,7 @@ using consoleapp::Exception;
 namespace {
 
 constexpr double kEndless = 1000 * kLong;
-constexpr char kOther[] = "other"; // the party of a thread that belongs to no launch
+constexpr char kOther[] = "other"; // the party of a thread of no launch
 
 class LaunchWait : public ConsoleAppFixture {
 protected:
@@ -108,7 +108,7 @@ TEST_F(LaunchWait, KillWaitsNoLongerThanTheShortWait)
     fApp->Reset();
 }
 
-// The child has ended, and the thread that saw it doesn't.
+// The child has ended, but the thread that waited for it doesn't.
 TEST_F(LaunchWait, TheJoinMustFitIntoTheTimeLeft)
 {
     const DebugValueSetter longShortWait("ConsoleAppShortWaitSecondsMinusOne", 600'000);
@@ -139,7 +139,7 @@ TEST_F(LaunchWait, ResetForgetsTheExitCode)
     EXPECT_EQ(fApp->Wait(nullptr, kLong), State::kFinished);
     fApp->Reset();
     LaunchUntilItWaits();
-    fApp->SetState(State::kFinished); // nobody told a code yet
+    fApp->SetState(State::kFinished); // without an exit code
     int exitCode = -1;
     boost::thread waiter([&] {
         fJournal.Enter(kOther);
@@ -162,7 +162,7 @@ TEST_F(LaunchWait, AnAccessorMissesTheAppAfterItsReset)
     EXPECT_TRUE(ThrowsFailure("Client: no console app", [&] { accessor.GetConsoleApp(); }));
 }
 
-// Waits of this length run out while the test holds what the waiter needs to go on.
+// Waits of this length time out while the test holds the mutex that the waiter needs.
 constexpr double kBrief = 0.2;
 
 void OutlastABriefWait()
@@ -176,7 +176,7 @@ TEST_F(LaunchWait, AStateThatComesWhenTheTimeHasJustRunOutIsSeen)
 {
     const std::string looks = "ConsoleApp::GetStateLocked nloops=0 fState=Launched";
     boost::mutex own;
-    // Again if the test was too slow to stop the waiter.
+    // Repeat if the test was too slow to stop the waiter.
     for (int attempt = 1, seen = 0; seen == 0; ++attempt) {
         fApp->SetState(State::kLaunched);
         State state = State::kUndefined;
@@ -201,7 +201,7 @@ TEST_F(LaunchWait, AStateThatComesWhenTheTimeHasJustRunOutIsSeen)
     fApp->Reset();
 }
 
-// Hands out a standard input that does something in each write, with the application's mutex held.
+// Returns a standard input that calls a function in each write, with the application's mutex held.
 class InputLauncher : public FakeLauncher {
 public:
     class Input : public FakeChannel {

@@ -1,4 +1,4 @@
-// Log scopes, and what a line tells when loggers, threads and locales change between lines.
+// Log scopes, and lines when loggers, threads and locales change in between.
 #include <locale>
 #include <stdexcept>
 
@@ -79,7 +79,7 @@ TEST_F(LogScope, ADisabledLoggerIsToldOfItsSuccessorToo)
     EXPECT_EQ(Messages(disabled), Lines{"Activating new logger next"});
 }
 
-// Seconds of the time of day on a line, and its delta.
+// The time of day on a line in seconds, and its delta.
 struct Times {
     explicit Times(const std::string& line)
     {
@@ -111,7 +111,7 @@ TEST_F(LogScope, EachLineTellsTheTimeSinceTheOneBefore)
         const Times now(logger.lines[line]);
         double passed = now.OfDay() - before.OfDay();
         if (passed < 0)
-            passed += 24.0 * 60 * 60; // over midnight
+            passed += 24.0 * 60 * 60; // midnight has passed
         EXPECT_NEAR(now.delta, passed, 0.0025) << logger.lines[line];
     }
 }

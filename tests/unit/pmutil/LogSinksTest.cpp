@@ -191,7 +191,7 @@ TEST_F(PMFileLoggerTest, TwoLiveLoggersOnOneNameBothWrite)
 {
     PMFileLogger first(WideFolder(), "both.txt");
     PM_LOG(gOn, "one");
-    PMFileLogger second(WideFolder(), "both.txt"); // its coming is a line of the first
+    PMFileLogger second(WideFolder(), "both.txt"); // the first one logs its construction
     PM_LOG(gOn, "two");
     first.LogPrintf(nullptr, 0, "three");
     const std::string text = Text("both.txt");

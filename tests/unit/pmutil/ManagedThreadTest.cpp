@@ -16,7 +16,7 @@ using pmutil::ManagedThread;
 
 namespace {
 
-// A thread that runs until it is let go.
+// A thread that runs until it is released.
 class Gate {
 public:
     ~Gate() { Open(); }
@@ -200,7 +200,7 @@ TEST(ManagedThread, AThreadCannotWaitForItself)
         joined = thread.TimedJoin(100.0);
     }));
     assigned = true;
-    // Looked at from outside only after the thread is through with it.
+    // Read only after the thread has finished with it.
     while (joined)
         boost::this_thread::yield();
     EXPECT_TRUE(thread.TimedJoin(pmutil::kLong));

@@ -1,14 +1,14 @@
-// What this process holds of the system's things, for tests that count what is left over.
+// Counts this process's system objects, for tests that check for leaks.
 #pragma once
 
-// Descriptors, or handles.
+// Counts open descriptors, or handles.
 long CountOpenThings();
 
-// All threads of this process.
+// Counts the threads of this process.
 long CountThreads();
 
-// True if this process has a child at all, running or ended.
+// Whether this process has a child, running or not reaped.
 bool HasChildren();
 
-// The handles that a launch leaves open for good.
+// The number of handles that a launch never closes.
 extern const long kKeptPerLaunch;

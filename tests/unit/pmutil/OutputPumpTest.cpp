@@ -12,7 +12,7 @@ using testing::ElementsAre;
 
 namespace {
 
-// What a function was called with.
+// The arguments of a function's calls.
 class Taken {
 public:
     TakeBytes Function()
@@ -23,7 +23,7 @@ public:
     std::vector<std::string> fBlocks;
 };
 
-// Runs a pump over what a channel brings.
+// Runs a pump on a channel.
 std::vector<std::string> Pump(std::deque<std::string> pieces)
 {
     Taken taken;
@@ -46,7 +46,7 @@ TEST(OutputPump, SaysTheEndAlsoWhereReadingFails)
 {
     Taken taken;
     const auto channel = boost::make_shared<FakeChannel>();
-    channel->fExcess = 1; // more than was asked for
+    channel->fExcess = 1; // more than requested
     OutputPump pump(taken.Function());
     pump.Prepare(OutputChannel::kStdout, nullptr, channel);
     EXPECT_THROW(pump.Run(), std::logic_error);
@@ -140,7 +140,7 @@ TEST(ByLine, CopiesShareTheBegunLine)
 
 class PumpedLaunch : public ConsoleAppFixture {
 protected:
-    // Pumps over channels that are at their end from the start.
+    // Makes pumps for channels that are at their end.
     PumpedLaunch()
     {
         for (const auto& [channel, pump] :
@@ -207,7 +207,7 @@ TEST_F(PumpedLaunch, AFunctionThatFailsIsAFailureOfItsChannel)
     EXPECT_EQ(fApp->CountEvents("OnRunning"), 1) << "the start doesn't suffer";
 }
 
-// As a client does it, with a child that dies before the launch looks at its tasks.
+// The way of a client, with a child that ends before the launch checks its tasks.
 TEST(PumpedChild, MayCrashAtOnce)
 {
     const LongShortWait longWait;

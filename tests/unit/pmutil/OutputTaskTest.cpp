@@ -94,7 +94,7 @@ TEST(OutputTask, AClosedReaderIsNotClosedAgain)
     EXPECT_THAT(reader->fCalls, ElementsAre("close"));
 }
 
-// Nothing but the start ends this wait within the test's time.
+// Only the start ends this wait within the time of the test.
 TEST(OutputTask, IsRunningReturnsAsSoonAsItRuns)
 {
     const DebugValueSetter log("ConsoleAppLog", 1);

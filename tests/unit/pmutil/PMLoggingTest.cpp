@@ -29,7 +29,7 @@ DebugValue gOn{"PMLoggingTest.on", 1};
 DebugValue gOff{"PMLoggingTest.off", 0};
 DebugValue gSwitched{"PMLoggingTest.switched", 0};
 
-// True if another thread finds the mutex free.
+// Whether another thread can lock the mutex.
 bool IsFree(boost::recursive_mutex& mutex)
 {
     bool isFree = false;
@@ -60,7 +60,7 @@ TEST(PMLoggingDeathTest, StatementBeforeInitLoggingWritesNothing)
 {
     ExpectInFreshProcess([] {
         RecordingLogger logger;
-        GetDebugValue(gOff) = 1; // the overflow slot, which all values share until then
+        GetDebugValue(gOff) = 1; // the overflow slot, which all values share before InitLogging
         REQUIRE_SO(GetDebugValue(gOn) == 1);
         REQUIRE_SO(!GetCurrentLogger());
         bool evaluated = false;
@@ -75,13 +75,13 @@ TEST(PMLoggingDeathTest, LoggerMadeBeforeInitLoggingIsCurrentAfterwards)
     ExpectInFreshProcess([] {
         RecordingLogger first;
         RecordingLogger second;
-        REQUIRE_SO(first.lines.empty()); // no word of the change before logging starts
+        REQUIRE_SO(first.lines.empty()); // the change isn't logged before logging starts
         InitLogging();
         REQUIRE_SO(GetCurrentLogger().get() == &second);
     });
 }
 
-// While it is made it stands on the stack without being a whole logger.
+// During its construction it is on the stack without being a complete logger.
 TEST(PMLoggingDeathTest, ThePMNullLoggerIsMadeUnderTheLogMutex)
 {
     ExpectInFreshProcess([] {
@@ -254,7 +254,7 @@ TEST_F(PMLoggingTest, StatementThatIsOffEvaluatesNothing)
     RecordingLogger logger;
     bool evaluated = false;
     PM_LOG(gOff, (evaluated = true));
-    PM_LOG(gOff, (evaluated = true)); // now with the name resolved
+    PM_LOG(gOff, (evaluated = true)); // with the name resolved
     EXPECT_FALSE(evaluated);
     EXPECT_THAT(logger.lines, IsEmpty());
 }
@@ -467,7 +467,7 @@ TEST_F(PMLoggingTest, BaseNameIsTheTextBehindTheLastSeparatorWithSomethingBehind
             << (test.path != nullptr ? test.path : "null");
 }
 
-// A sink that overrides nothing it need not.
+// A sink that overrides only the pure operations.
 struct Plain : PMLogger {
     Plain() : PMLogger("plain") {}
     void Write(const char* data, std::size_t size) override { text.append(data, size); }
@@ -563,7 +563,7 @@ TEST_F(PMLoggingTest, ScopeWritesNothingToADisabledLogger)
     {
         const PMLogScope scope("s", nullptr, 0);
         EXPECT_THAT(logger.lines, IsEmpty());
-        logger.enabled = true; // the end asks anew
+        logger.enabled = true; // the end checks it again
     }
     ASSERT_THAT(logger.lines, SizeIs(1));
     EXPECT_THAT(MessageOf(logger.lines[0]), testing::StartsWith("END s, duration="));

@@ -55,7 +55,7 @@ TEST(Previewer, PutsNothingBackAcrossASeek)
     EXPECT_EQ(ReadSomeText(source, 9), "bc");
 }
 
-// Goes on with a second buffer where the first one ends.
+// Continues with a second buffer at the end of the first one.
 class Chain : public pmutil::RandomAccess {
 public:
     Chain(Buffer& first, Buffer& second) : RandomAccess(&first), fSecond(second) {}
@@ -167,7 +167,7 @@ TEST(Previewer, MovesBackPushbackThatItOnlyPartlyRead)
     EXPECT_EQ(ReadSomeText(preview, 2), "ab");
     EXPECT_EQ(ReadSomeText(preview, 1), "c");
     preview.End();
-    // No second notice: the bytes had been put back before.
+    // No second notification: the bytes were put back before.
     EXPECT_THAT(source.fCalls, ElementsAre("unread 4"));
     EXPECT_EQ(ReadSomeText(source, 9), "abcd");
     EXPECT_EQ(ReadSomeText(source, 9), "xyz");

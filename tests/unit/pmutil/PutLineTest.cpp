@@ -12,7 +12,7 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// A stream that fails all writing, for its error indicator.
+// A stream whose writes fail, for its error indicator.
 class PutLineTest : public testing::Test {
 protected:
     void SetUp() override
@@ -24,7 +24,7 @@ protected:
     }
     void TearDown() override { std::fclose(fStream); }
 
-    // Puts the line where only `room` bytes are left, and fails as a stream does.
+    // Writes the line with space for only `room` bytes, and fails as a stream does.
     bool Put(const std::string& line, std::size_t room)
     {
         return PutLine(fStream, line, [&](const std::string& text) {

@@ -1,4 +1,4 @@
-// A sink that keeps what it is given.
+// A sink that keeps its lines.
 #pragma once
 
 #include <string>
@@ -20,7 +20,7 @@ public:
         pieces.clear();
     }
 
-    // What was written since the last line ended.
+    // The text since the end of the last line.
     std::string Text() const
     {
         std::string text;
@@ -34,7 +34,7 @@ public:
     int flushes = 0;
 };
 
-// The text behind a line's prefix.
+// Returns the text after a line's prefix.
 inline std::string MessageOf(const std::string& line)
 {
     const auto end = line.find("] ");

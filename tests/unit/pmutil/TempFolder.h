@@ -1,4 +1,4 @@
-// A folder that lives as long as a test.
+// A temporary folder for the time of a test.
 #pragma once
 
 #include <fstream>
@@ -33,7 +33,7 @@ private:
     boost::filesystem::path fPath;
 };
 
-// A text file's content, with plain newlines on every platform.
+// Reads a text file. Line ends are newlines on every platform.
 inline std::string ReadWhole(const std::string& path)
 {
     std::ifstream file(path);

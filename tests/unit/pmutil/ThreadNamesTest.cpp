@@ -37,7 +37,7 @@ TEST(ThreadNamesTest, ThreadThatWasNeverNamedShowsItsID)
 {
     OnNewThread([] {
         EXPECT_EQ(GetCurrentThreadIDString(), MakeThreadIDString(GetCurrentThreadNumber()));
-        // The system may have given the id of a thread of another test, and its name with it.
+        // The system may reuse the id of a thread of another test, which has a name.
         SetCurrentThreadName(GetCurrentThreadIDString());
     });
     EXPECT_EQ(GetCurrentThreadName(), GetCurrentThreadIDString());

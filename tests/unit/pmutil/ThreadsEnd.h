@@ -1,4 +1,4 @@
-// Waits for threads that nobody joins.
+// Waits for threads that are not joined.
 #pragma once
 
 #include <boost/thread/lock_guard.hpp>
@@ -12,8 +12,7 @@
 
 namespace pmutil {
 
-// Threads that are given up log until they end, and nobody joins them: this waits for that when it
-// goes.
+// Abandoned threads log until they end, and are never joined: the destructor waits for their end.
 class ThreadsEnd {
 public:
     ~ThreadsEnd()
@@ -25,7 +24,7 @@ public:
 private:
     static long CountIdle()
     {
-        boost::thread([] {}).join(); // a sanitizer adds one of its own to the first
+        boost::thread([] {}).join(); // with the first thread, a sanitizer starts one of its own
         return CountThreads();
     }
 

@@ -8,7 +8,7 @@
 
 #include <gtest/gtest.h>
 
-// Passes if `call` throws exactly a T, and no class derived from it, with the text `text`.
+// Succeeds if `call` throws exactly a T, not a derived class, with the text `text`.
 template <typename T, typename Call>
 testing::AssertionResult ThrowsExactly(const std::string& text, Call call)
 {

@@ -25,7 +25,7 @@ namespace {
     return pid;
 }
 
-// As long as it lives no descriptor can be opened.
+// While it exists, no descriptor can be opened.
 class NoDescriptors {
 public:
     NoDescriptors()
@@ -43,8 +43,8 @@ private:
     rlimit fBefore = {};
 };
 
-// A process that isn't this one's child, as one that has got the number of a child that has gone.
-// It sends back what it gets, until there is no more.
+// A process that isn't this one's child, as one that got the reused id of an ended child. It echoes
+// its input to the end.
 class Stranger {
 public:
     Stranger()
@@ -77,7 +77,7 @@ public:
 
     ::pid_t GetPid() const { return fPid; }
 
-    // It couldn't answer if it had been killed before.
+    // It couldn't answer if it had been killed.
     bool Lives()
     {
         char answer = 0;

@@ -55,7 +55,7 @@ struct Outcome {
     std::string out;
 };
 
-// The number of the process group of a shell, and of the shell.
+// The ids of the process group of a shell, and of the shell.
 std::vector<::pid_t> LaunchForGroup(LauncherPosix&& launcher)
 {
     LaunchResult ends = launcher.Launch(
@@ -106,7 +106,7 @@ TEST(LauncherPosix, ArgumentsArriveByteByByte)
 
 TEST(LauncherPosix, AnArgumentAboveTheSystemsLimitFailsTheStart)
 {
-    // One argument may have 32 pages with its zero byte.
+    // The maximum size of an argument is 32 pages, including its zero byte.
     const std::string fits(131'071, 'x');
     EXPECT_EQ(RunChild({"args", fits}).out.size(), 2 * fits.size() + 1);
     LauncherPosix launcher;
@@ -252,12 +252,12 @@ TEST(LauncherPosix, WaitWithoutALaunchFails)
 
 TEST(LauncherPosix, ChildHasItsStreamsAndNoOtherDescriptor)
 {
-    // Neither one that the host forgot to protect.
+    // A descriptor that the host forgot to protect isn't inherited either.
     const PosixHandle forgotten(::open("/dev/null", O_RDONLY), true); // NOLINT: no O_CLOEXEC
     EXPECT_THAT(RunChild({"state"}).out, testing::HasSubstr("descriptors 0 1 2\n"));
 }
 
-// What a child of another part of the host says, which keeps every descriptor that it is left.
+// The output of a child that another part of the host starts, which inherits every open descriptor.
 std::string RunForeignChild()
 {
     int ends[2];
@@ -315,7 +315,7 @@ TEST(LauncherPosix, ChildHasDefaultSignals)
 
 TEST(LauncherPosix, HostWithClosedStandardStreamsCanLaunch)
 {
-    for (const int closed : {1, 2, 3}) { // the first of them, and those behind it
+    for (const int closed : {1, 2, 3}) { // the first of them, and those after it
         int kept[3];
         for (int stream = 0; stream < closed; ++stream) {
             kept[stream] = ::fcntl(stream, F_DUPFD_CLOEXEC, 10);
@@ -340,7 +340,7 @@ TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
     const long used = CountOpenThings();
     int failures = 0;
     for (int room = 0; room < 8; ++room) {
-        // Fills the table up to `room` free places.
+        // Fills the descriptor table except for `room` entries.
         rlimit narrow = before;
         narrow.rlim_cur = 256;
         ::setrlimit(RLIMIT_NOFILE, &narrow);
@@ -366,7 +366,7 @@ TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
     EXPECT_GE(failures, 6) << "three pipes need six places";
 }
 
-// Ignores the signal that tells of ended children, as long as it lives.
+// Ignores SIGCHLD while it exists.
 class IgnoreChildren {
 public:
     explicit IgnoreChildren(int flags = 0)
@@ -417,7 +417,7 @@ TEST(LauncherPosix, OrphanIsSeenOffLater)
     EXPECT_TRUE(HasChildren());
     ends.fAppInput.reset(); // now it ends
     EXPECT_TRUE(Eventually([] {
-        RunChild({"exit", "0"}); // a launch looks after those of before
+        RunChild({"exit", "0"}); // a launch reaps earlier children
         return !HasChildren();
     }));
 }

@@ -1,4 +1,4 @@
-// Fails the whole run if it leaves a descriptor open or a temporary file behind.
+// Fails the whole run if it leaves an open descriptor or a temporary file.
 #include <cstdlib>
 #include <dirent.h>
 #include <gtest/gtest.h>

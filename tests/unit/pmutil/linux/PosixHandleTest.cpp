@@ -160,7 +160,7 @@ TEST(PosixHandle, InterruptedCallsAreRepeated)
 {
     struct sigaction action = {};
     struct sigaction before = {};
-    action.sa_handler = OnSignal; // and no SA_RESTART
+    action.sa_handler = OnSignal; // without SA_RESTART
     ::sigaction(SIGUSR1, &action, &before);
     int readEnd = -1;
     int writeEnd = -1;

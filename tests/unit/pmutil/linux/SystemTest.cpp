@@ -28,7 +28,7 @@ using testing::StartsWith;
 
 DebugValue gOn{"SystemTest.on", 1};
 
-// A stream whose reader comes and goes.
+// A stream whose reader can be opened and closed.
 class FifoTest : public testing::Test {
 protected:
     void SetUp() override
@@ -106,7 +106,7 @@ TEST_F(FifoTest, LogLineThatIsLostNeverTurnsUpAndALaterOneDoes)
     EXPECT_THAT(text, EndsWith("] later\n"));
 }
 
-// Each runs in a process of its own: what is prepared is never undone.
+// Each test runs in a process of its own: the settings can't be undone.
 
 rlimit GetLimit(__rlimit_resource resource)
 {
@@ -131,7 +131,7 @@ void BlockAllSignals()
 TEST(PrepareConsoleProcessDeathTest, LeavesNoCoreDump)
 {
     ExpectInFreshProcess([] {
-        // Whoever starts the tests may have forbidden core dumps already: allow them first.
+        // Core dumps may be disabled already: enable them first.
         const rlimit unlimited{RLIM_INFINITY, RLIM_INFINITY};
         if (setrlimit(RLIMIT_CORE, &unlimited) != 0) {
             const rlim_t most = GetLimit(RLIMIT_CORE).rlim_max;

@@ -51,7 +51,7 @@ Outcome RunChild(const std::deque<std::string>& args, const std::wstring& progra
     return run;
 }
 
-// The arguments as the child's C runtime hands them to its main.
+// The arguments as the child's C runtime passes them to main.
 std::vector<std::string> GetReceived(std::deque<std::string> args)
 {
     args.emplace_front("args");
@@ -101,8 +101,8 @@ TEST(LauncherWin, ArgumentWithBothQuotesArrivesAsItIs)
 
 TEST(LauncherWin, ArgumentInApostrophesRunsIntoTheNext)
 {
-    // The runtime knows no apostrophes: the quotation mark in between opens a quotation, which the
-    // next argument's first one closes.
+    // Apostrophes have no meaning to the runtime: the quotation mark between them opens a
+    // quotation, which the next argument's first one closes.
     EXPECT_THAT(GetReceived({"a\"b", "next"}), ElementsAre("'ab' next"));
     EXPECT_THAT(GetReceived({"\"a\"", "next"}), ElementsAre("'a'", "next"));
 }
@@ -193,7 +193,7 @@ TEST(LauncherWin, ParentKeepsItsEndsToItself)
     EXPECT_FALSE(isInherited(ends.fAppOutput[1]));
     EXPECT_FALSE(isInherited(ends.fAppOutput[2]));
     EXPECT_EQ(ends.fAppOutput[0], nullptr);
-    // No second holder of the child's input: its end comes with the writer's.
+    // No other process holds the child's input open: it ends with the writer.
     ends.fAppInput->Close();
     int exitCode = -1;
     EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally);
@@ -201,7 +201,7 @@ TEST(LauncherWin, ParentKeepsItsEndsToItself)
 
 TEST(LauncherWin, ChildInheritsItsPipesOnly)
 {
-    // As the ends that another launch, in another thread, has for its child.
+    // Like the ends of another launch, in another thread, for its child.
     SECURITY_ATTRIBUTES inheritable = {};
     inheritable.nLength = sizeof inheritable;
     inheritable.bInheritHandle = TRUE;

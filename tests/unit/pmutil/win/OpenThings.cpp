@@ -11,7 +11,7 @@ const long kKeptPerLaunch = 2; // of the process and of its thread
 
 namespace {
 
-// What the system tells of all handles; Wine's GetProcessHandleCount doesn't count.
+// Queries the system's list of all handles: Wine's GetProcessHandleCount isn't implemented.
 constexpr ULONG kExtendedHandleInformation = 64;
 constexpr LONG kTooSmall = static_cast<LONG>(0xC0000004);
 

@@ -17,7 +17,7 @@ using testing::StartsWith;
 
 DebugValue gOn{"PMDebugStrLoggerTest.on", 1};
 
-std::vector<std::string> gPieces; // what the debugger saw
+std::vector<std::string> gPieces; // the debugger's messages
 
 void WINAPI Record(LPCSTR text)
 {

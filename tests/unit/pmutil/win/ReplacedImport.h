@@ -1,4 +1,4 @@
-// A call of the system's, replaced in this program for as long as the object lives.
+// Replaces a system call in this program while the object exists.
 #pragma once
 
 #include <windows.h>

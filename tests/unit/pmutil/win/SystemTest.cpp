@@ -14,7 +14,7 @@ using namespace pmutil;
 
 namespace {
 
-// As in Windows' own header of result codes, which are unsigned there.
+// From Windows' header of result codes, which are unsigned there.
 constexpr int kAborted = static_cast<int>(0xC0000409);
 constexpr int kAccessViolation = static_cast<int>(0xC0000005);
 
@@ -23,7 +23,7 @@ TEST(PathCodecvt, PathThatTheCodePageCannotSayFails)
     using boost::filesystem::path;
     EXPECT_EQ(path(L"C:\\plain.txt").string(GetPathCodecvt()), "C:\\plain.txt");
     EXPECT_EQ(path("C:\\plain.txt").wstring(GetPathCodecvt()), L"C:\\plain.txt");
-    const wchar_t kNowhere[] = {L'C', L':', L'\\', 0xD83D, L'\0'}; // half a character
+    const wchar_t kNowhere[] = {L'C', L':', L'\\', 0xD83D, L'\0'}; // an unpaired surrogate
     try {
         path(kNowhere).string(GetPathCodecvt());
         FAIL() << "converted";
@@ -32,8 +32,8 @@ TEST(PathCodecvt, PathThatTheCodePageCannotSayFails)
     }
 }
 
-// Each ends as a crash: neither with the status 3, which says of a bad command line, nor in a
-// dialog, which would never end.
+// Each ends as a crash: neither with the status 3, which means a bad command line, nor in a dialog,
+// which would never end.
 TEST(PrepareConsoleProcessDeathTest, AbortIsACrash)
 {
     const auto run = [](void (*fail)()) {
@@ -57,7 +57,7 @@ TEST(PrepareConsoleProcessDeathTest, AccessViolationIsACrash)
         testing::ExitedWithCode(kAccessViolation), "");
 }
 
-// The process keeps the mode that it inherits; everything else is the calling thread's alone.
+// The process keeps its inherited mode; only the calling thread's mode changes.
 TEST(PrepareConsoleProcessDeathTest, NothingAsksTheUser)
 {
     EXPECT_EXIT(

@@ -11,8 +11,8 @@ namespace {
 constexpr UINT kBefore = 850;
 constexpr UINT kOther = 437;
 
-// Stands standard output on a console of this process's own. A process that does so loses its
-// former streams, so each test does it in another one and tells by its status.
+// Redirects standard output to a console of this process. The process loses its former streams, so
+// that each test does this in a new process and reports by its status.
 void TakeConsole()
 {
     ::FreeConsole();
@@ -64,7 +64,7 @@ TEST(UTF8ConsoleDeathTest, IsPutBackOnce)
             pages.before = ::GetConsoleOutputCP();
             UTF8Console::Restore();
             pages.during = ::GetConsoleOutputCP();
-            ::SetConsoleOutputCP(kOther); // somebody else's from here on
+            ::SetConsoleOutputCP(kOther); // changed by another process from here on
         }
         pages.after = ::GetConsoleOutputCP();
         EndWith(pages, {CP_UTF8, kBefore, kOther});

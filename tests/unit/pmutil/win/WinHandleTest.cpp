@@ -45,7 +45,7 @@ struct Win {
         DWORD count = 0;
         ::DeviceIoControl(file.GetHandle(), FSCTL_SET_SPARSE, nullptr, 0, nullptr, 0, &count,
                           nullptr);
-        // Wine's files are the host's, and sparse without being told.
+        // Wine's files are those of Linux, which are sparse by default.
         return true;
     }
 
@@ -79,7 +79,7 @@ TEST(WinHandle, TemporaryDirectoryThatIsTooLongFails)
     EXPECT_EQ(WinHandle::GetTemporaryDirectory(), usual);
 }
 
-// The most that the system takes in one call; the rest is a caller's next one.
+// The maximum of one system call; the caller repeats it for the rest.
 TEST(WinHandle, RequestsAboveFourGigabytesAskForAllThatACallTakes)
 {
     static std::vector<DWORD> asked;
