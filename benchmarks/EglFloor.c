@@ -1,7 +1,7 @@
-// What a run of the program asks of EGL and OpenGL, and nothing else: the same calls with the same
-// arguments in the same order, on the first device. compare_eglinfo.py checks that and times both.
-// Works on drivers with devices, surfaceless contexts and contexts without a configuration, as
-// Mesa's software renderer is one.
+// Makes only the EGL and OpenGL calls of the program: the same calls with the same arguments in the
+// same order, on the first device. compare_eglinfo.py checks that and times both. Requires a driver
+// with devices, surfaceless contexts and contexts without a configuration, such as Mesa's software
+// renderer.
 #include <dlfcn.h>
 #include <stdio.h>
 #include <stdlib.h>
@@ -15,7 +15,7 @@
 
 #include "EglFloorShaders.h"
 
-// Entry points by the dynamic loader, then by EGL, in the order in which the program asks for them.
+// Entry points of the dynamic loader, then of EGL, in the order in which the program looks them up.
 #define LIBRARY_FUNCTIONS(X)                                                                       \
     X(eglGetProcAddress)                                                                           \
     X(eglQueryString)                                                                              \

@@ -1,4 +1,4 @@
-// The program's test shaders, for the C program that makes its calls.
+// The program's test shaders, for EglFloor.c.
 #pragma once
 
 #ifdef __cplusplus

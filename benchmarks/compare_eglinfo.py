@@ -7,9 +7,9 @@ usage: compare_eglinfo.py [--build FOLDER] [--floor PROGRAM] [--runs N] [--json 
 Both are run alternately, with standard output and error to /dev/null. Values are medians in
 milliseconds of wall time and of processor time, which varies less on a busy machine. OpenCL is hidden
 from the program, since eglinfo doesn't query it. The program does more than eglinfo: it compiles
-shaders and renders. eglinfo tries every platform that EGL supports. The fair comparison is egl_floor,
-a C program that makes the program's own calls and nothing else; scripts/build benchmarks makes it.
-Before it is timed, both must make the same calls with the same arguments on the scripted driver.
+shaders and renders. eglinfo tries every platform that EGL supports. The exact comparison is with
+egl_floor, a C program that makes only the program's calls (scripts/build benchmarks). Before it is
+timed, both must make the same calls with the same arguments on the scripted driver.
 
 The program's own time is its time on the scripted driver of the tests, which returns at once, minus
 that of /bin/true. The stages are measured with programmed failures: a run that fails at a step ends
@@ -76,7 +76,7 @@ def medians(jobs, runs):
 
 
 def calls_of(program, environment, folder):
-    """The calls that a program makes of the scripted driver, with their arguments."""
+    """Runs the program on the scripted driver; returns its calls with their arguments."""
     record = folder / "record"
     script = folder / "recording-script"
     script.write_text(f"record {record}\ndevice\nsoftware\n")
@@ -92,7 +92,7 @@ def check_same_calls(program, floor, environment, folder):
     if ours != theirs:
         number = next((i for i, (one, other) in enumerate(zip(ours, theirs)) if one != other),
                       min(len(ours), len(theirs)))
-        sys.exit(f"egl_floor makes other calls than the program from call {number + 1} on:\n"
+        sys.exit(f"the calls of egl_floor and of the program differ from call {number + 1} on:\n"
                  f"  program: {ours[number:number + 3]}\n  egl_floor: {theirs[number:number + 3]}")
 
 
