@@ -1,4 +1,4 @@
-// Runs a program for at most some seconds, prints its lines as they come, and says how it ended.
+// Runs a program with a timeout, prints its lines as they arrive, and then how it ended.
 //
 // usage: run_assay PROGRAM SECONDS [argument...]
 #include <cstdlib>
@@ -10,7 +10,7 @@
 
 int main(int argc, char** argv)
 try {
-    const boost::nowide::args utf8(argc, argv); // also where the system has them in UTF-16
+    const boost::nowide::args utf8(argc, argv); // on Windows, converts them from UTF-16
     if (argc < 3) {
         std::cerr << "usage: run_assay PROGRAM SECONDS [argument...]\n";
         return 2;

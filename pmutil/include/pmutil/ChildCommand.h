@@ -20,7 +20,7 @@ struct ChildCommand {
 // launcher's own quoting can't express every argument. CommandLineToArgvW and the C runtime parse
 // the arguments back unchanged, but invalid UTF-8 becomes U+FFFD. The path is quoted, so that
 // "C:\My.exe" is never tried for "C:\My Programs\p.exe". `program` must not be a batch file, which
-// cmd.exe would run, with parsing rules of its own.
+// cmd.exe would run, with other parsing rules.
 //
 // Throws std::invalid_argument "ChildCommand: zero byte" if a text contains one, and on Windows
 // "ChildCommand: quotation mark in the path", which no path can contain.

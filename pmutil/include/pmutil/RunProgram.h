@@ -27,7 +27,7 @@ struct RunOptions {
     double fTimeoutSeconds = std::numeric_limits<double>::infinity();
 
     // Receive standard output and standard error while the program runs, instead of RunResult's
-    // texts: blocks, or lines with ByLine. Each is called on a thread of its own. RunProgram waits
+    // texts: blocks, or lines with ByLine. Each is called on a separate thread. RunProgram waits
     // for a call in progress, and makes no call after it has returned. If a function throws, the
     // program is killed, and RunProgram throws the same exception.
     TakeBytes fTakeOutput;

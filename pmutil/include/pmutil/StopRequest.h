@@ -1,4 +1,4 @@
-// A request to end what is under way, such as the run of a child. Any thread may use it.
+// A request to end an operation, such as the run of a child. Any thread may use it.
 #pragma once
 
 #include <functional>

@@ -1,5 +1,5 @@
-// Wraps another launcher and records how its child ended. The record is kept where ConsoleApp gives
-// up the launch, for example because another process holds the child's output open.
+// Wraps another launcher and records how its child ended. The record remains if ConsoleApp gives up
+// the launch, for example because another process holds the child's output open.
 #pragma once
 
 #include <functional>
@@ -20,34 +20,34 @@ struct ChildEnd {
     std::string fTerminationText; // GetTerminationText of the wrapped launcher
 };
 
-// For one launch. Any thread may call the operations other than Launch and Wait.
+// For one launch. Any thread may call the functions other than Launch and Wait.
 class TrackingLauncher : public Launcher {
 public:
-    // `onEnd` is called by Wait when the end is known; Wait throws what it throws. May be empty.
+    // Wait calls `onEnd` when the end is known, and passes on its exceptions. May be empty.
     explicit TrackingLauncher(boost::shared_ptr<Launcher> launcher,
                               std::function<void()> onEnd = {});
 
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override;
     WaitResult Wait(int* exitCode) override;
 
-    // If the child is not started yet, it is killed as soon as it is.
+    // Kills a child that is not started yet as soon as it is started.
     void Kill() override;
 
     bool HasLaunched() const;
     bool IsKilled() const; // Kill was called
 
-    // Empty until the end is known.
+    // Returns nullopt until the end is known.
     std::optional<ChildEnd> GetEnd() const;
 
-    // Waits until the end is known or Wait has failed, up to `maxWaitSeconds` (infinity: without
-    // limit). Returns false if the time ran out.
+    // Waits until the end is known or Wait has failed, up to `maxWaitSeconds` (infinity: without a
+    // limit). Returns false on timeout.
     bool AwaitEnd(double maxWaitSeconds) const;
 
     // The same, but returns false at once if Kill was or is called.
     bool AwaitEndOrKill(double maxWaitSeconds) const;
 
 private:
-    void NoteOver(const std::optional<ChildEnd>& end);
+    void SetOver(const std::optional<ChildEnd>& end);
     bool Await(double maxWaitSeconds, bool orKill) const;
 
     const boost::shared_ptr<Launcher> fLauncher;
@@ -56,7 +56,7 @@ private:
     mutable boost::condition_variable fCond;
     bool fLaunched = false;
     bool fIsKilled = false;
-    bool fOver = false;
+    bool fOver = false; // Wait has returned or failed
     std::optional<ChildEnd> fEnd;
 };
 

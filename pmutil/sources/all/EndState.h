@@ -1,11 +1,11 @@
-// The state of an application whose child has ended.
+// Converts the result of a launcher's Wait to a state.
 #pragma once
 
 #include "pmutil/Launcher.h"
 
 namespace pmutil {
 
-// Undefined for a value that no launcher gives.
+// Returns Undefined for a value that isn't a WaitResult.
 inline State GetEndState(int result)
 {
     switch (result) {

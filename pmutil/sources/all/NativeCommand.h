@@ -5,7 +5,7 @@
 
 namespace pmutil {
 
-// As MakeChildCommand, of texts without a zero.
+// As MakeChildCommand, for texts without zero bytes.
 ChildCommand MakeNativeCommand(const std::string& program, const std::vector<std::string>& args);
 
 } // namespace pmutil

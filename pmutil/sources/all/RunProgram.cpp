@@ -23,10 +23,10 @@ using consoleapp::LaunchStart;
 
 namespace {
 
-// How often a slow start checks for a kill, in seconds.
-constexpr double kStartTick = 0.1;
+// The interval, in seconds, at which a slow start checks for a kill.
+constexpr double kStartPollSeconds = 0.1;
 
-// A program that can't be killed is reported as still running.
+// Ignores a failure: a program that can't be killed is reported as still running.
 void TryKill(TrackingLauncher& child)
 {
     try {
@@ -35,8 +35,8 @@ void TryKill(TrackingLauncher& child)
     }
 }
 
-// Receives one output, for the caller's function or for the result. Lives on after the run if the
-// output is still open.
+// Receives one output, for the caller's function or for the result. Exists after the run as long as
+// the output is open.
 class Capture {
 public:
     Capture(TakeBytes take, std::size_t maxKept) : fTake(std::move(take)), fMaxKept(maxKept) {}
@@ -59,14 +59,14 @@ public:
         }
     }
 
-    // Drops everything from now on.
+    // Discards all further blocks.
     void Close()
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
         fIsClosed = true;
     }
 
-    // After Close.
+    // Call these after Close.
     void RethrowFailure() const
     {
         if (fFailure != nullptr)
@@ -159,14 +159,14 @@ public:
             throw;
         }
         RethrowFailures();
-        TellEnd();
+        SetEnd();
         return std::move(fResult);
     }
 
 private:
     void Launch()
     {
-        // An interrupted launch would wait for a program that nobody kills.
+        // An interrupted launch would wait for a program that isn't killed.
         const boost::this_thread::disable_interruption uninterrupted;
         fLaunch.Launch();
     }
@@ -190,7 +190,7 @@ private:
         using Result = LaunchStart::Result;
         Result start = Result::kPending;
         do
-            start = fApp->AwaitStart(std::min(GetTimeLeft(deadline), kStartTick));
+            start = fApp->AwaitStart(std::min(GetTimeLeft(deadline), kStartPollSeconds));
         while (start == Result::kPending && GetTimeLeft(deadline) > 0.0 &&
                !(orKill && fChild->IsKilled()));
         if (start != Result::kRunning)
@@ -226,7 +226,7 @@ private:
         fErrors->RethrowFailure();
     }
 
-    void TellEnd()
+    void SetEnd()
     {
         const std::optional<ChildEnd> end = fChild->GetEnd();
         fResult.fEnd = end ? GetEndState(end->fResult) : State::kTimeout;

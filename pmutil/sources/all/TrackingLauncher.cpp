@@ -27,7 +27,7 @@ LaunchResult TrackingLauncher::Launch(const std::wstring& program,
         try {
             fLauncher->Kill();
         } catch (const std::exception&) {
-            // The launch goes on with its child. The caller of Kill sees that no end comes.
+            // The launch continues. The caller of Kill finds that the child doesn't end.
         }
     }
     return result;
@@ -40,12 +40,12 @@ WaitResult TrackingLauncher::Wait(int* exitCode)
         end.fResult = fLauncher->Wait(&end.fExitCode);
         end.fTerminationText = GetTerminationText(*fLauncher);
     } catch (...) {
-        NoteOver({});
+        SetOver({});
         throw;
     }
     if (end.fResult == kEndedNormally)
         *exitCode = end.fExitCode;
-    NoteOver(end);
+    SetOver(end);
     if (fOnEnd)
         fOnEnd();
     return end.fResult;
@@ -104,7 +104,7 @@ bool TrackingLauncher::Await(double maxWaitSeconds, bool orKill) const
     return fOver;
 }
 
-void TrackingLauncher::NoteOver(const std::optional<ChildEnd>& end)
+void TrackingLauncher::SetOver(const std::optional<ChildEnd>& end)
 {
     const boost::lock_guard<boost::mutex> lock(fMutex);
     fEnd = end;
