@@ -23,6 +23,8 @@ from mutants.board import Board  # noqa: E402
 # A test that goes on for so long after its usual time is taken to hang.
 PATIENCE = 30
 PATIENCE_TIMES = 10
+# The usual time of what wasn't surveyed yet; None is its place among the known times.
+SURVEYED = {None: 60}
 MEMORY = 12 << 30
 # Some tests write behind the 32-bit sizes, into files with holes.
 FILE = 64 << 30
@@ -83,7 +85,7 @@ class Watch:
                 break
             else:
                 note(b"")
-            limit = PATIENCE + PATIENCE_TIMES * self.seconds.get(self.running, 1)
+            limit = PATIENCE + PATIENCE_TIMES * self.seconds.get(self.running, self.seconds.get(None, 1))
             if time.monotonic() - self.began > limit:
                 self.stop()
                 return Failure(self.running, "hangs")
@@ -176,11 +178,11 @@ def survey(job, board):
         for case in cases:
             board.clear()
             start = time.monotonic()
-            failure = GoogleTest(program, {}).run([case])
+            failure = GoogleTest(program, SURVEYED).run([case])
             result[program][case] = {"passed": failure is None, "seconds": time.monotonic() - start,
                                      "reached": board.reached()}
     if job["program_tests"]:
-        found = ProgramTests(job, {}).run(None, survey=True)
+        found = ProgramTests(job, SURVEYED).run(None, survey=True)
         result["program"] = {each.pop("ends"): each for each in found}
     return result
 

@@ -2,6 +2,7 @@
 import re
 
 from clang.cindex import CursorKind as Kind
+from clang.cindex import TypeKind
 
 from mutants import clang
 from mutants.mutant import Mutant, context, words
@@ -105,8 +106,15 @@ class Finder:
             self.statement(child, where)
         self.expression(cursor, children, where)
         for index, child in enumerate(children):
-            self.visit(child, function,
-                       CONSTANT if cursor.kind == Kind.CASE_STMT and index == 0 else relaxed)
+            needed = self.array_needs(cursor, child) or cursor.kind == Kind.CASE_STMT and index == 0
+            self.visit(child, function, CONSTANT if needed else relaxed)
+
+    def array_needs(self, cursor, child):
+        """Whether the child is the bound of an array, or the literal that gives it its size."""
+        if cursor.kind not in (Kind.VAR_DECL, Kind.FIELD_DECL, Kind.PARM_DECL):
+            return False
+        return self.source[:clang.span(child)[0]].rstrip().endswith(b"[") or (
+            child.kind == Kind.STRING_LITERAL and cursor.type.kind == TypeKind.CONSTANTARRAY)
 
     def relax(self, cursor, in_class):
         """Where a declaration says "constexpr", and what may stand there instead."""

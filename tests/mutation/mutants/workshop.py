@@ -122,7 +122,7 @@ class Workshop:
 
     def blame(self, output, numbered, refused):
         """The mutants at the lines that the compiler's errors name, or, if there are none, those that
-        turned constants into variables, or all of the files that are named."""
+        turned constants into variables, or change numbers, or all of the files that are named."""
         more = set()
         for failed in re.split(r"^FAILED: ", output, flags=re.M)[1:]:
             places = self.places(failed)
@@ -131,8 +131,9 @@ class Workshop:
             exact = {each.name for path, line in places for _, each in here[path]
                      if line in self.lines(path, each)}
             constants = {each.name for mutants in here.values() for _, each in mutants if each.relaxed}
+            numbers = {each.name for mutants in here.values() for _, each in mutants if each.kind == "constant"}
             every = {each.name for mutants in here.values() for _, each in mutants}
-            more |= exact or constants or every
+            more |= exact or constants or numbers or every
         return more
 
     def lines(self, path, mutant):
