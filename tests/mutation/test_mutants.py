@@ -127,6 +127,9 @@ TEST(All, Passes) { EXPECT_FALSE(MutantIsOn(1)); }
 TEST(All, Crashes) { if (MutantIsOn(2)) std::abort(); }
 TEST(All, KillsAll) { if (MutantIsOn(3)) kill(-1, SIGKILL); }
 TEST(All, Writes) { if (MutantIsOn(4)) { EXPECT_EQ(std::fopen("FOLDER/left", "w"), nullptr); EXPECT_NE(std::fopen("/tmp/left", "w"), nullptr); } }
+class OfValues : public testing::TestWithParam<int> {};
+TEST_P(OfValues, Fails) { EXPECT_FALSE(MutantIsOn(GetParam())); }
+INSTANTIATE_TEST_SUITE_P(Some, OfValues, testing::Values(6, 7));
 """
 
 
@@ -146,7 +149,8 @@ def cases(tmp_path_factory):
     shutil.rmtree(folder)
 
 
-ALL = {"All.Passes": 0.1, "All.Crashes": 0.1, "All.KillsAll": 0.1, "All.Writes": 0.1}
+ALL = {"All.Passes": 0.1, "All.Crashes": 0.1, "All.KillsAll": 0.1, "All.Writes": 0.1,
+       "Some/OfValues.Fails/0": 0.1, "Some/OfValues.Fails/1": 0.1}
 
 
 def attempt(cases, number):
@@ -158,6 +162,7 @@ def attempt(cases, number):
 def test_a_mutant_is_killed_by_a_failure_or_a_crash_and_survives_without(cases):
     assert attempt(cases, 1) == {"verdict": "killed", "by": "All.Passes", "how": "fails"}
     assert attempt(cases, 2) == {"verdict": "killed", "by": "All.Crashes", "how": "status -6"}
+    assert attempt(cases, 7) == {"verdict": "killed", "by": "Some/OfValues.Fails/1", "how": "fails"}
     assert attempt(cases, 5) == {"verdict": "survived", "unsteady": []}
 
 
@@ -176,5 +181,6 @@ def test_the_survey_says_which_case_asks_for_which_mutant(cases):
     program = str(folder / "cases")
     result, _ = isolation.run({**job, "what": "survey", "programs": {program: list(ALL)}}, folder, 100)
     assert {case: each["reached"] for case, each in result[program].items()} == {
-        "All.Passes": [1], "All.Crashes": [2], "All.KillsAll": [3], "All.Writes": [4]}
+        "All.Passes": [1], "All.Crashes": [2], "All.KillsAll": [3], "All.Writes": [4],
+        "Some/OfValues.Fails/0": [6], "Some/OfValues.Fails/1": [7]}
     assert all(each["passed"] for each in result[program].values())
