@@ -353,7 +353,7 @@ private:
 
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop)
 {
-    return RunChild(options, observer, stop, MakeChildLauncher());
+    return RunChild(options, observer, stop, MakeChildLauncher(), DefaultRunTimes());
 }
 
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,

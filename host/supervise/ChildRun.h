@@ -1,8 +1,6 @@
 // One supervised run of the child, from launch to verdict.
 #pragma once
 
-#include <chrono>
-#include <functional>
 #include <string>
 #include <vector>
 
@@ -12,6 +10,7 @@
 #include "pmutil/StopRequest.h"
 #include "report/ReportReader.h"
 #include "report/RunOutcome.h"
+#include "supervise/RunTimes.h"
 
 namespace assay_host {
 
@@ -37,21 +36,6 @@ public:
     virtual void OnTick(double /*seconds*/) {} // about ten times a second
 };
 
-// How long each step of a run may take. All that follows the timeout has to fit into two seconds,
-// of which pmutil takes one if its launch has to be given up.
-struct RunTimes {
-    using Clock = std::chrono::steady_clock;
-    using Seconds = std::chrono::duration<double>;
-
-    std::function<Clock::time_point()> fNow = &Clock::now; // of these times and of the timeout
-    std::chrono::milliseconds fTick{100}; // a longer pause counts as one in the graces
-    Seconds fKillGrace{0.7};              // for a killed child to end
-    Seconds fStreamGrace{0.2};            // for the streams to end after the child
-    Seconds fLastStreamGrace{0.2};        // for the streams to end after the descendants
-    double fTreeSeconds = 0.2;            // for the descendants to end, by the system's clock
-    double fJoinSeconds = 0.3; // for the launch to end after the child, by the system's clock
-};
-
 // Launches the child with its standard input closed, waits for its end no longer than the timeout,
 // kills it then, ends what it left behind, and judges. Returns within the timeout plus two seconds,
 // whatever the child does. Never throws for what the child or the system does; that is in the
@@ -63,7 +47,6 @@ RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::
 
 // The same with another launcher, used for this run alone, and with other times.
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
-                    const boost::shared_ptr<pmutil::Launcher>& launcher,
-                    const RunTimes& times = {});
+                    const boost::shared_ptr<pmutil::Launcher>& launcher, const RunTimes& times);
 
 } // namespace assay_host
