@@ -1,6 +1,6 @@
-// Any bytes as a report: checks that the documents made of it are valid and that reading them back
-// gives the same report. Any bytes as a document: checks that they are read or rejected with a
-// text.
+// Any bytes as a report: checks that the documents built from it are valid and that reading them
+// back returns the same report. Any bytes as a document: checks that they are read or rejected with
+// a text.
 #include <cstdint>
 #include <sstream>
 #include <stdexcept>

@@ -1,4 +1,4 @@
-// The keys of a device, each by itself and in whole runs.
+// The keys of a device, separately and in whole runs.
 #include <stdexcept>
 
 #include <gmock/gmock.h>

@@ -74,7 +74,7 @@ TEST_F(LibraryChecks, CoreFailsWithALineInTheLogOnly)
     QGF::Core::ReplaceLoaderCheck([] { throw QGF::LogicalException("no loader"); });
     ExpectCheck(kCore, "QGFCoreInitialized=0",
                 {"QGF::Core::Library::initialize() failed: no loader"});
-    QGF::Core::ReplaceLoaderCheck([] { throw std::runtime_error("not told"); });
+    QGF::Core::ReplaceLoaderCheck([] { throw std::runtime_error("not logged"); });
     ExpectCheck(kCore, "QGFCoreInitialized=0", {"QGF::Core::Library::initialize() failed"});
     EXPECT_THAT(err.Take(), IsEmpty());
 }
@@ -99,7 +99,7 @@ TEST_F(LibraryChecks, ContextFailsWithALineInTheLogOnly)
     gl.devices[0].onCreate = [] { throw NullMessage(); };
     ExpectCheck(kContext, "OGLContextCreated=0",
                 {"Cannot create default ContextOffscreen: <NULL>"});
-    gl.devices[0].onCreate = [] { throw std::runtime_error("not told"); };
+    gl.devices[0].onCreate = [] { throw std::runtime_error("not logged"); };
     ExpectCheck(kContext, "OGLContextCreated=0", {"Cannot create default ContextOffscreen"});
     EXPECT_THAT(err.Take(), IsEmpty());
 }

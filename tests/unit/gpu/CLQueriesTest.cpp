@@ -1,4 +1,4 @@
-// The queries of an OpenCL device and the values made of their results.
+// The queries of an OpenCL device and the values computed from their results.
 #include <new>
 #include <stdexcept>
 #include <utility>

@@ -1,7 +1,7 @@
-// What a process inherits from the one that started it and no test should depend on.
+// The state that a process inherits from its parent, on which no test should depend.
 #pragma once
 
-// To be called first in a program: makes up for signals that are ignored or blocked, as by nohup,
-// in the background of a script or in some hosts, for closed standard streams, and for being the
-// first process of a container, which gets everybody's orphans as children.
+// Call first in a program. Unblocks signals and stops ignoring them, as nohup, shells and some
+// hosts do; opens closed standard streams; and continues in a child process if this is the first
+// process of a container, which adopts all orphans.
 void DropInheritedState();

@@ -1,4 +1,5 @@
-// The unit tests' main: they find the same process whoever started it.
+// The main function of the unit tests. Drops the state that the process has inherited, so that the
+// results don't depend on the parent.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 

@@ -37,8 +37,8 @@ inline std::string CL(int device, const std::string& rest)
     return "clgpu[" + std::to_string(device) + "]." + rest;
 }
 
-// Returns the lines of an undisturbed run in groups, one for each step, in order. Independent of
-// the product's tables.
+// Returns the lines of a run without failures in groups, one for each step, in order. Independent
+// of the product's tables.
 inline std::vector<std::vector<std::string>> MakeWholeRun(int glCount, int clCount)
 {
     std::vector<std::vector<std::string>> run = {

@@ -1,4 +1,4 @@
-// Waits of the tests, and the waits of the supervision that a test may set.
+// Waits of the tests, and the waits of launches that a test can set.
 #pragma once
 
 #include <chrono>
@@ -8,10 +8,11 @@
 
 namespace pmutil {
 
-// Longer than anything takes, on a busy machine and in a process that is stopped most of the time.
+// Seconds; longer than any operation on a busy machine and in a process that is stopped most of the
+// time.
 constexpr double kLong = 300.0;
 
-// True as soon as the condition holds; false if it doesn't within kLong.
+// Waits until the condition is true. Returns false if it isn't within kLong.
 template <typename Condition>
 bool Eventually(const Condition& condition)
 {
@@ -24,12 +25,12 @@ bool Eventually(const Condition& condition)
     return true;
 }
 
-// Sets a debug value for as long as it lives. `name` must be a literal.
+// Sets a debug value while it exists. `name` must be a literal.
 class DebugValueSetter {
 public:
     DebugValueSetter(const char* name, int value) : fValue(name, 0)
     {
-        InitLogging(); // no name is known before
+        InitLogging(); // required to resolve the name
         fOld = GetDebugValue(fValue).exchange(value);
     }
     ~DebugValueSetter() { GetDebugValue(fValue) = fOld; }
@@ -41,8 +42,8 @@ private:
     int fOld = 0;
 };
 
-// Sets the short wait for as long as it lives. How long a test's machine takes must not matter: a
-// test that is about giving up has none, and every other one a long one.
+// Sets the short wait while it exists. So that tests don't depend on the machine's speed, tests of
+// launches that are given up use no short wait, and all others a long one.
 class ShortWait : public DebugValueSetter {
 public:
     explicit ShortWait(int seconds)
@@ -50,14 +51,13 @@ public:
     {}
 };
 
-// A short wait that nothing comes to the end of.
+// A short wait that never times out.
 class LongShortWait : public ShortWait {
 public:
     LongShortWait() : ShortWait(600) {}
 };
 
-// The short wait is no wait at all. No thread of a launch may come to a short wait of its own
-// meanwhile, unless it is to run out.
+// A short wait of 0 seconds. Meanwhile every short wait of a launch's threads times out at once.
 class NoShortWait : public ShortWait {
 public:
     NoShortWait() : ShortWait(0) {}

@@ -256,10 +256,10 @@ bool GetIntProperty(AdapterRow& row, std::uint32_t& out)
 
 std::string NarrowProperty(const std::u16string& wide)
 {
-    constexpr char16_t kFirstPrintable = 0x20;
-    constexpr char16_t kLastPrintable = 0x7E;
+    constexpr char16_t kMinPrintable = 0x20;
+    constexpr char16_t kMaxPrintable = 0x7E;
     constexpr char kDigits[] = "0123456789abcdef";
-    constexpr unsigned kHighestDigitShift = 12;
+    constexpr unsigned kUnitBits = 16;
     constexpr unsigned kDigitBits = 4;
     constexpr unsigned kDigitMask = 0xF;
 
@@ -267,12 +267,12 @@ std::string NarrowProperty(const std::u16string& wide)
     for (const char16_t unit : wide) {
         if (unit == 0)
             break;
-        if (unit >= kFirstPrintable && unit <= kLastPrintable) {
+        if (unit >= kMinPrintable && unit <= kMaxPrintable) {
             narrow += static_cast<char>(unit);
             continue;
         }
         narrow += "\\x";
-        for (unsigned shift = kHighestDigitShift + kDigitBits; shift != 0; shift -= kDigitBits)
+        for (unsigned shift = kUnitBits; shift != 0; shift -= kDigitBits)
             narrow += kDigits[(unsigned{unit} >> (shift - kDigitBits)) & kDigitMask];
     }
     return narrow;

@@ -11,7 +11,7 @@
 namespace pmutil {
 namespace {
 
-constexpr int kFirstYear = 1990; // no driver is older
+constexpr int kMinYear = 1990; // no driver is older
 
 // The time zones in the driver's build dates, in minutes east of UTC.
 struct Zone {
@@ -35,7 +35,7 @@ std::string DateAt(const std::vector<std::string>& words, std::size_t first)
     std::tm date{};
     in >> std::get_time(&date, "%b %d %H:%M:%S %Y");
     const bool complete = in && in.peek() == std::istringstream::traits_type::eof();
-    if (!complete || date.tm_year < kFirstYear - 1900)
+    if (!complete || date.tm_year < kMinYear - 1900)
         return {};
     const auto zone = std::find_if(std::begin(kZones), std::end(kZones), [&](const Zone& known) {
         return words[first + 3] == known.name;

@@ -11,8 +11,8 @@ namespace {
 
 void DoNothing(int /*signal*/) {}
 
-// Whoever ignores one of these wants the tests to survive it. A handler doesn't reach the programs
-// that the tests start.
+// Returns whether a parent may ignore the signal so that the tests survive it. These get a handler,
+// which isn't inherited by the programs that the tests start.
 bool IsFromTheUser(int number)
 {
     return number == SIGHUP || number == SIGINT || number == SIGQUIT;
@@ -34,7 +34,7 @@ void ResetSignals()
     ::sigprocmask(SIG_SETMASK, &none, nullptr);
 }
 
-// A descriptor that a test opens must not become a standard stream.
+// Opens closed standard streams, so that no descriptor of a test becomes one.
 void OpenStandardStreams()
 {
     for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) {
@@ -43,8 +43,9 @@ void OpenStandardStreams()
     }
 }
 
-// Leaves the place to a process that does what the first one must, and goes on in its child.
-void LeaveFirstPlace()
+// If this is the first process of a container, continues in a child. The parent reaps all children,
+// and ends with the child's status.
+void LeaveFirstProcess()
 {
     if (::getpid() != 1)
         return;
@@ -71,5 +72,5 @@ void DropInheritedState()
 {
     ResetSignals();
     OpenStandardStreams();
-    LeaveFirstPlace();
+    LeaveFirstProcess();
 }

@@ -4,5 +4,5 @@
 
 void DropInheritedState()
 {
-    ::SetConsoleCtrlHandler(nullptr, FALSE); // Ctrl-C counts again
+    ::SetConsoleCtrlHandler(nullptr, FALSE); // stop ignoring Ctrl-C
 }
