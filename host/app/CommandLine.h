@@ -12,7 +12,7 @@ namespace assay_host {
 
 enum class Format { kText, kJson, kJsonLines };
 
-// What the exit status of a run is about: its verdict, or whether these can be used.
+// What the exit status of a run shows: its verdict, or whether these interfaces can be used.
 enum class Need { kNothing, kOpenGL, kOpenCL, kBoth };
 
 struct ChildChoice {

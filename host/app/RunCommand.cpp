@@ -94,7 +94,7 @@ public:
             fWriter.Write([kept = ShortenLine(line), seconds] {
                 return MakeLineEvent(RestoreLine(kept), seconds);
             });
-        // The answers need no other lines, and these are on their way already.
+        // The answers need only the values; all lines are already with the writer.
         if (fChoice.fFormat != Format::kJsonLines || line.fKind == LineKind::kValue)
             fReport.Add(line);
         if (fChoice.fRaw)
@@ -116,7 +116,7 @@ public:
                                          next.empty() ? "at the end" : "at " + next));
     }
 
-    // Writes the rest, and returns the exit status.
+    // Queues the rest of the output, and returns the exit status.
     int Finish(const RunOutcome& outcome)
     {
         const auto report = std::make_shared<const Report>(std::move(fReport));

@@ -1,4 +1,4 @@
-// The version that a program's file carries, read without running it.
+// Reads the version in a program's file, without running the program.
 #pragma once
 
 #include <string>
@@ -7,8 +7,8 @@
 
 namespace assay_host {
 
-// Of assay's own file: on Linux the version in its ELF note, on Windows the version resource of any
-// program. Unknown if the file can't be read or has none; never throws. The path is UTF-8. Any
+// Returns the version of a program: on Linux the one in assay's ELF note, on Windows the version
+// resource. Unknown if the file can't be read or has none. Never throws. The path is UTF-8. Any
 // thread may call.
 Fact GetFileVersion(const std::string& path);
 

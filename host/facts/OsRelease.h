@@ -1,4 +1,4 @@
-// The file with which a Linux distribution names itself (os-release).
+// Reads the file that names a Linux distribution (os-release).
 #pragma once
 
 #include <string>
@@ -6,8 +6,8 @@
 
 namespace assay_host {
 
-// The value of a variable in the text of the file, without its quotes and escapes; empty if it is
-// not set. Of a variable that is set twice the last one counts, as in a shell.
+// Returns the value of a variable in the text of the file, without its quotes and escapes; empty if
+// it isn't set. If it is set twice, the last value counts, as in a shell. Any thread may call.
 std::string FindOsRelease(std::string_view text, std::string_view name);
 
 } // namespace assay_host

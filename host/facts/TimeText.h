@@ -1,4 +1,4 @@
-// Times as a document has them.
+// Formats times for a document. Any thread may call.
 #pragma once
 
 #include <cstdint>
@@ -6,11 +6,12 @@
 
 namespace assay_host {
 
-// "2026-11-22T01:26:02Z" for the seconds since 1970 in UTC. Years beyond 9999 are cut to 9999, and
-// times before 1970 to 1970.
+// Returns "2026-11-22T01:26:02Z" for the seconds since 1970 in UTC. Years beyond 9999 are limited
+// to 9999, and times before 1970 to 1970.
 std::string MakeUtcText(std::int64_t seconds);
 
-// "+01:00", "-09:30" for an offset in minutes. Offsets of a day or more are cut to a minute less.
+// Returns "+01:00" or "-09:30" for an offset in minutes. Offsets of a day or more are limited to
+// one minute less than a day.
 std::string MakeOffsetText(int minutes);
 
 } // namespace assay_host

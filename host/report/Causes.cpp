@@ -4,7 +4,7 @@ namespace assay_host {
 
 namespace {
 
-// What stands in front of the cause.
+// The parts before a cause.
 constexpr std::string_view kStarts[] = {
     "QGF::Core::Library::initialize() failed: ",
     "QGF::OGL::Library::initialize() failed: ",
@@ -13,7 +13,7 @@ constexpr std::string_view kStarts[] = {
     "DoGLFramebufferOK: ",
 };
 
-// Parts of lines that are causes as a whole.
+// A line with one of these parts is a cause as a whole.
 constexpr std::string_view kParts[] = {
     ": glGetError() returns ",
     "GLGetIntegerv failure",

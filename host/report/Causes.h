@@ -1,4 +1,4 @@
-// What a child's log says of failures.
+// Finds the causes of failures in a child's log.
 #pragma once
 
 #include <string>
@@ -6,8 +6,8 @@
 
 namespace assay_host {
 
-// The cause that the text of a log line tells, without the words that the report line of the
-// failure says itself; empty if the line is about no failure.
+// Returns the cause of a failure in the text of a log line, without the part that only names the
+// failed operation; empty if the line isn't about a failure. Any thread may call.
 std::string FindCauseText(std::string_view text);
 
 } // namespace assay_host

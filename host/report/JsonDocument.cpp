@@ -77,7 +77,7 @@ bool IsFlag(const Answer& answer)
            (answer.fLine->fValue == "0" || answer.fLine->fValue == "1");
 }
 
-// The members of a value that is no text.
+// The members of a value that isn't a text.
 void AddNumbers(Json& json, const ReportLine& line)
 {
     if (line.fQuoted || !IsWholeValue(line))

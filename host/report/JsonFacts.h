@@ -1,4 +1,4 @@
-// The parts of a document that the second schema added.
+// Makes the parts of a document that the second schema added. Any thread may call.
 #pragma once
 
 #include <vector>
@@ -13,19 +13,19 @@
 
 namespace assay_host {
 
-// {"known": true, "value": ...}, or {"known": false, "reason": ...}.
+// Makes {"known": true, "value": ...} or {"known": false, "reason": ...}.
 nlohmann::ordered_json MakeFact(const Fact& fact);
 
 nlohmann::ordered_json MakeVersions(const RunFacts& facts);
 nlohmann::ordered_json MakeEnvironment(const Environment& environment);
 
-// Both interfaces' answers, under "opengl" and "opencl".
+// Makes the results for both interfaces, under "opengl" and "opencl".
 nlohmann::ordered_json MakeUsable(const Answers& answers, const RunOutcome& outcome);
 
 nlohmann::ordered_json MakeWarnings(const std::vector<Warning>& warnings);
 nlohmann::ordered_json MakeCauses(const RunOutcome& outcome);
 
-// Whether the device is a software renderer: {"known": true, "flag": ...}.
+// Makes {"known": true, "flag": ...}: whether the device is a software renderer.
 nlohmann::ordered_json MakeSoftware(const DeviceAnswers& device);
 
 } // namespace assay_host

@@ -7,7 +7,7 @@ namespace assay_host {
 
 namespace {
 
-// The constant part of a prefix; '0' stands for any digit. The first number may be longer.
+// The form of a prefix up to its delta. '0' is any digit; the first number may have more digits.
 constexpr std::string_view kShape = "# 00000.0000.00.00_00:00:00.000(";
 
 bool IsDigit(char character)
@@ -68,7 +68,7 @@ std::vector<LogFilter::Piece> LogFilter::Finish()
     return pieces;
 }
 
-// `piece` has a line end at its end, or none.
+// `piece` has no line end except at its end.
 void LogFilter::FeedLine(std::string_view piece, std::vector<Piece>& pieces)
 {
     const bool isEnd = piece.back() == '\n';

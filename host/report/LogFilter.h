@@ -1,5 +1,5 @@
-// Takes the lines of the child's log out of its output, for a host that asks for the log and wants
-// the report as it is without one.
+// Removes the lines of the child's log from its output, for a host that requests the log and wants
+// the report without it.
 #pragma once
 
 #include <cstddef>
@@ -9,7 +9,7 @@
 
 namespace assay_host {
 
-// Splits output into pieces, in order. Serves one thread at a time.
+// Splits output into pieces, in order. One thread at a time.
 class LogFilter {
 public:
     struct Piece {
@@ -17,13 +17,13 @@ public:
         std::string fText; // a log line without its line end, or any bytes of the rest
     };
 
-    // A log line is cut here; the rest of it is dropped.
+    // The rest of a longer log line is dropped.
     static constexpr std::size_t kMaxLineBytes = std::size_t{1} << 16;
 
-    // The pieces that these bytes complete. Bytes that may begin a log line are held back.
+    // Returns the pieces that these bytes complete. Bytes that may begin a log line are kept.
     std::vector<Piece> Feed(std::string_view bytes);
 
-    // What is held back at the end of the output.
+    // Call at the end of the output. Returns the kept bytes.
     std::vector<Piece> Finish();
 
 private:
@@ -43,7 +43,7 @@ private:
 // ".
 bool IsLogLine(std::string_view line);
 
-// The text after the prefix of a log line.
+// Returns the text after the prefix of a log line.
 std::string_view GetLogText(std::string_view line);
 
 } // namespace assay_host

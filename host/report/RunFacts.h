@@ -1,5 +1,5 @@
-// What a document tells besides the report and the outcome: which programs, on which system, when.
-// Value types.
+// The facts of a document besides the report and the outcome: the programs, the system and the
+// time. Value types.
 #pragma once
 
 #include <string>
@@ -8,7 +8,7 @@ namespace assay_host {
 
 // A text that may not be known.
 struct Fact {
-    std::string fValue;  // UTF-8, or any bytes where the system has them
+    std::string fValue;  // UTF-8, or any bytes if the system has them
     std::string fReason; // why the value is not known; empty if it is
 
     bool IsKnown() const { return fReason.empty(); }

@@ -25,9 +25,9 @@ const char* GetVerdictName(Verdict verdict);
 // Returns the exit status of `assay-host run` for the verdict: 0 to 6 in the order above.
 int GetVerdictStatus(Verdict verdict);
 
-// What the child logged of something that failed.
+// The cause of a failure, from the child's log.
 struct Cause {
-    std::string fKey;  // of the report line that the failure belongs to, tag and all
+    std::string fKey;  // of the report line that the failure belongs to, with its tag
     std::string fText; // raw bytes, without the log's prefix
 };
 
@@ -47,7 +47,7 @@ struct RunOutcome {
     std::vector<Cause> fCauses; // in the order of the log; empty if the child kept none
     bool fLeftBehind = false;   // a process could not be killed and may still be running
 
-    // The text of the first cause of that key; empty without one.
+    // Returns the text of the first cause of this key; empty without one.
     std::string FindCause(const std::string& key) const;
 };
 

@@ -19,8 +19,8 @@ constexpr std::string_view kNames[] = {
     "oclgrind",            // "Oclgrind Simulator", which also claims to be a GPU
 };
 
-// The device in front of PoCL's build hash: "3.0 PoCL HSTR: cpu-x86_64-pc-linux-gnu-haswell". On
-// graphics cards other words follow, such as "CUDA-sm_75".
+// The device before PoCL's build hash: "3.0 PoCL HSTR: cpu-x86_64-pc-linux-gnu-haswell". Graphics
+// cards have other names there, such as "CUDA-sm_75".
 constexpr std::string_view kVersions[] = {
     "pocl hstr: pthread-",
     "pocl hstr: cpu-",

@@ -1,4 +1,4 @@
-// Recognises renderers that draw or compute on the processor.
+// Detects software renderers: OpenGL and OpenCL on the processor. Any thread may call.
 #pragma once
 
 #include <string>
@@ -8,19 +8,19 @@
 
 namespace assay_host {
 
-// Whether a name that a driver, a device or an adapter gives itself is that of a software renderer.
-// Compares ASCII letters without regard to case.
+// Whether the name of a driver, a device or an adapter is that of a software renderer. Ignores the
+// case of ASCII letters.
 bool IsSoftwareName(std::string_view name);
 
-// Whether the OpenCL version text of a device is that of a processor that PoCL drives. PoCL on a
-// graphics card is none.
+// Whether the OpenCL version text of a device is that of PoCL on a processor. PoCL also has drivers
+// for graphics cards.
 bool IsSoftwareVersion(std::string_view version);
 
-// The device's text that shows it to be a software renderer, as it came: a renderer, an adapter, a
-// device or a version. Empty if none does.
+// Returns the value that shows the device to be a software renderer, unchanged: its renderer, its
+// adapter, its name or its version. Empty if none does.
 std::string FindSoftwareText(const DeviceAnswers& device);
 
-// Whether the device has answered what FindSoftwareText() goes by.
+// Whether the device has the values that FindSoftwareText() checks.
 bool CanTellSoftware(const DeviceAnswers& device);
 
 } // namespace assay_host

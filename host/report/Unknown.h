@@ -1,5 +1,5 @@
-// Values by which a report says that it does not know: "?", an empty text, a 0. Each key has its
-// own way, and every form of a run decides here which value is one of these.
+// Values of a report that mean "not known": "?", an empty text, a 0. They depend on the key. This
+// is the only place that decides about them.
 #pragma once
 
 #include "report/KnownKeys.h"
@@ -10,7 +10,7 @@ namespace assay_host {
 enum class Unknown {
     kNot,
     kCut,         // only the beginning of the line came
-    kEmpty,       // the driver gave an empty text
+    kEmpty,       // the driver returned an empty text
     kNoAdapter,   // no adapter of the system matches the device
     kNotListed,   // the system's adapter lists do not have it
     kNoFigure,    // a size or an id of 0
@@ -18,11 +18,12 @@ enum class Unknown {
     kImplausible, // a measurement that no device reaches: its clock is unreliable
 };
 
-// A sentence part in English; empty for kNot.
+// Returns a phrase in English; empty for kNot.
 const char* GetUnknownText(Unknown unknown);
 
-// Whether the line's value stands for "not known", and why. `known` is its key, null for one that
-// is not known; `hasAdapter` is false for a line of a device that no adapter matches.
+// Returns why the line's value is not known, or kNot. `known`: its key, or null if that isn't in
+// the table. `hasAdapter`: false for a line of a device that no adapter matches. Any thread may
+// call.
 Unknown JudgeUnknown(const ReportLine& line, const KnownKey* known, bool hasAdapter);
 
 } // namespace assay_host

@@ -40,7 +40,7 @@ constexpr FailedTrial kFailedTrials[] = {
     {"GLFrameBufferOK", "framebuffer-trial-failed", "no framebuffer could be drawn to"},
 };
 
-// How one device came through the trials of its interface.
+// The result of one device's trials of the interface.
 struct Trial {
     const DeviceAnswers* fDevice;
     const char* fFailure; // a reason; null if it passed
@@ -88,7 +88,7 @@ private:
         return line != nullptr && line->fValue == value;
     }
 
-    // Whether the report went on after everything of this interface.
+    // Whether the report has continued after the last line of this interface.
     bool IsDone() const
     {
         const Answer& count = Get(GetCountKey(fKind));
@@ -112,8 +112,8 @@ private:
         return word ? std::optional(ReadDeviceTag(*word)->fKind) : std::nullopt;
     }
 
-    // The interface that the child was at when the report broke off; none before the first and
-    // after the last one.
+    // Returns the interface that the child was using when the report stopped; nothing before the
+    // first and after the last one.
     std::optional<DeviceKind> FindStop() const
     {
         constexpr DeviceKind kGL = DeviceKind::kOpenGL;
@@ -192,7 +192,7 @@ private:
         for (const auto& [key, reason, text] : kFailedTrials)
             if (device.GetValue(key) == "0")
                 return MakeFailure(device, reason, text, key);
-        // What only describes a device may fail after its last trial.
+        // A test after the last trial only describes the device; its failure doesn't matter.
         const char* const last = fKind == DeviceKind::kOpenGL ? "GLFrameBufferOK" : "CLCompute";
         if (!device.Find(last))
             return device.fFailed
@@ -228,7 +228,7 @@ private:
         return {Usability::kAbsent, "no-device", fmt::format("{} has no device.", name), {}};
     }
 
-    // ": CAUSE", or nothing.
+    // Returns ": CAUSE", or nothing.
     std::string GetCauseText(const std::string& key) const
     {
         const std::string cause = fOutcome.FindCause(key);

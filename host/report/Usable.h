@@ -12,9 +12,9 @@ namespace assay_host {
 enum class Usability {
     kHardware, // a device with graphics hardware passed its trials
     kSoftware, // only software renderers did
-    kBroken,   // something is there, and it crashed, hung or failed its trials
-    kAbsent,   // the library or every device is missing
-    kUnknown   // the run says nothing of it
+    kBroken,   // the library or a device exists, but crashed, hung or failed its trials
+    kAbsent,   // there is no library or no device
+    kUnknown   // the run doesn't show it
 };
 
 // Returns "hardware", "software", "broken", "absent" or "unknown".
@@ -24,19 +24,18 @@ const char* GetUsabilityName(Usability usability);
 // others in the order above. None is the status of a verdict.
 int GetUsabilityStatus(Usability usability);
 
-// The answer for a host that needs both: the one that leaves less. Broken leaves least, then
-// absent, unknown, software and hardware.
+// Returns the worse one of two, for a host that needs both. The order is broken, absent, unknown,
+// software, hardware, from the worst to the best.
 Usability GetLesser(Usability first, Usability second);
 
 struct Usable {
     Usability fUsability = Usability::kUnknown;
-    const char* fReason = ""; // a stable word for programs
-    std::string fText;        // one sentence for people, safe to write to a terminal
-    std::string fTag;         // the device that the answer is about; empty for none
+    const char* fReason = ""; // a stable identifier for programs
+    std::string fText;        // one sentence for the user, safe to write to a terminal
+    std::string fTag;         // of the device that decided; empty for none
 };
 
-// The answer for one interface. An outcome without a command, as of a report from a file, is taken
-// for what its verdict says. Any thread may call.
+// Judges one interface. Any thread may call.
 Usable JudgeUsable(DeviceKind kind, const Answers& answers, const RunOutcome& outcome);
 
 } // namespace assay_host

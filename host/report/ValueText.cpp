@@ -16,8 +16,8 @@ namespace assay_host {
 
 namespace {
 
-// Whether to say no more of it than that. An empty text, an adapter's missing name and a wrong
-// measurement are shown in their own ways.
+// Whether the value is shown as "not known". An empty text, an adapter's missing name and a wrong
+// measurement have texts of their own.
 bool IsNotKnown(const Answer& answer)
 {
     const ValueForm form = answer.fKnown ? answer.fKnown->fForm : ValueForm::kText;

@@ -1,4 +1,4 @@
-// What a reader of a run must be warned of: one list for every form.
+// The warnings of a run, in all its forms.
 #pragma once
 
 #include <string>
@@ -10,16 +10,16 @@
 namespace assay_host {
 
 struct Warning {
-    const char* fCode;    // a stable word for programs; docs/assay-host.md has the list
+    const char* fCode;    // a stable identifier for programs; docs/assay-host.md has the list
     std::string fTag;     // of the device; empty for a warning of the run
-    std::string fText;    // for people, safe to write to a terminal
-    std::string fCause{}; // what the child logged of it, as safe; empty for nothing
+    std::string fText;    // for the user, safe to write to a terminal
+    std::string fCause{}; // from the child's log, safe to write to a terminal; may be empty
 };
 
-// The text with the device's tag in front and its cause after it.
+// Returns the text with the device's tag before it and its cause after it.
 std::string GetWarningText(const Warning& warning);
 
-// The warnings of the run, then those of each device. Any thread may call.
+// Returns the warnings of the run, then those of each device. Any thread may call.
 std::vector<Warning> GetWarnings(const Answers& answers, const RunOutcome& outcome);
 
 } // namespace assay_host

@@ -1,4 +1,4 @@
-// How the supervised child is started.
+// Makes the launcher of the supervised child.
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -7,8 +7,8 @@
 
 namespace assay_host {
 
-// The launcher of this platform. On Linux its child is in a process group of its own, so that a
-// signal that the child sends to its group doesn't reach this process.
+// Makes the launcher of this platform. On Linux its child is in a process group of its own, so that
+// a signal that the child sends to its group doesn't reach this process. Any thread may call.
 boost::shared_ptr<pmutil::Launcher> MakeChildLauncher();
 
 } // namespace assay_host

@@ -100,7 +100,7 @@ private:
         } catch (const std::exception& exc) {
             NoteStartFailure(exc.what());
             if (fLauncher->HasLaunched())
-                KillDirectly(); // the launch failed behind it
+                KillDirectly(); // the launch failed after the child's start
             fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
             return false;
         }
@@ -121,7 +121,7 @@ private:
             fEvidence.fStartFailure = text;
     }
 
-    // Until the child and its output have ended, or were given up.
+    // Handles events until the child and its output have ended, or were abandoned.
     void Follow()
     {
         while (fEvidence.fStartFailure.empty() && !IsOver()) {
@@ -153,7 +153,7 @@ private:
         return false;
     }
 
-    // How long to wait for the next event: to the next thing that has its time.
+    // Returns how long to wait for the next event: until the next limit or tick.
     milliseconds GetPatience() const
     {
         Seconds patience = fTimes.fTick;
@@ -182,7 +182,7 @@ private:
         }
     }
 
-    // The log goes first, so that a -verbose= of the arguments would count.
+    // Put the option first, so that a later -verbose= of the arguments would replace it.
     std::vector<std::string> GetArgs() const
     {
         std::vector<std::string> args = fOptions.fArgs;
@@ -251,9 +251,9 @@ private:
             Kill(KillReason::kTimeout);
     }
 
-    // A failure of the launcher's own ends the launch, and pmutil has killed the child then; but
-    // not one that comes after the child's end, which may be seen before that end is taken from the
-    // queue. A failure of a pump costs its stream.
+    // A failure of the launcher's thread ends the launch, and pmutil has then killed the child.
+    // This doesn't hold after the child's end, whose event may still be in the queue. A failure of
+    // a pump only ends its stream.
     void LookForFailure()
     {
         try {
@@ -271,7 +271,7 @@ private:
         try {
             fLaunch.Kill();
         } catch (const std::exception&) {
-            // A stored failure of the launch came first, and kept the child alive.
+            // Kill threw a stored failure of the launch, and the child is still alive.
             KillDirectly();
         }
     }
@@ -281,14 +281,14 @@ private:
         try {
             fLauncher->Kill();
         } catch (const std::exception&) {
-            // What can't be killed is left behind, and said to be.
+            // The child is then reported as left behind.
         }
     }
 
     void Finish()
     {
         if (fEvidence.fKillReason == KillReason::kNone && fStop.IsRaised())
-            fEvidence.fKillReason = KillReason::kInterrupt; // which the child has seen first
+            fEvidence.fKillReason = KillReason::kInterrupt; // it reached the child first
         while (const std::optional<Event> event = fQueue->Pop(milliseconds(0)))
             Take(*event);
         fQueue->Close();
@@ -302,7 +302,7 @@ private:
             int exitCode = 0;
             fLaunch.Wait(&exitCode, fEnded ? fTimes.fJoinSeconds : 0.0);
         } catch (const std::exception&) {
-            // How the child ended is known without it.
+            // The launcher has recorded how the child ended.
         }
         fEvidence.fEnd = fLauncher->GetEnd();
         if (!fTreeEnded)
@@ -338,10 +338,10 @@ private:
 
     const Clock::time_point fStart = fTimes.fNow();
     Clock::time_point fLastTick = fStart;
-    // If this process stands still in a pass, as when the system stops it, that time doesn't count:
-    // the threads that bring what is waited for stand still too.
-    Seconds fKillWait{0}; // since the kill
-    Seconds fIdle{0};     // waited for output since the child's end
+    // Waiting times. While this process is stopped they don't grow: the threads that would end the
+    // waits are stopped too.
+    Seconds fKillWait{0}; // for the child's end since the kill
+    Seconds fIdle{0};     // for output since the child's end
     bool fKilled = false;
     bool fEnded = false;
     bool fTreeEnded = false;

@@ -1,4 +1,4 @@
-// One supervised run of the child, from launch to verdict.
+// Runs the child under supervision, from its launch to the verdict.
 #pragma once
 
 #include <string>
@@ -18,15 +18,16 @@ struct ChildOptions {
     std::string fProgram; // its path
     std::vector<std::string> fArgs;
     double fTimeoutSeconds = 60; // 0: no limit
-    // Asks the child for its log by -verbose=1, unless the arguments have a -verbose= of their own,
-    // and takes the causes of failures from it. The lines of that log are no part of the report and
-    // reach no observer.
+    // Requests the child's log with -verbose=1, unless the arguments have a -verbose= option, and
+    // takes the causes of failures from it. The lines of this log aren't part of the report, and
+    // aren't passed to the observer.
     bool fKeepCauses = false;
     ReportReader::Limits fLimits;
 };
 
-// Called while the child runs, on the thread that called RunChild. That thread supervises the
-// child, so no call may block. An exception of a call ends the child and leaves RunChild.
+// Called while the child runs, on the thread that called RunChild. This thread supervises the
+// child, so that no call may block. An exception of a call kills the child and leaves RunChild.
+// `seconds` is the time since the launch.
 class RunObserver {
 public:
     virtual ~RunObserver() = default;
@@ -36,16 +37,15 @@ public:
     virtual void OnTick(double /*seconds*/) {} // about ten times a second
 };
 
-// Launches the child with its standard input closed, waits for its end no longer than the timeout,
-// kills it then, ends what it left behind, and judges. Returns within the timeout plus two seconds,
-// whatever the child does. Never throws for what the child or the system does; that is in the
-// outcome.
+// Launches the child with its standard input closed, waits for its end, kills it after the timeout,
+// kills the processes that it left behind, and derives the verdict. Returns within the timeout plus
+// two seconds. Failures of the child or the system are in the outcome, not thrown.
 //
-// Raising `stop` kills the child at once, with the verdict interrupted; if it was raised before, no
-// child is started.
+// Raising `stop` kills the child at once, with the verdict interrupted; if it is already raised, no
+// child is started. One run at a time in a process.
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop);
 
-// The same with another launcher, used for this run alone, and with other times.
+// The same with another launcher, used only for this run, and with other times.
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
                     const boost::shared_ptr<pmutil::Launcher>& launcher, const RunTimes& times);
 

@@ -1,5 +1,5 @@
-// Brings one stream of the child to the thread that supervises it, whatever that does with the
-// bytes: the function of a pmutil::OutputPump.
+// Passes one stream of the child to the thread that supervises it: the function of a
+// pmutil::OutputPump.
 #pragma once
 
 #include <atomic>
@@ -14,14 +14,15 @@ namespace assay_host {
 
 class StreamFeed {
 public:
-    // Passes on a little more than `maxBytes`, so that the receiver sees that there is more; drops
-    // and counts the rest.
+    // Passes on at most one block more than `maxBytes`, so that the receiver sees that there is
+    // more; drops and counts the rest.
     StreamFeed(pmutil::OutputChannel channel, boost::shared_ptr<EventQueue> queue,
                std::uint64_t maxBytes);
 
-    // A block of the stream, or its end if it is empty. For the thread of the pump.
+    // Takes a block of the stream; an empty one is its end. For the thread of the pump.
     void Take(std::string_view block);
 
+    // Returns the number of bytes dropped so far. Any thread may call.
     std::uint64_t GetDroppedByteCount() const { return fDropped; }
 
 private:

@@ -35,7 +35,7 @@ std::size_t Align(std::size_t size)
     return (size + 3) & ~std::size_t{3};
 }
 
-// In the bytes of one segment of notes.
+// Finds a note in the bytes of one segment.
 std::string FindIn(const std::string& notes, const std::string& owner, std::uint32_t type)
 {
     std::size_t at = 0;

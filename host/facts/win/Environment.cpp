@@ -43,7 +43,7 @@ std::string ReadRevision()
     return "." + std::to_string(revision);
 }
 
-// Not what the version functions claim to programs without a manifest.
+// Returns the real version: the other functions return an older one to programs without a manifest.
 RTL_OSVERSIONINFOW GetKernelVersion()
 {
     RTL_OSVERSIONINFOW version{};
@@ -81,7 +81,7 @@ std::string GetHostName()
                : std::string();
 }
 
-// In minutes from UTC.
+// Returns the offset of the local time from UTC in minutes.
 int GetOffset()
 {
     TIME_ZONE_INFORMATION zone{};
@@ -106,7 +106,7 @@ Environment GetEnvironment(bool identify)
 
     const RTL_OSVERSIONINFOW version = GetKernelVersion();
     std::string product = ReadVersionText(L"ProductName");
-    // Windows 11 names itself 10 there.
+    // The value says "Windows 10" on Windows 11 too.
     constexpr std::string_view kTen = "Windows 10";
     if (version.dwBuildNumber >= kFirstBuildOf11 && product.rfind(kTen, 0) == 0)
         product.replace(0, kTen.size(), "Windows 11");

@@ -13,7 +13,7 @@ namespace {
 
 const std::string kPrefix = "# 00004.2026.11.21_10:49:36.366(+00.000)[tid=462f] ";
 
-// Log lines in brackets, the rest as it is; of a text that arrives in pieces of this size.
+// Filters a text that arrives in pieces of this size. Returns it with its log lines in brackets.
 std::string Filter(std::string_view text, std::size_t size)
 {
     LogFilter filter;

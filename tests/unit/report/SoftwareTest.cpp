@@ -9,8 +9,7 @@
 namespace assay_host {
 namespace {
 
-// What software renderers call themselves: the texts of Mesa, SwiftShader, ANGLE, Windows, PoCL and
-// Oclgrind.
+// The names of software renderers of Mesa, SwiftShader, ANGLE, Windows, PoCL and Oclgrind.
 TEST(Software, IsKnownByItsName)
 {
     for (const char* name :

@@ -10,7 +10,7 @@
 namespace assay_host {
 namespace {
 
-// The answer of the sample's first device after one of its values was replaced.
+// Returns the answer of the sample's first device after replacing one of its values.
 Unknown Judge(const std::string& key, const std::string& value)
 {
     const bool isGL = key.rfind("CL", 0) != 0 && key != "IsIntegratedCLGPU";

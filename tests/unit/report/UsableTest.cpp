@@ -10,7 +10,7 @@
 namespace assay_host {
 namespace {
 
-// "STATE reason device", as compact as a table.
+// Returns "STATE reason device".
 std::string Show(const Usable& usable)
 {
     return std::string(GetUsabilityName(usable.fUsability)) + " " + usable.fReason +
