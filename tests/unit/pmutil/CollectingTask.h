@@ -123,7 +123,7 @@ protected:
              count = reader->ReadSome(block.data(), block.size())) {
             const boost::lock_guard<boost::mutex> lock(fTextMutex);
             fCount += count;
-            if (fText.size() < kMostKept)
+            if (fText.size() < kMaxKept)
                 fText.append(block, 0, count);
         }
         if (const auto app = fApp.lock())
@@ -131,7 +131,7 @@ protected:
     }
 
 private:
-    static constexpr std::size_t kMostKept = 1 << 22;
+    static constexpr std::size_t kMaxKept = 1 << 22;
 
     boost::weak_ptr<StartedApp> fApp;
     boost::mutex fTextMutex;
