@@ -37,10 +37,9 @@ void ResetSignals()
 // Opens closed standard streams, so that no descriptor of a test becomes one.
 void OpenStandardStreams()
 {
-    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) {
+    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream)
         if (::fcntl(stream, F_GETFD) < 0)
             ::open("/dev/null", O_RDWR); // NOLINT: no O_CLOEXEC, as any standard stream
-    }
 }
 
 // If this is the first process of a container, continues in a child. The parent reaps all children,
