@@ -33,7 +33,8 @@ LEFT_OUT = {
 def linux_only():
     program = {f"program/{file.stem}" for file in (TREE / "tests" / "program").glob("test_*.py")
                if file.stem not in COUNTERPARTS}
-    unit = {f"unit/{folder.parent.name}" for folder in (TREE / "tests" / "unit").glob("*/linux")}
+    unit = {f"unit/{file.parents[1].name}"
+            for file in (TREE / "tests" / "unit").glob("*/linux/*Test.cpp")}
     return program | unit
 
 
