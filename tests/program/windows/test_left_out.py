@@ -20,12 +20,14 @@ COUNTERPARTS = {
 LEFT_OUT = {
     "the scripted OpenGL driver is an EGL library": {
         "program/test_bad_drivers", "program/test_failing_gpu", "program/test_fault_sweep",
-        "program/test_last_line"},
+        "program/test_last_line", "program/test_usable"},
     "the peer asks the driver through EGL": {"program/test_opengl_peers"},
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
         "unit/pmutil", "unit/supervise"},
+    "Linux's own files and terminals": {"unit/facts", "unit/output"},
+    "the help is the same text on both": {"program/test_host_help"},
     "the peak memory of a host is measured by getrusage": {"program/test_host_memory"},
 }
 
