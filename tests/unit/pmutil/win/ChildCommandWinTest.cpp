@@ -52,17 +52,6 @@ protected:
     const boost::filesystem::path fDecoy = fFolder.Path() / "My.exe";
 };
 
-TEST_F(Decoy, IsWhatAPathWithoutQuotesStarts)
-{
-    const boost::shared_ptr<Launcher> launcher = MakeLauncher();
-    const LaunchResult ends = launcher->Launch(fProgram.wstring(), {"self"});
-    char block[4096];
-    const auto count = ends.fAppOutput[1]->ReadSome(block, sizeof block);
-    EXPECT_THAT(std::string(block, count), testing::HasSubstr("\\My.exe"));
-    int exitCode = -1;
-    EXPECT_EQ(launcher->Wait(&exitCode), kEndedNormally);
-}
-
 TEST_F(Decoy, IsNeverStarted)
 {
     const std::string program = boost::nowide::narrow(fProgram.wstring());
