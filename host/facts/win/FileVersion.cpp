@@ -1,6 +1,6 @@
 #include "facts/FileVersion.h"
 
-#include <vector>
+#include <cstring>
 
 #include <boost/nowide/convert.hpp>
 #include <fmt/format.h>
@@ -8,21 +8,42 @@
 
 namespace assay_host {
 
+namespace {
+
+// The place of VS_FIXEDFILEINFO in a version resource: after three words and the key
+// "VS_VERSION_INFO", at a multiple of four bytes (the documentation of VS_VERSIONINFO).
+constexpr DWORD kFixedInfoOffset = 40;
+
+bool ReadFixedInfo(HMODULE file, VS_FIXEDFILEINFO& info)
+{
+    const HRSRC resource = ::FindResourceW(file, MAKEINTRESOURCEW(VS_VERSION_INFO),
+                                           MAKEINTRESOURCEW(16)); // RT_VERSION
+    if (resource == nullptr || ::SizeofResource(file, resource) < kFixedInfoOffset + sizeof info)
+        return false;
+    const HGLOBAL loaded = ::LoadResource(file, resource);
+    const void* const data = loaded != nullptr ? ::LockResource(loaded) : nullptr;
+    if (data == nullptr)
+        return false;
+    std::memcpy(&info, static_cast<const char*>(data) + kFixedInfoOffset, sizeof info);
+    return info.dwSignature == 0xFEEF04BD;
+}
+
+} // namespace
+
+// Without version.dll, which could be planted beside the program.
 Fact GetFileVersion(const std::string& path)
 {
-    const std::wstring wide = boost::nowide::widen(path);
-    DWORD unused = 0;
-    const DWORD size = ::GetFileVersionInfoSizeW(wide.c_str(), &unused);
-    std::vector<char> data(size);
-    void* block = nullptr;
-    UINT blockSize = 0;
-    if (size == 0 || !::GetFileVersionInfoW(wide.c_str(), 0, size, data.data()) ||
-        !::VerQueryValueW(data.data(), L"\\", &block, &blockSize) ||
-        blockSize < sizeof(VS_FIXEDFILEINFO))
+    const HMODULE file =
+        ::LoadLibraryExW(boost::nowide::widen(path).c_str(), nullptr,
+                         LOAD_LIBRARY_AS_DATAFILE | LOAD_LIBRARY_AS_IMAGE_RESOURCE);
+    VS_FIXEDFILEINFO info = {};
+    const bool found = file != nullptr && ReadFixedInfo(file, info);
+    if (file != nullptr)
+        ::FreeLibrary(file);
+    if (!found)
         return {{}, "its file has none"};
-    const auto* const info = static_cast<const VS_FIXEDFILEINFO*>(block);
-    return {fmt::format("{}.{}.{}", HIWORD(info->dwFileVersionMS), LOWORD(info->dwFileVersionMS),
-                        HIWORD(info->dwFileVersionLS)),
+    return {fmt::format("{}.{}.{}", HIWORD(info.dwFileVersionMS), LOWORD(info.dwFileVersionMS),
+                        HIWORD(info.dwFileVersionLS)),
             {}};
 }
 
