@@ -53,7 +53,7 @@ TEST(Launch, HangingChildTimesOutAndIsKilled)
     EXPECT_TRUE(ThrowsRuntimeError("ConsoleAppLauncher::Launch: already launched",
                                    [&] { launch.launcher.Launch(); }));
     {
-        const NoShortWait noWait; // the state doesn't change
+        const ShortWait wait(1); // the launch needs some to end its output tasks
         launch.launcher.Kill();
     }
     EXPECT_EQ(launch.launcher.Wait(&exitCode, kLong), State::kKilled);
