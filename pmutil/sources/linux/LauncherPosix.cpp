@@ -206,11 +206,11 @@ LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std:
     argv.push_back(nullptr);
 
     const ChildPipe input;
-    const ChildPipe output;
-    const ChildPipe error;
-    output.Enlarge();
     LogPipe("Stdin", input);
+    const ChildPipe output;
+    output.Enlarge();
     LogPipe("Stdout", output);
+    const ChildPipe error;
     LogPipe("Stderr", error);
     SpawnOptions options;
     options.SetStream(STDIN_FILENO, *input.reader);

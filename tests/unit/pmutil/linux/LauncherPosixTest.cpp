@@ -1,5 +1,6 @@
 #include "pmutil/LauncherPosix.h"
 
+#include <algorithm>
 #include <atomic>
 #include <boost/filesystem/path.hpp>
 #include <boost/thread/thread.hpp>
@@ -18,6 +19,7 @@
 #include <unistd.h>
 
 #include "OpenThings.h"
+#include "RecordingLogger.h"
 #include "TestChild.h"
 #include "Throws.h"
 #include "pmutil/PosixHandle.h"
@@ -333,13 +335,23 @@ TEST(LauncherPosix, HostWithClosedStandardStreamsCanLaunch)
     }
 }
 
+int CountLoggedPipes(const RecordingLogger& recorder)
+{
+    int pipes = 0;
+    for (const std::string& line : recorder.lines)
+        pipes += MessageOf(line).rfind("childStd", 0) == 0 ? 1 : 0;
+    return pipes;
+}
+
 TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
 {
     rlimit before = {};
     ::getrlimit(RLIMIT_NOFILE, &before);
     const long used = CountOpenThings();
+    const DebugValueSetter log("BINIO_LOG", 1);
     int failures = 0;
     for (int room = 0; room < 8; ++room) {
+        const RecordingLogger recorder;
         // Fills the descriptor table except for `room` entries.
         rlimit narrow = before;
         narrow.rlim_cur = 256;
@@ -362,6 +374,7 @@ TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
         ::setrlimit(RLIMIT_NOFILE, &before);
         EXPECT_EQ(CountOpenThings(), used) << "with room for " << room;
         EXPECT_FALSE(HasChildren());
+        EXPECT_EQ(CountLoggedPipes(recorder), std::min(room / 2, 3)) << "with room for " << room;
     }
     EXPECT_GE(failures, 6) << "three pipes need six places";
 }
