@@ -11,10 +11,14 @@
 // backslash.
 #pragma once
 
-#include <atomic>
 #include <cstdint>
+#include <memory>
+
+#include <boost/thread/mutex.hpp>
 
 #include "pmutil/Launcher.h"
+
+struct _PROCESS_INFORMATION;
 
 namespace pmutil {
 
@@ -30,16 +34,21 @@ public:
 
     // Returns the code with which the latest child ended, also after a crash or a kill; 0 before
     // Wait has returned.
-    std::uint32_t GetRawExitCode() const { return fRawExitCode; }
+    std::uint32_t GetRawExitCode() const;
 
     // Returns the command line that Launch uses.
     static std::wstring MakeCommandLine(const std::wstring& program,
                                         const std::deque<std::string>& args);
 
 private:
-    std::atomic<bool> fKilled{false};
-    std::atomic<void*> fProcess{nullptr};
-    std::atomic<std::uint32_t> fRawExitCode{0};
+    void* GetProcess() const; // its handle; null if no child was started
+
+    mutable boost::mutex fMutex; // guards all below
+    bool fKilled = false;
+    // Of the latest child; zero before the first one. Its handles are never closed, so that Kill
+    // is valid at any time.
+    const std::unique_ptr<::_PROCESS_INFORMATION> fProcessInfo;
+    std::uint32_t fRawExitCode = 0;
 };
 
 } // namespace pmutil

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include <boost/make_shared.hpp>
+#include <boost/thread/lock_guard.hpp>
 
 #include "all/BinioLog.h"
 #include "pmutil/WinHandle.h"
@@ -46,6 +47,12 @@ struct ChildPipe {
         writer->Reset(writeEnd, true);
     }
 };
+
+void LogPipe(const char* stream, const ChildPipe& pipe)
+{
+    PM_LOG(gBinioLog, "child" << stream << "Rd=" << pipe.reader->GetHandle() << " child" << stream
+                              << "Wr=" << pipe.writer->GetHandle());
+}
 
 void KeepFromChild(const WinHandle& end)
 {
@@ -87,9 +94,7 @@ private:
 
 } // namespace
 
-LauncherWin::LauncherWin() = default;
-
-// The handles of a process and its thread are never closed, so that Kill is valid at any time.
+LauncherWin::LauncherWin() : fProcessInfo(std::make_unique<PROCESS_INFORMATION>()) {}
 LauncherWin::~LauncherWin() = default;
 
 std::wstring LauncherWin::MakeCommandLine(const std::wstring& program,
@@ -131,30 +136,33 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
     const ChildPipe input;
     KeepFromChild(*input.writer);
     startup.hStdInput = input.reader->GetHandle();
-    PM_LOG(gBinioLog, "childStdinRd=" << input.reader->GetHandle()
-                                      << " childStdinWr=" << input.writer->GetHandle());
+    LogPipe("Stdin", input);
     const ChildPipe output;
     KeepFromChild(*output.reader);
     startup.hStdOutput = output.writer->GetHandle();
-    PM_LOG(gBinioLog, "childStdoutRd=" << output.reader->GetHandle()
-                                       << " childStdoutWr=" << output.writer->GetHandle());
+    LogPipe("Stdout", output);
     const ChildPipe error;
     KeepFromChild(*error.reader);
     startup.hStdError = error.writer->GetHandle();
-    PM_LOG(gBinioLog, "childStderrRd=" << error.reader->GetHandle()
-                                       << " childStderrWr=" << error.writer->GetHandle());
+    LogPipe("Stderr", error);
 
     HandleList inherited(startup);
     extended.lpAttributeList = inherited.Get();
 
-    fKilled = false;
-    fProcess = nullptr;
-    fRawExitCode = 0;
-    PROCESS_INFORMATION process = {};
+    PROCESS_INFORMATION info = {};
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fKilled = false;
+        *fProcessInfo = info;
+        fRawExitCode = 0;
+    }
     if (::CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE,
-                         EXTENDED_STARTUPINFO_PRESENT, nullptr, nullptr, &startup, &process) == 0)
+                         EXTENDED_STARTUPINFO_PRESENT, nullptr, nullptr, &startup, &info) == 0)
         ThrowFailed("CreateProcessW");
-    fProcess = process.hProcess;
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        *fProcessInfo = info;
+    }
 
     LaunchResult result;
     result.fAppInput = input.writer;
@@ -165,12 +173,13 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
 
 WaitResult LauncherWin::Wait(int* exitCode)
 {
-    const HANDLE process = fProcess;
+    const HANDLE process = GetProcess();
     if (::WaitForSingleObject(process, INFINITE) == WAIT_FAILED)
         ThrowFailed("WaitForSingleObject");
     DWORD code = 0;
     if (::GetExitCodeProcess(process, &code) == 0)
         ThrowFailed("GetExitCodeProcess");
+    const boost::lock_guard<boost::mutex> lock(fMutex);
     fRawExitCode = code;
     if (code <= kMaxExitCode) {
         *exitCode = static_cast<int>(code);
@@ -181,9 +190,23 @@ WaitResult LauncherWin::Wait(int* exitCode)
 
 void LauncherWin::Kill()
 {
+    const boost::lock_guard<boost::mutex> lock(fMutex);
     fKilled = true;
-    if (::TerminateProcess(fProcess, kKilledCode) == 0 && ::GetLastError() != ERROR_ACCESS_DENIED)
+    if (::TerminateProcess(fProcessInfo->hProcess, kKilledCode) == 0 &&
+        ::GetLastError() != ERROR_ACCESS_DENIED)
         ThrowFailed("TerminateProcess");
+}
+
+std::uint32_t LauncherWin::GetRawExitCode() const
+{
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    return fRawExitCode;
+}
+
+void* LauncherWin::GetProcess() const
+{
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    return fProcessInfo->hProcess;
 }
 
 boost::shared_ptr<Launcher> MakeLauncher()
@@ -194,11 +217,11 @@ boost::shared_ptr<Launcher> MakeLauncher()
 std::string GetTerminationText(const Launcher& launcher)
 {
     const auto* const own = dynamic_cast<const LauncherWin*>(&launcher);
-    if (own == nullptr || own->GetRawExitCode() <= kMaxExitCode)
+    const std::uint32_t code = own != nullptr ? own->GetRawExitCode() : 0;
+    if (code <= kMaxExitCode)
         return {};
     std::ostringstream text;
-    text << "code 0x" << std::hex << std::uppercase << std::setw(8) << std::setfill('0')
-         << own->GetRawExitCode();
+    text << "code 0x" << std::hex << std::uppercase << std::setw(8) << std::setfill('0') << code;
     return text.str();
 }
 

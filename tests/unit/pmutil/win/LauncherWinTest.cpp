@@ -9,10 +9,13 @@
 #include <boost/filesystem/operations.hpp>
 
 #include "OpenThings.h"
+#include "RecordingLogger.h"
+#include "ReplacedImport.h"
 #include "TempFolder.h"
 #include "TestChild.h"
 #include "Throws.h"
 #include "pmutil/WinHandle.h"
+#include "support/Waits.h"
 
 using namespace pmutil;
 using testing::ElementsAre;
@@ -197,6 +200,53 @@ TEST(LauncherWin, ParentKeepsItsEndsToItself)
     ends.fAppInput->Close();
     int exitCode = -1;
     EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally);
+}
+
+int gCallsBeforeFailure = 0;
+
+BOOL WINAPI CreateSomePipes(HANDLE* reader, HANDLE* writer, SECURITY_ATTRIBUTES* attributes,
+                            DWORD size)
+{
+    static const auto call = reinterpret_cast<decltype(&::CreatePipe)>(
+        ::GetProcAddress(::GetModuleHandleW(L"kernel32.dll"), "CreatePipe"));
+    return gCallsBeforeFailure-- > 0 ? call(reader, writer, attributes, size) : FALSE;
+}
+
+BOOL WINAPI SetSomeInformation(HANDLE handle, DWORD mask, DWORD flags)
+{
+    static const auto call = reinterpret_cast<decltype(&::SetHandleInformation)>(
+        ::GetProcAddress(::GetModuleHandleW(L"kernel32.dll"), "SetHandleInformation"));
+    return gCallsBeforeFailure-- > 0 ? call(handle, mask, flags) : FALSE;
+}
+
+// Fails `text` at each of the three pipes.
+void ExpectFailureAtEachPipe(const std::string& text)
+{
+    const DebugValueSetter log("BINIO_LOG", 1);
+    for (int pipes = 0; pipes < 3; ++pipes) {
+        const long before = CountOpenThings();
+        const RecordingLogger recorder;
+        LauncherWin launcher;
+        gCallsBeforeFailure = pipes;
+        EXPECT_TRUE(ThrowsRuntimeError(text, [&] { launcher.Launch(TEST_CHILD, {}); }));
+        EXPECT_EQ(CountOpenThings(), before);
+        int logged = 0;
+        for (const std::string& line : recorder.lines)
+            logged += MessageOf(line).rfind("childStd", 0) == 0 ? 1 : 0;
+        EXPECT_EQ(logged, pipes);
+    }
+}
+
+TEST(LauncherWin, FailedPipeClosesTheEndsMadeSoFar)
+{
+    const ReplacedImport replaced(__imp_CreatePipe, &CreateSomePipes);
+    ExpectFailureAtEachPipe("CreatePipe failed");
+}
+
+TEST(LauncherWin, EndThatStaysInheritableFailsTheStart)
+{
+    const ReplacedImport replaced(__imp_SetHandleInformation, &SetSomeInformation);
+    ExpectFailureAtEachPipe("SetHandleInformation failed");
 }
 
 TEST(LauncherWin, ChildInheritsItsPipesOnly)

@@ -8,6 +8,8 @@ extern "C" {
 extern decltype(&::WriteFile) __imp_WriteFile;
 extern decltype(&::ReadFile) __imp_ReadFile;
 extern decltype(&::OutputDebugStringA) __imp_OutputDebugStringA;
+extern decltype(&::CreatePipe) __imp_CreatePipe;
+extern decltype(&::SetHandleInformation) __imp_SetHandleInformation;
 }
 
 namespace pmutil {
