@@ -1,5 +1,11 @@
 #include "all/LogPrefix.h"
 
+#include <charconv>
+#include <cmath>
+#include <iterator>
+#include <limits>
+#include <utility>
+
 #include <gtest/gtest.h>
 
 namespace pmutil {
@@ -40,15 +46,54 @@ TEST(LogPrefixTest, TellsTheDeltaInSecondsRoundedToMilliseconds)
         double delta;
         const char* text;
     } kCases[] = {
-        {0, "(+00.000)"},       {0.0004, "(+00.000)"},
-        {0.0006, "(+00.001)"},  {1.5, "(+01.500)"},
-        {59.9996, "(+60.000)"}, {123.4567, "(+123.457)"},
-        {-0.25, "(+-0.250)"},   {-12.5, "(+-12.500)"},
-        {0.0625, "(+00.062)"},  {86400.125, "(+86400.125)"},
+        {0, "(+00.000)"},        {0.0004, "(+00.000)"},
+        {0.0006, "(+00.001)"},   {1.5, "(+01.500)"},
+        {59.9996, "(+60.000)"},  {123.4567, "(+123.457)"},
+        {-0.25, "(+-0.250)"},    {-12.5, "(+-12.500)"},
+        {0.0625, "(+00.062)"},   {86400.125, "(+86400.125)"},
+        {0.1875, "(+00.188)"},   {98.9994, "(+98.999)"},
+        {99.9996, "(+100.000)"},
     };
     for (const auto& test : kCases)
         EXPECT_EQ(MakeLogPrefix(0, 0, test.delta, "t").substr(29),
                   std::string(test.text) + "[tid=t] ");
+}
+
+// Returns "%06.3f" of a number that isn't negative. Not by printf, which on Windows rounds exact
+// halves up.
+std::string WithThreeDecimals(double number)
+{
+    char digits[400];
+    const auto end =
+        std::to_chars(std::begin(digits), std::end(digits), number, std::chars_format::fixed, 3)
+            .ptr;
+    const std::string text(digits, end);
+    return std::string(text.size() < 6 ? 6 - text.size() : 0, '0') + text;
+}
+
+// Near a half the exact value of the delta decides, not its product with 1000.
+TEST(LogPrefixTest, RoundsTheExactDelta)
+{
+    const double infinity = std::numeric_limits<double>::infinity();
+    for (const double whole : {0.0, 1.0, 41.0, 98.0, 99.0, 1000.0}) {
+        for (int thousandth = 0; thousandth < 1000; ++thousandth) {
+            const double half = whole + (thousandth + 0.5) / 1000;
+            for (const double delta :
+                 {half, std::nextafter(half, -infinity), std::nextafter(half, infinity)})
+                ASSERT_EQ(MakeLogPrefix(0, 0, delta, "t"), "00000.1970.01.01_00:00:00.000(+" +
+                                                               WithThreeDecimals(delta) +
+                                                               ")[tid=t] ");
+        }
+    }
+}
+
+TEST(LogPrefixTest, LongestDeltaFits)
+{
+    const double delta = std::numeric_limits<double>::max();
+    const std::string text = WithThreeDecimals(delta);
+    for (const auto& [signedDelta, sign] : {std::pair{delta, ""}, {-delta, "-"}})
+        EXPECT_EQ(MakeLogPrefix(0, 0, signedDelta, "t"),
+                  "00000.1970.01.01_00:00:00.000(+" + (sign + text) + ")[tid=t] ");
 }
 
 TEST(LogPrefixTest, LineNumberHasAtLeastFiveDigits)
