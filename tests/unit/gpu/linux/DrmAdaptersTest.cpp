@@ -132,6 +132,33 @@ TEST(DrmAdaptersTest, TheDriverIsThatBelowTheTransportIfItHasTheNodes)
     EXPECT_EQ(OnlyAdapter().driver, "virtio_gpu");
 }
 
+// Other devices on the same transport don't count, and of those with nodes the one that renders.
+TEST(DrmAdaptersTest, TheDriverIsThatOfTheDeviceThatRenders)
+{
+    namespace fs = std::filesystem;
+    const AdapterTree tree("virtio-gpu");
+    const std::string folder = tree.root() + "/sys/devices/pci0000:00/0000:00:01.0/virtio";
+    const auto add = [&](const std::string& number, const std::string& driver) {
+        fs::create_directories(folder + number);
+        fs::create_symlink("/sys/bus/virtio/drivers/" + driver, folder + number + "/driver");
+    };
+    const auto move = [&](const std::string& node, const std::string& number) {
+        const std::string link = tree.root() + "/sys/class/drm/" + node;
+        fs::remove(link);
+        fs::create_symlink("../../devices/pci0000:00/0000:00:01.0/virtio" + number + "/drm/" + node,
+                           link);
+    };
+    add("1", "shows");
+    add("2", "renders");
+    move("card0", "1");
+    move("renderD128", "2");
+    tree.refresh();
+    EXPECT_EQ(OnlyAdapter().driver, "renders");
+    fs::remove(tree.root() + "/sys/class/drm/renderD128");
+    tree.refresh();
+    EXPECT_EQ(OnlyAdapter().driver, "shows");
+}
+
 TEST(DrmAdaptersTest, AFirmwareFramebuffersDriverIsIgnored)
 {
     for (const char* name : {"nvidia-firmware", "nvidia-firmware-drm"}) {
