@@ -124,6 +124,23 @@ TEST(StepRules, TakeTheStepOfASilentCudaVersion)
     EXPECT_THAT(prediction.fErrors, ElementsAre("exception: Programmed throw"));
 }
 
+TEST(StepRules, TakeASilentCudaVersionForPassedBeforeAFailure)
+{
+    std::vector<std::string> lines;
+    for (const std::string& line : Join(MakeWholeRun(0, 1)))
+        if (line.find("CLBandwidth") == std::string::npos &&
+            line.find("CLCompute") == std::string::npos)
+            lines.push_back(line);
+    const StepRules rules(ReadReport(lines), MakeOutcome(2, {"exception: x"}));
+    EXPECT_EQ(rules.GetStepCount(), 10U + 10);
+    EXPECT_EQ(GetTexts(rules.Predict(StepFailure::kCrash, rules.GetStepCount())), lines);
+
+    // The step of CUDAVersion is the last one of the device: its failure is the only one then.
+    const Prediction silent = rules.Predict(StepFailure::kThrow, 8 + 9);
+    EXPECT_EQ(GetTexts(silent), lines);
+    EXPECT_THAT(silent.fErrors, ElementsAre("exception: Programmed throw"));
+}
+
 TEST(StepRules, KeepTheOutputOfOptionsBeforeTheReport)
 {
     std::vector<std::string> lines = Join(MakeWholeRun(0, -1));
