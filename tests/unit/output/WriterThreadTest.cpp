@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <condition_variable>
+#include <future>
 #include <mutex>
 #include <stdexcept>
 #include <thread>
@@ -51,6 +52,7 @@ struct Reader {
 
     std::atomic<bool> fFinished{false};
     std::atomic<bool> fAbandoned{false};
+    std::promise<void> fGone; // the output is destroyed
 
 private:
     void SetReads(bool reads)
@@ -79,6 +81,7 @@ public:
     }
     void Finish() override { fReader->fFinished = true; }
     void Abandon() override { fReader->fAbandoned = true; }
+    ~TestOutput() override { fReader->fGone.set_value(); }
 
 private:
     const std::shared_ptr<Reader> fReader;
@@ -129,6 +132,18 @@ TEST_F(WriterThreadTest, GivesUpAReaderThatDoesNotRead)
     fWriter.Abandon();
     EXPECT_TRUE(fReader->fAbandoned);
     EXPECT_FALSE(fReader->fFinished);
+}
+
+// The thread holds the output, and waits for the next text when its owner goes.
+TEST(WriterThreadEndTest, EndsAndLetsGoOfTheOutputWhenItIsAbandoned)
+{
+    const auto reader = std::make_shared<Reader>();
+    auto writer = std::make_unique<WriterThread>(std::make_unique<TestOutput>(reader), [] {});
+    writer->Write("one");
+    reader->AwaitAsked(1);
+    writer.reset();
+    reader->fGone.get_future().wait();
+    EXPECT_TRUE(reader->fAbandoned);
 }
 
 TEST_F(WriterThreadTest, MakesATextJustBeforeItIsWritten)
