@@ -202,21 +202,19 @@ TEST(LauncherWin, ParentKeepsItsEndsToItself)
     EXPECT_EQ(launcher.Wait(&exitCode), kEndedNormally);
 }
 
+const auto gCreatePipe = __imp_CreatePipe;
+const auto gSetHandleInformation = __imp_SetHandleInformation;
 int gCallsBeforeFailure = 0;
 
 BOOL WINAPI CreateSomePipes(HANDLE* reader, HANDLE* writer, SECURITY_ATTRIBUTES* attributes,
                             DWORD size)
 {
-    static const auto call = reinterpret_cast<decltype(&::CreatePipe)>(
-        ::GetProcAddress(::GetModuleHandleW(L"kernel32.dll"), "CreatePipe"));
-    return gCallsBeforeFailure-- > 0 ? call(reader, writer, attributes, size) : FALSE;
+    return gCallsBeforeFailure-- > 0 ? gCreatePipe(reader, writer, attributes, size) : FALSE;
 }
 
 BOOL WINAPI SetSomeInformation(HANDLE handle, DWORD mask, DWORD flags)
 {
-    static const auto call = reinterpret_cast<decltype(&::SetHandleInformation)>(
-        ::GetProcAddress(::GetModuleHandleW(L"kernel32.dll"), "SetHandleInformation"));
-    return gCallsBeforeFailure-- > 0 ? call(handle, mask, flags) : FALSE;
+    return gCallsBeforeFailure-- > 0 ? gSetHandleInformation(handle, mask, flags) : FALSE;
 }
 
 // Fails `text` at each of the three pipes.
