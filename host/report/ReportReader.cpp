@@ -9,23 +9,25 @@ namespace assay_host {
 
 std::vector<ReportLine> ReportReader::Feed(std::string_view bytes)
 {
-    const std::uint64_t room = fLimits.fMaxBytes - std::min(fLimits.fMaxBytes, fBytes);
     fBytes += bytes.size();
-    std::string_view taken = bytes.substr(0, std::min<std::uint64_t>(room, bytes.size()));
-    const std::size_t refused = bytes.size() - taken.size();
     Lines lines;
-    while (!taken.empty() && fLineCount < fLimits.fMaxLines) {
-        const std::size_t end = taken.find('\n');
-        Append(taken.substr(0, end));
-        if (end == std::string_view::npos) {
-            taken = {};
-        } else {
-            EndLine(fCarriageReturn ? "\r\n" : "\n", lines);
-            taken.remove_prefix(end + 1);
-        }
+    while (!bytes.empty() && fLineCount < fLimits.fMaxLines && GetRoom() > 0) {
+        const std::string_view piece = bytes.substr(0, bytes.find('\n'));
+        const std::size_t taken = GetTakenSize(piece.size());
+        Append(piece.substr(0, taken));
+        bytes.remove_prefix(taken);
+        if (taken < piece.size() || bytes.empty())
+            continue;
+        const std::string lineEnd = fCarriageReturn ? "\r\n" : "\n";
+        const std::uint64_t kept = fKept + lineEnd.size();
+        fKept = std::min(kept, fLimits.fMaxBytes);
+        if (kept > fLimits.fMaxBytes)
+            break; // the report is full
+        bytes.remove_prefix(1);
+        EndLine(lineEnd, lines);
     }
-    fLost += taken.size() + refused;
-    if (refused > 0 && (!fText.empty() || fCarriageReturn))
+    fLost += bytes.size();
+    if (!bytes.empty() && (!fText.empty() || fCarriageReturn))
         fCut = true;
     return lines;
 }
@@ -40,6 +42,28 @@ std::vector<ReportLine> ReportReader::Finish()
         EndLine("", lines);
     ReleaseOpenQuote(lines);
     return lines;
+}
+
+// Returns the room in the current line.
+std::size_t ReportReader::GetLineRoom() const
+{
+    const std::size_t room = fLimits.fMaxLineBytes - fText.size();
+    return fCarriageReturn && room > 0 ? room - 1 : room;
+}
+
+// Returns the room in the report.
+std::uint64_t ReportReader::GetRoom() const
+{
+    const bool keepsCarriageReturn = fCarriageReturn && fText.size() < fLimits.fMaxLineBytes;
+    return fLimits.fMaxBytes - std::min(fLimits.fMaxBytes, fKept + (keepsCarriageReturn ? 1 : 0));
+}
+
+// How many of `size` further bytes of the current line are taken: all, unless the report is full
+// before the line is.
+std::size_t ReportReader::GetTakenSize(std::size_t size) const
+{
+    const std::uint64_t room = GetRoom();
+    return size <= room || GetLineRoom() < room ? size : static_cast<std::size_t>(room);
 }
 
 void ReportReader::Append(std::string_view piece)
@@ -57,7 +81,9 @@ void ReportReader::Append(std::string_view piece)
 void ReportReader::Hold(std::string_view piece)
 {
     const std::size_t room = fLimits.fMaxLineBytes - fText.size();
-    fText += piece.substr(0, room);
+    const std::string_view kept = piece.substr(0, room);
+    fText += kept;
+    fKept += kept.size();
     if (piece.size() > room) {
         fLost += piece.size() - room;
         fCut = true;

@@ -24,8 +24,9 @@ public:
     // each kind has 17928 lines.
     struct Limits {
         std::size_t fMaxLineBytes = std::size_t{1} << 16; // without the line end
-        std::uint64_t fMaxBytes = std::uint64_t{4} << 20;
-        std::size_t fMaxLines = std::size_t{24} << 10; // bounds the memory that short lines cost
+        std::uint64_t fMaxBytes = std::uint64_t{4} << 20; // of the whole report, without what is
+                                                          // cut from long lines
+        std::size_t fMaxLines = std::size_t{24} << 10;    // bounds the memory that short lines cost
     };
 
     ReportReader() = default;
@@ -46,6 +47,9 @@ public:
 private:
     using Lines = std::vector<ReportLine>;
 
+    std::size_t GetLineRoom() const;
+    std::uint64_t GetRoom() const;
+    std::size_t GetTakenSize(std::size_t size) const;
     void Append(std::string_view piece);
     void Hold(std::string_view piece);
     void EndLine(const std::string& lineEnd, Lines& lines);
@@ -60,6 +64,7 @@ private:
     Limits fLimits;
     std::uint64_t fBytes = 0;
     std::uint64_t fLost = 0;
+    std::uint64_t fKept = 0; // without a carriage return that is kept out of fText
     std::size_t fLineCount = 0;
 
     // The current line. A carriage return is kept out of it until the next byte is known.

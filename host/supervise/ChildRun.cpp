@@ -30,6 +30,10 @@ using Clock = RunTimes::Clock;
 using Seconds = RunTimes::Seconds;
 using std::chrono::milliseconds;
 
+// The part of the child's output that is parsed. It bounds the processor time; fLimits bounds the
+// memory: an added log and the rests of cut lines aren't kept.
+constexpr std::uint64_t kMaxOutputBytes = std::uint64_t{64} << 20;
+
 boost::shared_ptr<pmutil::OutputTask> MakePump(const boost::shared_ptr<StreamFeed>& feed)
 {
     return boost::make_shared<pmutil::OutputPump>(
@@ -321,8 +325,8 @@ private:
     pmutil::StopRequest& fStop;
     const boost::shared_ptr<EventQueue> fQueue = boost::make_shared<EventQueue>();
     const boost::shared_ptr<pmutil::TrackingLauncher> fLauncher;
-    const boost::shared_ptr<StreamFeed> fOut = boost::make_shared<StreamFeed>(
-        pmutil::OutputChannel::kStdout, fQueue, fOptions.fLimits.fMaxBytes);
+    const boost::shared_ptr<StreamFeed> fOut =
+        boost::make_shared<StreamFeed>(pmutil::OutputChannel::kStdout, fQueue, kMaxOutputBytes);
     const boost::shared_ptr<StreamFeed> fErr = boost::make_shared<StreamFeed>(
         pmutil::OutputChannel::kStderr, fQueue, ErrorLines::kMaxBytes);
     const pmutil::StopListener fListener{fStop, [queue = fQueue] { queue->Wake(); }};

@@ -117,6 +117,23 @@ def test_flood(tmp_path, line, form, size):
     assert outcome["lostOutputBytes"] > 0.9 * size
 
 
+def test_a_long_log_costs_no_line_of_the_report(tmp_path):
+    """The log that the host asks for is not part of the report, and doesn't count to its limit."""
+    (tmp_path / "log").write_text(8 * (
+        "# 00004.2026.11.21_10:49:36.366(+00.000)[tid=462f] " + MEBIBYTE * "x" + "\n"))
+    run = run_child(script_child(tmp_path, f"cat {tmp_path}/log; {REPORT}"), timeout=20)
+    assert verdict_of(run) == "complete"
+    assert run.document()["outcome"]["lostOutputBytes"] == 0
+
+
+def test_long_lines_cost_no_other_line(tmp_path):
+    """What is cut from a line doesn't count to the limit of the report."""
+    (tmp_path / "lines").write_text(8 * ("#" + MEBIBYTE * "x" + "\n"))
+    run = run_child(script_child(tmp_path, f"cat {tmp_path}/lines; {REPORT}"), timeout=20)
+    assert verdict_of(run) == "complete"
+    assert run.document()["outcome"]["lostOutputBytes"] == 8 * (MEBIBYTE + 1 - 65536)
+
+
 def test_flood_on_standard_error(tmp_path):
     child = script_child(tmp_path, f"{REPORT}; yes words | head -c 500000000 >&2")
     run = run_child(child, timeout=30)

@@ -292,6 +292,39 @@ TEST(ReportReader, DropsBytesBeyondTheLimit)
               (Lines{Raw("a=\"1"), Cut(Raw("\r", ""))}));
 }
 
+TEST(ReportReader, DoesNotCountWhatIsCutFromALine)
+{
+    ReportReader::Limits limits;
+    limits.fMaxLineBytes = 4;
+    limits.fMaxBytes = 10;
+    EXPECT_EQ(ReadWithLimits("a=12345678\nb=1\nc\n", limits, 7),
+              (Lines{Cut(Plain("a=12", "\n", "a", "12")), Plain("b=1", "\n", "b", "1"),
+                     Cut(Raw("c", ""))}));
+    EXPECT_EQ(ReadWithLimits("a=12345678\nb=12345678", limits, 12),
+              (Lines{Cut(Plain("a=12", "\n", "a", "12")), Cut(Plain("b=12", "", "b", "12"))}));
+    EXPECT_EQ(ReadWithLimits("12345678\n1\r2345\n", limits, 6),
+              (Lines{Cut(Raw("1234")), Cut(Raw("1\r23"))}));
+}
+
+TEST(ReportReader, ReadsTheSameInPiecesAtEveryLimit)
+{
+    const std::string text = "a=\"12\r\r3\"\r\n\r\n1234\r5\n1234\r\n\n\rx\n";
+    for (std::size_t lineBytes = 0; lineBytes < 8; ++lineBytes)
+        for (std::uint64_t bytes = 0; bytes <= text.size(); ++bytes) {
+            ReportReader::Limits limits;
+            limits.fMaxLineBytes = lineBytes;
+            limits.fMaxBytes = bytes;
+            ReportReader reader(limits);
+            std::size_t size = 0;
+            for (const Lines& lines : {reader.Feed(text), reader.Finish()})
+                for (const ReportLine& line : lines)
+                    size += line.fText.size() + line.fLineEnd.size();
+            EXPECT_LE(size, bytes);
+            EXPECT_EQ(size + reader.GetLostByteCount(), text.size());
+            ReadWithLimits(text, limits, reader.GetLostByteCount());
+        }
+}
+
 TEST(ReportReader, DropsLinesBeyondTheLimit)
 {
     ReportReader::Limits limits;
