@@ -96,6 +96,7 @@ class Sweep:
             # An exception through the loader leaves its directory open, and the loader allocates as
             # much memory as the driver claims to need.
             environment["ASAN_OPTIONS"] += ":detect_leaks=0:allocator_may_return_null=1"
+            environment["TSAN_OPTIONS"] += ":allocator_may_return_null=1"
         return Watched(*arguments, program=program, environment=environment, stdout=out, stderr=err)
 
     def _wait_until_called(self, pair, record, process):

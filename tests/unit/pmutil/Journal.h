@@ -49,9 +49,13 @@ public:
 
     // Called for each line, on its thread and with the log mutex held as often as kLogLocks says.
     static constexpr int kLogLocks = 2;
-    std::function<void(const std::string& line)> fOnLine;
+    void SetOnLine(std::function<void(const std::string& line)> onLine)
+    {
+        const boost::lock_guard<boost::recursive_mutex> lock(GetLogMutex());
+        fOnLine = std::move(onLine);
+    }
 
-    // For fOnLine: other threads may log during the call.
+    // For the function of SetOnLine: other threads may log during the call.
     template <typename Call>
     static void WithoutLogMutex(Call call)
     {
@@ -121,6 +125,7 @@ private:
     std::map<boost::thread::id, std::string> fParties;
     std::map<std::string, Entries> fEntries;
     std::map<std::string, std::size_t> fTaken;
+    std::function<void(const std::string& line)> fOnLine; // under the log mutex
 };
 
 } // namespace pmutil

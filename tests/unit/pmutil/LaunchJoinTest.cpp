@@ -54,7 +54,7 @@ TEST_F(LaunchJoin, OneOfTwoWaitsGivesTheThreadUpAndTheOtherKeepsTheCode)
     boost::thread other;
     // The first wait is blocked where it abandons the thread; the other one proceeds as far as
     // possible.
-    fJournal.fOnLine = [&](const std::string& line) {
+    fJournal.SetOnLine([&](const std::string& line) {
         if (line != kGivesUp || other.joinable())
             return;
         other = boost::thread([&] {
@@ -63,7 +63,7 @@ TEST_F(LaunchJoin, OneOfTwoWaitsGivesTheThreadUpAndTheOtherKeepsTheCode)
         });
         fJournal.AwaitWithoutLogMutex("other", kJoins);
         fJournal.WithoutLogMutex(LetOthersRun);
-    };
+    });
     EXPECT_EQ(fApp->Wait(nullptr, 0.0), State::kTimeout);
     other.join();
     const Journal::Entries first = fJournal.Take("Client");

@@ -550,10 +550,10 @@ TEST_F(LaunchJournal, OfATaskThatEndsBeforeAnybodyLooks)
     fHolds["launcher.Launch"] = {{"Client", "ConsoleApp::GetStateLocked timeout", 1}};
     fHolds.erase("begin stdout");
     fHolds.erase("DoRun stdout");
-    fJournal.fOnLine = [this](const std::string& line) {
+    fJournal.SetOnLine([this](const std::string& line) {
         if (line.rfind("LaunchThreadTask OutputThreadTask spawned, use_count[stdout]", 0) == 0)
             fJournal.AwaitWithoutLogMutex("stdout", "end stdout");
-    };
+    });
     const NoShortWait noWait;
     Launch();
     fJournal.Await("Launcher", "NotifyFailureLocked: exc=");

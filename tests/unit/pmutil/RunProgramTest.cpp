@@ -300,19 +300,22 @@ TEST_F(RunProgramTest, AProgramThatCannotBeKilledIsLeftBehind)
 // An output that somebody else holds open when it has brought what the child wrote.
 class HeldChannel : public FakeChannel {
 public:
-    explicit HeldChannel(Gate& gate) : fGate(gate) { fPieces = {"begun"}; }
+    explicit HeldChannel(boost::shared_ptr<Gate> gate) : fGate(std::move(gate))
+    {
+        fPieces = {"begun"};
+    }
     ~HeldChannel() override = default;
 
 protected:
     std::uint64_t BinioReadSome(void* bytes, std::uint64_t nbytes) override
     {
         if (fPieces.empty())
-            fGate.Await();
+            fGate->Await();
         return FakeChannel::BinioReadSome(bytes, nbytes);
     }
 
 private:
-    Gate& fGate;
+    const boost::shared_ptr<Gate> fGate;
 };
 
 // Its child ends when its output was taken, which goes on. From then on no short wait lasts.
@@ -335,7 +338,7 @@ public:
     }
 
     Gate fTaken;
-    Gate fOutputEnd;
+    const boost::shared_ptr<Gate> fOutputEnd = boost::make_shared<Gate>();
 
 private:
     std::optional<NoShortWait> fNoShortWait;
@@ -363,7 +366,7 @@ TEST_F(RunProgramTest, TheCodeOutlivesAnOutputThatIsHeldOpen)
     EXPECT_EQ(run.fExitCode, 7);
     EXPECT_TRUE(run.fIsOutputOpen);
     EXPECT_EQ(output, "begun");
-    held.fOutputEnd.Open();
+    held.fOutputEnd->Open();
     threadsEnd.reset();
     EXPECT_EQ(calls, 2) << "no call comes after the return";
 }
