@@ -28,6 +28,10 @@ struct DrmNode {
 // driver (vgem, vkms, the compute partitions of amdgpu) are left out: they aren't hardware.
 std::vector<DrmNode> DrmNodes();
 
+// Returns the nodes that were present when QGF::DisplayAdapters (qgf/AdapterName.h) listed the
+// adapters.
+const std::vector<DrmNode>& DisplayNodes();
+
 // Returns the place of the adapter of a DRM node file such as "/dev/dri/card0"; empty if the kernel
 // has no such node or the node belongs to no adapter.
 std::string AdapterOfDrmNode(const std::string& file);

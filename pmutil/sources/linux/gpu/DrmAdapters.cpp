@@ -46,8 +46,8 @@ using Nodes = std::vector<QGF::DrmNode>;
 std::map<std::string, Nodes> NodesByPlace()
 {
     std::map<std::string, Nodes> nodes;
-    for (QGF::DrmNode& node : QGF::DrmNodes())
-        nodes[node.place].push_back(std::move(node));
+    for (const QGF::DrmNode& node : QGF::DisplayNodes())
+        nodes[node.place].push_back(node);
     return nodes;
 }
 
@@ -163,22 +163,42 @@ std::string GraphicsDriver(const std::string& device)
     return driver;
 }
 
-void ReadDriver(const std::string& folder, const Nodes& nodes, DrmAdapter& adapter)
+struct DriverRelease {
+    std::string version;
+    std::string date;
+};
+
+DriverRelease ReadRelease(const std::string& driver)
+{
+    DriverRelease release;
+    release.version = QGF::ReadSystemLine("/sys/module/" + driver + "/version");
+    if (driver == "nvidia") {
+        std::string text;
+        QGF::ReadSystemFile("/proc/driver/nvidia/version", text);
+        const NvidiaVersion nvidia = ParseNvidiaVersion(text);
+        if (release.version.empty())
+            release.version = nvidia.version;
+        release.date = nvidia.date;
+    }
+    if (release.version.empty())
+        release.version = QGF::ReadSystemLine("/proc/sys/kernel/osrelease");
+    return release;
+}
+
+// The releases by driver, each read once for all cards of the driver.
+using DriverReleases = std::map<std::string, DriverRelease>;
+
+void ReadDriver(const std::string& folder, const Nodes& nodes, DriverReleases& releases,
+                DrmAdapter& adapter)
 {
     adapter.driver = GraphicsDriver(DeviceOfNodes(folder, adapter.place, nodes));
     if (adapter.driver.empty())
         return;
-    adapter.driverVersion = QGF::ReadSystemLine("/sys/module/" + adapter.driver + "/version");
-    if (adapter.driver == "nvidia") {
-        std::string text;
-        QGF::ReadSystemFile("/proc/driver/nvidia/version", text);
-        const NvidiaVersion nvidia = ParseNvidiaVersion(text);
-        if (adapter.driverVersion.empty())
-            adapter.driverVersion = nvidia.version;
-        adapter.driverDate = nvidia.date;
-    }
-    if (adapter.driverVersion.empty())
-        adapter.driverVersion = QGF::ReadSystemLine("/proc/sys/kernel/osrelease");
+    const auto [release, isNew] = releases.try_emplace(adapter.driver);
+    if (isNew)
+        release->second = ReadRelease(adapter.driver);
+    adapter.driverVersion = release->second.version;
+    adapter.driverDate = release->second.date;
 }
 
 // Returns false if the connector was removed after it was listed.
@@ -228,6 +248,7 @@ std::vector<DrmAdapter> ReadDrmAdapters()
     const std::map<std::string, Nodes> nodesByPlace = NodesByPlace();
     const std::vector<std::string> classNames = QGF::ListSystemFolder(kDrmClass);
     const std::vector<std::string> nvidiaCards = QGF::ListSystemFolder("/proc/driver/nvidia/gpus");
+    DriverReleases releases;
     for (const std::string& place : QGF::DisplayAdapters()) {
         const std::string folder = QGF::AdapterFolder(place);
         const auto found = nodesByPlace.find(place);
@@ -236,7 +257,7 @@ std::vector<DrmAdapter> ReadDrmAdapters()
         adapter.place = place;
         adapter.name = QGF::AdapterName(place);
         ReadIds(folder, adapter);
-        ReadDriver(folder, nodes, adapter);
+        ReadDriver(folder, nodes, releases, adapter);
         ReadMemory(folder, nodes, adapter);
         ReadConnectors(classNames, nodes, adapter);
         ReadRenderer(nodes, nvidiaCards, adapter);

@@ -29,6 +29,11 @@ bool IsVersion(const std::string& word)
 // The words "Aug 19 01:15:15 UTC 2023" from index `first` on.
 std::string DateAt(const std::vector<std::string>& words, std::size_t first)
 {
+    const auto zone = std::find_if(std::begin(kZones), std::end(kZones), [&](const Zone& known) {
+        return words[first + 3] == known.name;
+    });
+    if (zone == std::end(kZones))
+        return {};
     std::istringstream in(words[first] + ' ' + words[first + 1] + ' ' + words[first + 2] + ' ' +
                           words[first + 4]);
     in.imbue(std::locale::classic());
@@ -36,11 +41,6 @@ std::string DateAt(const std::vector<std::string>& words, std::size_t first)
     in >> std::get_time(&date, "%b %d %H:%M:%S %Y");
     const bool complete = in && in.peek() == std::istringstream::traits_type::eof();
     if (!complete || date.tm_year < kMinYear - 1900)
-        return {};
-    const auto zone = std::find_if(std::begin(kZones), std::end(kZones), [&](const Zone& known) {
-        return words[first + 3] == known.name;
-    });
-    if (zone == std::end(kZones))
         return {};
     std::ostringstream out;
     out.imbue(std::locale::classic());

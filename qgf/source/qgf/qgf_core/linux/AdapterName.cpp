@@ -32,6 +32,7 @@ constexpr std::size_t kMaxNameLength = 127 - 19;
 
 struct Adapters {
     unsigned rootCount = 0;
+    std::vector<DrmNode> nodes;
     std::vector<std::string> places;
     std::map<std::string, std::string> names;
 };
@@ -57,11 +58,11 @@ std::uint16_t ShortIdOf(const std::string& address, const char* attribute)
 }
 
 // PCI addresses first, then the other places.
-std::vector<std::string> FindAdapters()
+std::vector<std::string> FindAdapters(const std::vector<DrmNode>& nodes)
 {
     std::set<std::string> onPci;
     std::set<std::string> elsewhere;
-    for (const DrmNode& node : DrmNodes())
+    for (const DrmNode& node : nodes)
         (IsPciAddress(node.place) ? onPci : elsewhere).insert(node.place);
     std::vector<std::string> adapters;
     for (const std::string& address : ListSystemFolder(kPciDevices))
@@ -126,7 +127,8 @@ Adapters ReadAdapters()
 {
     Adapters adapters;
     adapters.rootCount = SystemRootCount();
-    adapters.places = FindAdapters();
+    adapters.nodes = DrmNodes();
+    adapters.places = FindAdapters(adapters.nodes);
     PciIds ids;
     std::map<std::string, int> uses;
     for (const std::string& place : adapters.places) {
@@ -162,6 +164,11 @@ void Assign(std::vector<std::string>& cards, std::vector<std::string>::iterator 
 const std::vector<std::string>& DisplayAdapters()
 {
     return GetAdapters().places;
+}
+
+const std::vector<DrmNode>& DisplayNodes()
+{
+    return GetAdapters().nodes;
 }
 
 std::string AdapterName(const std::string& place)

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <memory>
+#include <string_view>
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -30,7 +31,10 @@ private:
     int fFd;
 };
 
-bool ReadAll(int fd, std::string& text, std::size_t maxSize)
+// How much of a file to read; never more than the maximum size.
+enum class Extent { kAll, kFirstLine };
+
+bool ReadBytes(int fd, std::string& text, std::size_t maxSize, Extent extent)
 {
     char block[4096];
     while (text.size() < maxSize) {
@@ -42,14 +46,15 @@ bool ReadAll(int fd, std::string& text, std::size_t maxSize)
         }
         if (count == 0)
             break;
-        text.append(block, static_cast<std::size_t>(count));
+        const std::string_view added(block, static_cast<std::size_t>(count));
+        text += added;
+        if (extent == Extent::kFirstLine && added.find('\n') != std::string_view::npos)
+            break;
     }
     return true;
 }
 
-} // namespace
-
-bool ReadSystemFile(const std::string& path, std::string& text, std::size_t maxSize)
+bool ReadFile(const std::string& path, std::string& text, std::size_t maxSize, Extent extent)
 {
     text.clear();
     const std::string full = SystemRoot() + path;
@@ -61,17 +66,24 @@ bool ReadSystemFile(const std::string& path, std::string& text, std::size_t maxS
     const Descriptor file(open(full.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC | O_NOCTTY));
     if (file.get() < 0 || fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode))
         return false;
-    if (!ReadAll(file.get(), text, maxSize)) {
+    if (!ReadBytes(file.get(), text, maxSize, extent)) {
         text.clear();
         return false;
     }
     return true;
 }
 
+} // namespace
+
+bool ReadSystemFile(const std::string& path, std::string& text, std::size_t maxSize)
+{
+    return ReadFile(path, text, maxSize, Extent::kAll);
+}
+
 std::string ReadSystemLine(const std::string& path)
 {
     std::string text;
-    ReadSystemFile(path, text);
+    ReadFile(path, text, kMaxSystemFileSize, Extent::kFirstLine);
     text.resize(std::min(text.find('\n'), text.size()));
     const char* const blanks = " \t\r";
     const std::size_t first = text.find_first_not_of(blanks);
