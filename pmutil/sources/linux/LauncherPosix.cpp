@@ -15,6 +15,7 @@
 #include "linux/ChildPipes.h"
 #include "linux/ChildProcess.h"
 #include "linux/ChildWords.h"
+#include "pmutil/KeptLauncher.h"
 #include "pmutil/PosixHandle.h"
 
 namespace pmutil {
@@ -180,8 +181,11 @@ boost::shared_ptr<Launcher> MakeLauncher()
 
 std::string GetTerminationText(const Launcher& launcher)
 {
-    const auto* const own = dynamic_cast<const LauncherPosix*>(&launcher);
-    const int number = own != nullptr ? own->GetTermSignal() : 0;
+    int number = 0;
+    if (const auto* const own = dynamic_cast<const LauncherPosix*>(&launcher))
+        number = own->GetTermSignal();
+    else if (const auto* const kept = dynamic_cast<const KeptLauncher*>(&launcher))
+        number = kept->GetTermSignal();
     if (number == 0)
         return {};
     std::string text = "signal " + std::to_string(number);

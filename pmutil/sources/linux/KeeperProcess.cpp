@@ -1,0 +1,199 @@
+#include "linux/KeeperProcess.h"
+
+#include <cerrno>
+#include <csignal>
+#include <fcntl.h>
+#include <poll.h>
+#include <sched.h>
+#include <sys/mman.h>
+#include <sys/socket.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <algorithm>
+
+#include <boost/thread/lock_guard.hpp>
+
+#include "linux/CallFailure.h"
+#include "linux/ChildPipes.h"
+
+namespace pmutil {
+
+namespace {
+
+// The keeper takes up to ten seconds to kill the rest.
+constexpr int kMaxLeaveMilliseconds = 11000;
+
+constexpr std::size_t kGuardBytes = 65536; // at least a page on every machine
+
+PosixHandle MakeClosed()
+{
+    return PosixHandle(PosixCalls::GetInvalid(), false);
+}
+
+// Blocks all signals on this thread while it exists, so that the keeper never runs a handler of the
+// host.
+class AllSignalsBlocked {
+public:
+    AllSignalsBlocked()
+    {
+        sigset_t all;
+        ::sigfillset(&all);
+        ::pthread_sigmask(SIG_SETMASK, &all, &fBefore);
+    }
+    ~AllSignalsBlocked() { ::pthread_sigmask(SIG_SETMASK, &fBefore, nullptr); }
+    AllSignalsBlocked(const AllSignalsBlocked&) = delete;
+    AllSignalsBlocked& operator=(const AllSignalsBlocked&) = delete;
+
+private:
+    sigset_t fBefore{};
+};
+
+int OpenPidfd(::pid_t pid)
+{
+    const int pidfd = static_cast<int>(::syscall(SYS_pidfd_open, pid, 0));
+    if (pidfd < 0)
+        throw CallFailure{"pidfd_open", errno};
+    return pidfd;
+}
+
+// Repeats the call while a signal interrupts it.
+template <typename Call>
+auto Repeat(Call call)
+{
+    auto result = call();
+    while (result < 0 && errno == EINTR)
+        result = call();
+    return result;
+}
+
+void Reap(int pidfd)
+{
+    siginfo_t info = {};
+    // __WALL, because the keeper's end has no signal.
+    Repeat([&] {
+        return ::waitid(static_cast<idtype_t>(P_PIDFD), static_cast<id_t>(pidfd), &info,
+                        WEXITED | __WALL);
+    });
+}
+
+} // namespace
+
+KeeperProcess::Stack::~Stack()
+{
+    if (fMemory != nullptr)
+        ::munmap(fMemory, kGuardBytes + kKeeperStackBytes);
+}
+
+void KeeperProcess::Stack::Make()
+{
+    void* const memory = ::mmap(nullptr, kGuardBytes + kKeeperStackBytes, PROT_READ | PROT_WRITE,
+                                MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE | MAP_STACK, -1, 0);
+    if (memory == MAP_FAILED)
+        throw CallFailure{"mmap", errno};
+    fMemory = memory;
+    if (::mprotect(memory, kGuardBytes, PROT_NONE) != 0)
+        throw CallFailure{"mprotect", errno};
+}
+
+void* KeeperProcess::Stack::GetTop() const
+{
+    return static_cast<char*>(fMemory) + kGuardBytes + kKeeperStackBytes;
+}
+
+KeeperProcess::KeeperProcess() : fLink(MakeClosed()), fPidfd(MakeClosed()) {}
+
+KeeperProcess::~KeeperProcess()
+{
+    Leave();
+}
+
+void KeeperProcess::Start(KeeperPlan& plan)
+{
+    fStack.Make();
+    int ends[2];
+    if (::socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, ends) != 0)
+        throw CallFailure{"socketpair", errno};
+    fLink.Reset(ends[0], true);
+    PosixHandle link(ends[1], true);
+    const ChildPipe pipe("End");
+    fEnd = pipe.reader;
+    PosixHandle host(OpenPidfd(::getpid()), true);
+    plan.fLink = ends[1];
+    plan.fEnd = pipe.writer->GetHandle();
+    plan.fHost = host.GetHandle();
+    fPidfd.Reset(Clone(plan), true);
+    link.Close();
+    pipe.writer->Close();
+
+    KeeperReply reply = ECHILD; // if the keeper was killed
+    Repeat([&] { return ::recv(fLink.GetHandle(), &reply, sizeof reply, 0); });
+    if (reply == 0)
+        return;
+    Leave();
+    throw CallFailure{"execve", reply};
+}
+
+int KeeperProcess::Clone(KeeperPlan& plan)
+{
+    const AllSignalsBlocked blocked;
+    int pidfd = -1;
+    if (::clone(RunKeeper, fStack.GetTop(), CLONE_VM | CLONE_PIDFD, &plan, &pidfd) >= 0)
+        return pidfd;
+    // An emulator of another processor can't share the memory.
+    const int pid = errno == EINVAL ? ::clone(RunKeeper, fStack.GetTop(), SIGCHLD, &plan) : -1;
+    if (pid < 0)
+        throw CallFailure{"clone", errno};
+    return OpenPidfd(pid);
+}
+
+std::optional<KeeperEnd> KeeperProcess::Await()
+{
+    KeeperEnd end = {};
+    const auto bytes = Repeat([&] { return ::read(fEnd->GetHandle(), &end, sizeof end); });
+    if (bytes == static_cast<::ssize_t>(sizeof end))
+        return end;
+    return std::nullopt;
+}
+
+// A failure means that the keeper has ended, and the child with it.
+void KeeperProcess::Send(KeeperCommand command)
+{
+    Repeat([&] { return ::send(fLink.GetHandle(), &command, sizeof command, MSG_NOSIGNAL); });
+}
+
+void KeeperProcess::Kill()
+{
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    if (fPidfd.IsOpen())
+        Send({KeeperCommand::kKill, 0});
+}
+
+bool KeeperProcess::EndAll(double seconds)
+{
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    if (!fPidfd.IsOpen())
+        return true;
+    Send({KeeperCommand::kEndAll, static_cast<int>(1000 * std::clamp(seconds, 0.0, 10.0))});
+    KeeperReply reply = 0; // if the keeper was killed
+    Repeat([&] { return ::recv(fLink.GetHandle(), &reply, sizeof reply, 0); });
+    return reply == 1;
+}
+
+void KeeperProcess::Leave()
+{
+    const boost::lock_guard<boost::mutex> lock(fMutex);
+    if (!fPidfd.IsOpen())
+        return;
+    Send({KeeperCommand::kLeave, 0});
+    pollfd poll{fPidfd.GetHandle(), POLLIN, 0};
+    if (Repeat([&] { return ::poll(&poll, 1, kMaxLeaveMilliseconds); }) > 0)
+        Reap(fPidfd.GetHandle());
+    else
+        fStack.Keep();
+    fPidfd.Close();
+    fLink.Close();
+}
+
+} // namespace pmutil
