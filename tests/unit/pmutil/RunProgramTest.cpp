@@ -159,6 +159,7 @@ protected:
     Gate fMayStart;
     std::string fLateFailure;
     std::string fFailure;
+    const ThreadsEnd fThreadsEndFirst; // before the logger and the gate, which they use
 };
 
 TEST_F(SlowStart, LosesNoStop)
