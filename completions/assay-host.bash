@@ -1,0 +1,61 @@
+# Completion of assay-host for bash. The options of the child come from the file of assay, which is in
+# the same folder.
+
+_assay_host() {
+    local cur prev words cword
+    _init_completion -n = || return
+
+    local command="" index
+    for ((index = 1; index < cword; index++)); do
+        case ${words[index]} in
+        --)
+            # The options of the child.
+            words=("${words[0]}" "${words[@]:index+1}")
+            cword=$((cword - index))
+            declare -F _assay_options >/dev/null || source "${BASH_SOURCE[0]%/*}/assay.bash"
+            _assay_options
+            return
+            ;;
+        run | torture | diff) [ -n "$command" ] || command=${words[index]} ;;
+        esac
+    done
+
+    case $prev in
+    --assay | --output)
+        _filedir
+        return
+        ;;
+    --format)
+        COMPREPLY=($(compgen -W "text json jsonl" -- "$cur"))
+        return
+        ;;
+    --schema)
+        COMPREPLY=($(compgen -W "1 2" -- "$cur"))
+        return
+        ;;
+    --need)
+        COMPREPLY=($(compgen -W "opengl opencl both" -- "$cur"))
+        return
+        ;;
+    --kind)
+        COMPREPLY=($(compgen -W "crash throw both" -- "$cur"))
+        return
+        ;;
+    --timeout | --tolerance) return ;;
+    esac
+
+    local options="--help"
+    case $command in
+    run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
+    torture) options+=" --assay --timeout --kind --" ;;
+    diff) options+=" --tolerance" ;;
+    *) options="run torture diff --help --version" ;;
+    esac
+    if [ "$command" = diff ] && [[ $cur != -* ]]; then
+        _filedir
+    else
+        COMPREPLY=($(compgen -W "$options" -- "$cur"))
+    fi
+}
+
+complete -F _assay_host assay-host
