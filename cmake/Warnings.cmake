@@ -2,7 +2,8 @@
 add_library(assay_options INTERFACE)
 target_compile_options(assay_options INTERFACE
   -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wnon-virtual-dtor
-  -Woverloaded-virtual -Wold-style-cast -Wcast-qual -Wformat=2 -Werror
+  -Woverloaded-virtual -Wold-style-cast -Wcast-qual -Wformat=2
+  $<$<BOOL:${ASSAY_WERROR}>:-Werror>
   # Make source paths in log lines and failure texts relative to the tree.
   -fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=)
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
