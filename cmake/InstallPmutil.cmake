@@ -7,7 +7,8 @@ set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/pmutil)
 install(TARGETS pmutil EXPORT pmutilTargets
   ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT pmutil)
 install(DIRECTORY ${CMAKE_CURRENT_SOURCE_DIR}/include/pmutil
-  DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT pmutil FILES_MATCHING PATTERN "*.h")
+  DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT pmutil FILES_MATCHING PATTERN "*.h"
+  PATTERN "*Win*.h" EXCLUDE PATTERN "PMDebugStrLogger.h" EXCLUDE)
 install(EXPORT pmutilTargets NAMESPACE pmutil:: DESTINATION ${package_dir} COMPONENT pmutil)
 
 configure_package_config_file(${CMAKE_SOURCE_DIR}/cmake/pmutilConfig.cmake.in
