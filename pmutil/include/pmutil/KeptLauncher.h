@@ -36,8 +36,9 @@ public:
     // are left after this time. Any thread may call.
     bool EndAll(double seconds);
 
-    // Kills all that is left, and waits for the end of the keeper, up to eleven seconds if a
-    // process can't be killed. Call after Wait has returned. Any thread may call.
+    // Kills all that is left, and waits for the end of the keeper, up to a second. If a process
+    // can't be killed, the keeper tries for ten seconds, and a later launch reaps it. Any thread may
+    // call.
     void Leave();
 
     // Returns the number of the signal that ended the child; 0 if none did, or before Wait has

@@ -12,7 +12,9 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <list>
 
+#include <boost/make_shared.hpp>
 #include <boost/thread/lock_guard.hpp>
 
 #include "linux/CallFailure.h"
@@ -22,8 +24,7 @@ namespace pmutil {
 
 namespace {
 
-// The keeper takes up to ten seconds to kill the rest.
-constexpr int kMaxLeaveMilliseconds = 11000;
+constexpr int kMaxLeaveMilliseconds = 1000;
 
 constexpr std::size_t kGuardBytes = 65536; // at least a page on every machine
 
@@ -78,15 +79,56 @@ void Reap(int pidfd)
     });
 }
 
+bool HasEnded(int pidfd, int milliseconds)
+{
+    pollfd poll{pidfd, POLLIN, 0};
+    return Repeat([&] { return ::poll(&poll, 1, milliseconds); }) > 0;
+}
+
+// Keepers that hadn't ended in time. They are reaped when others start.
+class LateKeepers {
+public:
+    static LateKeepers& Get()
+    {
+        static LateKeepers& late = *new LateKeepers; // never destroyed: their stacks are in use
+        return late;
+    }
+
+    void Add(boost::shared_ptr<PosixHandle> pidfd, KeeperStack stack)
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fKeepers.emplace_back(std::move(pidfd), std::move(stack));
+    }
+
+    void ReapEnded()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        const auto reap = [](const Keeper& keeper) {
+            const int pidfd = keeper.first->GetHandle();
+            if (!HasEnded(pidfd, 0))
+                return false;
+            Reap(pidfd);
+            return true;
+        };
+        fKeepers.remove_if(reap);
+    }
+
+private:
+    using Keeper = std::pair<boost::shared_ptr<PosixHandle>, KeeperStack>;
+
+    boost::mutex fMutex;
+    std::list<Keeper> fKeepers;
+};
+
 } // namespace
 
-KeeperProcess::Stack::~Stack()
+KeeperStack::~KeeperStack()
 {
     if (fMemory != nullptr)
         ::munmap(fMemory, kGuardBytes + kKeeperStackBytes);
 }
 
-void KeeperProcess::Stack::Make()
+void KeeperStack::Make()
 {
     void* const memory = ::mmap(nullptr, kGuardBytes + kKeeperStackBytes, PROT_READ | PROT_WRITE,
                                 MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE | MAP_STACK, -1, 0);
@@ -97,12 +139,12 @@ void KeeperProcess::Stack::Make()
         throw CallFailure{"mprotect", errno};
 }
 
-void* KeeperProcess::Stack::GetTop() const
+void* KeeperStack::GetTop() const
 {
     return static_cast<char*>(fMemory) + kGuardBytes + kKeeperStackBytes;
 }
 
-KeeperProcess::KeeperProcess() : fLink(MakeClosed()), fPidfd(MakeClosed()) {}
+KeeperProcess::KeeperProcess() : fLink(MakeClosed()) {}
 
 KeeperProcess::~KeeperProcess()
 {
@@ -111,6 +153,7 @@ KeeperProcess::~KeeperProcess()
 
 void KeeperProcess::Start(KeeperPlan& plan)
 {
+    LateKeepers::Get().ReapEnded();
     fStack.Make();
     int ends[2];
     if (::socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, ends) != 0)
@@ -123,7 +166,8 @@ void KeeperProcess::Start(KeeperPlan& plan)
     plan.fLink = ends[1];
     plan.fEnd = pipe.writer->GetHandle();
     plan.fHost = host.GetHandle();
-    fPidfd.Reset(Clone(plan), true);
+    fPidfd = boost::make_shared<PosixHandle>(PosixCalls::GetInvalid(), false);
+    fPidfd->Reset(Clone(plan), true);
     link.Close();
     pipe.writer->Close();
 
@@ -166,14 +210,14 @@ void KeeperProcess::Send(KeeperCommand command)
 void KeeperProcess::Kill()
 {
     const boost::lock_guard<boost::mutex> lock(fMutex);
-    if (fPidfd.IsOpen())
+    if (fPidfd != nullptr)
         Send({KeeperCommand::kKill, 0});
 }
 
 bool KeeperProcess::EndAll(double seconds)
 {
     const boost::lock_guard<boost::mutex> lock(fMutex);
-    if (!fPidfd.IsOpen())
+    if (fPidfd == nullptr)
         return true;
     Send({KeeperCommand::kEndAll, static_cast<int>(1000 * std::clamp(seconds, 0.0, 10.0))});
     KeeperReply reply = 0; // if the keeper was killed
@@ -184,15 +228,14 @@ bool KeeperProcess::EndAll(double seconds)
 void KeeperProcess::Leave()
 {
     const boost::lock_guard<boost::mutex> lock(fMutex);
-    if (!fPidfd.IsOpen())
+    if (fPidfd == nullptr)
         return;
     Send({KeeperCommand::kLeave, 0});
-    pollfd poll{fPidfd.GetHandle(), POLLIN, 0};
-    if (Repeat([&] { return ::poll(&poll, 1, kMaxLeaveMilliseconds); }) > 0)
-        Reap(fPidfd.GetHandle());
+    if (HasEnded(fPidfd->GetHandle(), kMaxLeaveMilliseconds))
+        Reap(fPidfd->GetHandle());
     else
-        fStack.Keep();
-    fPidfd.Close();
+        LateKeepers::Get().Add(fPidfd, std::move(fStack));
+    fPidfd.reset();
     fLink.Close();
 }
 

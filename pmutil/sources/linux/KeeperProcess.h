@@ -2,6 +2,7 @@
 #pragma once
 
 #include <optional>
+#include <utility>
 
 #include <boost/shared_ptr.hpp>
 #include <boost/thread/mutex.hpp>
@@ -10,6 +11,25 @@
 #include "pmutil/PosixHandle.h"
 
 namespace pmutil {
+
+// The memory of a keeper's stack, with a part before it that can't be accessed.
+class KeeperStack {
+public:
+    KeeperStack() = default;
+    KeeperStack(KeeperStack&& other) noexcept : fMemory(std::exchange(other.fMemory, nullptr)) {}
+    KeeperStack& operator=(KeeperStack&& other) noexcept
+    {
+        std::swap(fMemory, other.fMemory);
+        return *this;
+    }
+    ~KeeperStack();
+
+    void Make(); // throws CallFailure
+    void* GetTop() const;
+
+private:
+    void* fMemory = nullptr;
+};
 
 // Any thread may call; Await only one.
 class KeeperProcess {
@@ -31,26 +51,14 @@ public:
     void Leave();
 
 private:
-    // The memory of the keeper's stack, with a page before it that can't be accessed.
-    class Stack {
-    public:
-        ~Stack();
-        void Make(); // throws CallFailure
-        void* GetTop() const;
-        void Keep() { fMemory = nullptr; } // it is never freed
-
-    private:
-        void* fMemory = nullptr;
-    };
-
     void Send(KeeperCommand command);
     int Clone(KeeperPlan& plan);
 
     boost::mutex fMutex;
-    Stack fStack;
+    KeeperStack fStack;
     PosixHandle fLink;
     boost::shared_ptr<PosixHandle> fEnd;
-    PosixHandle fPidfd; // closed when the keeper was reaped
+    boost::shared_ptr<PosixHandle> fPidfd; // empty when the keeper was reaped
 };
 
 } // namespace pmutil
