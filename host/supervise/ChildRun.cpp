@@ -14,13 +14,12 @@
 #include "report/Causes.h"
 #include "report/LineForm.h"
 #include "report/LogFilter.h"
-#include "supervise/ChildLauncher.h"
 #include "supervise/ErrorLines.h"
 #include "supervise/EventQueue.h"
 #include "supervise/Judge.h"
 #include "supervise/Paths.h"
-#include "supervise/ProcessTree.h"
 #include "supervise/StreamFeed.h"
+#include "supervise/ThreadSignals.h"
 
 namespace assay_host {
 
@@ -50,13 +49,14 @@ bool HasVerbosity(const std::vector<std::string>& args)
 class Supervision {
 public:
     Supervision(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
-                const boost::shared_ptr<pmutil::Launcher>& launcher, const RunTimes& times)
+                Containment& containment, const RunTimes& times)
         : fTimes(times),
           fOptions(options),
           fObserver(observer),
           fStop(stop),
+          fContainment(containment),
           fLauncher(boost::make_shared<pmutil::TrackingLauncher>(
-              launcher,
+              containment.GetLauncher(),
               [queue = fQueue] {
                   queue->Push({Event::Kind::kChildEnd, {}, {}});
               })),
@@ -100,12 +100,13 @@ private:
                 pmutil::MakeChildCommand(fOptions.fProgram, GetArgs());
             fLaunch.SetLaunchParams(pmutil::LaunchParams(MakePump(fOut), MakePump(fErr),
                                                          command.fArgs, command.fProgram));
+            const SignalBlock block;
             fLaunch.Launch();
         } catch (const std::exception& exc) {
             NoteStartFailure(exc.what());
             if (fLauncher->HasLaunched())
                 KillDirectly(); // the launch failed after the child's start
-            fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
+            fLeftBehind = !fContainment.EndAll(fTimes.fTreeSeconds);
             return false;
         }
         return true;
@@ -150,9 +151,9 @@ private:
             return fKilled && fKillWait >= fTimes.fKillGrace;
         if (fTreeEnded)
             return fIdle >= fTimes.fLastStreamGrace + fTimes.fStreamGrace;
-        if (fIdle >= fTimes.fStreamGrace) {
+        if (fKilled || fIdle >= fTimes.fStreamGrace) {
             fTreeEnded = true;
-            fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
+            fLeftBehind = !fContainment.EndAll(fTimes.fTreeSeconds);
         }
         return false;
     }
@@ -310,7 +311,7 @@ private:
         }
         fEvidence.fEnd = fLauncher->GetEnd();
         if (!fTreeEnded)
-            fLeftBehind = !fTree.EndAll(fTimes.fTreeSeconds);
+            fLeftBehind = !fContainment.EndAll(fTimes.fTreeSeconds);
         fLeftBehind = fLeftBehind || (!fEnded && fEvidence.fStartFailure.empty()) ||
                       (fEnded && fOpenStreams > 0);
         fOutcome.fLostOutputBytes = fReader.GetLostByteCount() + fOut->GetDroppedByteCount();
@@ -324,13 +325,13 @@ private:
     RunObserver& fObserver;
     pmutil::StopRequest& fStop;
     const boost::shared_ptr<EventQueue> fQueue = boost::make_shared<EventQueue>();
+    Containment& fContainment;
     const boost::shared_ptr<pmutil::TrackingLauncher> fLauncher;
     const boost::shared_ptr<StreamFeed> fOut =
         boost::make_shared<StreamFeed>(pmutil::OutputChannel::kStdout, fQueue, kMaxOutputBytes);
     const boost::shared_ptr<StreamFeed> fErr = boost::make_shared<StreamFeed>(
         pmutil::OutputChannel::kStderr, fQueue, ErrorLines::kMaxBytes);
     const pmutil::StopListener fListener{fStop, [queue = fQueue] { queue->Wake(); }};
-    ProcessTree fTree;
     pmutil::ConsoleAppLauncher fLaunch;
 
     const bool fAddsLog = fOptions.fKeepCauses && !HasVerbosity(fOptions.fArgs);
@@ -355,15 +356,21 @@ private:
 
 } // namespace
 
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
+                    Containment& containment, const RunTimes& times)
+{
+    return Supervision(options, observer, stop, containment, times).Run();
+}
+
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop)
 {
-    return RunChild(options, observer, stop, MakeChildLauncher(), DefaultRunTimes());
+    return RunChild(options, observer, stop, *MakeOwnContainment(), DefaultRunTimes());
 }
 
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
                     const boost::shared_ptr<pmutil::Launcher>& launcher, const RunTimes& times)
 {
-    return Supervision(options, observer, stop, launcher, times).Run();
+    return RunChild(options, observer, stop, *MakeOwnContainment(launcher), times);
 }
 
 } // namespace assay_host

@@ -10,6 +10,7 @@
 #include "pmutil/StopRequest.h"
 #include "report/ReportReader.h"
 #include "report/RunOutcome.h"
+#include "supervise/Containment.h"
 #include "supervise/RunTimes.h"
 
 namespace assay_host {
@@ -42,7 +43,14 @@ public:
 // two seconds. Failures of the child or the system are in the outcome, not thrown.
 //
 // Raising `stop` kills the child at once, with the verdict interrupted; if it is already raised, no
-// child is started. One run at a time in a process.
+// child is started.
+//
+// The containment is only for this run. Its descendants are killed after a kill of the child, or
+// when the streams don't end with it.
+RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop,
+                    Containment& containment, const RunTimes& times);
+
+// The same with MakeOwnContainment() and DefaultRunTimes(). One run at a time in a process.
 RunOutcome RunChild(const ChildOptions& options, RunObserver& observer, pmutil::StopRequest& stop);
 
 // The same with another launcher, used only for this run, and with other times.

@@ -14,14 +14,8 @@ constexpr UINT kKilledCode = 257;
 
 HANDLE MakeOwnJob()
 {
-    const HANDLE made = ::CreateJobObjectW(nullptr, nullptr);
-    if (made == nullptr)
-        return nullptr;
-    JOBOBJECT_EXTENDED_LIMIT_INFORMATION limits = {};
-    limits.BasicLimitInformation.LimitFlags = JOB_OBJECT_LIMIT_KILL_ON_JOB_CLOSE;
-    if (::SetInformationJobObject(made, JobObjectExtendedLimitInformation, &limits,
-                                  sizeof limits) != 0 &&
-        ::AssignProcessToJobObject(made, ::GetCurrentProcess()) != 0)
+    const HANDLE made = MakeKillingJob();
+    if (made == nullptr || ::AssignProcessToJobObject(made, ::GetCurrentProcess()) != 0)
         return made;
     ::CloseHandle(made);
     return nullptr;
@@ -41,6 +35,20 @@ void End(HANDLE job, DWORD process)
 }
 
 } // namespace
+
+HANDLE MakeKillingJob()
+{
+    const HANDLE made = ::CreateJobObjectW(nullptr, nullptr);
+    if (made == nullptr)
+        return nullptr;
+    JOBOBJECT_EXTENDED_LIMIT_INFORMATION limits = {};
+    limits.BasicLimitInformation.LimitFlags = JOB_OBJECT_LIMIT_KILL_ON_JOB_CLOSE;
+    if (::SetInformationJobObject(made, JobObjectExtendedLimitInformation, &limits,
+                                  sizeof limits) != 0)
+        return made;
+    ::CloseHandle(made);
+    return nullptr;
+}
 
 HANDLE GetOwnJob()
 {

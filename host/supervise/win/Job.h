@@ -8,6 +8,10 @@
 
 namespace assay_host {
 
+// Makes a job whose processes the system kills when its last handle is closed; null if the system
+// doesn't allow one.
+HANDLE MakeKillingJob();
+
 // Returns the job of this process and its descendants, made at the first call; null if the system
 // doesn't allow one. When this process ends, even if it is killed, the system kills the other
 // processes of the job.

@@ -37,8 +37,8 @@ public:
     bool EndAll(double seconds);
 
     // Kills all that is left, and waits for the end of the keeper, up to a second. If a process
-    // can't be killed, the keeper tries for ten seconds, and a later launch reaps it. Any thread may
-    // call.
+    // can't be killed, the keeper tries for ten seconds, and a later launch reaps it. Any thread
+    // may call.
     void Leave();
 
     // Returns the number of the signal that ended the child; 0 if none did, or before Wait has

@@ -25,6 +25,11 @@ namespace pmutil {
 class LauncherWin : public Launcher {
 public:
     LauncherWin();
+
+    // With a job, each child is a member of it from its first instruction on, and its handles are
+    // closed by the next Launch and the destructor. The job must exist until Launch has returned.
+    // Null: no job.
+    explicit LauncherWin(void* job);
     ~LauncherWin() override;
 
     // Begins the command line with `program` unchanged: the caller must quote a path with blanks.
@@ -42,11 +47,14 @@ public:
 
 private:
     void* GetProcess() const; // its handle; null if no child was started
+    void EnterJob(void* process, void* thread) const;
+    void CloseJobMember();
 
+    void* const fJob;
     mutable boost::mutex fMutex; // guards all below
     bool fKilled = false;
-    // Of the latest child; zero before the first one. Its handles are never closed, so that Kill
-    // is valid at any time.
+    // Of the latest child; zero before the first one. Without a job its handles are never
+    // closed, so that Kill is valid at any time.
     const std::unique_ptr<::_PROCESS_INFORMATION> fProcessInfo;
     std::uint32_t fRawExitCode = 0;
 };

@@ -6,6 +6,7 @@
 #include <iomanip>
 #include <sstream>
 #include <stdexcept>
+#include <utility>
 #include <vector>
 
 #include <boost/make_shared.hpp>
@@ -94,8 +95,36 @@ private:
 
 } // namespace
 
-LauncherWin::LauncherWin() : fProcessInfo(std::make_unique<PROCESS_INFORMATION>()) {}
-LauncherWin::~LauncherWin() = default;
+LauncherWin::LauncherWin() : LauncherWin(nullptr) {}
+LauncherWin::LauncherWin(void* job)
+    : fJob(job), fProcessInfo(std::make_unique<PROCESS_INFORMATION>())
+{}
+
+LauncherWin::~LauncherWin()
+{
+    CloseJobMember();
+}
+
+void LauncherWin::CloseJobMember()
+{
+    if (fJob != nullptr && fProcessInfo->hProcess != nullptr)
+        ::CloseHandle(std::exchange(fProcessInfo->hProcess, nullptr));
+}
+
+// Makes the suspended child a member of the job, and lets it run.
+void LauncherWin::EnterJob(void* process, void* thread) const
+{
+    const bool entered = ::AssignProcessToJobObject(fJob, process) != 0;
+    if (entered)
+        ::ResumeThread(thread);
+    else
+        ::TerminateProcess(process, kKilledCode);
+    ::CloseHandle(thread);
+    if (entered)
+        return;
+    ::CloseHandle(process);
+    ThrowFailed("AssignProcessToJobObject");
+}
 
 std::wstring LauncherWin::MakeCommandLine(const std::wstring& program,
                                           const std::deque<std::string>& args)
@@ -153,12 +182,16 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
         fKilled = false;
+        CloseJobMember();
         *fProcessInfo = info;
         fRawExitCode = 0;
     }
     if (::CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE,
-                         EXTENDED_STARTUPINFO_PRESENT, nullptr, nullptr, &startup, &info) == 0)
+                         EXTENDED_STARTUPINFO_PRESENT | (fJob != nullptr ? CREATE_SUSPENDED : 0),
+                         nullptr, nullptr, &startup, &info) == 0)
         ThrowFailed("CreateProcessW");
+    if (fJob != nullptr)
+        EnterJob(info.hProcess, std::exchange(info.hThread, nullptr));
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
         *fProcessInfo = info;
