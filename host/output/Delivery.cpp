@@ -7,12 +7,11 @@
 #include "report/RunOutcome.h"
 #include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
+#include "supervise/RunTimes.h"
 
 namespace assay_host {
 
 namespace {
-
-constexpr std::chrono::milliseconds kPatience{1000};
 
 [[noreturn]] void GiveUp(WriterThread& writer)
 {
@@ -37,7 +36,8 @@ void Delivery::Finish() const
 {
     std::optional<std::chrono::milliseconds> patience;
     if (fInterrupts > 0)
-        patience = fInterrupts == 1 ? kPatience : std::chrono::milliseconds(0);
+        patience =
+            fInterrupts == 1 ? DefaultRunTimes().fReaderPatience : std::chrono::milliseconds(0);
     if (!fWriter->Finish(patience))
         GiveUp(*fWriter);
 }

@@ -19,6 +19,8 @@ struct RunTimes {
     Seconds fLastStreamGrace{0.2};        // for the streams to end after the descendants
     double fTreeSeconds = 0.2;            // for the descendants to end, by the system's clock
     double fJoinSeconds = 0.3; // for the launch to end after the child, by the system's clock
+    // For each piece of the output of an interrupted run to be read, by the system's clock.
+    std::chrono::milliseconds fReaderPatience{1000};
 };
 
 // The times of a run that gets none. Tests of whole programs change them before the first run.

@@ -5,6 +5,7 @@
 //   part TEXT              writes to standard error without a line end
 //   exit CODE              ends with the code
 //   sleep MILLISECONDS
+//   await FILE             waits until this file exists
 //   echo                   copies standard input to standard output until it ends
 //   flood BYTES            writes this many bytes to standard output
 //   abort                  crashes
@@ -21,6 +22,7 @@
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <fstream>
 #include <string>
 #include <thread>
 #include <vector>
@@ -48,6 +50,12 @@ void Echo()
         std::fwrite(block.data(), 1, count, stdout);
         std::fflush(stdout);
     }
+}
+
+void Await(const char* file)
+{
+    while (!std::ifstream(file))
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
 }
 
 void Flood(long long bytes)
@@ -83,6 +91,8 @@ int main(int argc, char** argv)
             ExitNow(std::atoi(next()));
         } else if (word == "sleep") {
             std::this_thread::sleep_for(std::chrono::milliseconds(std::atoi(next())));
+        } else if (word == "await") {
+            Await(next());
         } else if (word == "echo") {
             Echo();
         } else if (word == "flood") {

@@ -1,11 +1,21 @@
 """Fixtures of the program tests."""
 
+import signal
+
 import pytest
 
 # Must precede the first import, or failed assertions don't show the values.
 pytest.register_assert_rewrite("calls", "clmodel", "harness", "hosting", "model", "sweep")
 
 import harness  # noqa: E402
+
+
+def pytest_configure():
+    """Undoes what nohup and the background of a shell ignore: programs inherit it."""
+    signal.pthread_sigmask(signal.SIG_SETMASK, [])
+    for number in (signal.SIGHUP, signal.SIGQUIT, signal.SIGTERM, signal.SIGCHLD):
+        signal.signal(number, signal.SIG_DFL)
+    signal.signal(signal.SIGINT, signal.default_int_handler)
 
 
 @pytest.fixture

@@ -8,6 +8,7 @@ import os
 import re
 import signal
 import subprocess
+import time
 from dataclasses import dataclass, field
 from pathlib import Path
 
@@ -19,7 +20,8 @@ PROGRAM = BUILD / "bin" / "assay"
 PROGRAM_AT_ROOT = BUILD / "bin" / "assay-at-root"
 SCRIPTED_EGL = BUILD / "drivers" / "egl"
 
-SECONDS = 60
+# For events that must come, in seconds: no statement about speed. A machine may be very busy.
+DEADLINE = 600
 
 # The sanitizers of the build, as ASSAY_SANITIZE names them; "" without.
 SANITIZED_BY = os.environ.get("ASSAY_SANITIZE", "")
@@ -34,6 +36,16 @@ SANITIZERS = {
 # Every program that a test starts gets them, with or without an environment of its own.
 for name, value in SANITIZERS.items():
     os.environ[name] = ":".join(filter(None, [os.environ.get(name), value]))
+
+
+def until(condition, what):
+    """Waits until the condition is true, and returns what it returned. It must come true."""
+    deadline = time.monotonic() + DEADLINE
+    while not (found := condition()):
+        assert time.monotonic() < deadline, what
+        time.sleep(0.01)
+    return found
+
 
 STAMP = re.compile(r'^(assayStart|assayEnd)="\d{4}-\d\d-\d\d_\d\d:\d\d:\d\d"$', re.MULTILINE)
 
@@ -101,6 +113,15 @@ def read_record(path):
     return [read_call(line) for line in Path(path).read_text(encoding="ascii").splitlines()]
 
 
+def record_so_far(path):
+    """The whole lines of the record of a run that has not ended, and may not have started."""
+    try:
+        text = Path(path).read_text(encoding="ascii")
+    except FileNotFoundError:
+        return []
+    return [read_call(line) for line in text.splitlines(True) if line.endswith("\n")]
+
+
 @dataclass
 class Host:
     """Runs the program. Describes the machine that it finds, and the folder for its files."""
@@ -111,12 +132,9 @@ class Host:
     def record(self):
         return read_record(self.folder / "record")
 
-    def record_so_far(self):
-        """The record of a run that has not ended, and may not have started."""
-        try:
-            return self.record()
-        except FileNotFoundError:
-            return []
+    def has_called(self, name):
+        """Whether the run, which need not have started, has made this call. For a fresh record."""
+        return any(call.name == name for call in record_so_far(self.folder / "record"))
 
     def fresh_record(self):
         """Deletes the record, and returns a script line that makes the driver write a new one."""
@@ -170,7 +188,7 @@ class Host:
         result.update(self.variables)
         return result
 
-    def run(self, *arguments, seconds=SECONDS, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+    def run(self, *arguments, seconds=DEADLINE, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
             stderr=subprocess.PIPE, before=None, clear=False, **machine):
         """Runs the program to its end. `before` is called in the child; `clear` removes all variables
         except those that describe the machine."""

@@ -14,7 +14,7 @@ from pathlib import Path
 
 import pytest
 
-from harness import BUILD, PROGRAM, SANITIZED_BY, TREE, text_of
+from harness import BUILD, DEADLINE, PROGRAM, TREE, text_of, until
 
 sys.path.insert(0, str(TREE / "tests" / "schema"))
 pytest.importorskip("jsonschema", reason="python3-jsonschema isn't there")
@@ -22,16 +22,16 @@ pytest.importorskip("jsonschema", reason="python3-jsonschema isn't there")
 from validate import decode, report_bytes, validate_document, validate_events  # noqa: E402
 
 HOST = BUILD / "bin" / "assay-host"
+# The same program with long times for all that must happen in time, and with a clock for the timeout
+# that a Cue sets: the outcomes of its runs don't depend on the machine's speed.
+HOST_ON_CUE = BUILD / "bin" / "assay-host-on-cue"
+TIMEOUT = 1200 # seconds, which pass only by a cue
 CHILD = BUILD / "bin" / "test_child"
 WORKER = "assay-worker"
 
 STATUSES = {"complete": 0, "failed-tests": 1, "usage-error": 2, "crashed": 3, "hung": 4,
             "never-started": 5, "interrupted": 6}
 ERROR_STATUS = 10
-
-# The time of a verdict beyond the timeout, and an addition for a busy machine, in seconds.
-GRACE = 2.0 if SANITIZED_BY != "thread" else 10.0  # the sanitizer slows a flood down tenfold
-SLACK = 1.0
 
 
 @dataclass
@@ -41,7 +41,6 @@ class Hosted:
     status: int
     out: bytes
     err: bytes
-    seconds: float
     peak_kib: int  # its maximum memory, guardian and worker together
 
     @property
@@ -93,14 +92,26 @@ def peak_of(pid):
     return 0
 
 
+class Cue:
+    """Lets the timeout of a run of HOST_ON_CUE pass. The child does so with `touch "$ASSAY_TEST_CUE"`,
+    once all that it has to do before is done."""
+
+    def __init__(self, folder, name="cue"):
+        self.path = Path(folder) / name
+        self.path.unlink(missing_ok=True)
+        self.variables = {"ASSAY_TEST_CUE": str(self.path)}
+
+    def give(self):
+        self.path.touch()
+
+
 class Watched:
     """A running assay-host. As a context manager, asserts at the end that no process of it is left."""
 
     def __init__(self, *arguments, environment=None, stdin=subprocess.DEVNULL,
-                 stdout=subprocess.PIPE, stderr=subprocess.PIPE, program=HOST, **options):
+                 stdout=subprocess.PIPE, stderr=subprocess.PIPE, program=HOST_ON_CUE, **options):
         self.mark = f"ASSAY_TEST_MARK={uuid.uuid4()}".encode()
         name, value = self.mark.decode().split("=")
-        self.start = time.monotonic()
         self.process = subprocess.Popen(
             [program, *arguments], stdin=stdin, stdout=stdout, stderr=stderr,
             env={**(os.environ if environment is None else environment), name: value}, **options)
@@ -127,11 +138,11 @@ class Watched:
             time.sleep(0.01)
         return len(left)
 
-    def wait(self, seconds):
+    def wait(self):
         """Waits for the end of the process itself, even if others hold its streams open."""
         descriptor = os.pidfd_open(self.process.pid)
         try:
-            assert select.select([descriptor], [], [], seconds)[0], "the process doesn't end"
+            assert select.select([descriptor], [], [], DEADLINE)[0], "the process doesn't end"
         finally:
             os.close(descriptor)
         self.process.wait()
@@ -151,8 +162,8 @@ class Watched:
         peak = peak_of(self.process.pid) + (peak_of(worker) if worker else 0)
         self.peak_kib = max(self.peak_kib, peak)
 
-    def finish(self, seconds=60):
-        deadline = time.monotonic() + seconds
+    def finish(self):
+        deadline = time.monotonic() + DEADLINE
         while True:
             self.look()
             try:
@@ -160,14 +171,23 @@ class Watched:
                 break
             except subprocess.TimeoutExpired:
                 assert time.monotonic() < deadline, "assay-host doesn't end"
-        return Hosted(self.process.returncode, out or b"", err or b"",
-                      time.monotonic() - self.start, self.peak_kib)
+        return Hosted(self.process.returncode, out or b"", err or b"", self.peak_kib)
 
 
-def host_run(*arguments, seconds=60, **options):
+def host_run(*arguments, **options):
     """Runs assay-host to its end."""
     with Watched(*arguments, **options) as watched:
-        return watched.finish(seconds)
+        return watched.finish()
+
+
+def host_run_until(condition, folder, *arguments, environment, child=()):
+    """Runs assay-host; its timeout passes when the condition is true. The folder is for the cue."""
+    cue = Cue(folder)
+    with Watched(*arguments, "--timeout", str(TIMEOUT), *child,
+                 environment={**environment, **cue.variables}) as watched:
+        until(lambda: watched.process.poll() is not None or condition(), "the timeout doesn't pass")
+        cue.give()
+        return watched.finish()
 
 
 def run_assay(host, *options, child=(), assay=None, machine=None, **more):
@@ -192,11 +212,6 @@ def texts(document, kind="value"):
     return [text_of(decode(line["text"])) for line in document["lines"] if line["kind"] == kind]
 
 
-__all__ = ["CHILD", "GRACE", "HOST", "SLACK", "STATUSES", "ERROR_STATUS", "Hosted", "WORKER",
-           "Watched", "decode", "host_run", "json", "processes_with", "report_bytes", "run_assay",
-           "script_child", "texts"]
-
-
 def read_to_the_end(control):
     """Reads what was written to a pseudo-terminal whose other side is closed. It comes in pieces, and
     its end is an error."""
@@ -207,3 +222,8 @@ def read_to_the_end(control):
     except OSError as error:
         assert error.errno == errno.EIO
     return data
+
+
+__all__ = ["CHILD", "Cue", "ERROR_STATUS", "HOST", "HOST_ON_CUE", "Hosted", "STATUSES", "TIMEOUT",
+           "WORKER", "Watched", "decode", "host_run", "host_run_until", "json", "processes_with",
+           "read_to_the_end", "report_bytes", "run_assay", "script_child", "texts"]

@@ -4,20 +4,15 @@ import contextlib
 import os
 import re
 import threading
-import time
 from collections import Counter
 from dataclasses import dataclass, field
 
 from calls import RECORD_HERE, FullMachine, PREFIX, calls_of, without_calls
 from faults import FAULTS, Fault, library_of
-from harness import PROGRAM_AT_ROOT, Call, Run
-from hosting import HOST, Hosted, Watched
+from harness import PROGRAM_AT_ROOT, Call, Run, until
+from hosting import TIMEOUT, Cue, Hosted, Watched
 
 WORKERS = max(2, os.cpu_count() or 1)
-# Far more than it takes to reach any call. A child that hangs under assay-host takes this long.
-TIMEOUT = 20
-# For events that must come, even on a busy machine.
-DEADLINE = 200
 # A sample has one in this many pairs of an entry point and a fault.
 ONE_IN = 2
 
@@ -85,31 +80,32 @@ class Sweep:
         shift = list(FAULTS).index(fault.name)
         return (found if all_of_them else sample(found, shift)), left_out
 
-    def _watch(self, pair, way, *arguments, program, record, out, err):
+    def _watch(self, pair, way, *arguments, record, out, err, variables=None, **more):
         opencl = library_of(pair.call.name) == "cl"
         rules = pair.fault.rules(pair.call)
         gl_lines, cl_lines = ("", rules) if opencl else (rules, "")
         host, found = self.machine.host(f"{pair.name}-{way}", gl_lines=record["gl"] + gl_lines,
                                         cl_lines=record["cl"] + cl_lines)
-        environment = host.environment(**found)
+        environment = {**host.environment(**found), **(variables or {})}
         if pair.by_loader:
             # An exception through the loader leaves its directory open, and the loader allocates as
             # much memory as the driver claims to need.
             environment["ASAN_OPTIONS"] += ":detect_leaks=0:allocator_may_return_null=1"
             environment["TSAN_OPTIONS"] += ":allocator_may_return_null=1"
-        return Watched(*arguments, program=program, environment=environment, stdout=out, stderr=err)
+        return Watched(*arguments, environment=environment, stdout=out, stderr=err, **more)
 
     def _wait_until_called(self, pair, record, process):
         """Waits until the call is the last one in the record: the fault has begun."""
-        deadline = time.monotonic() + DEADLINE
         start = f"{pair.call.number} ".encode()
-        while True:
+
+        def has_begun():
             lines = record.read_bytes().splitlines() if record.exists() else []
             if lines and lines[-1].startswith(start) and pair.call.name.encode() in lines[-1]:
-                return
+                return True
             assert process.poll() is None, "the program ended although the driver hangs"
-            assert time.monotonic() < deadline, "the call isn't made"
-            time.sleep(0.01)
+            return False
+
+        until(has_begun, "the call isn't made")
 
     def bare(self, pair):
         """Runs the program by itself, with its calls between its lines."""
@@ -120,7 +116,7 @@ class Sweep:
             if pair.fault.ends == "hang":
                 self._wait_until_called(pair, files[0], watched.process)
                 watched.process.kill()
-            watched.wait(DEADLINE)
+            watched.wait()
             if pair.fault.leaves:
                 # Without assay-host nothing else ends them.
                 assert watched.end_what_is_left() == pair.fault.leaves
@@ -135,21 +131,23 @@ class Sweep:
                   for library in ("gl", "cl")}
         files = [self.folder / f"{pair.name}-host-{stream}" for stream in ("out", "err")]
         hangs = pair.fault.ends == "hang"
+        cue = Cue(self.folder, f"{pair.name}-cue")
         with contextlib.ExitStack() as stack:
             out, err = (stack.enter_context(open(file, "wb")) for file in files)
             # Limits the runs that are on the way to the call, not those that hang in it.
             with self._starting:
                 watched = stack.enter_context(self._watch(
                     pair, "hosted", "run", "--assay", str(PROGRAM_AT_ROOT), "--format", "json",
-                    "--timeout", str(TIMEOUT if hangs else DEADLINE), "--", "-verbose=1",
-                    program=HOST, out=out, err=err,
+                    "--timeout", str(TIMEOUT), "--", "-verbose=1", out=out, err=err,
+                    variables=cue.variables,
                     record={library: f"record {file}\n" for library, file in record.items()}))
                 if hangs:
                     library = "cl" if library_of(pair.call.name) == "cl" else "gl"
                     self._wait_until_called(pair, record[library], watched.process)
-            watched.wait(DEADLINE + TIMEOUT)
+                    cue.give()
+            watched.wait()
         run = Hosted(watched.process.returncode, *(file.read_bytes() for file in files),
-                     seconds=time.monotonic() - watched.start, peak_kib=watched.peak_kib)
-        for file in [*files, *record.values()]:
+                     peak_kib=watched.peak_kib)
+        for file in [*files, *record.values(), cue.path]:
             file.unlink(missing_ok=True)
         return run

@@ -13,12 +13,11 @@ import time
 
 import pytest
 
-from harness import SANITIZED_BY
-from hosting import CHILD, HOST, ERROR_STATUS, Watched, host_run, processes_with, script_child, texts
+from harness import SANITIZED_BY, until
+from hosting import (CHILD, ERROR_STATUS, HOST_ON_CUE, TIMEOUT, Cue, Watched, host_run,
+                     processes_with, script_child, texts)
 
 INTERRUPTED = 6
-DEADLINE = 30  # for events that must come
-TIMEOUT = 1.5
 LONG = bool(os.environ.get("ASSAY_LONG_TESTS"))
 
 # Prints many lines, then hangs, with a grandchild in a session of its own.
@@ -36,13 +35,6 @@ while :; do sleep 1; done
 """
 
 
-def until(condition, what):
-    deadline = time.monotonic() + DEADLINE
-    while not condition():
-        assert time.monotonic() < deadline, what
-        time.sleep(0.01)
-
-
 class Scene:
     """A child that prints and hangs, and a pipe that only a test reads."""
 
@@ -50,16 +42,27 @@ class Scene:
         self.folder = folder
         self.ready = folder / "ready"
         self.child = script_child(folder, CHATTERBOX)
+        self.cue = Cue(folder)
         self.read, self.write = os.pipe()
 
-    def watch(self, *options, **more):
-        environment = {**os.environ, "READY": str(self.ready)}
+    def watch(self, *options, unread=False, **more):
+        """Starts the run. `unread`: after a signal the host has no patience with its readers."""
+        environment = {**os.environ, "READY": str(self.ready), **self.cue.variables}
+        if unread:
+            environment["ASSAY_TEST_UNREAD"] = "1"
         more.setdefault("stdout", self.write)
         more.setdefault("stderr", subprocess.DEVNULL)
-        return Watched("run", "--assay", self.child, *options, environment=environment, **more)
+        return Watched("run", "--assay", self.child, "--timeout", str(TIMEOUT), *options,
+                       environment=environment, **more)
 
     def await_ready(self):
         until(self.ready.exists, "the child isn't ready")
+
+    def end_the_child(self, watched):
+        """Lets the timeout pass once the child is ready, and waits until the host has ended it."""
+        self.await_ready()
+        self.cue.give()
+        await_none(watched)
 
     def close(self):
         for end in ("read", "write"):
@@ -122,11 +125,10 @@ BLOCKED = ["json lines", "raw", "raw standard error", "unread fifo", "pipe that 
 
 @pytest.mark.parametrize("name", BLOCKED)
 def test_reader_that_does_not_read(scene, name):
-    """The child is still killed in time, and one signal ends the wait for the reader."""
+    """The child is still killed at its timeout, and one signal ends the wait for the reader."""
     options, streams = blocked(scene, name)
-    with scene.watch("--timeout", str(TIMEOUT), *options, **streams) as watched:
-        scene.await_ready()
-        await_none(watched)
+    with scene.watch(*options, unread=True, **streams) as watched:
+        scene.end_the_child(watched)
         assert watched.process.poll() is None # it still waits for the reader
         watched.process.send_signal(signal.SIGTERM)
         assert watched.finish().status == INTERRUPTED
@@ -135,15 +137,15 @@ def test_reader_that_does_not_read(scene, name):
 @pytest.mark.parametrize("name", BLOCKED)
 def test_signal_before_the_timeout(scene, name):
     options, streams = blocked(scene, name)
-    with scene.watch("--timeout", "600", *options, **streams) as watched:
+    with scene.watch(*options, unread=True, **streams) as watched:
         scene.await_ready()
         watched.process.send_signal(signal.SIGTERM)
         assert watched.finish().status == INTERRUPTED # without waiting for the reader
 
 
 def test_late_reader_gets_everything(scene):
-    with scene.watch("--timeout", str(TIMEOUT), "--format", "jsonl") as watched:
-        await_none_once_ready(scene, watched)
+    with scene.watch("--format", "jsonl") as watched:
+        scene.end_the_child(watched)
         data = scene.rest()
         assert watched.finish().status == 4
     lines = data.decode().splitlines()
@@ -151,17 +153,11 @@ def test_late_reader_gets_everything(scene):
     assert '"verdict":"hung"' in lines[-1]
 
 
-def await_none_once_ready(scene, watched):
-    scene.await_ready()
-    await_none(watched)
-
-
 def test_fifo_that_is_read_late(scene):
     fifo = scene.folder / "fifo"
     os.mkfifo(fifo)
-    with scene.watch("--timeout", str(TIMEOUT), "--output", fifo,
-                     stdout=subprocess.DEVNULL) as watched:
-        await_none_once_ready(scene, watched)
+    with scene.watch("--output", fifo, stdout=subprocess.DEVNULL) as watched:
+        scene.end_the_child(watched)
         assert b"Verdict: hung" in fifo.read_bytes()
         assert watched.finish().status == 4
 
@@ -170,10 +166,9 @@ def test_stopped_terminal(scene):
     """As after Ctrl-S: the terminal doesn't accept the progress line."""
     control, terminal = pty.openpty()
     try:
-        with scene.watch("--timeout", str(TIMEOUT), stdout=subprocess.DEVNULL,
-                         stderr=terminal) as watched:
+        with scene.watch(unread=True, stdout=subprocess.DEVNULL, stderr=terminal) as watched:
             termios.tcflow(terminal, termios.TCOOFF)
-            await_none_once_ready(scene, watched)
+            scene.end_the_child(watched)
             watched.process.send_signal(signal.SIGTERM)
             assert watched.finish().status in (4, INTERRUPTED) # it may not have shown any progress
     finally:
@@ -184,12 +179,12 @@ def test_stopped_terminal(scene):
 def test_output_file_of_an_abandoned_run(scene):
     """Standard error blocks the writer, and the temporary file is deleted."""
     file = scene.folder / "result"
-    with scene.watch("--timeout", str(TIMEOUT), "--raw", "--output", file,
-                     stdout=subprocess.DEVNULL, stderr=scene.write) as watched:
-        await_none_once_ready(scene, watched)
+    with scene.watch("--raw", "--output", file, unread=True, stdout=subprocess.DEVNULL,
+                     stderr=scene.write) as watched:
+        scene.end_the_child(watched)
         watched.process.send_signal(signal.SIGINT)
         assert watched.finish().status == INTERRUPTED
-    assert {each.name for each in scene.folder.iterdir()} == {"child", "ready"}
+    assert {each.name for each in scene.folder.iterdir()} == {"child", "cue", "ready"}
 
 
 # Signals.
@@ -202,7 +197,7 @@ ENDING_BY_DEFAULT = [signal.SIGHUP, signal.SIGINT, signal.SIGQUIT, signal.SIGUSR
 
 @pytest.mark.parametrize("number", ENDING_BY_DEFAULT, ids=str)
 def test_signal_that_ends(scene, number):
-    with scene.watch("--timeout", "600", "--format", "json", stdout=subprocess.PIPE) as watched:
+    with scene.watch("--format", "json", stdout=subprocess.PIPE) as watched:
         scene.await_ready()
         watched.process.send_signal(number)
         run = watched.finish()
@@ -210,17 +205,23 @@ def test_signal_that_ends(scene, number):
         assert texts(run.document())[0].startswith("key0=")
 
 
+def watch_waiting(folder, *words, **more):
+    """Runs a child that writes its report once there is the file "go"."""
+    return Watched("run", "--assay", CHILD, "--", *words, "await", folder / "go", "out",
+                   'assayStart="x"', "out", 'assayEnd="y"', **more)
+
+
 @pytest.mark.parametrize("number", [signal.SIGPIPE, signal.SIGXFSZ, signal.SIGCHLD, signal.SIGURG,
                                     signal.SIGWINCH, signal.SIGCONT, signal.SIGTTIN, signal.SIGTTOU],
                          ids=str)
-def test_signal_that_does_not(number):
-    with Watched("run", "--assay", CHILD, "--", "sleep", "300", "out", 'assayStart="x"', "out",
-                 'assayEnd="y"') as watched:
-        until(watched.worker, "no worker")
+def test_signal_that_does_not(number, tmp_path):
+    with watch_waiting(tmp_path) as watched:
+        worker = until(watched.worker, "no worker")
         for _ in range(5):
             watched.process.send_signal(number)
-            os.kill(watched.worker() or watched.process.pid, number)
+            os.kill(worker, number)
             time.sleep(0.02)
+        (tmp_path / "go").touch()
         assert watched.finish().status == 0
 
 
@@ -228,7 +229,7 @@ def test_signal_that_does_not(number):
 @pytest.mark.parametrize("pause", [0, 0.001, 0.01, 0.1])
 def test_repeated_signals(scene, number, pause):
     """Only the first two have an effect, and none ends the host before its child."""
-    with scene.watch("--timeout", "600") as watched:
+    with scene.watch() as watched:
         scene.await_ready()
         while watched.process.poll() is None:
             watched.process.send_signal(number)
@@ -237,18 +238,18 @@ def test_repeated_signals(scene, number, pause):
         assert watched.process.returncode == INTERRUPTED
 
 
-def test_ignored_hangup_stays_ignored():
-    with Watched("run", "--assay", CHILD, "--", "sleep", "400", "out", 'assayStart="x"', "out",
-                 'assayEnd="y"',
-                 preexec_fn=lambda: signal.signal(signal.SIGHUP, signal.SIG_IGN)) as watched:
-        until(watched.worker, "no worker")
+def test_ignored_hangup_stays_ignored(tmp_path):
+    with watch_waiting(tmp_path, preexec_fn=lambda: signal.signal(
+            signal.SIGHUP, signal.SIG_IGN)) as watched:
+        worker = until(watched.worker, "no worker")
         watched.process.send_signal(signal.SIGHUP)
-        os.kill(watched.worker() or watched.process.pid, signal.SIGHUP)
+        os.kill(worker, signal.SIGHUP)
+        (tmp_path / "go").touch()
         assert watched.finish().status == 0
 
 
 def test_torture_is_interrupted(scene):
-    with Watched("torture", "--assay", scene.child, "--timeout", "600", stdout=scene.write,
+    with Watched("torture", "--assay", scene.child, "--timeout", "0", stdout=scene.write,
                  environment={**os.environ, "READY": str(scene.ready)}) as watched:
         scene.await_ready()
         watched.process.send_signal(signal.SIGINT)
@@ -256,15 +257,15 @@ def test_torture_is_interrupted(scene):
         assert watched.finish().status == INTERRUPTED
 
 
-def test_suspended_and_continued():
+def test_suspended_and_continued(tmp_path):
     """As by Ctrl-Z and fg: the whole run stops and continues, including grandchildren."""
-    with Watched("run", "--assay", CHILD, "--", "spawn", "60000", "sleep", "2000", "out",
-                 'assayStart="x"', "out", 'assayEnd="y"') as watched:
+    with watch_waiting(tmp_path, "spawn", "6000000") as watched:
         until(lambda: watched.worker() and len(children_of(watched)) == 2, "no grandchild")
         everybody = [watched.process.pid, watched.worker(), *children_of(watched)]
         watched.process.send_signal(signal.SIGTSTP)
         until(lambda: all(state_of(each) == "T" for each in everybody), "not stopped")
         watched.process.send_signal(signal.SIGCONT)
+        (tmp_path / "go").touch()
         assert watched.finish().status == 0
 
 
@@ -289,7 +290,7 @@ def test_ignored_ends_of_children(command, host):
 
 
 def test_blocked_signals(scene):
-    with scene.watch("--timeout", "600", preexec_fn=lambda: signal.pthread_sigmask(
+    with scene.watch(unread=True, preexec_fn=lambda: signal.pthread_sigmask(
             signal.SIG_BLOCK, signal.valid_signals())) as watched:
         scene.await_ready()
         watched.process.send_signal(signal.SIGTERM)
@@ -320,8 +321,8 @@ def test_closed_streams(tmp_path, closed):
 
 def test_orphans_of_an_earlier_program(tmp_path):
     """Children that the process had before it became assay-host are left alone."""
-    script = script_child(tmp_path, f'sleep 1000 >&- 2>&- & echo $! > {tmp_path}/pid; exec {HOST} "$@"',
-                          "wrapper")
+    script = script_child(tmp_path, "sleep 1000 >&- 2>&- & echo $! > "
+                                    f'{tmp_path}/pid; exec {HOST_ON_CUE} "$@"', "wrapper")
     with Watched("run", "--assay", CHILD, "--", "out", "a=1", program=script) as watched:
         watched.finish()
         other = int((tmp_path / "pid").read_text())
@@ -384,8 +385,8 @@ def test_background_of_a_terminal(tmp_path):
     file = tmp_path / "result"
     control, terminal = pty.openpty()
     try:
-        with Watched("-c", BACKGROUND, HOST, "run", "--raw", "--assay", CHILD, "--output", file, "--",
-                     "err", "aside", "sleep", "300", "out", 'assayStart="x"', "out",
+        with Watched("-c", BACKGROUND, HOST_ON_CUE, "run", "--raw", "--assay", CHILD, "--output",
+                     file, "--", "err", "aside", "sleep", "300", "out", 'assayStart="x"', "out",
                      'assayEnd="y"', program=sys.executable, stdin=terminal, stdout=terminal,
                      stderr=terminal) as watched:
             watched.finish()
@@ -398,9 +399,9 @@ def test_background_of_a_terminal(tmp_path):
 def test_processor_time_that_is_used_up(tmp_path):
     """At the soft limit of processor time, the host gets SIGXCPU."""
     child = script_child(tmp_path, "setsid sleep 1000 & while :; do echo 'a=\"'; done")
-    with Watched("run", "--assay", child, "--timeout", "600", stdout=subprocess.DEVNULL,
+    with Watched("run", "--assay", child, "--timeout", "0", stdout=subprocess.DEVNULL,
                  preexec_fn=lambda: resource.setrlimit(resource.RLIMIT_CPU, (1, 600))) as watched:
-        assert watched.finish(120).status in (3, INTERRUPTED) # the child may reach the limit first
+        assert watched.finish().status in (3, INTERRUPTED) # the child may reach the limit first
 
 
 # A sudden end of the host.
@@ -423,7 +424,7 @@ def kill_by_name(watched):
     for number, _ in processes_with(watched.mark):
         try:
             with open(f"/proc/{number}/comm", encoding="utf-8") as name:
-                if name.read().strip() == "assay-host":
+                if name.read().strip() == HOST_ON_CUE.name[:15]:
                     os.kill(number, signal.SIGKILL)
         except (FileNotFoundError, ProcessLookupError):
             pass
@@ -438,17 +439,17 @@ ENDS = [kill_host, kill_group, kill_worker, kill_by_name, quit_worker]
 
 @pytest.mark.parametrize("end", ENDS, ids=lambda end: end.__name__)
 def test_sudden_end(scene, end):
-    with scene.watch("--timeout", "600", start_new_session=True) as watched:
+    with scene.watch(start_new_session=True) as watched:
         scene.await_ready()
         end(watched)
-        watched.process.wait(DEADLINE)
+        watched.wait()
         until(lambda: processes_with(watched.mark) == [], "something is left")
         expected = signal.SIGSEGV if end is quit_worker else signal.SIGKILL
         assert watched.process.returncode == -expected
 
 
 def test_end_while_suspended(scene):
-    with scene.watch("--timeout", "600") as watched:
+    with scene.watch() as watched:
         scene.await_ready()
         worker = watched.worker()
         watched.process.send_signal(signal.SIGTSTP)
@@ -465,10 +466,10 @@ def test_sudden_end_again_and_again(tmp_path):
     chance = random.Random(rounds)
     for number in range(rounds):
         command = "torture" if number % 5 == 4 else "run"
-        with Watched(command, "--assay", child, "--timeout", "600", stdout=subprocess.DEVNULL,
+        with Watched(command, "--assay", child, "--timeout", "0", stdout=subprocess.DEVNULL,
                      stderr=subprocess.DEVNULL, start_new_session=True) as watched:
             time.sleep(chance.uniform(0, 0.12 if not SANITIZED_BY else 0.5))
             chance.choice(ENDS)(watched)
-            watched.process.wait(DEADLINE)
+            watched.wait()
             for _ in range(2):
                 until(lambda: processes_with(watched.mark) == [], f"left in round {number}")

@@ -4,21 +4,19 @@ import os
 import re
 import shutil
 import signal
-import time
 
 import pytest
 
-from harness import PROGRAM, PROGRAM_AT_ROOT
-from hosting import HOST, Watched, host_run, read_to_the_end, script_child
+from harness import PROGRAM, PROGRAM_AT_ROOT, until
+from hosting import HOST, TIMEOUT, Cue, Watched, host_run, read_to_the_end, script_child
 from model import Gpu
 from test_opencl import Machine
 
 SUMMARY = re.compile(r"(\d+) runs, each as predicted, in \d+\.\d s\.\n$")
 
 
-def torture(environment, *options, assay=PROGRAM, seconds=120, **more):
-    return host_run("torture", "--assay", assay, *options, environment=environment, seconds=seconds,
-                    **more)
+def torture(environment, *options, assay=PROGRAM, **more):
+    return host_run("torture", "--assay", assay, *options, environment=environment, **more)
 
 
 def test_two_devices_of_each_kind(host):
@@ -71,7 +69,7 @@ RULE_BREAKERS = {
     "another message": ("echo exception: other >&2; exec " + str(PROGRAM) + ' "$@"',
                     "    + exception: other"),
     "no failure": (f"exec {PROGRAM}", "exit status: predicted 2, found 0"),
-    "no end": ("sleep 1000", "did not end within 2 s"),
+    "no end": ('touch "$ASSAY_TEST_CUE"; sleep 1000000', f"did not end within {TIMEOUT} s"),
 }
 
 
@@ -79,8 +77,8 @@ RULE_BREAKERS = {
 def test_first_outcome_that_is_not_predicted(host, tmp_path, name):
     action, shown = RULE_BREAKERS[name]
     child = wrapped(tmp_path, "-crashAfter=5", action)
-    run = torture(host.environment(script=Gpu().script(), opencl="absent"), "--timeout", "2",
-                  assay=child)
+    environment = host.environment(script=Gpu().script(), opencl="absent")
+    run = torture({**environment, **Cue(tmp_path).variables}, "--timeout", str(TIMEOUT), assay=child)
     assert run.status == 1
     assert "\n-crashAfter=5 differs from its prediction:\n" in run.text
     assert shown in run.text
@@ -100,15 +98,15 @@ def test_failing_undisturbed_run(host, tmp_path):
     assert "there is no file" in run.text
 
 
-def test_interrupt(host):
-    environment = host.environment(opencl="absent", script=Gpu().script() +
-                                   "at glLinkProgram sleep 300\n")
-    with Watched("torture", "--assay", PROGRAM, environment=environment) as watched:
-        time.sleep(1.5)
+def test_interrupt(host, tmp_path):
+    child = wrapped(tmp_path, "-crashAfter=5", f"touch {tmp_path}/there; sleep 1000000")
+    with Watched("torture", "--assay", child, "--timeout", "0",
+                 environment=host.environment(script=Gpu().script(), opencl="absent")) as watched:
+        until((tmp_path / "there").exists, "the run doesn't come")
         watched.process.send_signal(signal.SIGINT)
-        run = watched.finish(10)
+        run = watched.finish()
     assert run.status == 6
-    assert re.search(r"Interrupted at -crashAfter=\d+\.\n$", run.text)
+    assert run.text.endswith("\nInterrupted at -crashAfter=5.\n")
 
 
 def test_llvmpipe(host):
@@ -126,7 +124,7 @@ def test_llvmpipe_with_opencl(host, kind):
         pytest.skip("no OpenCL driver here")
     environment = {**host.environment(egl="real", opencl="real"), "RUSTICL_ENABLE": "llvmpipe",
                    "RUSTICL_DEVICE_TYPE": "gpu"}
-    run = torture(environment, "--kind", kind, seconds=590)
+    run = torture(environment, "--kind", kind)
     if " and 0 OpenCL" in run.text or " and no OpenCL" in run.text:
         pytest.skip("no OpenCL driver here presents a GPU")
     assert run.status == 0, run.text

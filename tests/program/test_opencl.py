@@ -531,7 +531,7 @@ def test_mesa_as_gpu(host):
     """The whole report with a real driver, compared with clinfo. Mesa's software device has no
     reliable counters, so that the two measurements are only checked to be positive."""
     use_mesa_as_gpu(host)
-    run = host.run(script=Gpu().script(), opencl="real", seconds=300)
+    run = host.run(script=Gpu().script(), opencl="real")
     assert run.status == 0
     assert run.errors == []
     keys = [line.split("=")[0] for line in run.lines if line.startswith("clgpu[0].")]
@@ -549,7 +549,7 @@ def test_drivers_of_this_machine(host):
     devices = clinfo_devices(host, egl="real", opencl="real")
     if not devices:
         pytest.skip("no OpenCL driver of this machine shows a GPU")
-    run = host.run(egl="real", opencl="real", seconds=300)
+    run = host.run(egl="real", opencl="real")
     assert run.status == 0
     assert_agrees_with_clinfo(run, devices)
     assert run.lines[-1] == 'assayEnd="STAMP"'

@@ -9,12 +9,11 @@ import signal
 import subprocess
 import sys
 import tempfile
-import time
 from pathlib import Path
 
 import pytest
 
-from harness import PROGRAM, Run, ended_by
+from harness import DEADLINE, PROGRAM, Run, ended_by
 from model import Gpu, check, predict
 
 
@@ -26,7 +25,21 @@ def one(host):
 
 
 LOST = "DoStdout failed"
-GL_RENDERER = 0x1F01
+STOP = "at 1 glGetString(GL_RENDERER) signal 19\n"
+
+
+def wait_until_stopped(child):
+    """Waits until the driver stops the process by the rule STOP."""
+    state = os.waitid(os.P_PID, child.pid, os.WEXITED | os.WSTOPPED | os.WNOWAIT)
+    assert state.si_code == os.CLD_STOPPED
+
+
+def rest_of(child):
+    """Continues a stopped child, and returns its further standard error and its status."""
+    child.send_signal(signal.SIGCONT)
+    errors = child.stderr.read()
+    child.stderr.close()
+    return errors, child.wait(DEADLINE)
 
 
 @pytest.mark.parametrize("options, status", [([], 0), (["-exit=7"], 7), (["-throwAfter=9"], 2)])
@@ -68,17 +81,15 @@ def test_reader_that_has_gone(one):
 def test_reader_that_closes_in_the_middle(one):
     """The reader gets a beginning of the report; each later line is reported as lost."""
     expected = predict([one.gpu]).lines
-    vendor = next(index for index, line in enumerate(expected) if ".GLVendor=" in line)
-    # Time for the reader to close the pipe.
-    script = one.gpu.script() + "at glGetString(GL_VENDOR) sleep 500\n"
-    child = one.start(script=script)
-    seen = b"".join(child.stdout.readline() for _ in range(vendor))
+    renderer = next(index for index, line in enumerate(expected) if ".GLRenderer=" in line)
+    child = one.start(script=one.gpu.script() + STOP)
+    wait_until_stopped(child)
+    seen = b"".join(child.stdout.readline() for _ in range(renderer))
     child.stdout.close()
-    errors = child.stderr.read()
-    child.stderr.close()
-    run = Run(child.wait(30), seen, errors)
-    assert run.lines == expected[:vendor]
-    assert run.errors == [LOST] * (len(expected) - vendor)
+    errors, status = rest_of(child)
+    run = Run(status, seen, errors)
+    assert run.lines == expected[:renderer]
+    assert run.errors == [LOST] * (len(expected) - renderer)
     assert run.status == 0
 
 
@@ -86,7 +97,6 @@ def test_output_that_fails_for_a_while(one):
     """Later lines are written again, and no lost line comes after them."""
     expected = predict([one.gpu]).lines
     renderer = next(index for index, line in enumerate(expected) if ".GLRenderer=" in line)
-    script = one.fresh_record() + one.gpu.script() + "at glGetString(GL_RENDERER) sleep 800\n"
     # A full pipe in non-blocking mode.
     reader, writer = os.pipe()
     fcntl.fcntl(writer, fcntl.F_SETPIPE_SZ, 4096)
@@ -97,40 +107,18 @@ def test_output_that_fails_for_a_while(one):
             filled += os.write(writer, b"." * 4096)
     except BlockingIOError:
         pass
-    child = one.start(script=script, stdout=writer)
+    child = one.start(script=one.gpu.script() + STOP, stdout=writer)
     os.close(writer)
-    deadline = time.monotonic() + 20
-    while f"glGetString 0x{GL_RENDERER:X}" not in [
-            f"{call.name} {call.arguments}" for call in one.record_so_far()]:
-        assert time.monotonic() < deadline
-        time.sleep(0.02)
+    wait_until_stopped(child)
     while filled > 0:
         filled -= len(os.read(reader, filled))
+    errors, status = rest_of(child)
     with open(reader, "rb") as rest:
         out = rest.read()
-    errors = child.stderr.read()
-    child.stderr.close()
-    run = Run(child.wait(30), out, errors)
+    run = Run(status, out, errors)
     assert run.lines == expected[renderer:]
     assert run.errors == [LOST] * renderer
     assert run.status == 0
-
-
-STOP = "at 1 glGetString(GL_RENDERER) signal 19\n"
-
-
-def wait_until_stopped(child):
-    """Waits until the driver stops the process by the rule STOP."""
-    state = os.waitid(os.P_PID, child.pid, os.WEXITED | os.WSTOPPED | os.WNOWAIT)
-    assert state.si_code == os.CLD_STOPPED
-
-
-def rest_of(child):
-    """Continues a stopped child, and returns its further standard error and its status."""
-    child.send_signal(signal.SIGCONT)
-    errors = child.stderr.read()
-    child.stderr.close()
-    return errors, child.wait(30)
 
 
 @pytest.mark.parametrize("options", [[], ["-verbose=1"]])
@@ -320,7 +308,7 @@ def test_background_of_a_terminal(one):
             out += piece
     except OSError as error:  # the terminal is closed
         assert error.errno == errno.EIO
-    errors = leader.communicate(timeout=30)[1]
+    errors = leader.communicate(timeout=DEADLINE)[1]
     os.close(main)
     check(Run(leader.returncode, out, errors), predict([one.gpu], exit_status=7))
 

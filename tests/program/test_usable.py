@@ -8,14 +8,12 @@ from dataclasses import dataclass
 import pytest
 
 from calls import FullMachine
-from harness import BUILD, PROGRAM, PROGRAM_AT_ROOT
-from hosting import host_run
+from harness import BUILD, PROGRAM, PROGRAM_AT_ROOT, record_so_far
+from hosting import host_run_until
 from validate import validate_document, validate_events
 
 pytestmark = pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
                                 reason="this machine has no OpenCL loader library")
-
-HANG_SECONDS = 1.5
 
 NEEDED = {"hardware": 0, "software": 20, "broken": 21, "absent": 22, "unknown": 23}
 # What leaves a host that needs both the least comes first.
@@ -132,13 +130,28 @@ FAILURES = {
 }
 
 
+def hangs(failure, records):
+    """Whether the child has made the call in which it hangs."""
+    for library, record in records.items():
+        rule = getattr(failure, library).split()
+        if rule[-1:] == ["hang"]:
+            times = int(rule[1]) if rule[1].isdigit() else 1
+            return sum(call.name == rule[-2] for call in record_so_far(record)) >= times
+    return False
+
+
 def run(folder, failure, *options):
-    host, found = FullMachine(folder).host("run", failure.gl, failure.cl)
+    records = {"gl": folder / "gl-record", "cl": folder / "cl-record"}
+    lines = {}
+    for library, record in records.items():
+        record.unlink(missing_ok=True)
+        lines[library] = f"record {record}\n" + getattr(failure, library)
+    host, found = FullMachine(folder).host("run", lines["gl"], lines["cl"])
     found.update(egl=failure.egl, opencl=failure.loader)
-    arguments = ["run", "--assay", str(failure.program), "--timeout", str(HANG_SECONDS), *options]
-    if failure.child:
-        arguments += ["--", *failure.child]
-    return host_run(*arguments, environment=host.environment(**found))
+    child = ["--", *failure.child] if failure.child else []
+    return host_run_until(lambda: hangs(failure, records), folder, "run", "--assay",
+                          str(failure.program), *options, environment=host.environment(**found),
+                          child=child)
 
 
 def answer_of(usable, name):
