@@ -11,7 +11,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <csignal>
-#include <ctime>
 #include <fstream>
 #include <stdexcept>
 #include <vector>
@@ -122,13 +121,6 @@ void OccupyClosedStreams()
 }
 
 } // namespace
-
-double GetClockSeconds()
-{
-    timespec now{};
-    clock_gettime(CLOCK_REALTIME, &now);
-    return static_cast<double>(now.tv_sec) + static_cast<double>(now.tv_nsec) * 1e-9;
-}
 
 std::uint64_t GetCurrentThreadNumber()
 {

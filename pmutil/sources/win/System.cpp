@@ -118,19 +118,6 @@ void DisableErrorReportDialog()
 
 } // namespace
 
-double GetClockSeconds()
-{
-    constexpr double kSecondsPerTick = 1e-7;
-    constexpr std::int64_t kTicksFrom1601To1970 = 116444736000000000;
-    FILETIME now{};
-    GetSystemTimeAsFileTime(&now);
-    ULARGE_INTEGER ticks{};
-    ticks.LowPart = now.dwLowDateTime;
-    ticks.HighPart = now.dwHighDateTime;
-    return static_cast<double>(static_cast<std::int64_t>(ticks.QuadPart) - kTicksFrom1601To1970) *
-           kSecondsPerTick;
-}
-
 std::uint64_t GetCurrentThreadNumber()
 {
     return GetCurrentThreadId();

@@ -4,6 +4,7 @@
 #include <gmock/gmock.h>
 
 #include "AppFixtures.h"
+#include "Clock.h"
 #include "GPUTest.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/System.h"
@@ -392,17 +393,18 @@ TEST_F(OneDevice, TheDelayPrecedesTheMeasurement)
 {
     pmutil::InitLogging();
     static pmutil::DebugValue delay{"GPUAssayOCLDelay", 0};
-    double measured = 0;
-    impl->failures["CLBandwidth"] = [&] { measured = pmutil::GetClockSeconds(); };
-    pmutil::GetDebugValue(delay) = 1;
-    const double start = pmutil::GetClockSeconds();
+    pmutil::GetDebugValue(delay) = 0;
+    tester.DoRunCLBandwidth("t", *cl); // the first look at a debug value reads the clock
+    SteppingClock clock(0.25);
+    double measured = -1;
+    impl->failures["CLBandwidth"] = [&] { measured = clock.fSeconds; };
+    tester.DoRunCLBandwidth("t", *cl);
+    EXPECT_EQ(measured, 0) << "there is no delay";
+
+    pmutil::GetDebugValue(delay) = 3;
     tester.DoRunCLBandwidth("t", *cl);
     pmutil::GetDebugValue(delay) = 0;
-    EXPECT_GE(measured - start, 1.0);
-
-    const double again = pmutil::GetClockSeconds();
-    tester.DoRunCLBandwidth("t", *cl);
-    EXPECT_LT(measured - again, 0.9);
+    EXPECT_EQ(measured, 3.25) << "the first reading is at 0.25";
 }
 
 TEST_F(OneDevice, GetStringPrintsItsCodeFirstAndTakesNoStep)
