@@ -16,6 +16,7 @@
 #include <utility>
 
 #include "TestChild.h"
+#include "pmutil/ConsoleApp.h"
 #include "pmutil/PMLogging.h"
 #include "pmutil/Reader.h"
 #include "supervise/ChildLauncher.h"
@@ -451,6 +452,47 @@ TEST_F(ScriptedChild, IsGivenUpIfItsStreamsDoNotEnd)
     const RunOutcome outcome = Run(kSmallStep);
     EXPECT_EQ(outcome.fVerdict, Verdict::kFailedTests);
     EXPECT_TRUE(outcome.fLeftBehind);
+}
+
+class GivenUpChild : public ScriptedChild {
+protected:
+    // Runs until the child is given up after its kill. Returns the number of pauses from the kill
+    // on, each of which a real clock ends after fTick, or after a part of fStreamGrace.
+    int CountPauses(std::function<void()> onKill)
+    {
+        bool killed = false;
+        fLauncher->fOnKill = [&] {
+            killed = true;
+            onKill();
+        };
+        int pauses = 0;
+        fRecorder.fOnTick = [&] { pauses += killed ? 1 : 0; };
+        const RunOutcome outcome = Run(RunTimes::Seconds(fTimes.fTick).count());
+        EXPECT_EQ(outcome.fVerdict, Verdict::kHung);
+        EXPECT_TRUE(outcome.fLeftBehind);
+        return pauses;
+    }
+
+    const RunTimes fTimes;
+    const double fShortWait = pmutil::ConsoleApp::GetShortWaitSeconds(); // to give up its threads
+};
+
+constexpr double kMaxSecondsAfterTimeout = 2;
+
+TEST_F(GivenUpChild, IsJudgedWithinTwoSecondsIfItOutlivesItsKill)
+{
+    const int pauses = CountPauses([] {});
+    EXPECT_GE(pauses * fTimes.fTick, fTimes.fKillGrace);
+    EXPECT_LE((pauses * RunTimes::Seconds(fTimes.fTick)).count() + fTimes.fTreeSeconds + fShortWait,
+              kMaxSecondsAfterTimeout);
+}
+
+TEST_F(GivenUpChild, IsJudgedWithinTwoSecondsIfItsStreamsDoNotEnd)
+{
+    const int pauses = CountPauses([this] { fMoments->fChildEnds.Come(); });
+    EXPECT_LE((pauses * fTimes.fStreamGrace / 4).count() + fTimes.fTreeSeconds +
+                  fTimes.fJoinSeconds + fShortWait,
+              kMaxSecondsAfterTimeout);
 }
 
 // Comes when the launcher's thread gives a stream up.
