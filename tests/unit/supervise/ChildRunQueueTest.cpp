@@ -14,6 +14,7 @@
 
 #include "pmutil/Reader.h"
 #include "supervise/ChildRun.h"
+#include "support/Waits.h"
 
 namespace assay_host {
 namespace {
@@ -43,18 +44,17 @@ public:
         return fAsked;
     }
 
-    // False if it isn't asked so many times within a minute.
+    // False if it isn't asked so many times for long.
     bool AwaitAsked(int times)
     {
         boost::unique_lock<boost::mutex> lock(fMutex);
-        return fCond.timed_wait(lock, boost::posix_time::minutes(1),
-                                [&] { return fAsked >= times; });
+        return fCond.timed_wait(lock, kLong, [&] { return fAsked >= times; });
     }
 
     bool AwaitClosed()
     {
         boost::unique_lock<boost::mutex> lock(fMutex);
-        return fCond.timed_wait(lock, boost::posix_time::minutes(1), [this] { return !fOpen; });
+        return fCond.timed_wait(lock, kLong, [this] { return !fOpen; });
     }
 
 protected:
@@ -84,6 +84,8 @@ protected:
     }
 
 private:
+    const boost::posix_time::seconds kLong{static_cast<long>(pmutil::kLong)};
+
     mutable boost::mutex fMutex;
     boost::condition_variable fCond;
     std::deque<std::string> fPieces;

@@ -42,7 +42,7 @@ TEST(EventQueue, CloseEndsTheWaitOfAPush)
     boost::thread pusher([queue] { queue->Push(Bytes("y")); });
     EXPECT_FALSE(pusher.timed_join(boost::posix_time::milliseconds(50))) << "the queue is full";
     queue->Close();
-    EXPECT_TRUE(pusher.timed_join(boost::posix_time::seconds(60)));
+    pusher.join();
 }
 
 // These would wait for hours without Wake.

@@ -10,6 +10,7 @@
 #include <fcntl.h>
 #include <memory>
 #include <pthread.h>
+#include <sys/ioctl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
 #include <thread>
@@ -265,7 +266,10 @@ TEST(PosixHandle, ReaderThatGoesInTheMiddleOfAWriteRaisesNoSignal)
     Posix::MakePipe(readEnd, writeEnd);
     PosixHandle writer(writeEnd, true);
     std::thread leaver([readEnd] {
-        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        for (int filled = 0; filled < 4096;) {
+            ::ioctl(readEnd, FIONREAD, &filled);
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
         ::close(readEnd);
     });
     const std::string text(1 << 20, 'x');
