@@ -98,12 +98,14 @@ private:
 void PosixCalls::Close(Handle handle)
 {
     // Don't repeat an interrupted close: the descriptor has been released.
-    ::close(handle);
+    if (handle != GetInvalid())
+        ::close(handle);
 }
 
 void PosixCalls::Delete(const Path& path)
 {
-    ::unlink(path.c_str());
+    if (!path.empty())
+        ::unlink(path.c_str());
 }
 
 PosixCalls::Handle PosixCalls::Open(const Path& path, int access, int creation)
