@@ -25,7 +25,7 @@ LEFT_OUT = {
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
-        "unit/pmutil", "unit/supervise"},
+        "unit/launch", "unit/pmutil", "unit/supervise"},
     "Linux's own files and terminals": {"unit/facts", "unit/output"},
     "the help is the same text on both": {"program/test_host_help"},
     "the peak memory of a host is measured by getrusage": {"program/test_host_memory"},

@@ -10,12 +10,12 @@
 
 #include "OpenThings.h"
 #include "RecordingLogger.h"
-#include "ReplacedImport.h"
 #include "TempFolder.h"
 #include "TestChild.h"
 #include "Throws.h"
 #include "pmutil/WinHandle.h"
 #include "support/Waits.h"
+#include "win/ReplacedImport.h"
 
 using namespace pmutil;
 using testing::ElementsAre;

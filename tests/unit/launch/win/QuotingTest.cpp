@@ -12,7 +12,7 @@
 
 #include <boost/nowide/convert.hpp>
 
-#include "../HexLines.h"
+#include "HexLines.h"
 #include "TestChild.h"
 #include "pmutil/RunProgram.h"
 
