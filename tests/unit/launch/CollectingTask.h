@@ -3,22 +3,22 @@
 
 #include <atomic>
 #include <boost/make_shared.hpp>
-#include <boost/thread/condition_variable.hpp>
 #include <boost/thread/lock_guard.hpp>
 #include <boost/thread/mutex.hpp>
-#include <functional>
 #include <gtest/gtest.h>
 #include <string>
+#include <string_view>
 
 #include "TestChild.h"
 #include "pmutil/ConsoleAppLauncher.h"
-#include "pmutil/OutputTask.h"
+#include "pmutil/OutputPump.h"
+#include "pmutil/StartAwareApp.h"
 #include "support/Waits.h"
 
 namespace pmutil {
 
-// The platform's launcher, which reports the kill of a child.
-class WatchedLauncher : public Launcher {
+// The platform's launcher, which counts its launches.
+class CountingLauncher : public Launcher {
 public:
     LaunchResult Launch(const std::wstring& program, const std::deque<std::string>& args) override
     {
@@ -27,124 +27,79 @@ public:
     }
 
     WaitResult Wait(int* exitCode) override { return fPlatform->Wait(exitCode); }
+    void Kill() override { fPlatform->Kill(); }
 
-    void Kill() override
-    {
-        fPlatform->Kill();
-        fOnKill();
-    }
-
-    std::function<void()> fOnKill = [] {};
     std::atomic<int> fLaunches{0};
 
 private:
     const boost::shared_ptr<Launcher> fPlatform = MakeLauncher();
 };
 
-// Keeps the tasks of a launch running until the start of the launch is over.
-class StartedApp : public ConsoleApp {
+// The output of one channel.
+class Collected {
 public:
-    StartedApp() : StartedApp(boost::make_shared<WatchedLauncher>()) {}
-    ~StartedApp() override
+    void Clear()
     {
-        fLauncher->fOnKill = [] {};
-    }
-
-    // Waits until the child runs, or is killed because the launch failed.
-    void AwaitStart()
-    {
-        boost::unique_lock<boost::mutex> lock(fStartMutex);
-        EXPECT_TRUE(fStartCond.timed_wait(lock,
-                                          boost::posix_time::seconds(static_cast<long>(kLong)),
-                                          [this] { return fStarted; }));
-    }
-
-    void ForgetStart()
-    {
-        const boost::lock_guard<boost::mutex> lock(fStartMutex);
-        fStarted = false;
-    }
-
-    WatchedLauncher& GetLauncher() { return *fLauncher; }
-
-protected:
-    void OnRunning() override { SetStarted(); }
-
-private:
-    explicit StartedApp(const boost::shared_ptr<WatchedLauncher>& launcher)
-        : ConsoleApp(launcher), fLauncher(launcher)
-    {
-        launcher->fOnKill = [this] { SetStarted(); };
-    }
-
-    void SetStarted()
-    {
-        const boost::lock_guard<boost::mutex> lock(fStartMutex);
-        fStarted = true;
-        fStartCond.notify_all();
-    }
-
-    const boost::shared_ptr<WatchedLauncher> fLauncher;
-    boost::mutex fStartMutex;
-    boost::condition_variable fStartCond;
-    bool fStarted = false;
-};
-
-// Reads everything, and returns after the start of the launch is over.
-class CollectingTask : public OutputTask {
-public:
-    explicit CollectingTask(boost::weak_ptr<StartedApp> app) : fApp(std::move(app)) {}
-
-    std::string Text()
-    {
-        const boost::lock_guard<boost::mutex> lock(fTextMutex);
-        return fText;
-    }
-
-    unsigned long long Count()
-    {
-        const boost::lock_guard<boost::mutex> lock(fTextMutex);
-        return fCount;
-    }
-
-protected:
-    void DoBegin(Lock& /*lock*/) override
-    {
-        const boost::lock_guard<boost::mutex> lock(fTextMutex);
+        const boost::lock_guard<boost::mutex> lock(fMutex);
         fText.clear();
         fCount = 0;
     }
 
-    void DoRun() override
+    void Add(std::string_view block)
     {
-        const boost::shared_ptr<Reader> reader = GetReader();
-        std::string block(65536, '\0');
-        for (auto count = reader->ReadSome(block.data(), block.size()); count > 0;
-             count = reader->ReadSome(block.data(), block.size())) {
-            const boost::lock_guard<boost::mutex> lock(fTextMutex);
-            fCount += count;
-            if (fText.size() < kMaxKept)
-                fText.append(block, 0, count);
-        }
-        if (const auto app = fApp.lock())
-            app->AwaitStart();
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fCount += block.size();
+        if (fText.size() < kMaxKept)
+            fText += block;
+    }
+
+    std::string GetText()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        return fText;
+    }
+
+    unsigned long long GetCount()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        return fCount;
     }
 
 private:
     static constexpr std::size_t kMaxKept = 1 << 22;
 
-    boost::weak_ptr<StartedApp> fApp;
-    boost::mutex fTextMutex;
+    boost::mutex fMutex;
     std::string fText;
     unsigned long long fCount = 0;
+};
+
+// Keeps the output of the latest launch.
+class CollectingTask : public OutputPump {
+public:
+    CollectingTask() : CollectingTask(boost::make_shared<Collected>()) {}
+
+    std::string Text() { return fCollected->GetText(); }
+    unsigned long long Count() { return fCollected->GetCount(); }
+
+protected:
+    void DoBegin(Lock& /*lock*/) override { fCollected->Clear(); }
+
+private:
+    explicit CollectingTask(const boost::shared_ptr<Collected>& collected)
+        : OutputPump([collected](std::string_view block) { collected->Add(block); }),
+          fCollected(collected)
+    {}
+
+    const boost::shared_ptr<Collected> fCollected;
 };
 
 // A launcher with an application and two collecting tasks.
 struct RealLaunch {
     LongShortWait longShortWait;
-    boost::shared_ptr<StartedApp> app = boost::make_shared<StartedApp>();
-    boost::shared_ptr<CollectingTask> out = boost::make_shared<CollectingTask>(app);
-    boost::shared_ptr<CollectingTask> err = boost::make_shared<CollectingTask>(app);
+    boost::shared_ptr<CountingLauncher> platform = boost::make_shared<CountingLauncher>();
+    boost::shared_ptr<StartAwareApp> app = boost::make_shared<StartAwareApp>(platform);
+    boost::shared_ptr<CollectingTask> out = boost::make_shared<CollectingTask>();
+    boost::shared_ptr<CollectingTask> err = boost::make_shared<CollectingTask>();
     ConsoleAppLauncher launcher;
 
     explicit RealLaunch(std::deque<std::string> args, bool keepStdin = false,
@@ -157,10 +112,14 @@ struct RealLaunch {
     void SetArgs(std::deque<std::string> args, bool keepStdin = false,
                  std::wstring program = TEST_CHILD)
     {
-        app->ForgetStart();
         LaunchParams params(out, err, std::move(args), std::move(program));
         params.fKeepStdin = keepStdin;
         launcher.SetLaunchParams(params);
+    }
+
+    void AwaitStart() const
+    {
+        EXPECT_EQ(app->AwaitStart(kLong), consoleapp::LaunchStart::Result::kRunning);
     }
 };
 

@@ -68,7 +68,7 @@ TEST(Launch, InputReachesTheChild)
 {
     RealLaunch launch({"echo", "exit", "5"}, true);
     launch.launcher.Launch();
-    launch.app->AwaitStart();
+    launch.AwaitStart();
     launch.app->WritelnAppStdin("one");
     launch.app->WritelnAppStdin("two");
     launch.app->CloseAppStdin();
@@ -90,7 +90,7 @@ TEST(Launch, WritingToAChildThatHasGoneRaises)
 {
     RealLaunch launch({"exit", "0"}, true);
     launch.launcher.Launch();
-    launch.app->AwaitStart();
+    launch.AwaitStart();
     const std::string text(1 << 16, 'x');
     // The first writes may still go into the pipe.
     EXPECT_THROW(for (int line = 0; line < 10'000; ++line) launch.app->WritelnAppStdin(text),
@@ -102,7 +102,7 @@ TEST(Launch, ChildThatNeverReadsItsInputBlocksTheWriterUntilItEnds)
 {
     RealLaunch launch({"sleep", "200", "exit", "3"}, true);
     launch.launcher.Launch();
-    launch.app->AwaitStart();
+    launch.AwaitStart();
     const std::string text(16 << 20, 'x'); // more than any pipe holds
     EXPECT_THROW(launch.app->WritelnAppStdin(text), std::runtime_error);
     int exitCode = -1;
@@ -302,7 +302,7 @@ TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
     EXPECT_EQ(ManagedThread::GetRegisteredThreadCount(), threads) << "nothing was given up";
 
     // The child has ended: this wait is short.
-    WatchedLauncher& platform = launch.app->GetLauncher();
+    CountingLauncher& platform = *launch.platform;
     EXPECT_EQ(platform.fLaunches, BeforeTheStart() ? 0 : 1);
     if (!BeforeTheStart() && kind.endless) {
         int code = -1;
