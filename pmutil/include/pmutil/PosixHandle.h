@@ -24,7 +24,8 @@ struct PosixCalls {
     static void Close(Handle handle);
     static void Delete(const Path& path);
 
-    // Directories can't be opened. `access` and `creation` are valid flags of OpenFile.
+    // Directories can't be opened. `access` and `creation` are the flags of OpenFile, which are
+    // checked first.
     static Handle Open(const Path& path, int access, int creation);
     static std::uint64_t Read(Handle handle, void* bytes, std::uint64_t nbytes);
     static std::uint64_t Write(Handle handle, const void* bytes, std::uint64_t nbytes);

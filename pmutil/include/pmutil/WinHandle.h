@@ -23,7 +23,7 @@ struct WinCalls {
     static void Delete(const Path& path);
 
     // Opens a file, shared for reading, writing and deleting, and not inherited by child processes.
-    // `access` and `creation` must be valid flags of OpenFile.
+    // `access` and `creation` are the flags of OpenFile, which are checked first.
     static Handle Open(const Path& path, int access, int creation);
     static std::uint64_t Read(Handle handle, void* bytes, std::uint64_t nbytes);
     static std::uint64_t Write(Handle handle, const void* bytes, std::uint64_t nbytes);

@@ -49,10 +49,6 @@ template <typename Platform>
 auto HandleChannel<Platform>::OpenFile(const Path& path, int access, int creation,
                                        bool deleteOnClose) -> boost::shared_ptr<HandleChannel>
 {
-    if (access < kOpenRead || access > kOpenReadWrite)
-        throw std::invalid_argument("OpenFile: bad access flags");
-    if (creation < kOpenExisting || creation > kCreateAlways)
-        throw std::invalid_argument("OpenFile: bad creation flags");
     // Make the owner first, so that a failed allocation can't leak the handle.
     boost::shared_ptr<HandleChannel> channel(new HandleChannel(Platform::GetInvalid(), false));
     Path deletePath = deleteOnClose ? path : Path();

@@ -10,6 +10,7 @@
 #include <unistd.h>
 
 #include "all/HandleChannelImpl.h"
+#include "all/OpenFlags.h"
 
 namespace pmutil {
 
@@ -111,6 +112,7 @@ void PosixCalls::Delete(const Path& path)
 PosixCalls::Handle PosixCalls::Open(const Path& path, int access, int creation)
 {
     static constexpr char kCall[] = "open";
+    RequireOpenFlags(access, creation);
     // Reject a path with a zero byte, which would open another file, and truncation without write
     // access, which the kernel would carry out.
     if (path.find('\0') != Path::npos || (access == kOpenRead && creation == kTruncateExisting))

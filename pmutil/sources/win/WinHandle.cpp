@@ -3,6 +3,7 @@
 #include <windows.h>
 
 #include "all/HandleChannelImpl.h"
+#include "all/OpenFlags.h"
 
 namespace pmutil {
 
@@ -17,7 +18,7 @@ constexpr DWORD kShareAll = FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELE
     throw std::runtime_error(std::string(call) + " failed");
 }
 
-// OpenFile has checked the flags before.
+// Call RequireOpenFlags before.
 DWORD GetDesiredAccess(int access)
 {
     static constexpr DWORD kAccess[] = {GENERIC_READ, GENERIC_WRITE, GENERIC_READ | GENERIC_WRITE};
@@ -63,6 +64,7 @@ void WinCalls::Delete(const Path& path)
 
 WinCalls::Handle WinCalls::Open(const Path& path, int access, int creation)
 {
+    RequireOpenFlags(access, creation);
     const Handle handle = ::CreateFileW(path.c_str(), GetDesiredAccess(access), kShareAll, nullptr,
                                         GetDisposition(creation), FILE_ATTRIBUTE_NORMAL, nullptr);
     if (handle == GetInvalid())

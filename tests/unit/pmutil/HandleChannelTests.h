@@ -75,6 +75,8 @@ TYPED_TEST_P(HandleChannelTest, BadAccessFlagsTouchNothing)
         EXPECT_TRUE(ThrowsInvalidArgument("OpenFile: bad access flags", [&] {
             Channel::OpenFile(path, access, 99, false);
         })) << "access is checked first";
+        EXPECT_TRUE(ThrowsInvalidArgument("OpenFile: bad access flags",
+                                          [&] { TypeParam::Calls::Open(path, access, 99); }));
     }
     EXPECT_FALSE(TypeParam::Exists(path));
 }
@@ -86,6 +88,9 @@ TYPED_TEST_P(HandleChannelTest, BadCreationFlagsTouchNothing)
     for (const int creation : {-1, 4, 99}) {
         EXPECT_TRUE(ThrowsInvalidArgument("OpenFile: bad creation flags", [&] {
             Channel::OpenFile(path, pmutil::kOpenReadWrite, creation, false);
+        }));
+        EXPECT_TRUE(ThrowsInvalidArgument("OpenFile: bad creation flags", [&] {
+            TypeParam::Calls::Open(path, pmutil::kOpenReadWrite, creation);
         }));
     }
     EXPECT_FALSE(TypeParam::Exists(path));

@@ -8,6 +8,7 @@ extern "C" {
 extern decltype(&::WriteFile) __imp_WriteFile;
 extern decltype(&::ReadFile) __imp_ReadFile;
 extern decltype(&::OutputDebugStringA) __imp_OutputDebugStringA;
+extern decltype(&::CreateFileW) __imp_CreateFileW;
 extern decltype(&::CreatePipe) __imp_CreatePipe;
 extern decltype(&::SetHandleInformation) __imp_SetHandleInformation;
 }

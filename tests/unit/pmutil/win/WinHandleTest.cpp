@@ -59,6 +59,48 @@ struct Win {
 
 INSTANTIATE_TYPED_TEST_SUITE_P(Win, HandleChannelTest, Win);
 
+// The arguments of CreateFileW.
+struct Opening {
+    std::wstring path;
+    DWORD access = 0;
+    DWORD share = 0;
+    SECURITY_ATTRIBUTES* security = nullptr;
+    DWORD disposition = 0;
+    DWORD attributes = 0;
+    HANDLE likeFile = nullptr;
+};
+
+TEST(WinHandle, FlagsAreThoseOfTheSystem)
+{
+    static std::vector<Opening> openings;
+    openings.clear();
+    const ReplacedImport create(
+        __imp_CreateFileW,
+        +[](LPCWSTR path, DWORD access, DWORD share, SECURITY_ATTRIBUTES* security,
+            DWORD disposition, DWORD attributes, HANDLE likeFile) -> HANDLE {
+            openings.push_back({path, access, share, security, disposition, attributes, likeFile});
+            return INVALID_HANDLE_VALUE;
+        });
+    const std::wstring path = L"\\\\?\\C:\\" + std::wstring(300, L'x') + L"\u65e5";
+    constexpr DWORD kAccess[] = {0x80000000, 0x40000000, 0xC0000000};
+    constexpr DWORD kDispositions[] = {3, 5, 4, 2};
+    for (int access = kOpenRead; access <= kOpenReadWrite; ++access) {
+        for (int creation = kOpenExisting; creation <= kCreateAlways; ++creation) {
+            EXPECT_TRUE(ThrowsRuntimeError("CreateFileW failed",
+                                           [&] { WinCalls::Open(path, access, creation); }));
+            const Opening& last = openings.back();
+            EXPECT_EQ(last.path, path);
+            EXPECT_EQ(last.access, kAccess[access - kOpenRead]);
+            EXPECT_EQ(last.share, 7U);
+            EXPECT_EQ(last.security, nullptr);
+            EXPECT_EQ(last.disposition, kDispositions[creation - kOpenExisting]);
+            EXPECT_EQ(last.attributes, 0x80U);
+            EXPECT_EQ(last.likeFile, nullptr);
+        }
+    }
+    EXPECT_EQ(openings.size(), 12U);
+}
+
 TEST(WinHandle, TemporaryDirectoryIsTheUsersFolder)
 {
     wchar_t buffer[MAX_PATH] = {};
