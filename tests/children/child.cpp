@@ -33,11 +33,16 @@ namespace {
 
 void WriteArguments(const std::vector<std::string>& arguments, int first)
 {
+    static const char kDigits[] = "0123456789abcdef";
+    std::string text;
     for (auto index = static_cast<std::size_t>(first); index < arguments.size(); ++index) {
-        for (const char byte : arguments[index])
-            std::printf("%02x", static_cast<unsigned>(static_cast<unsigned char>(byte)));
-        std::printf("\n");
+        for (const char byte : arguments[index]) {
+            const auto value = static_cast<unsigned char>(byte);
+            text += {kDigits[value / 16], kDigits[value % 16]};
+        }
+        text += '\n';
     }
+    std::fwrite(text.data(), 1, text.size(), stdout);
 }
 
 void Echo()

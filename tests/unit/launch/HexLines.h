@@ -20,4 +20,18 @@ inline std::vector<std::string> DecodeHexLines(const std::string& hexadecimal)
     return result;
 }
 
+inline std::string EncodeHexLines(const std::vector<std::string>& texts)
+{
+    static const char kDigits[] = "0123456789abcdef";
+    std::string lines;
+    for (const std::string& text : texts) {
+        for (const char byte : text) {
+            const auto value = static_cast<unsigned char>(byte);
+            lines += {kDigits[value / 16], kDigits[value % 16]};
+        }
+        lines += '\n';
+    }
+    return lines;
+}
+
 } // namespace pmutil

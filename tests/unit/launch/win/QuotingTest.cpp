@@ -5,6 +5,7 @@
 
 #include <shellapi.h>
 
+#include <cstdio>
 #include <cstdlib>
 #include <functional>
 #include <gtest/gtest.h>
@@ -74,7 +75,11 @@ public:
     using Check = std::function<void(const Texts& texts)>;
 
     explicit Batch(Check check) : fCheck(std::move(check)) {}
-    ~Batch() { Flush(); }
+    ~Batch()
+    {
+        Flush();
+        std::printf("quoting: %lld texts on %lld command lines\n", fNumTexts, fNumLines);
+    }
     Batch(const Batch&) = delete;
     Batch& operator=(const Batch&) = delete;
 
@@ -91,8 +96,11 @@ public:
 private:
     void Flush()
     {
-        if (!fTexts.empty())
+        if (!fTexts.empty() && !testing::Test::HasFatalFailure()) {
             fCheck(fTexts);
+            fNumTexts += static_cast<long long>(fTexts.size());
+            ++fNumLines;
+        }
         fSize = 0;
         fTexts.clear();
     }
@@ -100,6 +108,8 @@ private:
     const Check fCheck;
     std::size_t fSize = 0;
     Texts fTexts;
+    long long fNumTexts = 0;
+    long long fNumLines = 0;
 };
 
 void CheckWithTheShell(const Texts& texts)
@@ -124,7 +134,8 @@ void CheckWithAChild(const Texts& texts)
     const RunResult run = RunProgram(boost::nowide::narrow(TEST_CHILD), args);
     ASSERT_EQ(run.fEnd, State::kFinished);
     args.erase(args.begin());
-    ASSERT_EQ(DecodeHexLines(run.fOutput), args);
+    if (run.fOutput != EncodeHexLines(args))
+        ASSERT_EQ(DecodeHexLines(run.fOutput), args);
 }
 
 TEST(Quoting, DoublesOnlyTheBackslashesThatNeedIt)
@@ -153,7 +164,7 @@ TEST(Quoting, TheRuntimeOfAChildReadsBackEveryText)
     Batch batch(CheckWithAChild);
     const auto add = [&](const std::wstring& text) { batch.Add(text); };
     ForEachText(kKinds, IsLong() ? 8 : 6, add);
-    ForEachText(kHard, IsLong() ? 6 : 4, add);
+    ForEachText(kHard, IsLong() ? 8 : 4, add);
     ForRandomTexts(2'000, 200, add);
 }
 
