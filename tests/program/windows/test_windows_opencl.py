@@ -2,25 +2,15 @@
 
 import pytest
 
-from clmodel import ClGpu, ClPlatform, cl_script_of, cl_values_of
-from conftest import BUILD, OPENCL_GPU, gpu_of, run_under_wine
+from clmodel import ClGpu, ClPlatform, cl_values_of
+from conftest import OPENCL_GPU, gpu_of, run_under_wine, scripted_opencl
 from model import check, predict
-
-# Wine passes OpenCL calls on to Linux drivers, so that the scripted one is that of the Linux build.
-DRIVER = BUILD.parent / "linux" / "drivers" / "opencl"
-
 
 @pytest.fixture
 def scripted(tmp_path):
     """Runs the program on scripted OpenCL platforms."""
-    if not DRIVER.exists():
-        pytest.skip(f"the scripted OpenCL driver isn't built: {DRIVER}")
-
     def run(platforms, *arguments, extra=""):
-        script = tmp_path / "script"
-        script.write_text(cl_script_of(platforms) + extra)
-        return run_under_wine(*arguments, OCL_ICD_VENDORS=str(DRIVER),
-                              OCL_ICD_PLATFORM_SORT="none", ASSAY_SCRIPTED_OPENCL=str(script))
+        return run_under_wine(*arguments, **scripted_opencl(tmp_path, platforms, extra))
     return run
 
 
