@@ -8,9 +8,10 @@ from conftest import TREE
 COUNTERPARTS = {
     "test_command_line": "test_windows_command_line",
     "test_host_end": "test_windows_host",
+    "test_host_help": "test_windows_host",
     "test_host_hostile": "test_windows_host",
     "test_host_run": "test_windows_host",
-    "test_host_torture": "test_windows_host",
+    "test_host_torture": "test_windows_torture",
     "test_opencl": "test_windows_opencl",
     "test_steps": "test_windows",
     "test_verbose": "test_windows",
@@ -27,7 +28,6 @@ LEFT_OUT = {
     "the system's own calls; those of Windows have tests of their own": {
         "unit/launch", "unit/pmutil", "unit/supervise"},
     "Linux's own files and terminals": {"unit/facts", "unit/output"},
-    "the help is the same text on both": {"program/test_host_help"},
     "the peak memory of a host is measured by getrusage": {"program/test_host_memory"},
 }
 

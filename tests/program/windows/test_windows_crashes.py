@@ -50,7 +50,7 @@ def test_bare(prefix, how, code, _):
 
 @pytest.mark.parametrize("how, code, verdict", ENDS, ids=IDS)
 def test_judged(prefix, how, code, verdict):
-    run = run_under_wine("run", "--format", "json", "--timeout", "60", program=HOST,
+    run = run_under_wine("run", "--format", "json", "--timeout", "200", program=HOST,
                          ASSAY_MISBEHAVE=how, **prefix)
     outcome = json.loads(run.out)["outcome"]
     assert outcome["verdict"] == verdict

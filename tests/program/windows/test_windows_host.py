@@ -11,9 +11,11 @@ from pathlib import Path
 
 import pytest
 
-from clmodel import ClGpu, ClPlatform, cl_script_of
-from conftest import BUILD, NO_OPENCL_PLATFORM, OPENCL_GPU, TREE, run_under_wine, wine_desktop
+from clmodel import ClGpu, ClPlatform
+from conftest import (
+    BUILD, NO_OPENCL_PLATFORM, SECONDS, TREE, run_under_wine, scripted_opencl, wine_desktop)
 from harness import text_of
+from test_host_help import HELP
 
 sys.path.insert(0, str(TREE / "tests" / "schema"))
 pytest.importorskip("jsonschema", reason="python3-jsonschema isn't there")
@@ -23,9 +25,9 @@ from validate import report_bytes, validate_document, validate_events  # noqa: E
 HOST = BUILD / "bin" / "assay-host.exe"
 CHILD = BUILD / "bin" / "test_child.exe"
 REPORT = ["out", 'assayStart="x"', "out", 'assayEnd="y"']
-# Includes the start of Wine, in seconds.
-SLACK = 4.0
-TIMEOUT = 2.0
+# In seconds: more than a child needs, and the time for one that hangs.
+TIMEOUT = 120
+HANG_TIMEOUT = 10
 
 
 @pytest.fixture(autouse=True, scope="module")
@@ -46,11 +48,8 @@ def document_of(run):
 
 
 def run_child(*words, timeout=TIMEOUT, program=CHILD):
-    start = time.monotonic()
-    run = host_run("run", "--assay", str(program), "--format", "json", "--timeout", str(timeout),
-                   "--", *words)
-    assert time.monotonic() - start < timeout + 2 + SLACK
-    return document_of(run)
+    return document_of(host_run("run", "--assay", str(program), "--format", "json", "--timeout",
+                                str(timeout), "--", *words))
 
 
 def test_complete():
@@ -100,7 +99,7 @@ def test_crash():
 
 
 def test_hang():
-    document = run_child("out", "a=1", "sleep", "60000")
+    document = run_child("out", "a=1", "sleep", "600000", timeout=HANG_TIMEOUT)
     assert document["outcome"]["verdict"] == "hung"
     assert not document["outcome"]["leftBehind"]
     assert report_bytes(document).rstrip() == b"a=1"
@@ -115,18 +114,17 @@ def test_never_started(tmp_path):
 
 
 def test_grandchild_with_the_pipe():
-    start = time.monotonic()
-    document = run_child(*REPORT, "spawn", "77000", timeout=30)
-    assert time.monotonic() - start < 2 + SLACK
+    """It is ended with the child, long before it ends itself."""
+    document = run_child(*REPORT, "spawn", "770000")
     assert document["outcome"]["verdict"] == "complete"
     assert not document["outcome"]["leftBehind"]
-    left = subprocess.run(["pgrep", "-f", "test_child.exe sleep 77000"], stdout=subprocess.PIPE,
+    left = subprocess.run(["pgrep", "-f", "test_child.exe sleep 770000"], stdout=subprocess.PIPE,
                           check=False)
     assert left.stdout == b""
 
 
 def test_flood():
-    document = run_child(*REPORT, "flood", "300000000", timeout=60)
+    document = run_child(*REPORT, "flood", "300000000")
     assert document["outcome"]["verdict"] == "complete"
     assert document["outcome"]["lostOutputBytes"] > 280_000_000
 
@@ -181,7 +179,7 @@ class Running:
         return found
 
     def until_child(self, there):
-        deadline = time.monotonic() + 60
+        deadline = time.monotonic() + SECONDS
         while bool(self.numbers(of_host=False)) != there:
             assert time.monotonic() < deadline, f"no child: {not there}"
             time.sleep(0.05)
@@ -199,15 +197,15 @@ class Running:
 def test_reader_that_does_not_read():
     """The child is still killed in time."""
     read, write = os.pipe()
-    with Running("flood", "300000", options=["--format", "jsonl", "--timeout", "3"],
-                 stdout=write) as running:
+    options = ["--format", "jsonl", "--timeout", str(HANG_TIMEOUT)]
+    with Running("flood", "300000", options=options, stdout=write) as running:
         os.close(write)
         running.until_child(there=True)
         running.until_child(there=False)
         assert running.process.poll() is None # it still waits for the reader
         with os.fdopen(read, "rb") as reader:
             data = reader.read()
-        assert running.process.wait(60) == 4
+        assert running.process.wait(SECONDS) == 4
     assert b'"verdict":"hung"' in data
 
 
@@ -220,27 +218,15 @@ def test_killed_host():
         running.until_child(there=False)
 
 
-def test_help_and_version():
+def test_version():
     assert host_run("--version").out.startswith(b"assay-host ")
-    assert len(host_run("run", "--help").lines) <= 24
     assert host_run("bogus").status == 10
 
 
-def test_torture():
-    run = host_run("torture")
-    assert run.status == 0, text_of(run.out)
-    assert re.search(r"92 runs, each as predicted", text_of(run.out))
-
-
-def test_torture_with_opencl():
-    run = run_under_wine("torture", "--kind", "crash", program=HOST, **OPENCL_GPU)
-    if " and 0 OpenCL" in text_of(run.out):
-        pytest.skip("no OpenCL driver here presents a GPU")
-    assert run.status == 0, text_of(run.out)
-
-
-# Wine passes OpenCL calls on to Linux drivers, so that the scripted one is that of the Linux build.
-DRIVER = BUILD.parent / "linux" / "drivers" / "opencl"
+@pytest.mark.parametrize("command", HELP, ids=str)
+def test_help(command):
+    run = host_run(*filter(None, [command]), "--help")
+    assert (run.status, text_of(run.out), run.errors) == (0, HELP[command], [])
 
 
 @pytest.mark.parametrize("rule, verdict, key", [
@@ -250,13 +236,9 @@ DRIVER = BUILD.parent / "linux" / "drivers" / "opencl"
     ("at clCreateBuffer error CL_OUT_OF_RESOURCES", "failed-tests", None),
 ])
 def test_opencl_drivers(tmp_path, rule, verdict, key):
-    if not DRIVER.exists():
-        pytest.skip(f"the scripted OpenCL driver isn't built: {DRIVER}")
-    script = tmp_path / "script"
-    script.write_text(cl_script_of([ClPlatform([ClGpu()])]) + rule + "\n")
-    run = run_under_wine("run", "--format", "json", "--timeout", "4", program=HOST,
-                         OCL_ICD_VENDORS=str(DRIVER), OCL_ICD_PLATFORM_SORT="none",
-                         ASSAY_SCRIPTED_OPENCL=str(script))
+    timeout = 2 * HANG_TIMEOUT if verdict == "hung" else TIMEOUT
+    run = run_under_wine("run", "--format", "json", "--timeout", str(timeout), program=HOST,
+                         **scripted_opencl(tmp_path, [ClPlatform([ClGpu()])], rule + "\n"))
     document = document_of(run)
     assert document["outcome"]["verdict"] == verdict
     if key is not None:
