@@ -1,5 +1,5 @@
 // Listing the adapters of a machine with eight equal cards, compared with plain reads of the same
-// files. Goal: at most 5 ms longer.
+// files. Goal: at most 0.4 ms longer.
 #include <algorithm>
 #include <fstream>
 #include <set>

@@ -1,13 +1,18 @@
 // A supervised launch against the bare system calls: of a child that does nothing, and of one that
 // writes 1 GiB. With RESIDENT_BYTES set, in a process that holds that much memory.
+#include <array>
+#include <csignal>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include <fcntl.h>
+#include <poll.h>
 #include <spawn.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -68,6 +73,68 @@ void BareSpawn(benchmark::State& state)
     for (auto _ : state)
         if (!Await(Spawn({BENCHMARK_CHILD}, -1)))
             state.SkipWithError("the child failed");
+}
+
+// The system calls of a launch: three pipes for the child, the default signals, no other
+// descriptors, and a process descriptor to wait for its end.
+bool SpawnOnPipes()
+{
+    std::array<std::array<int, 2>, 3> pipes{};
+    for (auto& pipe : pipes)
+        if (::pipe2(pipe.data(), O_CLOEXEC) != 0)
+            return false;
+    ::fcntl(pipes[STDOUT_FILENO][1], F_SETPIPE_SZ, kWidePipe);
+    const std::array<int, 3> childEnds{pipes[0][0], pipes[1][1], pipes[2][1]};
+    const std::array<int, 3> ownEnds{pipes[0][1], pipes[1][0], pipes[2][0]};
+
+    posix_spawn_file_actions_t actions;
+    ::posix_spawn_file_actions_init(&actions);
+    for (int stream = 0; stream < 3; ++stream)
+        ::posix_spawn_file_actions_adddup2(&actions, childEnds[static_cast<std::size_t>(stream)],
+                                           stream);
+    ::posix_spawn_file_actions_addclosefrom_np(&actions, 3);
+    posix_spawnattr_t attributes;
+    ::posix_spawnattr_init(&attributes);
+    sigset_t all;
+    sigset_t none;
+    ::sigfillset(&all);
+    ::sigemptyset(&none);
+    ::posix_spawnattr_setsigdefault(&attributes, &all);
+    ::posix_spawnattr_setsigmask(&attributes, &none);
+    ::posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSIGMASK);
+
+    std::string program = BENCHMARK_CHILD;
+    std::array<char*, 2> argv{program.data(), nullptr};
+    pid_t child = -1;
+    const int failure =
+        ::posix_spawn(&child, argv[0], &actions, &attributes, argv.data(), ::environ);
+    ::posix_spawn_file_actions_destroy(&actions);
+    ::posix_spawnattr_destroy(&attributes);
+    for (const int end : childEnds)
+        ::close(end);
+    siginfo_t info{};
+    bool ended = false;
+    if (failure == 0) {
+        const int process = static_cast<int>(::syscall(SYS_pidfd_open, child, 0));
+        pollfd poll{process, POLLIN, 0};
+        ended = ::poll(&poll, 1, -1) == 1 &&
+                ::waitid(P_PIDFD, static_cast<id_t>(process), &info, WEXITED) == 0;
+        ::close(process);
+    }
+    for (const int end : ownEnds)
+        ::close(end);
+    return ended && info.si_code == CLD_EXITED && info.si_status == 0;
+}
+
+// The least that a launch on a thread of its own takes.
+void ThreadSpawn(benchmark::State& state)
+{
+    for (auto _ : state) {
+        bool ended = false;
+        std::thread([&] { ended = SpawnOnPipes(); }).join();
+        if (!ended)
+            state.SkipWithError("the child failed");
+    }
 }
 
 void LaunchAndWait(benchmark::State& state)
@@ -147,6 +214,7 @@ std::unique_ptr<char[]> Occupy(std::size_t bytes)
 } // namespace
 
 BENCHMARK(BareSpawn)->UseRealTime();
+BENCHMARK(ThreadSpawn)->UseRealTime();
 BENCHMARK(LaunchAndWait)->UseRealTime();
 
 int main(int argc, char** argv)
