@@ -323,6 +323,7 @@ TEST(JsonEvents, HaveTheirForms)
               Json::parse(R"({"event": "error", "seconds": 2.0, "text": "\uF780"})"));
     const Json end = SaveEvent(MakeFirstEndEvent(GoodOutcome()));
     EXPECT_EQ(Names(end), (std::vector<std::string>{"event", "seconds", "outcome"}));
+    EXPECT_EQ(end["event"], "end");
     EXPECT_EQ(end["seconds"], 0.25);
     EXPECT_EQ(end["outcome"], Document("")["outcome"]);
 }

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <iterator>
 #include <ostream>
 #include <string>
 
@@ -183,6 +184,27 @@ TEST(Usable, IsUnknownWhereTheRunSaysNothing)
     RunOutcome ended;
     ended.fVerdict = Verdict::kFailedTests;
     EXPECT_EQ(Judge("words\n", ended), (Both{"unknown ended-before", "unknown ended-before"}));
+}
+
+TEST(GetUsabilityStatus, IsOneForEachState)
+{
+    EXPECT_EQ(GetUsabilityStatus(Usability::kHardware), 0);
+    EXPECT_EQ(GetUsabilityStatus(Usability::kSoftware), 20);
+    EXPECT_EQ(GetUsabilityStatus(Usability::kBroken), 21);
+    EXPECT_EQ(GetUsabilityStatus(Usability::kAbsent), 22);
+    EXPECT_EQ(GetUsabilityStatus(Usability::kUnknown), 23);
+}
+
+TEST(GetLesser, OrdersTheStates)
+{
+    const Usability order[] = {Usability::kBroken, Usability::kAbsent, Usability::kUnknown,
+                               Usability::kSoftware, Usability::kHardware};
+    for (auto less = std::begin(order); less != std::end(order); ++less) {
+        for (auto other = less; other != std::end(order); ++other) {
+            EXPECT_EQ(GetLesser(*less, *other), *less);
+            EXPECT_EQ(GetLesser(*other, *less), *less);
+        }
+    }
 }
 
 TEST(Usable, SaysWhichDeviceIsMeant)
