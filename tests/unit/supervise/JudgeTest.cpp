@@ -101,6 +101,9 @@ TEST(Judge, DetectsAUsageErrorByStatusAndText)
 {
     const std::vector<std::string> usage = {"Usage exception: usage", "usage: "};
     EXPECT_EQ((Case{"# text\n", usage, {}, Ended(3)}.Judge().fVerdict), Verdict::kUsageError);
+    for (const std::string& line : usage)
+        EXPECT_EQ((Case{"", {"text", line}, {}, Ended(3)}.Judge().fVerdict), Verdict::kUsageError);
+    EXPECT_EQ((Case{"", {"no usage: "}, {}, Ended(3)}.Judge().fVerdict), Verdict::kFailedTests);
     EXPECT_EQ((Case{"", {}, {}, Ended(3)}.Judge().fVerdict), Verdict::kFailedTests);
     EXPECT_EQ((Case{"", usage, {}, Ended(4)}.Judge().fVerdict), Verdict::kFailedTests);
     EXPECT_EQ((Case{kWhole, usage, {"-exit=3"}, Ended(3)}.Judge().fVerdict), Verdict::kComplete);

@@ -3,7 +3,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <functional>
+#include <iterator>
 
 #include "support/Reports.h"
 
@@ -226,6 +228,24 @@ TEST(StepRules, RejectOtherRuns)
     broken.erase(broken.begin() + 20);
     EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(broken), MakeOutcome(2)); }),
                 HasSubstr("no line for"));
+}
+
+TEST(StepRules, RejectAFailureThatIsNotNamed)
+{
+    std::vector<std::string> lines = Join(MakeWholeRun(0, 1));
+    lines.erase(std::prev(lines.end(), 2)); // CLCompute
+    EXPECT_EQ(GetFailure([&] { StepRules(ReadReport(lines), MakeOutcome(2)); }),
+              "clgpu[0] has lines missing, and standard error names no failure");
+}
+
+TEST(StepRules, RejectMoreDevicesThanAReportMayHave)
+{
+    std::vector<std::string> lines = Join(MakeWholeRun(0, -1));
+    const auto count = std::find(lines.begin(), lines.end(), "NumGLGPUs=0");
+    ASSERT_NE(count, lines.end());
+    *count = "NumGLGPUs=" + std::to_string(kMaxDevices + 1);
+    EXPECT_EQ(GetFailure([&] { StepRules(ReadReport(lines), MakeOutcome(2)); }),
+              "the report counts " + std::to_string(kMaxDevices + 1) + " devices");
 }
 
 TEST(ExpectedLine, MatchesByItsKind)
