@@ -5,6 +5,7 @@
 #include <cstring>
 
 #include <drm.h>
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <i915_drm.h>
@@ -20,11 +21,9 @@ namespace {
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 
-constexpr int kNode = 7;
-
 // The state of the fake kernel and the recorded calls.
 struct Kernel {
-    bool nodeOpens = true;
+    int node = 7;     // -1: none opens
     int failures = 0; // the number of next calls that fail with `error`
     int error = EINTR;
     std::string answer;
@@ -38,7 +37,7 @@ Kernel gKernel;
 int Open(const char* path)
 {
     gKernel.opened.emplace_back(path);
-    return gKernel.nodeOpens ? kNode : -1;
+    return gKernel.node;
 }
 
 const std::string& NextAnswer(bool again)
@@ -99,7 +98,7 @@ int AnswerInPlace(void* argument, std::size_t size)
 
 int Ioctl(int node, unsigned long request, void* argument)
 {
-    EXPECT_EQ(node, kNode);
+    EXPECT_EQ(node, gKernel.node);
     ++gKernel.ioctls;
     if (gKernel.failures > 0) {
         --gKernel.failures;
@@ -124,7 +123,7 @@ int Ioctl(int node, unsigned long request, void* argument)
 
 void Close(int node)
 {
-    EXPECT_EQ(node, kNode);
+    EXPECT_EQ(node, gKernel.node);
     ++gKernel.closed;
 }
 
@@ -154,9 +153,17 @@ TEST_P(DrmQueryTest, TheAnswerIsReturnedUnchanged)
     EXPECT_EQ(gKernel.closed, 1);
 }
 
+// A host may start this program without standard input.
+TEST_P(DrmQueryTest, ANodeMayHaveTheNumberOfStandardInput)
+{
+    gKernel.node = 0;
+    EXPECT_EQ(Ask(driver()), gKernel.answer);
+    EXPECT_EQ(gKernel.closed, 1);
+}
+
 TEST_P(DrmQueryTest, ANodeThatCannotBeOpenedIsEmpty)
 {
-    gKernel.nodeOpens = false;
+    gKernel.node = -1;
     EXPECT_EQ(Ask(driver()), "");
     EXPECT_EQ(gKernel.ioctls, 0);
     EXPECT_EQ(gKernel.closed, 0);
@@ -228,6 +235,21 @@ TEST(DrmQueriesTest, AnAnswerMayBeAsLargeAsARecordedOne)
         gKernel.answer += 'x';
         EXPECT_EQ(Ask(driver), "") << driver;
     }
+}
+
+TEST(DrmQueriesTest, TheSystemsCallsReachTheFile)
+{
+    const DrmCalls& calls = SystemDrmCalls();
+    EXPECT_EQ(calls.open("/no/such/node"), -1);
+    EXPECT_EQ(errno, ENOENT);
+    const int node = calls.open("/dev/null");
+    ASSERT_GE(node, 0);
+    EXPECT_EQ(::fcntl(node, F_GETFD), FD_CLOEXEC);
+    EXPECT_EQ(::fcntl(node, F_GETFL) & (O_ACCMODE | O_NONBLOCK), O_RDWR | O_NONBLOCK);
+    EXPECT_EQ(calls.ioctl(node, DRM_IOCTL_RADEON_GEM_INFO, nullptr), -1);
+    EXPECT_EQ(errno, ENOTTY);
+    calls.close(node);
+    EXPECT_EQ(::fcntl(node, F_GETFD), -1);
 }
 
 TEST(DrmQueriesTest, OtherDriversAreNotQueried)
