@@ -387,6 +387,13 @@ TEST_F(OCLTest, AFailedValueThrows)
     answers()[CL_DEVICE_GLOBAL_MEM_SIZE].valueStatus = CL_INVALID_DEVICE;
     EXPECT_EQ(FailureOf([&] { (void)device.getInfo<cl_ulong>(DeviceProperty::GlobalMemSize); }),
               "clGetDeviceInfo(CL_DEVICE_GLOBAL_MEM_SIZE) failed: CL_INVALID_DEVICE (-33)");
+    answers()[0x1000].valueStatus = CL_INVALID_VALUE;
+    cl_uint other = 0;
+    EXPECT_EQ(FailureOf([&] {
+                  device.getInfoImpl(static_cast<DeviceProperty>(0x1000), sizeof other, &other,
+                                     nullptr);
+              }),
+              "clGetDeviceInfo failed: CL_INVALID_VALUE (-30)");
 }
 
 TEST_F(OCLTest, ContextAndQueueAreReleasedInReverseOrder)
@@ -520,6 +527,15 @@ TEST(OCLFunctionTableTest, FillsTheOthersWhenOneIsMissing)
 TEST(OCLLibraryTest, AMissingFileIsNotAvailable)
 {
     EXPECT_FALSE(QGF::OCL::Library::IsOpenCLAvailable("no-such-library-anywhere"));
+}
+
+TEST(OCLLibraryTest, AnotherLibraryIsNotAvailable)
+{
+#if defined(_WIN32)
+    EXPECT_FALSE(QGF::OCL::Library::IsOpenCLAvailable("kernel32.dll"));
+#else
+    EXPECT_FALSE(QGF::OCL::Library::IsOpenCLAvailable("libc.so.6"));
+#endif
 }
 
 } // namespace
