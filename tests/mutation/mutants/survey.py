@@ -1,5 +1,5 @@
-"""Which mutants each test asks for while none is on, and how long it takes; kept until a program or
-a test changes."""
+"""Which mutants each test asks for while none is on, and how long it takes; kept for each program until
+it or its tests change."""
 import hashlib
 import json
 import re
@@ -12,6 +12,8 @@ from mutants.workshop import TARGETS, run
 
 # Cases of one job: the jobs go on side by side.
 CHUNK = 100
+# Stands for the tests of whole programs, beside the paths of the programs of unit tests.
+PROGRAM = "program"
 
 
 class Survey:
@@ -26,42 +28,44 @@ class Survey:
         return {"board": str(shop.board), "size": self.size, "tree": str(shop.tree),
                 "build": str(shop.build), "program_tests": tests, **more}
 
-    def state(self):
-        state = hashlib.sha256()
-        programs = sorted((self.workshop.build / "bin").glob("*"))
-        for path in [*programs, *sorted((self.workshop.tree / "tests" / "program").glob("*.py"))]:
-            state.update(path.read_bytes())
-        return state.hexdigest()
+    def states(self):
+        """What the survey of each program of unit tests, and that of the program tests, depends on."""
+        folder = self.workshop.build / "bin"
+        others = hashlib.sha256()
+        for path in sorted(folder.glob("*")):
+            if path.name not in TARGETS:
+                others.update(path.read_bytes())
+        states = {str(folder / target): digest(others, [folder / target])
+                  for target in TARGETS if (folder / target).exists()}
+        if self.with_program:
+            tests = sorted((self.workshop.tree / "tests" / "program").glob("*.py"))
+            states[PROGRAM] = digest(others, tests)
+        return states
 
     def take(self):
-        kept = self.folder / f"survey-{'all' if self.with_program else 'unit'}.json"
-        state = self.state()
-        if kept.exists():
-            old = json.loads(kept.read_text())
-            if old["state"] == state:
-                self.cases = old["cases"]
-                return
+        kept = self.folder / "survey.json"
+        old = json.loads(kept.read_text()) if kept.exists() else {}
+        found = dict(old)
         with ThreadPoolExecutor(self.workshop.jobs) as pool:
-            for found in pool.map(self.look, self.parts()):
-                for program, cases in found.items():
-                    self.cases.setdefault(program, {}).update(cases)
-        for program, cases in self.cases.items():
-            for case in [case for case, found in cases.items() if not found["passed"]]:
-                print(f"not used, fails without a mutant: {Path(program).name} {case}", file=sys.stderr)
-                del cases[case]
-        kept.write_text(json.dumps({"state": state, "cases": self.cases}))
+            for name, state in self.states().items():
+                if old.get(name, {}).get("state") != state:
+                    found[name] = {"state": state, "cases": [pool.submit(self.look, job) for job in self.parts(name)]}
+            for name, survey in found.items():
+                if isinstance(survey["cases"], list):
+                    survey["cases"] = usable(name, [job.result() for job in survey["cases"]])
+                    # Those that are still to come are no part of the file.
+                    kept.write_text(json.dumps({name: each for name, each in found.items()
+                                                if isinstance(each["cases"], dict)}))
+        self.cases = {name: found[name]["cases"] for name in self.states()}
 
-    def parts(self):
-        if self.with_program:
+    def parts(self, name):
+        """The jobs by which to survey one program."""
+        if name == PROGRAM:
             yield self.job(what="survey", programs={})
-        for target in TARGETS:
-            program = self.workshop.build / "bin" / target
-            if not program.exists():
-                continue
-            cases = list_cases(program)
-            for start in range(0, len(cases), CHUNK):
-                yield {**self.job(what="survey", programs={str(program): cases[start:start + CHUNK]}),
-                       "program_tests": []}
+            return
+        cases = list_cases(Path(name))
+        for start in range(0, len(cases), CHUNK):
+            yield {**self.job(what="survey", programs={name: cases[start:start + CHUNK]}), "program_tests": []}
 
     def look(self, job):
         result, output = isolation.run(job, self.folder, 3600)
@@ -89,6 +93,22 @@ class Survey:
                   if not numbers.isdisjoint(each["reached"])}
         chosen = within_budget(asking, budget)
         return steps + ([("program", chosen)] if chosen else [])
+
+
+def digest(others, paths):
+    state = others.copy()
+    for path in paths:
+        state.update(path.read_bytes())
+    return state.hexdigest()
+
+
+def usable(name, results):
+    """The cases of a program's jobs that pass."""
+    cases = {case: found for result in results for each in result.values() for case, found in each.items()}
+    for case in [case for case, found in cases.items() if not found["passed"]]:
+        print(f"not used, fails without a mutant: {Path(name).name} {case}", file=sys.stderr)
+        del cases[case]
+    return cases
 
 
 def within_budget(seconds, budget):
