@@ -42,6 +42,8 @@ timed() {
     say "$what: done in $((SECONDS - start)) s"
 }
 
+project_version() { sed -n 's/^project(assay VERSION \([0-9.]*\).*/\1/p' CMakeLists.txt; }
+
 jobs=$(nproc)
 if command -v ccache >/dev/null; then
     export CMAKE_CXX_COMPILER_LAUNCHER=ccache CMAKE_C_COMPILER_LAUNCHER=ccache

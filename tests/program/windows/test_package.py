@@ -1,5 +1,6 @@
 """The zip of the Windows programs."""
 
+import json
 import os
 import re
 import shutil
@@ -38,11 +39,24 @@ def test_name_has_version_and_machine(package):
 
 def test_has_programs_documents_and_licences(package):
     assert {path.name for path in package.iterdir()} == {
-        "assay.exe", "assay-host.exe", "README.md", "docs", "schema", "licences", "check.cmd",
-        "check"}
+        "assay.exe", "assay-host.exe", "README.md", "docs", "schema", "check.cmd", "check",
+        "LICENSE", "CHANGELOG.md", "THIRD-PARTY-NOTICES.txt", "assay.spdx.json"}
     assert (package / "docs" / "report-format.md").stat().st_size > 0
-    for name in ["Boost", "GCC-runtime", "MinGW-w64", "CLI11", "fmt", "nlohmann-json"]:
-        assert (package / "licences" / f"{name}.txt").stat().st_size > 0
+    assert not list((package / "docs").rglob("*.scd"))
+
+
+LINKED = {"Boost", "fmt", "CLI11", "nlohmann-json", "GCC-runtime", "MinGW-w64-runtime"}
+
+
+def test_names_what_is_linked_in(package):
+    notices = (package / "THIRD-PARTY-NOTICES.txt").read_text(encoding="utf-8")
+    sbom = json.loads((package / "assay.spdx.json").read_text(encoding="utf-8"))
+    names = {each["SPDXID"]: each["name"] for each in sbom["packages"]}
+    linked = {names[each["relatedSpdxElement"]] for each in sbom["relationships"]
+              if each["relationshipType"] == "STATIC_LINK"}
+    assert linked == LINKED
+    for name in linked:
+        assert re.search(rf"^={{78}}\n{name} \d", notices, re.MULTILINE)
 
 
 def test_runs_in_an_empty_prefix(package, tmp_path):
