@@ -98,15 +98,20 @@ void ExpectOneKeyInAllOutputs(const Report& report, const RunOutcome& outcome,
     EXPECT_EQ(found.str(1), key);
 }
 
-TEST(NextLine, IsTheSameInAllOutputsOfCutReports)
+// A part of 20000 reports, so that several processes can share the work.
+class NextLineOfCutReports : public testing::TestWithParam<int> {};
+
+constexpr int kParts = 20;
+
+TEST_P(NextLineOfCutReports, IsTheSameInAllOutputs)
 {
-    constexpr int kReports = 20000;
+    constexpr int kReports = 20000 / kParts;
     constexpr int kFullInterval = 100; // of the reports that all outputs show
     std::vector<Report> runs = {ReadReport(Join(MakeWholeRun(1, -1)))};
     for (const auto& some : {MakeWholeRuns(), MakeFailingRuns(false), MakeFailingRuns(true)})
         for (const Lines& lines : some)
             runs.push_back(ReadReport(lines));
-    std::mt19937 random(20261121);
+    std::mt19937 random(20261121U + static_cast<unsigned>(GetParam()));
     int differing = 0;
     for (int number = 0; number < kReports; ++number) {
         const std::vector<ReportLine>& lines = runs[random() % runs.size()].GetLines();
@@ -129,6 +134,8 @@ TEST(NextLine, IsTheSameInAllOutputsOfCutReports)
     }
     EXPECT_EQ(differing, 0);
 }
+
+INSTANTIATE_TEST_SUITE_P(Part, NextLineOfCutReports, testing::Range(0, kParts));
 
 // Ends the report after each line, also before gputag lines and after failures in the log.
 TEST(NextLine, IsTheOneThatTheChildPrintsNext)
