@@ -106,12 +106,16 @@ class Cue:
 
 
 class Watched:
-    """A running assay-host. As a context manager, asserts at the end that no process of it is left."""
+    """A running assay-host. A child has no timeout unless the arguments have one. As a context manager,
+    asserts at the end that no process of it is left."""
 
     def __init__(self, *arguments, environment=None, stdin=subprocess.DEVNULL,
                  stdout=subprocess.PIPE, stderr=subprocess.PIPE, program=HOST_ON_CUE, **options):
         self.mark = f"ASSAY_TEST_MARK={uuid.uuid4()}".encode()
         name, value = self.mark.decode().split("=")
+        runs_children = program == HOST_ON_CUE and arguments[0] in ("run", "torture")
+        if runs_children and "--timeout" not in arguments:
+            arguments = [arguments[0], "--timeout", "0", *arguments[1:]]
         self.process = subprocess.Popen(
             [program, *arguments], stdin=stdin, stdout=stdout, stderr=stderr,
             env={**(os.environ if environment is None else environment), name: value}, **options)

@@ -249,7 +249,7 @@ def test_ignored_hangup_stays_ignored(tmp_path):
 
 
 def test_torture_is_interrupted(scene):
-    with Watched("torture", "--assay", scene.child, "--timeout", "0", stdout=scene.write,
+    with Watched("torture", "--assay", scene.child, stdout=scene.write,
                  environment={**os.environ, "READY": str(scene.ready)}) as watched:
         scene.await_ready()
         watched.process.send_signal(signal.SIGINT)
@@ -399,7 +399,7 @@ def test_background_of_a_terminal(tmp_path):
 def test_processor_time_that_is_used_up(tmp_path):
     """At the soft limit of processor time, the host gets SIGXCPU."""
     child = script_child(tmp_path, "setsid sleep 1000 & while :; do echo 'a=\"'; done")
-    with Watched("run", "--assay", child, "--timeout", "0", stdout=subprocess.DEVNULL,
+    with Watched("run", "--assay", child, stdout=subprocess.DEVNULL,
                  preexec_fn=lambda: resource.setrlimit(resource.RLIMIT_CPU, (1, 600))) as watched:
         assert watched.finish().status in (3, INTERRUPTED) # the child may reach the limit first
 
@@ -466,7 +466,7 @@ def test_sudden_end_again_and_again(tmp_path):
     chance = random.Random(rounds)
     for number in range(rounds):
         command = "torture" if number % 5 == 4 else "run"
-        with Watched(command, "--assay", child, "--timeout", "0", stdout=subprocess.DEVNULL,
+        with Watched(command, "--assay", child, stdout=subprocess.DEVNULL,
                      stderr=subprocess.DEVNULL, start_new_session=True) as watched:
             time.sleep(chance.uniform(0, 0.12 if not SANITIZED_BY else 0.5))
             chance.choice(ENDS)(watched)

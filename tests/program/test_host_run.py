@@ -173,7 +173,7 @@ def test_opencl_drivers(host, rule, verdict, key):
 def test_interrupt_keeps_the_report(host, form, number):
     environment = host.environment(opencl="absent",
                                    **scripted(host.fresh_record() + "at glLinkProgram hang"))
-    with Watched("run", "--assay", PROGRAM, "--format", form, "--timeout", "0",
+    with Watched("run", "--assay", PROGRAM, "--format", form,
                  environment=environment) as watched:
         until(lambda: host.has_called("glLinkProgram"), "the call isn't made")
         watched.process.send_signal(number)
@@ -226,7 +226,7 @@ def test_any_bytes_of_a_driver(host, text):
 def test_events_come_as_they_happen(host):
     """The lines of a child that hangs are already written."""
     environment = host.environment(opencl="absent", **scripted("at glLinkProgram hang"))
-    with Watched("run", "--assay", PROGRAM, "--format", "jsonl", "--timeout", "0",
+    with Watched("run", "--assay", PROGRAM, "--format", "jsonl",
                  environment=environment) as watched:
         seen = b""
         while b"GLDriverDate" not in seen:
@@ -271,7 +271,7 @@ def test_progress_only_on_a_terminal(host):
     environment = host.environment(opencl="absent", **scripted("at glLinkProgram hang"))
     progress = re.compile(rb"\r\d+\.\d s, \d+ steps, at glgpu\[0\]\.CanCompileProgramGLSL")
     control, terminal = pty.openpty()
-    with Watched("run", "--assay", PROGRAM, "--timeout", "0", environment=environment,
+    with Watched("run", "--assay", PROGRAM, environment=environment,
                  stderr=terminal) as watched:
         os.close(terminal)
         shown = b""

@@ -100,7 +100,7 @@ def test_failing_undisturbed_run(host, tmp_path):
 
 def test_interrupt(host, tmp_path):
     child = wrapped(tmp_path, "-crashAfter=5", f"touch {tmp_path}/there; sleep 1000000")
-    with Watched("torture", "--assay", child, "--timeout", "0",
+    with Watched("torture", "--assay", child,
                  environment=host.environment(script=Gpu().script(), opencl="absent")) as watched:
         until((tmp_path / "there").exists, "the run doesn't come")
         watched.process.send_signal(signal.SIGINT)
