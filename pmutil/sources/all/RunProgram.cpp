@@ -154,9 +154,13 @@ public:
             Launch();
             if (Follow())
                 Join();
-        } catch (const consoleapp::Exception&) {
+        } catch (const consoleapp::Exception& exc) {
             RethrowFailures(); // of the caller's functions first
-            throw;
+            // After the program's end, which may come before Launch returns, the launcher's only
+            // failure is to give up an output.
+            if (exc.GetTaskID() != TaskID::kLauncher || !fChild->GetEnd())
+                throw;
+            fResult.fIsOutputOpen = true;
         }
         RethrowFailures();
         SetEnd();
@@ -202,15 +206,8 @@ private:
     // Throws failures of the launch.
     void Join()
     {
-        try {
-            if (fLaunch.Wait(nullptr, ConsoleApp::GetDefaultWaitSeconds()) == State::kTimeout)
-                fResult.fIsOutputOpen = true;
-        } catch (const consoleapp::Exception& exc) {
-            // After the program's end, the launcher's only failure is to give up an output.
-            if (exc.GetTaskID() != TaskID::kLauncher || !fChild->GetEnd())
-                throw;
+        if (fLaunch.Wait(nullptr, ConsoleApp::GetDefaultWaitSeconds()) == State::kTimeout)
             fResult.fIsOutputOpen = true;
-        }
     }
 
     void CloseOutputs()
