@@ -3,7 +3,9 @@
 #include <string>
 #include <vector>
 
+#include "LongTimes.h"
 #include "TestChild.h"
+#include "supervise/ChildLauncher.h"
 #include "supervise/ChildRun.h"
 
 namespace assay_host {
@@ -31,7 +33,8 @@ RunOutcome RunWith(bool keepCauses, std::vector<std::string> args, Lines& lines)
     options.fTimeoutSeconds = 0;
     options.fKeepCauses = keepCauses;
     pmutil::StopRequest stop;
-    return RunChild(options, lines, stop);
+    const pmutil::LongShortWait shortWait;
+    return RunChild(options, lines, stop, MakeChildLauncher(), GetLongTimes());
 }
 
 TEST(Causes, AreTakenFromTheLogThatIsAskedFor)

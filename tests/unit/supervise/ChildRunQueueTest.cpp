@@ -9,6 +9,7 @@
 #include <chrono>
 #include <deque>
 #include <functional>
+#include <optional>
 #include <stdexcept>
 #include <vector>
 
@@ -166,7 +167,16 @@ protected:
             fOnLine();
     }
 
-    RunOutcome Run() { return RunChild(fOptions, *this, fStop, fLauncher, fTimes); }
+    // The start takes what it takes; what is given up later isn't waited for.
+    RunOutcome Run()
+    {
+        fShortWait.emplace(static_cast<int>(pmutil::kLong));
+        const RunOutcome outcome = RunChild(fOptions, *this, fStop, fLauncher, fTimes);
+        fShortWait.reset();
+        return outcome;
+    }
+
+    void OnStart() override { fShortWait.emplace(0); }
 
     void PassTheTimeout() { fNow += std::chrono::seconds(30); }
 
@@ -186,6 +196,7 @@ protected:
     RunTimes fTimes;
     RunTimes::Clock::time_point fNow{std::chrono::seconds(1)};
     std::function<void()> fOnLine;
+    std::optional<pmutil::ShortWait> fShortWait;
     std::vector<std::string> fLines;
 };
 

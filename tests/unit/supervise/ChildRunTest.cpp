@@ -15,6 +15,7 @@
 #include <thread>
 #include <utility>
 
+#include "LongTimes.h"
 #include "TestChild.h"
 #include "pmutil/ConsoleApp.h"
 #include "pmutil/PMLogging.h"
@@ -51,15 +52,6 @@ private:
     const double fStep;
     double fSeconds = 1;
 };
-
-// Long enough on a busy machine for all that ends.
-RunTimes GetLongTimes()
-{
-    RunTimes times;
-    times.fKillGrace = times.fLastStreamGrace = RunTimes::Seconds(pmutil::kLong);
-    times.fTreeSeconds = times.fJoinSeconds = pmutil::kLong;
-    return times;
-}
 
 // Keeps what it is told.
 class Recorder : public RunObserver {

@@ -9,6 +9,7 @@
 #include <thread>
 #include <vector>
 
+#include "LongTimes.h"
 #include "TestChild.h"
 #include "pmutil/ChildCommand.h"
 #include "supervise/ChildRun.h"
@@ -18,14 +19,6 @@ namespace assay_host {
 namespace {
 
 const std::vector<std::string> kWhole = {"out", "assayStart=\"x\"", "out", "assayEnd=\"y\""};
-
-RunTimes GetLongTimes()
-{
-    RunTimes times;
-    times.fKillGrace = times.fLastStreamGrace = RunTimes::Seconds(pmutil::kLong);
-    times.fTreeSeconds = times.fJoinSeconds = pmutil::kLong;
-    return times;
-}
 
 struct StopAtFirstLine : RunObserver {
     void OnLine(const ReportLine& /*line*/, double /*seconds*/) override { fStop.Raise(); }
@@ -42,7 +35,12 @@ RunOutcome RunForeign(std::vector<std::string> args, RunObserver& observer,
     return RunChild(options, observer, stop, *MakeForeignContainment(), times);
 }
 
-TEST(ForeignContainment, ManyRunsAtOnceEndTheirOwnGrandchildren)
+class ForeignContainment : public testing::Test {
+private:
+    const pmutil::LongShortWait fLongShortWait;
+};
+
+TEST_F(ForeignContainment, ManyRunsAtOnceEndTheirOwnGrandchildren)
 {
     std::atomic<int> right{0};
     std::vector<std::thread> threads;
@@ -61,7 +59,7 @@ TEST(ForeignContainment, ManyRunsAtOnceEndTheirOwnGrandchildren)
     EXPECT_EQ(right, 8);
 }
 
-TEST(ForeignContainment, LeavesTheOtherChildrenOfTheHost)
+TEST_F(ForeignContainment, LeavesTheOtherChildrenOfTheHost)
 {
     const pmutil::ChildCommand command =
         pmutil::MakeChildCommand(TEST_CHILD, {"echo", "exit", "5"});
@@ -78,7 +76,7 @@ TEST(ForeignContainment, LeavesTheOtherChildrenOfTheHost)
     EXPECT_EQ(exitCode, 5);
 }
 
-TEST(ForeignContainment, ReportsACrash)
+TEST_F(ForeignContainment, ReportsACrash)
 {
     RunObserver observer;
     pmutil::StopRequest stop;
@@ -88,7 +86,7 @@ TEST(ForeignContainment, ReportsACrash)
                 testing::AnyOf(testing::StartsWith("signal "), testing::StartsWith("code 0x")));
 }
 
-TEST(ForeignContainment, ReportsAMissingProgram)
+TEST_F(ForeignContainment, ReportsAMissingProgram)
 {
     ChildOptions options;
     options.fProgram = "no-such-program";
@@ -101,7 +99,7 @@ TEST(ForeignContainment, ReportsAMissingProgram)
 }
 
 // The streams of a killed child aren't waited for, as nothing of use is to come.
-TEST(ForeignContainment, AKilledChildsGrandchildIsEndedAtOnce)
+TEST_F(ForeignContainment, AKilledChildsGrandchildIsEndedAtOnce)
 {
     RunTimes times = GetLongTimes();
     times.fStreamGrace = RunTimes::Seconds(pmutil::kLong);
