@@ -7,9 +7,9 @@
 #include <boost/filesystem/operations.hpp>
 #include <boost/nowide/convert.hpp>
 
-#include "../TempFolder.h"
-#include "../Throws.h"
+#include "TempFolder.h"
 #include "TestChild.h"
+#include "Throws.h"
 #include "pmutil/RunProgram.h"
 
 using namespace pmutil;
