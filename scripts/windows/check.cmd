@@ -30,7 +30,9 @@ call :check 1 "a child that ends early is reported"
 if "%1"=="quick" goto end
 set command=%host% torture
 call :check 0 "a failure at every step is as predicted"
-for %%t in (pmutil qgf gpu app report supervise output) do call :unit %%t
+pushd "%here%check"
+for %%t in (*_tests.exe) do call :unit %%t
+popd
 
 :end
 if %failed%==0 (echo All checks passed.) else (echo Some checks failed; see %log%.)
@@ -42,8 +44,8 @@ call :check 3 "a crash is reported: %1"
 goto :eof
 
 :unit
-set command="%here%check\%1_tests.exe" --gtest_brief=1
-call :check 0 "unit tests of %1"
+set command="%here%check\%1" --gtest_brief=1
+call :check 0 "unit tests: %1"
 goto :eof
 
 rem Runs the command. The first argument is the expected status, the second the text of the check.

@@ -79,7 +79,7 @@ def test_has_no_symbols_and_debug_sections(package):
 
 
 def test_check_script(package):
-    """The quick part of the script passes, and the unit tests for the whole of it are included."""
+    """The quick part of the script passes, and all unit tests are included for the whole of it."""
     run = run_under_wine("/c", "check.cmd", "quick", program="cmd.exe", cwd=package,
                          **NO_OPENCL_PLATFORM)
     assert run.status == 0, text_of(run.out)
@@ -88,20 +88,24 @@ def test_check_script(package):
     assert all(line.startswith("ok    ") for line in run.lines[:-1])
     script = (package / "check.cmd").read_bytes()
     assert b"\n" not in script.replace(b"\r\n", b""), "Windows' own line ends"
-    [units] = re.findall(rb"for %%t in \((.*)\) do call :unit", script)
-    assert {f"{unit}_tests.exe" for unit in units.decode().split()} | {"test_child.exe"} == {
+    units = {path.name for path in (TREE / "tests" / "unit").iterdir()} - {"support"}
+    assert {f"{unit}_tests.exe" for unit in units} | {"test_child.exe"} == {
         path.name for path in (package / "check").iterdir()}
 
 
 def test_check_script_names_what_fails(package, tmp_path):
     broken = tmp_path / "broken"
     shutil.copytree(package, broken)
-    shutil.copy(broken / "check" / "test_child.exe", broken / "assay.exe")
-    run = run_under_wine("/c", "check.cmd", "quick", program="cmd.exe", cwd=broken,
-                         **NO_OPENCL_PLATFORM)
+    child = broken / "check" / "test_child.exe"
+    units = sorted((broken / "check").glob("*_tests.exe"))
+    for program in [broken / "assay.exe", *units]:
+        shutil.copy(child, program)
+    run = run_under_wine("/c", "check.cmd", program="cmd.exe", cwd=broken, **NO_OPENCL_PLATFORM)
     assert run.status == 1
     assert "FAIL  assay prints a whole report: status 1 instead of 0" in run.lines
     assert "ok    assay-host starts" in run.lines
+    assert [line for line in run.lines if "unit tests" in line] == [
+        f"FAIL  unit tests: {unit.name}: status 98 instead of 0" for unit in units]
 
 
 def test_signature(package, tmp_path_factory):
