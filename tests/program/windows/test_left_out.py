@@ -27,7 +27,8 @@ LEFT_OUT = {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
         "unit/launch", "unit/pmutil", "unit/supervise"},
-    "Linux's own files and terminals": {"unit/facts", "unit/output"},
+    "Linux's own files, shells and terminals": {
+        "program/test_completions", "program/test_hardening", "unit/facts", "unit/output"},
     "the peak memory of a host is measured by getrusage": {"program/test_host_memory"},
 }
 
