@@ -1,0 +1,329 @@
+/* libassay-host: runs assay as a supervised child and tells whether OpenGL and OpenCL can be used.
+ *
+ * A driver that crashes or hangs ends only the child. docs/embedding.md leads from nothing to a
+ * decision.
+ *
+ * Sizes are in bytes, times in seconds. Texts passed in are UTF-8 and end with a zero byte. Texts
+ * returned end with a zero byte, belong to the object that returned them and live as long as it; a
+ * text of a driver may contain any bytes, also zero bytes, so that functions with `size` set it to
+ * the number of bytes (`size` may be null). No text returned is null, except as stated.
+ *
+ * Threads: any number of runs at a time. An options object may be read by several threads, and
+ * changed only while no other thread uses it. A result never changes: any thread may read it. A
+ * stop is for any thread.
+ *
+ * The host: the library installs no signal handler and changes neither the working directory, nor
+ * the locale, nor a descriptor of its host. Its threads have all signals blocked. On Linux the host
+ * may ignore SIGCHLD or wait for any child: it doesn't see the library's processes. If the host
+ * ends, even if it is killed, the child and its descendants are killed. The shared library can't be
+ * unloaded.
+ *
+ * Freeing null does nothing. Reading from null returns 0, an empty text, never-started or unknown.
+ */
+#ifndef ASSAY_HOST_H
+#define ASSAY_HOST_H
+
+#include <stddef.h>
+#include <stdint.h>
+
+#if defined(ASSAY_HOST_STATIC)
+#define ASSAY_HOST_API
+#elif defined(_WIN32) && defined(ASSAY_HOST_BUILDING)
+#define ASSAY_HOST_API __declspec(dllexport)
+#elif defined(_WIN32)
+#define ASSAY_HOST_API __declspec(dllimport)
+#elif defined(__GNUC__)
+#define ASSAY_HOST_API __attribute__((visibility("default")))
+#else
+#define ASSAY_HOST_API
+#endif
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/* --- Errors of calls ------------------------------------------------------------------------- */
+
+/* What a call returns. A run whose child fails is no error: its result has a verdict. Later
+ * versions may add numbers to every enumeration here. */
+typedef enum assay_host_error {
+    ASSAY_HOST_OK = 0,
+    ASSAY_HOST_NO_MEMORY = 1,    /* "out of memory" */
+    ASSAY_HOST_NULL_POINTER = 2, /* "a pointer is null" */
+    ASSAY_HOST_BAD_VALUE = 3,    /* "a value is out of its range" */
+    ASSAY_HOST_BAD_TEXT = 4,     /* "a text is empty" */
+    ASSAY_HOST_INTERNAL = 5      /* "the system refused a thread or another resource" */
+} assay_host_error;
+
+/* Returns the text above; "unknown error" for other numbers. */
+ASSAY_HOST_API const char* assay_host_error_text(assay_host_error error);
+
+/* Returns the version of the library, "1.0.0". */
+ASSAY_HOST_API const char* assay_host_version(void);
+
+/* --- Options --------------------------------------------------------------------------------- */
+
+/* What to run and how. */
+typedef struct assay_host_options assay_host_options;
+
+/* Makes options with the defaults below. Returns null if memory runs out. Free it with
+ * assay_host_options_free. */
+ASSAY_HOST_API assay_host_options* assay_host_options_new(void);
+ASSAY_HOST_API void assay_host_options_free(assay_host_options* options);
+
+/* Sets the path of the program to run. The default is the assay in the folder of the library, else
+ * the one in the folder of programs of the same installation (../bin or ../../bin from there). In a
+ * static library it is the folder of the program that the library is part of. The PATH isn't
+ * searched. Errors: null pointer, bad text, no memory. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_program(assay_host_options* options,
+                                                               const char* path);
+
+/* Adds an argument of the child, after those added before. Errors: null pointer, no memory. */
+ASSAY_HOST_API assay_host_error assay_host_options_add_argument(assay_host_options* options,
+                                                                const char* argument);
+
+/* Sets the time after which the child is killed; 0 for no limit; the default is 60. The child is
+ * killed at this time, and assay_host_run returns within the next second, usually within some
+ * milliseconds. It takes up to two seconds more only if the system can't end a process at once, as
+ * on a driver that blocks in the kernel. Errors: null pointer; bad value for a negative number or
+ * one that isn't finite. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_timeout(assay_host_options* options,
+                                                               double seconds);
+
+/* Set the limits of the report that is kept: all its bytes, those of a line, its lines. What
+ * exceeds them is read, dropped and counted. The defaults are 4 MiB, 64 KiB and 24576 lines.
+ * Errors: null pointer; bad value for 0 or more than 1 GiB (1 Gi lines). */
+ASSAY_HOST_API assay_host_error assay_host_options_set_max_bytes(assay_host_options* options,
+                                                                 uint64_t bytes);
+ASSAY_HOST_API assay_host_error assay_host_options_set_max_line_bytes(assay_host_options* options,
+                                                                      uint64_t bytes);
+ASSAY_HOST_API assay_host_error assay_host_options_set_max_lines(assay_host_options* options,
+                                                                 uint64_t lines);
+
+/* Whether the JSON document names this machine: 1 or 0, which is the default. Error: null
+ * pointer. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_identify(assay_host_options* options,
+                                                                int identify);
+
+/* Callbacks of a run, with the context of their setter. They are called on the thread of
+ * assay_host_run, one after the other, `seconds` after the launch. This thread supervises the
+ * child: a callback that blocks delays the timeout. It returns 0 to continue, or another number to
+ * end the run, with the verdict interrupted. It must not throw or jump out. Null: no callback,
+ * which is the default. */
+
+/* A line of the report, or of the child's standard error, without its line end. */
+typedef int (*assay_host_line_callback)(void* context, const char* line, size_t size,
+                                        double seconds);
+
+/* About ten times a second. `steps`: the steps that the report shows to be done. `next_key`: the
+ * key of the report's next line, which is what the child is doing; empty at the end. */
+typedef int (*assay_host_tick_callback)(void* context, double seconds, uint64_t steps,
+                                        const char* next_key);
+
+/* Error: null pointer, for the options. */
+ASSAY_HOST_API assay_host_error assay_host_options_on_line(assay_host_options* options,
+                                                           assay_host_line_callback callback,
+                                                           void* context);
+ASSAY_HOST_API assay_host_error assay_host_options_on_error_line(assay_host_options* options,
+                                                                 assay_host_line_callback callback,
+                                                                 void* context);
+ASSAY_HOST_API assay_host_error assay_host_options_on_tick(assay_host_options* options,
+                                                           assay_host_tick_callback callback,
+                                                           void* context);
+
+/* --- Runs ------------------------------------------------------------------------------------ */
+
+/* A request to end runs. */
+typedef struct assay_host_stop assay_host_stop;
+
+/* Returns null if memory runs out. Free it after the runs that got it have returned. */
+ASSAY_HOST_API assay_host_stop* assay_host_stop_new(void);
+ASSAY_HOST_API void assay_host_stop_free(assay_host_stop* stop);
+
+/* Ends the runs that got this stop, with the verdict interrupted, and all that get it later. Can't
+ * be withdrawn. Any thread may call, but no signal handler. Error: null pointer. */
+ASSAY_HOST_API assay_host_error assay_host_stop_raise(assay_host_stop* stop);
+
+/* What a run has brought. */
+typedef struct assay_host_result assay_host_result;
+
+/* Runs the child to its end, the timeout, or a stop (null: none), and sets `*result`, which the
+ * caller frees with assay_host_result_free. Null options: the defaults. On an error `*result` is
+ * null. Errors: null pointer, no memory, internal. */
+ASSAY_HOST_API assay_host_error assay_host_run(const assay_host_options* options,
+                                               assay_host_stop* stop, assay_host_result** result);
+ASSAY_HOST_API void assay_host_result_free(assay_host_result* result);
+
+/* --- How the run ended ----------------------------------------------------------------------- */
+
+typedef enum assay_host_verdict {
+    ASSAY_HOST_COMPLETE = 0,      /* a whole report, and no test failed */
+    ASSAY_HOST_FAILED_TESTS = 1,  /* the child ended by itself in any other way */
+    ASSAY_HOST_USAGE_ERROR = 2,   /* the child rejected its arguments */
+    ASSAY_HOST_CRASHED = 3,       /* a signal, or on Windows a code above 255, ended the child */
+    ASSAY_HOST_HUNG = 4,          /* the child was killed at the timeout */
+    ASSAY_HOST_NEVER_STARTED = 5, /* the child could not be started */
+    ASSAY_HOST_INTERRUPTED = 6    /* a stop or a callback ended the run */
+} assay_host_verdict;
+
+ASSAY_HOST_API assay_host_verdict assay_host_result_verdict(const assay_host_result* result);
+
+/* Returns "complete", "failed-tests", "usage-error", "crashed", "hung", "never-started" or
+ * "interrupted"; "unknown" for other numbers. */
+ASSAY_HOST_API const char* assay_host_verdict_name(assay_host_verdict verdict);
+
+/* Returns one sentence for the user, safe to write to a terminal. */
+ASSAY_HOST_API const char* assay_host_result_reason(const assay_host_result* result);
+
+/* Returns 1 and sets `*status` to the child's exit status if it ended by itself, otherwise returns
+ * 0. */
+ASSAY_HOST_API int assay_host_result_exit_status(const assay_host_result* result, int* status);
+
+/* Returns what ended a crashed child, such as "signal 11 (Segmentation fault)" or "code
+ * 0xC0000005"; otherwise an empty text. */
+ASSAY_HOST_API const char* assay_host_result_termination(const assay_host_result* result);
+
+/* Returns the time from the launch to the child's end. */
+ASSAY_HOST_API double assay_host_result_seconds(const assay_host_result* result);
+
+/* Return the last line of the report, and the last line of the child's log after it, which shows
+ * what the child was doing. Empty if there is none. */
+ASSAY_HOST_API const char* assay_host_result_last_line(const assay_host_result* result,
+                                                       size_t* size);
+ASSAY_HOST_API const char* assay_host_result_last_log_line(const assay_host_result* result,
+                                                           size_t* size);
+
+/* Return the lines of the child's standard error, without their line ends. Empty beyond the
+ * count. */
+ASSAY_HOST_API size_t assay_host_result_error_line_count(const assay_host_result* result);
+ASSAY_HOST_API const char* assay_host_result_error_line(const assay_host_result* result,
+                                                        size_t index, size_t* size);
+
+/* Return the bytes that the limits dropped of the report and of standard error. */
+ASSAY_HOST_API uint64_t assay_host_result_lost_bytes(const assay_host_result* result);
+ASSAY_HOST_API uint64_t assay_host_result_lost_error_bytes(const assay_host_result* result);
+
+/* Returns 1 if a process of the child could not be killed and may still run. */
+ASSAY_HOST_API int assay_host_result_left_behind(const assay_host_result* result);
+
+/* --- What can be used ------------------------------------------------------------------------ */
+
+typedef enum assay_host_interface {
+    ASSAY_HOST_OPENGL = 0,
+    ASSAY_HOST_OPENCL = 1
+} assay_host_interface;
+
+typedef enum assay_host_usability {
+    ASSAY_HOST_HARDWARE = 0, /* a device with graphics hardware passed its trials */
+    ASSAY_HOST_SOFTWARE = 1, /* only software renderers did */
+    ASSAY_HOST_BROKEN = 2,   /* the library or a device crashed, hung or failed */
+    ASSAY_HOST_ABSENT = 3,   /* there is no library or no device */
+    ASSAY_HOST_UNKNOWN = 4   /* the run doesn't show it */
+} assay_host_usability;
+
+ASSAY_HOST_API assay_host_usability assay_host_result_usable(const assay_host_result* result,
+                                                             assay_host_interface which);
+
+/* Returns "hardware", "software", "broken", "absent" or "unknown". */
+ASSAY_HOST_API const char* assay_host_usability_name(assay_host_usability usability);
+
+/* Return a stable identifier of the reason, one sentence for the user, and the tag of the device
+ * that decided, which is empty for none. docs/embedding.md has the reasons. */
+ASSAY_HOST_API const char* assay_host_result_usable_reason(const assay_host_result* result,
+                                                           assay_host_interface which);
+ASSAY_HOST_API const char* assay_host_result_usable_text(const assay_host_result* result,
+                                                         assay_host_interface which);
+ASSAY_HOST_API const char* assay_host_result_usable_device(const assay_host_result* result,
+                                                           assay_host_interface which);
+
+/* --- Warnings -------------------------------------------------------------------------------- */
+
+/* Return a stable identifier, the tag of the device (empty: of the whole run), the text for the
+ * user, and its cause from the child's log (empty if there is none). Empty beyond the count. */
+ASSAY_HOST_API size_t assay_host_result_warning_count(const assay_host_result* result);
+ASSAY_HOST_API const char* assay_host_result_warning_code(const assay_host_result* result,
+                                                          size_t index);
+ASSAY_HOST_API const char* assay_host_result_warning_device(const assay_host_result* result,
+                                                            size_t index);
+ASSAY_HOST_API const char* assay_host_result_warning_text(const assay_host_result* result,
+                                                          size_t index);
+ASSAY_HOST_API const char* assay_host_result_warning_cause(const assay_host_result* result,
+                                                           size_t index);
+
+/* --- Devices --------------------------------------------------------------------------------- */
+
+/* A device of the report. Belongs to the result. */
+typedef struct assay_host_device assay_host_device;
+
+/* The OpenGL devices, then the OpenCL devices, by index. Null beyond the count. */
+ASSAY_HOST_API size_t assay_host_result_device_count(const assay_host_result* result);
+ASSAY_HOST_API const assay_host_device* assay_host_result_device(const assay_host_result* result,
+                                                                 size_t index);
+
+/* Returns the tag, "glgpu[0]" or "clgpu[1]". */
+ASSAY_HOST_API const char* assay_host_device_tag(const assay_host_device* device);
+ASSAY_HOST_API assay_host_interface assay_host_device_interface(const assay_host_device* device);
+
+/* Returns 1 if the device has all answers, 1 if one of its tests failed, and 1 if it is a software
+ * renderer, -1 if its answers don't show that. */
+ASSAY_HOST_API int assay_host_device_complete(const assay_host_device* device);
+ASSAY_HOST_API int assay_host_device_failed(const assay_host_device* device);
+ASSAY_HOST_API int assay_host_device_software(const assay_host_device* device);
+
+/* --- Answers --------------------------------------------------------------------------------- */
+
+/* The answer to a key of the report: a value, or the reason why there is none. Belongs to the
+ * result. */
+typedef struct assay_host_answer assay_host_answer;
+
+typedef enum assay_host_kind {
+    ASSAY_HOST_NOTHING = 0, /* no line, or a value that stands for "not known" */
+    ASSAY_HOST_TEXT = 1,
+    ASSAY_HOST_NUMBER = 2,
+    ASSAY_HOST_LIST = 3 /* of numbers */
+} assay_host_kind;
+
+/* Returns the answer to a key: "NumGLGPUs", "glgpu[0].GLMemoryMB". Null if the report never has the
+ * key: neither the table of keys nor a line of it names it. */
+ASSAY_HOST_API const assay_host_answer* assay_host_result_find(const assay_host_result* result,
+                                                               const char* key);
+
+/* All answers: those without a tag, then those of each device. Null beyond the count. */
+ASSAY_HOST_API size_t assay_host_result_answer_count(const assay_host_result* result);
+ASSAY_HOST_API const assay_host_answer* assay_host_result_answer(const assay_host_result* result,
+                                                                 size_t index);
+
+/* Returns the key with its tag. */
+ASSAY_HOST_API const char* assay_host_answer_key(const assay_host_answer* answer);
+ASSAY_HOST_API assay_host_kind assay_host_answer_kind(const assay_host_answer* answer);
+
+/* Returns why there is nothing, in English, such as "device failed before"; "no such key" for a
+ * null answer; empty for an answer of another kind. */
+ASSAY_HOST_API const char* assay_host_answer_reason(const assay_host_answer* answer);
+
+/* Returns the value as the report has it, without quotes, for each kind. For nothing it may be what
+ * stands for "not known", such as "?"; empty without a line. */
+ASSAY_HOST_API const char* assay_host_answer_text(const assay_host_answer* answer, size_t* size);
+
+/* Returns a number; 0 for another kind. Integers are exact up to 2^53. */
+ASSAY_HOST_API double assay_host_answer_number(const assay_host_answer* answer);
+
+/* Returns 1 for yes, 0 for no, and -1 if the answer is no flag. */
+ASSAY_HOST_API int assay_host_answer_flag(const assay_host_answer* answer);
+
+/* Return the numbers of a list; 0 beyond the count. */
+ASSAY_HOST_API size_t assay_host_answer_list_size(const assay_host_answer* answer);
+ASSAY_HOST_API double assay_host_answer_list_item(const assay_host_answer* answer, size_t index);
+
+/* --- The document ---------------------------------------------------------------------------- */
+
+/* Returns the JSON document of the run, as assay-host run --format json writes it (schema 2). It is
+ * made at the first call. Null if memory runs out. */
+ASSAY_HOST_API const char* assay_host_result_document(const assay_host_result* result,
+                                                      size_t* size);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif
