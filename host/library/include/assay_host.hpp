@@ -1,0 +1,361 @@
+// A C++17 wrapper of libassay-host with value types. Header-only: the binary interface is that of
+// assay_host.h.
+//
+// A failed call throws std::bad_alloc, std::invalid_argument or std::runtime_error with the error's
+// text.
+#ifndef ASSAY_HOST_HPP
+#define ASSAY_HOST_HPP
+
+#include <cstddef>
+#include <cstdint>
+#include <exception>
+#include <functional>
+#include <memory>
+#include <new>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <variant>
+#include <vector>
+
+#include "assay_host.h"
+
+namespace assay {
+
+enum class Verdict {
+    complete = ASSAY_HOST_COMPLETE,
+    failed_tests = ASSAY_HOST_FAILED_TESTS,
+    usage_error = ASSAY_HOST_USAGE_ERROR,
+    crashed = ASSAY_HOST_CRASHED,
+    hung = ASSAY_HOST_HUNG,
+    never_started = ASSAY_HOST_NEVER_STARTED,
+    interrupted = ASSAY_HOST_INTERRUPTED
+};
+
+enum class Interface { opengl = ASSAY_HOST_OPENGL, opencl = ASSAY_HOST_OPENCL };
+
+enum class Usability {
+    hardware = ASSAY_HOST_HARDWARE,
+    software = ASSAY_HOST_SOFTWARE,
+    broken = ASSAY_HOST_BROKEN,
+    absent = ASSAY_HOST_ABSENT,
+    unknown = ASSAY_HOST_UNKNOWN
+};
+
+inline std::string to_string(Verdict verdict)
+{
+    return assay_host_verdict_name(static_cast<assay_host_verdict>(verdict));
+}
+
+inline std::string to_string(Usability usability)
+{
+    return assay_host_usability_name(static_cast<assay_host_usability>(usability));
+}
+
+// Whether an interface can be used, and why.
+struct Usable {
+    Usability usability = Usability::unknown;
+    std::string reason; // a stable identifier
+    std::string text;   // for the user
+    std::string device; // its tag; empty for none
+};
+
+struct Warning {
+    std::string code;   // a stable identifier
+    std::string device; // its tag; empty for the whole run
+    std::string text;   // for the user
+    std::string cause;  // from the child's log; may be empty
+};
+
+struct Device {
+    std::string tag; // "glgpu[0]"
+    Interface interface_kind = Interface::opengl;
+    bool complete = false;
+    bool failed = false;
+    std::optional<bool> software; // empty if its answers don't show it
+};
+
+// The answer to a key: a text, a number, a list of numbers, or nothing and the reason.
+struct Answer {
+    std::string key;
+    std::variant<std::monostate, std::string, double, std::vector<double>> value;
+    std::optional<bool> flag; // of a number that means yes or no
+    std::string text;         // as the report has it
+    std::string reason;       // why there is nothing
+
+    explicit operator bool() const { return value.index() != 0; }
+};
+
+// The callbacks are called on the thread of run(). One that returns false ends the run; one that
+// throws ends it too, and run() throws that exception.
+struct Options {
+    std::string program; // empty: the one beside the library
+    std::vector<std::string> arguments;
+    double timeout_seconds = 60; // 0: no limit
+    std::uint64_t max_bytes = 0; // 0: the default
+    std::uint64_t max_line_bytes = 0;
+    std::uint64_t max_lines = 0;
+    bool identify = false;
+    std::function<bool(std::string_view line, double seconds)> on_line;
+    std::function<bool(std::string_view line, double seconds)> on_error_line;
+    std::function<bool(double seconds, std::uint64_t steps, std::string_view next_key)> on_tick;
+};
+
+namespace detail {
+
+inline void check(assay_host_error error)
+{
+    switch (error) {
+    case ASSAY_HOST_OK:
+        return;
+    case ASSAY_HOST_NO_MEMORY:
+        throw std::bad_alloc();
+    case ASSAY_HOST_NULL_POINTER:
+    case ASSAY_HOST_BAD_VALUE:
+    case ASSAY_HOST_BAD_TEXT:
+        throw std::invalid_argument(assay_host_error_text(error));
+    default:
+        throw std::runtime_error(assay_host_error_text(error));
+    }
+}
+
+template <typename Object>
+Object* check_made(Object* object)
+{
+    if (object == nullptr)
+        throw std::bad_alloc();
+    return object;
+}
+
+struct Free {
+    void operator()(assay_host_options* object) const { assay_host_options_free(object); }
+    void operator()(assay_host_stop* object) const { assay_host_stop_free(object); }
+    void operator()(assay_host_result* object) const { assay_host_result_free(object); }
+};
+
+// The callbacks of one run, and the exception of one.
+struct Calls {
+    const Options& options;
+    std::exception_ptr failure;
+
+    template <typename Call>
+    int call(const Call& action) noexcept
+    {
+        try {
+            return action() ? 0 : 1;
+        } catch (...) {
+            failure = std::current_exception();
+            return 1;
+        }
+    }
+
+    static int take_line(void* context, const char* line, std::size_t size, double seconds)
+    {
+        auto& calls = *static_cast<Calls*>(context);
+        return calls.call([&] { return calls.options.on_line({line, size}, seconds); });
+    }
+
+    static int take_error_line(void* context, const char* line, std::size_t size, double seconds)
+    {
+        auto& calls = *static_cast<Calls*>(context);
+        return calls.call([&] { return calls.options.on_error_line({line, size}, seconds); });
+    }
+
+    static int take_tick(void* context, double seconds, std::uint64_t steps, const char* next_key)
+    {
+        auto& calls = *static_cast<Calls*>(context);
+        return calls.call([&] { return calls.options.on_tick(seconds, steps, next_key); });
+    }
+};
+
+} // namespace detail
+
+// Ends runs from any thread. Can't be withdrawn. Must outlive the runs.
+class Stop {
+public:
+    Stop() : fStop(detail::check_made(assay_host_stop_new())) {}
+    void raise() { detail::check(assay_host_stop_raise(fStop.get())); }
+    assay_host_stop* get() const { return fStop.get(); }
+
+private:
+    std::unique_ptr<assay_host_stop, detail::Free> fStop;
+};
+
+// What a run has brought. Copies share it, and any thread may read it.
+class Result {
+public:
+    // Takes the ownership.
+    explicit Result(assay_host_result* result) : fResult(result, detail::Free()) {}
+
+    Verdict verdict() const
+    {
+        return static_cast<Verdict>(assay_host_result_verdict(fResult.get()));
+    }
+    std::string reason() const { return assay_host_result_reason(fResult.get()); }
+    std::string termination() const { return assay_host_result_termination(fResult.get()); }
+    double seconds() const { return assay_host_result_seconds(fResult.get()); }
+    bool left_behind() const { return assay_host_result_left_behind(fResult.get()) != 0; }
+
+    std::optional<int> exit_status() const
+    {
+        int status = 0;
+        if (assay_host_result_exit_status(fResult.get(), &status) == 0)
+            return std::nullopt;
+        return status;
+    }
+
+    std::vector<std::string> error_lines() const
+    {
+        std::vector<std::string> lines;
+        const std::size_t count = assay_host_result_error_line_count(fResult.get());
+        for (std::size_t index = 0; index < count; ++index) {
+            std::size_t size = 0;
+            const char* const line = assay_host_result_error_line(fResult.get(), index, &size);
+            lines.emplace_back(line, size);
+        }
+        return lines;
+    }
+
+    Usable usable(Interface which) const
+    {
+        const auto number = static_cast<assay_host_interface>(which);
+        return {static_cast<Usability>(assay_host_result_usable(fResult.get(), number)),
+                assay_host_result_usable_reason(fResult.get(), number),
+                assay_host_result_usable_text(fResult.get(), number),
+                assay_host_result_usable_device(fResult.get(), number)};
+    }
+
+    std::vector<Warning> warnings() const
+    {
+        std::vector<Warning> warnings;
+        const std::size_t count = assay_host_result_warning_count(fResult.get());
+        for (std::size_t index = 0; index < count; ++index)
+            warnings.push_back({assay_host_result_warning_code(fResult.get(), index),
+                                assay_host_result_warning_device(fResult.get(), index),
+                                assay_host_result_warning_text(fResult.get(), index),
+                                assay_host_result_warning_cause(fResult.get(), index)});
+        return warnings;
+    }
+
+    std::vector<Device> devices() const
+    {
+        std::vector<Device> devices;
+        const std::size_t count = assay_host_result_device_count(fResult.get());
+        for (std::size_t index = 0; index < count; ++index) {
+            const assay_host_device* const device = assay_host_result_device(fResult.get(), index);
+            Device made;
+            made.tag = assay_host_device_tag(device);
+            made.interface_kind = static_cast<Interface>(assay_host_device_interface(device));
+            made.complete = assay_host_device_complete(device) != 0;
+            made.failed = assay_host_device_failed(device) != 0;
+            const int software = assay_host_device_software(device);
+            if (software >= 0)
+                made.software = software != 0;
+            devices.push_back(made);
+        }
+        return devices;
+    }
+
+    Answer find(const std::string& key) const
+    {
+        Answer answer = make(assay_host_result_find(fResult.get(), key.c_str()));
+        answer.key = key;
+        return answer;
+    }
+
+    std::vector<Answer> answers() const
+    {
+        std::vector<Answer> answers;
+        const std::size_t count = assay_host_result_answer_count(fResult.get());
+        for (std::size_t index = 0; index < count; ++index)
+            answers.push_back(make(assay_host_result_answer(fResult.get(), index)));
+        return answers;
+    }
+
+    // The JSON document.
+    std::string document() const
+    {
+        std::size_t size = 0;
+        const char* const text =
+            detail::check_made(assay_host_result_document(fResult.get(), &size));
+        return {text, size};
+    }
+
+    assay_host_result* get() const { return fResult.get(); }
+
+private:
+    static Answer make(const assay_host_answer* answer)
+    {
+        Answer made;
+        made.key = assay_host_answer_key(answer);
+        std::size_t size = 0;
+        const char* const text = assay_host_answer_text(answer, &size);
+        made.text.assign(text, size);
+        made.reason = assay_host_answer_reason(answer);
+        const int flag = assay_host_answer_flag(answer);
+        if (flag >= 0)
+            made.flag = flag != 0;
+        switch (assay_host_answer_kind(answer)) {
+        case ASSAY_HOST_TEXT:
+            made.value = made.text;
+            break;
+        case ASSAY_HOST_NUMBER:
+            made.value = assay_host_answer_number(answer);
+            break;
+        case ASSAY_HOST_LIST: {
+            std::vector<double> list(assay_host_answer_list_size(answer));
+            for (std::size_t index = 0; index < list.size(); ++index)
+                list[index] = assay_host_answer_list_item(answer, index);
+            made.value = std::move(list);
+            break;
+        }
+        default:
+            break;
+        }
+        return made;
+    }
+
+    std::shared_ptr<assay_host_result> fResult;
+};
+
+// Runs the child to its end, the timeout or a stop (null: none).
+inline Result run(const Options& options = {}, Stop* stop = nullptr)
+{
+    const std::unique_ptr<assay_host_options, detail::Free> made(
+        detail::check_made(assay_host_options_new()));
+    assay_host_options* const handle = made.get();
+    if (!options.program.empty())
+        detail::check(assay_host_options_set_program(handle, options.program.c_str()));
+    for (const std::string& argument : options.arguments)
+        detail::check(assay_host_options_add_argument(handle, argument.c_str()));
+    detail::check(assay_host_options_set_timeout(handle, options.timeout_seconds));
+    if (options.max_bytes != 0)
+        detail::check(assay_host_options_set_max_bytes(handle, options.max_bytes));
+    if (options.max_line_bytes != 0)
+        detail::check(assay_host_options_set_max_line_bytes(handle, options.max_line_bytes));
+    if (options.max_lines != 0)
+        detail::check(assay_host_options_set_max_lines(handle, options.max_lines));
+    detail::check(assay_host_options_set_identify(handle, options.identify ? 1 : 0));
+    detail::Calls calls{options, nullptr};
+    if (options.on_line)
+        detail::check(assay_host_options_on_line(handle, detail::Calls::take_line, &calls));
+    if (options.on_error_line)
+        detail::check(
+            assay_host_options_on_error_line(handle, detail::Calls::take_error_line, &calls));
+    if (options.on_tick)
+        detail::check(assay_host_options_on_tick(handle, detail::Calls::take_tick, &calls));
+    assay_host_result* result = nullptr;
+    const assay_host_error error =
+        assay_host_run(handle, stop != nullptr ? stop->get() : nullptr, &result);
+    std::unique_ptr<assay_host_result, detail::Free> owner(result);
+    if (calls.failure)
+        std::rethrow_exception(calls.failure);
+    detail::check(error);
+    return Result(owner.release());
+}
+
+} // namespace assay
+
+#endif
