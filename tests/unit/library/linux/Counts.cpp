@@ -1,0 +1,53 @@
+#include <dirent.h>
+#include <unistd.h>
+
+#include <fstream>
+#include <string>
+
+#include "Runs.h"
+
+namespace {
+
+long CountEntries(const char* folder)
+{
+    long count = 0;
+    DIR* const directory = ::opendir(folder);
+    while (::readdir(directory) != nullptr)
+        ++count;
+    ::closedir(directory);
+    return count;
+}
+
+// All processes whose parent this process is, whatever signal their end has.
+long CountChildren()
+{
+    long count = 0;
+    DIR* const folder = ::opendir("/proc");
+    const std::string parent = std::to_string(::getpid());
+    while (const dirent* entry = ::readdir(folder)) {
+        std::ifstream file("/proc/" + std::string(entry->d_name) + "/stat");
+        const std::string text((std::istreambuf_iterator<char>(file)), {});
+        const std::size_t name = text.rfind(')');
+        if (name != std::string::npos &&
+            text.compare(name + 4, parent.size() + 1, parent + " ") == 0)
+            ++count;
+    }
+    ::closedir(folder);
+    return count;
+}
+
+} // namespace
+
+Counts CountThings()
+{
+    return {CountEntries("/proc/self/task"), CountEntries("/proc/self/fd"), CountChildren()};
+}
+
+long GetMemoryKiB()
+{
+    std::ifstream file("/proc/self/status");
+    for (std::string line; std::getline(file, line);)
+        if (line.rfind("RssAnon:", 0) == 0)
+            return std::atol(line.c_str() + 8);
+    return 0;
+}
