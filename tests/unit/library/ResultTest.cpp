@@ -47,8 +47,8 @@ TEST(LibraryResult, AnswersHaveTheirKinds)
     EXPECT_EQ(assay_host_answer_flag(find("glgpu[0].GLMemoryMB")), -1);
 
     EXPECT_EQ(assay_host_answer_kind(find("glgpu[0].GLRenderer")), ASSAY_HOST_TEXT);
-    EXPECT_EQ(std::string(assay_host_answer_text(find("glgpu[0].GLRenderer"), &size), size),
-              "llvmpipe \xFF");
+    const char* const renderer = assay_host_answer_text(find("glgpu[0].GLRenderer"), &size);
+    EXPECT_EQ(std::string(renderer, size), "llvmpipe \xFF");
     EXPECT_EQ(assay_host_answer_number(find("glgpu[0].GLRenderer")), 0);
 
     const assay_host_answer* const list = find("glgpu[0].glGetIntegerv[GL_MAX_TEXTURE_UNITS]");

@@ -25,6 +25,8 @@ long CountChildren()
     DIR* const folder = ::opendir("/proc");
     const std::string parent = std::to_string(::getpid());
     while (const dirent* entry = ::readdir(folder)) {
+        if (entry->d_name[0] < '0' || entry->d_name[0] > '9')
+            continue;
         std::ifstream file("/proc/" + std::string(entry->d_name) + "/stat");
         const std::string text((std::istreambuf_iterator<char>(file)), {});
         const std::size_t name = text.rfind(')');
