@@ -88,7 +88,8 @@ def test_check_script(package):
     assert all(line.startswith("ok    ") for line in run.lines[:-1])
     script = (package / "check.cmd").read_bytes()
     assert b"\n" not in script.replace(b"\r\n", b""), "Windows' own line ends"
-    units = {path.name for path in (TREE / "tests" / "unit").iterdir()} - {"support"}
+    # libassay-host isn't built for Windows yet.
+    units = {path.name for path in (TREE / "tests" / "unit").iterdir()} - {"support", "library"}
     assert {f"{unit}_tests.exe" for unit in units} | {"test_child.exe"} == {
         path.name for path in (package / "check").iterdir()}
 

@@ -20,13 +20,6 @@ TEST(FormatTest, TextOfAnyLengthIsWhole)
     }
 }
 
-// A character that no locale can encode.
-TEST(FormatTest, AFailureIsAnEmptyText)
-{
-    const wchar_t bad[] = {0xDC00, 0};
-    EXPECT_EQ(FormatString("text %ls", bad), "");
-}
-
 TEST(FormatTest, HexFormatHasTwoDigitsPerByteAndTheModifier)
 {
     EXPECT_EQ(MakeHexFormat(4, ""), "0x%08x");
