@@ -222,8 +222,9 @@ bool WriterThread::Finish(std::optional<std::chrono::milliseconds> patience)
             before = state.fPieces;
         }
     }
+    // The caller gets the failure: the thread, which may end later, doesn't free it.
     if (state.fFailure != nullptr)
-        std::rethrow_exception(state.fFailure);
+        std::rethrow_exception(std::exchange(state.fFailure, nullptr));
     return true;
 }
 
