@@ -10,6 +10,7 @@ HERE = Path(__file__).resolve().parent
 sys.path.insert(0, str(HERE))
 pytest.importorskip("clang.cindex", reason="python3-clang-14 is missing")
 from mutants import clang, isolation, judged, schemata, sites  # noqa: E402
+from mutants.survey import ProgramTests  # noqa: E402
 
 SOURCE = """\
 #include <cstdio>
@@ -174,6 +175,41 @@ def test_a_mutant_can_leave_nothing_behind(cases):
     assert attempt(cases, 4)["verdict"] == "survived"
     assert not (cases[0] / "left").exists()
     assert not Path("/tmp/left").exists()
+
+
+PROGRAM_CASES = """\
+import signal
+def test_ends():
+    pass
+def test_never_ends():
+    while True:
+        signal.pause()
+def test_ends_too():
+    pass
+"""
+
+
+def test_the_survey_breaks_off_program_tests_that_take_too_long(cases):
+    folder, job = cases
+    file = folder / "test_some.py"
+    file.write_text(PROGRAM_CASES)
+    # Long enough for those that end, whatever else the machine does.
+    result, output = isolation.run({**job, "what": "survey", "programs": {}, "tree": str(folder), "slowest": 5,
+                                    "program_tests": [str(file)]}, folder, 100)
+    assert result is not None, output
+    assert {name: each["passed"] for name, each in result["program"].items()} == {
+        "test_some.py::test_ends": True, "test_some.py::test_never_ends": False,
+        "test_some.py::test_ends_too": True}
+
+
+def test_program_tests_are_left_out_by_the_name_of_their_file(tmp_path):
+    folder = tmp_path / "tests" / "program"
+    folder.mkdir(parents=True)
+    for name in ("test_one.py", "test_two.py", "harness.py"):
+        (folder / name).touch()
+    assert ProgramTests(["test_two.py"], None).files(tmp_path) == [str(folder / "test_one.py")]
+    with pytest.raises(SystemExit, match="test_three.py"):
+        ProgramTests(["test_three.py"], None).files(tmp_path)
 
 
 def test_the_survey_says_which_case_asks_for_which_mutant(cases):

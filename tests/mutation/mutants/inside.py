@@ -143,7 +143,7 @@ class ProgramTests:
         progress, order = Path("/tmp/progress"), Path("/tmp/order")
         progress.write_text("")
         order.write_text(json.dumps({"cases": cases, "survey": survey, "board": self.job["board"],
-                                     "progress": str(progress)}))
+                                     "slowest": self.job.get("slowest"), "progress": str(progress)}))
         command = ["/usr/bin/python3", "-m", "pytest", "-q", "-p", "no:cacheprovider", "-p",
                    "mutants.pytest_plugin", "--rootdir", self.job["tree"], "--tb=no",
                    *([] if survey else ["-x"]), *self.job["program_tests"]]

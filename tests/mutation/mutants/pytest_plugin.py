@@ -1,6 +1,7 @@
 """Picks and orders the program tests as MUTATION_JOB says, and reports each as it starts and ends."""
 import json
 import os
+import signal
 import time
 from pathlib import Path
 
@@ -10,6 +11,14 @@ from mutants.board import Board
 
 JOB = json.loads(Path(os.environ["MUTATION_JOB"]).read_text())
 PASSED = {}
+
+
+class TooSlow(Exception):
+    """Ends a test that takes longer than the slowest that is used."""
+
+
+def give_up(*_):
+    raise TooSlow(f"longer than {JOB['slowest']} s")
 
 
 def say(**words):
@@ -22,6 +31,17 @@ def pytest_collection_modifyitems(items):
         return
     order = {name: index for index, name in enumerate(JOB["cases"])}
     items[:] = sorted((item for item in items if item.nodeid in order), key=lambda item: order[item.nodeid])
+
+
+@pytest.hookimpl(hookwrapper=True)
+def pytest_runtest_call():
+    if JOB["slowest"] is None:
+        yield
+        return
+    signal.signal(signal.SIGALRM, give_up)
+    signal.setitimer(signal.ITIMER_REAL, JOB["slowest"])
+    yield
+    signal.setitimer(signal.ITIMER_REAL, 0)
 
 
 @pytest.hookimpl(hookwrapper=True)

@@ -10,7 +10,8 @@ from pathlib import PurePath
 MODULES = {
     "qgf": "qgf", "pmutil": "pmutil/all", "pmutil_gpu": "pmutil/gpu", "assay_app": "assay/app",
     "assay": "assay/app", "assay_report": "report", "assay_supervise": "supervise",
-    "assay_output": "output", "assay_host_app": "host/app", "assay-host": "host/app",
+    "assay_output": "output", "assay_facts": "facts", "assay_library": "library",
+    "assay_host_app": "host/app", "assay-host": "host/app",
 }
 
 INCLUDE = re.compile(r'#include "([^"]+)"')

@@ -5,6 +5,7 @@ import json
 import re
 import sys
 from concurrent.futures import ThreadPoolExecutor
+from dataclasses import dataclass
 from pathlib import Path
 
 from mutants import isolation
@@ -16,28 +17,46 @@ CHUNK = 100
 PROGRAM = "program"
 
 
+@dataclass
+class ProgramTests:
+    """Which tests of whole programs are used: those of all files but some, that end in time."""
+
+    without: list  # names of files
+    slowest: float  # seconds, or None
+
+    def files(self, tree):
+        found = sorted((tree / "tests" / "program").glob("test_*.py"))
+        unknown = set(self.without) - {path.name for path in found}
+        if unknown:
+            sys.exit(f"run_mutants: no program tests are named {', '.join(sorted(unknown))}")
+        return [str(path) for path in found if path.name not in self.without]
+
+
 class Survey:
-    def __init__(self, workshop, folder, size, with_program):
+    """`program_tests` is None to use unit tests alone."""
+
+    def __init__(self, workshop, folder, size, program_tests):
         self.workshop, self.folder, self.size = workshop, folder, size
-        self.with_program = with_program
+        self.program_tests = program_tests
+        self.files = program_tests.files(workshop.tree) if program_tests else []
         self.cases = {}  # program: {case: {"seconds", "reached"}}
 
     def job(self, **more):
         shop = self.workshop
-        tests = sorted(str(path) for path in (shop.tree / "tests" / "program").glob("test_*.py"))
         return {"board": str(shop.board), "size": self.size, "tree": str(shop.tree),
-                "build": str(shop.build), "program_tests": tests, **more}
+                "build": str(shop.build), "program_tests": self.files, **more}
 
     def states(self):
         """What the survey of each program of unit tests, and that of the program tests, depends on."""
         folder = self.workshop.build / "bin"
         others = hashlib.sha256()
-        for path in sorted(folder.glob("*")):
+        for path in [*sorted(folder.glob("*")), *sorted(self.workshop.build.glob("lib*/*.so"))]:
             if path.name not in TARGETS:
                 others.update(path.read_bytes())
         states = {str(folder / target): digest(others, [folder / target])
                   for target in TARGETS if (folder / target).exists()}
-        if self.with_program:
+        if self.program_tests:
+            others.update(repr(self.program_tests).encode())
             tests = sorted((self.workshop.tree / "tests" / "program").glob("*.py"))
             states[PROGRAM] = digest(others, tests)
         return states
@@ -61,7 +80,9 @@ class Survey:
     def parts(self, name):
         """The jobs by which to survey one program."""
         if name == PROGRAM:
-            yield self.job(what="survey", programs={})
+            for file in self.files:
+                yield {**self.job(what="survey", programs={}, slowest=self.program_tests.slowest),
+                       "program_tests": [file]}
             return
         cases = list_cases(Path(name))
         for start in range(0, len(cases), CHUNK):

@@ -12,8 +12,8 @@ from mutants import schemata
 HERE = Path(__file__).resolve().parent
 ERROR = re.compile(r"(?:from |^|In file included from )([^\s:]+):(\d+)(?::\d+)?[:,]", re.M)
 TARGETS = ["qgf_tests", "pmutil_tests", "launch_tests", "gpu_tests", "app_tests", "report_tests",
-           "supervise_tests", "output_tests", "facts_tests"]
-PROGRAMS = ["assay", "assay-host", "assay-at-root"]
+           "supervise_tests", "output_tests", "facts_tests", "library_tests"]
+PROGRAMS = ["assay", "assay-host", "assay-at-root", "assay-host-on-cue", "assay_host_shared"]
 
 
 def run(command, **options):
