@@ -1,0 +1,160 @@
+#include "identity/linux/Files.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <memory>
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace assay_host {
+
+namespace {
+
+constexpr std::size_t kMaxNames = 4096;
+constexpr int kMaxLinks = 40; // the kernel's limit (MAXSYMLINKS)
+
+class Descriptor {
+public:
+    explicit Descriptor(int descriptor) : fDescriptor(descriptor) {}
+    ~Descriptor()
+    {
+        if (fDescriptor >= 0)
+            ::close(fDescriptor);
+    }
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+    int Get() const { return fDescriptor; }
+
+private:
+    int fDescriptor;
+};
+
+bool IsRegular(const struct stat& status)
+{
+    return S_ISREG(status.st_mode);
+}
+
+std::string ReadSystemLink(const std::string& path)
+{
+    char target[4096];
+    const ssize_t size = ::readlink(path.c_str(), target, sizeof(target));
+    return size > 0 ? std::string(target, static_cast<std::size_t>(size)) : std::string();
+}
+
+} // namespace
+
+std::string Files::Read(const std::string& path, std::size_t maxSize) const
+{
+    const std::string real = GetRealPath(path);
+    struct stat status {};
+    // Check the type before the file is opened, because opening a device has effects, and after it,
+    // because the file may have been replaced.
+    if (::stat(real.c_str(), &status) != 0 || !IsRegular(status))
+        return {};
+    const Descriptor file(::open(real.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+    if (file.Get() < 0 || ::fstat(file.Get(), &status) != 0 || !IsRegular(status))
+        return {};
+    std::string text;
+    char block[4096];
+    while (text.size() < maxSize) {
+        const ssize_t count =
+            ::read(file.Get(), block, std::min(sizeof(block), maxSize - text.size()));
+        if (count < 0 && errno == EINTR)
+            continue;
+        if (count < 0)
+            return {};
+        if (count == 0)
+            break;
+        text.append(block, static_cast<std::size_t>(count));
+    }
+    return text;
+}
+
+std::string Files::ReadLine(const std::string& path) const
+{
+    constexpr std::size_t kMaxLine = 4096;
+    constexpr const char* kBlanks = " \t\r";
+    std::string text = Read(path, kMaxLine);
+    text.resize(std::min(text.find('\n'), text.size()));
+    const std::size_t first = text.find_first_not_of(kBlanks);
+    if (first == std::string::npos)
+        return {};
+    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+
+std::vector<std::string> Files::List(const std::string& path) const
+{
+    std::vector<std::string> names;
+    const std::unique_ptr<DIR, int (*)(DIR*)> entries(::opendir(GetRealPath(path).c_str()),
+                                                      ::closedir);
+    while (entries && names.size() < kMaxNames) {
+        // NOLINTNEXTLINE(concurrency-mt-unsafe): the stream is local to this call.
+        const dirent* const entry = ::readdir(entries.get());
+        if (entry == nullptr)
+            break;
+        if (entry->d_name[0] != '.')
+            names.emplace_back(entry->d_name);
+    }
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+std::string Files::ReadLink(const std::string& path) const
+{
+    return ReadSystemLink(GetRealPath(path));
+}
+
+std::string Files::Resolve(const std::string& path) const
+{
+    std::string resolved;
+    std::string rest = path;
+    int links = 0;
+    while (!rest.empty()) {
+        const std::size_t begin = std::min(rest.find_first_not_of('/'), rest.size());
+        const std::size_t end = std::min(rest.find('/', begin), rest.size());
+        const std::string name = rest.substr(begin, end - begin);
+        rest.erase(0, end);
+        if (name.empty() || name == ".")
+            continue;
+        if (name == "..") {
+            resolved.erase(std::min(resolved.rfind('/'), resolved.size()));
+            continue;
+        }
+        const std::string next = resolved + "/" + name;
+        struct stat status {};
+        if (::lstat(GetRealPath(next).c_str(), &status) != 0)
+            return {};
+        if (!S_ISLNK(status.st_mode)) {
+            resolved = next;
+            continue;
+        }
+        const std::string target = ReadSystemLink(GetRealPath(next));
+        if (target.empty() || ++links > kMaxLinks)
+            return {};
+        if (target.front() == '/')
+            resolved.clear();
+        rest = target + "/" + rest;
+    }
+    return resolved.empty() ? "/" : resolved;
+}
+
+std::optional<FileStatus> Files::Find(const std::string& path) const
+{
+    if (path.empty() || path.front() != '/')
+        return std::nullopt;
+    FileStatus found;
+    found.fPath = Resolve(path);
+    struct stat status {};
+    if (found.fPath.empty() || ::stat(GetRealPath(found.fPath).c_str(), &status) != 0 ||
+        !IsRegular(status))
+        return std::nullopt;
+    constexpr std::int64_t kNanoseconds = 1000000000;
+    found.fSize = static_cast<std::uint64_t>(status.st_size);
+    found.fTime = std::int64_t{status.st_mtim.tv_sec} * kNanoseconds + status.st_mtim.tv_nsec;
+    return found;
+}
+
+} // namespace assay_host

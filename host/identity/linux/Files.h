@@ -1,0 +1,56 @@
+// Reads the files of a machine below a root that a test replaces.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace assay_host {
+
+// What the file system has of a regular file.
+struct FileStatus {
+    std::string fPath;       // without symbolic links, as seen from the root
+    std::uint64_t fSize = 0; // bytes
+    std::int64_t fTime = 0;  // of the last change: nanoseconds since 1970 in UTC
+};
+
+// Every path is absolute and as seen from the root. Below another root, absolute links are followed
+// only by Resolve() and Find(); pass their paths to the other functions. Nothing is opened but
+// folders and regular files. Throws only std::bad_alloc. Any thread may call.
+class Files {
+public:
+    // An empty root is that of the machine.
+    explicit Files(std::string root = {}) : fRoot(std::move(root)) {}
+
+    // Reads at most `maxSize` bytes of a file. Returns an empty text if it can't be read.
+    std::string Read(const std::string& path, std::size_t maxSize = kMaxSize) const;
+
+    // Returns the first line of a file without the blanks around it; empty if it can't be read.
+    std::string ReadLine(const std::string& path) const;
+
+    // Returns the names in a folder, sorted by their bytes, without hidden ones. At most 4096.
+    std::vector<std::string> List(const std::string& path) const;
+
+    // Returns the text of a symbolic link; empty if it is none.
+    std::string ReadLink(const std::string& path) const;
+
+    // Returns the path without symbolic links; empty if there is no such file or folder. An
+    // absolute link starts at the root.
+    std::string Resolve(const std::string& path) const;
+
+    // Returns the status of a regular file, all links followed.
+    std::optional<FileStatus> Find(const std::string& path) const;
+
+    // Returns the path for the functions of the system.
+    std::string GetRealPath(const std::string& path) const { return fRoot + path; }
+
+private:
+    static constexpr std::size_t kMaxSize = std::size_t{1} << 20;
+
+    std::string fRoot;
+};
+
+} // namespace assay_host
