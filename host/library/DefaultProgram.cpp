@@ -2,6 +2,7 @@
 
 #include <boost/filesystem/operations.hpp>
 
+#include "library/OwnFile.h"
 #include "supervise/Paths.h"
 
 namespace assay_host {

@@ -7,6 +7,7 @@
 #include "facts/FileVersion.h"
 #include "library/DefaultProgram.h"
 #include "library/Options.h"
+#include "library/OwnFile.h"
 #include "library/Result.h"
 #include "library/Try.h"
 #include "report/SequenceReader.h"
@@ -66,6 +67,7 @@ private:
 
 std::unique_ptr<assay_host_result> Run(const assay_host_options& options, assay_host_stop* stop)
 {
+    KeepLoaded();
     ChildOptions child = options.fChild;
     if (child.fProgram.empty())
         child.fProgram = FindDefaultProgram();

@@ -3,11 +3,13 @@
 //   -verbose=1             nothing: assay-host adds it
 //   out TEXT, err TEXT     writes a line
 //   part TEXT              writes to standard error without a line end
+//   raw HEX                writes these bytes, given in hexadecimal, to standard output
 //   exit CODE              ends with the code
 //   sleep MILLISECONDS
 //   await FILE             waits until this file exists
 //   echo                   copies standard input to standard output until it ends
 //   flood BYTES            writes this many bytes to standard output
+//   flood-errors BYTES     the same to standard error
 //   abort                  crashes
 //   die HOW                ends as Misbehave() does (Windows only)
 //   args ...               writes the other arguments, each in hexadecimal, and ends; on Windows as
@@ -63,15 +65,22 @@ void Await(const char* file)
         std::this_thread::sleep_for(std::chrono::milliseconds(5));
 }
 
-void Flood(long long bytes)
+void Flood(std::FILE* stream, long long bytes)
 {
     const std::string block(65536, 'x');
     while (bytes > 0) {
         const auto count = bytes < 65536 ? static_cast<std::size_t>(bytes) : block.size();
-        if (std::fwrite(block.data(), 1, count, stdout) != count)
+        if (std::fwrite(block.data(), 1, count, stream) != count)
             std::exit(99);
         bytes -= static_cast<long long>(count);
     }
+    std::fflush(stream);
+}
+
+void WriteRaw(const std::string& digits)
+{
+    for (std::size_t at = 0; at + 2 <= digits.size(); at += 2)
+        std::fputc(std::stoi(digits.substr(at, 2), nullptr, 16), stdout);
     std::fflush(stdout);
 }
 
@@ -101,7 +110,11 @@ int main(int argc, char** argv)
         } else if (word == "echo") {
             Echo();
         } else if (word == "flood") {
-            Flood(std::atoll(next()));
+            Flood(stdout, std::atoll(next()));
+        } else if (word == "flood-errors") {
+            Flood(stderr, std::atoll(next()));
+        } else if (word == "raw") {
+            WriteRaw(next());
         } else if (word == "abort") {
             CrashNow();
         } else if (word == "die") {

@@ -16,7 +16,7 @@
  * the locale, nor a descriptor of its host. Its threads have all signals blocked. On Linux the host
  * may ignore SIGCHLD or wait for any child: it doesn't see the library's processes. If the host
  * ends, even if it is killed, the child and its descendants are killed. The shared library can't be
- * unloaded.
+ * unloaded; the DLL can be until its first run.
  *
  * Freeing null does nothing. Reading from null returns 0, an empty text, never-started or unknown.
  */

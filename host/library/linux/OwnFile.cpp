@@ -6,7 +6,7 @@
 #include <sstream>
 #include <string>
 
-#include "library/DefaultProgram.h"
+#include "library/OwnFile.h"
 
 namespace assay_host {
 
@@ -44,5 +44,7 @@ boost::filesystem::path GetOwnFile()
     Dl_info info = {};
     return ::dladdr(&gMark, &info) != 0 && info.dli_fname != nullptr ? info.dli_fname : "";
 }
+
+void KeepLoaded() {}
 
 } // namespace assay_host
