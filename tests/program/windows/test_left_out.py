@@ -12,6 +12,7 @@ COUNTERPARTS = {
     "test_host_hostile": "test_windows_host",
     "test_host_run": "test_windows_host",
     "test_host_torture": "test_windows_torture",
+    "test_library": "test_windows_library",
     "test_opencl": "test_windows_opencl",
     "test_steps": "test_windows",
     "test_verbose": "test_windows",
@@ -25,10 +26,10 @@ LEFT_OUT = {
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
-        "unit/launch", "unit/pmutil", "unit/supervise"},
+        "unit/launch", "unit/library", "unit/pmutil", "unit/supervise"},
     "Linux's own files, shells and terminals": {
         "program/test_completions", "program/test_hardening", "unit/facts", "unit/output"},
-    "libassay-host isn't built for Windows yet": {"program/test_library", "unit/library"},
+    "there is no Python and no Node for Windows here": {"examples/decide.py", "examples/decide.js"},
     "the peak memory of a host is measured by getrusage": {"program/test_host_memory"},
 }
 
@@ -38,7 +39,9 @@ def linux_only():
                if file.stem not in COUNTERPARTS}
     unit = {f"unit/{file.parents[1].name}"
             for file in (TREE / "tests" / "unit").glob("*/linux/*Test.cpp")}
-    return program | unit
+    examples = {f"examples/{file.name}" for file in (TREE / "examples").iterdir()
+                if file.suffix in (".py", ".js")}
+    return program | unit | examples
 
 
 def test_counterparts_exist():

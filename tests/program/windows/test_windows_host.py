@@ -156,13 +156,16 @@ def test_output_file(tmp_path):
 
 
 class Running:
-    """A running assay-host.exe, with a child that has a unique argument."""
+    """A running host, assay-host.exe or the program of `command`, with a child that has a unique
+    argument."""
 
-    def __init__(self, *words, options=(), **streams):
+    def __init__(self, *words, options=(), command=(), **streams):
         self.word = str(random.randrange(10**8, 2 * 10**9)) # how long the child sleeps
+        command = command or [HOST, "run", *options, "--assay", CHILD, "--"]
+        self.name = Path(command[0]).name.encode()
         self.process = subprocess.Popen(
-            [TREE / "scripts" / "run-under-wine", HOST, "run", *options, "--assay", CHILD, "--",
-             *words, "sleep", self.word], stdin=subprocess.DEVNULL, stderr=subprocess.DEVNULL,
+            [TREE / "scripts" / "run-under-wine", *command, *words, "sleep", self.word],
+            stdin=subprocess.DEVNULL, stderr=subprocess.DEVNULL,
             env={**os.environ, **NO_OPENCL_PLATFORM}, **streams)
 
     def numbers(self, of_host):
@@ -172,7 +175,7 @@ class Running:
             try:
                 command = (folder / "cmdline").read_bytes() if folder.name.isdigit() else b""
                 if self.word.encode() in command and "wine" in os.readlink(folder / "exe"):
-                    if (b"assay-host" in command) == of_host:
+                    if (self.name in command) == of_host:
                         found.append(int(folder.name))
             except OSError:
                 pass

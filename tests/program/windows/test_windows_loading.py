@@ -1,4 +1,4 @@
-"""The programs load libraries only from the system's folder."""
+"""The programs and the DLL load libraries only from the system's folder."""
 
 import os
 import shutil
@@ -30,7 +30,7 @@ def imports_of(program):
     return names | {entry.dll.decode().lower() for entry in delayed}
 
 
-@pytest.mark.parametrize("program", ["assay.exe", "assay-host.exe"])
+@pytest.mark.parametrize("program", ["assay.exe", "assay-host.exe", "assay-host.dll"])
 def test_imports_nothing_that_could_be_planted(program):
     names = imports_of(BUILD / "bin" / program)
     assert "kernel32.dll" in names

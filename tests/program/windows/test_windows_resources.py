@@ -1,4 +1,4 @@
-"""The resources and headers of the Windows programs."""
+"""The resources and headers of the Windows programs and the DLL."""
 
 import re
 from xml.etree import ElementTree
@@ -13,14 +13,12 @@ VERSION = re.search(r"^project\(assay VERSION (\S+)", (TREE / "CMakeLists.txt").
                     re.MULTILINE).group(1)
 
 
-@pytest.fixture(scope="module", params=["assay", "assay-host"])
-def program(request):
-    return request.param
+PROGRAMS = ["assay.exe", "assay-host.exe"]
+FILES = [*PROGRAMS, "assay-host.dll"]
 
 
-@pytest.fixture(scope="module")
-def image(program):
-    return pefile.PE(str(BUILD / "bin" / f"{program}.exe"))
+def image_of(file):
+    return pefile.PE(str(BUILD / "bin" / file))
 
 
 def manifests_of(image):
@@ -32,8 +30,9 @@ def manifests_of(image):
                     yield name.id, image.get_data(place.OffsetToData, place.Size)
 
 
-def test_manifest(image):
-    [(number, text)] = manifests_of(image)
+@pytest.mark.parametrize("program", PROGRAMS)
+def test_manifest(program):
+    [(number, text)] = manifests_of(image_of(program))
     assert number == 1
     root = ElementTree.fromstring(text)
     values = {element.tag.split("}")[1]: element.text for element in root.iter()}
@@ -48,23 +47,31 @@ def test_manifest(image):
     assert "{8e0f7a12-bfb3-4fe8-b9a5-48fd50a15a9a}" in systems, "Windows 10 and 11"
 
 
-def test_version(program, image):
+def test_dll_has_no_manifest():
+    """A program has its own; one of a DLL would have the number 2."""
+    assert not list(manifests_of(image_of("assay-host.dll")))
+
+
+@pytest.mark.parametrize("file", FILES)
+def test_version(file):
+    image = image_of(file)
     numbers = [int(part) for part in VERSION.split(".")] + [0]
     [fixed] = image.VS_FIXEDFILEINFO
     assert [fixed.FileVersionMS >> 16, fixed.FileVersionMS & 0xFFFF,
             fixed.FileVersionLS >> 16, fixed.FileVersionLS & 0xFFFF] == numbers
-    assert fixed.FileType == 1
+    assert fixed.FileType == (1 if file.endswith(".exe") else 2)
     texts = {key.decode(): value.decode() for info in image.FileInfo[0]
              if info.Key == b"StringFileInfo" for table in info.StringTable
              for key, value in table.entries.items()}
     assert texts["ProductName"] == "assay"
     assert texts["ProductVersion"] == texts["FileVersion"] == VERSION
-    assert texts["OriginalFilename"] == f"{program}.exe"
+    assert texts["OriginalFilename"] == file
     assert texts["FileDescription"]
 
 
-def test_addresses_and_data_are_protected(image):
-    header = image.OPTIONAL_HEADER
+@pytest.mark.parametrize("file", FILES)
+def test_addresses_and_data_are_protected(file):
+    header = image_of(file).OPTIONAL_HEADER
     assert header.IMAGE_DLLCHARACTERISTICS_DYNAMIC_BASE
     assert header.IMAGE_DLLCHARACTERISTICS_HIGH_ENTROPY_VA
     assert header.IMAGE_DLLCHARACTERISTICS_NX_COMPAT
