@@ -1,5 +1,5 @@
 @echo off
-rem Tests the programs on this machine and prints one line for each check, "ok" or "FAIL". Installs and
+rem Tests the programs and the DLL on this machine and prints one line for each check, "ok" or "FAIL". Installs and
 rem changes nothing. No window should open.
 rem
 rem usage: check.cmd [quick]
@@ -9,6 +9,8 @@ set here=%~dp0
 set host="%here%assay-host.exe"
 set child="%here%check\test_child.exe"
 set log="%TEMP%\assay-check.log"
+rem For the DLL, which is beside assay.exe.
+set PATH=%here%;%PATH%
 set failed=0
 echo assay-check >%log%
 
@@ -20,6 +22,8 @@ set command=%host% run -- -bogus
 call :check 2 "a usage error is reported"
 set command=%host% run -- "-stdout=a b\" -exit=5 "-comment=c"
 call :check 0 "options reach assay unchanged"
+set command="%here%check\decide_c.exe"
+call :check 0 "an application decides by the DLL"
 
 for %%h in (access-violation fast-fail stack-overflow) do call :crash %%h
 set command=%host% run --assay %child% --timeout 5 -- die hang

@@ -39,10 +39,50 @@ def test_name_has_version_and_machine(package):
 
 def test_has_programs_documents_and_licences(package):
     assert {path.name for path in package.iterdir()} == {
-        "assay.exe", "assay-host.exe", "README.md", "docs", "schema", "check.cmd", "check",
-        "LICENSE", "CHANGELOG.md", "THIRD-PARTY-NOTICES.txt", "assay.spdx.json"}
+        "assay.exe", "assay-host.exe", "assay-host.dll", "include", "lib", "examples", "README.md",
+        "docs", "schema", "check.cmd", "check", "LICENSE", "CHANGELOG.md", "THIRD-PARTY-NOTICES.txt", "assay.spdx.json"}
     assert (package / "docs" / "report-format.md").stat().st_size > 0
     assert not list((package / "docs").rglob("*.scd"))
+    assert {path.name for path in (package / "include").iterdir()} == {
+        "assay_host.h", "assay_host.hpp"}
+    assert {path.name for path in (package / "lib").iterdir()} == {
+        "libassay-host.dll.a", "assay-host.def"}
+    assert {path.name for path in (package / "examples").iterdir()} == {
+        "decide.c", "decide.cpp", "decide.js", "decide.py"}
+
+
+def build_example(package, folder, compiler, source, library, *options):
+    """Builds a program with the files of the zip only. Returns its path, beside the DLL."""
+    program = folder / f"{source}.exe"
+    subprocess.run([f"x86_64-w64-mingw32-{compiler}-posix", *options, "-I", package / "include",
+                    package / "examples" / source, library, "-o", program,
+                    "-static", "-static-libgcc"], check=True)
+    for name in ("assay-host.dll", "assay.exe"):
+        shutil.copy(package / name, folder)
+    return program
+
+
+def check_decision(program, *arguments, first):
+    run = run_under_wine(*arguments, program=program, **NO_OPENCL_PLATFORM)
+    assert run.status == 0, text_of(run.err)
+    assert run.lines[0].startswith(first)
+
+
+@pytest.mark.parametrize("compiler, source, option", [
+    ("gcc", "decide.c", "-std=c99"), ("g++", "decide.cpp", "-std=c++17")])
+def test_examples_are_built_from_it_and_decide(package, tmp_path, compiler, source, option):
+    program = build_example(package, tmp_path, compiler, source,
+                            package / "lib" / "libassay-host.dll.a", option)
+    check_decision(program, first="complete: ")
+    check_decision(program, package / "check" / "test_child.exe", "abort", first="crashed: ")
+
+
+def test_list_of_exports_makes_an_import_library(package, tmp_path):
+    library = tmp_path / "assay-host.lib"
+    subprocess.run(["x86_64-w64-mingw32-dlltool", "-d", package / "lib" / "assay-host.def",
+                    "-D", "assay-host.dll", "-l", library], check=True)
+    program = build_example(package, tmp_path, "gcc", "decide.c", library)
+    check_decision(program, first="complete: ")
 
 
 LINKED = {"Boost", "fmt", "CLI11", "nlohmann-json", "GCC-runtime", "MinGW-w64-runtime"}
@@ -69,7 +109,7 @@ def test_runs_in_an_empty_prefix(package, tmp_path):
 def test_has_no_symbols_and_debug_sections(package):
     programs = sorted(package.rglob("*.exe"))
     assert len(programs) > 2
-    for program in programs:
+    for program in [*programs, package / "assay-host.dll"]:
         image = pefile.PE(str(program), fast_load=True)
         # A name of more than 8 characters, such as ".debug_info", is a reference: "/4".
         names = [section.Name.rstrip(b"\0") for section in image.sections]
@@ -84,19 +124,19 @@ def test_check_script(package):
                          **NO_OPENCL_PLATFORM)
     assert run.status == 0, text_of(run.out)
     assert run.lines[-1] == "All checks passed."
-    assert len(run.lines) == 10
+    assert len(run.lines) == 11
     assert all(line.startswith("ok    ") for line in run.lines[:-1])
     script = (package / "check.cmd").read_bytes()
     assert b"\n" not in script.replace(b"\r\n", b""), "Windows' own line ends"
-    # libassay-host isn't built for Windows yet.
-    units = {path.name for path in (TREE / "tests" / "unit").iterdir()} - {"support", "library"}
-    assert {f"{unit}_tests.exe" for unit in units} | {"test_child.exe"} == {
+    units = {path.name for path in (TREE / "tests" / "unit").iterdir()} - {"support"}
+    assert {f"{unit}_tests.exe" for unit in units} | {"test_child.exe", "decide_c.exe"} == {
         path.name for path in (package / "check").iterdir()}
 
 
 def test_check_script_names_what_fails(package, tmp_path):
     broken = tmp_path / "broken"
     shutil.copytree(package, broken)
+    (broken / "assay-host.dll").write_bytes(b"no library")
     child = broken / "check" / "test_child.exe"
     units = sorted((broken / "check").glob("*_tests.exe"))
     for program in [broken / "assay.exe", *units]:
@@ -105,6 +145,7 @@ def test_check_script_names_what_fails(package, tmp_path):
     assert run.status == 1
     assert "FAIL  assay prints a whole report: status 1 instead of 0" in run.lines
     assert "ok    assay-host starts" in run.lines
+    assert [line for line in run.lines if "by the DLL" in line][0].startswith("FAIL  ")
     assert [line for line in run.lines if "unit tests" in line] == [
         f"FAIL  unit tests: {unit.name}: status 98 instead of 0" for unit in units]
 
@@ -123,7 +164,7 @@ def test_signature(package, tmp_path_factory):
     signed, messages = pack(tmp_path_factory.mktemp("signed"), ASSAY_SIGN_CERTIFICATE=str(both),
                         ASSAY_SIGN_PASSWORD_FILE=str(password))
     assert "Not signed" not in messages
-    for program in signed.rglob("*.exe"):
+    for program in [*signed.rglob("*.exe"), signed / "assay-host.dll"]:
         subprocess.run(["osslsigncode", "verify", "-CAfile", certificate, "-in", program],
                        stdout=subprocess.DEVNULL, check=True)
     _, messages = pack(tmp_path_factory.mktemp("unsigned"))
