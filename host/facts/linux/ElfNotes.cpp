@@ -35,8 +35,9 @@ std::size_t Align(std::size_t size)
     return (size + 3) & ~std::size_t{3};
 }
 
-// Finds a note in the bytes of one segment.
-std::string FindIn(const std::string& notes, const std::string& owner, std::uint32_t type)
+} // namespace
+
+std::string FindNote(const std::string& notes, const std::string& owner, std::uint32_t type)
 {
     std::size_t at = 0;
     while (notes.size() - at >= sizeof(ElfW(Nhdr))) {
@@ -55,8 +56,6 @@ std::string FindIn(const std::string& notes, const std::string& owner, std::uint
     return {};
 }
 
-} // namespace
-
 std::string FindElfNote(std::istream& file, const std::string& owner, std::uint32_t type)
 {
     ElfW(Ehdr) header{};
@@ -73,7 +72,7 @@ std::string FindElfNote(std::istream& file, const std::string& owner, std::uint3
         file.seekg(static_cast<std::streamoff>(segment.p_offset));
         file.read(notes.data(), static_cast<std::streamsize>(notes.size()));
         notes.resize(static_cast<std::size_t>(file.gcount()));
-        std::string found = FindIn(notes, owner, type);
+        std::string found = FindNote(notes, owner, type);
         if (!found.empty())
             return found;
     }

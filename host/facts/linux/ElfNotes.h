@@ -11,4 +11,7 @@ namespace assay_host {
 // file of this machine's word size and byte order, or is damaged. Reads at most 64 KiB of notes.
 std::string FindElfNote(std::istream& file, const std::string& owner, std::uint32_t type);
 
+// Finds the note in the bytes of one segment of notes. Empty if it has none or is damaged.
+std::string FindNote(const std::string& notes, const std::string& owner, std::uint32_t type);
+
 } // namespace assay_host
