@@ -9,28 +9,16 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "identity/linux/Descriptor.h"
+
 namespace assay_host {
 
 namespace {
 
 constexpr std::size_t kMaxNames = 4096;
-constexpr int kMaxLinks = 40; // the kernel's limit (MAXSYMLINKS)
-
-class Descriptor {
-public:
-    explicit Descriptor(int descriptor) : fDescriptor(descriptor) {}
-    ~Descriptor()
-    {
-        if (fDescriptor >= 0)
-            ::close(fDescriptor);
-    }
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
-    int Get() const { return fDescriptor; }
-
-private:
-    int fDescriptor;
-};
+// The kernel's limits: MAXSYMLINKS and PATH_MAX.
+constexpr int kMaxLinks = 40;
+constexpr std::size_t kMaxPath = 4096;
 
 bool IsRegular(const struct stat& status)
 {
@@ -39,7 +27,7 @@ bool IsRegular(const struct stat& status)
 
 std::string ReadSystemLink(const std::string& path)
 {
-    char target[4096];
+    char target[kMaxPath];
     const ssize_t size = ::readlink(path.c_str(), target, sizeof(target));
     return size > 0 ? std::string(target, static_cast<std::size_t>(size)) : std::string();
 }
@@ -88,6 +76,8 @@ std::string Files::ReadLine(const std::string& path) const
 std::vector<std::string> Files::List(const std::string& path) const
 {
     std::vector<std::string> names;
+    if (path.empty())
+        return names;
     const std::unique_ptr<DIR, int (*)(DIR*)> entries(::opendir(GetRealPath(path).c_str()),
                                                       ::closedir);
     while (entries && names.size() < kMaxNames) {
@@ -109,36 +99,45 @@ std::string Files::ReadLink(const std::string& path) const
 
 std::string Files::Resolve(const std::string& path) const
 {
-    std::string resolved;
-    std::string rest = path;
     int links = 0;
-    while (!rest.empty()) {
-        const std::size_t begin = std::min(rest.find_first_not_of('/'), rest.size());
-        const std::size_t end = std::min(rest.find('/', begin), rest.size());
-        const std::string name = rest.substr(begin, end - begin);
-        rest.erase(0, end);
-        if (name.empty() || name == ".")
-            continue;
-        if (name == "..") {
-            resolved.erase(std::min(resolved.rfind('/'), resolved.size()));
-            continue;
-        }
-        const std::string next = resolved + "/" + name;
-        struct stat status {};
-        if (::lstat(GetRealPath(next).c_str(), &status) != 0)
-            return {};
-        if (!S_ISLNK(status.st_mode)) {
-            resolved = next;
-            continue;
-        }
-        const std::string target = ReadSystemLink(GetRealPath(next));
-        if (target.empty() || ++links > kMaxLinks)
-            return {};
-        if (target.front() == '/')
-            resolved.clear();
-        rest = target + "/" + rest;
-    }
-    return resolved.empty() ? "/" : resolved;
+    return Resolve(path, links);
+}
+
+std::string Files::ResolveFolder(const std::string& path, int& links) const
+{
+    const auto known = fFolders.find(path);
+    if (known != fFolders.end())
+        return known->second;
+    return fFolders[path] = Resolve(path, links);
+}
+
+// Returns an empty path after too many links.
+std::string Files::Resolve(const std::string& path, int& links) const
+{
+    if (path.size() > kMaxPath)
+        return {};
+    const std::size_t end = path.find_last_not_of('/');
+    if (end == std::string::npos)
+        return path.empty() ? "" : "/";
+    const std::size_t slash = path.rfind('/', end);
+    if (slash == std::string::npos)
+        return {};
+    const std::string name = path.substr(slash + 1, end - slash);
+    const std::string folder = slash == 0 ? "/" : ResolveFolder(path.substr(0, slash), links);
+    if (folder.empty() || name == ".")
+        return folder;
+    if (name == "..")
+        return folder.substr(0, std::max<std::size_t>(folder.rfind('/'), 1));
+    std::string resolved = (folder == "/" ? "" : folder) + "/" + name;
+    struct stat status {};
+    if (::lstat(GetRealPath(resolved).c_str(), &status) != 0)
+        return {};
+    if (!S_ISLNK(status.st_mode))
+        return resolved;
+    const std::string target = ReadSystemLink(GetRealPath(resolved));
+    if (target.empty() || ++links > kMaxLinks)
+        return {};
+    return Resolve(target.front() == '/' ? target : folder + "/" + target, links);
 }
 
 std::optional<FileStatus> Files::Find(const std::string& path) const
@@ -154,6 +153,7 @@ std::optional<FileStatus> Files::Find(const std::string& path) const
     constexpr std::int64_t kNanoseconds = 1000000000;
     found.fSize = static_cast<std::uint64_t>(status.st_size);
     found.fTime = std::int64_t{status.st_mtim.tv_sec} * kNanoseconds + status.st_mtim.tv_nsec;
+    found.fNode = {status.st_dev, status.st_ino};
     return found;
 }
 

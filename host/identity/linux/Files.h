@@ -3,6 +3,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <map>
 #include <optional>
 #include <string>
 #include <utility>
@@ -15,11 +16,14 @@ struct FileStatus {
     std::string fPath;       // without symbolic links, as seen from the root
     std::uint64_t fSize = 0; // bytes
     std::int64_t fTime = 0;  // of the last change: nanoseconds since 1970 in UTC
+    // What all names of one file have in common.
+    std::pair<std::uint64_t, std::uint64_t> fNode;
 };
 
 // Every path is absolute and as seen from the root. Below another root, absolute links are followed
 // only by Resolve() and Find(); pass their paths to the other functions. Nothing is opened but
-// folders and regular files. Throws only std::bad_alloc. Any thread may call.
+// folders and regular files. The links of a folder are read once. Throws only std::bad_alloc. One
+// thread at a time.
 class Files {
 public:
     // An empty root is that of the machine.
@@ -50,7 +54,11 @@ public:
 private:
     static constexpr std::size_t kMaxSize = std::size_t{1} << 20;
 
+    std::string Resolve(const std::string& path, int& links) const;
+    std::string ResolveFolder(const std::string& path, int& links) const;
+
     std::string fRoot;
+    mutable std::map<std::string, std::string> fFolders; // their paths without links
 };
 
 } // namespace assay_host

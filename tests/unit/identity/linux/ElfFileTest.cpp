@@ -1,0 +1,94 @@
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "FakeElf.h"
+#include "MachineTree.h"
+#include "identity/linux/ElfFile.h"
+
+namespace assay_host {
+namespace {
+
+using Names = std::vector<std::string>;
+
+ElfFile Read(const std::string& bytes)
+{
+    const MachineTree tree;
+    tree.Write("/lib/x.so", bytes);
+    return ReadElfFile(tree.GetRoot() + "/lib/x.so", "/lib");
+}
+
+TEST(ElfFile, HasNamesAndBuildId)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1", std::string(300, 'x'), "libtwo.so"};
+    fake.fBuildId = std::string("\x00\xAB\x7f", 3);
+    const ElfFile elf = Read(fake.Make());
+    EXPECT_EQ(elf.fNeeded, (Names{"libone.so.1", std::string(300, 'x'), "libtwo.so"}));
+    EXPECT_EQ(elf.fBuildId, "00ab7f");
+    EXPECT_EQ(elf.fRunPath, Names());
+    EXPECT_FALSE(elf.fIsRunPathFirst);
+}
+
+TEST(ElfFile, HasFoldersToSearch)
+{
+    FakeElf fake;
+    fake.fRunPath = "/one:$ORIGIN/two:${ORIGIN}:relative::$LIB/three:/four/$PLATFORM";
+    fake.fFirstPath = "/first";
+    const ElfFile elf = Read(fake.Make());
+    EXPECT_EQ(elf.fRunPath, (Names{"/one", "/lib/two", "/lib"}));
+    EXPECT_FALSE(elf.fIsRunPathFirst);
+
+    fake.fRunPath.clear();
+    const ElfFile first = Read(fake.Make());
+    EXPECT_EQ(first.fRunPath, Names{"/first"});
+    EXPECT_TRUE(first.fIsRunPathFirst);
+}
+
+TEST(ElfFile, IsEmptyForAnotherFile)
+{
+    EXPECT_EQ(Read("").fBuildId, "");
+    EXPECT_EQ(Read("\177ELF").fNeeded, Names());
+    EXPECT_EQ(Read("INPUT(libx.so)").fBuildId, "");
+    EXPECT_EQ(ReadElfFile("/nonexistent", "/").fNeeded, Names());
+    std::string other = FakeElf().Make();
+    other[EI_CLASS] = 0;
+    EXPECT_EQ(Read(other).fBuildId, "");
+}
+
+// What is left of the file is read; nothing beyond its end.
+TEST(ElfFile, MayBeCutAnywhere)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1", "libtwo.so"};
+    fake.fRunPath = "/one";
+    const std::string whole = fake.Make();
+    const MachineTree tree;
+    for (std::size_t size = 0; size <= whole.size(); ++size) {
+        tree.Write("/x.so", whole.substr(0, size));
+        const ElfFile elf = ReadElfFile(tree.GetRoot() + "/x.so", "/");
+        EXPECT_LE(elf.fNeeded.size(), 2U) << size;
+        if (size == whole.size())
+            EXPECT_EQ(elf.fNeeded.size(), 2U);
+    }
+}
+
+TEST(ElfFile, MayHaveAnyByteChanged)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1", "libtwo.so"};
+    fake.fRunPath = "/one";
+    std::string bytes = fake.Make();
+    const MachineTree tree;
+    for (char& byte : bytes) {
+        const char old = byte;
+        byte = static_cast<char>(~old);
+        tree.Write("/x.so", bytes);
+        EXPECT_LE(ReadElfFile(tree.GetRoot() + "/x.so", "/").fNeeded.size(), 256U);
+        byte = old;
+    }
+}
+
+} // namespace
+} // namespace assay_host
