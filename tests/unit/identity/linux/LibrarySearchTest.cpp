@@ -1,0 +1,140 @@
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "FakeElf.h"
+#include "MachineTree.h"
+#include "identity/linux/LibraryCache.h"
+#include "identity/linux/LibrarySearch.h"
+
+namespace assay_host {
+namespace {
+
+using Names = std::vector<std::string>;
+
+TEST(LibraryCache, FindsEveryPathOfAName)
+{
+    const LibraryCache cache(MakeLibraryCache({{"libb.so.1", "/usr/lib/libb.so.1"},
+                                               {"liba.so.1", "/usr/lib/hw/liba.so.1"},
+                                               {"liba.so.1", "/usr/lib/liba.so.1"}},
+                                              kCacheFlags));
+    EXPECT_EQ(cache.Find("libb.so.1"), Names{"/usr/lib/libb.so.1"});
+    EXPECT_EQ(cache.Find("liba.so.1"), (Names{"/usr/lib/hw/liba.so.1", "/usr/lib/liba.so.1"}));
+    EXPECT_EQ(cache.Find("liba.so"), Names());
+    EXPECT_EQ(cache.Find("libc.so.1"), Names());
+}
+
+TEST(LibraryCache, LeavesOutOtherMachines)
+{
+    EXPECT_EQ(LibraryCache(MakeLibraryCache({{"a", "/a"}}, 0x0803)).Find("a"), Names());
+    constexpr unsigned char kBig = 3;
+    EXPECT_EQ(LibraryCache(MakeLibraryCache({{"a", "/a"}}, kCacheFlags, kBig)).Find("a"), Names());
+    EXPECT_EQ(LibraryCache(MakeLibraryCache({{"a", "/a"}}, kCacheFlags, 0)).Find("a"), Names{"/a"});
+}
+
+TEST(LibraryCache, ReadsTheTableAfterAnOldOne)
+{
+    std::string old = "ld.so-1.7.0";
+    old.resize(16);
+    old[12] = 1;
+    old.resize(16 + 12);
+    old.resize(32); // the new table is at a multiple of 8
+    const std::string file = old + MakeLibraryCache({{"a", "/a"}}, kCacheFlags);
+    EXPECT_EQ(LibraryCache(file).Find("a"), Names{"/a"});
+    EXPECT_EQ(LibraryCache(old).Find("a"), Names());
+}
+
+TEST(LibraryCache, MayBeDamaged)
+{
+    const std::string whole = MakeLibraryCache({{"a", "/a"}, {"b", "/b"}}, kCacheFlags);
+    for (std::size_t size = 0; size < whole.size(); ++size) {
+        const Names found = LibraryCache(whole.substr(0, size)).Find("b");
+        EXPECT_EQ(found, Names()) << size;
+    }
+    std::string changed = whole;
+    for (char& byte : changed) {
+        const char old = byte;
+        byte = static_cast<char>(~old);
+        EXPECT_LE(LibraryCache(changed).Find("b").size(), 1U);
+        byte = old;
+    }
+}
+
+class LibrarySearchTest : public testing::Test {
+protected:
+    Names Find(const std::string& name, const ElfFile& from = {}) const
+    {
+        const Files files = fTree.GetFiles();
+        Names paths;
+        for (const FileStatus& status : LibrarySearch(files, fProcess).Find(name, from))
+            paths.push_back(status.fPath);
+        return paths;
+    }
+
+    MachineTree fTree;
+    Process fProcess;
+};
+
+TEST_F(LibrarySearchTest, KeepsTheOrderOfTheLoader)
+{
+    fTree.Write("/etc/ld.so.cache",
+                MakeLibraryCache({{"libx.so", "/cached/libx.so"}}, kCacheFlags));
+    for (const char* folder : {"/first", "/own", "/cached", "/usr/lib"})
+        fTree.Write(std::string(folder) + "/libx.so", "");
+    fProcess.fVariables["LD_LIBRARY_PATH"] = "/missing;/first";
+    ElfFile from;
+    from.fRunPath = {"/own"};
+    EXPECT_EQ(Find("libx.so", from), Names{"/first/libx.so"});
+    from.fIsRunPathFirst = true;
+    EXPECT_EQ(Find("libx.so", from), Names{"/own/libx.so"});
+    from.fIsRunPathFirst = false;
+    fTree.Remove("/first");
+    EXPECT_EQ(Find("libx.so", from), Names{"/own/libx.so"});
+    EXPECT_EQ(Find("libx.so"), Names{"/cached/libx.so"});
+    fTree.Remove("/cached");
+    EXPECT_EQ(Find("libx.so"), Names{"/usr/lib/libx.so"});
+    EXPECT_EQ(Find("liby.so"), Names());
+    EXPECT_EQ(Find(""), Names());
+}
+
+TEST_F(LibrarySearchTest, TakesANameWithASlashForAPath)
+{
+    fTree.Write("/home/me/libx.so", "");
+    fTree.Write("/usr/lib/libx.so", "");
+    fProcess.fFolder = "/home";
+    EXPECT_EQ(Find("me/libx.so"), Names{"/home/me/libx.so"});
+    EXPECT_EQ(Find("./me/../me/libx.so"), Names{"/home/me/libx.so"});
+    EXPECT_EQ(Find("/usr/lib/libx.so"), Names{"/usr/lib/libx.so"});
+    EXPECT_EQ(Find("/usr/libx.so"), Names());
+    fProcess.fVariables["LD_LIBRARY_PATH"] = "me";
+    EXPECT_EQ(Find("libx.so"), Names{"/home/me/libx.so"});
+}
+
+TEST_F(LibrarySearchTest, FindsVariantsForNewerProcessors)
+{
+    fTree.Write("/usr/lib/glibc-hwcaps/x86-64-v3/libx.so", "");
+    fTree.Write("/usr/lib/libx.so", "");
+    EXPECT_EQ(Find("libx.so"),
+              (Names{"/usr/lib/glibc-hwcaps/x86-64-v3/libx.so", "/usr/lib/libx.so"}));
+}
+
+TEST_F(LibrarySearchTest, FollowsLinksInsideTheRoot)
+{
+    fTree.Write("/opt/driver/libx.so.1.2", "1234");
+    fTree.Link("/etc/alternatives/libx", "/opt/current/libx.so.1.2");
+    fTree.Link("/opt/current", "driver");
+    fTree.Link("/usr/lib/libx.so.1", "../../etc/alternatives/libx");
+    EXPECT_EQ(Find("libx.so.1"), Names{"/opt/driver/libx.so.1.2"});
+    fTree.Link("/usr/lib/loop.so", "loop.so");
+    fTree.Link("/usr/lib/a", "b/x");
+    fTree.Link("/usr/lib/b", "a/x");
+    fTree.Link("/usr/lib/gone.so", "nowhere/gone.so");
+    for (const char* name : {"loop.so", "a", "b", "gone.so"})
+        EXPECT_EQ(Find(name), Names()) << name;
+    EXPECT_EQ(Find("/usr/lib"), Names());
+    EXPECT_EQ(Find(std::string(100000, '/') + "x"), Names());
+}
+
+} // namespace
+} // namespace assay_host
