@@ -1,10 +1,9 @@
 #include "identity/linux/Machine.h"
 
-#include <unistd.h>
-
 #include "facts/FileVersion.h"
 #include "facts/OsRelease.h"
 #include "identity/linux/Adapters.h"
+#include "identity/linux/DriverFiles.h"
 
 namespace assay_host {
 
@@ -24,24 +23,13 @@ std::string GetSystem(const Files& files)
     return text;
 }
 
-Variables GetEnvironmentVariables()
-{
-    Variables variables;
-    for (char** entry = environ; entry != nullptr && *entry != nullptr; ++entry) {
-        const std::string text = *entry;
-        const std::size_t end = text.find('=');
-        if (end != std::string::npos)
-            variables.emplace(text.substr(0, end), text.substr(end + 1));
-    }
-    return variables;
-}
-
 } // namespace
 
-Identity GetMachineIdentity(const Files& files, const Variables&)
+Identity GetMachineIdentity(const Files& files, const Process& process)
 {
     Identity identity;
     identity.fAdapters = ListAdapters(files);
+    identity.fFiles = ListDriverFiles(files, process);
     identity.fSystem = GetSystem(files);
     SortIdentity(identity);
     return identity;
@@ -49,7 +37,9 @@ Identity GetMachineIdentity(const Files& files, const Variables&)
 
 Identity GetIdentity(const std::string& assayProgram)
 {
-    Identity identity = GetMachineIdentity(Files(), GetEnvironmentVariables());
+    Process process = GetThisProcess();
+    process.fProgram = process.MakeAbsolute(assayProgram);
+    Identity identity = GetMachineIdentity(Files(), process);
     identity.fAssayVersion = GetFileVersion(assayProgram).fValue;
     return identity;
 }
