@@ -25,9 +25,18 @@ install(FILES ${CMAKE_CURRENT_BINARY_DIR}/assay-hostConfig.cmake
   ${CMAKE_CURRENT_BINARY_DIR}/assay-hostConfigVersion.cmake
   DESTINATION ${package_dir} COMPONENT libassay-host-dev)
 
-# The .pc file has its prefix relative to itself, so that the installation can be moved.
+# The .pc files have their prefix relative to themselves, so that the installation can be moved. One is
+# of the shared library, and with --static for a wholly static program; the other of the static library
+# in any program.
 file(RELATIVE_PATH prefix_from_pc /usr/${CMAKE_INSTALL_LIBDIR}/pkgconfig /usr)
-configure_file(${CMAKE_SOURCE_DIR}/cmake/assay-host.pc.in
-  ${CMAKE_CURRENT_BINARY_DIR}/assay-host.pc @ONLY)
-install(FILES ${CMAKE_CURRENT_BINARY_DIR}/assay-host.pc
-  DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT libassay-host-dev)
+set(static_libraries)
+set(pc_files assay-host)
+if(NOT WIN32)
+  set(static_libraries "-lboost_thread -lboost_filesystem -lstdc++ -lm -ldl -pthread")
+  list(APPEND pc_files assay-host-static)
+endif()
+foreach(file IN LISTS pc_files)
+  configure_file(${CMAKE_SOURCE_DIR}/cmake/${file}.pc.in ${CMAKE_CURRENT_BINARY_DIR}/${file}.pc @ONLY)
+  install(FILES ${CMAKE_CURRENT_BINARY_DIR}/${file}.pc
+    DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT libassay-host-dev)
+endforeach()
