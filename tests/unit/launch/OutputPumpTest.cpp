@@ -195,10 +195,11 @@ TEST_F(PumpedLaunch, AFunctionThatFailsIsAFailureOfItsChannel)
     const auto pump =
         boost::make_shared<OutputPump>([](std::string_view) { throw std::runtime_error("full"); });
     fParams.SetOutputTask(OutputChannel::kStderr, pump);
+    // If the failure comes before Launch returns, Launch awaits the child's end.
+    fLauncher->fOnLaunch = [this] { fLauncher->fEnded = true; };
     std::string failure;
     try {
         Launch();
-        fLauncher->End(kEndedNormally);
         fApp->Wait(nullptr, kLong);
     } catch (const consoleapp::Exception& exc) {
         failure = exc.what();
