@@ -127,6 +127,7 @@ extern "C" bool MutantIsOn(int number) noexcept;
 TEST(All, Passes) { EXPECT_FALSE(MutantIsOn(1)); }
 TEST(All, Crashes) { if (MutantIsOn(2)) std::abort(); }
 TEST(All, KillsAll) { if (MutantIsOn(3)) kill(-1, SIGKILL); }
+TEST(All, FailsAnyway) { EXPECT_TRUE(MutantIsOn(8)); }
 TEST(All, Writes) { if (MutantIsOn(4)) { EXPECT_EQ(std::fopen("FOLDER/left", "w"), nullptr); EXPECT_NE(std::fopen("/tmp/left", "w"), nullptr); } }
 class OfValues : public testing::TestWithParam<int> {};
 TEST_P(OfValues, Fails) { EXPECT_FALSE(MutantIsOn(GetParam())); }
@@ -165,6 +166,17 @@ def test_a_mutant_is_killed_by_a_failure_or_a_crash_and_survives_without(cases):
     assert attempt(cases, 2) == {"verdict": "killed", "by": "All.Crashes", "how": "status -6"}
     assert attempt(cases, 7) == {"verdict": "killed", "by": "Some/OfValues.Fails/1", "how": "fails"}
     assert attempt(cases, 5) == {"verdict": "survived", "unsteady": []}
+
+
+def test_a_case_that_fails_without_the_mutant_catches_nothing(cases):
+    folder, job = cases
+    steps = [(str(folder / "cases"), {"All.FailsAnyway": 0.1, "All.Passes": 0.1})]
+
+    def verdict(number):
+        return isolation.run({**job, "what": "attempt", "number": number, "steps": steps}, folder, 100)[0]
+
+    assert verdict(5) == {"verdict": "survived", "unsteady": ["All.FailsAnyway"]}
+    assert verdict(1) == {"verdict": "killed", "by": "All.Passes", "how": "fails"}
 
 
 def test_a_mutant_that_kills_all_it_finds_ends_only_its_own_tests(cases):

@@ -28,7 +28,7 @@ SURVEYED = {None: 60}
 MEMORY = 12 << 30
 # Some tests write behind the 32-bit sizes, into files with holes.
 FILE = 64 << 30
-# A case that fails once and then passes says nothing; after so many of them the mutant is let go.
+# A case that fails once and then passes, or fails without the mutant too, says nothing; after so many of them the mutant is let go.
 UNSTEADY = 3
 EVENT = re.compile(rb"\[ (RUN     | FAILED ) +\] ([\w/]+\.[\w/]+)")
 
@@ -187,6 +187,17 @@ def survey(job, board):
     return result
 
 
+def fails_anyway(job, board, tests, case):
+    """Whether a case fails without the mutant too. A mutant that was built alone, number 0, is on always."""
+    if job["number"] == 0:
+        return False
+    board.choose(0)
+    try:
+        return tests.run([case]) is not None
+    finally:
+        board.choose(job["number"])
+
+
 def attempt(job, board):
     """Whether the tests catch a mutant. `steps` are (program, {case: seconds}) in order."""
     board.choose(job["number"])
@@ -198,7 +209,8 @@ def attempt(job, board):
             failure = tests.run(cases)
             if failure is None:
                 break
-            if failure.how == "hangs" or not failure.case or tests.run([failure.case]) is not None:
+            again = failure.how == "hangs" or not failure.case or tests.run([failure.case]) is not None
+            if again and not (failure.case and fails_anyway(job, board, tests, failure.case)):
                 return {"verdict": "killed", "by": failure.case or Path(program).name, "how": failure.how}
             unsteady.append(failure.case)
             if len(unsteady) == UNSTEADY:
