@@ -42,6 +42,12 @@ TEST(OsRelease, GivesAVariable)
     EXPECT_EQ(FindOsRelease(text, "PRETTY"), "");
     EXPECT_EQ(FindOsRelease("", "NAME"), "");
     EXPECT_EQ(FindOsRelease("NAME=\"", "NAME"), "\"");
+    EXPECT_EQ(FindOsRelease("NAME=a\\\nX", "NAME"), "a\\") << "nothing follows the backslash";
+    EXPECT_EQ(FindOsRelease("NAME=\"a\\\"", "NAME"), "a\\");
+    EXPECT_EQ(FindOsRelease("NAME=''", "NAME"), "");
+    EXPECT_EQ(FindOsRelease("NAME='a\"", "NAME"), "'a\"") << "no quotes of one kind";
+    EXPECT_EQ(FindOsRelease("NAME='\\n'", "NAME"), "\\n");
+    EXPECT_EQ(FindOsRelease("NAME=a b \t\r\n", "NAME"), "a b");
 }
 
 TEST(Environment, DescribesThisMachine)
