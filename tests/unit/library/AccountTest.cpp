@@ -59,6 +59,19 @@ TEST(LibraryAccount, OfDevices)
                                      std::tuple("clgpu[0]", 1, 0, 0, -1)));
 }
 
+TEST(LibraryAccount, OfADeviceWithItsLastLine)
+{
+    const ChildRun run(MakeWords({{"out", "NumGLGPUs=0"},
+                                  {"out", "OpenCLAvailable=1"},
+                                  {"out", "NumCLGPUs=1"},
+                                  {"out", "clgpu[0].CLName=\"Card\""},
+                                  {"out", "clgpu[0].CLCompute=1"}}));
+    const assay_host_device* const device = assay_host_result_device(run.fResult, 0);
+    EXPECT_EQ(assay_host_device_complete(device), 1);
+    EXPECT_EQ(assay_host_device_failed(device), 0);
+    EXPECT_EQ(assay_host_device_software(device), 0);
+}
+
 TEST(LibraryAccount, OfTheEnd)
 {
     const ChildRun run(kTwoDevices);

@@ -195,6 +195,14 @@ TEST(ExtensionManager, FailedQueriesLeaveNoError)
     EXPECT_THAT(driver.device().errors, IsEmpty());
 }
 
+TEST(ExtensionManager, AFailedQueryOfTheListLeavesNoError)
+{
+    Driver driver("1.1");
+    driver.device().strings.erase(kGLExtensions);
+    EXPECT_FALSE(driver.supports(1));
+    EXPECT_THAT(driver.device().errors, IsEmpty());
+}
+
 TEST(ExtensionManager, CallersErrorsStay)
 {
     Driver driver("4.1", {"GL_ARB_imaging"});

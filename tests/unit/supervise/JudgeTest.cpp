@@ -121,6 +121,8 @@ TEST(Judge, DistinguishesCrashHangAndInterrupt)
 
     died.fKillReason = KillReason::kInterrupt; // Ctrl-C reaches the child too
     EXPECT_EQ(died.Judge().fVerdict, Verdict::kInterrupted);
+    EXPECT_THAT(died.Judge().fReason, testing::StartsWith("The run was interrupted"));
+    EXPECT_THAT(died.Judge().fReason, HasSubstr("QGFCoreInitialized"));
     died.fEnd->fResult = pmutil::kEndedByKill;
     EXPECT_EQ(died.Judge().fVerdict, Verdict::kInterrupted);
     died.fKillReason = KillReason::kTimeout;

@@ -248,6 +248,16 @@ TEST(StepRules, RejectMoreDevicesThanAReportMayHave)
               "the report counts " + std::to_string(kMaxDevices + 1) + " devices");
 }
 
+TEST(StepRules, TakeAsManyDevicesAsAReportMayHave)
+{
+    std::vector<std::string> lines = Join(MakeWholeRun(0, -1));
+    const auto count = std::find(lines.begin(), lines.end(), "NumGLGPUs=0");
+    ASSERT_NE(count, lines.end());
+    *count = "NumGLGPUs=" + std::to_string(kMaxDevices);
+    EXPECT_THAT(GetFailure([&] { StepRules(ReadReport(lines), MakeOutcome(2)); }),
+                testing::Not(HasSubstr("the report counts")));
+}
+
 TEST(ExpectedLine, MatchesByItsKind)
 {
     const ExpectedLine exact{"a=1", Match::kExact};

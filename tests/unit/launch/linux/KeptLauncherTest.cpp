@@ -263,11 +263,17 @@ TEST(KeptLauncher, AFailedStartLeavesNothing)
         {L"/nonexistent/\u00FC", "execve failed: /nonexistent/\xC3\xBC: No such file or directory"},
         {L"/tmp", "execve failed: /tmp: Permission denied"},
         {std::wstring(L"/bin/p\0q", 8), "execve failed: /bin/p: Invalid argument"},
+        {std::wstring(1, static_cast<wchar_t>(0xD800)),
+         "execve failed: Invalid or incomplete multibyte or wide character"},
     };
     for (const auto& row : kRows) {
         KeptLauncher launcher;
         EXPECT_TRUE(ThrowsRuntimeError(row.fText, [&] { launcher.Launch(row.fPath, {}); }));
     }
+    KeptLauncher launcher;
+    EXPECT_TRUE(ThrowsRuntimeError("execve failed: /bin/true: Invalid argument", [&] {
+        launcher.Launch(L"/bin/true", {std::string("a\0b", 3)});
+    }));
     siginfo_t info = {};
     EXPECT_NE(::waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT | __WALL), 0)
         << "a keeper is left";

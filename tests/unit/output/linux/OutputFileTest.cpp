@@ -17,6 +17,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "output/Links.h"
+
 namespace assay_host {
 namespace {
 
@@ -179,6 +181,17 @@ TEST_F(OutputFileTest, NamesAFolderThatIsInItsPlace)
     EXPECT_EQ(GetFailure(GetPath("folder")),
               "cannot write " + GetPath("folder") + ": Is a directory");
     EXPECT_THAT(List(), ElementsAre("folder"));
+}
+
+TEST_F(OutputFileTest, FollowsAsManyLinksAsTheSystem)
+{
+    // link0 -> link1 -> ... -> link41, which isn't there
+    for (int link = 0; link < 41; ++link)
+        fs::create_symlink("link" + std::to_string(link + 1),
+                           GetPath("link" + std::to_string(link)));
+    EXPECT_EQ(FollowLinks(GetPath("link1")).filename().string(), "link41");
+    EXPECT_EQ(FollowLinks(GetPath("link0")).filename().string(), "link40");
+    EXPECT_EQ(FollowLinks(GetPath("link41")).filename().string(), "link41");
 }
 
 } // namespace

@@ -116,6 +116,19 @@ TEST(ProgressLine, FitsTheTerminalInPlainCharacters)
     EXPECT_EQ(terminal.Take(), "\rcaf??\r     \r");
 }
 
+TEST(ProgressLine, TakesATerminalWithoutAWidthForOneOf80)
+{
+    for (const auto& [width, shown] : {std::pair<unsigned short, int>{0, 79}, {80, 79}, {2, 1}}) {
+        ErrorTerminal terminal(width);
+        {
+            ProgressLine line;
+            line.Show(std::string(200, 'x'));
+        }
+        const std::string text = terminal.Take();
+        EXPECT_EQ(std::count(text.begin(), text.end(), 'x'), shown) << width;
+    }
+}
+
 TEST(ProgressLine, IsNothingWhereStandardErrorIsNoTerminal)
 {
     testing::internal::CaptureStderr();

@@ -17,6 +17,7 @@
 
 #include "FreshProcess.h"
 #include "TempFolder.h"
+#include "all/PathCodecvt.h"
 #include "pmutil/LogSinks.h"
 #include "pmutil/Threads.h"
 
@@ -347,6 +348,33 @@ TEST(SystemTest, SharedAppendAppendsAndGivesNullForWhatCannotBeOpened)
     }
     EXPECT_EQ(ReadWhole(path), "one\ntwo\n");
     EXPECT_EQ(OpenSharedAppend(folder.File("missing/log")), nullptr);
+}
+
+TEST(SystemTest, APathThatHasNoNarrowFormIsRejectedAsAWhole)
+{
+    for (const wchar_t bad : {wchar_t{0xD800}, wchar_t{0xDFFF}, wchar_t{0x110000}, wchar_t{-1}}) {
+        const std::wstring path = {L'a', bad, L'b'};
+        char bytes[32] = {};
+        std::mbstate_t state = {};
+        const wchar_t* next = nullptr;
+        char* end = nullptr;
+        EXPECT_EQ(GetPathCodecvt().out(state, path.data(), path.data() + path.size(), next, bytes,
+                                       bytes + sizeof bytes, end),
+                  std::codecvt_base::error);
+        EXPECT_EQ(next, path.data());
+        EXPECT_EQ(end, bytes);
+    }
+    for (const wchar_t good : {wchar_t{0xD7FF}, wchar_t{0xE000}, wchar_t{0x10FFFF}}) {
+        const std::wstring path(1, good);
+        char bytes[32] = {};
+        std::mbstate_t state = {};
+        const wchar_t* next = nullptr;
+        char* end = nullptr;
+        EXPECT_EQ(GetPathCodecvt().out(state, path.data(), path.data() + path.size(), next, bytes,
+                                       bytes + sizeof bytes, end),
+                  std::codecvt_base::ok);
+        EXPECT_GT(end, bytes + 2);
+    }
 }
 
 TEST(PMFileLoggerOnLinuxTest, PathThatHasNoNarrowFormRaisesInWrite)

@@ -39,5 +39,17 @@ TEST(ListChildren, ListsEndedChildrenUntilTheyAreReaped)
     EXPECT_THAT(ListChildren(::getpid()), IsEmpty());
 }
 
+TEST(ListChildren, LeavesNoDescriptor)
+{
+    const auto open = [] {
+        const int next = ::dup(STDIN_FILENO);
+        ::close(next);
+        return next;
+    };
+    const int before = open();
+    ListChildren(::getpid());
+    EXPECT_EQ(open(), before) << "the lowest free descriptor is another one";
+}
+
 } // namespace
 } // namespace assay_host
