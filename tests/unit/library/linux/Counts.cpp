@@ -28,7 +28,8 @@ long CountChildren()
         if (entry->d_name[0] < '0' || entry->d_name[0] > '9')
             continue;
         std::ifstream file("/proc/" + std::string(entry->d_name) + "/stat");
-        const std::string text((std::istreambuf_iterator<char>(file)), {});
+        std::string text;
+        std::getline(file, text, '\0'); // fails if the process has just ended
         const std::size_t name = text.rfind(')');
         if (name != std::string::npos &&
             text.compare(name + 4, parent.size() + 1, parent + " ") == 0)

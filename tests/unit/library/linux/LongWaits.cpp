@@ -1,5 +1,6 @@
-// The library's waits are long in all tests, which then don't depend on the machine's speed. The graces
-// for streams stay as they are, because a stream that a descendant holds open ends only by them.
+// The library's waits are long in all tests, which then don't depend on the machine's speed. The
+// graces for streams stay as they are, because a stream that a descendant holds open ends only by
+// them.
 #include <gtest/gtest.h>
 
 #include <optional>
