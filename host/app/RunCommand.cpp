@@ -13,6 +13,7 @@
 #include "output/Terminal.h"
 #include "output/WriterThread.h"
 #include "report/JsonDocument.h"
+#include "report/JsonEvents.h"
 #include "report/LineForm.h"
 #include "report/Report.h"
 #include "report/SequenceReader.h"

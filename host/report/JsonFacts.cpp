@@ -1,6 +1,6 @@
 #include "report/JsonFacts.h"
 
-#include "report/JsonDocument.h"
+#include "report/JsonBytes.h"
 #include "report/Software.h"
 
 namespace assay_host {

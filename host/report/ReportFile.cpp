@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "report/JsonDocument.h"
+#include "report/JsonReader.h"
 #include "report/ReportInput.h"
 #include "report/ReportReader.h"
 

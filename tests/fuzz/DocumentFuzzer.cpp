@@ -11,7 +11,10 @@
 
 #include "Require.h"
 #include "report/Diff.h"
+#include "report/JsonBytes.h"
 #include "report/JsonDocument.h"
+#include "report/JsonEvents.h"
+#include "report/JsonReader.h"
 #include "report/ReportReader.h"
 #include "report/TextView.h"
 

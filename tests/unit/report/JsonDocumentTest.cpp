@@ -10,7 +10,9 @@
 #include "Samples.h"
 #include "SavedJson.h"
 #include "report/Bytes.h"
-#include "report/JsonDocument.h"
+#include "report/JsonBytes.h"
+#include "report/JsonEvents.h"
+#include "report/JsonReader.h"
 
 namespace assay_host {
 namespace {

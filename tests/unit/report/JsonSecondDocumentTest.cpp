@@ -8,6 +8,8 @@
 #include "Samples.h"
 #include "SavedJson.h"
 #include "report/JsonDocument.h"
+#include "report/JsonEvents.h"
+#include "report/JsonReader.h"
 
 namespace assay_host {
 namespace {

@@ -10,7 +10,8 @@
 #include "Lines.h"
 #include "Samples.h"
 #include "SavedJson.h"
-#include "report/JsonDocument.h"
+#include "report/JsonEvents.h"
+#include "report/JsonReader.h"
 #include "report/ReportFile.h"
 #include "report/ReportInput.h"
 

@@ -11,6 +11,7 @@
 #include <nlohmann/json.hpp>
 
 #include "report/JsonDocument.h"
+#include "report/JsonReader.h"
 
 namespace assay_host {
 
