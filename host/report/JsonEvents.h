@@ -1,5 +1,5 @@
-// The events of a run in the JSON Lines form. host/schema has their schemas. Each is a JSON object on one
-// line, with its line end. Texts are encoded by EncodeBytes.
+// The events of a run in the JSON Lines form. host/schema has their schemas. Each is a JSON object
+// on one line, with its line end. Texts are encoded by EncodeBytes.
 //
 // Any thread may call.
 #pragma once

@@ -192,8 +192,11 @@ TEST_F(PumpedLaunch, PumpsEndWithAStartThatFails)
 
 TEST_F(PumpedLaunch, AFunctionThatFailsIsAFailureOfItsChannel)
 {
-    const auto pump =
-        boost::make_shared<OutputPump>([](std::string_view) { throw std::runtime_error("full"); });
+    // The child ends here, because Launch or Wait fails, whichever sees the failure first.
+    const auto pump = boost::make_shared<OutputPump>([this](std::string_view) {
+        fLauncher->End(kEndedNormally);
+        throw std::runtime_error("full");
+    });
     fParams.SetOutputTask(OutputChannel::kStderr, pump);
     // If the failure comes before Launch returns, Launch awaits the child's end.
     fLauncher->fOnLaunch = [this] { fLauncher->fEnded = true; };
