@@ -1,16 +1,16 @@
 """Which sources of the product this platform builds, to which module each belongs, and how clang
 reads it."""
 import json
+import os
 import re
 import shlex
 from collections import Counter
 from pathlib import PurePath
 
-# The target of the build that makes a module.
+PRODUCT = ("qgf", "pmutil", "host")
+# The modules of the build's targets. The others are named by the target, without "assay_".
 MODULES = {
-    "qgf": "qgf", "pmutil": "pmutil/all", "pmutil_gpu": "pmutil/gpu", "assay_app": "assay/app",
-    "assay": "assay/app", "assay_report": "report", "assay_supervise": "supervise",
-    "assay_output": "output", "assay_facts": "facts", "assay_library": "library",
+    "pmutil": "pmutil/all", "pmutil_gpu": "pmutil/gpu", "assay_app": "assay/app", "assay": "assay/app",
     "assay_host_app": "host/app", "assay-host": "host/app",
 }
 
@@ -25,7 +25,7 @@ class Source:
 def module_of(target, path):
     if target.startswith("pmutil") and "linux" in PurePath(path).parts:
         return "pmutil/linux"
-    return MODULES[target]
+    return MODULES.get(target, target.removeprefix("assay_"))
 
 
 def sources(workshop):
@@ -34,8 +34,8 @@ def sources(workshop):
     for entry in json.loads(workshop.commands.read_text()):
         output = PurePath(re.search(r" -o (\S+)", entry["command"]).group(1))
         target = next((part[:-4] for part in output.parts if part.endswith(".dir")), "")
-        path = str(PurePath(entry["file"]).relative_to(tree)) if target in MODULES else None
-        if path in names:
+        path = os.path.relpath(entry["file"], tree)
+        if path in names and path.split("/")[0] in PRODUCT:
             found[path] = Source(path, module_of(target, path), arguments(entry["command"].replace(
                 str(tree), str(workshop.plain))))
     return {**found, **headers(workshop, found)}

@@ -9,7 +9,7 @@ from dataclasses import dataclass
 from pathlib import Path
 
 from mutants import isolation
-from mutants.workshop import TARGETS, run
+from mutants.workshop import UNIT_TESTS, run
 
 # Cases of one job: the jobs go on side by side.
 CHUNK = 100
@@ -51,10 +51,9 @@ class Survey:
         folder = self.workshop.build / "bin"
         others = hashlib.sha256()
         for path in [*sorted(folder.glob("*")), *sorted(self.workshop.build.glob("lib*/*.so"))]:
-            if path.name not in TARGETS:
+            if not UNIT_TESTS.fullmatch(path.name):
                 others.update(path.read_bytes())
-        states = {str(folder / target): digest(others, [folder / target])
-                  for target in TARGETS if (folder / target).exists()}
+        states = {str(path): digest(others, [path]) for path in sorted(folder.glob("*_tests"))}
         if self.program_tests:
             others.update(repr(self.program_tests).encode())
             tests = sorted((self.workshop.tree / "tests" / "program").glob("*.py"))

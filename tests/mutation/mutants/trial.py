@@ -63,8 +63,10 @@ class Trial:
 
     def near(self, mutant):
         """The numbers of the mutants by which to tell which tests reach this one: those of the same
-        function, or else of the same file."""
+        function, or else of the same file, or else of the same module."""
         others = [(number, each) for number, each in self.numbered[mutant.path]
                   if each.form != "alone" and each.name not in self.refused]
         function = [number for number, each in others if mutant.function and each.function == mutant.function]
-        return function or [number for number, _ in others]
+        return function or [number for number, _ in others] or [
+            number for mutants in self.numbered.values() for number, each in mutants
+            if each.module == mutant.module]

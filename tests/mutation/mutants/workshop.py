@@ -11,8 +11,7 @@ from mutants import schemata
 
 HERE = Path(__file__).resolve().parent
 ERROR = re.compile(r"(?:from |^|In file included from )([^\s:]+):(\d+)(?::\d+)?[:,]", re.M)
-TARGETS = ["qgf_tests", "pmutil_tests", "launch_tests", "gpu_tests", "app_tests", "report_tests",
-           "supervise_tests", "output_tests", "facts_tests", "library_tests"]
+UNIT_TESTS = re.compile(r"[a-z]+_tests")
 PROGRAMS = ["assay", "assay-host", "assay-at-root", "assay-host-on-cue", "assay_host_shared"]
 
 
@@ -85,8 +84,8 @@ class Workshop:
     def targets(self):
         known = run(["ninja", "-C", str(self.build), "-t", "targets", "all"]).stdout
         names = {line.split(":")[0] for line in known.splitlines()}
-        drivers = [name for name in names if name.startswith("scripted_")]
-        return [name for name in [*TARGETS, *PROGRAMS, *drivers, "test_child"] if name in names]
+        found = [name for name in names if name.startswith("scripted_") or UNIT_TESTS.fullmatch(name)]
+        return sorted(found) + [name for name in [*PROGRAMS, "test_child"] if name in names]
 
     def make(self, targets, keep_going=False):
         """(whether all was built, what the build said)."""
