@@ -53,6 +53,12 @@ TEST(Unknown, HasAFormForEachKindOfKey)
     EXPECT_EQ(Judge("CLBandwidth", "1.1e+13"), Unknown::kImplausible);
     EXPECT_EQ(Judge("CLCompute", "nan"), Unknown::kImplausible);
     EXPECT_EQ(Judge("CLCompute", "1e+08"), Unknown::kNot);
+    EXPECT_EQ(Judge("CLCompute", "1.00001e+08"), Unknown::kImplausible);
+    EXPECT_EQ(Judge("CLCompute", "0"), Unknown::kNoTime);
+    EXPECT_EQ(Judge("CLCompute", "-1"), Unknown::kImplausible);
+    EXPECT_EQ(Judge("CLBandwidth", "1e+13"), Unknown::kNot);
+    for (const char* small : {"0.5", "1", "1e-300"})
+        EXPECT_EQ(Judge("CLBandwidth", small), Unknown::kNot) << small;
 }
 
 TEST(Unknown, IsNoZeroThatIsAnAnswer)
