@@ -1,0 +1,150 @@
+// What the options of assay-host set. The help texts and messages are compared by program tests.
+#include "app/CommandLine.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace assay_host {
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::StartsWith;
+using Words = std::vector<std::string>;
+
+template <typename Kind>
+Kind Parse(const Words& words)
+{
+    const Parsed parsed = ParseCommandLine(words);
+    const Kind* const choice = parsed.fChoice ? std::get_if<Kind>(&*parsed.fChoice) : nullptr;
+    EXPECT_NE(choice, nullptr) << parsed.fText;
+    return choice == nullptr ? Kind() : *choice;
+}
+
+TEST(CommandLineOfRun, HasDefaults)
+{
+    const auto run = Parse<RunChoice>({"run"});
+    EXPECT_EQ(run.fChild.fProgram, "");
+    EXPECT_THAT(run.fChild.fArgs, IsEmpty());
+    EXPECT_EQ(run.fChild.fTimeoutSeconds, 60);
+    EXPECT_EQ(run.fFormat, Format::kText);
+    EXPECT_EQ(run.fSchema, 2);
+    EXPECT_EQ(run.fNeed, Need::kNothing);
+    EXPECT_FALSE(run.fIdentify);
+    EXPECT_FALSE(run.fRaw);
+    EXPECT_EQ(run.fOutput, "");
+}
+
+TEST(CommandLineOfRun, HasAnOptionForEachField)
+{
+    const auto child =
+        Parse<RunChoice>({"run", "--assay", "a b", "--timeout", "1.5", "--", "-x=1", "--", "y"});
+    EXPECT_EQ(child.fChild.fProgram, "a b");
+    EXPECT_EQ(child.fChild.fTimeoutSeconds, 1.5);
+    EXPECT_THAT(child.fChild.fArgs, ElementsAre("-x=1", "--", "y"));
+    const auto run = Parse<RunChoice>({"run", "--identify", "--raw", "--output", "file"});
+    EXPECT_TRUE(run.fIdentify);
+    EXPECT_TRUE(run.fRaw);
+    EXPECT_EQ(run.fOutput, "file");
+    EXPECT_EQ(Parse<RunChoice>({"run", "--timeout=0"}).fChild.fTimeoutSeconds, 0);
+}
+
+TEST(CommandLineOfRun, NamesItsFormsAndNeeds)
+{
+    EXPECT_EQ(Parse<RunChoice>({"run", "--format=text", "--raw"}).fFormat, Format::kText);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--format", "json"}).fFormat, Format::kJson);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--format", "jsonl"}).fFormat, Format::kJsonLines);
+    for (const char* form : {"json", "jsonl"}) {
+        EXPECT_EQ(Parse<RunChoice>({"run", "--format", form, "--schema", "1"}).fSchema, 1);
+        EXPECT_EQ(Parse<RunChoice>({"run", "--format", form, "--schema", "2"}).fSchema, 2);
+    }
+    EXPECT_EQ(Parse<RunChoice>({"run", "--need", "opengl"}).fNeed, Need::kOpenGL);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--need", "opencl"}).fNeed, Need::kOpenCL);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--need", "both"}).fNeed, Need::kBoth);
+}
+
+TEST(CommandLineOfTorture, NamesItsFailures)
+{
+    constexpr StepFailure kCrash = StepFailure::kCrash;
+    constexpr StepFailure kThrow = StepFailure::kThrow;
+    EXPECT_THAT(Parse<TortureChoice>({"torture"}).fFailures, ElementsAre(kCrash, kThrow));
+    const auto of = [](const char* kind) {
+        return Parse<TortureChoice>({"torture", "--kind", kind}).fFailures;
+    };
+    EXPECT_THAT(of("both"), ElementsAre(kCrash, kThrow));
+    EXPECT_THAT(of("crash"), ElementsAre(kCrash));
+    EXPECT_THAT(of("throw"), ElementsAre(kThrow));
+    const auto child = Parse<TortureChoice>({"torture", "--assay=a", "--timeout", "2", "--",
+                                             "-exit=1", "x-crashAfter=1", "crashAfter"});
+    EXPECT_EQ(child.fChild.fProgram, "a");
+    EXPECT_EQ(child.fChild.fTimeoutSeconds, 2);
+    EXPECT_THAT(child.fChild.fArgs, ElementsAre("-exit=1", "x-crashAfter=1", "crashAfter"));
+}
+
+TEST(CommandLineOfDiff, HasTwoFilesAndATolerance)
+{
+    const auto plain = Parse<DiffChoice>({"diff", "a", "b"});
+    EXPECT_EQ(plain.fBefore, "a");
+    EXPECT_EQ(plain.fAfter, "b");
+    EXPECT_EQ(plain.fTolerance, 0.1);
+    EXPECT_EQ(Parse<DiffChoice>({"diff", "--tolerance", "0", "a", "b"}).fTolerance, 0);
+    EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--tolerance=2.5"}).fTolerance, 2.5);
+}
+
+struct Row {
+    Words fWords;
+    int fStatus;
+};
+
+TEST(CommandLine, RejectsWhatNoCommandTakes)
+{
+    const Row kRows[] = {
+        {{}, kErrorStatus},
+        {{"bogus"}, kErrorStatus},
+        {{"run", "x"}, kErrorStatus},
+        {{"run", "--assay", ""}, kErrorStatus},
+        {{"run", "--output", ""}, kErrorStatus},
+        {{"run", "--timeout", ""}, kErrorStatus},
+        {{"run", "--timeout", "-0.5"}, kErrorStatus},
+        {{"run", "--timeout", "inf"}, kErrorStatus},
+        {{"run", "--format", ""}, kErrorStatus},
+        {{"run", "--format", "JSON"}, kErrorStatus},
+        {{"run", "--raw", "--format", "json"}, kErrorStatus},
+        {{"run", "--schema", "2"}, kErrorStatus},
+        {{"run", "--schema", "0", "--format", "json"}, kErrorStatus},
+        {{"run", "--need", "nothing"}, kErrorStatus},
+        {{"torture", "--format", "text"}, kErrorStatus},
+        {{"torture", "--kind", ""}, kErrorStatus},
+        {{"torture", "--", "-crashAfter=1"}, kErrorStatus},
+        {{"torture", "--", "x", "-throwAfter="}, kErrorStatus},
+        {{"diff"}, kDiffErrorStatus},
+        {{"diff", "a"}, kDiffErrorStatus},
+        {{"diff", "a", ""}, kDiffErrorStatus},
+        {{"diff", "", "b"}, kDiffErrorStatus},
+        {{"diff", "a", "b", "c"}, kDiffErrorStatus},
+        {{"diff", "a", "b", "--"}, kDiffErrorStatus},
+        {{"diff", "a", "b", "--tolerance", "-1"}, kDiffErrorStatus},
+    };
+    for (const Row& row : kRows) {
+        const Parsed parsed = ParseCommandLine(row.fWords);
+        const std::string words = testing::PrintToString(row.fWords);
+        EXPECT_FALSE(parsed.fChoice) << words;
+        EXPECT_EQ(parsed.fStatus, row.fStatus) << words;
+        EXPECT_THAT(parsed.fText, StartsWith("assay-host: ")) << words;
+    }
+}
+
+TEST(CommandLine, HelpAndVersionAreNoFailures)
+{
+    for (const Words& words : {Words{"--help"}, {"-h"}, {"run", "-h"}, {"diff", "--help", "a"}}) {
+        const Parsed parsed = ParseCommandLine(words);
+        EXPECT_FALSE(parsed.fChoice);
+        EXPECT_EQ(parsed.fStatus, 0);
+        EXPECT_THAT(parsed.fText, testing::HasSubstr("usage: assay-host ")) << parsed.fText;
+    }
+    EXPECT_EQ(ParseCommandLine({"--version"}).fStatus, 0);
+    EXPECT_THAT(ParseCommandLine({"--version"}).fText, StartsWith("assay-host "));
+}
+
+} // namespace
+} // namespace assay_host
