@@ -17,7 +17,7 @@ namespace {
 
 constexpr int kOperations = 1'000'000;
 constexpr int kParts = 10;
-constexpr std::uint64_t kMost = 20'000; // keeps the blocks small, and the growth frequent
+constexpr std::uint64_t kMaxBytes = 20'000; // keeps the blocks small, and the growth frequent
 
 // The text of an error; empty if there is none.
 using Outcome = std::string;
@@ -376,7 +376,7 @@ private:
             break;
         }
         ExpectSameState();
-        if (fModel.fBytes.size() > kMost)
+        if (fModel.fBytes.size() > kMaxBytes)
             StartOver();
     }
 

@@ -143,15 +143,16 @@ TEST(PosixHandle, RequestsAboveTheSystemsLimitComeBackShort)
     GTEST_SKIP() << "the thread sanitizer's shadow of the 2 GiB that are read takes all memory";
 #endif
     // Reads from /dev/zero into address space without memory: the read stops where memory ends.
-    constexpr std::uint64_t kMost = 0x7FFFF000;
+    constexpr std::uint64_t kMaxPerCall = 0x7FFFF000;
     constexpr std::uint64_t kAsked = (1ULL << 33) + 5;
     auto null = PosixHandle::OpenFile("/dev/null", kOpenWrite, kOpenExisting, false);
     void* const space =
         ::mmap(nullptr, kAsked, PROT_READ, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
     ASSERT_NE(space, MAP_FAILED);
-    EXPECT_EQ(null->WriteSome(space, kAsked), kMost);
+    EXPECT_EQ(null->WriteSome(space, kAsked), kMaxPerCall);
     null->WriteAll(space, kAsked);
-    EXPECT_EQ(null->WriteSome(space, UINT64_MAX), kMost) << "no size is taken for a negative one";
+    EXPECT_EQ(null->WriteSome(space, UINT64_MAX), kMaxPerCall)
+        << "no size is taken for a negative one";
     ::munmap(space, kAsked);
 }
 

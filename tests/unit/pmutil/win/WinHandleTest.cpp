@@ -127,7 +127,7 @@ TEST(WinHandle, RequestsAboveFourGigabytesAskForAllThatACallTakes)
     static std::vector<DWORD> asked;
     asked.clear();
     WinHandle channel(::GetStdHandle(STD_OUTPUT_HANDLE), false);
-    constexpr std::uint64_t kMost = 0xFFFFFFFF;
+    constexpr std::uint64_t kMaxPerCall = 0xFFFFFFFF;
     char bytes[1] = {};
     {
         const ReplacedImport write(
@@ -136,9 +136,9 @@ TEST(WinHandle, RequestsAboveFourGigabytesAskForAllThatACallTakes)
                 *count = size;
                 return TRUE;
             });
-        EXPECT_EQ(channel.WriteSome(bytes, kMost + 6), kMost);
-        EXPECT_EQ(channel.WriteSome(bytes, kMost - 1), kMost - 1);
-        channel.WriteAll(bytes, 2 * kMost + 6);
+        EXPECT_EQ(channel.WriteSome(bytes, kMaxPerCall + 6), kMaxPerCall);
+        EXPECT_EQ(channel.WriteSome(bytes, kMaxPerCall - 1), kMaxPerCall - 1);
+        channel.WriteAll(bytes, 2 * kMaxPerCall + 6);
     }
     {
         const ReplacedImport read(
@@ -147,7 +147,7 @@ TEST(WinHandle, RequestsAboveFourGigabytesAskForAllThatACallTakes)
                 *count = size;
                 return TRUE;
             });
-        EXPECT_EQ(channel.ReadSome(bytes, kMost + 6), kMost);
+        EXPECT_EQ(channel.ReadSome(bytes, kMaxPerCall + 6), kMaxPerCall);
     }
     EXPECT_EQ(asked,
               (std::vector<DWORD>{0xFFFFFFFF, 0xFFFFFFFE, 0xFFFFFFFF, 0xFFFFFFFF, 6, 0xFFFFFFFF}));
