@@ -12,6 +12,7 @@
 #include "report/Bytes.h"
 #include "report/LineForm.h"
 #include "report/Software.h"
+#include "report/Trials.h"
 
 namespace assay_host {
 
@@ -29,19 +30,8 @@ bool StartsWith(std::string_view text, std::string_view start)
     return text.substr(0, start.size()) == start;
 }
 
-struct FailedTrial {
-    const char* fKey;
-    const char* fReason;
-    const char* fText;
-};
-constexpr FailedTrial kFailedTrials[] = {
-    {"CanCompileProgramGLSL", "shader-trial-failed",
-     "a realistic pair of shaders does not compile"},
-    {"GLFrameBufferOK", "framebuffer-trial-failed", "no framebuffer could be drawn to"},
-};
-
 // The result of one device's trials of the interface.
-struct Trial {
+struct DeviceTrial {
     const DeviceAnswers* fDevice;
     const char* fFailure; // a reason; null if it passed
     std::string fText;
@@ -159,21 +149,21 @@ private:
 
     Usable JudgeDevices() const
     {
-        std::vector<Trial> trials;
+        std::vector<DeviceTrial> trials;
         for (const DeviceAnswers& device : fAnswers.fDevices)
             if (device.fKind == fKind)
                 trials.push_back(MakeTrial(device));
         if (trials.empty())
             return JudgeNoDevice();
-        const Trial* software = nullptr;
-        const Trial* failed = nullptr;
-        for (const Trial& trial : trials) {
+        const DeviceTrial* software = nullptr;
+        const DeviceTrial* failed = nullptr;
+        for (const DeviceTrial& trial : trials) {
             const bool isSoftware = !FindSoftwareText(*trial.fDevice).empty();
             if (!trial.fFailure && !isSoftware)
                 return {Usability::kHardware, "trials-passed",
                         fmt::format("{} works on graphics hardware.", GetKindName(fKind)),
                         trial.fDevice->fTag};
-            const Trial*& first = trial.fFailure ? failed : software;
+            const DeviceTrial*& first = trial.fFailure ? failed : software;
             if (!first)
                 first = &trial;
         }
@@ -187,11 +177,11 @@ private:
                 software->fDevice->fTag};
     }
 
-    Trial MakeTrial(const DeviceAnswers& device) const
+    DeviceTrial MakeTrial(const DeviceAnswers& device) const
     {
-        for (const auto& [key, reason, text] : kFailedTrials)
-            if (device.GetValue(key) == "0")
-                return MakeFailure(device, reason, text, key);
+        for (const Trial& trial : kTrials)
+            if (device.GetValue(trial.fKey) == "0")
+                return MakeFailure(device, trial.fCode, trial.fText, trial.fKey);
         // A test after the last trial only describes the device; its failure doesn't matter.
         const char* const last = fKind == DeviceKind::kOpenGL ? "GLFrameBufferOK" : "CLCompute";
         if (!device.Find(last))
@@ -235,8 +225,8 @@ private:
         return cause.empty() ? cause : ": " + ShowBytes(cause);
     }
 
-    Trial MakeFailure(const DeviceAnswers& device, const char* reason, const char* text,
-                      const char* key) const
+    DeviceTrial MakeFailure(const DeviceAnswers& device, const char* reason, const char* text,
+                            const char* key) const
     {
         return {&device, reason,
                 fmt::format("{}: {}{}", device.fTag, text, GetCauseText(device.fTag + "." + key))};

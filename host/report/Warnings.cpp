@@ -6,6 +6,7 @@
 
 #include "report/Bytes.h"
 #include "report/Software.h"
+#include "report/Trials.h"
 #include "report/Unknown.h"
 
 namespace assay_host {
@@ -25,12 +26,6 @@ constexpr Check kReportChecks[] = {
     {"OGLContextCreated", "no-default-context",
      "No OpenGL context could be created on the first display device."},
     {"NumGLGPUs", "no-opengl-device", "No OpenGL device was found."},
-};
-constexpr Check kTrials[] = {
-    {"CanCompileProgramGLSL", "shader-trial-failed",
-     "a realistic pair of shaders does not compile and link"},
-    {"GLFrameBufferOK", "framebuffer-trial-failed",
-     "no complete framebuffer object could be created and drawn to"},
 };
 
 std::string FindCause(const RunOutcome& outcome, const std::string& key)
@@ -100,7 +95,7 @@ void WarnOfFailure(Warnings& warnings, const DeviceAnswers& device, const RunOut
 void WarnOfDevice(Warnings& warnings, const DeviceAnswers& device, const RunOutcome& outcome)
 {
     WarnOfSoftware(warnings, device);
-    for (const Check& trial : kTrials)
+    for (const Trial& trial : kTrials)
         if (device.GetValue(trial.fKey) == "0")
             warnings.push_back({trial.fCode, device.fTag, trial.fText,
                                 FindCause(outcome, device.fTag + "." + trial.fKey)});

@@ -101,11 +101,11 @@ TEST(LibraryAccount, OfWhatCanBeUsed)
                    assay_host_result_usable_text(run.fResult, which),
                    assay_host_result_usable_device(run.fResult, which));
     };
-    EXPECT_EQ(of(ASSAY_HOST_OPENGL),
-              All(ASSAY_HOST_BROKEN, "shader-trial-failed",
-                  "OpenGL does not work: glgpu[0]: a realistic pair of shaders does not compile: "
-                  "broken.",
-                  "glgpu[0]"));
+    EXPECT_EQ(of(ASSAY_HOST_OPENGL), All(ASSAY_HOST_BROKEN, "shader-trial-failed",
+                                         "OpenGL does not work: glgpu[0]: a realistic pair of "
+                                         "shaders does not compile and link: "
+                                         "broken.",
+                                         "glgpu[0]"));
     EXPECT_EQ(of(ASSAY_HOST_OPENCL),
               All(ASSAY_HOST_BROKEN, "crashed", "The child crashed in OpenCL, at clgpu[0].CLName.",
                   "clgpu[0]"));

@@ -213,8 +213,9 @@ TEST(Usable, SaysWhichDeviceIsMeant)
                                          .Set("glgpu[0].CanCompileProgramGLSL", "0")
                                          .Set("glgpu[1].CanCompileProgramGLSL", "0")
                                          .GetText());
-    EXPECT_EQ(JudgeUsable(DeviceKind::kOpenGL, GetAnswers(report), {}).fText,
-              "OpenGL does not work: glgpu[0]: a realistic pair of shaders does not compile.");
+    EXPECT_EQ(
+        JudgeUsable(DeviceKind::kOpenGL, GetAnswers(report), {}).fText,
+        "OpenGL does not work: glgpu[0]: a realistic pair of shaders does not compile and link.");
 }
 
 } // namespace
