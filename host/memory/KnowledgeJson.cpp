@@ -1,0 +1,216 @@
+#include "memory/KnowledgeJson.h"
+
+#include <stdexcept>
+
+#include "report/JsonBytes.h"
+
+namespace assay_host {
+
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+constexpr Usability kUsabilities[] = {Usability::kHardware, Usability::kSoftware,
+                                      Usability::kBroken, Usability::kAbsent, Usability::kUnknown};
+
+// JSON numbers above 2^53 aren't exact in every reader.
+Json MakeLarge(std::uint64_t number)
+{
+    return std::to_string(number);
+}
+
+std::uint64_t ReadLarge(const Json& json)
+{
+    const auto& text = json.get_ref<const std::string&>();
+    std::size_t end = 0;
+    const std::uint64_t number = std::stoull(text, &end);
+    if (end != text.size())
+        throw std::runtime_error("not a number");
+    return number;
+}
+
+std::string ReadText(const Json& json)
+{
+    return DecodeBytes(json.get_ref<const std::string&>());
+}
+
+template <typename T>
+T ReadInteger(const Json& json)
+{
+    if (!json.is_number_integer())
+        throw std::runtime_error("not an integer");
+    return json.get<T>();
+}
+
+Json MakeAdapter(const AdapterIdentity& adapter)
+{
+    return {{"slot", EncodeBytes(adapter.fSlot)},
+            {"vendor", adapter.fVendor},
+            {"device", adapter.fDevice},
+            {"driver", EncodeBytes(adapter.fDriver)},
+            {"driverVersion", EncodeBytes(adapter.fDriverVersion)}};
+}
+
+AdapterIdentity ReadAdapter(const Json& json)
+{
+    AdapterIdentity adapter;
+    adapter.fSlot = ReadText(json.at("slot"));
+    adapter.fVendor = ReadInteger<unsigned>(json.at("vendor"));
+    adapter.fDevice = ReadInteger<unsigned>(json.at("device"));
+    adapter.fDriver = ReadText(json.at("driver"));
+    adapter.fDriverVersion = ReadText(json.at("driverVersion"));
+    return adapter;
+}
+
+Json MakeFile(const DriverFile& file)
+{
+    return {{"interface", GetKindName(file.fInterface)},
+            {"path", EncodeBytes(file.fPath)},
+            {"size", MakeLarge(file.fSize)},
+            {"time", std::to_string(file.fTime)},
+            {"buildId", EncodeBytes(file.fBuildId)}};
+}
+
+DriverFile ReadFile(const Json& json)
+{
+    DriverFile file;
+    file.fInterface = json.at("interface") == GetKindName(DeviceKind::kOpenGL)
+                          ? DeviceKind::kOpenGL
+                          : DeviceKind::kOpenCL;
+    file.fPath = ReadText(json.at("path"));
+    file.fSize = ReadLarge(json.at("size"));
+    file.fTime = std::stoll(json.at("time").get_ref<const std::string&>());
+    file.fBuildId = ReadText(json.at("buildId"));
+    return file;
+}
+
+Identity ReadIdentity(const Json& json)
+{
+    Identity identity;
+    for (const Json& adapter : json.at("adapters"))
+        identity.fAdapters.push_back(ReadAdapter(adapter));
+    for (const Json& file : json.at("files"))
+        identity.fFiles.push_back(ReadFile(file));
+    identity.fSystem = ReadText(json.at("system"));
+    identity.fAssayVersion = ReadText(json.at("assay"));
+    return identity;
+}
+
+Json MakeHost(const HostMark& host)
+{
+    return {{"process", MakeLarge(host.fProcess)},
+            {"start", MakeLarge(host.fStart)},
+            {"boot", EncodeBytes(host.fBoot)},
+            {"machine", EncodeBytes(host.fMachine)}};
+}
+
+HostMark ReadHost(const Json& json)
+{
+    return {ReadLarge(json.at("process")), ReadLarge(json.at("start")), ReadText(json.at("boot")),
+            ReadText(json.at("machine"))};
+}
+
+Json MakeFinding(const Finding& finding)
+{
+    return {{"answer", GetUsabilityName(finding.fUsability)},
+            {"reason", EncodeBytes(finding.fReason)},
+            {"text", EncodeBytes(finding.fText)},
+            {"tag", EncodeBytes(finding.fTag)},
+            {"device", EncodeBytes(finding.fDevice)},
+            {"driver", EncodeBytes(finding.fDriver)}};
+}
+
+Finding ReadFinding(const Json& json)
+{
+    return {ReadUsability(json.at("answer").get_ref<const std::string&>()),
+            ReadText(json.at("reason")),
+            ReadText(json.at("text")),
+            ReadText(json.at("tag")),
+            ReadText(json.at("device")),
+            ReadText(json.at("driver"))};
+}
+
+Json MakeAttempt(const Attempt& attempt)
+{
+    return {{"end", GetAttemptEndName(attempt.fEnd)},
+            {"started", attempt.fStarted},
+            {"ended", attempt.fEnded},
+            {"exitStatus", attempt.fExitStatus ? Json(*attempt.fExitStatus) : Json()},
+            {"termination", EncodeBytes(attempt.fTermination)},
+            {"reason", EncodeBytes(attempt.fReason)},
+            {"lastLine", EncodeBytes(attempt.fLastLine)},
+            {"host", MakeHost(attempt.fHost)},
+            {"opengl", MakeFinding(attempt.fOpenGL)},
+            {"opencl", MakeFinding(attempt.fOpenCL)}};
+}
+
+Attempt ReadAttempt(const Json& json)
+{
+    Attempt attempt;
+    const auto end = ReadAttemptEnd(json.at("end").get_ref<const std::string&>());
+    if (!end)
+        throw std::runtime_error("an unknown end");
+    attempt.fEnd = *end;
+    attempt.fStarted = ReadInteger<std::int64_t>(json.at("started"));
+    attempt.fEnded = ReadInteger<std::int64_t>(json.at("ended"));
+    if (!json.at("exitStatus").is_null())
+        attempt.fExitStatus = ReadInteger<int>(json.at("exitStatus"));
+    attempt.fTermination = ReadText(json.at("termination"));
+    attempt.fReason = ReadText(json.at("reason"));
+    attempt.fLastLine = ReadText(json.at("lastLine"));
+    attempt.fHost = ReadHost(json.at("host"));
+    attempt.fOpenGL = ReadFinding(json.at("opengl"));
+    attempt.fOpenCL = ReadFinding(json.at("opencl"));
+    return attempt;
+}
+
+} // namespace
+
+Usability ReadUsability(const std::string& name)
+{
+    for (const Usability usability : kUsabilities)
+        if (name == GetUsabilityName(usability))
+            return usability;
+    throw std::runtime_error("an unknown answer");
+}
+
+Json MakeIdentityJson(const Identity& identity)
+{
+    Json adapters = Json::array();
+    for (const AdapterIdentity& adapter : identity.fAdapters)
+        adapters.push_back(MakeAdapter(adapter));
+    Json files = Json::array();
+    for (const DriverFile& file : identity.fFiles)
+        files.push_back(MakeFile(file));
+    return {{"system", EncodeBytes(identity.fSystem)},
+            {"assay", EncodeBytes(identity.fAssayVersion)},
+            {"adapters", adapters},
+            {"files", files}};
+}
+
+Json MakeKnowledgeJson(const Knowledge& knowledge)
+{
+    Json attempts = Json::array();
+    for (const Attempt& attempt : knowledge.fAttempts)
+        attempts.push_back(MakeAttempt(attempt));
+    return {{"count", MakeLarge(knowledge.fCount)},
+            {"attempts", attempts},
+            {"identity", MakeIdentityJson(knowledge.fIdentity)}};
+}
+
+Knowledge ReadKnowledgeJson(const Json& content)
+{
+    Knowledge knowledge;
+    knowledge.fIdentity = ReadIdentity(content.at("identity"));
+    knowledge.fCount = ReadLarge(content.at("count"));
+    for (const Json& attempt : content.at("attempts"))
+        knowledge.fAttempts.push_back(ReadAttempt(attempt));
+    return knowledge;
+}
+
+std::string GetIdentityName(const Identity& identity)
+{
+    return MakeDigest(MakeIdentityJson(identity).dump());
+}
+
+} // namespace assay_host

@@ -1,0 +1,89 @@
+#include "memory/KnowledgeJson.h"
+
+#include <gtest/gtest.h>
+
+#include <functional>
+#include <set>
+
+#include "Samples.h"
+
+namespace assay_host {
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+TEST(KnowledgeJsonTest, ReadsWhatItWrote)
+{
+    const Knowledge knowledge = MakeKnowledge();
+    const Json json = MakeKnowledgeJson(knowledge);
+    const Knowledge read = ReadKnowledgeJson(Json::parse(json.dump()));
+    EXPECT_EQ(read.fIdentity, knowledge.fIdentity);
+    EXPECT_EQ(MakeKnowledgeJson(read), json);
+    ASSERT_EQ(read.fAttempts.size(), 2u);
+    EXPECT_EQ(read.fCount, 2u);
+    const Attempt& first = read.fAttempts.front();
+    EXPECT_EQ(first.fEnd, AttemptEnd::kCrashed);
+    EXPECT_EQ(first.fStarted, kNow - 100);
+    EXPECT_EQ(first.fExitStatus, std::nullopt);
+    EXPECT_EQ(first.fTermination, "signal 11 (Segmentation fault)");
+    EXPECT_EQ(first.fLastLine, "# \xFF\x80 clFinish");
+    EXPECT_EQ(first.fHost, (HostMark{7, 1007, "boot-1", "machine"}));
+    EXPECT_EQ(first.fOpenGL.fUsability, Usability::kHardware);
+    EXPECT_EQ(first.fOpenCL.fUsability, Usability::kBroken);
+    EXPECT_EQ(first.fOpenGL.fDevice, "A card");
+    EXPECT_EQ(read.fAttempts.back().fExitStatus, 2);
+}
+
+TEST(KnowledgeJsonTest, EachMemberIsNeeded)
+{
+    const Json json = MakeKnowledgeJson(MakeKnowledge());
+    const Json flat = json.flatten();
+    for (const auto& member : flat.items()) {
+        Json without = json;
+        const Json::json_pointer place(member.key());
+        Json& parent = without[place.parent_pointer()];
+        if (parent.is_array() || member.value().is_array())
+            continue;
+        parent.erase(place.back());
+        EXPECT_ANY_THROW(ReadKnowledgeJson(without)) << member.key();
+        Json changed = json;
+        changed[place] = {{"an", "object"}};
+        if (place.back() != "interface")
+            EXPECT_ANY_THROW(ReadKnowledgeJson(changed)) << member.key();
+    }
+}
+
+TEST(KnowledgeJsonTest, EachFactOfAnIdentityChangesItsName)
+{
+    const std::vector<std::function<void(Identity&)>> changes = {
+        [](Identity&) {},
+        [](Identity& identity) { identity.fSystem += "x"; },
+        [](Identity& identity) { identity.fAssayVersion += "x"; },
+        [](Identity& identity) { identity.fAdapters.pop_back(); },
+        [](Identity& identity) { identity.fAdapters[0].fSlot += "x"; },
+        [](Identity& identity) { ++identity.fAdapters[0].fVendor; },
+        [](Identity& identity) { ++identity.fAdapters[0].fDevice; },
+        [](Identity& identity) { identity.fAdapters[0].fDriver += "x"; },
+        [](Identity& identity) { identity.fAdapters[0].fDriverVersion += "x"; },
+        [](Identity& identity) { identity.fFiles.pop_back(); },
+        [](Identity& identity) { identity.fFiles[0].fInterface = DeviceKind::kOpenCL; },
+        [](Identity& identity) { identity.fFiles[0].fPath += "x"; },
+        [](Identity& identity) { ++identity.fFiles[0].fSize; },
+        [](Identity& identity) { ++identity.fFiles[0].fTime; },
+        [](Identity& identity) { identity.fFiles[0].fBuildId += "x"; },
+    };
+    std::set<std::string> names;
+    for (const auto& change : changes) {
+        Identity identity = MakeIdentity();
+        change(identity);
+        names.insert(GetIdentityName(identity));
+        Knowledge knowledge;
+        knowledge.fIdentity = identity;
+        EXPECT_EQ(ReadKnowledgeJson(MakeKnowledgeJson(knowledge)).fIdentity, identity);
+    }
+    EXPECT_EQ(names.size(), changes.size());
+    EXPECT_EQ(names.count(GetIdentityName(MakeIdentity())), 1u);
+}
+
+} // namespace
+} // namespace assay_host
