@@ -1,0 +1,183 @@
+#include "memory/Store.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "FakeFolder.h"
+#include "Samples.h"
+#include "memory/Envelope.h"
+#include "memory/KnowledgeJson.h"
+
+namespace assay_host {
+namespace {
+
+using testing::ElementsAre;
+using testing::EndsWith;
+using testing::IsEmpty;
+
+Knowledge MakeNumbered(int number)
+{
+    Knowledge knowledge = MakeKnowledge();
+    knowledge.fIdentity.fSystem = std::to_string(number);
+    return knowledge;
+}
+
+class StoreTest : public testing::Test {
+protected:
+    std::vector<std::string> LoadAndGetMessages()
+    {
+        Store store(fFolder);
+        EXPECT_THAT(store.Load(MakeIdentity()).fAttempts, IsEmpty());
+        store.Load(MakeIdentity());
+        return store.GetMessages();
+    }
+
+    FakeFolder fFolder;
+};
+
+TEST_F(StoreTest, LoadsWhatWasSaved)
+{
+    Store store(fFolder);
+    EXPECT_THAT(store.Load(MakeIdentity()).fAttempts, IsEmpty());
+    EXPECT_TRUE(store.Save(MakeKnowledge(), kNow));
+    EXPECT_EQ(store.Load(MakeIdentity()).fAttempts.size(), 2u);
+    EXPECT_THAT(store.Load(MakeNumbered(1).fIdentity).fAttempts, IsEmpty());
+    EXPECT_EQ(store.Load(MakeNumbered(1).fIdentity).fIdentity, MakeNumbered(1).fIdentity);
+    EXPECT_THAT(store.GetMessages(), IsEmpty());
+}
+
+TEST_F(StoreTest, IgnoresADamagedFileAndReplacesIt)
+{
+    Store store(fFolder);
+    store.Save(MakeKnowledge(), kNow);
+    fFolder.GetState()[30] ^= 1;
+    EXPECT_THAT(LoadAndGetMessages(), ElementsAre(EndsWith(" is ignored: it is damaged.")));
+    EXPECT_TRUE(store.Save(MakeKnowledge(), kNow));
+    EXPECT_EQ(store.Load(MakeIdentity()).fAttempts.size(), 2u);
+    fFolder.GetState().append(kMaxStateBytes, ' ');
+    EXPECT_THAT(LoadAndGetMessages(), ElementsAre(EndsWith(" is ignored: it is too large.")));
+    fFolder.GetState() = Seal({{"no", "knowledge"}});
+    EXPECT_THAT(LoadAndGetMessages(), ElementsAre(EndsWith(" is ignored: it is damaged.")));
+}
+
+TEST_F(StoreTest, IgnoresTheFileOfAnotherIdentityWithTheSameName)
+{
+    Store store(fFolder);
+    store.Save(MakeKnowledge(), kNow);
+    fFolder.GetState() = Seal(MakeKnowledgeJson(MakeNumbered(1)));
+    EXPECT_THAT(LoadAndGetMessages(),
+                ElementsAre(EndsWith(" is ignored: it is of another identity.")));
+}
+
+TEST_F(StoreTest, LeavesTheFileOfANewerVersion)
+{
+    Store(fFolder).Save(MakeKnowledge(), kNow);
+    auto newer = nlohmann::ordered_json::parse(Seal({{"new", "content"}}));
+    newer["format"] = kStateFormat + 1;
+    newer["checksum"] =
+        MakeDigest(std::to_string(kStateFormat + 1) + "\n" + newer["content"].dump());
+    const std::string text = fFolder.GetState() = newer.dump();
+    EXPECT_THAT(LoadAndGetMessages(),
+                ElementsAre(EndsWith(" is ignored: it is of a newer version.")));
+    Store store(fFolder);
+    EXPECT_FALSE(store.Save(MakeKnowledge(), kNow));
+    EXPECT_FALSE(store.Save(MakeKnowledge(), kNow));
+    EXPECT_THAT(store.GetMessages(),
+                ElementsAre("The state can't be kept: the file of a newer version is kept."));
+    store.Drop(MakeIdentity());
+    EXPECT_EQ(fFolder.GetState(), text);
+}
+
+TEST_F(StoreTest, SaysOnceThatNothingIsKept)
+{
+    fFolder.fGoodWrites = 0;
+    Store store(fFolder);
+    EXPECT_FALSE(store.Save(MakeKnowledge(), kNow));
+    EXPECT_FALSE(store.Save(MakeKnowledge(), kNow));
+    EXPECT_THAT(store.GetMessages(),
+                ElementsAre("The state can't be kept: No space left on device."));
+}
+
+TEST_F(StoreTest, DropsTheFileOfOneIdentity)
+{
+    Store store(fFolder);
+    store.Save(MakeKnowledge(), kNow);
+    store.Save(MakeNumbered(1), kNow);
+    store.Drop(MakeIdentity());
+    EXPECT_THAT(store.Load(MakeIdentity()).fAttempts, IsEmpty());
+    EXPECT_EQ(store.Load(MakeNumbered(1).fIdentity).fAttempts.size(), 2u);
+}
+
+TEST_F(StoreTest, KeepsTheNewestFiles)
+{
+    fFolder.fFiles["of another program"] = "text";
+    fFolder.fFiles[".left.tmp"] = "text";
+    fFolder.fTimes[".left.tmp"] = kNow - 3601;
+    fFolder.fFiles[".new.tmp"] = "text";
+    fFolder.fTimes[".new.tmp"] = kNow - 3600;
+    Store store(fFolder);
+    constexpr int kSaved = static_cast<int>(kMaxIdentities) + 5;
+    for (int number = 0; number < kSaved; ++number)
+        store.Save(MakeNumbered(number), kNow);
+    store.Save(MakeNumbered(5), kNow);
+    EXPECT_EQ(store.List().size(), kMaxIdentities);
+    EXPECT_EQ(fFolder.fFiles.count("of another program"), 1u);
+    EXPECT_EQ(fFolder.fFiles.count(".left.tmp"), 0u);
+    EXPECT_EQ(fFolder.fFiles.count(".new.tmp"), 1u);
+    EXPECT_THAT(store.Load(MakeNumbered(4).fIdentity).fAttempts, IsEmpty());
+    EXPECT_EQ(store.Load(MakeNumbered(5).fIdentity).fAttempts.size(), 2u);
+}
+
+TEST_F(StoreTest, ListsTheNewestFirst)
+{
+    Store store(fFolder);
+    store.Save(MakeNumbered(1), kNow);
+    fFolder.GetState()[30] ^= 1;
+    store.Save(MakeNumbered(2), kNow);
+    fFolder.fFiles["lock"] = "";
+    const auto list = store.List();
+    ASSERT_EQ(list.size(), 2u);
+    EXPECT_EQ(list[0].fName, GetIdentityName(MakeNumbered(2).fIdentity));
+    ASSERT_TRUE(list[0].fKnowledge);
+    EXPECT_EQ(list[0].fKnowledge->fIdentity.fSystem, "2");
+    EXPECT_FALSE(list[1].fKnowledge);
+    EXPECT_EQ(list[1].fProblem, "it is damaged");
+}
+
+TEST_F(StoreTest, ForgetsOneOrAll)
+{
+    Store store(fFolder);
+    store.Save(MakeNumbered(1), kNow);
+    store.Save(MakeNumbered(2), kNow);
+    Choice choice;
+    choice.fOpenGL = {Usability::kSoftware, kNow};
+    EXPECT_EQ(store.SaveChoice(choice), "");
+    fFolder.fFiles["of another program"] = "text";
+    EXPECT_EQ(store.Forget(GetIdentityName(MakeNumbered(1).fIdentity)), "");
+    EXPECT_EQ(store.List().size(), 1u);
+    EXPECT_FALSE(store.LoadChoice().IsEmpty());
+    EXPECT_EQ(store.ForgetAll(), "");
+    EXPECT_EQ(fFolder.fFiles.size(), 1u);
+    EXPECT_TRUE(store.LoadChoice().IsEmpty());
+    store.Save(MakeNumbered(1), kNow);
+    fFolder.fCanRemove = false;
+    EXPECT_EQ(store.ForgetAll(), "Read-only file system");
+}
+
+TEST_F(StoreTest, KeepsTheChoiceUntilItIsTakenBack)
+{
+    Store store(fFolder);
+    EXPECT_TRUE(store.LoadChoice().IsEmpty());
+    Choice choice;
+    choice.fOpenGL = {Usability::kSoftware, kNow};
+    EXPECT_EQ(store.SaveChoice(choice), "");
+    EXPECT_EQ(store.LoadChoice().fOpenGL->fUsability, Usability::kSoftware);
+    fFolder.fFiles["choice.json"][5] ^= 1;
+    EXPECT_TRUE(store.LoadChoice().IsEmpty());
+    EXPECT_THAT(store.GetMessages(), ElementsAre("The user's choice is ignored: it is damaged."));
+    EXPECT_EQ(store.SaveChoice({}), "");
+    EXPECT_TRUE(fFolder.fFiles.empty());
+}
+
+} // namespace
+} // namespace assay_host
