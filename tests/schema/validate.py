@@ -36,6 +36,16 @@ DOCUMENTS = {number: _validator(f"assay-report-{number}.schema.json") for number
 EVENTS = {number: _validator(f"assay-events-{number}.schema.json") for number in (1, 2)}
 
 
+ADVICE = _validator("assay-advice-1.schema.json")
+
+
+def validate_advice(data):
+    """The advice in these bytes; raises for what is no JSON, or not of its schema."""
+    advice = _load(data.decode("utf-8"))
+    ADVICE.validate(advice)
+    return advice
+
+
 def document_validator(document):
     """The validator of the schema that the document names; raises KeyError for any other."""
     return DOCUMENTS[document["schema"]]
