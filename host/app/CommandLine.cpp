@@ -90,7 +90,7 @@ public:
     Parser()
     {
         fApp.name("assay-host");
-        fFormatter->AddUsage("assay-host", "run|torture|diff [option...]");
+        fFormatter->AddUsage("assay-host", "run|torture|diff|advise|state [option...]");
         fApp.formatter(fFormatter);
         fApp.set_help_flag("-h,--help", "show this text");
         fApp.set_version_flag("--version", "assay-host " ASSAY_VERSION, "show the version");
@@ -99,6 +99,8 @@ public:
         AddRun();
         AddTorture();
         AddDiff();
+        AddAdvise();
+        AddState();
     }
 
     Parsed Parse(const std::vector<std::string>& words)
@@ -193,8 +195,112 @@ private:
             ->check(CLI::Validator(CheckNumber, "FRACTION"));
     }
 
-    Choice Choose(const Words& words)
+    void AddStateFolder(CLI::App& command, std::string& folder)
     {
+        command.add_option("--state", folder, "folder of what is remembered")
+            ->required()
+            ->option_text("FOLDER")
+            ->check(MakeNotEmptyCheck("FOLDER"));
+    }
+
+    static void AddNumber(CLI::App& command, const char* name, double& number, const char* what,
+                          const char* unit)
+    {
+        command.add_option(name, number, what)
+            ->option_text(unit)
+            ->check(CLI::Validator(CheckNumber, unit));
+    }
+
+    void AddAdvise()
+    {
+        fAdviseCommand =
+            AddCommand("advise", "tell from memory, or by one attempt, what can be used",
+                       "advise --state FOLDER [option...]",
+                       "exit status: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown,\n"
+                       "  6 interrupted, 10 error in the command line or the output");
+        AddStateFolder(*fAdviseCommand, fAdvise.fState);
+        AddChildOptions(*fAdviseCommand, fAdvise.fChild);
+        fAdviseCommand->add_option("--format", fAdviceFormat, "text, env or json [text]")
+            ->option_text("FORMAT")
+            ->check(CLI::IsMember({"text", "env", "json"}));
+        fAdviseCommand->add_option("--need", fAdviceNeed, "opengl, opencl or both [opengl]")
+            ->option_text("WHAT")
+            ->check(CLI::IsMember({"opengl", "opencl", "both"}));
+        AddNumber(*fAdviseCommand, "--wait", fAdvise.fWaitSeconds,
+                  "wait for the attempt of another process [10]", "SECONDS");
+        AddNumber(*fAdviseCommand, "--max-age", fAdvise.fMaxAgeDays,
+                  "try again what is older than this [30]", "DAYS");
+        fAdviseCommand->add_flag("--fresh", fAdvise.fFresh, "try again at any age");
+        AddNumber(*fAdviseCommand, "--pause", fAdvise.fPauseSeconds,
+                  "before the next attempt after a failure [60]", "SECONDS");
+        fAdviseCommand
+            ->add_option("--retries", fAdvise.fRetries, "attempts after a first failure [2]")
+            ->option_text("NUMBER")
+            ->check(CLI::Range(0, 1000));
+        AddNumber(*fAdviseCommand, "--forgive", fAdvise.fForgiveDays,
+                  "failures older than this don't count [7]", "DAYS");
+        fAdviseCommand->add_flag("--dry-run", fAdvise.fDryRun,
+                                 "show what the next call would do, without doing it");
+    }
+
+    void AddState()
+    {
+        fStateCommand =
+            AddCommand("state", "show or change what advise remembers",
+                       "state list|show|forget|set --state FOLDER [WORD...]",
+                       "list: the entries, one for each state of the machine\n"
+                       "show [ENTRY...]: all that is known\n"
+                       "forget [ENTRY...]: without an entry, everything\n"
+                       "set opengl=VALUE opencl=VALUE: hardware, software, absent, auto\n"
+                       "exit status: 0 done, 10 error");
+        fStateCommand->add_option("ACTION", fAction, "list, show, forget or set")
+            ->required()
+            ->option_text(" ")
+            ->check(CLI::IsMember({"list", "show", "forget", "set"}));
+        fStateCommand->add_option("WORD", fState.fWords, "what to act on")->option_text(" ");
+        AddStateFolder(*fStateCommand, fState.fState);
+    }
+
+    AdviseChoice ChooseAdvise(const Words& words)
+    {
+        if (words.fHasChild)
+            throw CLI::ExtrasError({kChildWord});
+        fAdvise.fFormat = fAdviceFormat == "json"  ? AdviceFormat::kJson
+                          : fAdviceFormat == "env" ? AdviceFormat::kVariables
+                                                   : AdviceFormat::kText;
+        fAdvise.fNeed = ReadNeed(fAdviceNeed);
+        return fAdvise;
+    }
+
+    StateChoice ChooseState(const Words& words)
+    {
+        if (words.fHasChild)
+            throw CLI::ExtrasError({kChildWord});
+        fState.fAction = fAction == "show"     ? StateAction::kShow
+                         : fAction == "forget" ? StateAction::kForget
+                         : fAction == "set"    ? StateAction::kSet
+                                               : StateAction::kList;
+        if (fState.fAction == StateAction::kList && !fState.fWords.empty())
+            throw CLI::ExtrasError(fState.fWords);
+        if (fState.fAction == StateAction::kSet && fState.fWords.empty())
+            throw CLI::ValidationError("set", "opengl=VALUE or opencl=VALUE is missing");
+        return fState;
+    }
+
+    static Need ReadNeed(const std::string& need)
+    {
+        return need == "opengl"   ? Need::kOpenGL
+               : need == "opencl" ? Need::kOpenCL
+               : need == "both"   ? Need::kBoth
+                                  : Need::kNothing;
+    }
+
+    CommandChoice Choose(const Words& words)
+    {
+        if (fAdviseCommand->parsed())
+            return ChooseAdvise(words);
+        if (fStateCommand->parsed())
+            return ChooseState(words);
         if (fDiffCommand->parsed()) {
             if (words.fHasChild)
                 throw CLI::ExtrasError({kChildWord});
@@ -218,10 +324,7 @@ private:
             throw CLI::ValidationError("--raw", "only with --format text");
         if (fRunCommand->count("--schema") > 0 && fRun.fFormat == Format::kText)
             throw CLI::ValidationError("--schema", "only with --format json or jsonl");
-        fRun.fNeed = fNeed == "opengl"   ? Need::kOpenGL
-                     : fNeed == "opencl" ? Need::kOpenCL
-                     : fNeed == "both"   ? Need::kBoth
-                                         : Need::kNothing;
+        fRun.fNeed = ReadNeed(fNeed);
         fRun.fChild.fArgs = words.fChild;
         return fRun;
     }
@@ -231,12 +334,19 @@ private:
     CLI::App* fRunCommand = nullptr;
     CLI::App* fTortureCommand = nullptr;
     CLI::App* fDiffCommand = nullptr;
+    CLI::App* fAdviseCommand = nullptr;
+    CLI::App* fStateCommand = nullptr;
     RunChoice fRun;
     TortureChoice fTorture;
     DiffChoice fDiff;
+    AdviseChoice fAdvise;
+    StateChoice fState;
     std::string fFormat = "text";
     std::string fKind = "both";
     std::string fNeed;
+    std::string fAdviceFormat = "text";
+    std::string fAdviceNeed = "opengl";
+    std::string fAction;
 };
 
 } // namespace

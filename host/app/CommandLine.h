@@ -36,21 +36,45 @@ struct TortureChoice {
     std::vector<StepFailure> fFailures;
 };
 
+enum class AdviceFormat { kText, kVariables, kJson };
+
+struct AdviseChoice {
+    ChildChoice fChild;
+    std::string fState; // the folder
+    AdviceFormat fFormat = AdviceFormat::kText;
+    Need fNeed = Need::kOpenGL;
+    bool fDryRun = false;
+    bool fFresh = false;
+    double fWaitSeconds = 10;
+    double fMaxAgeDays = 30;
+    double fPauseSeconds = 60; // before the second attempt after a failure
+    unsigned fRetries = 2;
+    double fForgiveDays = 7;
+};
+
+enum class StateAction { kList, kShow, kForget, kSet };
+
+struct StateChoice {
+    StateAction fAction = StateAction::kList;
+    std::string fState;              // the folder
+    std::vector<std::string> fWords; // entries, or choices of kSet
+};
+
 struct DiffChoice {
     std::string fBefore;
     std::string fAfter;
     double fTolerance = 0.1; // as DiffOptions::fTolerance
 };
 
-using Choice = std::variant<RunChoice, TortureChoice, DiffChoice>;
+using CommandChoice = std::variant<RunChoice, TortureChoice, DiffChoice, AdviseChoice, StateChoice>;
 
 // Exit statuses other than those of the verdicts.
-constexpr int kErrorStatus = 10; // of run and torture
+constexpr int kErrorStatus = 10; // of all but diff
 constexpr int kDifferentStatus = 1;
 constexpr int kDiffErrorStatus = 2;
 
 struct Parsed {
-    std::optional<Choice> fChoice; // empty if the program must end at once
+    std::optional<CommandChoice> fChoice; // empty if the program must end at once
     // Only without a choice: the exit status, and what to print before. The text goes to standard
     // output if the status is 0, otherwise to standard error.
     int fStatus = 0;

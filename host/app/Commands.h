@@ -9,5 +9,7 @@ namespace assay_host {
 int Run(const RunChoice& choice);
 int Torture(const TortureChoice& choice);
 int Diff(const DiffChoice& choice);
+int Advise(const AdviseChoice& choice);
+int State(const StateChoice& choice);
 
 } // namespace assay_host

@@ -36,6 +36,16 @@ int Act(const DiffChoice& choice)
     return Diff(choice);
 }
 
+int Act(const AdviseChoice& choice)
+{
+    return Advise(choice);
+}
+
+int Act(const StateChoice& choice)
+{
+    return State(choice);
+}
+
 int RunMain(const std::vector<std::string>& words)
 {
     const Parsed parsed = ParseCommandLine(words);

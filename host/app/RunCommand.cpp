@@ -6,6 +6,7 @@
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
+#include "app/NeedStatus.h"
 #include "facts/Environment.h"
 #include "facts/FileVersion.h"
 #include "output/Delivery.h"
@@ -64,11 +65,8 @@ int GetStatus(Need need, const Report& report, const RunOutcome& outcome)
     if (need == Need::kNothing)
         return GetVerdictStatus(outcome.fVerdict);
     const Answers answers = GetAnswers(report);
-    const Usability gl = JudgeUsable(DeviceKind::kOpenGL, answers, outcome).fUsability;
-    const Usability cl = JudgeUsable(DeviceKind::kOpenCL, answers, outcome).fUsability;
-    return GetUsabilityStatus(need == Need::kOpenGL   ? gl
-                              : need == Need::kOpenCL ? cl
-                                                      : GetLesser(gl, cl));
+    return GetNeedStatus(need, JudgeUsable(DeviceKind::kOpenGL, answers, outcome).fUsability,
+                         JudgeUsable(DeviceKind::kOpenCL, answers, outcome).fUsability);
 }
 
 // Collects the report, and passes lines and events to the writer at once.

@@ -7,7 +7,7 @@ from hosting import host_run
 HELP = {
     None: """\
 Runs assay as a child process, survives its failures, and shows its report.
-usage: assay-host run|torture|diff [option...]
+usage: assay-host run|torture|diff|advise|state [option...]
 
 Options:
   -h,--help               show this text
@@ -17,6 +17,8 @@ Subcommands:
   run                     run assay and show its report
   torture                 make assay fail at every step and check each outcome
   diff                    show the differences between two reports
+  advise                  tell from memory, or by one attempt, what can be used
+  state                   show or change what advise remembers
 
 "assay-host COMMAND --help" describes a command.
 """,
@@ -66,6 +68,46 @@ Options:
   --tolerance FRACTION    of measurements, relative to the larger one [0.1]
 
 exit status: 0 same, 1 different, 2 error
+""",
+    "advise": """\
+tell from memory, or by one attempt, what can be used
+usage: assay-host advise --state FOLDER [option...]
+
+Options:
+  -h,--help               show this text
+  --state FOLDER          folder of what is remembered
+  --assay PATH            program to run [beside assay-host, or on the PATH]
+  --timeout SECONDS       kill the child after this time, 0: never [60]
+  --format FORMAT         text, env or json [text]
+  --need WHAT             opengl, opencl or both [opengl]
+  --wait SECONDS          wait for the attempt of another process [10]
+  --max-age DAYS          try again what is older than this [30]
+  --fresh                 try again at any age
+  --pause SECONDS         before the next attempt after a failure [60]
+  --retries NUMBER        attempts after a first failure [2]
+  --forgive DAYS          failures older than this don't count [7]
+  --dry-run               show what the next call would do, without doing it
+
+exit status: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown,
+  6 interrupted, 10 error in the command line or the output
+""",
+    "state": """\
+show or change what advise remembers
+usage: assay-host state list|show|forget|set --state FOLDER [WORD...]
+
+Positionals:
+  ACTION                  list, show, forget or set
+  WORD                    what to act on
+
+Options:
+  -h,--help               show this text
+  --state FOLDER          folder of what is remembered
+
+list: the entries, one for each state of the machine
+show [ENTRY...]: all that is known
+forget [ENTRY...]: without an entry, everything
+set opengl=VALUE opencl=VALUE: hardware, software, absent, auto
+exit status: 0 done, 10 error
 """,
 }
 
