@@ -16,7 +16,7 @@ _assay_host() {
             _assay_options
             return
             ;;
-        run | torture | diff) [ -n "$command" ] || command=${words[index]} ;;
+        run | torture | diff | advise | state) [ -n "$command" ] || command=${words[index]} ;;
         esac
     done
 
@@ -25,8 +25,14 @@ _assay_host() {
         _filedir
         return
         ;;
+    --state)
+        _filedir -d
+        return
+        ;;
     --format)
-        COMPREPLY=($(compgen -W "text json jsonl" -- "$cur"))
+        local forms="text json jsonl"
+        [ "$command" = advise ] && forms="text env json"
+        COMPREPLY=($(compgen -W "$forms" -- "$cur"))
         return
         ;;
     --schema)
@@ -41,7 +47,7 @@ _assay_host() {
         COMPREPLY=($(compgen -W "crash throw both" -- "$cur"))
         return
         ;;
-    --timeout | --tolerance) return ;;
+    --timeout | --tolerance | --wait | --max-age | --pause | --retries | --forgive) return ;;
     esac
 
     local options="--help"
@@ -49,10 +55,17 @@ _assay_host() {
     run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
     diff) options+=" --tolerance" ;;
-    *) options="run torture diff --help --version" ;;
+    advise)
+        options+=" --state --assay --timeout --format --need --wait --max-age --fresh --pause"
+        options+=" --retries --forgive --dry-run"
+        ;;
+    state) options+=" --state" ;;
+    *) options="run torture diff advise state --help --version" ;;
     esac
     if [ "$command" = diff ] && [[ $cur != -* ]]; then
         _filedir
+    elif [ "$command" = state ] && [[ $cur != -* ]]; then
+        COMPREPLY=($(compgen -W "list show forget set" -- "$cur"))
     else
         COMPREPLY=($(compgen -W "$options" -- "$cur"))
     fi

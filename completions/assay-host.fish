@@ -1,10 +1,14 @@
 # Completion of assay-host for fish.
 
-set -l commands run torture diff
+set -l commands run torture diff advise state
 set -l none "not __fish_seen_subcommand_from $commands"
 set -l run "__fish_seen_subcommand_from run"
 set -l torture "__fish_seen_subcommand_from torture"
-set -l child "__fish_seen_subcommand_from run torture"
+set -l advise "__fish_seen_subcommand_from advise"
+set -l state "__fish_seen_subcommand_from state"
+set -l child "__fish_seen_subcommand_from run torture advise"
+set -l remembers "__fish_seen_subcommand_from advise state"
+set -l needs "__fish_seen_subcommand_from run advise"
 set -l diff "__fish_seen_subcommand_from diff"
 
 complete -c assay-host -f
@@ -13,15 +17,27 @@ complete -c assay-host -n $none -l version -d "Show the version"
 complete -c assay-host -n $none -a run -d "Run assay and show its report"
 complete -c assay-host -n $none -a torture -d "Make assay fail at every step and check each outcome"
 complete -c assay-host -n $none -a diff -d "Show the differences between two reports"
+complete -c assay-host -n $none -a advise -d "Tell from memory, or by one attempt, what can be used"
+complete -c assay-host -n $none -a state -d "Show or change what advise remembers"
 
 complete -c assay-host -n $child -l assay -r -F -d "Program to run"
 complete -c assay-host -n $child -l timeout -x -d "Kill the child after these seconds, 0: never"
 complete -c assay-host -n $run -l format -x -a "text json jsonl" -d "Form of the output"
 complete -c assay-host -n $run -l schema -x -a "1 2" -d "Version of json and jsonl"
-complete -c assay-host -n $run -l need -x -a "opengl opencl both" -d "Exit by whether they work"
+complete -c assay-host -n $needs -l need -x -a "opengl opencl both" -d "Exit by whether they work"
 complete -c assay-host -n $run -l identify -d "Name this machine in json and jsonl"
 complete -c assay-host -n $run -l raw -d "Print the child's own lines first"
 complete -c assay-host -n $run -l output -r -F -d "Write to this file"
 complete -c assay-host -n $torture -l kind -x -a "crash throw both" -d "Kind of failure"
 complete -c assay-host -n $diff -F
 complete -c assay-host -n $diff -l tolerance -x -d "Of measurements, relative to the larger one"
+complete -c assay-host -n $remembers -l state -x -a "(__fish_complete_directories)" -d "Folder of what is remembered"
+complete -c assay-host -n $advise -l format -x -a "text env json" -d "Form of the output"
+complete -c assay-host -n $advise -l wait -x -d "Wait for the attempt of another process, in seconds"
+complete -c assay-host -n $advise -l max-age -x -d "Try again what is older than these days"
+complete -c assay-host -n $advise -l fresh -d "Try again at any age"
+complete -c assay-host -n $advise -l pause -x -d "Before the next attempt after a failure, in seconds"
+complete -c assay-host -n $advise -l retries -x -d "Attempts after a first failure"
+complete -c assay-host -n $advise -l forgive -x -d "Failures older than these days don't count"
+complete -c assay-host -n $advise -l dry-run -d "Show what the next call would do"
+complete -c assay-host -n $state -a "list show forget set"

@@ -10,7 +10,7 @@ import pytest
 from harness import PROGRAM, TREE
 from hosting import HOST
 
-COMMANDS = ["run", "torture", "diff"]
+COMMANDS = ["run", "torture", "diff", "advise", "state"]
 FOLDER = TREE / "completions"
 BASH_COMPLETION = Path("/usr/share/bash-completion/bash_completion")
 
@@ -36,7 +36,7 @@ def output_of(*command):
 
 
 def host_options(*command):
-    return set(re.findall(r"^  (?:-\w,)?(--\w+)", output_of(HOST, *command, "--help"), re.MULTILINE))
+    return set(re.findall(r"^  (?:-\w,)?(--[\w-]+)", output_of(HOST, *command, "--help"), re.MULTILINE))
 
 
 def child_options():
@@ -77,7 +77,7 @@ def test_zsh_knows_the_options_of_a_command(command):
     own = re.search(rf"^    {command}\)(.*?);;", text, re.DOTALL | re.MULTILINE).group(1)
     if "$child" in own:
         own += child
-    assert set(re.findall(r"(--\w+)", own)) == host_options(command)
+    assert set(re.findall(r"(--[\w-]+)", own)) == host_options(command)
 
 
 def test_commands():
@@ -94,6 +94,11 @@ def test_values_of_options():
         assert in_fish(f"assay-host run {option} ") == set(values.split())
     assert in_bash("assay-host", "torture", "--kind", "") == {"crash", "throw", "both"}
     assert in_fish("assay-host torture --kind ") == {"crash", "throw", "both"}
+    assert in_bash("assay-host", "advise", "--format", "") == {"text", "env", "json"}
+    assert in_fish("assay-host advise --format ") == {"text", "env", "json"}
+    actions = {"list", "show", "forget", "set"}
+    assert in_bash("assay-host", "state", "") == actions
+    assert in_fish("assay-host state ") == actions
 
 
 def test_options_of_the_child():
