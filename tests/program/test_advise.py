@@ -66,13 +66,14 @@ class Starts:
     """The starts of a host on a machine with a scripted OpenGL driver. Counts the children."""
 
     def __init__(self, host, folder):
-        self.host = host
         self.folder = folder
         self.state = folder / "state"
         self.runs = folder / "runs"
         self.child = script_child(
             folder, f'echo >> "{self.runs}"\nexec "{PROGRAM}" "$@"')
         self.set_driver("")
+        # Made once: each making changes the times of files that belong to the identity.
+        self.base = host.environment(folder / "driver")
         self.variables = {}
 
     def set_driver(self, rules):
@@ -81,7 +82,7 @@ class Starts:
 
     @property
     def environment(self):
-        return {**self.host.environment(self.folder / "driver"), **self.variables}
+        return {**self.base, **self.variables}
 
     @property
     def children(self):
