@@ -85,6 +85,8 @@ void AddChildOptions(CLI::App& command, ChildChoice& child)
         ->check(CLI::Validator(CheckNumber, "SECONDS"));
 }
 
+constexpr const char* kVersion = "assay-host " ASSAY_VERSION;
+
 class Parser {
 public:
     Parser()
@@ -93,7 +95,7 @@ public:
         fFormatter->AddUsage("assay-host", "run|torture|diff|advise|state [option...]");
         fApp.formatter(fFormatter);
         fApp.set_help_flag("-h,--help", "show this text");
-        fApp.set_version_flag("--version", "assay-host " ASSAY_VERSION, "show the version");
+        fApp.set_version_flag("--version", kVersion, "show the version");
         fApp.require_subcommand(1);
         fApp.footer("\"assay-host COMMAND --help\" describes a command.");
         AddRun();
@@ -132,6 +134,7 @@ private:
         CLI::App* const command = fApp.add_subcommand(name, what);
         fFormatter->AddUsage(name, usage);
         command->footer(footer);
+        command->set_version_flag("--version", kVersion)->group(""); // not in the help of each
         return command;
     }
 

@@ -299,8 +299,10 @@ def test_help_fits_a_screen(command):
         assert run.err == b""
 
 
-def test_version():
-    run = host_run("--version", program=HOST)
+@pytest.mark.parametrize("command", [[], ["run"], ["torture"], ["diff"]],
+                         ids=lambda command: " ".join(command) or "none")
+def test_version(command):
+    run = host_run(*command, "--version", program=HOST)
     assert (run.status, run.err) == (0, b"")
     assert re.fullmatch(r"assay-host \d+\.\d+\.\d+\n", run.text)
 

@@ -222,7 +222,8 @@ def test_killed_host():
 
 
 def test_version():
-    assert host_run("--version").out.startswith(b"assay-host ")
+    for command in ([], ["run"]):
+        assert host_run(*command, "--version").out.startswith(b"assay-host ")
     assert host_run("bogus").status == 10
 
 
