@@ -164,30 +164,60 @@ TEST(LibraryRun, LimitsDropAndCount)
     EXPECT_EQ(assay_host_result_lost_error_bytes(errors.fResult), 70000U - 65536U);
 }
 
+// Runs of 8 threads at once, each with a grandchild that must be ended too. Returns the number of
+// those that ended as they should.
+int RunByEightThreads(int runsOfEach)
+{
+    std::atomic<int> right{0};
+    std::vector<std::thread> threads;
+    for (int thread = 0; thread < 8; ++thread)
+        threads.emplace_back([&, thread] {
+            for (int run = 0; run < runsOfEach; ++run) {
+                const ChildRun made(kWhole +
+                                    Words{"spawn", "600000", "exit", std::to_string(thread)});
+                int status = -1;
+                assay_host_result_exit_status(made.fResult, &status);
+                if (status == thread && assay_host_result_left_behind(made.fResult) == 0 &&
+                    assay_host_result_document(made.fResult, nullptr) != nullptr)
+                    ++right;
+            }
+        });
+    for (std::thread& thread : threads)
+        thread.join();
+    return right;
+}
+
+// The growth of memory, in KiB, that is no growth: pages that the heaps of 8 threads happen to
+// have.
+constexpr long kMaxGrowth = 1024;
+
+void ExpectNoGrowth(int runsOfEach)
+{
+    EXPECT_EQ(RunByEightThreads(runsOfEach), 8 * runsOfEach);
+    const Counts before = CountThings();
+    const long memory = GetMemoryKiB();
+    EXPECT_EQ(RunByEightThreads(runsOfEach), 8 * runsOfEach);
+    EXPECT_EQ(CountAfter(before), before);
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__) // they keep freed memory
+    EXPECT_LE(GetMemoryKiB() - memory, kMaxGrowth) << "of memory in KiB";
+#else
+    static_cast<void>(memory);
+#endif
+}
+
 TEST(LibraryRun, EightAtOnceLeaveNothing)
 {
-    const auto runSome = [](int runs) {
-        std::atomic<int> right{0};
-        std::vector<std::thread> threads;
-        for (int thread = 0; thread < 8; ++thread)
-            threads.emplace_back([&, thread] {
-                for (int run = 0; run < runs; ++run) {
-                    const ChildRun made(kWhole +
-                                        Words{"spawn", "600000", "exit", std::to_string(thread)});
-                    int status = -1;
-                    assay_host_result_exit_status(made.fResult, &status);
-                    if (status == thread && assay_host_result_left_behind(made.fResult) == 0)
-                        ++right;
-                }
-            });
-        for (std::thread& thread : threads)
-            thread.join();
-        return right.load();
-    };
-    EXPECT_EQ(runSome(1), 8);
+    EXPECT_EQ(RunByEightThreads(1), 8);
     const Counts before = CountThings();
-    EXPECT_EQ(runSome(4), 32);
+    EXPECT_EQ(RunByEightThreads(4), 32);
     EXPECT_EQ(CountAfter(before), before);
+}
+
+TEST(LibraryRun, AThousandByEightThreadsLeaveNothing)
+{
+    if (std::getenv("ASSAY_LONG_TESTS") == nullptr)
+        GTEST_SKIP() << "2000 runs take long: ASSAY_LONG_TESTS=1";
+    ExpectNoGrowth(125);
 }
 
 // ASSAY_LONG_TESTS=1 sets the number of the requirement.
