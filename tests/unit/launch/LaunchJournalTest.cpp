@@ -585,6 +585,20 @@ TEST_F(LaunchJournal, OfATaskThatDoesNothing)
                                   "OutputTask::Run CloseReader"}));
 }
 
+TEST_F(LaunchJournal, OfAFaultWithoutAName)
+{
+    ConsoleAppAccessor client(TaskID::kClient,
+                              boost::make_shared<consoleapp::ExecutionData>(
+                                  boost::weak_ptr<ConsoleApp>(fApp), boost::weak_ptr<OutputTask>(),
+                                  boost::weak_ptr<OutputTask>()));
+    client.SetInjectedFault(Fault::kLauncherKill);
+    EXPECT_THROW(fApp->ThrowIfInjected(TaskID::kStderr, Fault::kLauncherKill, nullptr, nullptr),
+                 Exception);
+    EXPECT_THAT(fJournal.Take("Client"),
+                testing::ElementsAre("ConsoleApp::ThrowIfInjectedLocked throwing, caller=stderr "
+                                     "fault=LauncherKill msg=<NULL>"));
+}
+
 TEST_F(LaunchJournal, OfTheDestructor)
 {
     fApp.reset();
