@@ -26,10 +26,13 @@ struct RelationName {
     Relation fRelation;
 };
 // The longer ones first, since one begins like another.
-constexpr RelationName kRelations[] = {
-    {">=", Relation::kGreaterOrEqual}, {"<=", Relation::kLessOrEqual}, {"==", Relation::kEqual},
-    {"!=", Relation::kNotEqual},       {">", Relation::kGreater},      {"<", Relation::kLess},
-    {"=", Relation::kEqual}};
+constexpr RelationName kRelations[] = {{">=", Relation::kGreaterOrEqual},
+                                       {"<=", Relation::kLessOrEqual},
+                                       {"==", Relation::kEqual},
+                                       {"!=", Relation::kNotEqual},
+                                       {">", Relation::kGreater},
+                                       {"<", Relation::kLess},
+                                       {"=", Relation::kEqual}};
 
 struct FactName {
     const char* fText;
@@ -132,7 +135,10 @@ public:
 private:
     [[noreturn]] static void Fail(const std::string& reason) { throw std::runtime_error(reason); }
 
-    void SkipBlanks() { fRest.remove_prefix(std::min(fRest.find_first_not_of(kBlanks), fRest.size())); }
+    void SkipBlanks()
+    {
+        fRest.remove_prefix(std::min(fRest.find_first_not_of(kBlanks), fRest.size()));
+    }
 
     std::string_view TakeWord()
     {
@@ -182,7 +188,8 @@ private:
     void CheckHasNoScope(std::string_view word) const
     {
         if (fHasScope)
-            Fail(fmt::format("\"all\" and \"any\" don't go with {}, which isn't of a device", word));
+            Fail(
+                fmt::format("\"all\" and \"any\" don't go with {}, which isn't of a device", word));
     }
 
     [[noreturn]] static void FailUnknown(std::string_view word)
@@ -222,7 +229,8 @@ private:
             value += fRest[at];
         }
         if (at + 1 != fRest.size())
-            Fail(at < fRest.size() ? "text follows the closing quote" : "the closing quote is missing");
+            Fail(at < fRest.size() ? "text follows the closing quote"
+                                   : "the closing quote is missing");
         return value;
     }
 
@@ -233,8 +241,9 @@ private:
             return;
         }
         CheckHasNoOrder("whether an interface can be used");
-        for (const Usability usability : {Usability::kHardware, Usability::kSoftware,
-                                          Usability::kBroken, Usability::kAbsent, Usability::kUnknown}) {
+        for (const Usability usability :
+             {Usability::kHardware, Usability::kSoftware, Usability::kBroken, Usability::kAbsent,
+              Usability::kUnknown}) {
             if (value == GetUsabilityName(usability)) {
                 fResult.fWanted = usability;
                 return;

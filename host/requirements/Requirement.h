@@ -1,5 +1,5 @@
-// A requirement of a machine: "GLMemoryMB>=2048". docs/requirements.md has the grammar. Value types;
-// any thread may call.
+// A requirement of a machine: "GLMemoryMB>=2048". docs/requirements.md has the grammar. Value
+// types; any thread may call.
 #pragma once
 
 #include <optional>

@@ -18,7 +18,8 @@ constexpr std::size_t kMaxNamed = 8;
 
 std::string GetReason(const Answer& answer)
 {
-    return answer.fLine == nullptr ? GetMissingText(answer.fMissing) : GetUnknownText(answer.fUnknown);
+    return answer.fLine == nullptr ? GetMissingText(answer.fMissing)
+                                   : GetUnknownText(answer.fUnknown);
 }
 
 // Reads a number, or a list of one as the limits of a driver are.
@@ -83,8 +84,8 @@ std::string FindUnmetDevices(const Requirement& requirement, const KnownKey& key
     return text;
 }
 
-std::string FindUnmetFact(const Requirement& requirement, const FactOf& fact, const Answers& answers,
-                          const RunOutcome& outcome)
+std::string FindUnmetFact(const Requirement& requirement, const FactOf& fact,
+                          const Answers& answers, const RunOutcome& outcome)
 {
     if (fact.fFact == Fact::kUsable) {
         const Usable usable = JudgeUsable(fact.fKind, answers, outcome);
@@ -98,7 +99,9 @@ std::string FindUnmetFact(const Requirement& requirement, const FactOf& fact, co
     // Without the library there are no devices for certain.
     if (answer.fMissing != Missing::kNoOpenCL)
         return FindUnmetValue(requirement, answer);
-    return Holds(requirement.fRelation, 0.0, std::get<double>(requirement.fWanted)) ? "" : "0 (no OpenCL)";
+    return Holds(requirement.fRelation, 0.0, std::get<double>(requirement.fWanted))
+               ? ""
+               : "0 (no OpenCL)";
 }
 
 } // namespace

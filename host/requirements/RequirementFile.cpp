@@ -21,7 +21,8 @@ std::vector<Requirement> ReadRequirements(std::istream& text)
     for (const Json& requirement : file["require"]) {
         if (!requirement.is_string())
             throw std::runtime_error(
-                fmt::format("\"require\" has an element that is no string but of the type {}", requirement.type_name()));
+                fmt::format("\"require\" has an element that is no string but of the type {}",
+                            requirement.type_name()));
         requirements.push_back(ParseRequirement(requirement.get<std::string>()));
     }
     if (requirements.empty())

@@ -91,8 +91,9 @@ TEST(RequirementCheck, WhatIsNotKnownMeetsNothing)
     }
     EXPECT_EQ(FindUnmetIn(text, "GLFrameBufferOK!=1"), "glgpu[0] not known (run ended before)");
     EXPECT_EQ(FindUnmetIn(text, "opencl.devices==0"), "not known (run ended before)");
-    EXPECT_EQ(FindUnmetIn("Tester=\"x\"\nNumGLGPUs=1\nglgpu[0].GLVersion=\"none\"\n", "GLVersion!=1"),
-              "glgpu[0] none");
+    EXPECT_EQ(
+        FindUnmetIn("Tester=\"x\"\nNumGLGPUs=1\nglgpu[0].GLVersion=\"none\"\n", "GLVersion!=1"),
+        "glgpu[0] none");
 }
 
 TEST(RequirementCheck, WithoutALibraryThereAreNoDevices)
@@ -110,7 +111,8 @@ TEST(RequirementCheck, NamesTheFirstDevices)
 {
     std::string text = "Tester=\"x\"\nNumGLGPUs=10\n";
     for (int device = 0; device < 10; ++device)
-        text += "glgpu[" + std::to_string(device) + "].GLMemoryMB=" + std::to_string(device + 1) + "\n";
+        text +=
+            "glgpu[" + std::to_string(device) + "].GLMemoryMB=" + std::to_string(device + 1) + "\n";
     EXPECT_EQ(FindUnmetIn(text, "GLMemoryMB>10"),
               "glgpu[0] 1, glgpu[1] 2, glgpu[2] 3, glgpu[3] 4, glgpu[4] 5, glgpu[5] 6, glgpu[6] 7, "
               "glgpu[7] 8 and 2 more");

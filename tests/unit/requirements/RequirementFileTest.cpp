@@ -22,7 +22,8 @@ std::string FindFailure(const std::string& text)
 
 TEST(RequirementFile, HasAnArrayOfThem)
 {
-    std::istringstream text(R"({"comment": "of all", "require": ["GLVersion>=3.3", "NumGLGPUs>=1"]})");
+    std::istringstream text(
+        R"({"comment": "of all", "require": ["GLVersion>=3.3", "NumGLGPUs>=1"]})");
     const std::vector<Requirement> requirements = ReadRequirements(text);
     ASSERT_EQ(requirements.size(), 2U);
     EXPECT_EQ(requirements[0].fText, "GLVersion>=3.3");

@@ -36,9 +36,9 @@ TEST(Requirement, Relations)
     const struct {
         const char* fText;
         Relation fRelation;
-    } rows[] = {{"==", Relation::kEqual},       {"=", Relation::kEqual},
-                {"!=", Relation::kNotEqual},    {"<", Relation::kLess},
-                {"<=", Relation::kLessOrEqual}, {">", Relation::kGreater},
+    } rows[] = {{"==", Relation::kEqual},         {"=", Relation::kEqual},
+                {"!=", Relation::kNotEqual},      {"<", Relation::kLess},
+                {"<=", Relation::kLessOrEqual},   {">", Relation::kGreater},
                 {">=", Relation::kGreaterOrEqual}};
     for (const auto& row : rows)
         EXPECT_EQ(ParseRequirement(std::string("CLCompute") + row.fText + "1").fRelation,
@@ -79,7 +79,8 @@ TEST(Requirement, TheKeyDecidesTheTypeOfTheValue)
     for (const char* text : {"1", "true", "yes"})
         EXPECT_EQ(std::get<double>(wanted(("GLFrameBufferOK==" + std::string(text)).c_str())), 1);
     for (const char* text : {"0", "false", "no"})
-        EXPECT_EQ(std::get<double>(wanted(("QGFCoreInitialized==" + std::string(text)).c_str())), 0);
+        EXPECT_EQ(std::get<double>(wanted(("QGFCoreInitialized==" + std::string(text)).c_str())),
+                  0);
     EXPECT_EQ(std::get<Version>(wanted("GLVersion>=3.3")), (Version{3, 3}));
     EXPECT_EQ(std::get<Version>(wanted("glGetString[GL_SHADING_LANGUAGE_VERSION]>=4.50")),
               (Version{4, 50}));
@@ -121,7 +122,8 @@ TEST(Requirement, SaysWhatIsWrong)
         {"any opencl.usable==hardware",
          R"("any opencl.usable==hardware": "all" and "any" don't go with opencl.usable, which isn't of a device)"},
         {"GLName>=x", R"("GLName>=x": GLName has no order: only == and != apply)"},
-        {"GLFrameBufferOK>=1", R"("GLFrameBufferOK>=1": a flag has no order: only == and != apply)"},
+        {"GLFrameBufferOK>=1",
+         R"("GLFrameBufferOK>=1": a flag has no order: only == and != apply)"},
         {"GLFrameBufferOK==2", R"("GLFrameBufferOK==2": "2" is neither 0 nor 1)"},
         {"GLMemoryMB>=2 GB", R"("GLMemoryMB>=2 GB": "2 GB" is no number)"},
         {"GLVendorID==0x", R"("GLVendorID==0x": "0x" is no number)"},

@@ -1,0 +1,45 @@
+#include "app/options/CommandOptions.h"
+
+namespace assay_host {
+
+namespace {
+
+class DiffOptions : public CommandOptions {
+public:
+    Help GetHelp() const override
+    {
+        return {"diff", "show the differences between two reports", "diff [option...] A B",
+                "exit status: 0 same, 1 different, 2 error"};
+    }
+
+    void Add(CLI::App& command) override
+    {
+        AddText(command, "A", fChoice.fBefore, "a report: json, jsonl, or as assay prints it",
+                "FILE")
+            ->required()
+            ->option_text(" ");
+        AddText(command, "B", fChoice.fAfter, "the other report", "FILE")
+            ->required()
+            ->option_text(" ");
+        AddNumber(command, "--tolerance", fChoice.fTolerance,
+                  "of measurements, relative to the larger one [0.1]", "FRACTION");
+    }
+
+    CommandChoice Choose(const CLI::App& /*command*/,
+                         const std::vector<std::string>& /*childWords*/) override
+    {
+        return fChoice;
+    }
+
+private:
+    DiffChoice fChoice;
+};
+
+} // namespace
+
+std::unique_ptr<CommandOptions> MakeDiffOptions()
+{
+    return std::make_unique<DiffOptions>();
+}
+
+} // namespace assay_host

@@ -1,0 +1,65 @@
+#include "app/options/CommandOptions.h"
+
+namespace assay_host {
+
+namespace {
+
+class RunOptions : public CommandOptions {
+public:
+    Help GetHelp() const override
+    {
+        return {"run", "run assay and show its report", "run [option...] [-- child option...]",
+                "exit status: 0 complete, 1 failed tests, 2 usage error of the child,\n"
+                "  3 crashed, 4 hung and killed, 5 never started, 6 interrupted,\n"
+                "  10 error in the command line or the output;\n"
+                "  with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown"};
+    }
+
+    void Add(CLI::App& command) override
+    {
+        AddChildOptions(command, fChoice.fChild);
+        AddWord(command, "--format", fFormat, "text, json or jsonl [text]", "FORMAT",
+                {"text", "json", "jsonl"});
+        command.add_option("--schema", fChoice.fSchema, "of json and jsonl, 1 or 2 [2]")
+            ->option_text("NUMBER")
+            ->check(CLI::IsMember({"1", "2"}));
+        AddWord(command, "--need", fNeed, "opengl, opencl or both: exit by whether they work",
+                "WHAT", {"opengl", "opencl", "both"});
+        command.add_flag("--identify", fChoice.fIdentify, "name this machine in json and jsonl");
+        command.add_flag("--raw", fChoice.fRaw,
+                         "print the child's own lines first; only with text");
+        AddText(command, "--output", fChoice.fOutput, "write to this file [standard output]",
+                "FILE");
+    }
+
+    bool TakesChildWords() const override { return true; }
+
+    CommandChoice Choose(const CLI::App& command,
+                         const std::vector<std::string>& childWords) override
+    {
+        fChoice.fFormat = fFormat == "json"    ? Format::kJson
+                          : fFormat == "jsonl" ? Format::kJsonLines
+                                               : Format::kText;
+        if (fChoice.fRaw && fChoice.fFormat != Format::kText)
+            throw CLI::ValidationError("--raw", "only with --format text");
+        if (command.count("--schema") > 0 && fChoice.fFormat == Format::kText)
+            throw CLI::ValidationError("--schema", "only with --format json or jsonl");
+        fChoice.fNeed = ReadNeed(fNeed);
+        fChoice.fChild.fArgs = childWords;
+        return fChoice;
+    }
+
+private:
+    RunChoice fChoice;
+    std::string fFormat = "text";
+    std::string fNeed;
+};
+
+} // namespace
+
+std::unique_ptr<CommandOptions> MakeRunOptions()
+{
+    return std::make_unique<RunOptions>();
+}
+
+} // namespace assay_host
