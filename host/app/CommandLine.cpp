@@ -4,8 +4,10 @@
 #include <map>
 #include <memory>
 #include <sstream>
+#include <utility>
 
 #include <CLI/CLI.hpp>
+#include <boost/algorithm/string/replace.hpp>
 #include <fmt/format.h>
 
 #include "app/options/CommandOptions.h"
@@ -49,6 +51,14 @@ public:
     std::string make_usage(const CLI::App* app, std::string /*name*/) const override
     {
         return "usage: assay-host " + fUsages.at(app->get_name()) + "\n";
+    }
+
+    // The group of a hidden option leaves an empty line.
+    std::string make_help(const CLI::App* app, std::string name,
+                          CLI::AppFormatMode mode) const override
+    {
+        return boost::algorithm::replace_all_copy(
+            CLI::Formatter::make_help(app, std::move(name), mode), "\n\n\n", "\n\n");
     }
 
 private:
