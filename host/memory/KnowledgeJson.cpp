@@ -2,6 +2,7 @@
 
 #include <stdexcept>
 
+#include "memory/Machine.h"
 #include "report/JsonBytes.h"
 
 namespace assay_host {
@@ -40,6 +41,15 @@ T ReadInteger(const Json& json)
     if (!json.is_number_integer())
         throw std::runtime_error("not an integer");
     return json.get<T>();
+}
+
+// A time outside of these years would be one of a broken clock, and overflow in differences.
+std::int64_t ReadTime(const Json& json)
+{
+    const auto time = ReadInteger<std::int64_t>(json);
+    if (time < 0 || time > kLastTime)
+        throw std::runtime_error("not a time");
+    return time;
 }
 
 Json MakeAdapter(const AdapterIdentity& adapter)
@@ -151,8 +161,8 @@ Attempt ReadAttempt(const Json& json)
     if (!end)
         throw std::runtime_error("an unknown end");
     attempt.fEnd = *end;
-    attempt.fStarted = ReadInteger<std::int64_t>(json.at("started"));
-    attempt.fEnded = ReadInteger<std::int64_t>(json.at("ended"));
+    attempt.fStarted = ReadTime(json.at("started"));
+    attempt.fEnded = ReadTime(json.at("ended"));
     if (!json.at("exitStatus").is_null())
         attempt.fExitStatus = ReadInteger<int>(json.at("exitStatus"));
     attempt.fTermination = ReadText(json.at("termination"));

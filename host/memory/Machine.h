@@ -8,6 +8,9 @@
 
 namespace assay_host {
 
+// The end of the year 9999, in seconds since 1970.
+constexpr std::int64_t kLastTime = 253402300799;
+
 // Any thread may call. Never throws for a fact that the system doesn't provide.
 class Machine {
 public:
@@ -16,7 +19,8 @@ public:
     Machine(const Machine&) = delete;
     Machine& operator=(const Machine&) = delete;
 
-    // Returns the seconds since 1970 in UTC, as the system's clock is set.
+    // Returns the seconds since 1970 in UTC, as the system's clock is set; at least 0 and at most
+    // kLastTime.
     virtual std::int64_t GetTime() = 0;
 
     // Returns the mark of this process.

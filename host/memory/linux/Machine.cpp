@@ -1,5 +1,6 @@
 #include "memory/Machine.h"
 
+#include <algorithm>
 #include <chrono>
 #include <fstream>
 #include <sstream>
@@ -50,9 +51,10 @@ class SystemMachine : public Machine {
 public:
     std::int64_t GetTime() override
     {
-        return std::chrono::duration_cast<std::chrono::seconds>(
-                   std::chrono::system_clock::now().time_since_epoch())
-            .count();
+        const std::int64_t now = std::chrono::duration_cast<std::chrono::seconds>(
+                                     std::chrono::system_clock::now().time_since_epoch())
+                                     .count();
+        return std::clamp<std::int64_t>(now, 0, kLastTime);
     }
 
     HostMark GetSelf() override

@@ -2,6 +2,7 @@
 
 #include <windows.h>
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
 #include <string>
@@ -19,9 +20,10 @@ constexpr std::int64_t kBootTolerance = 120;
 
 std::int64_t ReadClock()
 {
-    return std::chrono::duration_cast<std::chrono::seconds>(
-               std::chrono::system_clock::now().time_since_epoch())
-        .count();
+    const std::int64_t now = std::chrono::duration_cast<std::chrono::seconds>(
+                                 std::chrono::system_clock::now().time_since_epoch())
+                                 .count();
+    return std::clamp<std::int64_t>(now, 0, kLastTime);
 }
 
 // Returns when the process was started; 0 if it doesn't exist any more.

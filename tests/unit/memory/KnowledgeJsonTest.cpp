@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <functional>
 #include <set>
 
@@ -50,6 +51,22 @@ TEST(KnowledgeJsonTest, EachMemberIsNeeded)
         changed[place] = {{"an", "object"}};
         if (place.back() != "interface")
             EXPECT_ANY_THROW(ReadKnowledgeJson(changed)) << member.key();
+    }
+}
+
+TEST(KnowledgeJsonTest, RefusesTimesThatNoClockHas)
+{
+    for (const char* const member : {"started", "ended"}) {
+        Json json = MakeKnowledgeJson(MakeKnowledge());
+        Json& time = json["attempts"][0][member];
+        for (const std::int64_t good : {std::int64_t(0), kLastTime}) {
+            time = good;
+            EXPECT_EQ(ReadKnowledgeJson(json).fAttempts.size(), 2u);
+        }
+        for (const std::int64_t bad : {std::int64_t(-1), kLastTime + 1, INT64_MIN, INT64_MAX}) {
+            time = bad;
+            EXPECT_ANY_THROW(ReadKnowledgeJson(json)) << bad;
+        }
     }
 }
 
