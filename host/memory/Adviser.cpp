@@ -6,7 +6,6 @@
 #include <fmt/format.h>
 
 #include "memory/Closing.h"
-#include "memory/KnowledgeJson.h"
 #include "report/Bytes.h"
 
 namespace assay_host {
@@ -107,7 +106,7 @@ Advice Adviser::Answer(const Knowledge& knowledge, Due due)
 {
     Advice advice;
     advice.fTime = fMachine.GetTime();
-    advice.fName = GetIdentityName(fIdentity);
+    advice.fName = fStore.GetName(fIdentity);
     advice.fPlan = due == Due::kNot ? Plan::kAnswer : Plan::kTry;
     advice.fDue = due;
     advice.fCount = knowledge.fCount;

@@ -21,7 +21,7 @@ constexpr std::size_t kDigestSize = 36;
 // A temporary file of this age isn't being written any more.
 constexpr std::int64_t kTemporarySeconds = 3600;
 
-std::string GetFileName(const std::string& identityName)
+std::string MakeFileName(const std::string& identityName)
 {
     return identityName + std::string(kEnding);
 }
@@ -65,9 +65,23 @@ std::optional<nlohmann::ordered_json> Store::Read(const std::string& name, std::
     return std::nullopt;
 }
 
+const std::string& Store::GetName(const Identity& identity)
+{
+    if (!fNamed || *fNamed != identity) {
+        fName = GetIdentityName(identity);
+        fNamed = identity;
+    }
+    return fName;
+}
+
+std::string Store::GetFileName(const Identity& identity)
+{
+    return MakeFileName(GetName(identity));
+}
+
 Knowledge Store::Load(const Identity& identity)
 {
-    const std::string name = GetFileName(GetIdentityName(identity));
+    const std::string name = GetFileName(identity);
     Knowledge nothing;
     nothing.fIdentity = identity;
     std::string problem;
@@ -88,7 +102,7 @@ Knowledge Store::Load(const Identity& identity)
 
 bool Store::Save(const Knowledge& knowledge, std::int64_t now)
 {
-    const std::string name = GetFileName(GetIdentityName(knowledge.fIdentity));
+    const std::string name = GetFileName(knowledge.fIdentity);
     const FileRead present = fFolder.Read(name, kMaxStateBytes);
     std::string reason;
     if (IsNewer(present)) {
@@ -108,7 +122,7 @@ bool Store::Save(const Knowledge& knowledge, std::int64_t now)
 
 void Store::Drop(const Identity& identity)
 {
-    const std::string name = GetFileName(GetIdentityName(identity));
+    const std::string name = GetFileName(identity);
     if (!IsNewer(fFolder.Read(name, kMaxStateBytes)))
         fFolder.Remove(name);
 }
@@ -162,7 +176,7 @@ std::vector<StoredKnowledge> Store::List()
 
 std::string Store::Forget(const std::string& name)
 {
-    return fFolder.Remove(GetFileName(name));
+    return fFolder.Remove(MakeFileName(name));
 }
 
 std::string Store::ForgetAll()

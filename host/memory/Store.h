@@ -29,6 +29,9 @@ class Store {
 public:
     explicit Store(Folder& folder) : fFolder(folder) {}
 
+    // Returns GetIdentityName(). Keeps the last one, which costs more than all else of an answer.
+    const std::string& GetName(const Identity& identity);
+
     // Returns what is known of the identity; nothing but the identity if there is no file.
     Knowledge Load(const Identity& identity);
 
@@ -62,8 +65,12 @@ private:
     std::optional<nlohmann::ordered_json> Read(const std::string& name, std::string& problem);
     void RemoveOldest(const std::string& kept, std::int64_t now);
 
+    std::string GetFileName(const Identity& identity);
+
     Folder& fFolder;
     std::vector<std::string> fMessages;
+    std::optional<Identity> fNamed; // the identity of fName
+    std::string fName;
 };
 
 } // namespace assay_host
