@@ -11,6 +11,7 @@ COUNTERPARTS = {
     "test_host_help": "test_windows_host",
     "test_host_hostile": "test_windows_host",
     "test_host_run": "test_windows_host",
+    "test_host_usage_errors": "test_windows_host",
     "test_host_torture": "test_windows_torture",
     "test_library": "test_windows_library",
     "test_opencl": "test_windows_opencl",
@@ -21,12 +22,14 @@ COUNTERPARTS = {
 }
 LEFT_OUT = {
     "the scripted OpenGL driver is an EGL library, and the peer uses EGL": {
-        "program/test_bad_drivers", "program/test_failing_gpu", "program/test_fault_sweep",
-        "program/test_last_line", "program/test_opengl_peers", "program/test_usable"},
+        "program/test_advise", "program/test_bad_drivers", "program/test_failing_gpu",
+        "program/test_fault_sweep", "program/test_last_line", "program/test_opengl_peers",
+        "program/test_usable"},
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
-        "unit/launch", "unit/library", "unit/pmutil", "unit/supervise"},
+        "unit/identity", "unit/launch", "unit/library", "unit/pmutil", "unit/supervise"},
+    "the folder of what is remembered is tested on Linux only": {"unit/memory"},
     "Linux's own files, shells and terminals": {
         "program/test_completions", "program/test_hardening", "unit/facts", "unit/output"},
     "there is no Python and no Node for Windows here": {"examples/decide.py", "examples/decide.js"},
