@@ -77,8 +77,9 @@ std::string FindUnmetDevices(const Requirement& requirement, const KnownKey& key
     if (count == 0)
         return fmt::format("there is no {} device", GetKindName(*key.fKind));
     const std::size_t named = std::min(unmet.size(), kMaxNamed);
-    std::string text = fmt::format(
-        "{}", fmt::join(unmet.begin(), unmet.begin() + static_cast<std::ptrdiff_t>(named), ", "));
+    std::string text;
+    for (std::size_t index = 0; index < named; ++index)
+        text += (index == 0 ? "" : ", ") + unmet[index];
     if (unmet.size() > named)
         text += fmt::format(" and {} more", unmet.size() - named);
     return text;
