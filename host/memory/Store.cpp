@@ -36,6 +36,18 @@ std::string ReadFileName(const std::string& name)
                                                                               : std::string();
 }
 
+// Returns the text of the file, without the oldest attempts if it would be too large.
+std::string MakeText(const Knowledge& knowledge)
+{
+    std::string text = Seal(MakeKnowledgeJson(knowledge));
+    for (Knowledge shorter = knowledge;
+         text.size() > kMaxStateBytes && shorter.fAttempts.size() > 1;) {
+        shorter.fAttempts.erase(shorter.fAttempts.begin());
+        text = Seal(MakeKnowledgeJson(shorter));
+    }
+    return text;
+}
+
 bool IsNewer(const FileRead& read)
 {
     return read.fState == FileState::kRead && Unseal(read.fText).fSoundness == Soundness::kNewer;
@@ -108,7 +120,7 @@ bool Store::Save(const Knowledge& knowledge, std::int64_t now)
     if (IsNewer(present)) {
         reason = "the file of a newer version is kept";
     } else {
-        const std::string text = Seal(MakeKnowledgeJson(knowledge));
+        const std::string text = MakeText(knowledge);
         reason = text.size() > kMaxStateBytes ? "it is too large" : fFolder.Write(name, text);
     }
     if (!reason.empty()) {

@@ -98,6 +98,22 @@ TEST_F(StoreTest, SaysOnceThatNothingIsKept)
                 ElementsAre("The state can't be kept: No space left on device."));
 }
 
+TEST_F(StoreTest, LeavesOutOldAttemptsThatHaveNoRoom)
+{
+    Knowledge knowledge = MakeKnowledge();
+    for (Attempt& attempt : knowledge.fAttempts)
+        attempt.fLastLine = std::string(kMaxStateBytes / 2, 'x');
+    Store store(fFolder);
+    EXPECT_TRUE(store.Save(knowledge, kNow));
+    const Knowledge read = store.Load(MakeIdentity());
+    ASSERT_EQ(read.fAttempts.size(), 1u);
+    EXPECT_EQ(read.fAttempts[0].fEnd, AttemptEnd::kEnded);
+    EXPECT_EQ(read.fCount, 2u);
+    knowledge.fAttempts[1].fLastLine += knowledge.fAttempts[1].fLastLine;
+    EXPECT_FALSE(store.Save(knowledge, kNow));
+    EXPECT_THAT(store.GetMessages(), ElementsAre("The state can't be kept: it is too large."));
+}
+
 TEST_F(StoreTest, DropsTheFileOfOneIdentity)
 {
     Store store(fFolder);
