@@ -142,13 +142,18 @@ Advice Adviser::Recall()
 
 Advice Adviser::Advise(const AttemptFunction& attempt, const PauseFunction& pause)
 {
+    State state;
+    Due due = Due::kNot;
     for (double waited = 0;; waited += kLookSeconds) {
         const LockTry lock = fFolder.TryLock();
         std::string problem;
         if (lock.fState == LockState::kFailed)
             problem = fmt::format("The state can't be locked: {}.", ShowBytes(lock.fReason));
-        State state = Load();
-        const Due due = FindDue(state.fKnowledge);
+        // What the holder of the lock finds out is on the disk once it is released.
+        if (waited == 0 || lock.fState != LockState::kBusy) {
+            state = Load();
+            due = FindDue(state.fKnowledge);
+        }
         if (lock.fState != LockState::kBusy && state.fOpen != OpenState::kAlive) {
             if (due != Due::kNot)
                 return Try(std::move(state.fKnowledge), due, problem, attempt);

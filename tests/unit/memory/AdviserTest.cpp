@@ -291,12 +291,14 @@ TEST_F(AdviserTest, AnswersUnknownIfAnotherProcessTakesTooLong)
     EXPECT_EQ(advice.fOpenGL.fOutlook.fFinding.fReason, "other-instance");
     double waited = 0;
     fRequest.fWaitSeconds = 3;
+    fFolder.fReads = 0;
     fPause = [&waited](double seconds) {
         waited += seconds;
         return true;
     };
     EXPECT_EQ(Show(Advise()), "wait: unknown unknown");
     EXPECT_NEAR(waited, 3, 0.1);
+    EXPECT_LT(fFolder.fReads, 5); // a lock that is held needs no look at the files
     fPause = [](double) { return false; };
     EXPECT_TRUE(Advise().fStopped);
     EXPECT_EQ(fAttempts, 0);
