@@ -16,12 +16,12 @@ _assay_host() {
             _assay_options
             return
             ;;
-        run | torture | diff | advise | state) [ -n "$command" ] || command=${words[index]} ;;
+        run | torture | diff | check | advise | state) [ -n "$command" ] || command=${words[index]} ;;
         esac
     done
 
     case $prev in
-    --assay | --output)
+    --assay | --output | --requirements | --from)
         _filedir
         return
         ;;
@@ -47,7 +47,7 @@ _assay_host() {
         COMPREPLY=($(compgen -W "crash throw both" -- "$cur"))
         return
         ;;
-    --timeout | --tolerance | --wait | --max-age | --pause | --retries | --forgive) return ;;
+    --timeout | --tolerance | --require | --wait | --max-age | --pause | --retries | --forgive) return ;;
     esac
 
     local options="--help"
@@ -55,12 +55,13 @@ _assay_host() {
     run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
     diff) options+=" --tolerance" ;;
+    check) options+=" --require --requirements --from --assay --timeout --" ;;
     advise)
         options+=" --state --assay --timeout --format --need --wait --max-age --fresh --pause"
         options+=" --retries --forgive --dry-run"
         ;;
     state) options+=" --state" ;;
-    *) options="run torture diff advise state --help --version" ;;
+    *) options="run torture diff check advise state --help --version" ;;
     esac
     if [ "$command" = diff ] && [[ $cur != -* ]]; then
         _filedir

@@ -1,12 +1,13 @@
 # Completion of assay-host for fish.
 
-set -l commands run torture diff advise state
+set -l commands run torture diff check advise state
 set -l none "not __fish_seen_subcommand_from $commands"
 set -l run "__fish_seen_subcommand_from run"
 set -l torture "__fish_seen_subcommand_from torture"
+set -l check "__fish_seen_subcommand_from check"
 set -l advise "__fish_seen_subcommand_from advise"
 set -l state "__fish_seen_subcommand_from state"
-set -l child "__fish_seen_subcommand_from run torture advise"
+set -l child "__fish_seen_subcommand_from run torture check advise"
 set -l remembers "__fish_seen_subcommand_from advise state"
 set -l needs "__fish_seen_subcommand_from run advise"
 set -l diff "__fish_seen_subcommand_from diff"
@@ -17,6 +18,7 @@ complete -c assay-host -n $none -l version -d "Show the version"
 complete -c assay-host -n $none -a run -d "Run assay and show its report"
 complete -c assay-host -n $none -a torture -d "Make assay fail at every step and check each outcome"
 complete -c assay-host -n $none -a diff -d "Show the differences between two reports"
+complete -c assay-host -n $none -a check -d "Hold this machine, or stored reports, to requirements"
 complete -c assay-host -n $none -a advise -d "Tell from memory, or by one attempt, what can be used"
 complete -c assay-host -n $none -a state -d "Show or change what advise remembers"
 
@@ -31,6 +33,9 @@ complete -c assay-host -n $run -l output -r -F -d "Write to this file"
 complete -c assay-host -n $torture -l kind -x -a "crash throw both" -d "Kind of failure"
 complete -c assay-host -n $diff -F
 complete -c assay-host -n $diff -l tolerance -x -d "Of measurements, relative to the larger one"
+complete -c assay-host -n $check -l require -x -d "A requirement"
+complete -c assay-host -n $check -l requirements -r -F -d "A file of requirements"
+complete -c assay-host -n $check -l from -r -F -d "Check a stored report instead of a run"
 complete -c assay-host -n $remembers -l state -x -a "(__fish_complete_directories)" -d "Folder of what is remembered"
 complete -c assay-host -n $advise -l format -x -a "text env json" -d "Form of the output"
 complete -c assay-host -n $advise -l wait -x -d "Wait for the attempt of another process, in seconds"

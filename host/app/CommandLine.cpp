@@ -79,7 +79,7 @@ public:
         fApp.footer("\"assay-host COMMAND --help\" describes a command.");
         std::string names;
         for (const auto& make : {MakeRunOptions, MakeTortureOptions, MakeDiffOptions,
-                                 MakeAdviseOptions, MakeStateOptions}) {
+                                 MakeCheckOptions, MakeAdviseOptions, MakeStateOptions}) {
             std::unique_ptr<CommandOptions> options = make();
             const CommandOptions::Help help = options->GetHelp();
             CLI::App* const command = fApp.add_subcommand(help.fName, help.fPurpose);

@@ -60,16 +60,25 @@ struct StateChoice {
     std::vector<std::string> fWords; // entries, or choices of kSet
 };
 
+struct CheckChoice {
+    ChildChoice fChild;
+    std::vector<std::string> fRequirements;
+    std::vector<std::string> fRequirementFiles;
+    std::vector<std::string> fReports; // files; empty: run the child
+};
+
 struct DiffChoice {
     std::string fBefore;
     std::string fAfter;
     double fTolerance = 0.1; // as DiffOptions::fTolerance
 };
 
-using CommandChoice = std::variant<RunChoice, TortureChoice, DiffChoice, AdviseChoice, StateChoice>;
+using CommandChoice =
+    std::variant<RunChoice, TortureChoice, DiffChoice, CheckChoice, AdviseChoice, StateChoice>;
 
 // Exit statuses other than those of the verdicts.
 constexpr int kErrorStatus = 10; // of all but diff
+constexpr int kUnmetStatus = 7;  // of check
 constexpr int kDifferentStatus = 1;
 constexpr int kDiffErrorStatus = 2;
 

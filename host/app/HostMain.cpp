@@ -36,6 +36,11 @@ int Act(const DiffChoice& choice)
     return Diff(choice);
 }
 
+int Act(const CheckChoice& choice)
+{
+    return Check(choice);
+}
+
 int Act(const AdviseChoice& choice)
 {
     return Advise(choice);

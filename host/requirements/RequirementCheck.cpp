@@ -55,6 +55,17 @@ const Answer& Get(const std::vector<Answer>& answers, const KnownKey& key)
                          [&key](const Answer& answer) { return answer.fKnown == &key; });
 }
 
+// Returns why there is no device for the requirement.
+std::string FindNoDevice(const Requirement& requirement, DeviceKind kind, const Answers& answers)
+{
+    const Answer& total = Get(answers.fReport, *FindKnownKey(std::nullopt, GetCountKey(kind)));
+    if (!total.IsKnown() && total.fMissing != Missing::kNoOpenCL)
+        return fmt::format("not known ({})", GetReason(total));
+    if (requirement.fDevice)
+        return fmt::format("there is no {}", MakeTag(kind, requirement.fDevice->fIndex));
+    return fmt::format("there is no {} device", GetKindName(kind));
+}
+
 std::string FindUnmetDevices(const Requirement& requirement, const KnownKey& key,
                              const Answers& answers)
 {
@@ -71,11 +82,8 @@ std::string FindUnmetDevices(const Requirement& requirement, const KnownKey& key
         else if (requirement.fScope == Scope::kAny)
             return {};
     }
-    if (count == 0 && requirement.fDevice)
-        return fmt::format("there is no {}",
-                           MakeTag(requirement.fDevice->fKind, requirement.fDevice->fIndex));
     if (count == 0)
-        return fmt::format("there is no {} device", GetKindName(*key.fKind));
+        return FindNoDevice(requirement, *key.fKind, answers);
     const std::size_t named = std::min(unmet.size(), kMaxNamed);
     std::string text;
     for (std::size_t index = 0; index < named; ++index)

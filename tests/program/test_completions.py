@@ -10,7 +10,7 @@ import pytest
 from harness import PROGRAM, TREE
 from hosting import HOST
 
-COMMANDS = ["run", "torture", "diff", "advise", "state"]
+COMMANDS = ["run", "torture", "diff", "check", "advise", "state"]
 FOLDER = TREE / "completions"
 BASH_COMPLETION = Path("/usr/share/bash-completion/bash_completion")
 

@@ -7,7 +7,7 @@ from hosting import host_run
 HELP = {
     None: """\
 Runs assay as a child process, survives its failures, and shows its report.
-usage: assay-host run|torture|diff|advise|state [option...]
+usage: assay-host run|torture|diff|check|advise|state [option...]
 
 Options:
   -h,--help               show this text
@@ -17,6 +17,7 @@ Subcommands:
   run                     run assay and show its report
   torture                 make assay fail at every step and check each outcome
   diff                    show the differences between two reports
+  check                   hold this machine, or stored reports, to requirements
   advise                  tell from memory, or by one attempt, what can be used
   state                   show or change what advise remembers
 
@@ -68,6 +69,23 @@ Options:
   --tolerance FRACTION    of measurements, relative to the larger one [0.1]
 
 exit status: 0 same, 1 different, 2 error
+""",
+    "check": """\
+hold this machine, or stored reports, to requirements
+usage: assay-host check [option...] [-- child option...]
+
+Options:
+  -h,--help               show this text
+  --require TEXT          a requirement; may be repeated
+  --requirements FILE     a file of them; may be repeated
+  --from FILE             check a stored report instead of a run; may be repeated
+  --assay PATH            program to run [beside assay-host, or on the PATH]
+  --timeout SECONDS       kill the child after this time, 0: never [60]
+
+A requirement is a key, a relation and a value: 'GLVersion>=3.3',
+  'all GLFrameBufferOK==1', 'opengl.devices>=2', 'opencl.usable==hardware'
+exit status: 0 met, 7 not met, 1 to 6 as run if the run isn't complete,
+  10 error in the command line, a file or the output
 """,
     "advise": """\
 tell from memory, or by one attempt, what can be used

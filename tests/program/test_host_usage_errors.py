@@ -34,6 +34,12 @@ ROWS = [
     ("diff a b c", 2, "", "c"),
     ("diff a b --", 2, "", "--"),
     ("diff --tolerance x a b", 2, "--tolerance: ", NO_NUMBER.format("x")),
+    ("check", 10, "--require or --requirements ", ""),
+    ("check --require=", 10, "--require: ", "TEXT missing"),
+    ("check --require NumGLGPUs>=1 --from x --timeout 3", 10, "--timeout: ", "only without --from"),
+    ("check --require NumGLGPUs>=1 --from x --assay y", 10, "--assay: ", "only without --from"),
+    ("check --require NumGLGPUs>=1 --from x -- -verbose=1", 10, "-verbose=1: ",
+     "only without --from"),
     ("diff --tolerance -1 a b", 2, "--tolerance: ", NO_NUMBER.format("-1")),
 ]
 

@@ -50,6 +50,17 @@ CLI::Option* AddText(CLI::App& command, const char* name, std::string& text, con
         ->check(CLI::Validator(CheckNotEmpty, placeholder));
 }
 
+void AddTexts(CLI::App& command, const char* name, std::vector<std::string>& texts,
+              const char* what, const char* placeholder)
+{
+    command.add_option(name, texts, what)
+        ->option_text(placeholder)
+        ->type_size(1)
+        ->expected(1)
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
+        ->check(CLI::Validator(CheckNotEmpty, placeholder));
+}
+
 void AddWord(CLI::App& command, const char* name, std::string& word, const char* what,
              const char* placeholder, const std::vector<std::string>& words)
 {

@@ -44,6 +44,7 @@ public:
 std::unique_ptr<CommandOptions> MakeRunOptions();
 std::unique_ptr<CommandOptions> MakeTortureOptions();
 std::unique_ptr<CommandOptions> MakeDiffOptions();
+std::unique_ptr<CommandOptions> MakeCheckOptions();
 std::unique_ptr<CommandOptions> MakeAdviseOptions();
 std::unique_ptr<CommandOptions> MakeStateOptions();
 
@@ -58,6 +59,10 @@ void AddNumber(CLI::App& command, const char* name, double& number, const char* 
 // Adds an option with a text that isn't empty. Returns it.
 CLI::Option* AddText(CLI::App& command, const char* name, std::string& text, const char* what,
                      const char* placeholder);
+
+// Adds an option that may be repeated, each time with a text that isn't empty.
+void AddTexts(CLI::App& command, const char* name, std::vector<std::string>& texts,
+              const char* what, const char* placeholder);
 
 // Adds an option with one of these words.
 void AddWord(CLI::App& command, const char* name, std::string& word, const char* what,

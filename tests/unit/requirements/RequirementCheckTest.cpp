@@ -107,6 +107,15 @@ TEST(RequirementCheck, WithoutALibraryThereAreNoDevices)
     EXPECT_EQ(FindUnmetIn(text, "opencl.usable!=hardware"), "");
 }
 
+TEST(RequirementCheck, DevicesAreNotKnownBeforeTheirNumber)
+{
+    EXPECT_EQ(FindUnmetIn("Tester=\"x\"\n", "GLVersion>=1"), "not known (run ended before)");
+    EXPECT_EQ(FindUnmetIn("Tester=\"x\"\n", "glgpu[0].GLVersion>=1"),
+              "not known (run ended before)");
+    EXPECT_EQ(FindUnmetIn("Tester=\"x\"\nNumGLGPUs=0\nassayEnd=\"y\"\n", "CLCompute>=1"),
+              "there is no OpenCL device");
+}
+
 TEST(RequirementCheck, NamesTheFirstDevices)
 {
     std::string text = "Tester=\"x\"\nNumGLGPUs=10\n";

@@ -1,0 +1,137 @@
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <fmt/format.h>
+
+#include "app/Commands.h"
+#include "app/FindAssay.h"
+#include "output/Delivery.h"
+#include "output/Output.h"
+#include "output/WriterThread.h"
+#include "report/Answers.h"
+#include "report/Bytes.h"
+#include "report/Report.h"
+#include "report/ReportFile.h"
+#include "report/RunOutcome.h"
+#include "requirements/RequirementCheck.h"
+#include "requirements/RequirementFile.h"
+#include "supervise/ChildRun.h"
+#include "supervise/Guardian.h"
+#include "supervise/Interrupt.h"
+
+namespace assay_host {
+
+namespace {
+
+std::vector<Requirement> GetRequirements(const CheckChoice& choice)
+{
+    std::vector<Requirement> requirements;
+    for (const std::string& text : choice.fRequirements)
+        requirements.push_back(ParseRequirement(text));
+    for (const std::string& file : choice.fRequirementFiles)
+        for (Requirement& requirement : LoadRequirements(file))
+            requirements.push_back(std::move(requirement));
+    return requirements;
+}
+
+class Collector : public RunObserver {
+public:
+    void OnLine(const ReportLine& line, double /*seconds*/) override
+    {
+        if (line.fKind == LineKind::kValue)
+            fReport.Add(line);
+    }
+
+    Report fReport;
+};
+
+// Writes a line for each requirement that isn't met, or one that all are.
+class Checker {
+public:
+    explicit Checker(const CheckChoice& choice) : fRequirements(GetRequirements(choice)) {}
+
+    // Returns whether all are met.
+    bool Check(const Report& report, const RunOutcome& outcome, const std::string& prefix)
+    {
+        const Answers answers = GetAnswers(report);
+        bool isMet = true;
+        for (const Requirement& requirement : fRequirements) {
+            const std::string unmet = FindUnmet(requirement, answers, outcome);
+            if (unmet.empty())
+                continue;
+            isMet = false;
+            fText +=
+                fmt::format("{}not met: {}: {}\n", prefix, ShowBytes(requirement.fText), unmet);
+        }
+        if (isMet)
+            fText += fmt::format("{}met: {}\n", prefix,
+                                 fRequirements.size() == 1
+                                     ? "the requirement"
+                                     : fmt::format("all {} requirements", fRequirements.size()));
+        return isMet;
+    }
+
+    void AddLine(const std::string& line) { fText += line + "\n"; }
+
+    const std::string& GetText() const { return fText; }
+
+private:
+    const std::vector<Requirement> fRequirements;
+    std::string fText;
+};
+
+// A stored report is taken for one of a child that ended by itself.
+RunOutcome MakeOutcome(const Report& report)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = report.IsWhole() ? Verdict::kComplete : Verdict::kFailedTests;
+    return outcome;
+}
+
+int CheckReports(const CheckChoice& choice)
+{
+    Checker checker(choice);
+    bool isMet = true;
+    for (const std::string& path : choice.fReports) {
+        const Report report = LoadReport(path);
+        const std::string prefix = choice.fReports.size() > 1 ? ShowBytes(path) + ": " : "";
+        isMet = checker.Check(report, MakeOutcome(report), prefix) && isMet;
+    }
+    OpenStandardOutput()->Write(checker.GetText());
+    return isMet ? 0 : kUnmetStatus;
+}
+
+int CheckRun(const CheckChoice& choice)
+{
+    Checker checker(choice);
+    GuardProcess();
+    const auto stop = std::make_shared<pmutil::StopRequest>();
+    WatchForInterrupt(stop);
+    ChildOptions options = MakeChildOptions(choice.fChild);
+    options.fKeepCauses = true;
+    Collector collector;
+    const RunOutcome outcome = RunChild(options, collector, *stop);
+    const auto writer =
+        std::make_shared<WriterThread>(OpenStandardOutput(), [stop] { stop->Raise(); });
+    const Delivery delivery(writer);
+    const bool isComplete = outcome.fVerdict == Verdict::kComplete;
+    if (!isComplete)
+        checker.AddLine(fmt::format("{}: {}", GetVerdictName(outcome.fVerdict), outcome.fReason));
+    const bool isMet = checker.Check(collector.fReport, outcome, "");
+    writer->Write(checker.GetText());
+    delivery.Finish();
+    if (!isComplete)
+        return GetVerdictStatus(outcome.fVerdict);
+    return isMet ? 0 : kUnmetStatus;
+}
+
+} // namespace
+
+int Check(const CheckChoice& choice)
+{
+    return choice.fReports.empty() ? CheckRun(choice) : CheckReports(choice);
+}
+
+} // namespace assay_host

@@ -1,0 +1,59 @@
+#include "app/options/CommandOptions.h"
+
+namespace assay_host {
+
+namespace {
+
+class CheckOptions : public CommandOptions {
+public:
+    Help GetHelp() const override
+    {
+        return {"check", "hold this machine, or stored reports, to requirements",
+                "check [option...] [-- child option...]",
+                "A requirement is a key, a relation and a value: 'GLVersion>=3.3',\n"
+                "  'all GLFrameBufferOK==1', 'opengl.devices>=2', 'opencl.usable==hardware'\n"
+                "exit status: 0 met, 7 not met, 1 to 6 as run if the run isn't complete,\n"
+                "  10 error in the command line, a file or the output"};
+    }
+
+    void Add(CLI::App& command) override
+    {
+        AddTexts(command, "--require", fChoice.fRequirements, "a requirement; may be repeated",
+                 "TEXT");
+        AddTexts(command, "--requirements", fChoice.fRequirementFiles,
+                 "a file of them; may be repeated", "FILE");
+        AddTexts(command, "--from", fChoice.fReports,
+                 "check a stored report instead of a run; may be repeated", "FILE");
+        AddChildOptions(command, fChoice.fChild);
+    }
+
+    bool TakesChildWords() const override { return true; }
+
+    CommandChoice Choose(const CLI::App& command,
+                         const std::vector<std::string>& childWords) override
+    {
+        if (fChoice.fRequirements.empty() && fChoice.fRequirementFiles.empty())
+            throw CLI::RequiredError("--require or --requirements");
+        if (!fChoice.fReports.empty()) {
+            for (const char* option : {"--assay", "--timeout"})
+                if (command.count(option) > 0)
+                    throw CLI::ValidationError(option, "only without --from");
+            if (!childWords.empty())
+                throw CLI::ValidationError(childWords.front(), "only without --from");
+        }
+        fChoice.fChild.fArgs = childWords;
+        return fChoice;
+    }
+
+private:
+    CheckChoice fChoice;
+};
+
+} // namespace
+
+std::unique_ptr<CommandOptions> MakeCheckOptions()
+{
+    return std::make_unique<CheckOptions>();
+}
+
+} // namespace assay_host

@@ -1,0 +1,104 @@
+"""assay-host check: holds a run or stored reports to requirements."""
+
+import json
+
+import pytest
+
+from hosting import host_run
+
+WHOLE = """Tester="x"
+assayStart="2026-01-01_00:00:00"
+QGFCoreInitialized=1
+QGFOGLInitialized=1
+OGLContextCreated=1
+NumGLGPUs=1
+glgpu[0].GLVersion="4.1"
+glgpu[0].GLMemoryMB={memory}
+NumCLGPUs=0
+assayEnd="2026-01-01_00:00:01"
+"""
+
+
+@pytest.fixture(name="stored")
+def fixture_stored(tmp_path):
+    def store(name, memory):
+        path = tmp_path / name
+        path.write_text(WHOLE.format(memory=memory), encoding="ascii")
+        return str(path)
+    return store
+
+
+def requirements(*texts):
+    return [word for text in texts for word in ("--require", text)]
+
+
+def test_run_that_meets_all():
+    hosted = host_run("check", *requirements("NumGLGPUs>=1", "GLVersion>=3.3", "all GLFrameBufferOK==1"))
+    assert (hosted.status, hosted.text, hosted.err) == (0, "met: all 3 requirements\n", b"")
+
+
+def test_run_that_misses_some():
+    hosted = host_run("check", *requirements("GLVersion>=9", "NumGLGPUs>=1", "opengl.devices>=8"))
+    assert (hosted.status, hosted.err) == (7, b"")
+    assert hosted.text == "not met: GLVersion>=9: glgpu[0] 4.1\nnot met: opengl.devices>=8: 1\n"
+
+
+def test_run_that_ends_early_has_its_own_status():
+    hosted = host_run("check", *requirements("NumGLGPUs>=1"), "--", "-crashAfter=1")
+    lines = hosted.text.splitlines()
+    assert hosted.status in (1, 3)
+    assert lines[0].split(": ")[0] == {1: "failed-tests", 3: "crashed"}[hosted.status]
+    assert lines[1:] == ["not met: NumGLGPUs>=1: not known (run ended before)"]
+
+
+def test_child_that_cannot_be_started():
+    hosted = host_run("check", "--assay", "/nowhere/assay", *requirements("NumGLGPUs>=1"))
+    assert hosted.status == 5
+    assert hosted.text.startswith("never-started: ")
+
+
+def test_stored_report(stored):
+    path = stored("a", 1024)
+    assert host_run("check", "--from", path, *requirements("GLMemoryMB>=1024")).text == "met: the requirement\n"
+    hosted = host_run("check", "--from", path, *requirements("GLMemoryMB>=2048"))
+    assert (hosted.status, hosted.text) == (7, "not met: GLMemoryMB>=2048: glgpu[0] 1024\n")
+
+
+def test_each_of_several_reports_is_named(stored):
+    good, bad = stored("good", 4096), stored("bad", 0)
+    hosted = host_run("check", "--from", good, "--from", bad, *requirements("GLMemoryMB>=2048"))
+    lines = hosted.text.splitlines()
+    assert hosted.status == 7
+    assert lines[0] == f"{good}: met: the requirement"
+    assert lines[1].startswith(f"{bad}: not met: GLMemoryMB>=2048: glgpu[0] not known (")
+
+
+@pytest.mark.parametrize("form", ["json", "jsonl"])
+def test_stored_document_is_checked_as_its_run(form, tmp_path):
+    path = tmp_path / form
+    path.write_bytes(host_run("run", "--format", form).out)
+    words = requirements("GLVersion>=9", "NumGLGPUs>=1", "opengl.devices>=8")
+    stored, ran = host_run("check", "--from", str(path), *words), host_run("check", *words)
+    assert (stored.status, stored.text) == (ran.status, ran.text)
+    assert ran.status == 7
+
+
+def test_file_of_requirements(tmp_path, stored):
+    rules = tmp_path / "rules.json"
+    rules.write_text(json.dumps({"require": ["GLMemoryMB>=2048", "GLVersion>=4"]}), encoding="ascii")
+    hosted = host_run("check", "--from", stored("a", 1024), "--requirements", str(rules),
+                      *requirements("NumCLGPUs>=1"))
+    assert hosted.text == ("not met: NumCLGPUs>=1: 0\n"
+                           "not met: GLMemoryMB>=2048: glgpu[0] 1024\n")
+
+
+@pytest.mark.parametrize("words, message", [
+    (["--require", "GLMemoryMb>=1"],
+     'assay-host: "GLMemoryMb>=1": there is no key "GLMemoryMb"; did you mean GLMemoryMB?\n'),
+    (["--requirements", "/nowhere/rules"], "assay-host: /nowhere/rules: cannot be opened\n"),
+    (["--from", "/nowhere/report", "--require", "NumGLGPUs>=1"],
+     "assay-host: /nowhere/report: can't open: No such file or directory\n"),
+])
+def test_errors(words, message):
+    hosted = host_run("check", *words)
+    assert (hosted.status, hosted.out, hosted.err.decode()) == (10, b"", message)
