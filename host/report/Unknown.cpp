@@ -59,13 +59,13 @@ const char* GetUnknownText(Unknown unknown)
     case Unknown::kCut:
         return "only the beginning of the line came";
     case Unknown::kEmpty:
-        return "the driver gave an empty text";
+        return "the driver returned an empty text";
     case Unknown::kNoAdapter:
         return "no adapter of the system matches the device";
     case Unknown::kNotListed:
         return "the system's adapter lists do not have it";
     case Unknown::kNoFigure:
-        return "no source gave a figure";
+        return "no source has the value";
     case Unknown::kNoTime:
         return "the device's clock reported no elapsed time";
     case Unknown::kImplausible:

@@ -147,7 +147,7 @@ TEST(JsonSecondDocument, SaysWhatIsNotKnown)
         return Json{{"known", false}, {"value", value}, {"reason", reason}};
     };
     const char* const noAdapter = "no adapter of the system matches the device";
-    EXPECT_EQ(keys["GLMemoryMB"], unknown("0", "no source gave a figure"));
+    EXPECT_EQ(keys["GLMemoryMB"], unknown("0", "no source has the value"));
     EXPECT_EQ(keys["GLVendorID"], unknown("0", noAdapter));
     EXPECT_EQ(keys["GLName"], unknown("", noAdapter));
     EXPECT_EQ(keys["IsIntegratedGLGPU"], unknown("0", noAdapter));
