@@ -192,8 +192,10 @@ TEST(KeptLauncher, TheKeeperHasItsOwnNameAndGroupAndNoDescriptorOfTheHost)
     EXPECT_EQ(status.fParent, ::getpid());
     EXPECT_EQ(ReadStatus(child).fGroup, child);
     const std::string folder = "/proc/" + std::to_string(keeper) + "/fd";
-    // The link, the pipe of the end, and the process descriptors of the host and the child.
-    EXPECT_EQ(std::distance(boost::filesystem::directory_iterator(folder), {}), 4);
+    // The link, the pipe of the end, and the process descriptors of the host and the child. The
+    // others are closed after the child has started.
+    EXPECT_TRUE(Eventually(
+        [&] { return std::distance(boost::filesystem::directory_iterator(folder), {}) == 4; }));
 }
 
 TEST(KeptLauncher, TheChildEndsWithAKilledKeeper)
