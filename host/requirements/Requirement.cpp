@@ -39,10 +39,10 @@ struct FactName {
     FactOf fFact;
 };
 constexpr FactName kFacts[] = {
-    {"opengl.devices", {Fact::kDevices, DeviceKind::kOpenGL}},
-    {"opencl.devices", {Fact::kDevices, DeviceKind::kOpenCL}},
-    {"opengl.usable", {Fact::kUsable, DeviceKind::kOpenGL}},
-    {"opencl.usable", {Fact::kUsable, DeviceKind::kOpenCL}},
+    {"opengl.devices", {InterfaceFact::kDevices, DeviceKind::kOpenGL}},
+    {"opencl.devices", {InterfaceFact::kDevices, DeviceKind::kOpenCL}},
+    {"opengl.usable", {InterfaceFact::kUsable, DeviceKind::kOpenGL}},
+    {"opencl.usable", {InterfaceFact::kUsable, DeviceKind::kOpenCL}},
 };
 
 // The number of insertions, deletions and exchanges of bytes between two texts. Letters of either
@@ -236,7 +236,7 @@ private:
 
     void SetWanted(const FactOf& fact, const std::string& value)
     {
-        if (fact.fFact == Fact::kDevices) {
+        if (fact.fFact == InterfaceFact::kDevices) {
             SetNumber(value);
             return;
         }

@@ -19,13 +19,13 @@ enum class Relation { kEqual, kNotEqual, kLess, kLessOrEqual, kGreater, kGreater
 enum class Scope { kAny, kAll, kOne };
 
 // What is compared, besides keys.
-enum class Fact {
+enum class InterfaceFact {
     kDevices, // how many devices the interface has
     kUsable   // whether the interface can be used
 };
 
 struct FactOf {
-    Fact fFact;
+    InterfaceFact fFact;
     DeviceKind fKind;
 };
 

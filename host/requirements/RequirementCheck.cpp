@@ -96,7 +96,7 @@ std::string FindUnmetDevices(const Requirement& requirement, const KnownKey& key
 std::string FindUnmetFact(const Requirement& requirement, const FactOf& fact,
                           const Answers& answers, const RunOutcome& outcome)
 {
-    if (fact.fFact == Fact::kUsable) {
+    if (fact.fFact == InterfaceFact::kUsable) {
         const Usable usable = JudgeUsable(fact.fKind, answers, outcome);
         const auto wanted = std::get<Usability>(requirement.fWanted);
         if ((usable.fUsability == wanted) == (requirement.fRelation == Relation::kEqual))
