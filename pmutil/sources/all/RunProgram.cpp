@@ -127,12 +127,15 @@ public:
           fErrors(boost::make_shared<Capture>(options.fTakeErrors, options.fMaxKeptBytes))
     {}
 
-    // Kills the program if an exception ended the run.
+    // Kills the program if an exception ended the run. The application is reset here, since its
+    // last reference may otherwise be that of an output's thread: this thread and the launcher's
+    // would wait for each other, up to the short wait.
     ~ProgramRun()
     {
         if (!fChild->GetEnd())
             TryKill(*fChild);
         CloseOutputs();
+        fApp->Reset();
     }
     ProgramRun(const ProgramRun&) = delete;
     ProgramRun& operator=(const ProgramRun&) = delete;
