@@ -8,12 +8,12 @@
 #include "app/Commands.h"
 #include "app/FindAssay.h"
 #include "app/NeedStatus.h"
+#include "app/ValueCollector.h"
 #include "identity/Identity.h"
 #include "memory/AdviceForms.h"
 #include "memory/Adviser.h"
 #include "memory/Closing.h"
 #include "output/Output.h"
-#include "report/Report.h"
 #include "report/RunOutcome.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Guardian.h"
@@ -44,17 +44,6 @@ AdviceRequest MakeRequest(const AdviseChoice& choice)
     return request;
 }
 
-class Collector : public RunObserver {
-public:
-    void OnLine(const ReportLine& line, double /*seconds*/) override
-    {
-        if (line.fKind == LineKind::kValue)
-            fReport.Add(line);
-    }
-
-    Report fReport;
-};
-
 // Waits and tries with the guardian and the interrupts of a run.
 Advice TryWatched(Adviser& adviser, Machine& machine, const AdviseChoice& choice)
 {
@@ -64,7 +53,7 @@ Advice TryWatched(Adviser& adviser, Machine& machine, const AdviseChoice& choice
     const auto run = [&](Attempt& attempt) {
         ChildOptions options = MakeChildOptions(choice.fChild);
         options.fKeepCauses = true;
-        Collector collector;
+        ValueCollector collector;
         const RunOutcome outcome = RunChild(options, collector, *stop);
         CloseAttempt(attempt, collector.fReport, outcome, machine.GetTime());
     };

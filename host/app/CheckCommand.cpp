@@ -7,6 +7,7 @@
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
+#include "app/ValueCollector.h"
 #include "output/Delivery.h"
 #include "output/Output.h"
 #include "output/WriterThread.h"
@@ -35,17 +36,6 @@ std::vector<Requirement> GetRequirements(const CheckChoice& choice)
             requirements.push_back(std::move(requirement));
     return requirements;
 }
-
-class Collector : public RunObserver {
-public:
-    void OnLine(const ReportLine& line, double /*seconds*/) override
-    {
-        if (line.fKind == LineKind::kValue)
-            fReport.Add(line);
-    }
-
-    Report fReport;
-};
 
 // Writes a line for each requirement that isn't met, or one that all are.
 class Checker {
@@ -111,7 +101,7 @@ int CheckRun(const CheckChoice& choice)
     WatchForInterrupt(stop);
     ChildOptions options = MakeChildOptions(choice.fChild);
     options.fKeepCauses = true;
-    Collector collector;
+    ValueCollector collector;
     const RunOutcome outcome = RunChild(options, collector, *stop);
     const auto writer =
         std::make_shared<WriterThread>(OpenStandardOutput(), [stop] { stop->Raise(); });
