@@ -6,6 +6,7 @@ from conftest import TREE
 
 # The program tests of Linux with their counterparts here, and those without one by reason.
 COUNTERPARTS = {
+    "test_check": "test_windows_host",
     "test_command_line": "test_windows_command_line",
     "test_host_end": "test_windows_host",
     "test_host_help": "test_windows_host",

@@ -247,3 +247,18 @@ def test_opencl_drivers(tmp_path, rule, verdict, key):
     assert document["outcome"]["verdict"] == verdict
     if key is not None:
         assert document["report"]["next"] == f"clgpu[0].{key}"
+
+
+def test_check_of_a_stored_report(tmp_path):
+    report = tmp_path / "report"
+    report.write_bytes(b'Tester="x"\r\nNumGLGPUs=1\r\nglgpu[0].GLMemoryMB=1024\r\nassayEnd="y"\r\n')
+    run = host_run("check", "--from", str(report), "--require", "GLMemoryMB>=1024")
+    assert (run.status, text_of(run.out)) == (0, "met: the requirement\n")
+    run = host_run("check", "--from", str(report), "--require", "GLMemoryMB>=2048")
+    assert (run.status, text_of(run.out)) == (7, "not met: GLMemoryMB>=2048: glgpu[0] 1024\n")
+
+
+def test_check_of_a_run():
+    run = host_run("check", "--assay", str(CHILD), "--require", "opengl.devices>=1", "--", *REPORT)
+    assert run.status == 7
+    assert text_of(run.out) == "not met: opengl.devices>=1: not known (no readable line)\n"
