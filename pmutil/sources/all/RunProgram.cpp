@@ -135,7 +135,11 @@ public:
         if (!fChild->GetEnd())
             TryKill(*fChild);
         CloseOutputs();
-        fApp->Reset();
+        try {
+            fApp->Reset();
+        } catch (...) {
+            // As in the application's destructor.
+        }
     }
     ProgramRun(const ProgramRun&) = delete;
     ProgramRun& operator=(const ProgramRun&) = delete;
