@@ -4,8 +4,8 @@
 #include "CollectingTask.h"
 #include "ConsoleAppFixture.h"
 #include "FailingStart.h"
-#include "OpenThings.h"
 #include "RecordingLogger.h"
+#include "support/OpenThings.h"
 
 using namespace pmutil;
 using consoleapp::Exception;

@@ -7,7 +7,7 @@
 #include <thread>
 
 #include "CollectingTask.h"
-#include "OpenThings.h"
+#include "support/OpenThings.h"
 
 using namespace pmutil;
 

@@ -6,8 +6,8 @@
 #include <boost/thread/thread.hpp>
 #include <gtest/gtest.h>
 
-#include "OpenThings.h"
 #include "pmutil/PMLogging.h"
+#include "support/OpenThings.h"
 #include "support/Waits.h"
 
 namespace pmutil {

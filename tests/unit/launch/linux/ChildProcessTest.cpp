@@ -7,10 +7,10 @@
 #include <sys/resource.h>
 #include <unistd.h>
 
-#include "OpenThings.h"
 #include "Throws.h"
 #include "linux/CallFailure.h"
 #include "pmutil/PosixHandle.h"
+#include "support/OpenThings.h"
 
 using namespace pmutil;
 

@@ -17,11 +17,11 @@
 #include <thread>
 #include <unistd.h>
 
-#include "OpenThings.h"
 #include "TestChild.h"
 #include "Throws.h"
 #include "pmutil/LauncherPosix.h"
 #include "pmutil/PosixHandle.h"
+#include "support/OpenThings.h"
 #include "support/Waits.h"
 
 using namespace pmutil;

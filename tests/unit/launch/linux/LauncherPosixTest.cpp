@@ -18,11 +18,11 @@
 #include <thread>
 #include <unistd.h>
 
-#include "OpenThings.h"
 #include "RecordingLogger.h"
 #include "TestChild.h"
 #include "Throws.h"
 #include "pmutil/PosixHandle.h"
+#include "support/OpenThings.h"
 #include "support/Waits.h"
 
 using namespace pmutil;

@@ -8,12 +8,12 @@
 
 #include <boost/filesystem/operations.hpp>
 
-#include "OpenThings.h"
 #include "RecordingLogger.h"
 #include "TempFolder.h"
 #include "TestChild.h"
 #include "Throws.h"
 #include "pmutil/WinHandle.h"
+#include "support/OpenThings.h"
 #include "support/Waits.h"
 #include "win/ReplacedImport.h"
 

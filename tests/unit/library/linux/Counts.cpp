@@ -5,18 +5,9 @@
 #include <string>
 
 #include "Runs.h"
+#include "support/OpenThings.h"
 
 namespace {
-
-long CountEntries(const char* folder)
-{
-    long count = 0;
-    DIR* const directory = ::opendir(folder);
-    while (::readdir(directory) != nullptr)
-        ++count;
-    ::closedir(directory);
-    return count;
-}
 
 // All processes whose parent this process is, whatever signal their end has.
 long CountChildren()
@@ -43,7 +34,7 @@ long CountChildren()
 
 Counts CountThings()
 {
-    return {CountEntries("/proc/self/task"), CountEntries("/proc/self/fd"), CountChildren()};
+    return {CountThreads(), CountOpenThings(), CountChildren()};
 }
 
 long GetMemoryKiB()

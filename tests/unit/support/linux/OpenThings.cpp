@@ -1,4 +1,4 @@
-#include "OpenThings.h"
+#include "support/OpenThings.h"
 
 #include <dirent.h>
 #include <sys/wait.h>
