@@ -49,9 +49,11 @@ protected:
     }
 
 private:
-    static bool IsCharacter(wchar_t code)
+    // wchar_t has a sign on some processors only.
+    static bool IsCharacter(wchar_t character)
     {
-        return (code >= 0 && code < 0xD800) || (code >= 0xE000 && code <= 0x10FFFF);
+        const auto code = static_cast<std::uint32_t>(character);
+        return code < 0xD800 || (code >= 0xE000 && code <= 0x10FFFF);
     }
 };
 
