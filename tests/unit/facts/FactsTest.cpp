@@ -20,6 +20,19 @@ TEST(TimeText, IsUtc)
     EXPECT_EQ(MakeUtcText(INT64_MAX), "9999-12-31T23:59:59Z");
 }
 
+TEST(TimeText, IsReadAgain)
+{
+    for (const std::int64_t time : {std::int64_t{0}, std::int64_t{951782399},
+                                    std::int64_t{951782400}, std::int64_t{4294967296}})
+        EXPECT_EQ(ReadUtcText(MakeUtcText(time)), time);
+    for (const char* text :
+         {"", "2026-11-22", "2026-11-22 01:26:02Z", "2026-11-22T01:26:02", "2026-11-22T01:26:02Z ",
+          "2026-13-22T01:26:02Z", "2026-02-30T01:26:02Z", "2026-11-22T24:00:00Z",
+          "2026-11-22T01:60:02Z", "2026-11-22T01:26:60Z", "1969-12-31T23:59:59Z",
+          "+026-11-22T01:26:02Z", "2026-11-22T01:26:-2Z", "0000-01-01T00:00:00Z"})
+        EXPECT_FALSE(ReadUtcText(text)) << text;
+}
+
 TEST(TimeText, HasOffsets)
 {
     EXPECT_EQ(MakeOffsetText(0), "+00:00");
