@@ -20,4 +20,12 @@ boost::filesystem::path FollowLinks(boost::filesystem::path path)
     return path;
 }
 
+boost::filesystem::path MakeTemporaryPath(const boost::filesystem::path& path)
+{
+    boost::filesystem::path name = ".";
+    name += path.filename();
+    name += boost::filesystem::unique_path(".%%%%%%%%.tmp");
+    return path.parent_path() / name;
+}
+
 } // namespace assay_host

@@ -36,8 +36,9 @@ protected:
 std::unique_ptr<Output> OpenStandardOutput();
 
 // Returns an output that replaces or creates a file. It writes to a temporary file in the same
-// folder, which Finish renames, and which is deleted otherwise. An existing device or pipe is
-// written to directly. The path is UTF-8. Throws if the temporary file can't be created.
+// folder, whose name begins with a dot. Finish renames it; otherwise it is deleted. An existing
+// device or pipe is written to directly. The path is UTF-8. Throws if the temporary file can't be
+// created.
 std::unique_ptr<Output> OpenFile(const std::string& path);
 
 } // namespace assay_host

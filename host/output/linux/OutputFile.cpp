@@ -28,7 +28,7 @@ public:
             Fail(errno);
         if (exists && !S_ISREG(found.st_mode))
             return;
-        fTemporary = fPath + boost::filesystem::unique_path(".%%%%%%%%.tmp").native();
+        fTemporary = MakeTemporaryPath(fPath).native();
         OpenPath(fTemporary, O_WRONLY | O_CREAT | O_EXCL);
         fHasTemporary = true;
         if (exists)

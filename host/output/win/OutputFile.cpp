@@ -23,8 +23,7 @@ public:
         const boost::filesystem::file_type type = boost::filesystem::status(fPath, error).type();
         if (type != boost::filesystem::file_not_found && type != boost::filesystem::regular_file)
             return;
-        fTemporary = fPath;
-        fTemporary += boost::filesystem::unique_path(L".%%%%%%%%.tmp");
+        fTemporary = MakeTemporaryPath(fPath);
         OpenPath(fTemporary, CREATE_NEW);
         fHasTemporary = true;
     }

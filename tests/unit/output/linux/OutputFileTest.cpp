@@ -92,7 +92,7 @@ TEST_F(OutputFileTest, AppearsWhenItIsFinished)
     {
         const std::unique_ptr<Output> output = OpenFile(path);
         ASSERT_EQ(List().size(), 1U);
-        EXPECT_THAT(List().front(), testing::MatchesRegex("report\\.[0-9a-f]{8}\\.tmp"));
+        EXPECT_THAT(List().front(), testing::MatchesRegex("\\.report\\.[0-9a-f]{8}\\.tmp"));
         output->Open();
         output->Write("one ");
         output->Write("two");
