@@ -6,6 +6,7 @@
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
+#include "app/Forms.h"
 #include "app/NeedStatus.h"
 #include "facts/Environment.h"
 #include "facts/FileVersion.h"
@@ -18,7 +19,6 @@
 #include "report/LineForm.h"
 #include "report/Report.h"
 #include "report/SequenceReader.h"
-#include "report/TextView.h"
 #include "report/Usable.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Guardian.h"
@@ -121,29 +121,20 @@ public:
         const auto report = std::make_shared<const Report>(std::move(fReport));
         const int status = GetStatus(fChoice.fNeed, *report, outcome);
         const bool isFirst = fChoice.fSchema == kFirstSchemaVersion;
-        switch (fChoice.fFormat) {
-        case Format::kJsonLines:
+        if (fChoice.fFormat == Format::kJsonLines) {
             fWriter.Write([report, outcome, isFirst] {
                 return isFirst ? MakeFirstEndEvent(outcome)
                                : MakeEndEvent(GetAnswers(*report), outcome);
             });
-            break;
-        case Format::kJson:
-            fWriter.WriteLarge([report, outcome, facts = fFacts, isFirst](std::ostream& out) {
-                if (isFirst)
-                    WriteFirstDocument(out, *report, outcome);
-                else
-                    WriteDocument(out, *report, outcome, facts);
-            });
-            break;
-        case Format::kText:
-            if (fChoice.fRaw)
-                fWriter.Write("\n");
-            const int width = fChoice.fOutput.empty() ? GetOutputWidth() : kFileWidth;
-            fWriter.WriteLarge([report, outcome, width](std::ostream& out) {
-                PrintText(out, *report, outcome, width);
-            });
+            return status;
         }
+        if (fChoice.fRaw)
+            fWriter.Write("\n");
+        const Form form = {fChoice.fFormat, fChoice.fSchema,
+                           fChoice.fOutput.empty() ? GetOutputWidth() : kFileWidth};
+        fWriter.WriteLarge([form, report, outcome, facts = fFacts](std::ostream& out) {
+            WriteForm(out, form, *report, outcome, facts);
+        });
         return status;
     }
 

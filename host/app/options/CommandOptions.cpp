@@ -67,6 +67,16 @@ void AddWord(CLI::App& command, const char* name, std::string& word, const char*
     command.add_option(name, word, what)->option_text(placeholder)->check(CLI::IsMember(words));
 }
 
+Format ReadFormat(const std::string& format)
+{
+    return format == "json"         ? Format::kJson
+           : format == "jsonl"      ? Format::kJsonLines
+           : format == "prometheus" ? Format::kPrometheus
+           : format == "nfd"        ? Format::kNodeFeatures
+           : format == "ansible"    ? Format::kAnsible
+                                    : Format::kText;
+}
+
 Need ReadNeed(const std::string& need)
 {
     return need == "opengl"   ? Need::kOpenGL

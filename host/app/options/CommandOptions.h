@@ -68,6 +68,10 @@ void AddTexts(CLI::App& command, const char* name, std::vector<std::string>& tex
 void AddWord(CLI::App& command, const char* name, std::string& word, const char* what,
              const char* placeholder, const std::vector<std::string>& words);
 
+// Returns the format of "json", "jsonl", "prometheus", "nfd" or "ansible", and of any other text
+// the text form.
+Format ReadFormat(const std::string& format);
+
 // Returns the need of "opengl", "opencl" or "both", and of any other text nothing.
 Need ReadNeed(const std::string& need);
 

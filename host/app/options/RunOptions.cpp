@@ -18,8 +18,9 @@ public:
     void Add(CLI::App& command) override
     {
         AddChildOptions(command, fChoice.fChild);
-        AddWord(command, "--format", fFormat, "text, json or jsonl [text]", "FORMAT",
-                {"text", "json", "jsonl"});
+        AddWord(command, "--format", fFormat,
+                "text, json, jsonl, prometheus, nfd or ansible [text]", "FORMAT",
+                {"text", "json", "jsonl", "prometheus", "nfd", "ansible"});
         command.add_option("--schema", fChoice.fSchema, "of json and jsonl, 1 or 2 [2]")
             ->option_text("NUMBER")
             ->check(CLI::IsMember({"1", "2"}));
@@ -37,12 +38,12 @@ public:
     CommandChoice Choose(const CLI::App& command,
                          const std::vector<std::string>& childWords) override
     {
-        fChoice.fFormat = fFormat == "json"    ? Format::kJson
-                          : fFormat == "jsonl" ? Format::kJsonLines
-                                               : Format::kText;
+        fChoice.fFormat = ReadFormat(fFormat);
+        const bool isJson =
+            fChoice.fFormat == Format::kJson || fChoice.fFormat == Format::kJsonLines;
         if (fChoice.fRaw && fChoice.fFormat != Format::kText)
             throw CLI::ValidationError("--raw", "only with --format text");
-        if (command.count("--schema") > 0 && fChoice.fFormat == Format::kText)
+        if (command.count("--schema") > 0 && !isJson)
             throw CLI::ValidationError("--schema", "only with --format json or jsonl");
         fChoice.fNeed = ReadNeed(fNeed);
         fChoice.fChild.fArgs = childWords;

@@ -58,6 +58,9 @@ TEST(CommandLineOfRun, NamesItsFormsAndNeeds)
         EXPECT_EQ(Parse<RunChoice>({"run", "--format", form, "--schema", "1"}).fSchema, 1);
         EXPECT_EQ(Parse<RunChoice>({"run", "--format", form, "--schema", "2"}).fSchema, 2);
     }
+    EXPECT_EQ(Parse<RunChoice>({"run", "--format", "prometheus"}).fFormat, Format::kPrometheus);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--format", "nfd"}).fFormat, Format::kNodeFeatures);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--format", "ansible"}).fFormat, Format::kAnsible);
     EXPECT_EQ(Parse<RunChoice>({"run", "--need", "opengl"}).fNeed, Need::kOpenGL);
     EXPECT_EQ(Parse<RunChoice>({"run", "--need", "opencl"}).fNeed, Need::kOpenCL);
     EXPECT_EQ(Parse<RunChoice>({"run", "--need", "both"}).fNeed, Need::kBoth);

@@ -1,0 +1,23 @@
+// The forms of a run that are written after its end.
+#pragma once
+
+#include <ostream>
+
+#include "app/CommandLine.h"
+#include "report/Report.h"
+#include "report/RunFacts.h"
+#include "report/RunOutcome.h"
+
+namespace assay_host {
+
+struct Form {
+    Format fFormat = Format::kText; // any but kJsonLines
+    int fSchema = 2;                // of kJson
+    int fWidth = 80;                // of kText, in columns
+};
+
+// Writes the run. Doesn't check the stream for failures. Any thread may call.
+void WriteForm(std::ostream& out, const Form& form, const Report& report, const RunOutcome& outcome,
+               const RunFacts& facts);
+
+} // namespace assay_host
