@@ -104,5 +104,9 @@ struct FunctionTable {
 bool FillFunctionTable(FunctionTable& table, Core::Proc (*getProc)(void* context, const char* name),
                        void* context);
 
+// Makes the calls of the CALLED functions observed, as in DriverCall.h. Only for the one table of a
+// process.
+void ObserveCalls(FunctionTable& table);
+
 } // namespace OCL
 } // namespace QGF

@@ -5,6 +5,7 @@
 #include <cstdint>
 
 #include "qgf/Core.h"
+#include "qgf/DriverCall.h"
 
 namespace QGF {
 namespace OGL {
@@ -53,6 +54,7 @@ public:
     {
         if (!isOffered())
             ThrowNotOffered(fName, file, line);
+        const Core::DriverCall call(Core::Interface::kOpenGL);
         return fFunction(parameters...);
     }
 

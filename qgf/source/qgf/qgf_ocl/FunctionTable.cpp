@@ -1,4 +1,5 @@
 #include "qgf/OCLFunctionTable.h"
+#include "qgf/qgf_core/ObservedCalls.h"
 
 namespace QGF {
 namespace OCL {
@@ -32,6 +33,16 @@ bool FillFunctionTable(FunctionTable& table, Core::Proc (*getProc)(void* context
 #undef QGF_OCL_FILL
 
     return complete;
+}
+
+void ObserveCalls(FunctionTable& table)
+{
+#define QGF_OCL_OBSERVE(name)                                                                      \
+    Core::ObserveMember<Core::Interface::kOpenCL, &FunctionTable::name>(table);
+#define QGF_OCL_SKIP(name)
+    QGF_OCL_ENTRY_POINTS(QGF_OCL_OBSERVE, QGF_OCL_SKIP)
+#undef QGF_OCL_OBSERVE
+#undef QGF_OCL_SKIP
 }
 
 } // namespace OCL

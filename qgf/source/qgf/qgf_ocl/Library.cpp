@@ -1,6 +1,7 @@
 #include <optional>
 #include <utility>
 
+#include "qgf/DriverCall.h"
 #include "qgf/OCL.h"
 #include "qgf/qgf_ocl/LibraryNames.h"
 
@@ -21,6 +22,7 @@ Core::Proc GetProcOf(void* library, const char* name)
 
 LoadedLibrary Load(const char* const* names)
 {
+    const Core::DriverCall call(Core::Interface::kOpenCL);
     LoadedLibrary loaded{Core::OpenLibrary(names), {}};
     if (!FillFunctionTable(loaded.table, GetProcOf, loaded.loader.get()))
         throw LogicalException("The OpenCL library lacks required entry points");
@@ -30,7 +32,12 @@ LoadedLibrary Load(const char* const* names)
 // Never closed: threads of a driver may outlive all objects of this library.
 const LoadedLibrary& GetLoadedLibrary()
 {
-    static const LoadedLibrary* const loaded = new LoadedLibrary(Load(kLibraryNames));
+    static const LoadedLibrary* const loaded = [] {
+        auto* const library = new LoadedLibrary(Load(kLibraryNames));
+        if (Core::IsObserved())
+            ObserveCalls(library->table);
+        return library;
+    }();
     return *loaded;
 }
 

@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "qgf/AdapterName.h"
+#include "qgf/DriverCall.h"
 #include "qgf/DrmNodes.h"
 #include "qgf/qgf_core/Quietly.h"
 
@@ -394,7 +395,10 @@ std::unique_ptr<Platform> MakeNativePlatform()
 {
     // Never closed: drivers have threads and exit handlers.
     static const char* const names[] = {"libEGL.so.1", "libEGL.so", nullptr};
-    static Core::DynamicLibrary* const library = Core::OpenLibrary(names).release();
+    static Core::DynamicLibrary* const library = [] {
+        const Core::DriverCall call(Core::Interface::kOpenGL);
+        return Core::OpenLibrary(names).release();
+    }();
     EGLTable egl;
     FillEGLTable(
         egl,
@@ -402,6 +406,8 @@ std::unique_ptr<Platform> MakeNativePlatform()
             return static_cast<Core::DynamicLibrary*>(context)->getProc(name);
         },
         library);
+    if (Core::IsObserved())
+        ObserveCalls(egl);
     return std::make_unique<EGLPlatform>(
         egl,
         EGLPlatform::AdapterLookup{AdapterOfDrmNode, NvidiaAdapters, AdapterName, IsFirmwareNode});

@@ -44,5 +44,8 @@ struct EGLTable {
 void FillEGLTable(EGLTable& table, Core::Proc (*getProc)(void* context, const char* name),
                   void* context);
 
+// Makes the calls of the table's functions observed. Only for the one table of a process.
+void ObserveCalls(EGLTable& table);
+
 } // namespace OGL
 } // namespace QGF

@@ -3,6 +3,7 @@
 #include <future>
 
 #include "qgf/Core.h"
+#include "qgf/DriverCall.h"
 #include "qgf/qgf_core/win/SystemError.h"
 
 namespace QGF {
@@ -18,6 +19,14 @@ constexpr int kSize = 32; // pixels; nothing is drawn on the window
     const DWORD error = GetLastError();
     throw LogicalException(std::string(call) + " failed for display device " + deviceName + ": " +
                            Core::SystemErrorText(error));
+}
+
+// Calls a function in which Windows loads or calls the driver.
+template <typename Function, typename... Parameters>
+auto CallDriver(Function function, Parameters... parameters)
+{
+    const Core::DriverCall call(Core::Interface::kOpenGL);
+    return function(parameters...);
 }
 
 // Ignores WM_CLOSE: a request to close all windows must not end a running measurement.
@@ -129,10 +138,10 @@ void HiddenWindow::ChooseFormat(const std::string& deviceName)
     wanted.iPixelType = PFD_TYPE_RGBA;
     wanted.cColorBits = kColorBits;
     wanted.cAlphaBits = kAlphaBits;
-    const int format = ChoosePixelFormat(fDC, &wanted);
+    const int format = CallDriver(ChoosePixelFormat, fDC, &wanted);
     if (format == 0)
         ThrowFailed("ChoosePixelFormat", deviceName);
-    if (SetPixelFormat(fDC, format, &wanted) == 0)
+    if (CallDriver(SetPixelFormat, fDC, format, &wanted) == 0)
         ThrowFailed("SetPixelFormat", deviceName);
 }
 

@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <string>
 
+#include "qgf/DriverCall.h"
+#include "qgf/qgf_core/ObservedCalls.h"
 #include "qgf/qgf_core/Quietly.h"
 #include "qgf/qgf_core/win/SystemError.h"
 #include "qgf/qgf_ogl/win/HiddenWindow.h"
@@ -73,6 +75,15 @@ void FillEntry(Function& entry, const Core::DynamicLibrary& library, const char*
         throw LogicalException(std::string("opengl32.dll has no ") + name);
 }
 
+void ObserveCalls(WGLTable& table)
+{
+    constexpr Core::Interface kOpenGL = Core::Interface::kOpenGL;
+    Core::ObserveMember<kOpenGL, &WGLTable::wglCreateContext>(table);
+    Core::ObserveMember<kOpenGL, &WGLTable::wglDeleteContext>(table);
+    Core::ObserveMember<kOpenGL, &WGLTable::wglMakeCurrent>(table);
+    Core::ObserveMember<kOpenGL, &WGLTable::wglGetProcAddress>(table);
+}
+
 } // namespace
 
 WGLPlatform::WGLPlatform(std::unique_ptr<Core::DynamicLibrary> library)
@@ -82,6 +93,8 @@ WGLPlatform::WGLPlatform(std::unique_ptr<Core::DynamicLibrary> library)
     FillEntry(fWGL.wglDeleteContext, *fLibrary, "wglDeleteContext");
     FillEntry(fWGL.wglMakeCurrent, *fLibrary, "wglMakeCurrent");
     FillEntry(fWGL.wglGetProcAddress, *fLibrary, "wglGetProcAddress");
+    if (Core::IsObserved())
+        ObserveCalls(fWGL);
 }
 
 std::vector<DisplayDeviceKey> WGLPlatform::displayDevices()
@@ -115,6 +128,7 @@ std::unique_ptr<PlatformContext> WGLPlatform::createOffscreen(const DisplayDevic
 std::unique_ptr<Platform> MakeNativePlatform()
 {
     static const char* const names[] = {"opengl32.dll", nullptr};
+    const Core::DriverCall call(Core::Interface::kOpenGL);
     return std::make_unique<WGLPlatform>(Core::OpenLibrary(names));
 }
 
