@@ -1,0 +1,1 @@
+// Has nothing: only its file counts.
