@@ -10,6 +10,7 @@
 #include "ReportLine.h"
 #include "Timestamp.h"
 #include "pmutil/PMLogging.h"
+#include "pmutil_gpu/DriverFileLog.h"
 #include "pmutil_gpu/GPUImplHardware.h"
 #include "qgf/Core.h"
 
@@ -21,6 +22,7 @@ GPUAssayTester::~GPUAssayTester() = default;
 void GPUAssayTester::Run()
 {
     fStep = 0;
+    pmutil::LogDriverFiles();
     DoRunStart();
     DoRunTimestamp("assayStart");
     DoRunQGFCoreInitialize();
