@@ -15,6 +15,7 @@ from hosting import run_assay
 from model import Gpu
 
 RULES = INTEGRATIONS / "prometheus" / "assay-rules.yml"
+DASHBOARD = INTEGRATIONS / "prometheus" / "assay-dashboard.json"
 LISTENING = r'msg="Listening on" address=(127\.0\.0\.1:\d+)'
 
 CONFIGURATION = """\
@@ -141,7 +142,18 @@ def test_run_is_scraped_and_an_alert_fires_when_the_driver_crashes(host, prometh
     assert prometheus.query('count({__name__=~"assay_.*"})')[0][1] == len(written)
 
 
-def test_metrics_of_rules_exist(host):
+def test_panels_of_the_dashboard_are_queries(prometheus):
+    dashboard = json.loads(DASHBOARD.read_text(encoding="utf-8"))
+    assert len(dashboard["panels"]) == 13
+    for panel in dashboard["panels"]:
+        for target in panel["targets"]:
+            prometheus.query(target["expr"].replace("$instance", ".*"))
+    names = {variable["name"] for variable in dashboard["templating"]["list"]}
+    assert set(re.findall(r"\$\{?(\w+)", json.dumps(dashboard))) <= names
+
+
+def test_metrics_of_rules_and_dashboard_exist(host):
     known = set(re.findall(r"^# TYPE (\S+) gauge$", run_of_one_card(host).text, re.MULTILINE))
-    used = set(re.findall(r"\bassay_\w+", RULES.read_text(encoding="utf-8")))
-    assert used - known == set()
+    for file in (RULES, DASHBOARD):
+        used = set(re.findall(r"\bassay_\w+", file.read_text(encoding="utf-8")))
+        assert used - known == set(), file
