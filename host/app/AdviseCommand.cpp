@@ -7,7 +7,6 @@
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
-#include "app/NeedStatus.h"
 #include "app/ValueCollector.h"
 #include "identity/Identity.h"
 #include "memory/AdviceForms.h"
@@ -68,13 +67,6 @@ Advice TryWatched(Adviser& adviser, Machine& machine, const AdviseChoice& choice
     return advice;
 }
 
-int GetStatus(const Advice& advice, Need need)
-{
-    if (advice.fStopped)
-        return GetVerdictStatus(Verdict::kInterrupted);
-    return GetNeedStatus(need, advice.fOpenGL.GetUsability(), advice.fOpenCL.GetUsability());
-}
-
 std::string MakeText(const Advice& advice, AdviceFormat format, int status)
 {
     switch (format) {
@@ -96,13 +88,14 @@ int Advise(const AdviseChoice& choice)
     const std::unique_ptr<Folder> folder =
         OpenFolder(choice.fState, choice.fDryRun ? FolderUse::kRead : FolderUse::kWrite);
     const std::unique_ptr<Machine> machine = MakeSystemMachine();
-    Adviser adviser(*folder, *machine, identity, MakeRequest(choice));
+    const AdviceRequest request = MakeRequest(choice);
+    Adviser adviser(*folder, *machine, identity, request);
     Advice advice = adviser.Recall();
     if (!choice.fDryRun && (advice.fPlan != Plan::kAnswer || advice.fIsOpen))
         advice = TryWatched(adviser, *machine, choice);
     for (const std::string& message : advice.fMessages)
         std::fprintf(stderr, "assay-host: %s\n", message.c_str());
-    const int status = GetStatus(advice, choice.fNeed);
+    const int status = GetAdviceStatus(request, advice);
     OpenStandardOutput()->Write(MakeText(advice, choice.fFormat, status));
     return status;
 }

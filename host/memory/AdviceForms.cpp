@@ -37,13 +37,6 @@ std::optional<std::int64_t> GetTime(const InterfaceAdvice& part)
     return part.fChosen ? std::optional(part.fChosen->fTime) : part.fOutlook.fTime;
 }
 
-// A time in the future has the age 0.
-std::optional<std::int64_t> GetAge(const Advice& advice, const InterfaceAdvice& part)
-{
-    const auto time = GetTime(part);
-    return time ? std::optional(std::max<std::int64_t>(advice.fTime - *time, 0)) : std::nullopt;
-}
-
 std::string ShowAge(std::int64_t seconds)
 {
     struct Unit {
@@ -56,17 +49,6 @@ std::string ShowAge(std::int64_t seconds)
         if (const std::int64_t count = seconds / unit.fSeconds; count > 0)
             return fmt::format("{} {}{} ago", count, unit.fName, count == 1 ? "" : "s");
     return "now";
-}
-
-std::string GetReason(const InterfaceAdvice& part)
-{
-    return part.fChosen ? "chosen" : part.fOutlook.fFinding.fReason;
-}
-
-std::string GetText(const InterfaceAdvice& part, DeviceKind kind)
-{
-    return part.fChosen ? fmt::format("The user chose this for {}.", GetKindName(kind))
-                        : ShowBytes(part.fOutlook.fFinding.fText);
 }
 
 const char* GetEnd(const InterfaceAdvice& part)
@@ -128,7 +110,7 @@ void AddInterface(Lines& lines, const Advice& advice, DeviceKind kind)
     const Outlook& outlook = part.fOutlook;
     lines.fText +=
         fmt::format("{}: {}\n", GetKindName(kind), GetUsabilityName(part.GetUsability()));
-    lines.Add("why", GetText(part, kind));
+    lines.Add("why", GetAdviceText(part, kind));
     if (part.fChosen)
         lines.Add("learnt", fmt::format("{}: {}", GetUsabilityName(outlook.fFinding.fUsability),
                                         ShowBytes(outlook.fFinding.fText)));
@@ -139,7 +121,7 @@ void AddInterface(Lines& lines, const Advice& advice, DeviceKind kind)
     lines.Add("line", ShowBytes(part.fLastLine));
     if (const auto time = GetTime(part))
         lines.Add("since",
-                  fmt::format("{} ({})", MakeUtcText(*time), ShowAge(*GetAge(advice, part))));
+                  fmt::format("{} ({})", MakeUtcText(*time), ShowAge(*GetAdviceAge(advice, part))));
     if (outlook.fFailures > 0)
         lines.Add("failures", std::to_string(outlook.fFailures));
     lines.Add("warning", ShowBytes(outlook.fWarning));
@@ -182,10 +164,10 @@ Json MakePart(const Advice& advice, DeviceKind kind)
 {
     const InterfaceAdvice& part = advice.Get(kind);
     const Outlook& outlook = part.fOutlook;
-    const auto age = GetAge(advice, part);
+    const auto age = GetAdviceAge(advice, part);
     return {{"answer", GetUsabilityName(part.GetUsability())},
-            {"reason", EncodeBytes(GetReason(part))},
-            {"text", EncodeBytes(GetText(part, kind))},
+            {"reason", EncodeBytes(GetAdviceReason(part))},
+            {"text", EncodeBytes(GetAdviceText(part, kind))},
             {"source", GetSourceName(advice, kind)},
             {"learnt", GetUsabilityName(outlook.fFinding.fUsability)},
             {"device", MakeDevice(outlook.fFinding)},
@@ -201,6 +183,34 @@ Json MakePart(const Advice& advice, DeviceKind kind)
 }
 
 } // namespace
+
+std::string GetAdviceReason(const InterfaceAdvice& part)
+{
+    return part.fChosen ? "chosen" : part.fOutlook.fFinding.fReason;
+}
+
+std::string GetAdviceText(const InterfaceAdvice& part, DeviceKind kind)
+{
+    return part.fChosen ? fmt::format("The user chose this for {}.", GetKindName(kind))
+                        : ShowBytes(part.fOutlook.fFinding.fText);
+}
+
+std::optional<std::int64_t> GetAdviceAge(const Advice& advice, const InterfaceAdvice& part)
+{
+    const auto time = GetTime(part);
+    return time ? std::optional(std::max<std::int64_t>(advice.fTime - *time, 0)) : std::nullopt;
+}
+
+int GetAdviceStatus(const AdviceRequest& request, const Advice& advice)
+{
+    if (advice.fStopped)
+        return GetVerdictStatus(Verdict::kInterrupted);
+    const Usability opengl = advice.fOpenGL.GetUsability();
+    const Usability opencl = advice.fOpenCL.GetUsability();
+    return GetUsabilityStatus(!request.fNeedsOpenCL   ? opengl
+                              : !request.fNeedsOpenGL ? opencl
+                                                      : GetLesser(opengl, opencl));
+}
 
 const char* GetSourceName(const Advice& advice, DeviceKind kind)
 {
@@ -220,7 +230,7 @@ std::string GetChangeText(const Advice& advice, DeviceKind kind)
         return fmt::format("\"assay-host state set {}=auto\" takes the choice back.",
                            GetName(kind));
     if (finding.fReason == "other-instance")
-        return "Call again, or wait longer with --wait.";
+        return "Call again, or wait longer.";
     const char* const hint =
         finding.fReason == "never-started" ? "Check the installation of assay. " : "";
     if (!part.fOutlook.fNextTime)
@@ -230,7 +240,7 @@ std::string GetChangeText(const Advice& advice, DeviceKind kind)
     switch (finding.fUsability) {
     case Usability::kHardware:
     case Usability::kSoftware:
-        return next + ", or with --fresh.";
+        return next + ", or if a fresh one is requested.";
     case Usability::kBroken:
         return next + ", or after a change of a driver or of the system, or after \"assay-host "
                       "state forget\".";
@@ -263,15 +273,15 @@ std::string MakeAdviceVariables(const Advice& advice)
         const Outlook& outlook = part.fOutlook;
         const std::string name = each.fVariable;
         add(name, GetUsabilityName(part.GetUsability()));
-        add(name + "_REASON", GetReason(part));
-        add(name + "_TEXT", GetText(part, each.fKind));
+        add(name + "_REASON", GetAdviceReason(part));
+        add(name + "_TEXT", GetAdviceText(part, each.fKind));
         add(name + "_SOURCE", GetSourceName(advice, each.fKind));
         add(name + "_LEARNT", GetUsabilityName(outlook.fFinding.fUsability));
         add(name + "_DEVICE", outlook.fFinding.fDevice);
         add(name + "_DRIVER", outlook.fFinding.fDriver);
         add(name + "_END", GetEnd(part));
         add(name + "_LAST_LINE", part.fLastLine);
-        add(name + "_AGE", ShowNumber(GetAge(advice, part)));
+        add(name + "_AGE", ShowNumber(GetAdviceAge(advice, part)));
         add(name + "_FAILURES", std::to_string(outlook.fFailures));
         add(name + "_NEXT", outlook.fNextTime ? MakeUtcText(*outlook.fNextTime) : "");
         add(name + "_WARNING", outlook.fWarning);

@@ -48,7 +48,7 @@ TEST(AdviceFormsTest, TellsPeopleWhatAndWhy)
   device   glgpu[0], A card, driver 1.2
   since    2027-01-13T08:00:00Z (2 days ago)
   warning  A warning.
-  change   The next attempt is due at 2027-01-16T08:00:00Z, or with --fresh.
+  change   The next attempt is due at 2027-01-16T08:00:00Z, or if a fresh one is requested.
 OpenCL: broken
   why      A sentence.
   device   clgpu[0], It's \x1B[31m\xFF, driver 1.2
@@ -90,6 +90,21 @@ TEST(AdviceFormsTest, WritesADocument)
     EXPECT_EQ(document["messages"], nlohmann::json({"A message."}));
 }
 
+TEST(AdviceFormsTest, HasTheStatusOfWhatIsNeeded)
+{
+    Advice advice = MakeAdvice(); // OpenGL works, OpenCL is broken
+    AdviceRequest request;
+    EXPECT_EQ(GetAdviceStatus(request, advice), 0);
+    request.fNeedsOpenCL = true;
+    EXPECT_EQ(GetAdviceStatus(request, advice), 21);
+    request.fNeedsOpenGL = false;
+    EXPECT_EQ(GetAdviceStatus(request, advice), 21);
+    advice.fOpenCL.fChosen = {Usability::kHardware, kNow};
+    EXPECT_EQ(GetAdviceStatus(request, advice), 0);
+    advice.fStopped = true;
+    EXPECT_EQ(GetAdviceStatus(request, advice), 6);
+}
+
 TEST(AdviceFormsTest, TellsTheUsersChoiceApart)
 {
     Advice advice = MakeAdvice();
@@ -112,7 +127,8 @@ TEST(AdviceFormsTest, TellsWhatWouldChangeTheAnswer)
     Advice advice = MakeAdvice();
     Finding& finding = advice.fOpenGL.fOutlook.fFinding;
     const auto change = [&] { return GetChangeText(advice, DeviceKind::kOpenGL); };
-    EXPECT_EQ(change(), "The next attempt is due at 2027-01-16T08:00:00Z, or with --fresh.");
+    EXPECT_EQ(change(),
+              "The next attempt is due at 2027-01-16T08:00:00Z, or if a fresh one is requested.");
     finding = MakeFinding(Usability::kBroken);
     EXPECT_EQ(change(), "The next attempt is due at 2027-01-16T08:00:00Z, or after a change of a "
                         "driver or of the system, or after \"assay-host state forget\".");
@@ -120,7 +136,7 @@ TEST(AdviceFormsTest, TellsWhatWouldChangeTheAnswer)
     EXPECT_EQ(change(), "The next attempt is due at 2027-01-16T08:00:00Z, or after the "
                         "installation of a driver.");
     finding = MakeFinding(Usability::kUnknown, "other-instance");
-    EXPECT_EQ(change(), "Call again, or wait longer with --wait.");
+    EXPECT_EQ(change(), "Call again, or wait longer.");
     finding = MakeFinding(Usability::kUnknown, "host-ended");
     EXPECT_EQ(change(),
               "The next attempt is due at 2027-01-16T08:00:00Z, or after \"assay-host state "
