@@ -2,26 +2,13 @@
 #include <cstring>
 
 #include "library/Result.h"
+#include "library/ReturnText.h"
 #include "library/Try.h"
 #include "report/Unknown.h"
 
 using namespace assay_host;
 
 namespace {
-
-const char* Return(const std::string& text, std::size_t* size)
-{
-    if (size != nullptr)
-        *size = text.size();
-    return text.c_str();
-}
-
-const char* ReturnNothing(std::size_t* size)
-{
-    if (size != nullptr)
-        *size = 0;
-    return "";
-}
 
 // Returns the element, or null beyond the end or for a null object.
 template <typename Object, typename Element>
@@ -78,12 +65,14 @@ double assay_host_result_seconds(const assay_host_result* result)
 
 const char* assay_host_result_last_line(const assay_host_result* result, size_t* size)
 {
-    return result == nullptr ? ReturnNothing(size) : Return(result->fOutcome.fLastReportLine, size);
+    return result == nullptr ? ReturnNothing(size)
+                             : ReturnText(result->fOutcome.fLastReportLine, size);
 }
 
 const char* assay_host_result_last_log_line(const assay_host_result* result, size_t* size)
 {
-    return result == nullptr ? ReturnNothing(size) : Return(result->fOutcome.fLastLogLine, size);
+    return result == nullptr ? ReturnNothing(size)
+                             : ReturnText(result->fOutcome.fLastLogLine, size);
 }
 
 size_t assay_host_result_error_line_count(const assay_host_result* result)
@@ -95,7 +84,7 @@ const char* assay_host_result_error_line(const assay_host_result* result, size_t
                                          size_t* size)
 {
     return index < assay_host_result_error_line_count(result)
-               ? Return(result->fOutcome.fErrorLines[index], size)
+               ? ReturnText(result->fOutcome.fErrorLines[index], size)
                : ReturnNothing(size);
 }
 
@@ -254,7 +243,7 @@ const char* assay_host_answer_text(const assay_host_answer* answer, size_t* size
 {
     return answer == nullptr || answer->fAnswer->fLine == nullptr
                ? ReturnNothing(size)
-               : Return(answer->fAnswer->fLine->fValue, size);
+               : ReturnText(answer->fAnswer->fLine->fValue, size);
 }
 
 double assay_host_answer_number(const assay_host_answer* answer)
@@ -283,7 +272,7 @@ const char* assay_host_result_document(const assay_host_result* result, size_t* 
     ReturnNothing(size);
     if (result != nullptr)
         Try([&] {
-            document = Return(result->GetDocument(), size);
+            document = ReturnText(result->GetDocument(), size);
             return ASSAY_HOST_OK;
         });
     return document;
