@@ -3,6 +3,7 @@
 #include <iterator>
 
 #include "assay_host.h"
+#include "memory/Adviser.h"
 #include "report/RunOutcome.h"
 #include "report/Usable.h"
 
@@ -14,9 +15,14 @@ const char* assay_host_version()
 const char* assay_host_error_text(assay_host_error error)
 {
     constexpr const char* kTexts[] = {
-        "no error",          "out of memory",
-        "a pointer is null", "a value is out of its range",
-        "a text is empty",   "the system refused a thread or another resource",
+        "no error",
+        "out of memory",
+        "a pointer is null",
+        "a value is out of its range",
+        "a text is empty",
+        "the system refused a thread or another resource",
+        "the state can't be changed",
+        "another process or thread makes an attempt",
     };
     const auto index = static_cast<std::size_t>(error);
     return index < std::size(kTexts) ? kTexts[index] : "unknown error";
@@ -32,4 +38,11 @@ const char* assay_host_verdict_name(assay_host_verdict verdict)
 const char* assay_host_usability_name(assay_host_usability usability)
 {
     return assay_host::GetUsabilityName(static_cast<assay_host::Usability>(usability));
+}
+
+const char* assay_host_plan_name(assay_host_plan plan)
+{
+    if (plan < ASSAY_HOST_ANSWER || plan > ASSAY_HOST_WAIT)
+        return "unknown";
+    return assay_host::GetPlanName(static_cast<assay_host::Plan>(plan));
 }

@@ -1,5 +1,6 @@
 #include "library/Options.h"
 
+#include <algorithm>
 #include <cmath>
 #include <new>
 
@@ -10,6 +11,8 @@ using assay_host::Try;
 namespace {
 
 constexpr std::uint64_t kMaxLimit = std::uint64_t{1} << 30;
+constexpr std::uint64_t kMaxRetries = 1000;
+constexpr double kMaxSeconds = 100.0 * 365 * assay_host::Policy::kDay;
 
 template <typename Limit>
 assay_host_error SetLimit(Limit& limit, std::uint64_t value)
@@ -17,6 +20,23 @@ assay_host_error SetLimit(Limit& limit, std::uint64_t value)
     if (value == 0 || value > kMaxLimit)
         return ASSAY_HOST_BAD_VALUE;
     limit = static_cast<Limit>(value);
+    return ASSAY_HOST_OK;
+}
+
+bool IsTime(double seconds)
+{
+    return std::isfinite(seconds) && seconds >= 0;
+}
+
+// Sets a time of the policy, which has whole seconds.
+assay_host_error SetTime(assay_host_options* options, std::int64_t assay_host::Policy::*time,
+                         double seconds)
+{
+    if (options == nullptr)
+        return ASSAY_HOST_NULL_POINTER;
+    if (!IsTime(seconds))
+        return ASSAY_HOST_BAD_VALUE;
+    options->fRequest.fPolicy.*time = static_cast<std::int64_t>(std::min(seconds, kMaxSeconds));
     return ASSAY_HOST_OK;
 }
 
@@ -58,7 +78,7 @@ assay_host_error assay_host_options_set_timeout(assay_host_options* options, dou
 {
     if (options == nullptr)
         return ASSAY_HOST_NULL_POINTER;
-    if (!std::isfinite(seconds) || seconds < 0)
+    if (!IsTime(seconds))
         return ASSAY_HOST_BAD_VALUE;
     options->fChild.fTimeoutSeconds = seconds;
     return ASSAY_HOST_OK;
@@ -117,5 +137,67 @@ assay_host_error assay_host_options_on_tick(assay_host_options* options,
         return ASSAY_HOST_NULL_POINTER;
     options->fOnTick = callback;
     options->fTickContext = context;
+    return ASSAY_HOST_OK;
+}
+
+assay_host_error assay_host_options_set_need(assay_host_options* options, int opengl, int opencl)
+{
+    if (options == nullptr)
+        return ASSAY_HOST_NULL_POINTER;
+    if (opengl == 0 && opencl == 0)
+        return ASSAY_HOST_BAD_VALUE;
+    options->fRequest.fNeedsOpenGL = opengl != 0;
+    options->fRequest.fNeedsOpenCL = opencl != 0;
+    return ASSAY_HOST_OK;
+}
+
+assay_host_error assay_host_options_set_fresh(assay_host_options* options, int fresh)
+{
+    if (options == nullptr)
+        return ASSAY_HOST_NULL_POINTER;
+    options->fRequest.fFresh = fresh != 0;
+    return ASSAY_HOST_OK;
+}
+
+assay_host_error assay_host_options_set_dry_run(assay_host_options* options, int dry_run)
+{
+    if (options == nullptr)
+        return ASSAY_HOST_NULL_POINTER;
+    options->fDryRun = dry_run != 0;
+    return ASSAY_HOST_OK;
+}
+
+assay_host_error assay_host_options_set_wait(assay_host_options* options, double seconds)
+{
+    if (options == nullptr)
+        return ASSAY_HOST_NULL_POINTER;
+    if (!IsTime(seconds))
+        return ASSAY_HOST_BAD_VALUE;
+    options->fRequest.fWaitSeconds = std::min(seconds, kMaxSeconds);
+    return ASSAY_HOST_OK;
+}
+
+assay_host_error assay_host_options_set_max_age(assay_host_options* options, double seconds)
+{
+    return SetTime(options, &assay_host::Policy::fMaxAge, seconds);
+}
+
+assay_host_error assay_host_options_set_pause(assay_host_options* options, double seconds)
+{
+    return SetTime(options, &assay_host::Policy::fFirstPause, seconds);
+}
+
+assay_host_error assay_host_options_set_forgive(assay_host_options* options, double seconds)
+{
+    return SetTime(options, &assay_host::Policy::fForgiven, seconds);
+}
+
+assay_host_error assay_host_options_set_retries(assay_host_options* options, uint64_t retries)
+{
+    if (options == nullptr)
+        return ASSAY_HOST_NULL_POINTER;
+    if (retries > kMaxRetries)
+        return ASSAY_HOST_BAD_VALUE;
+    options->fRequest.fPolicy.fRetries = static_cast<std::size_t>(retries);
     return ASSAY_HOST_OK;
 }

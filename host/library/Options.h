@@ -2,6 +2,7 @@
 #pragma once
 
 #include "assay_host.h"
+#include "memory/Adviser.h"
 #include "supervise/ChildRun.h"
 
 struct assay_host_options {
@@ -14,4 +15,8 @@ struct assay_host_options {
     void* fErrorLineContext = nullptr;
     assay_host_tick_callback fOnTick = nullptr;
     void* fTickContext = nullptr;
+
+    // Of an advice.
+    assay_host::AdviceRequest fRequest;
+    bool fDryRun = false;
 };

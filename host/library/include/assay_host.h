@@ -1,16 +1,17 @@
 /* libassay-host: runs assay as a supervised child and tells whether OpenGL and OpenCL can be used.
  *
- * A driver that crashes or hangs ends only the child. docs/embedding.md leads from nothing to a
- * decision.
+ * A driver that crashes or hangs ends only the child. assay_host_run runs the child once;
+ * assay_host_advise remembers its runs, and answers from memory until something changes.
+ * docs/embedding.md leads from nothing to a decision.
  *
  * Sizes are in bytes, times in seconds. Texts passed in are UTF-8 and end with a zero byte. Texts
  * returned end with a zero byte, belong to the object that returned them and live as long as it; a
  * text of a driver may contain any bytes, also zero bytes, so that functions with `size` set it to
  * the number of bytes (`size` may be null). No text returned is null, except as stated.
  *
- * Threads: any number of runs at a time. An options object may be read by several threads, and
- * changed only while no other thread uses it. A result never changes: any thread may read it. A
- * stop is for any thread.
+ * Threads: any number of runs and advices at a time. An options object may be read by several
+ * threads, and changed only while no other thread uses it. A result and an advice never change: any
+ * thread may read them. A stop is for any thread.
  *
  * The host: the library installs no signal handler and changes neither the working directory, nor
  * the locale, nor a descriptor of its host. Its threads have all signals blocked. On Linux the host
@@ -52,7 +53,9 @@ typedef enum assay_host_error {
     ASSAY_HOST_NULL_POINTER = 2, /* "a pointer is null" */
     ASSAY_HOST_BAD_VALUE = 3,    /* "a value is out of its range" */
     ASSAY_HOST_BAD_TEXT = 4,     /* "a text is empty" */
-    ASSAY_HOST_INTERNAL = 5      /* "the system refused a thread or another resource" */
+    ASSAY_HOST_INTERNAL = 5,     /* "the system refused a thread or another resource" */
+    ASSAY_HOST_NOT_CHANGED = 6,  /* "the state can't be changed" */
+    ASSAY_HOST_BUSY = 7          /* "another process or thread makes an attempt" */
 } assay_host_error;
 
 /* Returns the text above; "unknown error" for other numbers. */
@@ -63,7 +66,7 @@ ASSAY_HOST_API const char* assay_host_version(void);
 
 /* --- Options --------------------------------------------------------------------------------- */
 
-/* What to run and how. */
+/* What to run and how. Those after the callbacks are for assay_host_advise alone. */
 typedef struct assay_host_options assay_host_options;
 
 /* Makes options with the defaults below. Returns null if memory runs out. Free it with
@@ -106,10 +109,10 @@ ASSAY_HOST_API assay_host_error assay_host_options_set_identify(assay_host_optio
                                                                 int identify);
 
 /* Callbacks of a run, with the context of their setter. They are called on the thread of
- * assay_host_run, one after the other, `seconds` after the launch. This thread supervises the
- * child: a callback that blocks delays the timeout. It returns 0 to continue, or another number to
- * end the run, with the verdict interrupted. It must not throw or jump out. Null: no callback,
- * which is the default. */
+ * assay_host_run or assay_host_advise, one after the other, `seconds` after the launch. This thread
+ * supervises the child: a callback that blocks delays the timeout. It returns 0 to continue, or
+ * another number to end the run, with the verdict interrupted. It must not throw or jump out. Null:
+ * no callback, which is the default. */
 
 /* A line of the report, or of the child's standard error, without its line end. */
 typedef int (*assay_host_line_callback)(void* context, const char* line, size_t size,
@@ -131,6 +134,40 @@ ASSAY_HOST_API assay_host_error assay_host_options_on_tick(assay_host_options* o
                                                            assay_host_tick_callback callback,
                                                            void* context);
 
+/* Which interfaces may cause an attempt, 1 or 0 each; the default is OpenGL alone. The advice has
+ * both in any case. Errors: null pointer; bad value if both are 0. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_need(assay_host_options* options, int opengl,
+                                                            int opencl);
+
+/* Whether results of earlier attempts are due for another one at any age: 1 or 0, which is the
+ * default. The pauses after failures stay. Error: null pointer. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_fresh(assay_host_options* options,
+                                                             int fresh);
+
+/* Whether to show only what a call would do, and why, without doing it: 1 or 0, which is the
+ * default. Then nothing is written and no child is started. Error: null pointer. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_dry_run(assay_host_options* options,
+                                                               int dry_run);
+
+/* Set how long to wait for the attempt of another process or thread, 10 by default; the age at
+ * which hardware and software are tried again, 30 days; the pause after a first failure, 60, which
+ * grows by a factor of 60 up to the next one; and the age from which failures don't count, 7 days.
+ * More than 100 years are 100 years. Errors: null pointer; bad value for a negative number or one
+ * that isn't finite. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_wait(assay_host_options* options,
+                                                            double seconds);
+ASSAY_HOST_API assay_host_error assay_host_options_set_max_age(assay_host_options* options,
+                                                               double seconds);
+ASSAY_HOST_API assay_host_error assay_host_options_set_pause(assay_host_options* options,
+                                                             double seconds);
+ASSAY_HOST_API assay_host_error assay_host_options_set_forgive(assay_host_options* options,
+                                                               double seconds);
+
+/* Sets the number of attempts after a first failure, until failures are forgiven; the default is 2.
+ * Errors: null pointer; bad value for more than 1000. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_retries(assay_host_options* options,
+                                                               uint64_t retries);
+
 /* --- Runs ------------------------------------------------------------------------------------ */
 
 /* A request to end runs. */
@@ -140,8 +177,9 @@ typedef struct assay_host_stop assay_host_stop;
 ASSAY_HOST_API assay_host_stop* assay_host_stop_new(void);
 ASSAY_HOST_API void assay_host_stop_free(assay_host_stop* stop);
 
-/* Ends the runs that got this stop, with the verdict interrupted, and all that get it later. Can't
- * be withdrawn. Any thread may call, but no signal handler. Error: null pointer. */
+/* Ends the runs and advices that got this stop, and all that get it later: a run with the verdict
+ * interrupted, an advice without blame for a driver. Can't be withdrawn. Any thread may call, but
+ * no signal handler. Error: null pointer. */
 ASSAY_HOST_API assay_host_error assay_host_stop_raise(assay_host_stop* stop);
 
 /* What a run has brought. */
@@ -320,6 +358,128 @@ ASSAY_HOST_API double assay_host_answer_list_item(const assay_host_answer* answe
 /* Returns the JSON document of the run, as assay-host run --format json writes it (schema 2). It is
  * made at the first call. Null if memory runs out. */
 ASSAY_HOST_API const char* assay_host_result_document(const assay_host_result* result,
+                                                      size_t* size);
+
+/* --- Advice ---------------------------------------------------------------------------------- */
+
+/* What to do, from memory or from one attempt. docs/advise.md has the rules. */
+typedef struct assay_host_advice assay_host_advice;
+
+/* Answers what can be used, and sets `*advice`, which the caller frees with
+ * assay_host_advice_free. The answer comes from the folder without a child, unless an attempt is
+ * due: then the child runs as in assay_host_run, and its result is kept. While another process or
+ * thread makes an attempt with the same folder, the call waits for its answer.
+ *
+ * `folder` is the path of the folder with the state. It is created if it is missing, but not its
+ * parents. Several programs and threads may share it. If it can't be used, that is no error: each
+ * call makes an attempt, at most one, and the advice has a message.
+ *
+ * What is known holds for one set of adapters, drivers, system and assay. The arguments of the
+ * options are passed to the child, but don't count among these. No driver is loaded to collect
+ * them. The environment of this process is read, so that no other thread may change it meanwhile.
+ *
+ * Before the child starts, the attempt is on the disk with this process as its host. If the process
+ * ends during it, that is weak evidence; if the system ends, it counts as a freeze. A host that is
+ * asked to end should raise the stop, and wait for the return: then nobody is blamed.
+ *
+ * Null options: the defaults. Null stop: none. On an error `*advice` is null. Errors: null pointer;
+ * bad text for an empty path; no memory; internal. */
+ASSAY_HOST_API assay_host_error assay_host_advise(const assay_host_options* options,
+                                                  const char* folder, assay_host_stop* stop,
+                                                  assay_host_advice** advice);
+ASSAY_HOST_API void assay_host_advice_free(assay_host_advice* advice);
+
+/* Returns what can be used: the user's choice, or what was learnt. */
+ASSAY_HOST_API assay_host_usability assay_host_advice_usable(const assay_host_advice* advice,
+                                                             assay_host_interface which);
+
+/* Return a stable identifier of the reason, and one sentence for the user, safe to write to a
+ * terminal. docs/advise.md has the reasons. */
+ASSAY_HOST_API const char* assay_host_advice_reason(const assay_host_advice* advice,
+                                                    assay_host_interface which);
+ASSAY_HOST_API const char* assay_host_advice_text(const assay_host_advice* advice,
+                                                  assay_host_interface which);
+
+/* Returns what the answer is from: "attempt" of this call, "memory", "choice" of the user, or
+ * "none". Empty for null. */
+ASSAY_HOST_API const char* assay_host_advice_source(const assay_host_advice* advice,
+                                                    assay_host_interface which);
+
+/* Returns the answer without the user's choice. */
+ASSAY_HOST_API assay_host_usability assay_host_advice_learnt(const assay_host_advice* advice,
+                                                             assay_host_interface which);
+
+/* Return the tag, the name and the driver of the device that decided; empty if they aren't
+ * known. */
+ASSAY_HOST_API const char* assay_host_advice_device(const assay_host_advice* advice,
+                                                    assay_host_interface which);
+ASSAY_HOST_API const char* assay_host_advice_device_name(const assay_host_advice* advice,
+                                                         assay_host_interface which, size_t* size);
+ASSAY_HOST_API const char* assay_host_advice_device_driver(const assay_host_advice* advice,
+                                                           assay_host_interface which,
+                                                           size_t* size);
+
+/* Return how the attempt ended: "ended", "crashed", "hung", "killed", "not-started",
+ * "host-stopped", "host-ended" or "system-ended"; a sentence about it; and, if it didn't bring a
+ * usable device, the last line of the child's log or report. Empty if there is none. */
+ASSAY_HOST_API const char* assay_host_advice_end(const assay_host_advice* advice,
+                                                 assay_host_interface which);
+ASSAY_HOST_API const char* assay_host_advice_end_text(const assay_host_advice* advice,
+                                                      assay_host_interface which);
+ASSAY_HOST_API const char* assay_host_advice_last_line(const assay_host_advice* advice,
+                                                       assay_host_interface which, size_t* size);
+
+/* Returns 1 and sets `*seconds` to the age of the answer: that of the attempt or of the choice.
+ * Otherwise returns 0. */
+ASSAY_HOST_API int assay_host_advice_age(const assay_host_advice* advice,
+                                         assay_host_interface which, double* seconds);
+
+/* Returns the failures that count, since the last success. */
+ASSAY_HOST_API uint64_t assay_host_advice_failures(const assay_host_advice* advice,
+                                                   assay_host_interface which);
+
+/* Returns 1 and sets `*seconds` to the time from this advice to the next attempt, if that is later
+ * than the next call; otherwise returns 0. */
+ASSAY_HOST_API int assay_host_advice_next_attempt(const assay_host_advice* advice,
+                                                  assay_host_interface which, double* seconds);
+
+/* Return one sentence on what would change the answer, and one that warns of an answer that may
+ * not last; the latter may be empty. */
+ASSAY_HOST_API const char* assay_host_advice_change(const assay_host_advice* advice,
+                                                    assay_host_interface which);
+ASSAY_HOST_API const char* assay_host_advice_warning(const assay_host_advice* advice,
+                                                     assay_host_interface which);
+
+typedef enum assay_host_plan {
+    ASSAY_HOST_ANSWER = 0, /* memory has the answer */
+    ASSAY_HOST_TRY = 1,    /* an attempt was due, or with a dry run is */
+    ASSAY_HOST_WAIT = 2    /* another process or thread makes one */
+} assay_host_plan;
+
+ASSAY_HOST_API assay_host_plan assay_host_advice_plan(const assay_host_advice* advice);
+
+/* Returns "answer", "try" or "wait"; "unknown" for other numbers. */
+ASSAY_HOST_API const char* assay_host_plan_name(assay_host_plan plan);
+
+/* Returns why an attempt was due, such as "first"; "not-due" if none was. docs/advise.md has the
+ * identifiers. Empty for null. */
+ASSAY_HOST_API const char* assay_host_advice_due(const assay_host_advice* advice);
+
+/* Return 1 if this call made an attempt, and 1 if a stop or a callback ended the call. */
+ASSAY_HOST_API int assay_host_advice_tried(const assay_host_advice* advice);
+ASSAY_HOST_API int assay_host_advice_stopped(const assay_host_advice* advice);
+
+/* Return the name of the set of adapters, drivers, system and assay, and the number of all attempts
+ * with it. */
+ASSAY_HOST_API const char* assay_host_advice_identity(const assay_host_advice* advice);
+ASSAY_HOST_API uint64_t assay_host_advice_attempts(const assay_host_advice* advice);
+
+/* Return the problems with the folder, each a sentence. Empty beyond the count. */
+ASSAY_HOST_API size_t assay_host_advice_message_count(const assay_host_advice* advice);
+ASSAY_HOST_API const char* assay_host_advice_message(const assay_host_advice* advice, size_t index);
+
+/* Returns the JSON document, as assay-host advise --format json writes it (schema 1). */
+ASSAY_HOST_API const char* assay_host_advice_document(const assay_host_advice* advice,
                                                       size_t* size);
 
 #ifdef __cplusplus

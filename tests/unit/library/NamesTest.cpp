@@ -1,4 +1,4 @@
-// The names of errors, verdicts and usabilities.
+// The names of errors, verdicts, usabilities and plans.
 #include <gtest/gtest.h>
 
 #include <iterator>
@@ -19,6 +19,7 @@ TEST(LibraryNames, OfErrors)
     ExpectNames(assay_host_error_text,
                 {"no error", "out of memory", "a pointer is null", "a value is out of its range",
                  "a text is empty", "the system refused a thread or another resource",
+                 "the state can't be changed", "another process or thread makes an attempt",
                  "unknown error", "unknown error"});
 }
 
@@ -31,6 +32,11 @@ TEST(LibraryNames, OfVerdicts)
 TEST(LibraryNames, OfUsabilities)
 {
     ExpectNames(assay_host_usability_name, {"hardware", "software", "broken", "absent", "unknown"});
+}
+
+TEST(LibraryNames, OfPlans)
+{
+    ExpectNames(assay_host_plan_name, {"answer", "try", "wait", "unknown"});
 }
 
 } // namespace

@@ -23,6 +23,13 @@ inline Words operator+(Words left, const Words& right)
     return left;
 }
 
+// Returns any number as one of an enumeration, as a program in C or of a later version has it.
+template <typename Enumeration>
+Enumeration MakeNumber(int number)
+{
+    return static_cast<Enumeration>(number);
+}
+
 class Options {
 public:
     using TakeLine = std::function<int(const std::string& line)>;
