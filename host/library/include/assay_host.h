@@ -482,6 +482,48 @@ ASSAY_HOST_API const char* assay_host_advice_message(const assay_host_advice* ad
 ASSAY_HOST_API const char* assay_host_advice_document(const assay_host_advice* advice,
                                                       size_t* size);
 
+/* --- The state ------------------------------------------------------------------------------- */
+
+/* The folder with the state: what is remembered, and the user's choice. For one thread at a time;
+ * several objects, of several threads and programs, may have one folder. */
+typedef struct assay_host_state assay_host_state;
+
+/* Sets `*state`, which the caller frees with assay_host_state_free. Doesn't open the folder yet.
+ * Errors: null pointer; bad text for an empty path; no memory. Then `*state` is null. */
+ASSAY_HOST_API assay_host_error assay_host_state_new(const char* folder, assay_host_state** state);
+ASSAY_HOST_API void assay_host_state_free(assay_host_state* state);
+
+/* Returns a sentence on what failed in the last call with this object, or on a file that it
+ * ignored; empty if nothing did. Lives until the next call with it. */
+ASSAY_HOST_API const char* assay_host_state_message(const assay_host_state* state);
+
+/* What the user decided. It holds for every identity, and there is no attempt for an interface that
+ * is chosen. */
+typedef enum assay_host_choice {
+    ASSAY_HOST_CHOICE_AUTO = 0, /* nothing: what is learnt holds */
+    ASSAY_HOST_CHOICE_HARDWARE = 1,
+    ASSAY_HOST_CHOICE_SOFTWARE = 2,
+    ASSAY_HOST_CHOICE_ABSENT = 3
+} assay_host_choice;
+
+/* Reads the choice, which is auto if the folder is missing or its file is ignored. Errors: null
+ * pointer; bad value for the interface; no memory. Then it is auto. */
+ASSAY_HOST_API assay_host_error assay_host_state_get_choice(assay_host_state* state,
+                                                            assay_host_interface which,
+                                                            assay_host_choice* choice);
+
+/* Writes the choice; creates the folder if it is missing. Of two calls at a time the last one
+ * holds, for both interfaces. Errors: null pointer; bad value for the interface or the choice; not
+ * changed, with a message; no memory. */
+ASSAY_HOST_API assay_host_error assay_host_state_set_choice(assay_host_state* state,
+                                                            assay_host_interface which,
+                                                            assay_host_choice choice);
+
+/* Removes all that is remembered, and the choice, so that the next advice makes an attempt. Errors:
+ * null pointer; busy while another process or thread makes an attempt; not changed, with a message;
+ * no memory. */
+ASSAY_HOST_API assay_host_error assay_host_state_forget(assay_host_state* state);
+
 #ifdef __cplusplus
 }
 #endif
