@@ -100,7 +100,8 @@ std::string Files::ReadLink(const std::string& path) const
 std::string Files::Resolve(const std::string& path) const
 {
     int links = 0;
-    return Resolve(path, links);
+    struct stat status {};
+    return Resolve(path, links, status);
 }
 
 std::string Files::ResolveFolder(const std::string& path, int& links) const
@@ -108,11 +109,12 @@ std::string Files::ResolveFolder(const std::string& path, int& links) const
     const auto known = fFolders.find(path);
     if (known != fFolders.end())
         return known->second;
-    return fFolders[path] = Resolve(path, links);
+    struct stat status {};
+    return fFolders[path] = Resolve(path, links, status);
 }
 
 // Returns an empty path after too many links.
-std::string Files::Resolve(const std::string& path, int& links) const
+std::string Files::Resolve(const std::string& path, int& links, struct stat& status) const
 {
     if (path.size() > kMaxPath)
         return {};
@@ -129,7 +131,6 @@ std::string Files::Resolve(const std::string& path, int& links) const
     if (name == "..")
         return folder.substr(0, std::max<std::size_t>(folder.rfind('/'), 1));
     std::string resolved = (folder == "/" ? "" : folder) + "/" + name;
-    struct stat status {};
     if (::lstat(GetRealPath(resolved).c_str(), &status) != 0)
         return {};
     if (!S_ISLNK(status.st_mode))
@@ -137,7 +138,7 @@ std::string Files::Resolve(const std::string& path, int& links) const
     const std::string target = ReadSystemLink(GetRealPath(resolved));
     if (target.empty() || ++links > kMaxLinks)
         return {};
-    return Resolve(target.front() == '/' ? target : folder + "/" + target, links);
+    return Resolve(target.front() == '/' ? target : folder + "/" + target, links, status);
 }
 
 std::optional<FileStatus> Files::Find(const std::string& path) const
@@ -145,10 +146,10 @@ std::optional<FileStatus> Files::Find(const std::string& path) const
     if (path.empty() || path.front() != '/')
         return std::nullopt;
     FileStatus found;
-    found.fPath = Resolve(path);
+    int links = 0;
     struct stat status {};
-    if (found.fPath.empty() || ::stat(GetRealPath(found.fPath).c_str(), &status) != 0 ||
-        !IsRegular(status))
+    found.fPath = Resolve(path, links, status);
+    if (found.fPath.empty() || !IsRegular(status))
         return std::nullopt;
     constexpr std::int64_t kNanoseconds = 1000000000;
     found.fSize = static_cast<std::uint64_t>(status.st_size);

@@ -9,6 +9,8 @@
 #include <utility>
 #include <vector>
 
+struct stat;
+
 namespace assay_host {
 
 // What the file system has of a regular file.
@@ -54,7 +56,8 @@ public:
 private:
     static constexpr std::size_t kMaxSize = std::size_t{1} << 20;
 
-    std::string Resolve(const std::string& path, int& links) const;
+    // Sets `status` if the path is a file's.
+    std::string Resolve(const std::string& path, int& links, struct stat& status) const;
     std::string ResolveFolder(const std::string& path, int& links) const;
 
     std::string fRoot;

@@ -37,17 +37,25 @@ LibrarySearch::LibrarySearch(const Files& files, const Process& process)
         fLastFolders.insert(fLastFolders.end(), {folder + "/" + kMachine, folder + "64", folder});
 }
 
+const std::vector<std::string>& LibrarySearch::ListVariants(const std::string& folder) const
+{
+    const auto [known, isNew] = fVariants.try_emplace(folder);
+    if (isNew) {
+        const std::string variants = folder + "/glibc-hwcaps";
+        for (const std::string& variant : fFiles.List(variants))
+            known->second.push_back(variants + "/" + variant);
+    }
+    return known->second;
+}
+
 void LibrarySearch::AddFolder(const std::string& folder, const std::string& name,
                               std::vector<FileStatus>& found) const
 {
-    const std::string variants = folder + "/glibc-hwcaps";
-    std::vector<std::string> paths;
-    for (const std::string& variant : fFiles.List(variants))
-        paths.push_back(variants + "/" + variant + "/" + name);
-    paths.push_back(folder + "/" + name);
-    for (const std::string& path : paths)
-        if (const auto status = fFiles.Find(path))
+    for (const std::string& place : ListVariants(folder))
+        if (const auto status = fFiles.Find(place + "/" + name))
             found.push_back(*status);
+    if (const auto status = fFiles.Find(folder + "/" + name))
+        found.push_back(*status);
 }
 
 std::vector<FileStatus> LibrarySearch::FindIn(const std::vector<std::string>& folders,
@@ -61,14 +69,23 @@ std::vector<FileStatus> LibrarySearch::FindIn(const std::vector<std::string>& fo
 
 std::vector<FileStatus> LibrarySearch::Find(const std::string& name, const ElfFile& from) const
 {
-    std::vector<FileStatus> found;
     if (name.empty())
-        return found;
+        return {};
     if (name.find('/') != std::string::npos) {
-        if (const auto status = fFiles.Find(fProcess.MakeAbsolute(name)))
-            found.push_back(*status);
-        return found;
+        const auto status = fFiles.Find(fProcess.MakeAbsolute(name));
+        return status ? std::vector<FileStatus>{*status} : std::vector<FileStatus>();
     }
+    if (!from.fRunPath.empty())
+        return FindName(name, from);
+    const auto [known, isNew] = fKnown.try_emplace(name);
+    if (isNew)
+        known->second = FindName(name, {});
+    return known->second;
+}
+
+std::vector<FileStatus> LibrarySearch::FindName(const std::string& name, const ElfFile& from) const
+{
+    std::vector<FileStatus> found;
     if (from.fIsRunPathFirst)
         found = FindIn(from.fRunPath, name);
     if (found.empty())

@@ -1,6 +1,7 @@
 // Finds libraries as the dynamic loader does, without loading them.
 #pragma once
 
+#include <map>
 #include <string>
 #include <vector>
 
@@ -11,7 +12,7 @@
 
 namespace assay_host {
 
-// Throws only std::bad_alloc. Any thread may call.
+// What it has found it keeps. Throws only std::bad_alloc. One thread at a time.
 class LibrarySearch {
 public:
     // Both must outlive the search.
@@ -23,6 +24,8 @@ public:
     std::vector<FileStatus> Find(const std::string& name, const ElfFile& from) const;
 
 private:
+    std::vector<FileStatus> FindName(const std::string& name, const ElfFile& from) const;
+    const std::vector<std::string>& ListVariants(const std::string& folder) const;
     void AddFolder(const std::string& folder, const std::string& name,
                    std::vector<FileStatus>& found) const;
     std::vector<FileStatus> FindIn(const std::vector<std::string>& folders,
@@ -33,6 +36,10 @@ private:
     LibraryCache fCache;
     std::vector<std::string> fFirstFolders; // of LD_LIBRARY_PATH
     std::vector<std::string> fLastFolders;  // without a cache
+    // The folders for newer processors in a folder, and the files of a name that no library's own
+    // folders are searched for.
+    mutable std::map<std::string, std::vector<std::string>> fVariants;
+    mutable std::map<std::string, std::vector<FileStatus>> fKnown;
 };
 
 } // namespace assay_host
