@@ -69,7 +69,9 @@ constexpr const char* kVersion = "assay-host " ASSAY_VERSION;
 
 class Parser {
 public:
-    Parser()
+    // Only the commands that a word names get their options, since all of them would take longer
+    // than an answer from memory.
+    explicit Parser(const std::vector<std::string>& words) : fWords(Split(words))
     {
         fApp.name("assay-host");
         fApp.formatter(fFormatter);
@@ -86,26 +88,26 @@ public:
             fFormatter->AddUsage(help.fName, help.fUsage);
             command->footer(help.fFooter);
             command->set_version_flag("--version", kVersion)->group(""); // not in its help
-            options->Add(*command);
+            if (std::find(fWords.fOwn.begin(), fWords.fOwn.end(), help.fName) != fWords.fOwn.end())
+                options->Add(*command);
             names += names.empty() ? help.fName : std::string("|") + help.fName;
             fCommands.push_back({command, std::move(options)});
         }
         fFormatter->AddUsage("assay-host", names + " [option...]");
     }
 
-    Parsed Parse(const std::vector<std::string>& words)
+    Parsed Parse()
     {
-        const Words split = Split(words);
         try {
-            std::vector<std::string> own(split.fOwn.rbegin(), split.fOwn.rend());
+            std::vector<std::string> own(fWords.fOwn.rbegin(), fWords.fOwn.rend());
             fApp.parse(own);
-            return {Choose(split), 0, {}};
+            return {Choose(), 0, {}};
         } catch (const CLI::ParseError& error) {
             std::ostringstream out;
             std::ostringstream err;
             if (fApp.exit(error, out, err) == 0)
                 return {std::nullopt, 0, out.str()};
-            const bool isDiff = !words.empty() && words.front() == "diff";
+            const bool isDiff = !fWords.fOwn.empty() && fWords.fOwn.front() == "diff";
             return {std::nullopt, isDiff ? kDiffErrorStatus : kErrorStatus, GetText(error)};
         }
     }
@@ -122,15 +124,16 @@ private:
                            ShowBytes(error.what()));
     }
 
-    CommandChoice Choose(const Words& words) const
+    CommandChoice Choose() const
     {
         const auto command = std::find_if(fCommands.begin(), fCommands.end(),
                                           [](const Command& each) { return each.fApp->parsed(); });
-        if (words.fHasChild && !command->fOptions->TakesChildWords())
+        if (fWords.fHasChild && !command->fOptions->TakesChildWords())
             throw CLI::ExtrasError({kChildWord});
-        return command->fOptions->Choose(*command->fApp, words.fChild);
+        return command->fOptions->Choose(*command->fApp, fWords.fChild);
     }
 
+    const Words fWords;
     CLI::App fApp{"Runs assay as a child process, survives its failures, and shows its report."};
     const std::shared_ptr<HelpFormatter> fFormatter = std::make_shared<HelpFormatter>();
     std::vector<Command> fCommands;
@@ -140,7 +143,7 @@ private:
 
 Parsed ParseCommandLine(const std::vector<std::string>& words)
 {
-    return Parser().Parse(words);
+    return Parser(words).Parse();
 }
 
 } // namespace assay_host
