@@ -16,10 +16,19 @@ bool IsByteCharacter(char32_t code)
     return code >= kByteBase + 0x80 && code <= kByteBase + 0xFF;
 }
 
+// Most texts are plain ASCII, which is the same in both forms.
+bool IsPlain(const std::string& bytes)
+{
+    return std::all_of(bytes.begin(), bytes.end(),
+                       [](char byte) { return static_cast<unsigned char>(byte) < 0x80; });
+}
+
 } // namespace
 
 std::string EncodeBytes(const std::string& bytes)
 {
+    if (IsPlain(bytes))
+        return bytes;
     std::string text;
     text.reserve(bytes.size());
     std::string_view rest = bytes;
@@ -38,6 +47,8 @@ std::string EncodeBytes(const std::string& bytes)
 
 std::string DecodeBytes(const std::string& text)
 {
+    if (IsPlain(text))
+        return text;
     std::string bytes;
     bytes.reserve(text.size());
     std::string_view rest = text;
