@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -116,14 +117,16 @@ void CloseAttempt(Attempt& attempt, const Report& report, const RunOutcome& outc
 OpenState SettleOpen(std::vector<Attempt>& attempts, Machine& machine)
 {
     OpenState state = OpenState::kNone;
-    const HostMark self = machine.GetSelf();
+    std::optional<HostMark> self; // most calls find no open attempt, and don't need it
     for (Attempt& attempt : attempts) {
         if (attempt.fEnd != AttemptEnd::kOpen)
             continue;
+        if (!self)
+            self = machine.GetSelf();
         const HostMark& host = attempt.fHost;
-        const bool isHere = host.fMachine == self.fMachine;
-        const bool isKnown = isHere && !host.fBoot.empty() && !self.fBoot.empty();
-        const bool isSameBoot = isKnown && machine.IsSameBoot(host.fBoot, self.fBoot);
+        const bool isHere = host.fMachine == self->fMachine;
+        const bool isKnown = isHere && !host.fBoot.empty() && !self->fBoot.empty();
+        const bool isSameBoot = isKnown && machine.IsSameBoot(host.fBoot, self->fBoot);
         if (isSameBoot && machine.IsAlive(host))
             return OpenState::kAlive;
         const bool isFreeze = isKnown && !isSameBoot;

@@ -1,5 +1,6 @@
 #include "memory/Folder.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <dirent.h>
 #include <fcntl.h>
@@ -87,9 +88,13 @@ public:
             return {FileState::kRefused, {}, GetReason(errno)};
         if (std::string reason = CheckFile(found); !reason.empty())
             return {FileState::kRefused, {}, std::move(reason)};
-        std::string text(maxBytes + 1, '\0');
+        // One byte more than the file has shows its end with one read. A file that grows needs
+        // more.
+        std::string text(std::min(static_cast<std::size_t>(found.st_size), maxBytes) + 1, '\0');
         std::size_t size = 0;
-        while (size < text.size()) {
+        while (size <= maxBytes) {
+            if (size == text.size())
+                text.resize(maxBytes + 1);
             const ::ssize_t got = ::read(file.Get(), &text[size], text.size() - size);
             if (got < 0 && errno != EINTR)
                 return {FileState::kRefused, {}, GetReason(errno)};
