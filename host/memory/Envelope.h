@@ -1,7 +1,9 @@
 // The outer form of a file of the state: a format version and a checksum around the content.
 //
-// A later version may change the content but not this form, so that every version can tell a newer
-// file from a damaged one.
+// A file is a JSON object, one member on a line: "format", "checksum", "content". The checksum is
+// the digest of the format's number, a line end, and all bytes after the checksum's line. A later
+// version may change the content but not this form, so that every version can tell a newer file
+// from a damaged one.
 #pragma once
 
 #include <cstddef>

@@ -1,6 +1,11 @@
 #include "memory/KnowledgeJson.h"
 
+#include <charconv>
 #include <stdexcept>
+#include <string_view>
+#include <system_error>
+
+#include <fmt/format.h>
 
 #include "memory/Machine.h"
 #include "report/JsonBytes.h"
@@ -20,14 +25,20 @@ Json MakeLarge(std::uint64_t number)
     return std::to_string(number);
 }
 
-std::uint64_t ReadLarge(const Json& json)
+template <typename T>
+T ReadNumber(std::string_view word)
 {
-    const auto& text = json.get_ref<const std::string&>();
-    std::size_t end = 0;
-    const std::uint64_t number = std::stoull(text, &end);
-    if (end != text.size())
+    T number = 0;
+    const char* const end = word.data() + word.size();
+    const auto result = std::from_chars(word.data(), end, number);
+    if (result.ec != std::errc() || result.ptr != end)
         throw std::runtime_error("not a number");
     return number;
+}
+
+std::uint64_t ReadLarge(const Json& json)
+{
+    return ReadNumber<std::uint64_t>(json.get_ref<const std::string&>());
 }
 
 std::string ReadText(const Json& json)
@@ -72,25 +83,41 @@ AdapterIdentity ReadAdapter(const Json& json)
     return adapter;
 }
 
+// One text: interface, size, time, build id or "-", path. A machine has a hundred of them, and an
+// object for each would cost more than all else of an answer.
 Json MakeFile(const DriverFile& file)
 {
-    return {{"interface", GetKindName(file.fInterface)},
-            {"path", EncodeBytes(file.fPath)},
-            {"size", MakeLarge(file.fSize)},
-            {"time", std::to_string(file.fTime)},
-            {"buildId", EncodeBytes(file.fBuildId)}};
+    return fmt::format("{} {} {} {} {}", GetKindName(file.fInterface), file.fSize, file.fTime,
+                       file.fBuildId.empty() ? "-" : EncodeBytes(file.fBuildId),
+                       EncodeBytes(file.fPath));
+}
+
+// Removes the first word of a text and the blank after it, and returns the word.
+std::string_view TakeWord(std::string_view& text)
+{
+    const std::size_t end = text.find(' ');
+    if (end == std::string_view::npos)
+        throw std::runtime_error("too few words");
+    const std::string_view word = text.substr(0, end);
+    text.remove_prefix(end + 1);
+    return word;
 }
 
 DriverFile ReadFile(const Json& json)
 {
+    std::string_view rest = json.get_ref<const std::string&>();
     DriverFile file;
-    file.fInterface = json.at("interface") == GetKindName(DeviceKind::kOpenGL)
-                          ? DeviceKind::kOpenGL
-                          : DeviceKind::kOpenCL;
-    file.fPath = ReadText(json.at("path"));
-    file.fSize = ReadLarge(json.at("size"));
-    file.fTime = std::stoll(json.at("time").get_ref<const std::string&>());
-    file.fBuildId = ReadText(json.at("buildId"));
+    const std::string_view interface = TakeWord(rest);
+    if (interface == GetKindName(DeviceKind::kOpenCL))
+        file.fInterface = DeviceKind::kOpenCL;
+    else if (interface != GetKindName(DeviceKind::kOpenGL))
+        throw std::runtime_error("an unknown interface");
+    file.fSize = ReadNumber<std::uint64_t>(TakeWord(rest));
+    file.fTime = ReadNumber<std::int64_t>(TakeWord(rest));
+    const std::string_view buildId = TakeWord(rest);
+    if (buildId != "-")
+        file.fBuildId = DecodeBytes(std::string(buildId));
+    file.fPath = DecodeBytes(std::string(rest));
     return file;
 }
 
@@ -210,17 +237,33 @@ Json MakeKnowledgeJson(const Knowledge& knowledge)
 
 Knowledge ReadKnowledgeJson(const Json& content)
 {
-    Knowledge knowledge;
+    Knowledge knowledge = ReadAttemptsJson(content);
     knowledge.fIdentity = ReadIdentity(content.at("identity"));
+    return knowledge;
+}
+
+Knowledge ReadAttemptsJson(const Json& content)
+{
+    Knowledge knowledge;
     knowledge.fCount = ReadLarge(content.at("count"));
     for (const Json& attempt : content.at("attempts"))
         knowledge.fAttempts.push_back(ReadAttempt(attempt));
     return knowledge;
 }
 
-std::string GetIdentityName(const Identity& identity)
+std::string GetIdentityName(const Json& identity)
 {
-    return MakeDigest(MakeIdentityJson(identity).dump());
+    // The files make up most of it. To dump them takes longer than to join them.
+    std::string text = identity.at("adapters").dump();
+    const auto add = [&text](const Json& json) {
+        const auto& part = json.get_ref<const std::string&>();
+        text += fmt::format("\n{} ", part.size()) + part;
+    };
+    add(identity.at("system"));
+    add(identity.at("assay"));
+    for (const Json& file : identity.at("files"))
+        add(file);
+    return MakeDigest(text);
 }
 
 } // namespace assay_host

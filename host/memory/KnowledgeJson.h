@@ -22,7 +22,11 @@ Usability ReadUsability(const std::string& name);
 // Reads the content. Throws std::exception if a member is missing or has a wrong type or value.
 Knowledge ReadKnowledgeJson(const nlohmann::ordered_json& content);
 
-// Returns the name of the identity's state file without its ending.
-std::string GetIdentityName(const Identity& identity);
+// Reads all but the identity, which is left empty. Throws as ReadKnowledgeJson.
+Knowledge ReadAttemptsJson(const nlohmann::ordered_json& content);
+
+// Returns the name of the identity's state file without its ending. `identity` is of
+// MakeIdentityJson.
+std::string GetIdentityName(const nlohmann::ordered_json& identity);
 
 } // namespace assay_host

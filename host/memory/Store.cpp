@@ -77,13 +77,19 @@ std::optional<nlohmann::ordered_json> Store::Read(const std::string& name, std::
     return std::nullopt;
 }
 
+const Store::Named& Store::Name(const Identity& identity)
+{
+    if (!fNamed || fNamed->fIdentity != identity) {
+        nlohmann::ordered_json json = MakeIdentityJson(identity);
+        std::string name = GetIdentityName(json);
+        fNamed = Named{identity, std::move(json), std::move(name)};
+    }
+    return *fNamed;
+}
+
 const std::string& Store::GetName(const Identity& identity)
 {
-    if (!fNamed || *fNamed != identity) {
-        fName = GetIdentityName(identity);
-        fNamed = identity;
-    }
-    return fName;
+    return Name(identity).fName;
 }
 
 std::string Store::GetFileName(const Identity& identity)
@@ -94,22 +100,22 @@ std::string Store::GetFileName(const Identity& identity)
 Knowledge Store::Load(const Identity& identity)
 {
     const std::string name = GetFileName(identity);
-    Knowledge nothing;
-    nothing.fIdentity = identity;
+    Knowledge knowledge;
     std::string problem;
     if (const auto content = Read(name, problem)) {
         try {
-            Knowledge knowledge = ReadKnowledgeJson(*content);
-            if (knowledge.fIdentity == identity)
-                return knowledge;
-            problem = "it is of another identity";
+            if (content->at("identity") == Name(identity).fJson)
+                knowledge = ReadAttemptsJson(*content);
+            else
+                problem = "it is of another identity";
         } catch (const std::exception&) {
             problem = "it is damaged";
         }
     }
     if (!problem.empty())
         AddMessage(fmt::format("The state file {} is ignored: {}.", name, ShowBytes(problem)));
-    return nothing;
+    knowledge.fIdentity = identity;
+    return knowledge;
 }
 
 bool Store::Save(const Knowledge& knowledge, std::int64_t now)

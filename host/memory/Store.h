@@ -29,7 +29,7 @@ class Store {
 public:
     explicit Store(Folder& folder) : fFolder(folder) {}
 
-    // Returns GetIdentityName(). Keeps the last one, which costs more than all else of an answer.
+    // Returns GetIdentityName().
     const std::string& GetName(const Identity& identity);
 
     // Returns what is known of the identity; nothing but the identity if there is no file.
@@ -65,12 +65,19 @@ private:
     std::optional<nlohmann::ordered_json> Read(const std::string& name, std::string& problem);
     void RemoveOldest(const std::string& kept, std::int64_t now);
 
+    // An identity in its other forms, which take longer to make than all else of an answer.
+    struct Named {
+        Identity fIdentity;
+        nlohmann::ordered_json fJson;
+        std::string fName;
+    };
+
+    const Named& Name(const Identity& identity);
     std::string GetFileName(const Identity& identity);
 
     Folder& fFolder;
     std::vector<std::string> fMessages;
-    std::optional<Identity> fNamed; // the identity of fName
-    std::string fName;
+    std::optional<Named> fNamed; // the last one
 };
 
 } // namespace assay_host

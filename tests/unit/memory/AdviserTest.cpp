@@ -96,7 +96,7 @@ TEST_F(AdviserTest, TriesOnceAndRemembers)
     EXPECT_EQ(Show(Advise()), "try, tried: hardware software");
     const Advice second = Advise();
     EXPECT_EQ(Show(second), "answer: hardware software");
-    EXPECT_EQ(second.fName, GetIdentityName(fIdentity));
+    EXPECT_EQ(second.fName, GetIdentityName(MakeIdentityJson(fIdentity)));
     EXPECT_EQ(second.fCount, 1u);
     EXPECT_EQ(second.fOpenGL.fOutlook.fTime, kNow);
     EXPECT_THAT(second.fMessages, IsEmpty());

@@ -2,21 +2,14 @@
 
 #include <gtest/gtest.h>
 
+#include "Samples.h"
+
 namespace assay_host {
 namespace {
 
 using Json = nlohmann::ordered_json;
 
 const Json kContent = {{"text", "value"}, {"list", {1, -2, 3}}, {"nothing", nullptr}};
-
-// As a later version would write it.
-std::string SealAs(int format, const Json& content)
-{
-    Json file = Json::parse(Seal(content));
-    file["format"] = format;
-    file["checksum"] = MakeDigest(std::to_string(format) + "\n" + content.dump());
-    return file.dump(2);
-}
 
 TEST(EnvelopeTest, ReadsWhatItWrote)
 {
@@ -30,37 +23,29 @@ TEST(EnvelopeTest, ReadsWhatItWrote)
 
 TEST(EnvelopeTest, TellsANewerFileFromADamagedOne)
 {
-    EXPECT_EQ(Unseal(SealAs(kStateFormat, kContent)).fSoundness, Soundness::kSound);
+    EXPECT_EQ(SealAs(kStateFormat, kContent), Seal(kContent));
     EXPECT_EQ(Unseal(SealAs(kStateFormat + 1, {{"other", 1}})).fSoundness, Soundness::kNewer);
     EXPECT_EQ(Unseal(SealAs(kStateFormat - 1, kContent)).fSoundness, Soundness::kDamaged);
-    Json changed = Json::parse(Seal(kContent));
-    changed["format"] = kStateFormat + 1;
-    EXPECT_EQ(Unseal(changed.dump()).fSoundness, Soundness::kDamaged);
+    std::string changed = Seal(kContent);
+    changed[changed.find(std::to_string(kStateFormat))] = '9';
+    EXPECT_EQ(Unseal(changed).fSoundness, Soundness::kDamaged);
 }
 
 TEST(EnvelopeTest, NoCutFileIsSound)
 {
     const std::string text = Seal(kContent);
-    for (std::size_t size = 0; size + 1 < text.size(); ++size)
+    for (std::size_t size = 0; size < text.size(); ++size)
         EXPECT_EQ(Unseal(text.substr(0, size)).fSoundness, Soundness::kDamaged) << size;
 }
 
-// A changed blank between two members leaves the content as it was.
-TEST(EnvelopeTest, AChangedBitLeavesTheContentOrDamagesTheFile)
+TEST(EnvelopeTest, NoFileWithAChangedBitIsSound)
 {
     const std::string text = Seal(kContent);
-    std::size_t damaged = 0;
     for (std::size_t bit = 0; bit < 8 * text.size(); ++bit) {
         std::string changed = text;
         changed[bit / 8] = static_cast<char>(changed[bit / 8] ^ (1 << bit % 8));
-        const Opened opened = Unseal(changed);
-        if (opened.fSoundness == Soundness::kSound)
-            EXPECT_EQ(opened.fContent, kContent) << bit;
-        else
-            EXPECT_EQ(opened.fSoundness, Soundness::kDamaged) << bit;
-        damaged += opened.fSoundness == Soundness::kDamaged ? 1 : 0;
+        EXPECT_EQ(Unseal(changed).fSoundness, Soundness::kDamaged) << bit;
     }
-    EXPECT_GT(damaged, 7 * text.size());
 }
 
 TEST(EnvelopeTest, RefusesWhatIsNoFile)
@@ -71,10 +56,19 @@ TEST(EnvelopeTest, RefusesWhatIsNoFile)
           "{\"format\": 99999999999999999999, \"checksum\": \"\", \"content\": {}}"})
         EXPECT_EQ(Unseal(text).fSoundness, Soundness::kDamaged) << text;
     EXPECT_EQ(Unseal(std::string(kMaxStateBytes, '[')).fSoundness, Soundness::kDamaged);
-    std::string deep;
-    for (std::size_t level = 0; level < kMaxStateBytes / 8; ++level)
-        deep += "{\"a\":[";
-    EXPECT_EQ(Unseal(deep).fSoundness, Soundness::kDamaged);
+}
+
+TEST(EnvelopeTest, RefusesWhatIsDeeperThanAnyContent)
+{
+    const auto nest = [](int levels) {
+        Json content = 1;
+        for (int level = 0; level < levels; ++level)
+            content = Json::array({content});
+        return Unseal(Seal(content)).fSoundness;
+    };
+    EXPECT_EQ(nest(14), Soundness::kSound);
+    EXPECT_EQ(nest(17), Soundness::kDamaged);
+    EXPECT_EQ(nest(100), Soundness::kDamaged);
 }
 
 TEST(EnvelopeTest, DigestsAreNamesOfFiles)

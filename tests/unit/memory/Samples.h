@@ -5,6 +5,7 @@
 #include <string>
 
 #include "memory/Attempt.h"
+#include "memory/Envelope.h"
 #include "memory/Machine.h"
 
 namespace assay_host {
@@ -71,6 +72,18 @@ inline Knowledge MakeKnowledge()
                                       Usability::kSoftware));
     knowledge.fAttempts.back().fExitStatus = 2;
     return knowledge;
+}
+
+// Makes the text of a state file as a program of this format would.
+inline std::string SealAs(int format, const nlohmann::ordered_json& content)
+{
+    const std::string text = Seal(content);
+    const std::string mark = "\"checksum\": \"";
+    const std::size_t begin = text.find(mark) + mark.size();
+    const std::string body = text.substr(text.find('\n', begin) + 1);
+    const std::string number = std::to_string(format);
+    return "{\n  \"format\": " + number + ",\n  " + mark + MakeDigest(number + "\n" + body) +
+           "\",\n" + body;
 }
 
 } // namespace assay_host

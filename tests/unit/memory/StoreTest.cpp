@@ -72,11 +72,7 @@ TEST_F(StoreTest, IgnoresTheFileOfAnotherIdentityWithTheSameName)
 TEST_F(StoreTest, LeavesTheFileOfANewerVersion)
 {
     Store(fFolder).Save(MakeKnowledge(), kNow);
-    auto newer = nlohmann::ordered_json::parse(Seal({{"new", "content"}}));
-    newer["format"] = kStateFormat + 1;
-    newer["checksum"] =
-        MakeDigest(std::to_string(kStateFormat + 1) + "\n" + newer["content"].dump());
-    const std::string text = fFolder.GetState() = newer.dump();
+    const std::string text = fFolder.GetState() = SealAs(kStateFormat + 1, {{"new", "content"}});
     EXPECT_THAT(LoadAndGetMessages(),
                 ElementsAre(EndsWith(" is ignored: it is of a newer version.")));
     Store store(fFolder);
@@ -153,7 +149,7 @@ TEST_F(StoreTest, ListsTheNewestFirst)
     fFolder.fFiles["lock"] = "";
     const auto list = store.List();
     ASSERT_EQ(list.size(), 2u);
-    EXPECT_EQ(list[0].fName, GetIdentityName(MakeNumbered(2).fIdentity));
+    EXPECT_EQ(list[0].fName, GetIdentityName(MakeIdentityJson(MakeNumbered(2).fIdentity)));
     ASSERT_TRUE(list[0].fKnowledge);
     EXPECT_EQ(list[0].fKnowledge->fIdentity.fSystem, "2");
     EXPECT_FALSE(list[1].fKnowledge);
@@ -169,7 +165,7 @@ TEST_F(StoreTest, ForgetsOneOrAll)
     choice.fOpenGL = {Usability::kSoftware, kNow};
     EXPECT_EQ(store.SaveChoice(choice), "");
     fFolder.fFiles["of another program"] = "text";
-    EXPECT_EQ(store.Forget(GetIdentityName(MakeNumbered(1).fIdentity)), "");
+    EXPECT_EQ(store.Forget(GetIdentityName(MakeIdentityJson(MakeNumbered(1).fIdentity))), "");
     EXPECT_EQ(store.List().size(), 1u);
     EXPECT_FALSE(store.LoadChoice().IsEmpty());
     EXPECT_EQ(store.ForgetAll(), "");
