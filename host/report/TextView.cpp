@@ -11,6 +11,8 @@
 
 #include "report/Answers.h"
 #include "report/Bytes.h"
+#include "report/LostAnswers.h"
+#include "report/RunText.h"
 #include "report/TextTable.h"
 #include "report/Usable.h"
 #include "report/ValueText.h"
@@ -27,16 +29,6 @@ std::size_t GetWidth(int width)
 {
     constexpr int kMinWidth = 40;
     return static_cast<std::size_t>(std::max(width, kMinWidth));
-}
-
-std::string GetLabel(const Answer& answer)
-{
-    return answer.fKnown ? answer.fKnown->fLabel : ShowBytes(answer.fKey);
-}
-
-bool IsLost(const Answer& answer)
-{
-    return !answer.fLine && answer.fMissing != Missing::kNotPrinted;
 }
 
 void AppendToList(std::string& list, const std::string& item)
@@ -132,35 +124,11 @@ private:
         }
     }
 
-    // Adds one row for each reason, with the labels of all keys that are missing for it.
     void AddLost()
     {
-        for (const Missing missing :
-             {Missing::kUnreadable, Missing::kDeviceFailed, Missing::kRunEnded}) {
-            std::string labels;
-            AddLost(labels, KeyGroup::kMain, missing, nullptr);
-            AddLost(labels, KeyGroup::kLimit, missing, "all limits");
-            AddLost(labels, KeyGroup::kExtension, missing, "all extensions");
-            if (!labels.empty())
-                fTable.Add("No answer", fmt::format("{} ({})", labels, GetMissingText(missing)));
-        }
-    }
-
-    // `all`: replaces the labels if every key of the group is missing; null for no replacement.
-    void AddLost(std::string& labels, KeyGroup group, Missing missing, const char* all)
-    {
-        std::string some;
-        bool isAll = all != nullptr;
-        for (const Answer& answer : fDevice.fAnswers) {
-            if (!answer.fKnown || answer.fKnown->fGroup != group)
-                continue;
-            if (answer.fMissing == missing)
-                AppendToList(some, GetLabel(answer));
-            else
-                isAll = false;
-        }
-        if (!some.empty())
-            AppendToList(labels, isAll ? all : some);
+        for (const LostAnswers& lost : ListLost(fDevice))
+            fTable.Add("No answer",
+                       fmt::format("{} ({})", lost.fLabels, GetMissingText(lost.fMissing)));
     }
 
     const DeviceAnswers& fDevice;
@@ -190,60 +158,6 @@ void AddLines(TextTable& table, const std::string& label, const std::vector<std:
         const std::string text = ShowBytes(lines[line]);
         table.Add(std::exchange(first, ""), text.empty() ? "(empty)" : text);
     }
-}
-
-std::vector<std::string> GetRawLines(const Report& report)
-{
-    std::vector<std::string> texts;
-    for (const ReportLine& line : report.GetLines())
-        if (line.fKind == LineKind::kRaw && !line.fText.empty())
-            texts.push_back(line.fText);
-    return texts;
-}
-
-std::string GetCommandText(const RunOutcome& outcome)
-{
-    std::string text;
-    for (const std::string& word : outcome.fCommand)
-        text += (text.empty() ? "" : " ") + ShowBytes(word);
-    return text;
-}
-
-// "hardware (glgpu[0]): OpenGL works on graphics hardware."
-std::string GetUsableText(const Usable& usable)
-{
-    return fmt::format("{}{}: {}", GetUsabilityName(usable.fUsability),
-                       usable.fTag.empty() ? "" : " (" + usable.fTag + ")", usable.fText);
-}
-
-std::string GetTimeText(const RunOutcome& outcome)
-{
-    std::string text = fmt::format("{:.2f} s", outcome.fSeconds);
-    if (outcome.fTimeoutSeconds > 0)
-        text += fmt::format(" of {:g} s", outcome.fTimeoutSeconds);
-    return text;
-}
-
-// Returns a text such as "2 OpenGL, no OpenCL".
-std::string GetCountText(const Answers& answers)
-{
-    std::string text;
-    for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL}) {
-        const auto count =
-            std::count_if(answers.fDevices.begin(), answers.fDevices.end(),
-                          [kind](const DeviceAnswers& device) { return device.fKind == kind; });
-        const auto answer =
-            std::find_if(answers.fReport.begin(), answers.fReport.end(),
-                         [kind](const Answer& row) { return row.fKey == GetCountKey(kind); });
-        const char* const name = GetKindName(kind);
-        if (answer->fMissing == Missing::kNoOpenCL)
-            AppendToList(text, fmt::format("no {}", name));
-        else if (answer->fMissing == Missing::kRunEnded && count == 0)
-            AppendToList(text, fmt::format("{} not reached", name));
-        else
-            AppendToList(text, fmt::format("{} {}", count, name));
-    }
-    return text;
 }
 
 bool HasValues(const Report& report)
