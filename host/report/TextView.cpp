@@ -12,6 +12,7 @@
 #include "report/Answers.h"
 #include "report/Bytes.h"
 #include "report/LostAnswers.h"
+#include "report/NextSteps.h"
 #include "report/RunText.h"
 #include "report/TextTable.h"
 #include "report/Usable.h"
@@ -147,6 +148,13 @@ void PrintWarnings(std::ostream& out, const std::vector<Warning>& warnings, std:
     out << "\n";
 }
 
+// Adds a row for each text, the label beside the first.
+void AddRows(TextTable& table, std::string label, const std::vector<std::string>& texts)
+{
+    for (const std::string& text : texts)
+        table.Add(std::exchange(label, ""), text);
+}
+
 // Adds the last lines under one label.
 void AddLines(TextTable& table, const std::string& label, const std::vector<std::string>& lines)
 {
@@ -180,6 +188,7 @@ void PrintVerdict(std::ostream& out, const Report& report, const Answers& answer
     add("What happened", ShowBytes(outcome.fReason));
     for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL})
         add(GetKindName(kind), GetUsableText(JudgeUsable(kind, answers, outcome)));
+    AddRows(table, "What to do", GetNextSteps(answers, outcome));
     add("Ended by", ShowBytes(outcome.fTermination));
     add("Exit status", outcome.fExitStatus ? std::to_string(*outcome.fExitStatus) : "");
     add("Command", GetCommandText(outcome));

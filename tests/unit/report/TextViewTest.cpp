@@ -158,6 +158,12 @@ TEST(TextView, OfACrashAndABadDevice)
               "  OpenGL            broken (glgpu[1]): The child crashed in OpenGL, at\n"
               "                    glgpu[1].CanCompileProgramGLSL.\n"
               "  OpenCL            unknown: The run ended before OpenCL was tried.\n"
+              "  What to do        Update the graphics driver, or reinstall it.\n"
+              "                    Run again with -- -verbose=1 after the other\n"
+              "                    options: the log then names the driver's calls.\n"
+              "                    If the newest driver fails too, report it to the\n"
+              "                    driver's developers, with the output of --format\n"
+              "                    json.\n"
               "  Ended by          signal 11 (Segmentation fault)\n"
               "  Command           assay\n"
               "  Time              1.50 s\n"
@@ -183,13 +189,16 @@ TEST(TextView, OfAChildThatNeverStarted)
     RunOutcome outcome;
     outcome.fCommand = {"nothing"};
     outcome.fReason = "There is no such file.";
-    EXPECT_EQ(Print("", outcome), "Verdict: never-started\n"
-                                  "----------------------\n"
-                                  "  What happened  There is no such file.\n"
-                                  "  OpenGL         unknown: The child could not be started.\n"
-                                  "  OpenCL         unknown: The child could not be started.\n"
-                                  "  Command        nothing\n"
-                                  "  Time           0.00 s\n");
+    EXPECT_EQ(Print("", outcome),
+              "Verdict: never-started\n"
+              "----------------------\n"
+              "  What happened  There is no such file.\n"
+              "  OpenGL         unknown: The child could not be started.\n"
+              "  OpenCL         unknown: The child could not be started.\n"
+              "  What to do     Check that assay is installed beside assay-host or on the PATH,\n"
+              "                 or name it with --assay.\n"
+              "  Command        nothing\n"
+              "  Time           0.00 s\n");
 }
 
 TEST(TextView, OfAChildWithoutAReport)
@@ -207,6 +216,10 @@ TEST(TextView, OfAChildWithoutAReport)
                                          "  OpenCL          unknown: The child\n"
                                          "                  rejected its command\n"
                                          "                  line.\n"
+                                         "  What to do      Correct the child's\n"
+                                         "                  options, those after\n"
+                                         "                  \"--\"; assay -help\n"
+                                         "                  lists them.\n"
                                          "  Exit status     3\n"
                                          "  Command         assay -help\n"
                                          "  Time            0.00 s\n"
@@ -218,7 +231,7 @@ TEST(TextView, HasUnknownKeys)
 {
     const std::string text = Print(Sample(1, -1).GetText() + "glgpu[0].Extra=\"1\t2\"\n", {});
     EXPECT_NE(text.find("  Others\n    Extra                 1\\t2\n"), std::string::npos) << text;
-    EXPECT_NE(text.find("  Devices  1 OpenGL, no OpenCL\n"), std::string::npos) << text;
+    EXPECT_NE(text.find("  Devices     1 OpenGL, no OpenCL\n"), std::string::npos) << text;
 }
 
 TEST(TextView, ListsExtensionsWithUnclearOrMissingAnswers)

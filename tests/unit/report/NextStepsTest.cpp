@@ -1,0 +1,72 @@
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "Lines.h"
+#include "Samples.h"
+#include "report/NextSteps.h"
+
+namespace assay_host {
+namespace {
+
+constexpr char kCalls[] =
+    "Run again with -- -verbose=1 after the other options: the log then names the driver's calls.";
+constexpr char kUpdate[] = "Update the graphics driver, or reinstall it.";
+constexpr char kReport[] = "If the newest driver fails too, report it to the driver's developers, "
+                           "with the output of --format json.";
+
+std::vector<std::string> Get(const std::string& text, Verdict verdict)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = verdict;
+    const Report report = ReadReport(text);
+    return GetNextSteps(GetAnswers(report), outcome);
+}
+
+using Steps = std::vector<std::string>;
+
+TEST(NextSteps, NoneForAGoodMachine)
+{
+    EXPECT_EQ(Get(Sample(1, 1).GetText(), Verdict::kComplete), Steps());
+    // OpenCL is often left out on purpose.
+    EXPECT_EQ(Get(Sample(1, -1).GetText(), Verdict::kComplete), Steps());
+}
+
+TEST(NextSteps, AreNotRepeated)
+{
+    const std::string text = Sample(1, 1)
+                                 .Set("glgpu[0].GLFrameBufferOK", "0")
+                                 .Fail("clgpu[0]", "CLDeviceVersion")
+                                 .GetText();
+    EXPECT_EQ(Get(text, Verdict::kFailedTests), (Steps{kUpdate, kCalls, kReport}));
+}
+
+TEST(NextSteps, OfEachVerdict)
+{
+    const std::string broken = Sample(1, 1).EndAfter("glgpu[0].GLVersion").GetText();
+    EXPECT_EQ(Get(broken, Verdict::kCrashed), (Steps{kUpdate, kCalls, kReport}));
+    EXPECT_EQ(Get(broken, Verdict::kHung),
+              (Steps{"If the machine is slow or busy, run again with a longer --timeout.", kUpdate,
+                     kCalls, kReport}));
+    EXPECT_EQ(Get("", Verdict::kNeverStarted),
+              (Steps{"Check that assay is installed beside assay-host or on the PATH, or name it "
+                     "with --assay."}));
+    EXPECT_EQ(Get("", Verdict::kUsageError),
+              (Steps{"Correct the child's options, those after \"--\"; assay -help lists them."}));
+    EXPECT_EQ(Get("", Verdict::kInterrupted), (Steps{"Run again, and let the run end by itself."}));
+}
+
+TEST(NextSteps, ForSoftwareAndForNoDevice)
+{
+    EXPECT_EQ(
+        Get(Sample(1, -1).Set("glgpu[0].GLRenderer", "\"llvmpipe\"").GetText(), Verdict::kComplete),
+        (Steps{"If the machine has a graphics card, install its OpenGL driver, and check that "
+               "this user may open the card."}));
+    EXPECT_EQ(Get(Sample(0, -1).GetText(), Verdict::kComplete),
+              (Steps{"Install the graphics card's driver, and check that this user may open the "
+                     "card."}));
+}
+
+} // namespace
+} // namespace assay_host
