@@ -60,9 +60,10 @@ void AddForUsable(StepList& steps, DeviceKind kind, const Usable& usable)
     case Usability::kHardware:
         break;
     case Usability::kSoftware:
-        steps.Add(fmt::format("If the machine has a graphics card, install its {} driver, and check "
-                              "that this user may open the card.",
-                              name));
+        steps.Add(
+            fmt::format("If the machine has a graphics card, install its {} driver, and check "
+                        "that this user may open the card.",
+                        name));
         break;
     case Usability::kBroken:
         steps.Add("Update the graphics driver, or reinstall it.");

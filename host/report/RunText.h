@@ -1,5 +1,5 @@
-// Texts about a run that the forms for people share. All are safe to write to a terminal. Any thread
-// may call.
+// Texts about a run that the forms for people share. All are safe to write to a terminal. Any
+// thread may call.
 #pragma once
 
 #include <string>
@@ -18,7 +18,8 @@ std::string GetCommandText(const RunOutcome& outcome);
 // Returns a text such as "hardware (glgpu[0]): OpenGL works on graphics hardware."
 std::string GetUsableText(const Usable& usable);
 
-// Returns a text such as "0.12 s of 60 s": the time that the child took, and its limit if it had one.
+// Returns a text such as "0.12 s of 60 s": the time that the child took, and its limit if it had
+// one.
 std::string GetTimeText(const RunOutcome& outcome);
 
 // Returns a text such as "2 OpenGL, no OpenCL".

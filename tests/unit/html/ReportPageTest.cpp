@@ -1,0 +1,195 @@
+#include <gtest/gtest.h>
+
+#include <sstream>
+#include <string>
+
+#include "html/Assets.h"
+#include "html/ReportPage.h"
+#include "report/JsonDocument.h"
+#include "report/Lines.h"
+#include "report/Samples.h"
+
+namespace assay_host {
+namespace {
+
+RunFacts MakeFacts()
+{
+    RunFacts facts;
+    facts.fHostVersion = "1.0.0";
+    facts.fChildVersion = {"1.0.0", ""};
+    facts.fEnvironment.fSystem = {"Example <OS>", ""};
+    facts.fEnvironment.fKernel = {"", "the kernel does not say it"};
+    facts.fEnvironment.fHost = {"", "only with --identify"};
+    facts.fEnvironment.fTime = "2026-11-22T01:26:02Z";
+    facts.fEnvironment.fOffset = "+01:00";
+    return facts;
+}
+
+RunOutcome MakeOutcome(Verdict verdict)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = verdict;
+    outcome.fCommand = {"bin/assay"};
+    outcome.fReason = "The reason <b>.";
+    outcome.fSeconds = 0.25;
+    if (verdict == Verdict::kComplete)
+        outcome.fExitStatus = 0;
+    return outcome;
+}
+
+std::string WritePage(const std::string& text, const RunOutcome& outcome)
+{
+    std::ostringstream out;
+    WriteReportPage(out, ReadReport(text), outcome, MakeFacts());
+    return out.str();
+}
+
+bool Has(const std::string& page, const std::string& part)
+{
+    return page.find(part) != std::string::npos;
+}
+
+std::size_t Count(const std::string& page, const std::string& part)
+{
+    std::size_t count = 0;
+    for (std::size_t at = page.find(part); at != std::string::npos; at = page.find(part, at + 1))
+        ++count;
+    return count;
+}
+
+TEST(ReportPage, OfAGoodMachine)
+{
+    const std::string page = WritePage(Sample(1, 1).GetText(), MakeOutcome(Verdict::kComplete));
+    EXPECT_EQ(page.substr(0, 16), "<!DOCTYPE html>\n");
+    EXPECT_TRUE(Has(page, "<title>assay: complete</title>"));
+    EXPECT_TRUE(Has(page, "<h1>OpenGL works on graphics hardware.</h1>"));
+    EXPECT_TRUE(Has(page, "<span class=\"hardware\">hardware</span> (glgpu[0]): OpenGL works"));
+    EXPECT_TRUE(Has(page, "<span class=\"hardware\">hardware</span> (clgpu[0]): OpenCL works"));
+    EXPECT_FALSE(Has(page, "What to do"));
+    EXPECT_FALSE(Has(page, "Warnings"));
+    EXPECT_TRUE(Has(page, "<article class=\"card\" id=\"glgpu[0]\"><h2>OpenGL device glgpu[0]: "
+                          "Accelerator 4000</h2>"));
+    EXPECT_TRUE(Has(page, "<dt>Shaders compile</dt>\n<dd class=\"yes\">yes</dd>"));
+    EXPECT_TRUE(Has(page, "<dt>Memory</dt>\n<dd>23.99 GiB</dd>"));
+    EXPECT_TRUE(Has(page, "<summary>Limits (10)</summary>"));
+    EXPECT_TRUE(Has(page, "<summary>Extensions (10)</summary>"));
+    EXPECT_TRUE(Has(page, "<caption>Copy bandwidth (more is better)</caption>"));
+    EXPECT_TRUE(Has(page, "<caption>Compute score (more is better)</caption>"));
+    EXPECT_TRUE(Has(page, "<dt>System</dt>\n<dd>Example &lt;OS&gt;</dd>"));
+    EXPECT_TRUE(Has(page, "<dd>not known (the kernel does not say it)</dd>"));
+    EXPECT_FALSE(Has(page, "<dt>Host</dt>"));
+    EXPECT_TRUE(Has(page, "<dt>Versions</dt>\n<dd>assay-host 1.0.0, assay 1.0.0</dd>"));
+    EXPECT_TRUE(Has(page, "NumGLGPUs=1\n"));
+    EXPECT_EQ(page.substr(page.size() - 8), "</html>\n");
+}
+
+TEST(ReportPage, OfACrash)
+{
+    RunOutcome outcome = MakeOutcome(Verdict::kCrashed);
+    outcome.fTermination = "signal 11 (Segmentation fault)";
+    outcome.fLastReportLine = "glgpu[0].GLVersion=\"4.1\"";
+    outcome.fErrorLines = {"a < b", ""};
+    const std::string page =
+        WritePage(Sample(1, 1).EndAfter("glgpu[0].GLVersion").GetText(), outcome);
+    EXPECT_TRUE(Has(page, "<h1>The reason &lt;b&gt;.</h1>"));
+    EXPECT_TRUE(Has(page, "<span class=\"broken\">broken</span> (glgpu[0]): The child crashed"));
+    EXPECT_TRUE(Has(page, "<h2>What to do</h2>\n<ul><li>Update the graphics driver"));
+    EXPECT_TRUE(Has(page, "<dt>Ended by</dt>\n<dd>signal 11 (Segmentation fault)</dd>"));
+    EXPECT_TRUE(
+        Has(page, "<dt>Last report line</dt>\n<dd>glgpu[0].GLVersion=&quot;4.1&quot;</dd>"));
+    EXPECT_TRUE(Has(page, "<dt>Next to report</dt>\n<dd>glgpu[0].IsIntegratedGLGPU</dd>"));
+    EXPECT_TRUE(Has(page, "<h3>No answer</h3>\n<dl><dt>run ended before</dt>"));
+    EXPECT_TRUE(Has(page, "<summary>Standard error (2)</summary>\n<pre>a &lt; b\n\n</pre>"));
+    EXPECT_FALSE(Has(page, "Measurements"));
+    EXPECT_FALSE(Has(page, "Trials"));
+}
+
+TEST(ReportPage, FailedTrialsStandOut)
+{
+    const std::string page =
+        WritePage(Sample(1, 0).Set("glgpu[0].CanCompileProgramGLSL", "0").GetText(),
+                  MakeOutcome(Verdict::kComplete));
+    EXPECT_TRUE(Has(page, "<h1>OpenGL does not work: glgpu[0]: a realistic pair of shaders"));
+    EXPECT_TRUE(Has(page, "<dt>Shaders compile</dt>\n<dd class=\"no\">no</dd>"));
+    EXPECT_TRUE(Has(page, "<dt>Framebuffers work</dt>\n<dd class=\"yes\">yes</dd>"));
+    EXPECT_TRUE(Has(page, "<h2>Warnings</h2>\n<ul><li>glgpu[0]: a realistic pair"));
+}
+
+TEST(ReportPage, AMeasurementThatIsNotKnownHasNoBar)
+{
+    const std::string page = WritePage(Sample(0, 3)
+                                           .Set("clgpu[0].CLBandwidth", "0")
+                                           .Set("clgpu[1].CLBandwidth", "1e30")
+                                           .Set("clgpu[2].CLBandwidth", "2e11")
+                                           .Set("clgpu[0].CLCompute", "0")
+                                           .Set("clgpu[1].CLCompute", "0")
+                                           .Set("clgpu[2].CLCompute", "0")
+                                           .GetText(),
+                                       MakeOutcome(Verdict::kComplete));
+    EXPECT_EQ(Count(page, "class=\"bar\""), 1U);
+    EXPECT_TRUE(Has(page, "<td>200 GB/s</td>"));
+    EXPECT_FALSE(Has(page, "Compute score (more"));
+}
+
+// Texts of a driver that could do harm in a page, in each place.
+TEST(ReportPage, ADriversTextsDoNothing)
+{
+    const std::string hostile = "</script></style><script>alert(1)</script><!--\"'&\x1B[31m\u202E";
+    Sample sample(1, 1);
+    for (const SampleValue& value : kSampleGL)
+        sample.Set(std::string("glgpu[0].") + value.fKey, "\"" + hostile + "\"");
+    for (const SampleValue& value : kSampleCL)
+        sample.Set(std::string("clgpu[0].") + value.fKey, "\"" + hostile + "\"");
+    RunOutcome outcome = MakeOutcome(Verdict::kCrashed);
+    for (std::string* text :
+         {&outcome.fReason, &outcome.fTermination, &outcome.fLastReportLine, &outcome.fLastLogLine})
+        *text = hostile;
+    outcome.fCommand = {hostile};
+    outcome.fErrorLines = {hostile};
+    outcome.fCauses = {{"OGLContextCreated", hostile}};
+    const std::string page =
+        WritePage("OGLContextCreated=0\n" + sample.GetText() + hostile + "\n", outcome);
+    EXPECT_EQ(Count(page, "<script"), 2U);
+    EXPECT_EQ(Count(page, "</script"), 2U);
+    EXPECT_EQ(Count(page, "</style"), 1U);
+    EXPECT_EQ(Count(page, "<!--"), 0U);
+    EXPECT_EQ(Count(page, "\x1B"), 0U);
+    // The document has it as it is; a browser shows no part of that.
+    const std::size_t document = page.find("<script type=\"application/json\"");
+    ASSERT_NE(document, std::string::npos);
+    EXPECT_EQ(Count(page.substr(0, document), "\u202E"), 0U);
+    EXPECT_GT(Count(page.substr(0, document), "\\x1B[31m\\u{202E}"), 20U);
+}
+
+TEST(ReportPage, HoldsTheDocument)
+{
+    const std::string text = Sample(1, 1).Set("glgpu[0].GLRenderer", "\"</script>\"").GetText();
+    const RunOutcome outcome = MakeOutcome(Verdict::kComplete);
+    const std::string page = WritePage(text, outcome);
+    const std::string begin = "<script type=\"application/json\" id=\"json\">";
+    const std::size_t start = page.find(begin) + begin.size();
+    std::string json = page.substr(start, page.find("</script>", start) - start);
+    const std::string escape = "\\u003C";
+    EXPECT_EQ(Count(json, "<"), 0U);
+    ASSERT_GT(Count(json, escape), 0U);
+    for (std::size_t at = json.find(escape); at != std::string::npos; at = json.find(escape, at))
+        json.replace(at, escape.size(), "<");
+    std::ostringstream document;
+    WriteDocument(document, ReadReport(text), outcome, MakeFacts());
+    EXPECT_EQ(json, document.str());
+}
+
+TEST(ReportPage, AllowsOnlyItsOwnScript)
+{
+    const std::string page = WritePage(Sample(0, 0).GetText(), MakeOutcome(Verdict::kComplete));
+    EXPECT_TRUE(
+        Has(page, "content=\"default-src &#39;none&#39;; style-src &#39;unsafe-inline&#39;; "
+                  "script-src &#39;" +
+                      std::string(kCopyScriptHash) + "&#39;;"));
+    EXPECT_TRUE(Has(page, "<script>" + std::string(kCopyScript) + "</script>"));
+    for (const char* const remote : {"http:", "https:", "url(", "src=", "@import", "href="})
+        EXPECT_EQ(Count(page, remote), 0U) << remote;
+}
+
+} // namespace
+} // namespace assay_host
