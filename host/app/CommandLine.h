@@ -10,7 +10,7 @@
 
 namespace assay_host {
 
-enum class Format { kText, kJson, kJsonLines, kPrometheus, kNodeFeatures, kAnsible };
+enum class Format { kText, kJson, kJsonLines, kHtml, kPrometheus, kNodeFeatures, kAnsible };
 
 // What the exit status of a run shows: its verdict, or whether these interfaces can be used.
 enum class Need { kNothing, kOpenGL, kOpenCL, kBoth };

@@ -3,6 +3,7 @@
 #include "fleet/AnsibleFacts.h"
 #include "fleet/NodeFeatures.h"
 #include "fleet/PrometheusText.h"
+#include "html/ReportPage.h"
 #include "report/JsonDocument.h"
 #include "report/TextView.h"
 
@@ -21,6 +22,9 @@ void WriteForm(std::ostream& out, const Form& form, const Report& report, const 
             WriteFirstDocument(out, report, outcome);
         else
             WriteDocument(out, report, outcome, facts);
+        break;
+    case Format::kHtml:
+        WriteReportPage(out, report, outcome, facts);
         break;
     case Format::kPrometheus:
         WritePrometheusText(out, report, outcome, facts);

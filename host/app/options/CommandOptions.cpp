@@ -71,6 +71,7 @@ Format ReadFormat(const std::string& format)
 {
     return format == "json"         ? Format::kJson
            : format == "jsonl"      ? Format::kJsonLines
+           : format == "html"       ? Format::kHtml
            : format == "prometheus" ? Format::kPrometheus
            : format == "nfd"        ? Format::kNodeFeatures
            : format == "ansible"    ? Format::kAnsible

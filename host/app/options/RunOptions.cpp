@@ -19,14 +19,15 @@ public:
     {
         AddChildOptions(command, fChoice.fChild);
         AddWord(command, "--format", fFormat,
-                "text, json, jsonl, prometheus, nfd or ansible [text]", "FORMAT",
-                {"text", "json", "jsonl", "prometheus", "nfd", "ansible"});
+                "text, json, jsonl, html, prometheus, nfd or ansible [text]", "FORMAT",
+                {"text", "json", "jsonl", "html", "prometheus", "nfd", "ansible"});
         command.add_option("--schema", fChoice.fSchema, "of json and jsonl, 1 or 2 [2]")
             ->option_text("NUMBER")
             ->check(CLI::IsMember({"1", "2"}));
         AddWord(command, "--need", fNeed, "opengl, opencl or both: exit by whether they work",
                 "WHAT", {"opengl", "opencl", "both"});
-        command.add_flag("--identify", fChoice.fIdentify, "name this machine in json and jsonl");
+        command.add_flag("--identify", fChoice.fIdentify,
+                         "name this machine in json, jsonl and html");
         command.add_flag("--raw", fChoice.fRaw,
                          "print the child's own lines first; only with text");
         AddText(command, "--output", fChoice.fOutput, "write to this file [standard output]",
