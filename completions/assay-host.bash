@@ -30,7 +30,7 @@ _assay_host() {
         return
         ;;
     --format)
-        local forms="text json jsonl prometheus nfd ansible"
+        local forms="text json jsonl html prometheus nfd ansible"
         [ "$command" = advise ] && forms="text env json"
         COMPREPLY=($(compgen -W "$forms" -- "$cur"))
         return

@@ -24,10 +24,10 @@ complete -c assay-host -n $none -a state -d "Show or change what advise remember
 
 complete -c assay-host -n $child -l assay -r -F -d "Program to run"
 complete -c assay-host -n $child -l timeout -x -d "Kill the child after these seconds, 0: never"
-complete -c assay-host -n $run -l format -x -a "text json jsonl prometheus nfd ansible" -d "Form of the output"
+complete -c assay-host -n $run -l format -x -a "text json jsonl html prometheus nfd ansible" -d "Form of the output"
 complete -c assay-host -n $run -l schema -x -a "1 2" -d "Version of json and jsonl"
 complete -c assay-host -n $needs -l need -x -a "opengl opencl both" -d "Exit by whether they work"
-complete -c assay-host -n $run -l identify -d "Name this machine in json and jsonl"
+complete -c assay-host -n $run -l identify -d "Name this machine in json, jsonl and html"
 complete -c assay-host -n $run -l raw -d "Print the child's own lines first"
 complete -c assay-host -n $run -l output -r -F -d "Write to this file"
 complete -c assay-host -n $torture -l kind -x -a "crash throw both" -d "Kind of failure"

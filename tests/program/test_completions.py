@@ -88,7 +88,7 @@ def test_commands():
 
 
 def test_values_of_options():
-    for option, values in {"--format": "text json jsonl prometheus nfd ansible",
+    for option, values in {"--format": "text json jsonl html prometheus nfd ansible",
                            "--schema": "1 2",
                            "--need": "opengl opencl both"}.items():
         assert in_bash("assay-host", "run", option, "") == set(values.split())

@@ -31,10 +31,10 @@ Options:
   -h,--help               show this text
   --assay PATH            program to run [beside assay-host, or on the PATH]
   --timeout SECONDS       kill the child after this time, 0: never [60]
-  --format FORMAT         text, json, jsonl, prometheus, nfd or ansible [text]
+  --format FORMAT         text, json, jsonl, html, prometheus, nfd or ansible [text]
   --schema NUMBER         of json and jsonl, 1 or 2 [2]
   --need WHAT             opengl, opencl or both: exit by whether they work
-  --identify              name this machine in json and jsonl
+  --identify              name this machine in json, jsonl and html
   --raw                   print the child's own lines first; only with text
   --output FILE           write to this file [standard output]
 

@@ -19,7 +19,7 @@ ROWS = [
     ("run --timeout 1x", 10, "--timeout: ", NO_NUMBER.format("1x")),
     ("run --assay=", 10, "--assay: ", "PATH missing"),
     ("run --output=", 10, "--output: ", "FILE missing"),
-    ("run --format xml", 10, "--format: xml ", "{text,json,jsonl,prometheus,nfd,ansible}"),
+    ("run --format xml", 10, "--format: xml ", "{text,json,jsonl,html,prometheus,nfd,ansible}"),
     ("run --raw --format json", 10, "--raw: ", "only with --format text"),
     ("run --raw --format jsonl", 10, "--raw: ", "only with --format text"),
     ("run --raw --format nfd", 10, "--raw: ", "only with --format text"),
