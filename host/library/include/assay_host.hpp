@@ -44,6 +44,15 @@ enum class Usability {
     unknown = ASSAY_HOST_UNKNOWN
 };
 
+enum class Plan { answer = ASSAY_HOST_ANSWER, attempt = ASSAY_HOST_TRY, wait = ASSAY_HOST_WAIT };
+
+enum class Choice {
+    automatic = ASSAY_HOST_CHOICE_AUTO,
+    hardware = ASSAY_HOST_CHOICE_HARDWARE,
+    software = ASSAY_HOST_CHOICE_SOFTWARE,
+    absent = ASSAY_HOST_CHOICE_ABSENT
+};
+
 inline std::string to_string(Verdict verdict)
 {
     return assay_host_verdict_name(static_cast<assay_host_verdict>(verdict));
@@ -52,6 +61,11 @@ inline std::string to_string(Verdict verdict)
 inline std::string to_string(Usability usability)
 {
     return assay_host_usability_name(static_cast<assay_host_usability>(usability));
+}
+
+inline std::string to_string(Plan plan)
+{
+    return assay_host_plan_name(static_cast<assay_host_plan>(plan));
 }
 
 // Whether an interface can be used, and why.
@@ -88,8 +102,28 @@ struct Answer {
     explicit operator bool() const { return value.index() != 0; }
 };
 
-// The callbacks are called on the thread of run(). One that returns false ends the run; one that
-// throws ends it too, and run() throws that exception.
+// What an advice says of an interface.
+struct Advised {
+    Usability usability = Usability::unknown;
+    std::string reason;                    // a stable identifier
+    std::string text;                      // for the user
+    std::string source;                    // "attempt", "memory", "choice" or "none"
+    Usability learnt = Usability::unknown; // without the user's choice
+    std::string device;                    // its tag, name and driver; empty if unknown
+    std::string device_name;
+    std::string device_driver;
+    std::string end; // of the attempt: a stable identifier, and for the user; may be empty
+    std::string end_text;
+    std::string last_line;                      // of the child, if it brought no usable device
+    std::optional<double> age_seconds;          // of the attempt or of the choice
+    std::uint64_t failures = 0;                 // that count, since the last success
+    std::optional<double> next_attempt_seconds; // from the advice; empty: at the next call
+    std::string change;                         // what would change the answer
+    std::string warning;                        // may be empty
+};
+
+// The callbacks are called on the thread of run() or advise(). One that returns false ends the run;
+// one that throws ends it too, and run() or advise() throws that exception.
 struct Options {
     std::string program; // empty: the one beside the library
     std::vector<std::string> arguments;
@@ -101,6 +135,17 @@ struct Options {
     std::function<bool(std::string_view line, double seconds)> on_line;
     std::function<bool(std::string_view line, double seconds)> on_error_line;
     std::function<bool(double seconds, std::uint64_t steps, std::string_view next_key)> on_tick;
+
+    // For advise() alone.
+    bool need_opengl = true; // what may cause an attempt
+    bool need_opencl = false;
+    bool fresh = false;       // results are due at any age
+    bool dry_run = false;     // only show what a call would do
+    double wait_seconds = 10; // for the attempt of another process or thread
+    double max_age_seconds = 30 * 24 * 3600.0;
+    double pause_seconds = 60;                // after a first failure
+    double forgive_seconds = 7 * 24 * 3600.0; // older failures don't count
+    std::uint64_t retries = 2;                // after a first failure
 };
 
 namespace detail {
@@ -133,6 +178,8 @@ struct Free {
     void operator()(assay_host_options* object) const { assay_host_options_free(object); }
     void operator()(assay_host_stop* object) const { assay_host_stop_free(object); }
     void operator()(assay_host_result* object) const { assay_host_result_free(object); }
+    void operator()(assay_host_advice* object) const { assay_host_advice_free(object); }
+    void operator()(assay_host_state* object) const { assay_host_state_free(object); }
 };
 
 // The callbacks of one run, and the exception of one.
@@ -170,9 +217,51 @@ struct Calls {
     }
 };
 
+using OptionsHandle = std::unique_ptr<assay_host_options, Free>;
+
+// `calls` must outlive the handle.
+inline OptionsHandle make_options(Calls& calls)
+{
+    const Options& options = calls.options;
+    OptionsHandle made(check_made(assay_host_options_new()));
+    assay_host_options* const handle = made.get();
+    if (!options.program.empty())
+        check(assay_host_options_set_program(handle, options.program.c_str()));
+    for (const std::string& argument : options.arguments)
+        check(assay_host_options_add_argument(handle, argument.c_str()));
+    check(assay_host_options_set_timeout(handle, options.timeout_seconds));
+    if (options.max_bytes != 0)
+        check(assay_host_options_set_max_bytes(handle, options.max_bytes));
+    if (options.max_line_bytes != 0)
+        check(assay_host_options_set_max_line_bytes(handle, options.max_line_bytes));
+    if (options.max_lines != 0)
+        check(assay_host_options_set_max_lines(handle, options.max_lines));
+    check(assay_host_options_set_identify(handle, options.identify ? 1 : 0));
+    if (options.on_line)
+        check(assay_host_options_on_line(handle, Calls::take_line, &calls));
+    if (options.on_error_line)
+        check(assay_host_options_on_error_line(handle, Calls::take_error_line, &calls));
+    if (options.on_tick)
+        check(assay_host_options_on_tick(handle, Calls::take_tick, &calls));
+    return made;
+}
+
+inline void set_advice_options(assay_host_options* handle, const Options& options)
+{
+    check(assay_host_options_set_need(handle, options.need_opengl ? 1 : 0,
+                                      options.need_opencl ? 1 : 0));
+    check(assay_host_options_set_fresh(handle, options.fresh ? 1 : 0));
+    check(assay_host_options_set_dry_run(handle, options.dry_run ? 1 : 0));
+    check(assay_host_options_set_wait(handle, options.wait_seconds));
+    check(assay_host_options_set_max_age(handle, options.max_age_seconds));
+    check(assay_host_options_set_pause(handle, options.pause_seconds));
+    check(assay_host_options_set_forgive(handle, options.forgive_seconds));
+    check(assay_host_options_set_retries(handle, options.retries));
+}
+
 } // namespace detail
 
-// Ends runs from any thread. Can't be withdrawn. Must outlive the runs.
+// Ends runs and advices from any thread. Can't be withdrawn. Must outlive them.
 class Stop {
 public:
     Stop() : fStop(detail::check_made(assay_host_stop_new())) {}
@@ -320,40 +409,157 @@ private:
     std::shared_ptr<assay_host_result> fResult;
 };
 
+// What to do, from memory or from one attempt. Copies share it, and any thread may read it.
+class Advice {
+public:
+    // Takes the ownership.
+    explicit Advice(assay_host_advice* advice) : fAdvice(advice, detail::Free()) {}
+
+    Usability usability(Interface which) const
+    {
+        return static_cast<Usability>(
+            assay_host_advice_usable(fAdvice.get(), static_cast<assay_host_interface>(which)));
+    }
+
+    Advised of(Interface which) const
+    {
+        const assay_host_advice* const advice = fAdvice.get();
+        const auto number = static_cast<assay_host_interface>(which);
+        const auto get = [&](auto read) {
+            std::size_t size = 0;
+            const char* const text = read(advice, number, &size);
+            return std::string(text, size);
+        };
+        const auto get_seconds = [&](auto read) {
+            double seconds = 0;
+            return read(advice, number, &seconds) != 0 ? std::optional(seconds) : std::nullopt;
+        };
+        Advised made;
+        made.usability = usability(which);
+        made.reason = assay_host_advice_reason(advice, number);
+        made.text = assay_host_advice_text(advice, number);
+        made.source = assay_host_advice_source(advice, number);
+        made.learnt = static_cast<Usability>(assay_host_advice_learnt(advice, number));
+        made.device = assay_host_advice_device(advice, number);
+        made.device_name = get(assay_host_advice_device_name);
+        made.device_driver = get(assay_host_advice_device_driver);
+        made.end = assay_host_advice_end(advice, number);
+        made.end_text = assay_host_advice_end_text(advice, number);
+        made.last_line = get(assay_host_advice_last_line);
+        made.age_seconds = get_seconds(assay_host_advice_age);
+        made.failures = assay_host_advice_failures(advice, number);
+        made.next_attempt_seconds = get_seconds(assay_host_advice_next_attempt);
+        made.change = assay_host_advice_change(advice, number);
+        made.warning = assay_host_advice_warning(advice, number);
+        return made;
+    }
+
+    Plan plan() const { return static_cast<Plan>(assay_host_advice_plan(fAdvice.get())); }
+    std::string due() const { return assay_host_advice_due(fAdvice.get()); }
+    bool tried() const { return assay_host_advice_tried(fAdvice.get()) != 0; }
+    bool stopped() const { return assay_host_advice_stopped(fAdvice.get()) != 0; }
+    std::string identity() const { return assay_host_advice_identity(fAdvice.get()); }
+    std::uint64_t attempts() const { return assay_host_advice_attempts(fAdvice.get()); }
+
+    // The problems with the folder.
+    std::vector<std::string> messages() const
+    {
+        std::vector<std::string> messages;
+        const std::size_t count = assay_host_advice_message_count(fAdvice.get());
+        for (std::size_t index = 0; index < count; ++index)
+            messages.emplace_back(assay_host_advice_message(fAdvice.get(), index));
+        return messages;
+    }
+
+    // The JSON document.
+    std::string document() const
+    {
+        std::size_t size = 0;
+        const char* const text = assay_host_advice_document(fAdvice.get(), &size);
+        return {text, size};
+    }
+
+    assay_host_advice* get() const { return fAdvice.get(); }
+
+private:
+    std::shared_ptr<assay_host_advice> fAdvice;
+};
+
+// The folder with the state: the user's choice, and what is remembered. For one thread at a time.
+class State {
+public:
+    // `folder` is in UTF-8. Opens nothing yet.
+    explicit State(const std::string& folder)
+    {
+        assay_host_state* state = nullptr;
+        detail::check(assay_host_state_new(folder.c_str(), &state));
+        fState.reset(state);
+    }
+
+    // Automatic if the folder is missing, or if its file is ignored.
+    Choice choice(Interface which)
+    {
+        assay_host_choice choice = ASSAY_HOST_CHOICE_AUTO;
+        detail::check(assay_host_state_get_choice(
+            fState.get(), static_cast<assay_host_interface>(which), &choice));
+        return static_cast<Choice>(choice);
+    }
+
+    // Throws std::runtime_error with the message if the folder can't be changed.
+    void set_choice(Interface which, Choice choice)
+    {
+        check(assay_host_state_set_choice(fState.get(), static_cast<assay_host_interface>(which),
+                                          static_cast<assay_host_choice>(choice)));
+    }
+
+    // Removes all that is remembered, and the choice. Throws as set_choice(), and during an
+    // attempt.
+    void forget() { check(assay_host_state_forget(fState.get())); }
+
+    // On what failed in the last call, or on a file that it ignored; empty if nothing did.
+    std::string message() const { return assay_host_state_message(fState.get()); }
+
+private:
+    void check(assay_host_error error)
+    {
+        if (error == ASSAY_HOST_NOT_CHANGED)
+            throw std::runtime_error(message());
+        detail::check(error);
+    }
+
+    std::unique_ptr<assay_host_state, detail::Free> fState;
+};
+
 // Runs the child to its end, the timeout or a stop (null: none).
 inline Result run(const Options& options = {}, Stop* stop = nullptr)
 {
-    const std::unique_ptr<assay_host_options, detail::Free> made(
-        detail::check_made(assay_host_options_new()));
-    assay_host_options* const handle = made.get();
-    if (!options.program.empty())
-        detail::check(assay_host_options_set_program(handle, options.program.c_str()));
-    for (const std::string& argument : options.arguments)
-        detail::check(assay_host_options_add_argument(handle, argument.c_str()));
-    detail::check(assay_host_options_set_timeout(handle, options.timeout_seconds));
-    if (options.max_bytes != 0)
-        detail::check(assay_host_options_set_max_bytes(handle, options.max_bytes));
-    if (options.max_line_bytes != 0)
-        detail::check(assay_host_options_set_max_line_bytes(handle, options.max_line_bytes));
-    if (options.max_lines != 0)
-        detail::check(assay_host_options_set_max_lines(handle, options.max_lines));
-    detail::check(assay_host_options_set_identify(handle, options.identify ? 1 : 0));
     detail::Calls calls{options, nullptr};
-    if (options.on_line)
-        detail::check(assay_host_options_on_line(handle, detail::Calls::take_line, &calls));
-    if (options.on_error_line)
-        detail::check(
-            assay_host_options_on_error_line(handle, detail::Calls::take_error_line, &calls));
-    if (options.on_tick)
-        detail::check(assay_host_options_on_tick(handle, detail::Calls::take_tick, &calls));
+    const detail::OptionsHandle handle = detail::make_options(calls);
     assay_host_result* result = nullptr;
     const assay_host_error error =
-        assay_host_run(handle, stop != nullptr ? stop->get() : nullptr, &result);
+        assay_host_run(handle.get(), stop != nullptr ? stop->get() : nullptr, &result);
     std::unique_ptr<assay_host_result, detail::Free> owner(result);
     if (calls.failure)
         std::rethrow_exception(calls.failure);
     detail::check(error);
     return Result(owner.release());
+}
+
+// Answers from the state in the folder, whose path is in UTF-8, or by one attempt, which ends as
+// run() does. The header of the C interface has the details.
+inline Advice advise(const std::string& folder, const Options& options = {}, Stop* stop = nullptr)
+{
+    detail::Calls calls{options, nullptr};
+    const detail::OptionsHandle handle = detail::make_options(calls);
+    detail::set_advice_options(handle.get(), options);
+    assay_host_advice* advice = nullptr;
+    const assay_host_error error = assay_host_advise(
+        handle.get(), folder.c_str(), stop != nullptr ? stop->get() : nullptr, &advice);
+    std::unique_ptr<assay_host_advice, detail::Free> owner(advice);
+    if (calls.failure)
+        std::rethrow_exception(calls.failure);
+    detail::check(error);
+    return Advice(owner.release());
 }
 
 } // namespace assay

@@ -9,6 +9,7 @@
 
 #include <assay_host.hpp>
 
+#include "Advices.h"
 #include "TestChild.h"
 
 namespace {
@@ -81,6 +82,109 @@ TEST(Wrapper, ABadOptionThrows)
     assay::Options options = MakeOptions({});
     options.timeout_seconds = -1;
     EXPECT_THROW(run(options), std::invalid_argument);
+    options.timeout_seconds = 1;
+    options.need_opengl = false;
+    EXPECT_THROW(assay::advise("x", options), std::invalid_argument);
+    EXPECT_THROW(assay::advise(""), std::invalid_argument);
+    EXPECT_THROW(assay::State(""), std::invalid_argument);
+}
+
+TEST(Wrapper, AnAdviceAsValues)
+{
+    const StateFolder folder;
+    const assay::Advice first = assay::advise(folder.Get(), MakeOptions(kWorks));
+    EXPECT_EQ(first.usability(assay::Interface::opengl), assay::Usability::hardware);
+    EXPECT_EQ(first.usability(assay::Interface::opencl), assay::Usability::absent);
+    EXPECT_TRUE(first.tried());
+    EXPECT_FALSE(first.stopped());
+    EXPECT_EQ(first.plan(), assay::Plan::attempt);
+    EXPECT_EQ(to_string(first.plan()), "try");
+    EXPECT_EQ(first.due(), "first");
+    EXPECT_EQ(first.attempts(), 1U);
+    EXPECT_THAT(first.messages(), testing::IsEmpty());
+    EXPECT_EQ(first.document().front(), '{');
+    EXPECT_FALSE(first.identity().empty());
+    const assay::Advised gl = first.of(assay::Interface::opengl);
+    EXPECT_EQ(gl.usability, assay::Usability::hardware);
+    EXPECT_EQ(gl.learnt, assay::Usability::hardware);
+    EXPECT_THAT(
+        (std::vector<std::string>{gl.reason, gl.source, gl.device, gl.device_name, gl.device_driver,
+                                  gl.end, gl.last_line, gl.warning}),
+        ElementsAre("trials-passed", "attempt", "glgpu[0]", "A card", "1.2", "ended", "", ""));
+    EXPECT_EQ(gl.text, assay_host_advice_text(first.get(), ASSAY_HOST_OPENGL));
+    EXPECT_EQ(gl.end_text, assay_host_advice_end_text(first.get(), ASSAY_HOST_OPENGL));
+    EXPECT_EQ(gl.change, assay_host_advice_change(first.get(), ASSAY_HOST_OPENGL));
+    EXPECT_TRUE(gl.age_seconds);
+    EXPECT_TRUE(gl.next_attempt_seconds);
+    EXPECT_EQ(gl.failures, 0U);
+}
+
+TEST(Wrapper, AnAdviceByEachOption)
+{
+    const StateFolder folder;
+    assay::Options options = MakeOptions(kCrashes);
+    options.dry_run = true;
+    EXPECT_EQ(assay::advise(folder.Get(), options).plan(), assay::Plan::attempt);
+    EXPECT_FALSE(folder.Exists());
+    options.dry_run = false;
+    const assay::Advised crashed =
+        assay::advise(folder.Get(), options).of(assay::Interface::opengl);
+    EXPECT_EQ(crashed.usability, assay::Usability::broken);
+    EXPECT_EQ(crashed.last_line, "# a call");
+    EXPECT_EQ(crashed.failures, 1U);
+    options.pause_seconds = 0;
+    options.retries = 0;
+    EXPECT_FALSE(assay::advise(folder.Get(), options).tried());
+    options.retries = 2;
+    EXPECT_TRUE(assay::advise(folder.Get(), options).tried());
+    assay::State(folder.Get()).forget();
+    options.arguments = kWorks;
+    EXPECT_TRUE(assay::advise(folder.Get(), options).tried());
+    EXPECT_FALSE(assay::advise(folder.Get(), options).tried());
+    options.fresh = true;
+    EXPECT_EQ(assay::advise(folder.Get(), options).due(), "requested");
+}
+
+TEST(Wrapper, AnExceptionOfACallbackEndsAnAttemptAndArrives)
+{
+    const StateFolder folder;
+    assay::Options options = MakeOptions({"out", "x", "sleep", "600000"});
+    options.on_line = [](std::string_view line, double) -> bool {
+        throw std::runtime_error("of " + std::string(line));
+    };
+    try {
+        assay::advise(folder.Get(), options);
+        FAIL() << "no exception";
+    } catch (const std::runtime_error& failure) {
+        EXPECT_STREQ(failure.what(), "of x");
+    }
+    const assay::Advice later = assay::advise(folder.Get(), MakeOptions(kWorks));
+    EXPECT_EQ(later.of(assay::Interface::opengl).warning, "") << "nobody is blamed";
+    EXPECT_TRUE(later.tried());
+    assay::Stop stop;
+    stop.raise();
+    options = MakeOptions(kWorks);
+    options.fresh = true;
+    EXPECT_TRUE(assay::advise(folder.Get(), options, &stop).stopped());
+}
+
+TEST(Wrapper, AChoiceAndItsFailures)
+{
+    const StateFolder folder;
+    assay::State state(folder.Get());
+    state.set_choice(assay::Interface::opencl, assay::Choice::absent);
+    EXPECT_EQ(state.choice(assay::Interface::opencl), assay::Choice::absent);
+    EXPECT_EQ(state.choice(assay::Interface::opengl), assay::Choice::automatic);
+    state.forget();
+    EXPECT_EQ(state.choice(assay::Interface::opencl), assay::Choice::automatic);
+    assay::State bad(std::string(folder.Get()) + "/none/none");
+    try {
+        bad.set_choice(assay::Interface::opengl, assay::Choice::hardware);
+        FAIL() << "no exception";
+    } catch (const std::runtime_error& failure) {
+        EXPECT_THAT(failure.what(), testing::StartsWith("The state can't be changed: "));
+        EXPECT_EQ(failure.what(), bad.message());
+    }
 }
 
 } // namespace
