@@ -120,19 +120,20 @@ class Workshop:
             self.refused.write_text(json.dumps(sorted(refused)))
 
     def blame(self, output, numbered, refused):
-        """The mutants at the lines that the compiler's errors name, or, if there are none, those that
-        turned constants into variables, or change numbers, or all of the files that are named."""
+        """The mutants at the lines that the compiler's errors name, or, if there are none, those at the
+        lines that lead to the errors, or those that turned constants into variables, or change numbers,
+        or all of the files that are named."""
         more = set()
         for failed in re.split(r"^FAILED: ", output, flags=re.M)[1:]:
-            places = self.places(failed)
+            errors, others = self.places(failed)
             here = {path: [(number, each) for number, each in numbered.get(path, [])
-                           if each.form != "alone" and each.name not in refused] for path, _ in places}
-            exact = {each.name for path, line in places for _, each in here[path]
-                     if line in self.lines(path, each)}
+                           if each.form != "alone" and each.name not in refused] for path, _ in errors | others}
+            near = [{each.name for path, line in places for _, each in here[path]
+                     if line in self.lines(path, each)} for places in (errors, others)]
             constants = {each.name for mutants in here.values() for _, each in mutants if each.relaxed}
             numbers = {each.name for mutants in here.values() for _, each in mutants if each.kind == "constant"}
             every = {each.name for mutants in here.values() for _, each in mutants}
-            more |= exact or constants or numbers or every
+            more |= near[0] or near[1] or constants or numbers or every
         return more
 
     def lines(self, path, mutant):
@@ -143,8 +144,7 @@ class Workshop:
         return range(first, last + 1)
 
     def places(self, failed):
-        """Where errors are: (path, line) of the tree. A place that only leads to an error counts if
-        no error itself is in the tree."""
+        """Where errors are, and the places that only lead to them: (path, line) of the tree."""
         found = {"error": set(), "other": set()}
         for line in failed.splitlines():
             for match in ERROR.finditer(line):
@@ -156,7 +156,7 @@ class Workshop:
                     continue
                 if name in self.names:
                     found["error" if " error: " in line else "other"].add((name, int(match.group(2))))
-        return found["error"] or found["other"]
+        return found["error"], found["other"]
 
     def alone(self, mutant):
         """Writes one mutant into the plain text of its file."""
