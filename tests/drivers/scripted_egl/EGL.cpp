@@ -493,6 +493,18 @@ EGLAPI EGLSurface EGLAPIENTRY eglCreatePbufferSurface(EGLDisplay handle, EGLConf
     return objects.surfaces.back().get();
 }
 
+// This driver has no windows.
+EGLAPI EGLSurface EGLAPIENTRY eglCreateWindowSurface(EGLDisplay handle, EGLConfig /*config*/,
+                                                     EGLNativeWindowType /*window*/,
+                                                     const EGLint* attributes)
+{
+    const Call call("eglCreateWindowSurface", DeviceOfDisplay(handle),
+                    {DisplayArgument(handle), AttributesArgument(attributes)});
+    if (!call.Over() && Ready(handle) != nullptr)
+        Fail(EGL_BAD_NATIVE_WINDOW);
+    return EGL_NO_SURFACE;
+}
+
 EGLAPI EGLBoolean EGLAPIENTRY eglDestroySurface(EGLDisplay handle, EGLSurface surface)
 {
     const Call call("eglDestroySurface", DeviceOfDisplay(handle),
@@ -529,6 +541,35 @@ EGLAPI EGLBoolean EGLAPIENTRY eglMakeCurrent(EGLDisplay handle, EGLSurface draw,
     tDisplay = handle;
     tSurface = draw;
     return EGL_TRUE;
+}
+
+EGLAPI EGLBoolean EGLAPIENTRY eglSwapBuffers(EGLDisplay handle, EGLSurface surface)
+{
+    const Call call("eglSwapBuffers", DeviceOfDisplay(handle),
+                    {DisplayArgument(handle), SurfaceArgument(surface)});
+    if (call.Over())
+        return call.Answer();
+    return Find(GetObjects().surfaces, surface) == nullptr ? Fail(EGL_BAD_SURFACE) : EGL_TRUE;
+}
+
+EGLAPI EGLBoolean EGLAPIENTRY eglSwapInterval(EGLDisplay handle, EGLint interval)
+{
+    const Call call("eglSwapInterval", DeviceOfDisplay(handle),
+                    {DisplayArgument(handle), Number(interval)});
+    return call.Over() ? call.Answer() : EGL_TRUE;
+}
+
+EGLAPI EGLBoolean EGLAPIENTRY eglWaitGL(void)
+{
+    const Call call("eglWaitGL", tContext == nullptr ? -1 : tContext->device, {});
+    return call.Over() ? call.Answer() : EGL_TRUE;
+}
+
+EGLAPI EGLBoolean EGLAPIENTRY eglWaitNative(EGLint engine)
+{
+    const Call call("eglWaitNative", tContext == nullptr ? -1 : tContext->device,
+                    {Enum(static_cast<std::uint32_t>(engine))});
+    return call.Over() ? call.Answer() : EGL_TRUE;
 }
 
 EGLAPI EGLContext EGLAPIENTRY eglGetCurrentContext(void)
@@ -586,8 +627,13 @@ EGLAPI __eglMustCastToProperFunctionPointerType EGLAPIENTRY eglGetProcAddress(co
         {"eglCreateContext", reinterpret_cast<Entry>(&eglCreateContext)},
         {"eglDestroyContext", reinterpret_cast<Entry>(&eglDestroyContext)},
         {"eglCreatePbufferSurface", reinterpret_cast<Entry>(&eglCreatePbufferSurface)},
+        {"eglCreateWindowSurface", reinterpret_cast<Entry>(&eglCreateWindowSurface)},
         {"eglDestroySurface", reinterpret_cast<Entry>(&eglDestroySurface)},
         {"eglMakeCurrent", reinterpret_cast<Entry>(&eglMakeCurrent)},
+        {"eglSwapBuffers", reinterpret_cast<Entry>(&eglSwapBuffers)},
+        {"eglSwapInterval", reinterpret_cast<Entry>(&eglSwapInterval)},
+        {"eglWaitGL", reinterpret_cast<Entry>(&eglWaitGL)},
+        {"eglWaitNative", reinterpret_cast<Entry>(&eglWaitNative)},
         {"eglGetCurrentContext", reinterpret_cast<Entry>(&eglGetCurrentContext)},
         {"eglGetCurrentDisplay", reinterpret_cast<Entry>(&eglGetCurrentDisplay)},
         {"eglGetCurrentSurface", reinterpret_cast<Entry>(&eglGetCurrentSurface)},
