@@ -11,8 +11,8 @@ enum class Interface { kOpenGL, kOpenCL };
 class DriverCallObserver {
 public:
     virtual ~DriverCallObserver() = default;
-    virtual void BeforeCall(Interface interface) noexcept = 0;
-    virtual void AfterCall(Interface interface) noexcept = 0;
+    virtual void BeforeCall(Interface kind) noexcept = 0;
+    virtual void AfterCall(Interface kind) noexcept = 0;
 };
 
 namespace detail {
@@ -35,7 +35,7 @@ inline bool IsObserved()
 // A call, from the construction to the destruction.
 class DriverCall {
 public:
-    explicit DriverCall(Interface interface) noexcept : fInterface(interface)
+    explicit DriverCall(Interface kind) noexcept : fInterface(kind)
     {
         if (IsObserved())
             detail::gDriverCallObserver->BeforeCall(fInterface);

@@ -17,23 +17,17 @@ public:
     RecordedCalls(const RecordedCalls&) = delete;
     RecordedCalls& operator=(const RecordedCalls&) = delete;
 
-    void BeforeCall(QGF::Core::Interface interface) noexcept override
-    {
-        Add("before " + GetName(interface));
-    }
+    void BeforeCall(QGF::Core::Interface kind) noexcept override { Add("before " + GetName(kind)); }
 
-    void AfterCall(QGF::Core::Interface interface) noexcept override
-    {
-        Add("after " + GetName(interface));
-    }
+    void AfterCall(QGF::Core::Interface kind) noexcept override { Add("after " + GetName(kind)); }
 
     void Add(std::string text) { fCalls.push_back(std::move(text)); }
     const std::vector<std::string>& Get() const { return fCalls; }
 
 private:
-    static std::string GetName(QGF::Core::Interface interface)
+    static std::string GetName(QGF::Core::Interface kind)
     {
-        return interface == QGF::Core::Interface::kOpenGL ? "OpenGL" : "OpenCL";
+        return kind == QGF::Core::Interface::kOpenGL ? "OpenGL" : "OpenCL";
     }
 
     std::vector<std::string> fCalls;

@@ -17,9 +17,9 @@ namespace {
 
 using QGF::Core::Interface;
 
-const char* GetName(Interface interface)
+const char* GetName(Interface kind)
 {
-    return interface == Interface::kOpenGL ? "OpenGL" : "OpenCL";
+    return kind == Interface::kOpenGL ? "OpenGL" : "OpenCL";
 }
 
 class DriverFileLog : public QGF::Core::DriverCallObserver {
@@ -35,10 +35,10 @@ public:
         Look([](const std::string&) {});
     }
 
-    void AfterCall(Interface interface) noexcept override
+    void AfterCall(Interface kind) noexcept override
     {
-        Look([interface](const std::string& path) {
-            PM_LOG(gGPUAssay, "loaded for " << GetName(interface) << ": " << path);
+        Look([kind](const std::string& path) {
+            PM_LOG(gGPUAssay, "loaded for " << GetName(kind) << ": " << path);
         });
     }
 
