@@ -20,7 +20,8 @@ auto Fields(const DriverFile& file)
 
 auto Fields(const Identity& identity)
 {
-    return std::tie(identity.fAdapters, identity.fFiles, identity.fSystem, identity.fAssayVersion);
+    return std::tie(identity.fAdapters, identity.fFiles, identity.fVariables, identity.fSystem,
+                    identity.fAssayVersion);
 }
 
 template <typename T>

@@ -1,5 +1,6 @@
 // The identity of what draws and computes on a machine: its adapters with their drivers, the files
-// that OpenGL and OpenCL would load, the system and assay. What a run found holds for one identity.
+// that OpenGL and OpenCL would load, the variables that select among them, the system and assay.
+// What a run found holds for one identity.
 #pragma once
 
 #include <cstdint>
@@ -33,6 +34,7 @@ struct DriverFile {
 struct Identity {
     std::vector<AdapterIdentity> fAdapters; // sorted by all fields in their order
     std::vector<DriverFile> fFiles;         // sorted by all fields in their order, each once
+    std::vector<std::string> fVariables;    // "NAME=value" of ListVariables()
     std::string fSystem;                    // the operating system's build and the kernel's
     std::string fAssayVersion;              // of the program's file; empty if it can't be read
 };

@@ -8,6 +8,9 @@
 #include <charconv>
 #include <map>
 #include <string_view>
+#include <utility>
+
+#include "identity/Variables.h"
 
 namespace assay_host {
 
@@ -91,6 +94,11 @@ public:
             AddDriverFiles(GetClassKey(Values(fSource, kEnum + device)));
         AddOpenCLLists();
         AddOpenGLList();
+        // Windows has no variable without a value.
+        fIdentity.fVariables = ListVariables([this](const std::string& name) {
+            std::string value = fSource.GetVariable(name);
+            return value.empty() ? std::nullopt : std::optional(std::move(value));
+        });
         SortIdentity(fIdentity);
         return std::move(fIdentity);
     }

@@ -128,6 +128,8 @@ Identity ReadIdentity(const Json& json)
         identity.fAdapters.push_back(ReadAdapter(adapter));
     for (const Json& file : json.at("files"))
         identity.fFiles.push_back(ReadFile(file));
+    for (const Json& variable : json.at("variables"))
+        identity.fVariables.push_back(ReadText(variable));
     identity.fSystem = ReadText(json.at("system"));
     identity.fAssayVersion = ReadText(json.at("assay"));
     return identity;
@@ -216,12 +218,16 @@ Json MakeIdentityJson(const Identity& identity)
     Json adapters = Json::array();
     for (const AdapterIdentity& adapter : identity.fAdapters)
         adapters.push_back(MakeAdapter(adapter));
+    Json variables = Json::array();
+    for (const std::string& variable : identity.fVariables)
+        variables.push_back(EncodeBytes(variable));
     Json files = Json::array();
     for (const DriverFile& file : identity.fFiles)
         files.push_back(MakeFile(file));
     return {{"system", EncodeBytes(identity.fSystem)},
             {"assay", EncodeBytes(identity.fAssayVersion)},
             {"adapters", adapters},
+            {"variables", variables},
             {"files", files}};
 }
 
@@ -254,7 +260,7 @@ Knowledge ReadAttemptsJson(const Json& content)
 std::string GetIdentityName(const Json& identity)
 {
     // The files make up most of it. To dump them takes longer than to join them.
-    std::string text = identity.at("adapters").dump();
+    std::string text = identity.at("adapters").dump() + identity.at("variables").dump();
     const auto add = [&text](const Json& json) {
         const auto& part = json.get_ref<const std::string&>();
         text += fmt::format("\n{} ", part.size()) + part;

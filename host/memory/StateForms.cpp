@@ -96,6 +96,8 @@ std::string MakeStateText(const StoredKnowledge& entry)
     text += "  assay " + ShowBytes(identity.fAssayVersion) + "\n";
     for (const AdapterIdentity& adapter : identity.fAdapters)
         text += "  adapter " + GetAdapterText(adapter) + "\n";
+    for (const std::string& variable : identity.fVariables)
+        text += "  variable " + ShowBytes(variable) + "\n";
     for (const DriverFile& file : identity.fFiles)
         text += fmt::format("  {} file {}, {} bytes, {}{}\n", GetKindName(file.fInterface),
                             ShowBytes(file.fPath), file.fSize, MakeUtcText(file.fTime / 1000000000),

@@ -1,7 +1,10 @@
 #include "identity/linux/Machine.h"
 
+#include <optional>
+
 #include "facts/FileVersion.h"
 #include "facts/OsRelease.h"
+#include "identity/Variables.h"
 #include "identity/linux/Adapters.h"
 #include "identity/linux/DriverFiles.h"
 
@@ -30,6 +33,11 @@ Identity GetMachineIdentity(const Files& files, const Process& process)
     Identity identity;
     identity.fAdapters = ListAdapters(files);
     identity.fFiles = ListDriverFiles(files, process);
+    identity.fVariables = ListVariables([&](const std::string& name) {
+        const auto variable = process.fVariables.find(name);
+        return variable == process.fVariables.end() ? std::nullopt
+                                                    : std::optional(variable->second);
+    });
     identity.fSystem = GetSystem(files);
     SortIdentity(identity);
     return identity;

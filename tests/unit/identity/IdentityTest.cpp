@@ -16,6 +16,7 @@ Identity MakeSample()
                           {"0000:00:02.0", 0x8086, 0xA7A0, "i915", ""}};
     identity.fFiles = {{DeviceKind::kOpenCL, "/usr/lib/libOpenCL.so.1.0.0", 100, 2, "ab"},
                        {DeviceKind::kOpenGL, "/usr/lib/libEGL.so.1.1.0", 200, 1, ""}};
+    identity.fVariables = {"DRI_PRIME=1"};
     identity.fSystem = "Debian; 6.12";
     identity.fAssayVersion = "1.0.0";
     SortIdentity(identity);
@@ -37,6 +38,8 @@ TEST(Identity, DiffersByEveryField)
         [](Identity& i) { ++i.fFiles[0].fTime; },
         [](Identity& i) { i.fFiles[0].fBuildId = "cd"; },
         [](Identity& i) { i.fFiles.pop_back(); },
+        [](Identity& i) { i.fVariables[0] = "DRI_PRIME=0"; },
+        [](Identity& i) { i.fVariables.pop_back(); },
         [](Identity& i) { i.fSystem = "Debian; 6.13"; },
         [](Identity& i) { i.fAssayVersion = "1.0.1"; },
     };

@@ -209,6 +209,10 @@ TEST_F(WindowsRulesTest, ChangeTheIdentity)
     fWindows.fKeys[kVendors].clear();
     fWindows.fKeys[kClass + kDisplay + "\\0000"][0] = MakeText("DriverVersion", "31.0.15.5124");
     EXPECT_NE(GetWindowsIdentity(fWindows), before) << "the driver has another version";
+    fWindows.fKeys[kClass + kDisplay + "\\0000"][0] = MakeText("DriverVersion", "31.0.15.5123");
+    EXPECT_EQ(GetWindowsIdentity(fWindows), before);
+    fWindows.fVariables["GALLIUM_DRIVER"] = "llvmpipe";
+    EXPECT_NE(GetWindowsIdentity(fWindows), before) << "a variable selects another driver";
 }
 
 } // namespace

@@ -81,6 +81,8 @@ TEST(KnowledgeJsonTest, EachFactOfAnIdentityChangesItsName)
         [](Identity& identity) { ++identity.fAdapters[0].fDevice; },
         [](Identity& identity) { identity.fAdapters[0].fDriver += "x"; },
         [](Identity& identity) { identity.fAdapters[0].fDriverVersion += "x"; },
+        [](Identity& identity) { identity.fVariables.pop_back(); },
+        [](Identity& identity) { identity.fVariables[0] += "x"; },
         [](Identity& identity) { identity.fFiles.pop_back(); },
         [](Identity& identity) { identity.fFiles[0].fInterface = DeviceKind::kOpenCL; },
         [](Identity& identity) { identity.fFiles[0].fPath += "x"; },

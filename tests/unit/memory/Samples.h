@@ -20,6 +20,7 @@ inline Identity MakeIdentity()
     identity.fFiles = {
         {DeviceKind::kOpenGL, "/usr/lib/libEGL.so.1.1.0", 77000, 1'700'000'000'000'000'001, "ab12"},
         {DeviceKind::kOpenCL, "/usr/lib/libOpenCL.so.1.0.0", 1ULL << 60, -5, ""}};
+    identity.fVariables = {"DRI_PRIME=1"};
     identity.fSystem = "Linux 6.1.0-13";
     identity.fAssayVersion = "1.0.0";
     return identity;

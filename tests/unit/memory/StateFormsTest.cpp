@@ -37,6 +37,7 @@ TEST(StateFormsTest, ShowsAllOfAnEntry)
   assay 1.0.0
   adapter 0000:01:00.0 10de:2484 nvidia 535.1
   adapter 0000:02:00.0 1002:73bf amdgpu
+  variable DRI_PRIME=1
   OpenGL file /usr/lib/libEGL.so.1.1.0, 77000 bytes, 2023-11-14T22:13:20Z, build ab12
   OpenCL file /usr/lib/libOpenCL.so.1.0.0, 1152921504606846976 bytes, 1970-01-01T00:00:00Z
   attempts: 3, the last 3:

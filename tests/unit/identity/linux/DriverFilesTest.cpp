@@ -227,6 +227,18 @@ TEST_F(DriverFilesTest, AreThoseThatTheEnvironmentNamesForOpenCL)
     EXPECT_FALSE(Has("/opt/two/libtwo.so"));
 }
 
+TEST_F(DriverFilesTest, HaveTheVariablesThatSelectAmongThem)
+{
+    const Identity before = Read();
+    EXPECT_EQ(before.fVariables, Names());
+    fProcess.fVariables = {{"PATH", "/bin"}, {"LIBGL_ALWAYS_SOFTWARE", "1"}};
+    const Identity after = Read();
+    EXPECT_EQ(after.fVariables, Names{"LIBGL_ALWAYS_SOFTWARE=1"});
+    EXPECT_NE(after, before);
+    fProcess.fVariables.erase("LIBGL_ALWAYS_SOFTWARE");
+    EXPECT_EQ(Read(), before);
+}
+
 TEST_F(DriverFilesTest, AreFoundByTheFoldersOfTheProgram)
 {
     FakeElf program;
