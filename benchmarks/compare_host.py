@@ -14,12 +14,13 @@ import argparse
 import fcntl
 import json
 import os
-import random
 import statistics
 import subprocess
 import sys
 import time
 from pathlib import Path
+
+from scripted_runs import scripted_environment, time_in_turn, time_once
 
 TREE = Path(__file__).resolve().parents[1]
 
@@ -29,25 +30,6 @@ GOAL_MIB = 10.0
 F_SETPIPE_SZ = 1031  # in module fcntl only from Python 3.10 on
 
 FORMATS = ["text", "json", "jsonl"]
-
-SCRIPT = """device
-software
-string GL_VENDOR "A vendor"
-string GL_RENDERER "A renderer"
-version "2.1 Scripted"
-extensions "GL_ARB_vertex_program GL_ARB_fragment_program GL_EXT_framebuffer_object"
-"""
-
-
-def time_once(command, environment):
-    start = time.perf_counter()
-    with open(os.devnull, "r+b") as null:
-        status = subprocess.run(command, env=environment, stdin=null, stdout=null, stderr=null,
-                                check=False).returncode
-    taken = 1000 * (time.perf_counter() - start)
-    if status != 0:
-        sys.exit(f"{' '.join(map(str, command))} ended with {status}")
-    return taken
 
 
 def read_kib(path, name):
@@ -108,30 +90,16 @@ def main():
     options = parser.parse_args()
     build = options.build.resolve()
     assay, host = build / "bin" / "assay", build / "bin" / "assay-host"
-
-    environment = dict(os.environ)
-    if not options.real:
-        script = build / "compare_host.script"
-        script.write_text(SCRIPT)
-        empty = build / "compare_host.no-opencl"
-        empty.mkdir(exist_ok=True)
-        for name in ("libOpenCL.so.1", "libOpenCL.so"):
-            (empty / name).touch()
-        environment["LD_LIBRARY_PATH"] = f"{build / 'drivers' / 'egl'}:{empty}"
-        environment["ASSAY_SCRIPTED_EGL"] = str(script)
+    environment = (dict(os.environ) if options.real
+                   else scripted_environment(build, "compare_host", "software\n"))
 
     commands = {"assay alone": [assay]}
     for form in FORMATS:
         commands[f"supervised, {form}"] = [host, "run", "--format", form]
-    times = {name: [] for name in commands}
     for command in commands.values():
         time_once(command, environment)
-    shuffle = random.Random(1).shuffle
-    order = list(commands)
-    for _ in range(options.runs):
-        shuffle(order)
-        for name in order:
-            times[name].append(time_once(commands[name], environment))
+    taken = time_in_turn(commands, options.runs, environment)
+    times = {name: [each.wall for each in runs] for name, runs in taken.items()}
     peaks = {name: statistics.median(peak_of(command, environment) for _ in range(5))
              for name, command in commands.items()}
 
