@@ -47,7 +47,10 @@ _assay_host() {
         COMPREPLY=($(compgen -W "crash throw both" -- "$cur"))
         return
         ;;
-    --timeout | --tolerance | --require | --wait | --max-age | --pause | --retries | --forgive) return ;;
+    --timeout | --tolerance | --require | --wait | --max-age | --pause | --pause-growth | --retries | \
+        --forgive | --forgive-freeze | --keep-absent | --keep-unknown | --unclear | --unclear-pause)
+        return
+        ;;
     esac
 
     local options="--help"
@@ -58,7 +61,8 @@ _assay_host() {
     check) options+=" --require --requirements --from --assay --timeout --" ;;
     advise)
         options+=" --state --assay --timeout --format --need --wait --max-age --fresh --pause"
-        options+=" --retries --forgive --dry-run"
+        options+=" --pause-growth --retries --forgive --forgive-freeze --keep-absent --keep-unknown"
+        options+=" --unclear --unclear-pause --dry-run"
         ;;
     state) options+=" --state" ;;
     *) options="run torture diff check advise state --help --version" ;;

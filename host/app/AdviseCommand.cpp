@@ -40,6 +40,12 @@ AdviceRequest MakeRequest(const AdviseChoice& choice)
     request.fPolicy.fFirstPause = ToSeconds(choice.fPauseSeconds, 1);
     request.fPolicy.fRetries = choice.fRetries;
     request.fPolicy.fForgiven = ToSeconds(choice.fForgiveDays, Policy::kDay);
+    request.fPolicy.fAbsentKept = ToSeconds(choice.fKeepAbsentSeconds, 1);
+    request.fPolicy.fUnknownKept = ToSeconds(choice.fKeepUnknownSeconds, 1);
+    request.fPolicy.fPauseGrowth = choice.fPauseGrowth;
+    request.fPolicy.fFreezeForgiven = ToSeconds(choice.fForgiveFreezeDays, Policy::kDay);
+    request.fPolicy.fMaxUnclear = choice.fUnclear;
+    request.fPolicy.fUnclearPause = ToSeconds(choice.fUnclearPauseSeconds, 1);
     return request;
 }
 

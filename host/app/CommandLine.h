@@ -50,6 +50,12 @@ struct AdviseChoice {
     double fPauseSeconds = 60; // before the second attempt after a failure
     unsigned fRetries = 2;
     double fForgiveDays = 7;
+    double fKeepAbsentSeconds = 600;
+    double fKeepUnknownSeconds = 60;
+    unsigned fPauseGrowth = 60; // each further pause is longer by this factor
+    double fForgiveFreezeDays = 30;
+    unsigned fUnclear = 3; // attempts in a row that showed nothing, before there is a pause
+    double fUnclearPauseSeconds = 600;
 };
 
 enum class StateAction { kList, kShow, kForget, kSet };

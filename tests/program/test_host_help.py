@@ -102,8 +102,14 @@ Options:
   --max-age DAYS          try again what is older than this [30]
   --fresh                 try again at any age
   --pause SECONDS         before the next attempt after a failure [60]
+  --pause-growth FACTOR   each further pause is longer by this [60]
   --retries NUMBER        attempts after a first failure [2]
   --forgive DAYS          failures older than this don't count [7]
+  --forgive-freeze DAYS   ends of the system older than this don't count [30]
+  --keep-absent SECONDS   try again what is absent, after [600]
+  --keep-unknown SECONDS  try again what is unknown, after [60]
+  --unclear NUMBER        attempts in a row that may show nothing [3]
+  --unclear-pause SECONDS before the next attempt after so many [600]
   --dry-run               show what the next call would do, without doing it
 
 exit status: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown,

@@ -29,11 +29,22 @@ public:
         command.add_flag("--fresh", fChoice.fFresh, "try again at any age");
         AddNumber(command, "--pause", fChoice.fPauseSeconds,
                   "before the next attempt after a failure [60]", "SECONDS");
-        command.add_option("--retries", fChoice.fRetries, "attempts after a first failure [2]")
-            ->option_text("NUMBER")
-            ->check(CLI::Range(0, 1000));
+        AddCount(command, "--pause-growth", fChoice.fPauseGrowth,
+                 "each further pause is longer by this [60]", "FACTOR", 1);
+        AddCount(command, "--retries", fChoice.fRetries, "attempts after a first failure [2]",
+                 "NUMBER", 0);
         AddNumber(command, "--forgive", fChoice.fForgiveDays,
                   "failures older than this don't count [7]", "DAYS");
+        AddNumber(command, "--forgive-freeze", fChoice.fForgiveFreezeDays,
+                  "ends of the system older than this don't count [30]", "DAYS");
+        AddNumber(command, "--keep-absent", fChoice.fKeepAbsentSeconds,
+                  "try again what is absent, after [600]", "SECONDS");
+        AddNumber(command, "--keep-unknown", fChoice.fKeepUnknownSeconds,
+                  "try again what is unknown, after [60]", "SECONDS");
+        AddCount(command, "--unclear", fChoice.fUnclear,
+                 "attempts in a row that may show nothing [3]", "NUMBER", 1);
+        AddNumber(command, "--unclear-pause", fChoice.fUnclearPauseSeconds,
+                  "before the next attempt after so many [600]", "SECONDS");
         command.add_flag("--dry-run", fChoice.fDryRun,
                          "show what the next call would do, without doing it");
     }
@@ -49,6 +60,15 @@ public:
     }
 
 private:
+    static void AddCount(CLI::App& command, const std::string& name, unsigned& count,
+                         const std::string& text, const std::string& value, unsigned min)
+    {
+        constexpr unsigned kMaxCount = 1000;
+        command.add_option(name, count, text)
+            ->option_text(value)
+            ->check(CLI::Range(min, kMaxCount));
+    }
+
     AdviseChoice fChoice;
     std::string fFormat = "text";
     std::string fNeed = "opengl";
