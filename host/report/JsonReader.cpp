@@ -14,7 +14,9 @@
 #include "report/Bytes.h"
 #include "report/JsonBytes.h"
 #include "report/JsonDocument.h"
+#include "report/JsonMembers.h"
 #include "report/JsonParts.h"
+#include "report/JsonRun.h"
 #include "report/LineForm.h"
 #include "report/ReportReader.h"
 
@@ -26,23 +28,6 @@ using Json = nlohmann::ordered_json;
 
 const std::string kDocument = "the document";
 
-// Returns a required member of an object. Throws if it is missing or of another type.
-const Json& Get(const Json& object, const std::string& where, const char* name,
-                bool (Json::*isType)() const noexcept, const char* type)
-{
-    const auto member = object.find(name);
-    if (member == object.end())
-        throw std::runtime_error(fmt::format("{}: \"{}\" is missing", where, name));
-    if (!((*member).*isType)())
-        throw std::runtime_error(fmt::format("{}: \"{}\" is not {}", where, name, type));
-    return *member;
-}
-
-std::string GetString(const Json& object, const std::string& where, const char* name)
-{
-    return Get(object, where, name, &Json::is_string, "a string").get<std::string>();
-}
-
 // Reads a line of a document or an event.
 ReportLine ReadJsonLine(const Json& json, const std::string& where)
 {
@@ -53,8 +38,8 @@ ReportLine ReadJsonLine(const Json& json, const std::string& where)
     std::string end = GetString(json, where, "end");
     if (!end.empty() && end != "\n" && end != "\r\n")
         throw std::runtime_error(where + ": \"end\" is not a line end");
-    const bool cut =
-        json.contains("cut") && Get(json, where, "cut", &Json::is_boolean, "a bool").get<bool>();
+    const bool cut = json.contains("cut") &&
+                     GetMember(json, where, "cut", &Json::is_boolean, "a bool").get<bool>();
     ReportLine line = ReadLine(std::move(text), std::move(end), cut);
     if (kind != GetLineKindName(line.fKind))
         throw std::runtime_error(
@@ -64,7 +49,7 @@ ReportLine ReadJsonLine(const Json& json, const std::string& where)
 
 void CheckSchema(const Json& json, const std::string& where)
 {
-    const Json& schema = Get(json, where, "schema", &Json::is_number_integer, "an integer");
+    const Json& schema = GetMember(json, where, "schema", &Json::is_number_integer, "an integer");
     if (schema != kSchemaVersion && schema != kFirstSchemaVersion)
         throw std::runtime_error(fmt::format("{}: \"schema\" is {}, and only {} and {} can be read",
                                              where, schema.dump(), kFirstSchemaVersion,
@@ -121,10 +106,21 @@ bool IsLineMember(const Json& name)
     return name == "kind" || name == "text" || name == "end" || name == "cut";
 }
 
+// How much of a document or of events is kept besides the lines.
+enum class Extent { kReport, kRun };
+
+// Whether a run has the member of a document or an event besides its lines.
+bool IsRunMember(const std::string& name)
+{
+    return name == "versions" || name == "environment" || name == "command" || name == "outcome";
+}
+
 // A parser callback that collects the lines of a document, checks its schema version, and discards
-// everything else.
+// everything else but, if asked, the members of the run.
 class DocumentFilter {
 public:
+    explicit DocumentFilter(Extent extent) : fExtent(extent) {}
+
     bool operator()(int depth, Json::parse_event_t event, Json& parsed)
     {
         constexpr int kMember = 1;
@@ -133,6 +129,8 @@ public:
         case Json::parse_event_t::key:
             if (depth == kMember)
                 fMember = parsed.get<std::string>();
+            if (fExtent == Extent::kRun && IsRunMember(fMember))
+                return true;
             return depth == kMember ? fMember == "schema" || fMember == "lines"
                                     : fIsInLines && IsLineMember(parsed);
         case Json::parse_event_t::array_start:
@@ -140,7 +138,8 @@ public:
                 fIsInLines = true;
             [[fallthrough]];
         case Json::parse_event_t::object_start:
-            return depth < kMember || (fMember == "lines" && depth <= kLine);
+            return depth < kMember || (fMember == "lines" && depth <= kLine) ||
+                   (fExtent == Extent::kRun && IsRunMember(fMember));
         case Json::parse_event_t::array_end:
             if (depth == kMember)
                 fIsInLines = false;
@@ -160,24 +159,38 @@ public:
     Report TakeReport() { return fLines.TakeReport(); }
 
 private:
+    const Extent fExtent;
     std::string fMember;
     bool fIsInLines = false;
     LineCollector fLines;
 };
 
-// A parser callback that keeps only the members of an event that ReadEvents needs.
-bool KeepEventMembers(int depth, Json::parse_event_t event, Json& parsed)
-{
-    switch (event) {
-    case Json::parse_event_t::key:
-        return parsed == "event" || parsed == "schema" || IsLineMember(parsed);
-    case Json::parse_event_t::object_start:
-    case Json::parse_event_t::array_start:
-        return depth == 0;
-    default:
-        return true;
+// A parser callback that keeps only the members of an event that are needed.
+class EventFilter {
+public:
+    explicit EventFilter(Extent extent) : fExtent(extent) {}
+
+    bool operator()(int depth, Json::parse_event_t event, Json& parsed)
+    {
+        switch (event) {
+        case Json::parse_event_t::key:
+            if (depth == 1)
+                fMember = parsed.get<std::string>();
+            return IsKept() || parsed == "event" || parsed == "schema" || IsLineMember(parsed);
+        case Json::parse_event_t::object_start:
+        case Json::parse_event_t::array_start:
+            return depth == 0 || IsKept();
+        default:
+            return true;
+        }
     }
-}
+
+private:
+    bool IsKept() const { return fExtent == Extent::kRun && IsRunMember(fMember); }
+
+    const Extent fExtent;
+    std::string fMember;
+};
 
 // Iterates over the bytes up to the next line end.
 class LineIterator {
@@ -219,30 +232,32 @@ bool SkipLine(std::streambuf& bytes)
     return next == '\n';
 }
 
-} // namespace
-
-Report ReadDocument(std::istream& text)
+// Parses a document. Stores its report, and returns the rest that was asked for.
+Json ParseDocument(std::istream& text, Extent extent, Report& report)
 {
-    DocumentFilter filter;
-    const Json document = Parse([&] { return Json::parse(text, std::ref(filter)); });
+    DocumentFilter filter(extent);
+    Json document = Parse([&] { return Json::parse(text, std::ref(filter)); });
     if (!document.is_object())
         throw std::runtime_error(kDocument + " is not an object");
     CheckSchema(document, kDocument);
-    Get(document, kDocument, "lines", &Json::is_array, "an array");
-    return filter.TakeReport();
+    GetMember(document, kDocument, "lines", &Json::is_array, "an array");
+    report = filter.TakeReport();
+    return document;
 }
 
-Report ReadEvents(std::istream& text)
+// Calls `take` with each event and the text "line N".
+template <typename Take>
+void ForEachEvent(std::istream& text, Extent extent, Take take)
 {
     std::streambuf& bytes = *text.rdbuf();
     const auto end = std::char_traits<char>::eof();
-    LineCollector lines;
     for (std::size_t number = 1; bytes.sgetc() != end; ++number) {
         const std::string where = fmt::format("line {}", number);
         Json event;
         try {
+            EventFilter filter(extent);
             event = Parse(
-                [&] { return Json::parse(LineIterator(bytes), LineIterator(), KeepEventMembers); });
+                [&] { return Json::parse(LineIterator(bytes), LineIterator(), std::ref(filter)); });
         } catch (const JsonFailure& failure) {
             if (!SkipLine(bytes) && number > 1)
                 break;
@@ -257,15 +272,76 @@ Report ReadEvents(std::istream& text)
                                                           : " is a second event \"start\""));
         if (name == "start")
             CheckSchema(event, where);
-        if (name == "line")
-            lines.Add(event, where);
+        take(name, event, where);
     }
+}
+
+RunFacts ReadFactsOf(const Json& object, const std::string& where)
+{
+    return object["schema"] == kFirstSchemaVersion ? MakeUnknownFacts("the first schema has none")
+                                                   : ReadFacts(object, where);
+}
+
+} // namespace
+
+Report ReadDocument(std::istream& text)
+{
+    Report report;
+    ParseDocument(text, Extent::kReport, report);
+    return report;
+}
+
+Report ReadEvents(std::istream& text)
+{
+    LineCollector lines;
+    ForEachEvent(text, Extent::kReport,
+                 [&](const std::string& name, const Json& event, const std::string& where) {
+                     if (name == "line")
+                         lines.Add(event, where);
+                 });
     return lines.TakeReport();
+}
+
+StoredRun ReadDocumentRun(std::istream& text)
+{
+    StoredRun run;
+    const Json document = ParseDocument(text, Extent::kRun, run.fReport);
+    run.fOutcome = ReadOutcome(document, kDocument);
+    run.fOutcome.fCommand = ReadCommand(document, kDocument);
+    run.fFacts = ReadFactsOf(document, kDocument);
+    return run;
+}
+
+StoredRun ReadEventsRun(std::istream& text)
+{
+    StoredRun run;
+    LineCollector lines;
+    std::vector<std::string> command;
+    bool hasEnd = false;
+    ForEachEvent(text, Extent::kRun,
+                 [&](const std::string& name, const Json& event, const std::string& where) {
+                     if (name == "line")
+                         lines.Add(event, where);
+                     if (name == "start") {
+                         command = ReadCommand(event, where);
+                         run.fFacts = ReadFactsOf(event, where);
+                     }
+                     if (name == "end") {
+                         run.fOutcome = ReadOutcome(event, where);
+                         hasEnd = true;
+                     }
+                 });
+    run.fReport = lines.TakeReport();
+    if (!hasEnd)
+        run.fOutcome = MakeOutcomeOfReport(run.fReport);
+    run.fOutcome.fCommand = std::move(command);
+    return run;
 }
 
 bool IsEvent(const std::string& line)
 {
-    const Json json = Json::parse(line, KeepEventMembers, false);
+    EventFilter filter(Extent::kReport);
+    const Json json = Json::parse(line, std::ref(filter), false);
     return json.is_object() && json.contains("event");
 }
 

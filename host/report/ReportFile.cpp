@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "report/JsonReader.h"
+#include "report/JsonRun.h"
 #include "report/ReportInput.h"
 #include "report/ReportReader.h"
 
@@ -23,6 +24,13 @@ Report ReadJson(ReportInput& input, const std::string& line)
     input.ExpectJson();
     std::istream stream(&input);
     return IsEvent(line) ? ReadEvents(stream) : ReadDocument(stream);
+}
+
+StoredRun ReadJsonRun(ReportInput& input, const std::string& line)
+{
+    input.ExpectJson();
+    std::istream stream(&input);
+    return IsEvent(line) ? ReadEventsRun(stream) : ReadDocumentRun(stream);
 }
 
 Report ReadText(ReportInput& input)
@@ -47,17 +55,38 @@ Report ReadText(ReportInput& input)
     return report;
 }
 
-} // namespace
+StoredRun ReadTextRun(ReportInput& input)
+{
+    StoredRun run;
+    run.fReport = ReadText(input);
+    run.fOutcome = MakeOutcomeOfReport(run.fReport);
+    run.fFacts = MakeUnknownFacts("the file has only the report");
+    return run;
+}
 
-Report LoadReport(const std::string& path)
+// Opens the file and reads it by its form. Adds the path to what is thrown.
+template <typename FromText, typename FromJson>
+auto Load(const std::string& path, FromText fromText, FromJson fromJson)
 {
     try {
         ReportInput input(path);
         const std::string line = input.PeekJsonLine(kMaxStartBytes);
-        return line.empty() ? ReadText(input) : ReadJson(input, line);
+        return line.empty() ? fromText(input) : fromJson(input, line);
     } catch (const std::runtime_error& failure) {
         throw std::runtime_error(path + ": " + failure.what());
     }
+}
+
+} // namespace
+
+Report LoadReport(const std::string& path)
+{
+    return Load(path, ReadText, ReadJson);
+}
+
+StoredRun LoadRun(const std::string& path)
+{
+    return Load(path, ReadTextRun, ReadJsonRun);
 }
 
 } // namespace assay_host

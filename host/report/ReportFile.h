@@ -4,6 +4,7 @@
 #include <string>
 
 #include "report/Report.h"
+#include "report/StoredRun.h"
 
 namespace assay_host {
 
@@ -13,5 +14,9 @@ namespace assay_host {
 // Throws std::runtime_error with the text "PATH: REASON" if the file can't be read or is no report.
 // Any thread may call.
 Report LoadReport(const std::string& path);
+
+// Loads a whole run. Of a file that has only the report's own lines, the outcome is that of
+// MakeOutcomeOfReport() and the facts are unknown. Accepts and throws as LoadReport does.
+StoredRun LoadRun(const std::string& path);
 
 } // namespace assay_host

@@ -1,0 +1,24 @@
+#include "report/StoredRun.h"
+
+#include <fmt/format.h>
+
+#include "report/Answers.h"
+
+namespace assay_host {
+
+RunOutcome MakeOutcomeOfReport(const Report& report)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = report.IsWhole() ? Verdict::kComplete : Verdict::kFailedTests;
+    const std::string next = GetAnswers(report).fNext;
+    outcome.fReason = report.IsWhole()
+                          ? "The report is whole; how the child ended was not stored."
+                          : fmt::format("The report stopped{}; how the child ended was not stored.",
+                                        next.empty() ? "" : " before " + next);
+    for (const ReportLine& line : report.GetLines())
+        if (line.fKind == LineKind::kValue)
+            outcome.fLastReportLine = line.fText;
+    return outcome;
+}
+
+} // namespace assay_host

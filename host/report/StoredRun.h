@@ -1,0 +1,20 @@
+// A run as a file has it.
+#pragma once
+
+#include "report/Report.h"
+#include "report/RunFacts.h"
+#include "report/RunOutcome.h"
+
+namespace assay_host {
+
+struct StoredRun {
+    Report fReport;
+    RunOutcome fOutcome;
+    RunFacts fFacts;
+};
+
+// Makes the outcome of a run of which only the report is stored: complete if it is whole, and
+// failed-tests otherwise. The reason says that the child's end isn't known.
+RunOutcome MakeOutcomeOfReport(const Report& report);
+
+} // namespace assay_host

@@ -1,0 +1,190 @@
+#include <gtest/gtest.h>
+
+#include <functional>
+#include <sstream>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include <nlohmann/json.hpp>
+
+#include "Lines.h"
+#include "Samples.h"
+#include "report/JsonDocument.h"
+#include "report/JsonEvents.h"
+#include "report/JsonReader.h"
+
+namespace assay_host {
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+RunFacts MakeFacts()
+{
+    RunFacts facts;
+    facts.fHostVersion = "1.2.3";
+    facts.fChildVersion = {{}, "its file can't be read"};
+    facts.fEnvironment = {
+        {"Example OS \xFF", {}}, {{}, "no build"},       {"Linux 6.1", {}}, {"x86_64", {}},
+        {"machine", {}},         "2026-11-22T01:26:02Z", "+01:00"};
+    return facts;
+}
+
+// An outcome in which every member has a value of its own.
+RunOutcome MakeFullOutcome(Verdict verdict)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = verdict;
+    outcome.fCommand = {"assay", "-verbose=1", "\xFF"};
+    outcome.fExitStatus = 2;
+    outcome.fTermination = "signal 11 (Segmentation fault)";
+    outcome.fReason = "A reason.";
+    outcome.fSeconds = 1.5;
+    outcome.fTimeoutSeconds = 60;
+    outcome.fLastReportLine = "NumGLGPUs=1";
+    outcome.fLastLogLine = "# log \x80";
+    outcome.fErrorLines = {"first", "", "\xC3"};
+    outcome.fLostOutputBytes = 12;
+    outcome.fLostErrorBytes = 34;
+    outcome.fCauses = {{"glgpu[0].GLVendor", "a cause \xFF"}};
+    outcome.fLeftBehind = true;
+    return outcome;
+}
+
+std::string Write(const StoredRun& run)
+{
+    std::ostringstream out;
+    WriteDocument(out, run.fReport, run.fOutcome, run.fFacts);
+    return out.str();
+}
+
+StoredRun ReadRun(const std::string& document)
+{
+    std::istringstream in(document);
+    return ReadDocumentRun(in);
+}
+
+TEST(StoredRun, ADocumentIsReadBackWhole)
+{
+    const Report report = ReadReport(Sample(2, 1).Set("clgpu[0].CLName", "\"\xFE\"").GetText());
+    for (const Verdict verdict :
+         {Verdict::kComplete, Verdict::kFailedTests, Verdict::kUsageError, Verdict::kCrashed,
+          Verdict::kHung, Verdict::kNeverStarted, Verdict::kInterrupted}) {
+        const StoredRun full = {report, MakeFullOutcome(verdict), MakeFacts()};
+        const std::string document = Write(full);
+        EXPECT_EQ(Write(ReadRun(document)), document);
+        StoredRun bare = {Report(), RunOutcome(), MakeFacts()};
+        bare.fOutcome.fVerdict = verdict;
+        EXPECT_EQ(Write(ReadRun(Write(bare))), Write(bare));
+    }
+}
+
+TEST(StoredRun, TheFirstSchemaHasNoFacts)
+{
+    const RunOutcome outcome = MakeFullOutcome(Verdict::kCrashed);
+    std::ostringstream out;
+    WriteFirstDocument(out, ReadReport(Sample(1, 1).GetText()), outcome);
+    const StoredRun run = ReadRun(out.str());
+    EXPECT_TRUE(run.fOutcome.fCauses.empty());
+    EXPECT_TRUE(run.fFacts.fEnvironment.fTime.empty());
+    EXPECT_EQ(run.fFacts.fEnvironment.fKernel.fReason, "the first schema has none");
+    EXPECT_EQ(run.fFacts.fChildVersion.fReason, "the first schema has none");
+    std::ostringstream again;
+    WriteFirstDocument(again, run.fReport, run.fOutcome);
+    EXPECT_EQ(again.str(), out.str());
+}
+
+TEST(StoredRun, EventsAreReadBackWhole)
+{
+    const Report report = ReadReport(Sample(1, 1).GetText());
+    const RunOutcome outcome = MakeFullOutcome(Verdict::kHung);
+    std::string events = MakeStartEvent(outcome.fCommand, MakeFacts());
+    for (const ReportLine& line : report.GetLines())
+        events += MakeLineEvent(line, 0.5);
+    events += MakeErrorLineEvent("first", 0.5);
+    const std::string unfinished = events;
+    events += MakeEndEvent(GetAnswers(report), outcome);
+    std::istringstream in(events);
+    EXPECT_EQ(Write(ReadEventsRun(in)), Write({report, outcome, MakeFacts()}));
+
+    std::istringstream cut(unfinished);
+    const StoredRun run = ReadEventsRun(cut);
+    EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kComplete);
+    EXPECT_EQ(run.fOutcome.fReason, "The report is whole; how the child ended was not stored.");
+    EXPECT_EQ(run.fOutcome.fCommand, outcome.fCommand);
+    EXPECT_EQ(run.fFacts.fHostVersion, "1.2.3");
+}
+
+TEST(StoredRun, OfAReportAlone)
+{
+    const RunOutcome whole = MakeOutcomeOfReport(ReadReport(Sample(1, 0).GetText()));
+    EXPECT_EQ(whole.fVerdict, Verdict::kComplete);
+    EXPECT_EQ(whole.fLastReportLine, "assayEnd=\"2026-11-21_10:49:36\"");
+    const RunOutcome stopped =
+        MakeOutcomeOfReport(ReadReport(Sample(1, 0).EndAfter("glgpu[0].GLVersion").GetText()));
+    EXPECT_EQ(stopped.fVerdict, Verdict::kFailedTests);
+    EXPECT_EQ(stopped.fReason, "The report stopped before glgpu[0].IsIntegratedGLGPU; how the "
+                               "child ended was not stored.");
+    EXPECT_EQ(stopped.fLastReportLine, "glgpu[0].GLVersion=\"4.1\"");
+    EXPECT_FALSE(stopped.fExitStatus);
+}
+
+// What is wrong in a document, and how it is named.
+TEST(StoredRun, NamesWhatIsWrong)
+{
+    struct Case {
+        const char* fPointer;
+        Json fValue; // null: the member is removed
+        const char* fText;
+    };
+    const std::vector<Case> cases = {
+        {"/outcome", nullptr, "the document: \"outcome\" is missing"},
+        {"/outcome", 1, "the document: \"outcome\" is not an object"},
+        {"/outcome/verdict", "odd", "the document.outcome: \"verdict\" is \"odd\", which is none"},
+        {"/outcome/verdict", nullptr, "the document.outcome: \"verdict\" is missing"},
+        {"/outcome/exitStatus", "1", "the document.outcome: \"exitStatus\" is not an integer"},
+        {"/outcome/termination", 1, "the document.outcome: \"termination\" is not a string"},
+        {"/outcome/reason", 1, "the document.outcome: \"reason\" is not a string"},
+        {"/outcome/seconds", "1", "the document.outcome: \"seconds\" is not a number"},
+        {"/outcome/timeoutSeconds", "1",
+         "the document.outcome: \"timeoutSeconds\" is not a number"},
+        {"/outcome/lastReportLine", 1, "the document.outcome: \"lastReportLine\" is not a string"},
+        {"/outcome/lastLogLine", 1, "the document.outcome: \"lastLogLine\" is not a string"},
+        {"/outcome/errorLines", 1, "the document.outcome: \"errorLines\" is not an array"},
+        {"/outcome/errorLines/0", 1,
+         "the document.outcome: \"errorLines\" has an element that is not a string"},
+        {"/outcome/lostOutputBytes", -1,
+         "the document.outcome: \"lostOutputBytes\" is not a count"},
+        {"/outcome/lostErrorBytes", 0.5, "the document.outcome: \"lostErrorBytes\" is not a count"},
+        {"/outcome/leftBehind", 0, "the document.outcome: \"leftBehind\" is not a bool"},
+        {"/outcome/causes", 0, "the document.outcome: \"causes\" is not an array"},
+        {"/outcome/causes/0/key", 0, "the document.outcome.causes: \"key\" is not a string"},
+        {"/command", nullptr, "the document: \"command\" is missing"},
+        {"/versions", nullptr, "the document: \"versions\" is missing"},
+        {"/versions/assay", 1, "the document.versions: \"assay\" is not an object"},
+        {"/versions/assay/known", 1, "the document.versions.assay: \"known\" is not a bool"},
+        {"/versions/assay/reason", nullptr, "the document.versions.assay: \"reason\" is missing"},
+        {"/environment", "x", "the document: \"environment\" is not an object"},
+        {"/environment/time", nullptr, "the document.environment: \"time\" is missing"},
+        {"/environment/kernel/value", 6,
+         "the document.environment.kernel: \"value\" is not a string"},
+    };
+    const StoredRun run = {Report(), MakeFullOutcome(Verdict::kCrashed), MakeFacts()};
+    for (const Case& each : cases) {
+        Json document = Json::parse(Write(run));
+        const Json::json_pointer pointer(each.fPointer);
+        if (each.fValue.is_null())
+            document.at(pointer.parent_pointer()).erase(pointer.back());
+        else
+            document.at(pointer) = each.fValue;
+        try {
+            ReadRun(document.dump());
+            ADD_FAILURE() << each.fPointer;
+        } catch (const std::runtime_error& failure) {
+            EXPECT_STREQ(failure.what(), each.fText) << each.fPointer;
+        }
+    }
+}
+
+} // namespace
+} // namespace assay_host
