@@ -16,7 +16,7 @@ _assay_host() {
             _assay_options
             return
             ;;
-        run | torture | diff | check | advise | state) [ -n "$command" ] || command=${words[index]} ;;
+        run | torture | diff | show | check | advise | state) [ -n "$command" ] || command=${words[index]} ;;
         esac
     done
 
@@ -32,6 +32,7 @@ _assay_host() {
     --format)
         local forms="text json jsonl html prometheus nfd ansible"
         [ "$command" = advise ] && forms="text env json"
+        [ "$command" = show ] && forms="text json html prometheus nfd ansible"
         COMPREPLY=($(compgen -W "$forms" -- "$cur"))
         return
         ;;
@@ -58,6 +59,7 @@ _assay_host() {
     run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
     diff) options+=" --tolerance" ;;
+    show) options+=" --format --schema --output" ;;
     check) options+=" --require --requirements --from --assay --timeout --" ;;
     advise)
         options+=" --state --assay --timeout --format --need --wait --max-age --fresh --pause"
@@ -65,9 +67,9 @@ _assay_host() {
         options+=" --unclear --unclear-pause --dry-run"
         ;;
     state) options+=" --state" ;;
-    *) options="run torture diff check advise state --help --version" ;;
+    *) options="run torture diff show check advise state --help --version" ;;
     esac
-    if [ "$command" = diff ] && [[ $cur != -* ]]; then
+    if [[ $command = diff || $command = show ]] && [[ $cur != -* ]]; then
         _filedir
     elif [ "$command" = state ] && [[ $cur != -* ]]; then
         COMPREPLY=($(compgen -W "list show forget set" -- "$cur"))

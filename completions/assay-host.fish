@@ -1,6 +1,6 @@
 # Completion of assay-host for fish.
 
-set -l commands run torture diff check advise state
+set -l commands run torture diff show check advise state
 set -l none "not __fish_seen_subcommand_from $commands"
 set -l run "__fish_seen_subcommand_from run"
 set -l torture "__fish_seen_subcommand_from torture"
@@ -11,6 +11,7 @@ set -l child "__fish_seen_subcommand_from run torture check advise"
 set -l remembers "__fish_seen_subcommand_from advise state"
 set -l needs "__fish_seen_subcommand_from run advise"
 set -l diff "__fish_seen_subcommand_from diff"
+set -l show "__fish_seen_subcommand_from show; and not __fish_seen_subcommand_from state"
 
 complete -c assay-host -f
 complete -c assay-host -s h -l help -d "Show the options"
@@ -18,6 +19,7 @@ complete -c assay-host -n $none -l version -d "Show the version"
 complete -c assay-host -n $none -a run -d "Run assay and show its report"
 complete -c assay-host -n $none -a torture -d "Make assay fail at every step and check each outcome"
 complete -c assay-host -n $none -a diff -d "Show the differences between two reports"
+complete -c assay-host -n $none -a show -d "Show a stored report in any form"
 complete -c assay-host -n $none -a check -d "Hold this machine, or stored reports, to requirements"
 complete -c assay-host -n $none -a advise -d "Tell from memory, or by one attempt, what can be used"
 complete -c assay-host -n $none -a state -d "Show or change what advise remembers"
@@ -33,6 +35,10 @@ complete -c assay-host -n $run -l output -r -F -d "Write to this file"
 complete -c assay-host -n $torture -l kind -x -a "crash throw both" -d "Kind of failure"
 complete -c assay-host -n $diff -F
 complete -c assay-host -n $diff -l tolerance -x -d "Of measurements, relative to the larger one"
+complete -c assay-host -n $show -F
+complete -c assay-host -n $show -l format -x -a "text json html prometheus nfd ansible" -d "Form of the output"
+complete -c assay-host -n $show -l schema -x -a "1 2" -d "Version of json"
+complete -c assay-host -n $show -l output -r -F -d "Write to this file"
 complete -c assay-host -n $check -l require -x -d "A requirement"
 complete -c assay-host -n $check -l requirements -r -F -d "A file of requirements"
 complete -c assay-host -n $check -l from -r -F -d "Check a stored report instead of a run"

@@ -79,8 +79,15 @@ struct DiffChoice {
     double fTolerance = 0.1; // as DiffOptions::fTolerance
 };
 
-using CommandChoice =
-    std::variant<RunChoice, TortureChoice, DiffChoice, CheckChoice, AdviseChoice, StateChoice>;
+struct ShowChoice {
+    std::string fReport; // a file
+    Format fFormat = Format::kText;
+    int fSchema = 2;     // of the document
+    std::string fOutput; // empty: standard output
+};
+
+using CommandChoice = std::variant<RunChoice, TortureChoice, DiffChoice, ShowChoice, CheckChoice,
+                                   AdviseChoice, StateChoice>;
 
 // Exit statuses other than those of the verdicts.
 constexpr int kErrorStatus = 10; // of all but diff

@@ -9,6 +9,7 @@ namespace assay_host {
 int Run(const RunChoice& choice);
 int Torture(const TortureChoice& choice);
 int Diff(const DiffChoice& choice);
+int Show(const ShowChoice& choice);
 int Check(const CheckChoice& choice);
 int Advise(const AdviseChoice& choice);
 int State(const StateChoice& choice);

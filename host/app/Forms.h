@@ -10,6 +10,9 @@
 
 namespace assay_host {
 
+// The columns of a text form in a file.
+constexpr int kFileWidth = 100;
+
 struct Form {
     Format fFormat = Format::kText; // any but kJsonLines
     int fSchema = 2;                // of kJson

@@ -36,6 +36,11 @@ int Act(const DiffChoice& choice)
     return Diff(choice);
 }
 
+int Act(const ShowChoice& choice)
+{
+    return Show(choice);
+}
+
 int Act(const CheckChoice& choice)
 {
     return Check(choice);

@@ -28,8 +28,6 @@ namespace assay_host {
 
 namespace {
 
-constexpr int kFileWidth = 100;
-
 // Returns the line without its key and value, which RestoreLine reads from the text again. Saves
 // memory while the line waits to be written.
 ReportLine ShortenLine(const ReportLine& line)

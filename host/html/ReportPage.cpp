@@ -231,11 +231,11 @@ private:
         AddRow("Architecture", environment.fArchitecture);
         if (environment.fHost.IsKnown())
             AddRow("Host", environment.fHost);
-        AddRow("When", fmt::format("{} (local time {})", environment.fTime, environment.fOffset));
-        AddRow("Versions",
-               fmt::format("assay-host {}, assay {}", fFacts.fHostVersion,
-                           fFacts.fChildVersion.IsKnown() ? ShowBytes(fFacts.fChildVersion.fValue)
-                                                          : "not known"));
+        if (!environment.fTime.empty())
+            AddRow("When",
+                   fmt::format("{} (local time {})", environment.fTime, environment.fOffset));
+        AddRow("Version of assay-host", ShowBytes(fFacts.fHostVersion));
+        AddRow("Version of assay", fFacts.fChildVersion);
     }
 
     void AddLines(const char* title, const std::vector<std::string>& lines)
@@ -255,7 +255,7 @@ private:
     {
         const Element footer(fPage, "footer");
         const Element line(fPage, "p", {{"class", "soft"}});
-        fPage.AddText(fmt::format("Made by assay-host {}. ", fFacts.fHostVersion));
+        fPage.AddText("Made by assay-host. ");
         fPage.Add("button", "Copy as JSON", {{"id", "copy"}, {"hidden", ""}});
         fPage.Add("span", "", {{"id", "copied"}, {"role", "status"}});
     }

@@ -10,7 +10,7 @@ import pytest
 from harness import PROGRAM, TREE
 from hosting import HOST
 
-COMMANDS = ["run", "torture", "diff", "check", "advise", "state"]
+COMMANDS = ["run", "torture", "diff", "show", "check", "advise", "state"]
 FOLDER = TREE / "completions"
 BASH_COMPLETION = Path("/usr/share/bash-completion/bash_completion")
 
@@ -97,6 +97,9 @@ def test_values_of_options():
     assert in_fish("assay-host torture --kind ") == {"crash", "throw", "both"}
     assert in_bash("assay-host", "advise", "--format", "") == {"text", "env", "json"}
     assert in_fish("assay-host advise --format ") == {"text", "env", "json"}
+    forms = {"text", "json", "html", "prometheus", "nfd", "ansible"}
+    assert in_bash("assay-host", "show", "--format", "") == forms
+    assert in_fish("assay-host show --format ") == forms
     actions = {"list", "show", "forget", "set"}
     assert in_bash("assay-host", "state", "") == actions
     assert in_fish("assay-host state ") == actions

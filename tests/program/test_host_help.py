@@ -7,7 +7,7 @@ from hosting import host_run
 HELP = {
     None: """\
 Runs assay as a child process, survives its failures, and shows its report.
-usage: assay-host run|torture|diff|check|advise|state [option...]
+usage: assay-host run|torture|diff|show|check|advise|state [option...]
 
 Options:
   -h,--help               show this text
@@ -17,6 +17,7 @@ Subcommands:
   run                     run assay and show its report
   torture                 make assay fail at every step and check each outcome
   diff                    show the differences between two reports
+  show                    show a stored report in any form
   check                   hold this machine, or stored reports, to requirements
   advise                  tell from memory, or by one attempt, what can be used
   state                   show or change what advise remembers
@@ -69,6 +70,21 @@ Options:
   --tolerance FRACTION    of measurements, relative to the larger one [0.1]
 
 exit status: 0 same, 1 different, 2 error
+""",
+    "show": """\
+show a stored report in any form
+usage: assay-host show [option...] REPORT
+
+Positionals:
+  REPORT                  a report: json, jsonl, or as assay prints it
+
+Options:
+  -h,--help               show this text
+  --format FORMAT         text, json, html, prometheus, nfd or ansible [text]
+  --schema NUMBER         of json, 1 or 2 [2]
+  --output FILE           write to this file [standard output]
+
+exit status: 0 shown, 10 error
 """,
     "check": """\
 hold this machine, or stored reports, to requirements

@@ -25,7 +25,7 @@ LEFT_OUT = {
     "the scripted OpenGL driver is an EGL library, and the peer uses EGL": {
         "program/test_advise", "program/test_bad_drivers", "program/test_failing_gpu",
         "program/test_fault_sweep", "program/test_html", "program/test_last_line",
-        "program/test_opengl_peers", "program/test_usable"},
+        "program/test_opengl_peers", "program/test_show", "program/test_usable"},
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {

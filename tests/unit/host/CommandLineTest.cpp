@@ -94,6 +94,21 @@ TEST(CommandLineOfDiff, HasTwoFilesAndATolerance)
     EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--tolerance=2.5"}).fTolerance, 2.5);
 }
 
+TEST(CommandLineOfShow, HasAFileAndAForm)
+{
+    const auto plain = Parse<ShowChoice>({"show", "a"});
+    EXPECT_EQ(plain.fReport, "a");
+    EXPECT_EQ(plain.fFormat, Format::kText);
+    EXPECT_EQ(plain.fSchema, 2);
+    EXPECT_EQ(plain.fOutput, "");
+    const auto full =
+        Parse<ShowChoice>({"show", "a", "--format=json", "--schema", "1", "--output", "b"});
+    EXPECT_EQ(full.fFormat, Format::kJson);
+    EXPECT_EQ(full.fSchema, 1);
+    EXPECT_EQ(full.fOutput, "b");
+    EXPECT_EQ(Parse<ShowChoice>({"show", "a", "--format=html"}).fFormat, Format::kHtml);
+}
+
 struct Row {
     Words fWords;
     int fStatus;
@@ -120,6 +135,12 @@ TEST(CommandLine, RejectsWhatNoCommandTakes)
         {{"torture", "--kind", ""}, kErrorStatus},
         {{"torture", "--", "-crashAfter=1"}, kErrorStatus},
         {{"torture", "--", "x", "-throwAfter="}, kErrorStatus},
+        {{"show"}, kErrorStatus},
+        {{"show", ""}, kErrorStatus},
+        {{"show", "a", "b"}, kErrorStatus},
+        {{"show", "a", "--format", "jsonl"}, kErrorStatus},
+        {{"show", "a", "--schema", "1"}, kErrorStatus},
+        {{"show", "a", "--raw"}, kErrorStatus},
         {{"diff"}, kDiffErrorStatus},
         {{"diff", "a"}, kDiffErrorStatus},
         {{"diff", "a", ""}, kDiffErrorStatus},

@@ -78,7 +78,7 @@ TEST(ReportPage, OfAGoodMachine)
     EXPECT_TRUE(Has(page, "<dt>System</dt>\n<dd>Example &lt;OS&gt;</dd>"));
     EXPECT_TRUE(Has(page, "<dd>not known (the kernel does not say it)</dd>"));
     EXPECT_FALSE(Has(page, "<dt>Host</dt>"));
-    EXPECT_TRUE(Has(page, "<dt>Versions</dt>\n<dd>assay-host 1.0.0, assay 1.0.0</dd>"));
+    EXPECT_TRUE(Has(page, "<dt>Version of assay</dt>\n<dd>1.0.0</dd>"));
     EXPECT_TRUE(Has(page, "NumGLGPUs=1\n"));
     EXPECT_EQ(page.substr(page.size() - 8), "</html>\n");
 }
