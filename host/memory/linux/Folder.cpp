@@ -205,12 +205,25 @@ std::string CheckFolder(int folder)
 
 std::unique_ptr<Folder> OpenFolder(const std::string& path, FolderUse use)
 {
-    if (use == FolderUse::kWrite && ::mkdir(path.c_str(), kFolderMode) != 0 && errno != EEXIST &&
+    // With a slash at its end, the name of a link would mean what it leads to.
+    std::string place = path;
+    while (place.size() > 1 && place.back() == '/')
+        place.pop_back();
+    if (use == FolderUse::kWrite && ::mkdir(place.c_str(), kFolderMode) != 0 && errno != EEXIST &&
         errno != EROFS)
         return MakeUnusableFolder(GetReason(errno));
-    const int folder = ::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    constexpr int kFlags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
+    int folder = ::open(place.c_str(), kFlags | O_NOFOLLOW);
+    int error = errno;
+    struct stat link = {};
+    if (folder < 0 && ::lstat(place.c_str(), &link) == 0 && S_ISLNK(link.st_mode)) {
+        if (link.st_uid != ::geteuid() && link.st_uid != 0)
+            return MakeUnusableFolder("it is a link of another user");
+        folder = ::open(place.c_str(), kFlags);
+        error = errno;
+    }
     if (folder < 0)
-        return MakeUnusableFolder(GetReason(errno));
+        return MakeUnusableFolder(GetReason(error));
     if (const std::string reason = CheckFolder(folder); !reason.empty()) {
         ::close(folder);
         return MakeUnusableFolder(reason);

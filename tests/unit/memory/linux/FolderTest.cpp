@@ -144,6 +144,32 @@ TEST_F(FolderTest, RefusesAFolderThatAllCanChange)
     EXPECT_EQ(OpenFolder(fPath.native(), FolderUse::kWrite)->Write("file", ""), "");
 }
 
+TEST_F(FolderTest, FollowsALinkOfTheUserToIt)
+{
+    const std::string link = (fParent / "link").native();
+    ASSERT_EQ(::symlink("state", link.c_str()), 0);
+    EXPECT_EQ(OpenFolder(link, FolderUse::kWrite)->Write("file", "text"), "");
+    EXPECT_EQ(fFolder->Read("file", kLimit).fText, "text");
+    EXPECT_EQ(OpenFolder(link + "/", FolderUse::kWrite)->Write("file", "text"), "");
+}
+
+TEST_F(FolderTest, FollowsNoLinkOfAnotherUserToIt)
+{
+    if (::geteuid() != 0)
+        GTEST_SKIP() << "only root can give links away";
+    const std::string link = (fParent / "link").native();
+    ASSERT_EQ(::symlink("state", link.c_str()), 0);
+    ASSERT_EQ(::lchown(link.c_str(), 1, 1), 0);
+    for (const FolderUse use : {FolderUse::kRead, FolderUse::kWrite})
+        for (const char* const end : {"", "/", "//"})
+            EXPECT_EQ(OpenFolder(link + end, use)->Write("file", "text"),
+                      "it is a link of another user");
+    EXPECT_EQ(fFolder->Read("file", kLimit).fState, FileState::kMissing);
+    // A loop of links is no folder.
+    ASSERT_EQ(::symlink("loop", (fParent / "loop").c_str()), 0);
+    EXPECT_NE(OpenFolder((fParent / "loop").native(), FolderUse::kWrite)->Write("file", ""), "");
+}
+
 TEST_F(FolderTest, CreatesOnlyTheFolderItself)
 {
     const std::string missing = (fParent / "new").native();
