@@ -5,7 +5,7 @@ import signal
 import pytest
 
 # Must precede the first import, or failed assertions don't show the values.
-pytest.register_assert_rewrite("calls", "clmodel", "harness", "hosting", "model", "sweep")
+pytest.register_assert_rewrite("calls", "clmodel", "harness", "hosting", "model", "starts", "sweep")
 
 import harness  # noqa: E402
 

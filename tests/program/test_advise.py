@@ -1,131 +1,21 @@
 """`assay-host advise` and `assay-host state` with scripted drivers: what a host is told at its starts
 while its drivers work, crash, hang and change, its processes are killed, and its folder fails."""
 
-import ctypes.util
-import json
 import os
 import resource
-import shutil
 import signal
 import subprocess
 import uuid
-from dataclasses import dataclass
+from datetime import datetime
 from pathlib import Path
 
 import pytest
 
-from calls import FullMachine
-from faults import FAULTS, library_of
-from harness import PROGRAM, PROGRAM_AT_ROOT, SCRIPTED_EGL, record_so_far, until
-from hosting import (HOST, Watched, host_run, host_run_until, processes_with, script_child)
-from sweep import Sweep
+from harness import PROGRAM, record_so_far, until
+from hosting import HOST, host_run, host_run_until
+from starts import (ABSENT, BROKEN, DAY, ERROR, HARDWARE, INTERRUPTED, SOFTWARE, UNKNOWN, Answer,
+                    Starts, kill_all, processes_below, seal)
 from validate import validate_advice
-
-HARDWARE, SOFTWARE, BROKEN, ABSENT, UNKNOWN = 0, 20, 21, 22, 23
-INTERRUPTED, ERROR = 6, 10
-DAY = 24 * 3600
-
-GOOD = """device
-string GL_VENDOR "A vendor"
-string GL_RENDERER "A renderer"
-version "2.1 Scripted"
-extensions "GL_ARB_vertex_program GL_ARB_fragment_program GL_EXT_framebuffer_object"
-"""
-
-
-def seal(content, number=1):
-    """The text of a state file, made independently of the program."""
-    body = json.dumps({"content": content}, indent=2, ensure_ascii=False)[len("{\n"):] + "\n"
-    checksum = uuid.uuid5(uuid.UUID(int=0), f"{number}\n{body}")
-    return f'{{\n  "format": {number},\n  "checksum": "{checksum}",\n{body}'
-
-
-@dataclass
-class Answer:
-    """What one call answered."""
-
-    status: int
-    document: dict
-    err: str
-
-    @property
-    def opengl(self):
-        return self.document["opengl"]["answer"]
-
-    @property
-    def opencl(self):
-        return self.document["opencl"]["answer"]
-
-    @property
-    def tried(self):
-        return self.document["tried"]
-
-
-class Starts:
-    """The starts of a host on a machine with a scripted OpenGL driver. Counts the children."""
-
-    def __init__(self, host, folder):
-        self.folder = folder
-        self.state = folder / "state"
-        self.runs = folder / "runs"
-        self.child = script_child(
-            folder, f'echo >> "{self.runs}"\nexec "{PROGRAM}" "$@"')
-        self.set_driver("")
-        # Made once: each making changes the times of files that belong to the identity.
-        self.base = host.environment(folder / "driver")
-        self.variables = {}
-
-    def set_driver(self, rules):
-        """Replaces what the driver does. Its files stay as they are."""
-        (self.folder / "driver").write_text(GOOD + rules)
-
-    @property
-    def environment(self):
-        return {**self.base, **self.variables}
-
-    @property
-    def children(self):
-        return len(self.runs.read_text().splitlines()) if self.runs.exists() else 0
-
-    def arguments(self, *options):
-        return ["advise", "--state", str(self.state), "--assay", str(self.child), "--format", "json",
-                *options]
-
-    def answer(self, run):
-        return Answer(run.status, validate_advice(run.out), run.err.decode())
-
-    def advise(self, *options, **more):
-        run = host_run(*self.arguments(*options), environment=self.environment, **more)
-        answer = self.answer(run)
-        if answer.status != INTERRUPTED:
-            assert answer.status == answer.document["status"]
-        return answer
-
-    def start(self, *options):
-        return Watched(*self.arguments(*options), environment=self.environment)
-
-    def act(self, *arguments):
-        return host_run("state", *arguments, "--state", str(self.state),
-                        environment=self.environment)
-
-    def file(self):
-        """The state file of the only identity."""
-        files = [path for path in self.state.glob("*.json") if path.name != "choice.json"]
-        return files[0] if len(files) == 1 else None
-
-    def content(self):
-        file = self.file()
-        return json.loads(file.read_text())["content"] if file else None
-
-    def rewrite(self, change):
-        """Changes the content of the state file."""
-        content = self.content()
-        change(content)
-        self.file().write_text(seal(content))
-
-    def has_open_attempt(self):
-        content = self.content()
-        return content is not None and content["attempts"][-1]["end"] == "open"
 
 
 @pytest.fixture
@@ -242,27 +132,6 @@ def test_a_stopped_host_blames_nobody(starts, number):
     assert again.document["opengl"]["warning"] is None
 
 
-def processes_below(pid):
-    """The process and its descendants."""
-    children = []
-    for task in Path(f"/proc/{pid}/task").glob("*/children"):
-        children += [int(word) for word in task.read_text().split()]
-    return [pid, *(each for child in children for each in processes_below(child))]
-
-
-def kill_all(call, starts):
-    """Kills the guardian, the worker and the child at once, as a session's end can do."""
-    until(lambda: starts.has_open_attempt() and starts.children == 1 and
-          len(processes_below(call.process.pid)) == 3, "no child")
-    processes = processes_below(call.process.pid)
-    for pid in processes:
-        os.kill(pid, signal.SIGSTOP)
-    for pid in reversed(processes):
-        os.kill(pid, signal.SIGKILL)
-    call.wait()
-    until(lambda: not processes_with(call.mark), "a process is left")
-
-
 def test_a_host_that_was_killed_with_everything_is_weak_evidence(starts):
     starts.set_driver("at eglInitialize hang\n")
     with starts.start("--timeout", "0") as call:
@@ -350,6 +219,58 @@ def test_ages(starts):
         answer = starts.advise()
         assert (answer.status, answer.tried, answer.document["due"]) == (HARDWARE, True, "old")
         assert not starts.advise().tried
+
+
+def seconds_to_the_next(starts, interface, *options):
+    """How long after an attempt the next one for an interface is due."""
+    part = starts.advise("--dry-run", *options).document[interface]
+    if part["nextAttempt"] is None:
+        return 0
+    times = [datetime.fromisoformat(part[name].replace("Z", "+00:00"))
+             for name in ("time", "nextAttempt")]
+    return (times[1] - times[0]).total_seconds()
+
+
+def test_each_time_of_the_policy_can_be_set(starts):
+    starts.advise()
+    for option, interface, default, unit in (("--max-age", "opengl", 30 * DAY, DAY),
+                                             ("--keep-absent", "opencl", 600, 1)):
+        assert seconds_to_the_next(starts, interface) == default + 1
+        assert seconds_to_the_next(starts, interface, option, "1000") == 1000 * unit + 1
+    starts.act("forget")
+    starts.set_driver("at eglInitialize crash\n")
+    starts.advise()
+    assert seconds_to_the_next(starts, "opengl") == 60
+    assert seconds_to_the_next(starts, "opengl", "--pause", "1000") == 1000
+    starts.advise("--pause", "0")
+    assert seconds_to_the_next(starts, "opengl") == 3600
+    assert seconds_to_the_next(starts, "opengl", "--pause-growth", "2") == 120
+    assert seconds_to_the_next(starts, "opengl", "--pause-growth", "1000", "--forgive", "0.5") == DAY / 2
+    assert seconds_to_the_next(starts, "opengl", "--retries", "1") == 7 * DAY + 1
+    assert seconds_to_the_next(starts, "opengl", "--retries", "1", "--forgive", "2") == 2 * DAY + 1
+
+
+def test_each_time_after_what_is_unclear_can_be_set(starts):
+    starts.advise()
+
+    def end_all(end, reason):
+        def change(content):
+            attempt = content["attempts"][-1]
+            for part in ("opengl", "opencl"):
+                attempt[part].update(answer="unknown", reason=reason)
+            content["attempts"] = [{**attempt, "end": end} for _ in range(3)]
+        starts.rewrite(change)
+
+    end_all("ended", "ended-early")
+    assert seconds_to_the_next(starts, "opengl") == 61
+    assert seconds_to_the_next(starts, "opengl", "--keep-unknown", "1000") == 1001
+    end_all("killed", "killed")
+    assert seconds_to_the_next(starts, "opengl") == 600
+    assert seconds_to_the_next(starts, "opengl", "--unclear-pause", "1000") == 1000
+    assert seconds_to_the_next(starts, "opengl", "--unclear", "4") == 0
+    end_all("system-ended", "")
+    assert seconds_to_the_next(starts, "opengl") == 30 * DAY + 1
+    assert seconds_to_the_next(starts, "opengl", "--forgive-freeze", "1") == DAY + 1
 
 
 def test_a_clock_that_was_set_never_makes_a_wrong_hardware(starts):
@@ -455,6 +376,14 @@ def test_errors_of_the_command_line(starts):
                       ["advise", "--state", "x", "--need", "none"],
                       ["advise", "--state", "x", "--", "-verbose=1"],
                       ["advise", "--state", "x", "--retries", "-1"],
+                      ["advise", "--state", "x", "--retries", "1001"],
+                      ["advise", "--state", "x", "--unclear", "0"],
+                      ["advise", "--state", "x", "--pause-growth", "0"],
+                      ["advise", "--state", "x", "--pause-growth", "1.5"],
+                      ["advise", "--state", "x", "--keep-absent", "-1"],
+                      ["advise", "--state", "x", "--keep-unknown", "soon"],
+                      ["advise", "--state", "x", "--forgive-freeze", "nan"],
+                      ["advise", "--state", "x", "--unclear-pause", ""],
                       ["advise", "--state", "x", "--wait", "inf"]):
         run = host_run(*arguments, environment=starts.environment)
         assert (run.status, run.out) == (ERROR, b""), arguments
@@ -544,59 +473,3 @@ def test_a_damaged_and_a_newer_file(starts):
     assert starts.act("forget").status == 0
     assert starts.advise().tried
     assert not starts.advise().tried
-
-
-def test_each_change_of_a_driver_allows_one_attempt(starts):
-    """The version text of the driver stays the same; only its file changes."""
-    libraries = starts.folder / "libraries"
-    libraries.mkdir()
-    for file in SCRIPTED_EGL.iterdir():
-        shutil.copy2(file, libraries / file.name, follow_symlinks=True)
-    before = starts.environment["LD_LIBRARY_PATH"]
-    starts.variables = {"LD_LIBRARY_PATH": before.replace(str(SCRIPTED_EGL), str(libraries))}
-    starts.set_driver("at eglInitialize crash\n")
-    assert starts.advise().tried
-    assert not starts.advise().tried
-    library = libraries / "libEGL.so.1"
-    library.write_bytes(library.read_bytes())
-    os.utime(library, (1, 1))
-    assert starts.advise().tried
-    assert not starts.advise().tried
-    with open(library, "ab") as file:
-        file.write(b"\0")
-    os.utime(library, (1, 1))
-    starts.set_driver("")
-    answer = starts.advise()
-    assert (answer.status, answer.tried) == (HARDWARE, True)
-    assert answer.document["opengl"]["warning"] is None
-    assert not starts.advise().tried
-    assert starts.children == 3
-    assert len(list(starts.state.glob("*.json"))) == 3
-
-
-@pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
-                    reason="this machine has no OpenCL loader library")
-@pytest.mark.parametrize("name", [name for name, fault in FAULTS.items()
-                                  if fault.ends in ("SIGSEGV", "SIGABRT")])
-def test_a_crash_in_the_calls_of_a_run(tmp_path, name):
-    """The answer blames the library of the call and no other, and the next call has it too."""
-    sweep = Sweep(tmp_path)
-    for pair in sweep.pairs(FAULTS[name], False)[0]:
-        opencl = library_of(pair.call.name) == "cl"
-        rules = pair.fault.rules(pair.call)
-        gl_lines, cl_lines = ("", rules) if opencl else (rules, "")
-        host, machine = sweep.machine.host(pair.name, gl_lines=gl_lines, cl_lines=cl_lines)
-        environment = host.environment(**machine)
-        state = tmp_path / f"state-{pair.name}"
-        arguments = ["advise", "--state", str(state), "--assay", str(PROGRAM_AT_ROOT), "--format",
-                     "json", "--need", "opencl" if opencl else "opengl"]
-        first = host_run(*arguments, environment=environment)
-        second = host_run(*arguments, environment=environment)
-        documents = [validate_advice(run.out) for run in (first, second)]
-        for document in documents:
-            answers = [document[kind]["answer"] for kind in ("opengl", "opencl")]
-            whole = answers == ["hardware", "hardware"]  # a crash when drivers are unloaded
-            blamed = ["hardware", "broken"] if opencl else ["broken", "unknown"]
-            assert whole or answers == blamed, str(pair)
-        assert [document["tried"] for document in documents] == [True, False], str(pair)
-        assert first.status == second.status
