@@ -6,7 +6,7 @@ import subprocess
 
 import pytest
 
-from harness import TREE, until
+from harness import DEADLINE, TREE, until
 
 INTEGRATIONS = TREE / "integrations"
 
@@ -56,6 +56,6 @@ class Server:
 
 def outcome_of(*command, **options):
     """The exit status of a program and its output with its errors."""
-    run = subprocess.run(list(map(str, command)), stdout=subprocess.PIPE, stderr=subprocess.STDOUT,
-                         check=False, **options)
+    run = subprocess.run(list(map(str, command)), stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+                         stderr=subprocess.STDOUT, check=False, timeout=DEADLINE, **options)
     return run.returncode, run.stdout.decode("utf-8", "replace")
