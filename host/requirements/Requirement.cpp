@@ -11,6 +11,7 @@
 
 #include "report/Bytes.h"
 #include "report/Numbers.h"
+#include "report/SimilarName.h"
 
 namespace assay_host {
 
@@ -45,29 +46,6 @@ constexpr FactName kFacts[] = {
     {"opencl.usable", {InterfaceFact::kUsable, DeviceKind::kOpenCL}},
 };
 
-// The number of insertions, deletions and exchanges of bytes between two texts. Letters of either
-// case are equal, as keys are easily mistyped by their case.
-std::size_t GetDistance(std::string_view left, std::string_view right)
-{
-    const auto lower = [](char byte) {
-        return byte >= 'A' && byte <= 'Z' ? static_cast<char>(byte - 'A' + 'a') : byte;
-    };
-    std::vector<std::size_t> row(right.size() + 1);
-    for (std::size_t column = 0; column < row.size(); ++column)
-        row[column] = column;
-    for (std::size_t line = 0; line < left.size(); ++line) {
-        std::size_t diagonal = row[0];
-        row[0] = line + 1;
-        for (std::size_t column = 0; column < right.size(); ++column) {
-            const std::size_t changed =
-                diagonal + (lower(left[line]) == lower(right[column]) ? 0 : 1);
-            diagonal = row[column + 1];
-            row[column + 1] = std::min({row[column + 1] + 1, row[column] + 1, changed});
-        }
-    }
-    return row.back();
-}
-
 // Returns the name that is the most similar to what was written; empty if none is similar.
 std::string FindSimilar(std::string_view written)
 {
@@ -76,16 +54,7 @@ std::string FindSimilar(std::string_view written)
         names.push_back(key.fKey);
     for (const FactName& fact : kFacts)
         names.emplace_back(fact.fText);
-    std::string best;
-    std::size_t bestDistance = std::max<std::size_t>(2, written.size() / 3) + 1;
-    for (const std::string& name : names) {
-        const std::size_t distance = GetDistance(written, name);
-        if (distance < bestDistance) {
-            bestDistance = distance;
-            best = name;
-        }
-    }
-    return best;
+    return FindSimilarName(written, names);
 }
 
 const KnownKey* FindKey(std::string_view name)

@@ -1,0 +1,29 @@
+#include <gtest/gtest.h>
+
+#include "report/SimilarName.h"
+
+namespace assay_host {
+namespace {
+
+TEST(SimilarName, IsTheNearestRegardlessOfCase)
+{
+    const std::vector<std::string> names = {"GLMemoryMB", "CLMemoryMB", "GLVersion"};
+    EXPECT_EQ(FindSimilarName("glmemorymb", names), "GLMemoryMB");
+    EXPECT_EQ(FindSimilarName("CLMemory", names), "CLMemoryMB");
+    EXPECT_EQ(FindSimilarName("GLVersoin", names), "GLVersion");
+    // Of two, the first.
+    EXPECT_EQ(FindSimilarName("LMemoryMB", names), "GLMemoryMB");
+}
+
+// Up to a third of the letters may differ, and two in any case.
+TEST(SimilarName, IsNotJustAnyName)
+{
+    EXPECT_EQ(FindSimilarName("abc", {"abcde"}), "abcde");
+    EXPECT_EQ(FindSimilarName("abc", {"abcdef"}), "");
+    EXPECT_EQ(FindSimilarName("abcdefghi", {"abcdefghixyz"}), "abcdefghixyz");
+    EXPECT_EQ(FindSimilarName("abcdefghi", {"abcdefghiwxyz"}), "");
+    EXPECT_EQ(FindSimilarName("abc", {}), "");
+}
+
+} // namespace
+} // namespace assay_host
