@@ -16,7 +16,7 @@ _assay_host() {
             _assay_options
             return
             ;;
-        run | torture | diff | show | check | advise | state) [ -n "$command" ] || command=${words[index]} ;;
+        run | torture | diff | show | explain | check | advise | state) [ -n "$command" ] || command=${words[index]} ;;
         esac
     done
 
@@ -59,6 +59,7 @@ _assay_host() {
     run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
     diff) options+=" --tolerance" ;;
+    explain) ;;
     show) options+=" --format --schema --output" ;;
     check) options+=" --require --requirements --from --assay --timeout --" ;;
     advise)
@@ -67,10 +68,12 @@ _assay_host() {
         options+=" --unclear --unclear-pause --dry-run"
         ;;
     state) options+=" --state" ;;
-    *) options="run torture diff show check advise state --help --version" ;;
+    *) options="run torture diff show explain check advise state --help --version" ;;
     esac
     if [[ $command = diff || $command = show ]] && [[ $cur != -* ]]; then
         _filedir
+    elif [ "$command" = explain ] && [[ $cur != -* ]]; then
+        COMPREPLY=($(compgen -W "$("${COMP_WORDS[0]}" explain 2>/dev/null | sed "s/ (.*//")" -- "$cur"))
     elif [ "$command" = state ] && [[ $cur != -* ]]; then
         COMPREPLY=($(compgen -W "list show forget set" -- "$cur"))
     else

@@ -1,6 +1,6 @@
 # Completion of assay-host for fish.
 
-set -l commands run torture diff show check advise state
+set -l commands run torture diff show explain check advise state
 set -l none "not __fish_seen_subcommand_from $commands"
 set -l run "__fish_seen_subcommand_from run"
 set -l torture "__fish_seen_subcommand_from torture"
@@ -20,6 +20,7 @@ complete -c assay-host -n $none -a run -d "Run assay and show its report"
 complete -c assay-host -n $none -a torture -d "Make assay fail at every step and check each outcome"
 complete -c assay-host -n $none -a diff -d "Show the differences between two reports"
 complete -c assay-host -n $none -a show -d "Show a stored report in any form"
+complete -c assay-host -n $none -a explain -d "Explain the keys of a report"
 complete -c assay-host -n $none -a check -d "Hold this machine, or stored reports, to requirements"
 complete -c assay-host -n $none -a advise -d "Tell from memory, or by one attempt, what can be used"
 complete -c assay-host -n $none -a state -d "Show or change what advise remembers"
@@ -39,6 +40,7 @@ complete -c assay-host -n $show -F
 complete -c assay-host -n $show -l format -x -a "text json html prometheus nfd ansible" -d "Form of the output"
 complete -c assay-host -n $show -l schema -x -a "1 2" -d "Version of json"
 complete -c assay-host -n $show -l output -r -F -d "Write to this file"
+complete -c assay-host -n "__fish_seen_subcommand_from explain" -x -a "(command -q assay-host; and assay-host explain 2>/dev/null | string replace -r ' \\(.*' '')"
 complete -c assay-host -n $check -l require -x -d "A requirement"
 complete -c assay-host -n $check -l requirements -r -F -d "A file of requirements"
 complete -c assay-host -n $check -l from -r -F -d "Check a stored report instead of a run"

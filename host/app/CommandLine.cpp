@@ -82,7 +82,7 @@ public:
         std::string names;
         for (const auto& make :
              {MakeRunOptions, MakeTortureOptions, MakeDiffOptions, MakeShowOptions,
-              MakeCheckOptions, MakeAdviseOptions, MakeStateOptions}) {
+              MakeExplainOptions, MakeCheckOptions, MakeAdviseOptions, MakeStateOptions}) {
             std::unique_ptr<CommandOptions> options = make();
             const CommandOptions::Help help = options->GetHelp();
             CLI::App* const command = fApp.add_subcommand(help.fName, help.fPurpose);

@@ -86,8 +86,12 @@ struct ShowChoice {
     std::string fOutput; // empty: standard output
 };
 
-using CommandChoice = std::variant<RunChoice, TortureChoice, DiffChoice, ShowChoice, CheckChoice,
-                                   AdviseChoice, StateChoice>;
+struct ExplainChoice {
+    std::vector<std::string> fKeys; // empty: all are listed
+};
+
+using CommandChoice = std::variant<RunChoice, TortureChoice, DiffChoice, ShowChoice, ExplainChoice,
+                                   CheckChoice, AdviseChoice, StateChoice>;
 
 // Exit statuses other than those of the verdicts.
 constexpr int kErrorStatus = 10; // of all but diff

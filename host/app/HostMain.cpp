@@ -41,6 +41,11 @@ int Act(const ShowChoice& choice)
     return Show(choice);
 }
 
+int Act(const ExplainChoice& choice)
+{
+    return Explain(choice);
+}
+
 int Act(const CheckChoice& choice)
 {
     return Check(choice);

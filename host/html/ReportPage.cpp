@@ -14,6 +14,7 @@
 #include "html/Markup.h"
 #include "report/Answers.h"
 #include "report/Bytes.h"
+#include "report/Explanations.h"
 #include "report/JsonDocument.h"
 #include "report/NextSteps.h"
 #include "report/Numbers.h"
@@ -150,6 +151,7 @@ private:
         }
         AddMeasurements();
         AddRun();
+        AddTerms();
         AddLines("Standard error", fOutcome.fErrorLines);
         std::vector<std::string> lines;
         for (const ReportLine& line : fReport.GetLines())
@@ -236,6 +238,25 @@ private:
                    fmt::format("{} (local time {})", environment.fTime, environment.fOffset));
         AddRow("Version of assay-host", ShowBytes(fFacts.fHostVersion));
         AddRow("Version of assay", fFacts.fChildVersion);
+    }
+
+    // Explains what the cards have.
+    void AddTerms()
+    {
+        if (fAnswers.fDevices.empty())
+            return;
+        const Element fold(fPage, "details");
+        fPage.Add("summary", "What the terms mean");
+        const Element list(fPage, "dl");
+        for (const KnownKey& key : GetKnownKeys()) {
+            const bool isShown = std::any_of(
+                fAnswers.fDevices.begin(), fAnswers.fDevices.end(),
+                [&key](const DeviceAnswers& device) { return device.fKind == key.fKind; });
+            if (!isShown || key.fGroup == KeyGroup::kExtension)
+                continue;
+            fPage.Add("dt", fmt::format("{}: {}", GetKindName(*key.fKind), key.fLabel));
+            fPage.Add("dd", GetExplanation(key).fMeaning);
+        }
     }
 
     void AddLines(const char* title, const std::vector<std::string>& lines)

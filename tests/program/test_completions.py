@@ -1,5 +1,6 @@
 """The completions of the shells offer exactly the options of the programs' help texts."""
 
+import os
 import re
 import shutil
 import subprocess
@@ -10,7 +11,7 @@ import pytest
 from harness import PROGRAM, TREE
 from hosting import HOST
 
-COMMANDS = ["run", "torture", "diff", "show", "check", "advise", "state"]
+COMMANDS = ["run", "torture", "diff", "show", "explain", "check", "advise", "state"]
 FOLDER = TREE / "completions"
 BASH_COMPLETION = Path("/usr/share/bash-completion/bash_completion")
 
@@ -103,6 +104,15 @@ def test_values_of_options():
     actions = {"list", "show", "forget", "set"}
     assert in_bash("assay-host", "state", "") == actions
     assert in_fish("assay-host state ") == actions
+
+
+def test_keys_to_explain(monkeypatch):
+    """The program that is completed names them."""
+    monkeypatch.setenv("PATH", f"{HOST.parent}:{os.environ['PATH']}")
+    assert in_bash("assay-host", "explain", "GLMem") == {"GLMemoryMB"}
+    assert in_fish("assay-host explain GLMem") == {"GLMemoryMB"}
+    monkeypatch.setenv("PATH", os.environ["PATH"].partition(":")[2])
+    assert in_fish("assay-host explain GLMem") == set()
 
 
 def test_options_of_the_child():

@@ -7,7 +7,7 @@ from hosting import host_run
 HELP = {
     None: """\
 Runs assay as a child process, survives its failures, and shows its report.
-usage: assay-host run|torture|diff|show|check|advise|state [option...]
+usage: assay-host run|torture|diff|show|explain|check|advise|state [option...]
 
 Options:
   -h,--help               show this text
@@ -18,6 +18,7 @@ Subcommands:
   torture                 make assay fail at every step and check each outcome
   diff                    show the differences between two reports
   show                    show a stored report in any form
+  explain                 explain the keys of a report
   check                   hold this machine, or stored reports, to requirements
   advise                  tell from memory, or by one attempt, what can be used
   state                   show or change what advise remembers
@@ -85,6 +86,19 @@ Options:
   --output FILE           write to this file [standard output]
 
 exit status: 0 shown, 10 error
+""",
+    "explain": """\
+explain the keys of a report
+usage: assay-host explain [KEY...]
+
+Positionals:
+  KEY                     a key of the report, or its label
+
+Options:
+  -h,--help               show this text
+
+Without a key: lists all.
+exit status: 0 explained, 10 error
 """,
     "check": """\
 hold this machine, or stored reports, to requirements
