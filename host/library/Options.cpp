@@ -11,7 +11,7 @@ using assay_host::Try;
 namespace {
 
 constexpr std::uint64_t kMaxLimit = std::uint64_t{1} << 30;
-constexpr std::uint64_t kMaxRetries = 1000;
+constexpr double kMaxCount = 1000;
 constexpr double kMaxSeconds = 100.0 * 365 * assay_host::Policy::kDay;
 
 template <typename Limit>
@@ -28,16 +28,49 @@ bool IsTime(double seconds)
     return std::isfinite(seconds) && seconds >= 0;
 }
 
-// Sets a time of the policy, which has whole seconds.
-assay_host_error SetTime(assay_host_options* options, std::int64_t assay_host::Policy::*time,
-                         double seconds)
+// The policy has whole seconds.
+assay_host_error SetTime(std::int64_t& time, double seconds)
 {
-    if (options == nullptr)
-        return ASSAY_HOST_NULL_POINTER;
     if (!IsTime(seconds))
         return ASSAY_HOST_BAD_VALUE;
-    options->fRequest.fPolicy.*time = static_cast<std::int64_t>(std::min(seconds, kMaxSeconds));
+    time = static_cast<std::int64_t>(std::min(seconds, kMaxSeconds));
     return ASSAY_HOST_OK;
+}
+
+template <typename Count>
+assay_host_error SetCount(Count& count, double value, double min)
+{
+    if (!(value >= min && value <= kMaxCount) || value != std::floor(value))
+        return ASSAY_HOST_BAD_VALUE;
+    count = static_cast<Count>(value);
+    return ASSAY_HOST_OK;
+}
+
+assay_host_error SetPolicy(assay_host::Policy& policy, assay_host_policy which, double value)
+{
+    switch (which) {
+    case ASSAY_HOST_MAX_AGE:
+        return SetTime(policy.fMaxAge, value);
+    case ASSAY_HOST_KEEP_ABSENT:
+        return SetTime(policy.fAbsentKept, value);
+    case ASSAY_HOST_KEEP_UNKNOWN:
+        return SetTime(policy.fUnknownKept, value);
+    case ASSAY_HOST_PAUSE:
+        return SetTime(policy.fFirstPause, value);
+    case ASSAY_HOST_PAUSE_GROWTH:
+        return SetCount(policy.fPauseGrowth, value, 1);
+    case ASSAY_HOST_RETRIES:
+        return SetCount(policy.fRetries, value, 0);
+    case ASSAY_HOST_FORGIVE:
+        return SetTime(policy.fForgiven, value);
+    case ASSAY_HOST_FORGIVE_FREEZE:
+        return SetTime(policy.fFreezeForgiven, value);
+    case ASSAY_HOST_UNCLEAR:
+        return SetCount(policy.fMaxUnclear, value, 1);
+    case ASSAY_HOST_UNCLEAR_PAUSE:
+        return SetTime(policy.fUnclearPause, value);
+    }
+    return ASSAY_HOST_BAD_VALUE;
 }
 
 } // namespace
@@ -177,27 +210,9 @@ assay_host_error assay_host_options_set_wait(assay_host_options* options, double
     return ASSAY_HOST_OK;
 }
 
-assay_host_error assay_host_options_set_max_age(assay_host_options* options, double seconds)
+assay_host_error assay_host_options_set_policy(assay_host_options* options, assay_host_policy which,
+                                               double value)
 {
-    return SetTime(options, &assay_host::Policy::fMaxAge, seconds);
-}
-
-assay_host_error assay_host_options_set_pause(assay_host_options* options, double seconds)
-{
-    return SetTime(options, &assay_host::Policy::fFirstPause, seconds);
-}
-
-assay_host_error assay_host_options_set_forgive(assay_host_options* options, double seconds)
-{
-    return SetTime(options, &assay_host::Policy::fForgiven, seconds);
-}
-
-assay_host_error assay_host_options_set_retries(assay_host_options* options, uint64_t retries)
-{
-    if (options == nullptr)
-        return ASSAY_HOST_NULL_POINTER;
-    if (retries > kMaxRetries)
-        return ASSAY_HOST_BAD_VALUE;
-    options->fRequest.fPolicy.fRetries = static_cast<std::size_t>(retries);
-    return ASSAY_HOST_OK;
+    return options == nullptr ? ASSAY_HOST_NULL_POINTER
+                              : SetPolicy(options->fRequest.fPolicy, which, value);
 }

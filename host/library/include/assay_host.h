@@ -149,24 +149,33 @@ ASSAY_HOST_API assay_host_error assay_host_options_set_fresh(assay_host_options*
 ASSAY_HOST_API assay_host_error assay_host_options_set_dry_run(assay_host_options* options,
                                                                int dry_run);
 
-/* Set how long to wait for the attempt of another process or thread, 10 by default; the age at
- * which hardware and software are tried again, 30 days; the pause after a first failure, 60, which
- * grows by a factor of 60 up to the next one; and the age from which failures don't count, 7 days.
- * More than 100 years are 100 years. Errors: null pointer; bad value for a negative number or one
- * that isn't finite. */
+/* Sets how long to wait for the attempt of another process or thread; the default is 10. Errors:
+ * null pointer; bad value for a negative number or one that isn't finite. */
 ASSAY_HOST_API assay_host_error assay_host_options_set_wait(assay_host_options* options,
                                                             double seconds);
-ASSAY_HOST_API assay_host_error assay_host_options_set_max_age(assay_host_options* options,
-                                                               double seconds);
-ASSAY_HOST_API assay_host_error assay_host_options_set_pause(assay_host_options* options,
-                                                             double seconds);
-ASSAY_HOST_API assay_host_error assay_host_options_set_forgive(assay_host_options* options,
-                                                               double seconds);
 
-/* Sets the number of attempts after a first failure, until failures are forgiven; the default is 2.
- * Errors: null pointer; bad value for more than 1000. */
-ASSAY_HOST_API assay_host_error assay_host_options_set_retries(assay_host_options* options,
-                                                               uint64_t retries);
+/* What decides when there is another attempt. The comments have the defaults; docs/advise.md has
+ * the rules. */
+typedef enum assay_host_policy {
+    ASSAY_HOST_MAX_AGE = 0,        /* 30 days; hardware and software are tried again after this */
+    ASSAY_HOST_KEEP_ABSENT = 1,    /* 600; absent is */
+    ASSAY_HOST_KEEP_UNKNOWN = 2,   /* 60; unknown is, if a child ended by itself */
+    ASSAY_HOST_PAUSE = 3,          /* 60, before the second attempt after a failure */
+    ASSAY_HOST_PAUSE_GROWTH = 4,   /* 60; each further pause is longer by this factor */
+    ASSAY_HOST_RETRIES = 5,        /* 2 attempts after a first failure */
+    ASSAY_HOST_FORGIVE = 6,        /* 7 days; failures that are older don't count */
+    ASSAY_HOST_FORGIVE_FREEZE = 7, /* 30 days; ends of the system that are older don't count */
+    ASSAY_HOST_UNCLEAR = 8,        /* 3 attempts in a row that may show nothing */
+    ASSAY_HOST_UNCLEAR_PAUSE = 9   /* 600, before the next attempt after so many */
+} assay_host_policy;
+
+/* Sets a value of the policy: a time, a factor or a number of attempts. Times of more than 100
+ * years are 100 years. Errors: null pointer; bad value for another number of the enumeration, a
+ * time that is negative or not finite, a number of retries that isn't a whole one from 0 to 1000,
+ * and a factor or another number that isn't a whole one from 1 to 1000. */
+ASSAY_HOST_API assay_host_error assay_host_options_set_policy(assay_host_options* options,
+                                                              assay_host_policy which,
+                                                              double value);
 
 /* --- Runs ------------------------------------------------------------------------------------ */
 

@@ -122,6 +122,20 @@ struct Advised {
     std::string warning;                        // may be empty
 };
 
+// What decides when advise() makes another attempt. The times are seconds.
+struct Policy {
+    double max_age = 30 * 24 * 3600.0;        // hardware and software are tried again after this
+    double keep_absent = 600;                 // absent is
+    double keep_unknown = 60;                 // unknown is, if a child ended by itself
+    double pause = 60;                        // before the second attempt after a failure
+    unsigned pause_growth = 60;               // each further pause is longer by this factor
+    unsigned retries = 2;                     // attempts after a first failure
+    double forgive = 7 * 24 * 3600.0;         // failures that are older don't count
+    double forgive_freeze = 30 * 24 * 3600.0; // ends of the system that are older don't count
+    unsigned unclear = 3;                     // attempts in a row that may show nothing
+    double unclear_pause = 600;               // before the next attempt after so many
+};
+
 // The callbacks are called on the thread of run() or advise(). One that returns false ends the run;
 // one that throws ends it too, and run() or advise() throws that exception.
 struct Options {
@@ -142,10 +156,7 @@ struct Options {
     bool fresh = false;       // results are due at any age
     bool dry_run = false;     // only show what a call would do
     double wait_seconds = 10; // for the attempt of another process or thread
-    double max_age_seconds = 30 * 24 * 3600.0;
-    double pause_seconds = 60;                // after a first failure
-    double forgive_seconds = 7 * 24 * 3600.0; // older failures don't count
-    std::uint64_t retries = 2;                // after a first failure
+    Policy policy;
 };
 
 namespace detail {
@@ -253,10 +264,19 @@ inline void set_advice_options(assay_host_options* handle, const Options& option
     check(assay_host_options_set_fresh(handle, options.fresh ? 1 : 0));
     check(assay_host_options_set_dry_run(handle, options.dry_run ? 1 : 0));
     check(assay_host_options_set_wait(handle, options.wait_seconds));
-    check(assay_host_options_set_max_age(handle, options.max_age_seconds));
-    check(assay_host_options_set_pause(handle, options.pause_seconds));
-    check(assay_host_options_set_forgive(handle, options.forgive_seconds));
-    check(assay_host_options_set_retries(handle, options.retries));
+    const Policy& policy = options.policy;
+    for (const auto& [which, value] :
+         {std::pair<assay_host_policy, double>(ASSAY_HOST_MAX_AGE, policy.max_age),
+          {ASSAY_HOST_KEEP_ABSENT, policy.keep_absent},
+          {ASSAY_HOST_KEEP_UNKNOWN, policy.keep_unknown},
+          {ASSAY_HOST_PAUSE, policy.pause},
+          {ASSAY_HOST_PAUSE_GROWTH, policy.pause_growth},
+          {ASSAY_HOST_RETRIES, policy.retries},
+          {ASSAY_HOST_FORGIVE, policy.forgive},
+          {ASSAY_HOST_FORGIVE_FREEZE, policy.forgive_freeze},
+          {ASSAY_HOST_UNCLEAR, policy.unclear},
+          {ASSAY_HOST_UNCLEAR_PAUSE, policy.unclear_pause}})
+        check(assay_host_options_set_policy(handle, which, value));
 }
 
 } // namespace detail

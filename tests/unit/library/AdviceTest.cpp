@@ -18,6 +18,10 @@ namespace {
 using testing::HasSubstr;
 using testing::StartsWith;
 
+constexpr double kInfinite = std::numeric_limits<double>::infinity();
+constexpr double kNoNumber = std::numeric_limits<double>::quiet_NaN();
+constexpr double kDay = 24 * 3600;
+
 TEST(LibraryAdvice, ComesFromOneAttemptAndThenFromMemory)
 {
     const StateFolder folder;
@@ -61,7 +65,7 @@ TEST(LibraryAdvice, DescribesHardware)
     EXPECT_EQ(assay_host_advice_age(advice, ASSAY_HOST_OPENGL, nullptr), 1);
     EXPECT_EQ(assay_host_advice_failures(advice, ASSAY_HOST_OPENGL), 0U);
     EXPECT_EQ(assay_host_advice_next_attempt(advice, ASSAY_HOST_OPENGL, &seconds), 1);
-    EXPECT_GT(seconds, 29 * 24 * 3600.0);
+    EXPECT_GT(seconds, 29 * kDay);
     EXPECT_THAT(assay_host_advice_change(advice, ASSAY_HOST_OPENGL),
                 StartsWith("The next attempt is due at "));
     EXPECT_STREQ(assay_host_advice_warning(advice, ASSAY_HOST_OPENGL), "");
@@ -71,7 +75,7 @@ TEST(LibraryAdvice, DescribesACrashAndRemembersIt)
 {
     const StateFolder folder;
     const Options options;
-    assay_host_options_set_pause(options, 24 * 3600);
+    assay_host_options_set_policy(options, ASSAY_HOST_PAUSE, kDay);
     const ChildAdvice made(folder, kCrashes, options);
     EXPECT_EQ(made.Show(), "broken attempt tried");
     const ChildAdvice again(folder, kWorks, options);
@@ -87,20 +91,20 @@ TEST(LibraryAdvice, DescribesACrashAndRemembersIt)
     double seconds = 0;
     EXPECT_EQ(assay_host_advice_next_attempt(advice, ASSAY_HOST_OPENGL, &seconds), 1);
     EXPECT_GT(seconds, 0);
-    EXPECT_LE(seconds, 24 * 3600);
+    EXPECT_LE(seconds, kDay);
 }
 
 TEST(LibraryAdvice, TriesAgainByItsOptions)
 {
     const StateFolder folder;
     const Options options;
-    assay_host_options_set_pause(options, 0);
-    assay_host_options_set_retries(options, 1);
+    assay_host_options_set_policy(options, ASSAY_HOST_PAUSE, 0);
+    assay_host_options_set_policy(options, ASSAY_HOST_RETRIES, 1);
     EXPECT_EQ(ChildAdvice(folder, kCrashes, options).Show(), "broken attempt tried");
     EXPECT_EQ(ChildAdvice(folder, {}, options).Show(), "broken attempt tried");
     EXPECT_EQ(ChildAdvice(folder, {}, options).Show(), "broken memory") << "one retry";
     const Options other;
-    assay_host_options_set_pause(other, 0);
+    assay_host_options_set_policy(other, ASSAY_HOST_PAUSE, 0);
     const ChildAdvice good(folder, kWorks, other);
     EXPECT_EQ(good.Show(), "hardware attempt tried");
     EXPECT_STRNE(assay_host_advice_warning(good.fAdvice, ASSAY_HOST_OPENGL), "");
@@ -118,7 +122,7 @@ TEST(LibraryAdvice, AttemptsAreForTheNeededInterface)
     const Words crashInOpenCL = {"out", "assayStart=\"x\"",  "out",  "NumGLGPUs=0",
                                  "out", "OpenCLAvailable=1", "abort"};
     const Options options;
-    assay_host_options_set_pause(options, 0);
+    assay_host_options_set_policy(options, ASSAY_HOST_PAUSE, 0);
     EXPECT_EQ(ChildAdvice(folder, crashInOpenCL, options).Show(ASSAY_HOST_OPENCL),
               "broken attempt tried");
     EXPECT_EQ(ChildAdvice(folder, {}, options).Show(ASSAY_HOST_OPENCL), "broken memory");
@@ -305,14 +309,10 @@ TEST(LibraryAdvice, ArgumentsOutOfRange)
     EXPECT_EQ(assay_host_advise(options, "", nullptr, &advice), ASSAY_HOST_BAD_TEXT);
     EXPECT_EQ(advice, nullptr);
     assay_host_advice_free(nullptr);
-    for (const auto set : {assay_host_options_set_wait, assay_host_options_set_max_age,
-                           assay_host_options_set_pause, assay_host_options_set_forgive}) {
-        EXPECT_EQ(set(nullptr, 1), ASSAY_HOST_NULL_POINTER);
-        EXPECT_EQ(set(options, -1), ASSAY_HOST_BAD_VALUE);
-        EXPECT_EQ(set(options, std::numeric_limits<double>::infinity()), ASSAY_HOST_BAD_VALUE);
-        EXPECT_EQ(set(options, std::numeric_limits<double>::quiet_NaN()), ASSAY_HOST_BAD_VALUE);
-        EXPECT_EQ(set(options, std::numeric_limits<double>::max()), ASSAY_HOST_OK);
-    }
+    EXPECT_EQ(assay_host_options_set_wait(nullptr, 1), ASSAY_HOST_NULL_POINTER);
+    EXPECT_EQ(assay_host_options_set_wait(options, 1e300), ASSAY_HOST_OK);
+    for (const double bad : {-1.0, kInfinite, kNoNumber})
+        EXPECT_EQ(assay_host_options_set_wait(options, bad), ASSAY_HOST_BAD_VALUE);
     for (const auto set : {assay_host_options_set_fresh, assay_host_options_set_dry_run}) {
         EXPECT_EQ(set(nullptr, 1), ASSAY_HOST_NULL_POINTER);
         EXPECT_EQ(set(options, 1), ASSAY_HOST_OK);
@@ -320,9 +320,33 @@ TEST(LibraryAdvice, ArgumentsOutOfRange)
     EXPECT_EQ(assay_host_options_set_need(nullptr, 1, 1), ASSAY_HOST_NULL_POINTER);
     EXPECT_EQ(assay_host_options_set_need(options, 0, 0), ASSAY_HOST_BAD_VALUE);
     EXPECT_EQ(assay_host_options_set_need(options, 1, 1), ASSAY_HOST_OK);
-    EXPECT_EQ(assay_host_options_set_retries(nullptr, 1), ASSAY_HOST_NULL_POINTER);
-    EXPECT_EQ(assay_host_options_set_retries(options, 1001), ASSAY_HOST_BAD_VALUE);
-    EXPECT_EQ(assay_host_options_set_retries(options, 1000), ASSAY_HOST_OK);
+}
+
+TEST(LibraryAdvice, PoliciesOutOfRange)
+{
+    const Options options;
+    const auto set = [&](assay_host_policy which, double value) {
+        return assay_host_options_set_policy(options, which, value);
+    };
+    EXPECT_EQ(assay_host_options_set_policy(nullptr, ASSAY_HOST_PAUSE, 1), ASSAY_HOST_NULL_POINTER);
+    EXPECT_EQ(set(MakeNumber<assay_host_policy>(10), 1), ASSAY_HOST_BAD_VALUE);
+    for (const assay_host_policy time :
+         {ASSAY_HOST_MAX_AGE, ASSAY_HOST_KEEP_ABSENT, ASSAY_HOST_KEEP_UNKNOWN, ASSAY_HOST_PAUSE,
+          ASSAY_HOST_FORGIVE, ASSAY_HOST_FORGIVE_FREEZE, ASSAY_HOST_UNCLEAR_PAUSE}) {
+        for (const double bad : {-1.0, kInfinite, kNoNumber})
+            EXPECT_EQ(set(time, bad), ASSAY_HOST_BAD_VALUE) << time;
+        for (const double good : {0.0, 0.5, 1e300})
+            EXPECT_EQ(set(time, good), ASSAY_HOST_OK) << time;
+    }
+    for (const assay_host_policy count :
+         {ASSAY_HOST_RETRIES, ASSAY_HOST_PAUSE_GROWTH, ASSAY_HOST_UNCLEAR}) {
+        for (const double bad : {-1.0, 1.5, 1001.0, kInfinite, kNoNumber})
+            EXPECT_EQ(set(count, bad), ASSAY_HOST_BAD_VALUE) << count;
+        for (const double good : {1.0, 1000.0})
+            EXPECT_EQ(set(count, good), ASSAY_HOST_OK) << count;
+        EXPECT_EQ(set(count, 0), count == ASSAY_HOST_RETRIES ? ASSAY_HOST_OK : ASSAY_HOST_BAD_VALUE)
+            << count;
+    }
 }
 
 } // namespace

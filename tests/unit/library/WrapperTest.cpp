@@ -132,10 +132,10 @@ TEST(Wrapper, AnAdviceByEachOption)
     EXPECT_EQ(crashed.usability, assay::Usability::broken);
     EXPECT_EQ(crashed.last_line, "# a call");
     EXPECT_EQ(crashed.failures, 1U);
-    options.pause_seconds = 0;
-    options.retries = 0;
+    options.policy.pause = 0;
+    options.policy.retries = 0;
     EXPECT_FALSE(assay::advise(folder.Get(), options).tried());
-    options.retries = 2;
+    options.policy.retries = 2;
     EXPECT_TRUE(assay::advise(folder.Get(), options).tried());
     assay::State(folder.Get()).forget();
     options.arguments = kWorks;
