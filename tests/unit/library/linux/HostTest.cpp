@@ -9,13 +9,14 @@
 #include <clocale>
 #include <cstdlib>
 #include <cstring>
+#include <stdexcept>
 #include <string>
 #include <thread>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "Runs.h"
+#include "Advices.h"
 
 namespace {
 
@@ -72,12 +73,44 @@ TEST(LibraryHost, MayHaveClosedItsStandardStreams)
         ::close(stream);
     }
     const assay_host_verdict verdict = ChildRun(kWhole).GetVerdict();
+    const StateFolder folder;
+    const std::string advice = ChildAdvice(folder).Show();
     for (int stream = 0; stream < 3; ++stream) {
         EXPECT_EQ(::fcntl(stream, F_GETFD), -1) << stream << " is in use";
         ::dup2(kept[stream], stream);
         ::close(kept[stream]);
     }
     EXPECT_EQ(verdict, ASSAY_HOST_COMPLETE);
+    EXPECT_EQ(advice, "hardware attempt tried");
+}
+
+TEST(LibraryHost, IsLeftAsItIsByAnAdvice)
+{
+    const auto handler = std::signal(SIGCHLD, SIG_IGN);
+    const State before;
+    const StateFolder folder;
+    EXPECT_EQ(ChildAdvice(folder).Show(), "hardware attempt tried");
+    EXPECT_EQ(ChildAdvice(folder).Show(), "hardware memory");
+    const StateFolder other;
+    EXPECT_EQ(ChildAdvice(other, kCrashes).Show(), "broken attempt tried");
+    EXPECT_TRUE(State() == before);
+    std::signal(SIGCHLD, handler);
+}
+
+// A callback must not throw. It stands for any failure in this process during an attempt.
+TEST(LibraryHost, AnExceptionOfACallbackClosesTheAttempt)
+{
+    const StateFolder folder;
+    Options options;
+    options.OnLine([](const std::string&) -> int { throw std::runtime_error("a failure"); });
+    const ChildAdvice failed(folder, kWorks, options);
+    EXPECT_EQ(failed.fError, ASSAY_HOST_INTERNAL);
+    EXPECT_EQ(failed.fAdvice, nullptr);
+    const Options atOnce;
+    assay_host_options_set_wait(atOnce, 0);
+    const ChildAdvice later(folder, kWorks, atOnce);
+    EXPECT_EQ(later.Show(), "hardware attempt tried");
+    EXPECT_STREQ(assay_host_advice_warning(later.fAdvice, ASSAY_HOST_OPENGL), "");
 }
 
 // Threads that the library starts never run a handler of the host.
