@@ -39,21 +39,28 @@ TEST(LibraryCallbacks, ATickBringsTheStepsAndTheNextKey)
 TEST(LibraryCallbacks, LinesComeWithRisingTimesAndTheirContexts)
 {
     struct Lines {
+        std::size_t fExpected;
+        const Lines* fOther;
         std::vector<std::string> fTexts;
         std::vector<double> fSeconds;
+
+        bool IsWhole() const { return fTexts.size() == fExpected; }
     };
+    // Ends the run when all lines have come: a line may come later than the end of the child.
     const auto take = [](void* context, const char* line, std::size_t size, double seconds) {
         auto& lines = *static_cast<Lines*>(context);
         lines.fTexts.emplace_back(line, size);
         lines.fSeconds.push_back(seconds);
-        return 0;
+        return lines.IsWhole() && lines.fOther->IsWhole() ? 1 : 0;
     };
     Options options;
-    Lines out;
-    Lines err;
+    Lines out{2, nullptr, {}, {}};
+    Lines err{1, &out, {}, {}};
+    out.fOther = &err;
     EXPECT_EQ(assay_host_options_on_line(options, take, &out), ASSAY_HOST_OK);
     EXPECT_EQ(assay_host_options_on_error_line(options, take, &err), ASSAY_HOST_OK);
-    const ChildRun run({"out", "a=1", "err", "e", "out", "b=2"}, options);
+    const ChildRun run({"out", "a=1", "err", "e", "out", "b=2", "sleep", "600000"}, options);
+    EXPECT_EQ(run.GetVerdict(), ASSAY_HOST_INTERRUPTED);
     EXPECT_THAT(out.fTexts, testing::ElementsAre("a=1", "b=2"));
     EXPECT_THAT(err.fTexts, testing::ElementsAre("e"));
     EXPECT_GT(out.fSeconds.at(0), 0);
