@@ -352,7 +352,8 @@ TEST(SystemTest, SharedAppendAppendsAndGivesNullForWhatCannotBeOpened)
 
 TEST(SystemTest, APathThatHasNoNarrowFormIsRejectedAsAWhole)
 {
-    for (const wchar_t bad : {wchar_t{0xD800}, wchar_t{0xDFFF}, wchar_t{0x110000}, wchar_t{-1}}) {
+    for (const wchar_t bad :
+         {wchar_t{0xD800}, wchar_t{0xDFFF}, wchar_t{0x110000}, static_cast<wchar_t>(-1)}) {
         const std::wstring path = {L'a', bad, L'b'};
         char bytes[32] = {};
         std::mbstate_t state = {};
