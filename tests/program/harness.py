@@ -25,6 +25,8 @@ DEADLINE = 600
 
 # The sanitizers of the build, as ASSAY_SANITIZE names them; "" without.
 SANITIZED_BY = os.environ.get("ASSAY_SANITIZE", "")
+# Whether the programs are for another processor, and run by an emulator.
+EMULATED = os.environ.get("ASSAY_EMULATED", "") == "ON"
 # A sanitizer must not handle crashes: a host must see their signals.
 CRASHES = "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0:handle_sigfpe=0"
 SANITIZERS = {
@@ -36,6 +38,13 @@ SANITIZERS = {
 # Every program that a test starts gets them, with or without an environment of its own.
 for name, value in SANITIZERS.items():
     os.environ[name] = ":".join(filter(None, [os.environ.get(name), value]))
+
+
+def libraries_of(program):
+    """The files of the libraries that the loader loads with a program, by name."""
+    listed = subprocess.run([program], env={**os.environ, "LD_TRACE_LOADED_OBJECTS": "1"}, check=True,
+                            stdout=subprocess.PIPE, text=True).stdout
+    return {Path(file).name: Path(file) for file in re.findall(r"=> (\S+) \(", listed)}
 
 
 def until(condition, what):

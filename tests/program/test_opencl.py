@@ -12,7 +12,7 @@ import pytest
 
 from adapters import Adapter, write_tree
 from clmodel import CL_KEYS, ClGpu, ClPlatform, cl_script_of, cl_values_of
-from harness import BUILD, PROGRAM, SANITIZED_BY
+from harness import BUILD, PROGRAM, SANITIZED_BY, libraries_of
 from model import Gpu, check, predict, script_of
 
 WORKERS = 2
@@ -121,11 +121,8 @@ def test_library_without_opencls_entry_points(machine, tmp_path):
     """A library of that name without its functions: no OpenCL line at all."""
     folder = tmp_path / "wrong"
     folder.mkdir()
-    libm = next(line.split("=>")[1].split()[0] for line in subprocess.run(
-        ["ldd", PROGRAM], capture_output=True, text=True, check=True).stdout.splitlines()
-        if "libm.so" in line)
     for name in ("libOpenCL.so.1", "libOpenCL.so"):
-        (folder / name).symlink_to(libm)
+        (folder / name).symlink_to(libraries_of(PROGRAM)["libm.so.6"])
     machine.script(cl_script_of(machine.platforms))
     path = machine.host.environment(**machine.found)["LD_LIBRARY_PATH"]
     machine.host.variables["LD_LIBRARY_PATH"] = f"{folder}:{path}"
@@ -143,13 +140,24 @@ CALLED = """
     clWaitForEvents""".split()
 
 
+def processor_of(file):
+    """The number of the processor that an ELF file is for."""
+    return file.read_bytes()[18:20]
+
+
+def opencl_loader():
+    """The loader library that the program finds: beside its C library, or by the system's list."""
+    listed = subprocess.run(["ldconfig", "-p"], capture_output=True, text=True, check=True).stdout
+    folders = {file.parent for file in libraries_of(PROGRAM).values()}
+    files = [folder / "libOpenCL.so.1" for folder in folders]
+    files += map(Path, re.findall(r"libOpenCL\.so\.1 .*=> (\S+)", listed))
+    return next(file for file in files if file.exists() and processor_of(file) == processor_of(PROGRAM))
+
+
 def loader_without(machine, folder, lacks):
     """Makes the program find a copy of the loader without the names for which `lacks` is true.
     Returns those names."""
-    found = subprocess.run(["ldconfig", "-p"], capture_output=True, text=True, check=True).stdout
-    loader = next(line.split("=>")[1].strip() for line in found.splitlines()
-                  if "libOpenCL.so.1 " in line and "x86-64" in line)
-    library = Path(loader).read_bytes()
+    library = opencl_loader().read_bytes()
     names = {name.decode() for name in re.findall(rb"\0(cl[A-Z]\w+)(?=\0)", library)}
     missing = [name for name in names if lacks(name) and not name.startswith("clIcd")]
     for name in missing:
