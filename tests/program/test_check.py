@@ -4,7 +4,11 @@ import json
 
 import pytest
 
+from harness import EMULATED
 from hosting import host_run
+
+DRIVER = pytest.mark.skipif(EMULATED, reason="the machine's driver is for another processor")
+START = pytest.mark.skipif(EMULATED, reason="the emulator loses the failure of a start")
 
 WHOLE = """Tester="x"
 assayStart="2026-01-01_00:00:00"
@@ -32,11 +36,13 @@ def requirements(*texts):
     return [word for text in texts for word in ("--require", text)]
 
 
+@DRIVER
 def test_run_that_meets_all():
     hosted = host_run("check", *requirements("NumGLGPUs>=1", "GLVersion>=3.3", "all GLFrameBufferOK==1"))
     assert (hosted.status, hosted.text, hosted.err) == (0, "met: all 3 requirements\n", b"")
 
 
+@DRIVER
 def test_run_that_misses_some():
     hosted = host_run("check", *requirements("GLVersion>=9", "NumGLGPUs>=1", "opengl.devices>=8"))
     assert (hosted.status, hosted.err) == (7, b"")
@@ -51,6 +57,7 @@ def test_run_that_ends_early_has_its_own_status():
     assert lines[1:] == ["not met: NumGLGPUs>=1: not known (run ended before)"]
 
 
+@START
 def test_child_that_cannot_be_started():
     hosted = host_run("check", "--assay", "/nowhere/assay", *requirements("NumGLGPUs>=1"))
     assert hosted.status == 5

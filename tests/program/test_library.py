@@ -10,7 +10,7 @@ from pathlib import Path
 import pytest
 
 from calls import FullMachine
-from harness import BUILD, SANITIZED_BY
+from harness import BUILD, EMULATED, SANITIZED_BY
 from test_usable import FAILURES
 from hosting import validate_document
 
@@ -23,6 +23,7 @@ HOST = Path(__file__).with_name("library_host.py")
 pytestmark = [
     pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
                        reason="this machine has no OpenCL loader library"),
+    pytest.mark.skipif(EMULATED, reason="Python can't load a library for another processor"),
     pytest.mark.skipif(bool(SANITIZED_BY), reason="Python can't load a library with a sanitizer"),
 ]
 
