@@ -40,6 +40,33 @@ TEST(Diff, IgnoresStampsAndLogLines)
         "");
 }
 
+TEST(Diff, ComparesStampsIfAsked)
+{
+    DiffOptions options;
+    options.fStamps = true;
+    std::ostringstream out;
+    EXPECT_TRUE(PrintDiff(out, ReadReport(Sample(1, 1).GetText()),
+                          ReadReport(Sample(1, 1).Set("assayEnd", "\"2028\"").GetText()), options));
+    EXPECT_EQ(out.str(), "assayEnd: \"2026-11-21_10:49:36\" -> \"2028\"\n");
+}
+
+TEST(Diff, LetsAMeasurementBeLargerIfAsked)
+{
+    const auto differs = [](const char* value) {
+        DiffOptions options;
+        options.fFasterIsSame = true;
+        std::ostringstream out;
+        return PrintDiff(out, ReadReport(Sample(1, 1).Set("clgpu[0].CLCompute", "100").GetText()),
+                         ReadReport(Sample(1, 1).Set("clgpu[0].CLCompute", value).GetText()),
+                         options);
+    };
+    EXPECT_FALSE(differs("300"));
+    EXPECT_FALSE(differs("91"));
+    EXPECT_TRUE(differs("89"));
+    EXPECT_TRUE(differs("1e9")); // implausible: not a measurement
+    EXPECT_TRUE(differs("0"));
+}
+
 TEST(Diff, IgnoresLineEnds)
 {
     std::string text = Sample(1, 1).GetText();
