@@ -21,7 +21,7 @@ _assay_host() {
     done
 
     case $prev in
-    --assay | --output | --requirements | --from)
+    --assay | --output | --requirements | --from | --baseline)
         _filedir
         return
         ;;
@@ -58,10 +58,10 @@ _assay_host() {
     case $command in
     run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
-    diff) options+=" --tolerance" ;;
+    diff) options+=" --tolerance --identity" ;;
     explain) ;;
     show) options+=" --format --schema --output" ;;
-    check) options+=" --require --requirements --from --assay --timeout --" ;;
+    check) options+=" --require --requirements --from --baseline --tolerance --assay --timeout --" ;;
     advise)
         options+=" --state --assay --timeout --format --need --wait --max-age --fresh --pause"
         options+=" --pause-growth --retries --forgive --forgive-freeze --keep-absent --keep-unknown"

@@ -1,4 +1,8 @@
+#include <cstdio>
 #include <memory>
+#include <optional>
+#include <sstream>
+#include <stdexcept>
 #include <string>
 #include <utility>
 #include <vector>
@@ -13,6 +17,7 @@
 #include "output/WriterThread.h"
 #include "report/Answers.h"
 #include "report/Bytes.h"
+#include "report/Diff.h"
 #include "report/Report.h"
 #include "report/ReportFile.h"
 #include "report/RunOutcome.h"
@@ -40,7 +45,12 @@ std::vector<Requirement> GetRequirements(const CheckChoice& choice)
 // Writes a line for each requirement that isn't met, or one that all are.
 class Checker {
 public:
-    explicit Checker(const CheckChoice& choice) : fRequirements(GetRequirements(choice)) {}
+    explicit Checker(const CheckChoice& choice)
+        : fRequirements(GetRequirements(choice)), fTolerance(choice.fTolerance)
+    {
+        if (!choice.fBaseline.empty())
+            fBaseline = LoadReport(choice.fBaseline);
+    }
 
     // Returns whether all are met.
     bool Check(const Report& report, const RunOutcome& outcome, const std::string& prefix)
@@ -55,11 +65,9 @@ public:
             fText +=
                 fmt::format("{}not met: {}: {}\n", prefix, ShowBytes(requirement.fText), unmet);
         }
+        isMet = CheckBaseline(report, prefix) && isMet;
         if (isMet)
-            fText += fmt::format("{}met: {}\n", prefix,
-                                 fRequirements.size() == 1
-                                     ? "the requirement"
-                                     : fmt::format("all {} requirements", fRequirements.size()));
+            fText += fmt::format("{}met: {}\n", prefix, GetWhatIsMet());
         return isMet;
     }
 
@@ -68,28 +76,55 @@ public:
     const std::string& GetText() const { return fText; }
 
 private:
+    bool CheckBaseline(const Report& report, const std::string& prefix)
+    {
+        if (!fBaseline)
+            return true;
+        DiffOptions options;
+        options.fTolerance = fTolerance;
+        options.fFasterIsSame = true;
+        std::stringstream lines;
+        const bool differs = PrintDiff(lines, *fBaseline, report, options);
+        for (std::string line; std::getline(lines, line);)
+            fText += fmt::format("{}not as the baseline: {}\n", prefix, line);
+        return !differs;
+    }
+
+    std::string GetWhatIsMet() const
+    {
+        const std::string all = fRequirements.size() == 1
+                                    ? "the requirement"
+                                    : fmt::format("all {} requirements", fRequirements.size());
+        if (!fBaseline)
+            return all;
+        return fRequirements.empty() ? "the baseline" : all + " and the baseline";
+    }
+
     const std::vector<Requirement> fRequirements;
+    const double fTolerance;
+    std::optional<Report> fBaseline;
     std::string fText;
 };
-
-// A stored report is taken for one of a child that ended by itself.
-RunOutcome MakeOutcome(const Report& report)
-{
-    RunOutcome outcome;
-    outcome.fVerdict = report.IsWhole() ? Verdict::kComplete : Verdict::kFailedTests;
-    return outcome;
-}
 
 int CheckReports(const CheckChoice& choice)
 {
     Checker checker(choice);
     bool isMet = true;
+    bool isRead = true;
     for (const std::string& path : choice.fReports) {
-        const Report report = LoadReport(path);
-        const std::string prefix = choice.fReports.size() > 1 ? ShowBytes(path) + ": " : "";
-        isMet = checker.Check(report, MakeOutcome(report), prefix) && isMet;
+        try {
+            const StoredRun run = LoadRun(path);
+            const std::string prefix = choice.fReports.size() > 1 ? ShowBytes(path) + ": " : "";
+            isMet = checker.Check(run.fReport, run.fOutcome, prefix) && isMet;
+        } catch (const std::runtime_error& failure) {
+            // The other files are checked all the same.
+            std::fprintf(stderr, "assay-host: %s\n", ShowBytes(failure.what()).c_str());
+            isRead = false;
+        }
     }
     OpenStandardOutput()->Write(checker.GetText());
+    if (!isRead)
+        return kErrorStatus;
     return isMet ? 0 : kUnmetStatus;
 }
 

@@ -71,12 +71,15 @@ struct CheckChoice {
     std::vector<std::string> fRequirements;
     std::vector<std::string> fRequirementFiles;
     std::vector<std::string> fReports; // files; empty: run the child
+    std::string fBaseline;             // a file; empty: none
+    double fTolerance = 0.1;           // of the baseline, as DiffOptions::fTolerance
 };
 
 struct DiffChoice {
     std::string fBefore;
-    std::string fAfter;
-    double fTolerance = 0.1; // as DiffOptions::fTolerance
+    std::vector<std::string> fAfter; // at least one
+    double fTolerance = 0.1;         // as DiffOptions::fTolerance
+    bool fIdentity = false;          // compare the machines' names and the times too
 };
 
 struct ShowChoice {

@@ -1,25 +1,112 @@
+#include <algorithm>
+#include <cstdio>
+#include <memory>
+#include <optional>
 #include <ostream>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include <fmt/format.h>
 
 #include "app/Commands.h"
 #include "output/Output.h"
 #include "output/SinkBuffer.h"
+#include "report/Bytes.h"
 #include "report/Diff.h"
 #include "report/ReportFile.h"
 
 namespace assay_host {
 
+namespace {
+
+// Writes each line after a prefix.
+class PrefixedOutput {
+public:
+    explicit PrefixedOutput(Output& output) : fOutput(output) {}
+
+    void SetPrefix(std::string prefix) { fPrefix = std::move(prefix); }
+
+    void Write(std::string_view block)
+    {
+        std::string text;
+        while (!block.empty()) {
+            if (fIsAtStart)
+                text += fPrefix;
+            const std::size_t end = std::min(block.find('\n'), block.size() - 1) + 1;
+            fIsAtStart = block[end - 1] == '\n';
+            text += block.substr(0, end);
+            block.remove_prefix(end);
+        }
+        fOutput.Write(text);
+    }
+
+private:
+    Output& fOutput;
+    std::string fPrefix;
+    bool fIsAtStart = true;
+};
+
+// Prints the differences between the machines' names and the times.
+bool PrintIdentity(std::ostream& out, const Environment& before, const Environment& after)
+{
+    bool differs = false;
+    const auto compare = [&](const char* what, const std::string& left, const std::string& right) {
+        if (left == right)
+            return;
+        out << fmt::format("{}: {} -> {}\n", what, left.empty() ? "not known" : ShowBytes(left),
+                           right.empty() ? "not known" : ShowBytes(right));
+        differs = true;
+    };
+    compare("host", before.fHost.fValue, after.fHost.fValue);
+    compare("time", before.fTime, after.fTime);
+    return differs;
+}
+
+// Loads one of several files. Says on standard error why it can't be read, so that the others are
+// compared all the same.
+std::optional<StoredRun> TryLoad(const std::string& path)
+{
+    try {
+        return LoadRun(path);
+    } catch (const std::runtime_error& failure) {
+        std::fprintf(stderr, "assay-host: %s\n", ShowBytes(failure.what()).c_str());
+        return std::nullopt;
+    }
+}
+
+} // namespace
+
 int Diff(const DiffChoice& choice)
 {
-    const Report before = LoadReport(choice.fBefore);
-    const Report after = LoadReport(choice.fAfter);
+    const StoredRun before = LoadRun(choice.fBefore);
     DiffOptions options;
     options.fTolerance = choice.fTolerance;
+    options.fStamps = choice.fIdentity;
     const std::unique_ptr<Output> output = OpenStandardOutput();
-    SinkBuffer buffer([&output](std::string_view block) { output->Write(block); });
+    PrefixedOutput lines(*output);
+    SinkBuffer buffer([&lines](std::string_view block) { lines.Write(block); });
     std::ostream text(&buffer);
     text.exceptions(std::ios::badbit);
-    const bool differs = PrintDiff(text, before, after, options);
-    text.flush();
+    const bool isOne = choice.fAfter.size() == 1;
+    bool differs = false;
+    bool isRead = true;
+    for (const std::string& path : choice.fAfter) {
+        const std::optional<StoredRun> after = TryLoad(path);
+        if (!after) {
+            isRead = false;
+            continue;
+        }
+        lines.SetPrefix(isOne ? "" : ShowBytes(path) + ": ");
+        if (choice.fIdentity)
+            differs = PrintIdentity(text, before.fFacts.fEnvironment, after->fFacts.fEnvironment) ||
+                      differs;
+        differs = PrintDiff(text, before.fReport, after->fReport, options) || differs;
+        text.flush();
+    }
+    if (!isRead)
+        return kDiffErrorStatus;
     return differs ? kDifferentStatus : 0;
 }
 

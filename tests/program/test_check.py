@@ -99,6 +99,55 @@ def test_file_of_requirements(tmp_path, stored):
                            "not met: GLMemoryMB>=2048: glgpu[0] 1024\n")
 
 
+def test_reports_are_held_to_a_baseline(stored):
+    good, less, same = stored("good", 4096), stored("less", 2048), stored("same", 4096)
+    hosted = host_run("check", "--baseline", good, less, same)
+    assert (hosted.status, hosted.err) == (7, b"")
+    assert hosted.text == (f"{less}: not as the baseline: glgpu[0].GLMemoryMB: 4096 -> 2048\n"
+                           f"{same}: met: the baseline\n")
+    both = host_run("check", "--baseline", good, "--require", "GLVersion>=4", "--from", same)
+    assert (both.status, both.text) == (0, "met: the requirement and the baseline\n")
+
+
+def test_run_is_held_to_a_baseline(tmp_path):
+    """Another run of this machine: times and measurements differ."""
+    path = tmp_path / "baseline"
+    path.write_bytes(host_run("run", "--format", "json", "--identify").out)
+    hosted = host_run("check", "--baseline", str(path), "--tolerance", "1")
+    assert (hosted.status, hosted.text) == (0, "met: the baseline\n")
+
+
+def test_unreadable_file_does_not_hide_the_others(stored):
+    good, bad = stored("good", 4096), stored("bad", 1)
+    hosted = host_run("check", "--require", "GLMemoryMB>=2048", "/nowhere/x", good, bad)
+    assert (hosted.status, hosted.err) == (
+        10, b"assay-host: /nowhere/x: can't open: No such file or directory\n")
+    assert hosted.text == (f"{good}: met: the requirement\n"
+                           f"{bad}: not met: GLMemoryMB>=2048: glgpu[0] 1\n")
+
+
+def test_document_is_checked_by_how_its_run_ended(tmp_path):
+    path = tmp_path / "document"
+    ran = host_run("run", "--format", "json", "--", "-crashAfter=4")
+    path.write_bytes(ran.out)
+    hosted = host_run("check", "--require", "opengl.usable==hardware", str(path))
+    usable = json.loads(ran.out)["usable"]["opengl"]
+    assert hosted.text == (f"not met: opengl.usable==hardware: {usable['answer']} ({usable['text']})\n")
+
+
+def test_difference_of_identity_is_shown_if_asked(tmp_path):
+    document = json.loads(host_run("run", "--format", "json", "--identify").out)
+    files = []
+    for name, time in (("one", "2026-11-22T01:26:02Z"), ("two", "2026-11-23T01:26:02Z")):
+        document["environment"].update(time=time, host={"known": True, "value": name})
+        files.append(tmp_path / name)
+        files[-1].write_text(json.dumps(document), encoding="utf-8")
+    assert host_run("diff", *files).text == ""
+    hosted = host_run("diff", "--identity", *files)
+    assert (hosted.status, hosted.text) == (
+        1, "host: one -> two\ntime: 2026-11-22T01:26:02Z -> 2026-11-23T01:26:02Z\n")
+
+
 @pytest.mark.parametrize("words, message", [
     (["--require", "GLMemoryMb>=1"],
      'assay-host: "GLMemoryMb>=1": there is no key "GLMemoryMb"; did you mean GLMemoryMB?\n'),

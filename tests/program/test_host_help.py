@@ -33,7 +33,7 @@ Options:
   -h,--help               show this text
   --assay PATH            program to run [beside assay-host, or on the PATH]
   --timeout SECONDS       kill the child after this time, 0: never [60]
-  --format FORMAT         text, json, jsonl, html, prometheus, nfd or ansible [text]
+  --format FORMAT         [text], json, jsonl, html, prometheus, nfd, ansible
   --schema NUMBER         of json and jsonl, 1 or 2 [2]
   --need WHAT             opengl, opencl or both: exit by whether they work
   --identify              name this machine in json, jsonl and html
@@ -60,15 +60,16 @@ exit status: 0 as predicted, 1 different, 5 never started, 6 interrupted,
 """,
     "diff": """\
 show the differences between two reports
-usage: assay-host diff [option...] A B
+usage: assay-host diff [option...] A B...
 
 Positionals:
   A                       a report: json, jsonl, or as assay prints it
-  B                       the other report
+  B                       the other report; of several, each is compared with A
 
 Options:
   -h,--help               show this text
   --tolerance FRACTION    of measurements, relative to the larger one [0.1]
+  --identity              compare the machines' names and the times too
 
 exit status: 0 same, 1 different, 2 error
 """,
@@ -81,7 +82,7 @@ Positionals:
 
 Options:
   -h,--help               show this text
-  --format FORMAT         text, json, html, prometheus, nfd or ansible [text]
+  --format FORMAT         [text], json, html, prometheus, nfd, ansible
   --schema NUMBER         of json, 1 or 2 [2]
   --output FILE           write to this file [standard output]
 
@@ -102,13 +103,18 @@ exit status: 0 explained, 10 error
 """,
     "check": """\
 hold this machine, or stored reports, to requirements
-usage: assay-host check [option...] [-- child option...]
+usage: assay-host check [option...] [REPORT...] [-- child option...]
+
+Positionals:
+  REPORT                  a stored report to check instead of a run, as --from
 
 Options:
   -h,--help               show this text
   --require TEXT          a requirement; may be repeated
   --requirements FILE     a file of them; may be repeated
   --from FILE             check a stored report instead of a run; may be repeated
+  --baseline FILE         the report of a good machine, to be as
+  --tolerance FRACTION    by which a measurement may be below it [0.1]
   --assay PATH            program to run [beside assay-host, or on the PATH]
   --timeout SECONDS       kill the child after this time, 0: never [60]
 

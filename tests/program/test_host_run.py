@@ -314,7 +314,7 @@ def test_version(command):
     (["run", "--timeout", ""], ERROR_STATUS), (["run", "--timeout", "1x"], ERROR_STATUS),
     (["run", "--format", "xml"], ERROR_STATUS), (["run", "--raw", "--format", "json"], ERROR_STATUS),
     (["torture", "--kind", "x"], ERROR_STATUS), (["torture", "--", "-crashAfter=3"], ERROR_STATUS),
-    (["diff"], 2), (["diff", "a"], 2), (["diff", "a", "b", "c"], 2),
+    (["diff"], 2), (["diff", "a"], 2), (["diff", "a", "b", ""], 2),
     (["diff", "--tolerance", "-1", "a", "b"], 2), (["diff", "a", "b", "--", "x"], 2),
 ], ids=str)
 def test_bad_command_lines(command, status):
@@ -340,6 +340,13 @@ def test_diff_over_the_forms(host, tmp_path):
         run = host_run("diff", one, other)
         assert run.status == 1
         assert "Another" in run.text
+    many = host_run("diff", files["raw"], other, files["json"], files["jsonl"])
+    lines = many.text.splitlines()
+    assert many.status == 1
+    assert lines and all(line.startswith(f"{other}: ") for line in lines)
+    unreadable = host_run("diff", files["raw"], tmp_path / "missing", other)
+    assert (unreadable.status, unreadable.text) == (2, many.text)
+    assert unreadable.err.startswith(f"assay-host: {tmp_path / 'missing'}: ".encode())
     missing = host_run("diff", files["raw"], tmp_path / "missing")
     assert missing.status == 2
     assert b"missing" in missing.err

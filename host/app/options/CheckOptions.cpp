@@ -9,7 +9,7 @@ public:
     Help GetHelp() const override
     {
         return {"check", "hold this machine, or stored reports, to requirements",
-                "check [option...] [-- child option...]",
+                "check [option...] [REPORT...] [-- child option...]",
                 "A requirement is a key, a relation and a value: 'GLVersion>=3.3',\n"
                 "  'all GLFrameBufferOK==1', 'opengl.devices>=2', 'opencl.usable==hardware'\n"
                 "exit status: 0 met, 7 not met, 1 to 6 as run if the run isn't complete,\n"
@@ -18,12 +18,18 @@ public:
 
     void Add(CLI::App& command) override
     {
+        AddFiles(command, "REPORT", fReports,
+                 "a stored report to check instead of a run, as --from");
         AddTexts(command, "--require", fChoice.fRequirements, "a requirement; may be repeated",
                  "TEXT");
         AddTexts(command, "--requirements", fChoice.fRequirementFiles,
                  "a file of them; may be repeated", "FILE");
         AddTexts(command, "--from", fChoice.fReports,
                  "check a stored report instead of a run; may be repeated", "FILE");
+        AddText(command, "--baseline", fChoice.fBaseline, "the report of a good machine, to be as",
+                "FILE");
+        AddNumber(command, "--tolerance", fChoice.fTolerance,
+                  "by which a measurement may be below it [0.1]", "FRACTION");
         AddChildOptions(command, fChoice.fChild);
     }
 
@@ -32,8 +38,12 @@ public:
     CommandChoice Choose(const CLI::App& command,
                          const std::vector<std::string>& childWords) override
     {
-        if (fChoice.fRequirements.empty() && fChoice.fRequirementFiles.empty())
-            throw CLI::RequiredError("--require or --requirements");
+        if (fChoice.fRequirements.empty() && fChoice.fRequirementFiles.empty() &&
+            fChoice.fBaseline.empty())
+            throw CLI::RequiredError("--require, --requirements or --baseline");
+        if (command.count("--tolerance") > 0 && fChoice.fBaseline.empty())
+            throw CLI::ValidationError("--tolerance", "only with --baseline");
+        fChoice.fReports.insert(fChoice.fReports.end(), fReports.begin(), fReports.end());
         if (!fChoice.fReports.empty()) {
             for (const char* option : {"--assay", "--timeout"})
                 if (command.count(option) > 0)
@@ -47,6 +57,7 @@ public:
 
 private:
     CheckChoice fChoice;
+    std::vector<std::string> fReports;
 };
 
 } // namespace

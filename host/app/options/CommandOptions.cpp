@@ -57,8 +57,17 @@ void AddTexts(CLI::App& command, const char* name, std::vector<std::string>& tex
         ->option_text(placeholder)
         ->type_size(1)
         ->expected(1)
+        ->allow_extra_args(false)
         ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
         ->check(CLI::Validator(CheckNotEmpty, placeholder));
+}
+
+CLI::Option* AddFiles(CLI::App& command, const char* name, std::vector<std::string>& files,
+                      const char* what)
+{
+    return command.add_option(name, files, what)
+        ->option_text(" ")
+        ->check(CLI::Validator(CheckNotEmpty, "FILE"));
 }
 
 void AddWord(CLI::App& command, const char* name, std::string& word, const char* what,

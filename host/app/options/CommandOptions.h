@@ -66,6 +66,10 @@ CLI::Option* AddText(CLI::App& command, const char* name, std::string& text, con
 void AddTexts(CLI::App& command, const char* name, std::vector<std::string>& texts,
               const char* what, const char* placeholder);
 
+// Adds the last operands of a command: files, at least one if it is required. Returns them.
+CLI::Option* AddFiles(CLI::App& command, const char* name, std::vector<std::string>& files,
+                      const char* what);
+
 // Adds an option with one of these words.
 void AddWord(CLI::App& command, const char* name, std::string& word, const char* what,
              const char* placeholder, const std::vector<std::string>& words);

@@ -8,7 +8,7 @@ class DiffOptions : public CommandOptions {
 public:
     Help GetHelp() const override
     {
-        return {"diff", "show the differences between two reports", "diff [option...] A B",
+        return {"diff", "show the differences between two reports", "diff [option...] A B...",
                 "exit status: 0 same, 1 different, 2 error"};
     }
 
@@ -18,11 +18,13 @@ public:
                 "FILE")
             ->required()
             ->option_text(" ");
-        AddText(command, "B", fChoice.fAfter, "the other report", "FILE")
-            ->required()
-            ->option_text(" ");
+        AddFiles(command, "B", fChoice.fAfter,
+                 "the other report; of several, each is compared with A")
+            ->required();
         AddNumber(command, "--tolerance", fChoice.fTolerance,
                   "of measurements, relative to the larger one [0.1]", "FRACTION");
+        command.add_flag("--identity", fChoice.fIdentity,
+                         "compare the machines' names and the times too");
     }
 
     CommandChoice Choose(const CLI::App& /*command*/,

@@ -18,9 +18,8 @@ public:
     void Add(CLI::App& command) override
     {
         AddChildOptions(command, fChoice.fChild);
-        AddWord(command, "--format", fFormat,
-                "text, json, jsonl, html, prometheus, nfd or ansible [text]", "FORMAT",
-                {"text", "json", "jsonl", "html", "prometheus", "nfd", "ansible"});
+        AddWord(command, "--format", fFormat, "[text], json, jsonl, html, prometheus, nfd, ansible",
+                "FORMAT", {"text", "json", "jsonl", "html", "prometheus", "nfd", "ansible"});
         command.add_option("--schema", fChoice.fSchema, "of json and jsonl, 1 or 2 [2]")
             ->option_text("NUMBER")
             ->check(CLI::IsMember({"1", "2"}));

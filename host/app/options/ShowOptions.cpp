@@ -18,7 +18,7 @@ public:
                 "FILE")
             ->required()
             ->option_text(" ");
-        AddWord(command, "--format", fFormat, "text, json, html, prometheus, nfd or ansible [text]",
+        AddWord(command, "--format", fFormat, "[text], json, html, prometheus, nfd, ansible",
                 "FORMAT", {"text", "json", "html", "prometheus", "nfd", "ansible"});
         command.add_option("--schema", fChoice.fSchema, "of json, 1 or 2 [2]")
             ->option_text("NUMBER")

@@ -84,11 +84,22 @@ TEST(CommandLineOfTorture, NamesItsFailures)
     EXPECT_THAT(child.fChild.fArgs, ElementsAre("-exit=1", "x-crashAfter=1", "crashAfter"));
 }
 
-TEST(CommandLineOfDiff, HasTwoFilesAndATolerance)
+TEST(CommandLineOfCheck, TellsReportsFromTheValuesOfOptions)
 {
+    const auto check =
+        Parse<CheckChoice>({"check", "a", "--require", "x>=1", "b", "--from", "c", "d"});
+    EXPECT_THAT(check.fRequirements, ElementsAre("x>=1"));
+    EXPECT_THAT(check.fReports, ElementsAre("c", "a", "b", "d"));
+    EXPECT_EQ(Parse<CheckChoice>({"check", "--baseline", "a", "b"}).fBaseline, "a");
+}
+
+TEST(CommandLineOfDiff, HasFilesAndATolerance)
+{
+    EXPECT_THAT(Parse<DiffChoice>({"diff", "a", "b", "--identity", "c"}).fAfter,
+                ElementsAre("b", "c"));
     const auto plain = Parse<DiffChoice>({"diff", "a", "b"});
     EXPECT_EQ(plain.fBefore, "a");
-    EXPECT_EQ(plain.fAfter, "b");
+    EXPECT_THAT(plain.fAfter, ElementsAre("b"));
     EXPECT_EQ(plain.fTolerance, 0.1);
     EXPECT_EQ(Parse<DiffChoice>({"diff", "--tolerance", "0", "a", "b"}).fTolerance, 0);
     EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--tolerance=2.5"}).fTolerance, 2.5);
@@ -145,7 +156,7 @@ TEST(CommandLine, RejectsWhatNoCommandTakes)
         {{"diff", "a"}, kDiffErrorStatus},
         {{"diff", "a", ""}, kDiffErrorStatus},
         {{"diff", "", "b"}, kDiffErrorStatus},
-        {{"diff", "a", "b", "c"}, kDiffErrorStatus},
+        {{"diff", "a", "b", ""}, kDiffErrorStatus},
         {{"diff", "a", "b", "--"}, kDiffErrorStatus},
         {{"diff", "a", "b", "--tolerance", "-1"}, kDiffErrorStatus},
     };
