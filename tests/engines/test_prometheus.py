@@ -16,6 +16,7 @@ from model import Gpu
 
 RULES = INTEGRATIONS / "prometheus" / "assay-rules.yml"
 DASHBOARD = INTEGRATIONS / "prometheus" / "assay-dashboard.json"
+DOCS = TREE / "docs" / "fleet.md"
 LISTENING = r'msg="Listening on" address=(127\.0\.0\.1:\d+)'
 
 CONFIGURATION = """\
@@ -150,6 +151,18 @@ def test_panels_of_the_dashboard_are_queries(prometheus):
             prometheus.query(target["expr"].replace("$instance", ".*"))
     names = {variable["name"] for variable in dashboard["templating"]["list"]}
     assert set(re.findall(r"\$\{?(\w+)", json.dumps(dashboard))) <= names
+
+
+def test_queries_of_the_docs(prometheus, host):
+    """Each is a query, and those about what is have an answer."""
+    run_of_one_card(host, output=prometheus.textfiles / "assay.prom")
+    until(lambda: prometheus.query("assay_device_info"), "the run isn't scraped")
+    blocks = re.findall(r"^```promql\n(.*?)^```$", DOCS.read_text(encoding="utf-8"), re.DOTALL | re.MULTILINE)
+    queries = "".join(blocks).splitlines()
+    assert len(queries) == 9
+    found = {query: prometheus.query(query) for query in queries}
+    assert {query for query in queries if found[query] == []} == {
+        query for query in queries if re.search(r"offset|broken|86400|!=", query)}
 
 
 def test_metrics_of_rules_and_dashboard_exist(host):

@@ -12,10 +12,11 @@ from pathlib import Path
 import pytest
 
 from engines import INTEGRATIONS, Server, needed, outcome_of
-from harness import until
+from harness import TREE, until
 from hosting import HOST
 from model import Gpu
 
+DOCS = TREE / "docs" / "fleet.md"
 SCRIPT = INTEGRATIONS / "slurm" / "assay-health"
 REQUIREMENT = '{"require": ["all CanCompileProgramGLSL==1"]}'
 
@@ -224,6 +225,11 @@ def test_node_with_a_crashing_driver_is_drained_and_resumed(cluster):
     cluster.script.write_text(Gpu().script() + "at glCompileShader crash\n", encoding="ascii")
     until(lambda: cluster.state() == "drained", "the node isn't drained")
     assert cluster.reason().startswith("assay: crashed: The child crashed")
+    questions = [line for line in DOCS.read_text(encoding="utf-8").splitlines()
+                 if line.startswith("sinfo -N")]
+    nodes, counts = [cluster.ask("bash", "-c", question) for question in questions]
+    assert nodes.startswith("machine drained assay: crashed: ")
+    assert counts.startswith("1 assay: crashed: ")
 
     mark = cluster.folder / "ran"
     job = write_program(cluster.folder / "job", f"touch {mark}\n")
