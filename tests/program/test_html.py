@@ -4,13 +4,15 @@ import base64
 import ctypes.util
 import hashlib
 import json
+import os
 import re
 
 import pytest
 
 from browser import browser
 from calls import FullMachine
-from harness import PROGRAM_AT_ROOT, text_of
+from clmodel import ClGpu, ClPlatform
+from harness import PROGRAM_AT_ROOT, TREE, text_of
 from hosting import host_run, script_child
 from validate import validate_document
 
@@ -26,8 +28,9 @@ def a_window():
         yield window
 
 
-def run(folder, *options, gl="", cl="", child=()):
-    host, found = FullMachine(folder).host("run", gl, cl)
+def run(folder, *options, gl="", cl="", child=(), cards=None):
+    machine = FullMachine(folder) if cards is None else FullMachine(folder, opencl=[ClPlatform(cards)])
+    host, found = machine.host("run", gl, cl)
     arguments = ["--", *child] if child else []
     return host_run("run", "--assay", str(PROGRAM_AT_ROOT), *options, *arguments,
                     environment=host.environment(**found))
@@ -39,6 +42,14 @@ def healthy(folder):
 
 def crashed(folder):
     return run(folder, "--format", "html", gl="at glLinkProgram crash\n")
+
+
+def two_cards(folder):
+    """For OpenCL, with other speeds."""
+    # A measurement of the second takes four batches.
+    cards = [ClGpu(name="Large card", batch=600_000, memory=24 << 30, kernel=2_000_000),
+             ClGpu(name="Small card", batch=2_400_000, memory=4 << 30, kernel=9_000_000)]
+    return run(folder, "--format", "html", cards=cards)
 
 
 def trial_failed(folder):
@@ -64,11 +75,12 @@ def hostile(folder):
     return host_run("run", "--assay", str(child), "--format", "html")
 
 
-PAGES = {"healthy": healthy, "crashed": crashed, "trial-failed": trial_failed,
+PAGES = {"healthy": healthy, "crashed": crashed, "two-cards": two_cards, "trial-failed": trial_failed,
          "never-started": never_started, "hostile": hostile}
 HEADLINES = {
     "healthy": "OpenGL works on graphics hardware.",
     "crashed": "The child crashed with signal 11 (Segmentation fault)",
+    "two-cards": "OpenGL works on graphics hardware.",
     "trial-failed": "OpenGL does not work: glgpu[0]: no complete framebuffer object could be created",
     "never-started": "The child could not be started",
     "hostile": "OpenGL works on graphics hardware.",
@@ -94,7 +106,7 @@ def test_a_page_says_what_happened(window, pages, name):
     assert window.run("return document.querySelectorAll('h1').length") == 1
     assert window.run("return document.documentElement.lang") == "en"
     advice = window.run("return [...document.querySelectorAll('h2')].some(h => h.innerText === 'What to do')")
-    assert advice == (name not in ("healthy", "hostile"))
+    assert advice == (name not in ("healthy", "two-cards", "hostile"))
 
 
 @pytest.mark.parametrize("name", PAGES)
@@ -203,3 +215,34 @@ def test_only_text_takes_raw(tmp_path):
     hosted = host_run("run", "--assay", str(tmp_path / "nothing"), "--format", "html", "--raw")
     assert hosted.status == 10
     assert "--raw: only with --format text" in text_of(hosted.err)
+
+
+# What the documentation shows.
+PICTURES = TREE / "docs" / "pictures"
+
+
+@pytest.mark.parametrize("name", ["healthy", "crashed", "two-cards"])
+def test_the_pictures_in_the_documentation(window, pages, name, tmp_path):
+    """A picture is of the page as it is: the landmarks, headings and terms are those that were there
+    when it was taken. ASSAY_NEW_PICTURES=1 takes them again."""
+    window.open(pages[name], width=1000)
+    outline = "\n".join(window.outline()) + "\n"
+    # What is this machine's own is left out of a picture.
+    window.run("""
+        for (const term of document.querySelectorAll("dt"))
+            if (["Command", "System", "Build", "Kernel", "Architecture"].includes(term.textContent)) {
+                term.nextElementSibling.remove();
+                term.remove();
+            }""")
+    if os.environ.get("ASSAY_NEW_PICTURES"):
+        PICTURES.mkdir(exist_ok=True)
+        window.picture(PICTURES / f"{name}.png")
+        (PICTURES / f"{name}.txt").write_text(outline, encoding="utf-8")
+    assert outline == (PICTURES / f"{name}.txt").read_text(encoding="utf-8")
+    picture = tmp_path / "picture.png"
+    window.picture(picture)
+    size = [int.from_bytes((file.read_bytes())[16:24][start:start + 4], "big")
+            for file in (picture, PICTURES / f"{name}.png") for start in (0, 4)]
+    # The fonts of a machine may make a page a little longer.
+    assert size[0] == size[2] == 1000
+    assert abs(size[1] - size[3]) < size[3] / 4
