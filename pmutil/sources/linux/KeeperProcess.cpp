@@ -166,8 +166,10 @@ void KeeperProcess::Start(KeeperPlan& plan)
     plan.fLink = ends[1];
     plan.fEnd = pipe.writer->GetHandle();
     plan.fHost = host.GetHandle();
-    fPidfd = boost::make_shared<PosixHandle>(PosixCalls::GetInvalid(), false);
-    fPidfd->Reset(Clone(plan), true);
+    // Allocated before the keeper exists, and kept only with a keeper: Leave waits for it.
+    const auto pidfd = boost::make_shared<PosixHandle>(PosixCalls::GetInvalid(), false);
+    pidfd->Reset(Clone(plan), true);
+    fPidfd = pidfd;
     link.Close();
     pipe.writer->Close();
 

@@ -88,7 +88,7 @@ void WriteState()
     ::sigprocmask(SIG_BLOCK, nullptr, &mask);
     int blocked = 0;
     int changed = 0;
-    for (int number = 1; number < 32; ++number) {
+    for (int number = 1; number <= SIGRTMAX; ++number) {
         struct sigaction action = {};
         ::sigaction(number, nullptr, &action);
         blocked += ::sigismember(&mask, number) == 1;

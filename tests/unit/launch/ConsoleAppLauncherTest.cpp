@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "FakeLauncher.h"
+#include "RecordingLogger.h"
 #include "Throws.h"
 #include "pmutil/Threads.h"
 
@@ -75,6 +76,18 @@ TEST(ConsoleAppAccessor, OfAnAppThatIsGone)
     EXPECT_TRUE(ThrowsExactly<Exception>("Launcher: no ExecutionData", [&] {
         accessor.GetExecutionData();
     })) << "it forgot its data";
+}
+
+TEST(ConsoleAppAccessor, LogsAFailureThatItCannotNotify)
+{
+    const DebugValueSetter log("ConsoleAppLog", 1);
+    const RecordingLogger logger;
+    ConsoleAppAccessor accessor(TaskID::kStdout, nullptr);
+    accessor.NotifyFailure(Exception(TaskID::kStderr, "first"));
+    ASSERT_EQ(logger.lines.size(), 1U);
+    EXPECT_EQ(MessageOf(logger.lines[0]),
+              "ConsoleAppAccessor::NotifyFailure exc=stderr: first could not notify app because "
+              "stdout: no ExecutionData\n");
 }
 
 TEST(ConsoleAppAccessor, OfATaskThatIsGone)

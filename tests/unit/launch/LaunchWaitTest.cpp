@@ -1,5 +1,7 @@
 // The waits of a supervised application: what wakes them, their limits and their results. The limit
 // of a wait is far longer than the test, so that only a wake ends it.
+#include <limits>
+
 #include <gmock/gmock.h>
 
 #include "ConsoleAppFixture.h"
@@ -276,6 +278,16 @@ TEST(WaitTime, IsRoundedToWholeMilliseconds)
         EXPECT_EQ(ToWaitDuration(row.seconds).total_microseconds(), row.microseconds)
             << row.seconds;
     EXPECT_EQ(GetTimeLeft(GetWaitClock() - 1.0), 0.0);
+}
+
+TEST(WaitTime, IsInfiniteBeyondAHundredYears)
+{
+    constexpr double kYears = 100.0 * 365 * 24 * 60 * 60;
+    EXPECT_EQ(ToWaitDuration(kYears).total_seconds(), 3153600000);
+    EXPECT_TRUE(ToWaitDuration(kYears + 1).is_pos_infinity());
+    EXPECT_FALSE(ToWaitDuration(-kYears).is_special());
+    EXPECT_TRUE(ToWaitDuration(-kYears - 1).is_neg_infinity());
+    EXPECT_TRUE(ToWaitDuration(std::numeric_limits<double>::quiet_NaN()).is_not_a_date_time());
 }
 
 } // namespace
