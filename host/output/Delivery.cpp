@@ -22,10 +22,10 @@ namespace {
 
 } // namespace
 
-Delivery::Delivery(std::shared_ptr<WriterThread> writer) : fWriter(std::move(writer))
-{
-    fInterrupts = SetInterruptEnd([shared = fWriter] { GiveUp(*shared); });
-}
+Delivery::Delivery(std::shared_ptr<WriterThread> writer)
+    : fWriter(std::move(writer)),
+      fInterrupts(SetInterruptEnd([shared = fWriter] { GiveUp(*shared); }))
+{}
 
 Delivery::~Delivery()
 {

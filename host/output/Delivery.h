@@ -24,7 +24,7 @@ public:
 
 private:
     const std::shared_ptr<WriterThread> fWriter;
-    int fInterrupts = 0; // before the construction
+    const int fInterrupts; // before the construction
 };
 
 } // namespace assay_host

@@ -134,6 +134,41 @@ TEST_F(WriterThreadTest, GivesUpAReaderThatDoesNotRead)
     EXPECT_FALSE(fReader->fFinished);
 }
 
+// Stops to read after many pieces, for which a writer needs longer than the patience below.
+class TiringOutput : public Output {
+public:
+    static constexpr int kPieces = 100'000;
+
+    explicit TiringOutput(std::shared_ptr<Reader> reader) : fReader(std::move(reader)) {}
+
+    void Write(std::string_view text) override
+    {
+        if (++fPieces > kPieces)
+            fReader->Take(text);
+    }
+    void Finish() override {}
+    void Abandon() override {}
+
+private:
+    const std::shared_ptr<Reader> fReader;
+    int fPieces = 0;
+};
+
+TEST(WriterThreadEndTest, GivesUpAReaderThatStopsWhileItWaits)
+{
+    const auto reader = std::make_shared<Reader>();
+    reader->Stop();
+    WriterThread writer(std::make_unique<TiringOutput>(reader), [] {});
+    writer.WriteLarge([](std::ostream& out) {
+        const std::string block(4096, 'x');
+        for (int piece = 0; piece <= TiringOutput::kPieces; ++piece)
+            out << block;
+    });
+    EXPECT_FALSE(writer.Finish(milliseconds(1)));
+    writer.Abandon();
+    reader->Resume();
+}
+
 // The thread holds the output, and waits for the next text when its owner goes.
 TEST(WriterThreadEndTest, EndsAndLetsGoOfTheOutputWhenItIsAbandoned)
 {
