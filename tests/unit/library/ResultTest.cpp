@@ -39,6 +39,18 @@ const Words kReport = MakeReport({
     "glgpu[0].New=12345678901234567890",
 });
 
+TEST(LibraryResult, HasNoMoreWarningsThanItCounts)
+{
+    const ChildRun run(kReport);
+    const std::size_t count = assay_host_result_warning_count(run.fResult);
+    for (const std::size_t index : {count, count + 1, static_cast<std::size_t>(-1)}) {
+        EXPECT_STREQ(assay_host_result_warning_code(run.fResult, index), "");
+        EXPECT_STREQ(assay_host_result_warning_device(run.fResult, index), "");
+        EXPECT_STREQ(assay_host_result_warning_text(run.fResult, index), "");
+        EXPECT_STREQ(assay_host_result_warning_cause(run.fResult, index), "");
+    }
+}
+
 TEST(LibraryResult, AnswersHaveTheirKinds)
 {
     const ChildRun run(kReport);
@@ -70,6 +82,11 @@ TEST(LibraryResult, AnswersHaveTheirKinds)
     EXPECT_STREQ(assay_host_answer_text(find("glgpu[0].GLVendor"), nullptr), "?");
     EXPECT_STREQ(assay_host_answer_reason(find("glgpu[0].GLVendor")),
                  "the system's adapter lists do not have it");
+    for (const char* unanswered : {"glgpu[0].GLVendor", "assayEnd"}) {
+        EXPECT_EQ(assay_host_answer_flag(find(unanswered)), -1);
+        EXPECT_EQ(assay_host_answer_number(find(unanswered)), 0);
+        EXPECT_EQ(assay_host_answer_list_size(find(unanswered)), 0U);
+    }
     EXPECT_EQ(assay_host_answer_kind(find("assayEnd")), ASSAY_HOST_NOTHING);
     EXPECT_STREQ(assay_host_answer_reason(find("assayEnd")), "run ended before");
     EXPECT_STREQ(assay_host_answer_text(find("assayEnd"), &size), "");

@@ -122,6 +122,14 @@ TEST(ElfNotes, AreReadFromSegmentsOfNotesOnly)
     EXPECT_EQ(Find(MakeFile({{PT_NOTE, ""}, {PT_NOTE, note}}), "own", 1), "text");
 }
 
+TEST(ElfNotes, AreReadFromAsManySegmentsAsTheFileCounts)
+{
+    std::string file = MakeFile({{PT_LOAD, "x"}, {PT_NOTE, MakeNote("own", 1, "text")}});
+    ASSERT_EQ(Find(file, "own", 1), "text");
+    file[offsetof(ElfW(Ehdr), e_phnum)] = 1;
+    EXPECT_EQ(Find(file, "own", 1), "");
+}
+
 TEST(ElfNotes, MayBeAnyLengthThatTheirSegmentHolds)
 {
     for (const std::size_t size : {0U, 1U, 3U, 4U, 5U, 8U}) {
