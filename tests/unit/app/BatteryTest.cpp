@@ -389,6 +389,14 @@ TEST_F(OneDevice, TheBandwidthMeasurementIsALogScope)
                                      "t.CLBandwidth=1.23457e+09"));
 }
 
+TEST_F(OneDevice, TheDelayIsNoneUntilItIsSet)
+{
+    pmutil::InitLogging();
+    tester.DoRunCLBandwidth("t", *cl);
+    static pmutil::DebugValue delay{"GPUAssayOCLDelay", 7};
+    EXPECT_EQ(pmutil::GetDebugValue(delay), 0);
+}
+
 TEST_F(OneDevice, TheDelayPrecedesTheMeasurement)
 {
     pmutil::InitLogging();

@@ -12,6 +12,13 @@ TEST(FormatTest, FormatsLikePrintf)
     EXPECT_EQ(FormatString("%s", ""), "");
 }
 
+TEST(FormatTest, ANullTextIsShown)
+{
+    const char* volatile none = nullptr;
+    EXPECT_EQ(FormatString("%s", none), "(null)");
+    EXPECT_EQ(FormatString("<%s>", none), "<(null)>");
+}
+
 TEST(FormatTest, TextOfAnyLengthIsWhole)
 {
     for (const std::size_t size : {254U, 255U, 256U, 257U, 1000U, 1000000U}) {

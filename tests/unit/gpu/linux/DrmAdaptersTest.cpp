@@ -63,6 +63,7 @@ TEST(DrmAdaptersTest, ADiscreteCardWithEverything)
     EXPECT_EQ(adapter.connectors[1].name, "DP-2");
     EXPECT_EQ(adapter.connectors[1].connected, false);
     EXPECT_EQ(adapter.connectors[1].width, 0U);
+    EXPECT_EQ(adapter.connectors[1].height, 0U);
     EXPECT_EQ(adapter.connectors[2].name, "HDMI-A-1");
     EXPECT_EQ(adapter.connectors[2].width, 1920U);
 }

@@ -128,6 +128,10 @@ TEST(DrmMemoryTest, OtherRangesAreIgnored)
 {
     EXPECT_EQ(LargestPrefetchableBar(""), 0U);
     EXPECT_EQ(LargestPrefetchableBar(kNothing), 0U);
+    // Of one byte, and of a size that 64 bits hold.
+    EXPECT_EQ(LargestPrefetchableBar("0x1 0x1 0x220c\n"), 0U);
+    EXPECT_EQ(LargestPrefetchableBar("0x1 0x2 0x220c\n"), 2U);
+    EXPECT_EQ(LargestPrefetchableBar("0x1 0xfffffffffffffffe 0x220c\n"), 0xFFFFFFFFFFFFFFFEU);
     // Registers and ports.
     EXPECT_EQ(LargestPrefetchableBar("0x0 0x3fffffff 0x140204\n0x0 0xff 0x40101\n"), 0U);
     // The lines after the sixth are the ROM and the BARs of virtual functions.

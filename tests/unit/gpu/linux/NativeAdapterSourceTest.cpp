@@ -162,6 +162,33 @@ TEST(NativeAdapterSourceTest, OtherCardsHaveNoSharedMemory)
     }
 }
 
+// 0 is the only result of a call that did what it was asked for.
+TEST(NativeAdapterSourceTest, EachCallSucceeds)
+{
+    const AdapterTree tree("amd-discrete");
+    const auto service = NativeAdapterSource().CreateManagementService();
+    EXPECT_EQ(service->Initialize(), 0);
+    EXPECT_EQ(service->CreateLocator(), 0);
+    EXPECT_EQ(service->ConnectServer(), 0);
+    EXPECT_EQ(service->SetProxyBlanket(), 0);
+    std::unique_ptr<AdapterRows> rows;
+    EXPECT_EQ(service->QueryAdapters(rows), 0);
+    std::unique_ptr<AdapterRow> row;
+    EXPECT_EQ(rows->Next(row), 0);
+    PropertyValue value;
+    EXPECT_EQ(row->Get(u"Name", value), 0);
+    std::unique_ptr<AdapterFactory> factory;
+    EXPECT_EQ(NativeAdapterSource().CreateFactory(factory), 0);
+    std::unique_ptr<Adapter> adapter;
+    EXPECT_EQ(factory->EnumAdapters(0, adapter), 0);
+    AdapterDescriptor descriptor;
+    EXPECT_EQ(adapter->GetDesc(descriptor), 0);
+    std::unique_ptr<AdapterOutput> output;
+    EXPECT_EQ(adapter->EnumOutputs(0, output), 0);
+    OutputDescriptor outputDescriptor;
+    EXPECT_EQ(output->GetDesc(outputDescriptor), 0);
+}
+
 // The names of the adapter's outputs; '*' marks those that are attached to the desktop.
 std::string Outputs(std::uint32_t index)
 {

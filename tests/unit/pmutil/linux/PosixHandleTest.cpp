@@ -307,6 +307,27 @@ TEST(PosixHandle, TemporaryFilesAreTheUsersOwn)
     EXPECT_EQ(status.st_mode & 0777U, 0600U);
 }
 
+TEST(PosixHandle, OtherNewFilesHaveAllRightsThatTheProcessLeaves)
+{
+    const std::string path =
+        PosixHandle::GetTemporaryDirectory() + "/rights" + std::to_string(::getpid());
+    const ::mode_t before = ::umask(0);
+    const struct {
+        ::mode_t fMask;
+        ::mode_t fMode;
+    } kRows[] = {{0, 0666}, {027, 0640}, {077, 0600}};
+    for (const auto& row : kRows) {
+        ::umask(row.fMask);
+        const auto file = PosixHandle::OpenFile(path, kOpenWrite, kOpenAlways, false);
+        struct stat status = {};
+        ASSERT_EQ(::fstat(file->GetHandle(), &status), 0);
+        EXPECT_EQ(status.st_mode & 07777U, row.fMode);
+        EXPECT_EQ(::fcntl(file->GetHandle(), F_GETFD) & FD_CLOEXEC, FD_CLOEXEC);
+        ::unlink(path.c_str());
+    }
+    ::umask(before);
+}
+
 TEST(PosixHandle, StandardChannelsStandOverTheFirstThreeDescriptors)
 {
     EXPECT_EQ(dynamic_cast<PosixHandle&>(PosixHandle::GetStandardInput()).GetHandle(), 0);

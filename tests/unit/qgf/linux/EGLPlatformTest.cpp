@@ -128,7 +128,9 @@ bool HasPair(const EGLint* attributes, EGLint name, EGLint value)
 EGLBoolean ChooseConfig(EGLDisplay, const EGLint* attributes, EGLConfig* config, EGLint size,
                         EGLint* count)
 {
-    const bool preferred = HasPair(attributes, EGL_RED_SIZE, 8);
+    const bool preferred =
+        HasPair(attributes, EGL_RED_SIZE, 8) && HasPair(attributes, EGL_GREEN_SIZE, 8) &&
+        HasPair(attributes, EGL_BLUE_SIZE, 8) && HasPair(attributes, EGL_ALPHA_SIZE, 8);
     std::string text = preferred ? "8888" : "any";
     if (HasPair(attributes, EGL_SURFACE_TYPE, EGL_PBUFFER_BIT))
         text += " pbuffer";
@@ -396,6 +398,17 @@ TEST_F(EGLPlatformTest, NvidiaDeviceWithoutNodeIsFoundByItsOwnName)
         {"EGL_NV_device_cuda EGL_EXT_device_query_name", {{EGL_RENDERER_EXT, "Card 2"}}},
         {"EGL_NV_device_cuda", {}}};
     EXPECT_THAT(devices(), ElementsAre("egl:0|Second Adapter|0000:02:00.0", "egl:1|egl:1|"));
+}
+
+// The scripted query fails the test for a string that the device lacks.
+TEST_F(EGLPlatformTest, OnlyAnNvidiaDeviceOfUnknownAddressIsAskedForItsName)
+{
+    script.devices = {{"EGL_EXT_device_query_name", {}},
+                      {"EGL_NV_device_cuda EGL_EXT_device_query_name EGL_EXT_device_drm",
+                       {{EGL_DRM_DEVICE_FILE_EXT, "/dev/dri/card0"}}},
+                      {"EGL_EXT_device_query_name EGL_EXT_device_drm",
+                       {{EGL_DRM_DEVICE_FILE_EXT, "/dev/dri/card1"}}}};
+    EXPECT_EQ(devices().size(), 3U);
 }
 
 TEST_F(EGLPlatformTest, TakenAddressesArePassedToTheLookup)

@@ -29,6 +29,13 @@ TEST(PciIdsTest, ANameConsistsOfVendorAndDevice)
               "Advanced Micro Devices, Inc. [AMD/ATI] Navi 31 [Radeon RX 7900 XT/7900 XTX]");
 }
 
+TEST(PciIdsTest, ABlankFollowsAnId)
+{
+    const std::string text = "1002x  Wrong\n1002 \n10020 Wrong\n1002 A vendor  \r\n"
+                             "\t744cx  Wrong\n\t744c    A card \r\n";
+    EXPECT_EQ(FindPciName(text, 0x1002, 0x744C), "A vendor A card");
+}
+
 TEST(PciIdsTest, AnUnknownDeviceHasNoName)
 {
     EXPECT_EQ(FindPciName(kText, 0x1002, 0x744D), "");
