@@ -1,5 +1,8 @@
 #include "facts/OsRelease.h"
 
+#include <fstream>
+#include <iterator>
+
 namespace assay_host {
 
 namespace {
@@ -35,6 +38,22 @@ std::string FindOsRelease(std::string_view text, std::string_view name)
         }
     }
     return value;
+}
+
+std::string FindOsBuild(std::string_view text)
+{
+    const std::string build = FindOsRelease(text, "BUILD_ID");
+    return build.empty() ? FindOsRelease(text, "VERSION_ID") : build;
+}
+
+std::string ReadOsRelease(const std::string& root)
+{
+    for (const char* path : {"/etc/os-release", "/usr/lib/os-release"}) {
+        std::ifstream file(root + path, std::ios::binary);
+        if (file)
+            return {std::istreambuf_iterator<char>(file), {}};
+    }
+    return {};
 }
 
 } // namespace assay_host

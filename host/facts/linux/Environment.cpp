@@ -1,8 +1,6 @@
 #include "facts/Environment.h"
 
 #include <ctime>
-#include <fstream>
-#include <iterator>
 #include <string>
 
 #include <sys/utsname.h>
@@ -21,16 +19,6 @@ Fact MakeFact(std::string value, const char* reason)
     return {std::move(value), {}};
 }
 
-std::string ReadOsRelease()
-{
-    for (const char* path : {"/etc/os-release", "/usr/lib/os-release"}) {
-        std::ifstream file(path, std::ios::binary);
-        if (file)
-            return {std::istreambuf_iterator<char>(file), {}};
-    }
-    return {};
-}
-
 void SetTime(Environment& environment)
 {
     const std::time_t now = std::time(nullptr);
@@ -46,11 +34,9 @@ Environment GetEnvironment(bool identify)
 {
     Environment environment;
     SetTime(environment);
-    const std::string release = ReadOsRelease();
-    const std::string build = FindOsRelease(release, "BUILD_ID");
+    const std::string release = ReadOsRelease({});
     environment.fSystem = MakeFact(FindOsRelease(release, "PRETTY_NAME"), "no os-release names it");
-    environment.fBuild = MakeFact(build.empty() ? FindOsRelease(release, "VERSION_ID") : build,
-                                  "no os-release has it");
+    environment.fBuild = MakeFact(FindOsBuild(release), "no os-release has it");
     ::utsname names{};
     const bool hasNames = ::uname(&names) == 0;
     constexpr const char* kNoNames = "the kernel does not tell";
