@@ -113,8 +113,8 @@ TEST(CommandLineOfState, NamesItsActions)
 TEST(CommandLineOfCheck, HasAnOptionForEachField)
 {
     const auto check = Parse<CheckChoice>({"check", "--require", "a", "--require", "b",
-                                           "--requirements", "c", "--requirements", "d",
-                                           "--assay", "e", "--timeout", "2", "--", "-x", "y"});
+                                           "--requirements", "c", "--requirements", "d", "--assay",
+                                           "e", "--timeout", "2", "--", "-x", "y"});
     EXPECT_THAT(check.fRequirements, ElementsAre("a", "b"));
     EXPECT_THAT(check.fRequirementFiles, ElementsAre("c", "d"));
     EXPECT_THAT(check.fReports, IsEmpty());
@@ -157,8 +157,8 @@ TEST(CommandLine, SaysWhatItRejects)
     for (const Row& row : kRows) {
         const Parsed parsed = ParseCommandLine(row.fWords);
         EXPECT_FALSE(parsed.fChoice) << row.fMessage;
-        EXPECT_EQ(parsed.fText, "assay-host: " + row.fMessage +
-                                    "\nRun \"assay-host --help\" for the usage.\n");
+        EXPECT_EQ(parsed.fText,
+                  "assay-host: " + row.fMessage + "\nRun \"assay-host --help\" for the usage.\n");
     }
     for (const char* option : {"--wait", "--max-age", "--pause", "--forgive", "--forgive-freeze",
                                "--keep-absent", "--keep-unknown", "--unclear-pause"})

@@ -51,8 +51,7 @@ TEST(FailedLaunch, EndsWhatItStarted)
         options.fProgram = TEST_CHILD;
         RunObserver observer;
         pmutil::StopRequest stop;
-        const RunOutcome outcome =
-            RunChild(options, observer, stop, containment, GetLongTimes());
+        const RunOutcome outcome = RunChild(options, observer, stop, containment, GetLongTimes());
         EXPECT_EQ(outcome.fVerdict, Verdict::kNeverStarted);
         EXPECT_THAT(outcome.fReason, testing::HasSubstr("no streams"));
         EXPECT_EQ(outcome.fLeftBehind, !ends);

@@ -129,8 +129,7 @@ TEST(KeeperProcess, WaitsOnWhenSignalsInterruptIt)
     LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", "read line; exit 5"});
     int exitCode = -1;
     std::atomic<int> result{-1};
-    Interrupt([&] { result = launcher.Wait(&exitCode); },
-              [&] { ends.fAppInput.reset(); });
+    Interrupt([&] { result = launcher.Wait(&exitCode); }, [&] { ends.fAppInput.reset(); });
     EXPECT_EQ(result, kEndedNormally);
     EXPECT_EQ(exitCode, 5);
 }
@@ -186,8 +185,8 @@ int CountGuards()
         char* end = nullptr;
         const unsigned long begin = std::strtoul(line.c_str(), &end, 16);
         const unsigned long bytes = std::strtoul(end + 1, &end, 16) - begin;
-        count += bytes == 65536 && line.compare(static_cast<std::size_t>(end - line.c_str()), 5,
-                                                " ---p") == 0
+        count += bytes == 65536 &&
+                         line.compare(static_cast<std::size_t>(end - line.c_str()), 5, " ---p") == 0
                      ? 1
                      : 0;
     }

@@ -72,8 +72,8 @@ private:
 
 TEST_F(DeliveryTest, WithoutAnInterruptNeedsNoPatience)
 {
-    EXPECT_EXIT(Deliver(std::make_unique<ReadOutput>(), 0, kNoPatience),
-                testing::ExitedWithCode(0), "");
+    EXPECT_EXIT(Deliver(std::make_unique<ReadOutput>(), 0, kNoPatience), testing::ExitedWithCode(0),
+                "");
 }
 
 TEST_F(DeliveryTest, AfterAnInterruptWaitsForAReaderThatReads)
