@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
+#include <string_view>
 
 #include <elf.h>
 #include <link.h>
@@ -54,6 +55,18 @@ std::string FindNote(const std::string& notes, const std::string& owner, std::ui
         at += name + text;
     }
     return {};
+}
+
+std::string MakeHexText(const std::string& bytes)
+{
+    constexpr std::string_view kDigits = "0123456789abcdef";
+    std::string text;
+    for (const char byte : bytes) {
+        const auto value = static_cast<unsigned char>(byte);
+        text += kDigits[value >> 4];
+        text += kDigits[value & 0xF];
+    }
+    return text;
 }
 
 std::string FindElfNote(std::istream& file, const std::string& owner, std::uint32_t type)

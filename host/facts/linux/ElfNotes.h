@@ -14,4 +14,7 @@ std::string FindElfNote(std::istream& file, const std::string& owner, std::uint3
 // Finds the note in the bytes of one segment of notes. Empty if it has none or is damaged.
 std::string FindNote(const std::string& notes, const std::string& owner, std::uint32_t type);
 
+// Returns the bytes in lower-case hexadecimal, as a build id is written.
+std::string MakeHexText(const std::string& bytes);
+
 } // namespace assay_host

@@ -91,18 +91,6 @@ Segments ReadSegments(const Reader& file)
                                       std::min<std::size_t>(header.e_phnum, kMaxSegments));
 }
 
-std::string MakeHexText(const std::string& bytes)
-{
-    constexpr std::string_view kDigits = "0123456789abcdef";
-    std::string text;
-    for (const char byte : bytes) {
-        const auto value = static_cast<unsigned char>(byte);
-        text += kDigits[value >> 4];
-        text += kDigits[value & 0xF];
-    }
-    return text;
-}
-
 std::string ReadBuildId(const Reader& file, const Segments& segments)
 {
     for (const ElfW(Phdr) & segment : segments) {
