@@ -52,7 +52,7 @@ class Library:
 
 def spawn_bare(child):
     read, write = os.pipe()
-    pid = os.posix_spawn(child, [child, "-verbose=1", *WORDS], os.environ, file_actions=[
+    pid = os.posix_spawn(child, [child, "-verbose=0x101", *WORDS], os.environ, file_actions=[
         (os.POSIX_SPAWN_DUP2, write, 1), (os.POSIX_SPAWN_CLOSE, read)])
     os.close(write)
     while os.read(read, 65536):

@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "report/LoadedFiles.h"
+
 namespace assay_host {
 
 enum class Verdict {
@@ -45,7 +47,8 @@ struct RunOutcome {
     std::uint64_t fLostOutputBytes = 0;   // dropped by a limit
     std::uint64_t fLostErrorBytes = 0;
     std::vector<Cause> fCauses; // in the order of the log; empty if the child kept none
-    bool fLeftBehind = false;   // a process could not be killed and may still be running
+    LoadedFiles fDrivers{{}, "the child was not started"};
+    bool fLeftBehind = false; // a process could not be killed and may still be running
 
     // Returns the text of the first cause of this key; empty without one.
     std::string FindCause(const std::string& key) const;

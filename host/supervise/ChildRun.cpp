@@ -13,6 +13,7 @@
 #include "pmutil/StartAwareApp.h"
 #include "report/Causes.h"
 #include "report/LineForm.h"
+#include "report/LoadedFiles.h"
 #include "report/LogFilter.h"
 #include "supervise/ErrorLines.h"
 #include "supervise/EventQueue.h"
@@ -76,6 +77,8 @@ public:
         if (fStop.IsRaised()) {
             fEvidence.fKillReason = KillReason::kInterrupt;
         } else if (Launch()) {
+            fOutcome.fDrivers.fReason =
+                fAddsLog ? "the child did not log them" : "the log of the child was not requested";
             try {
                 fObserver.OnStart();
                 Follow();
@@ -192,7 +195,7 @@ private:
     {
         std::vector<std::string> args = fOptions.fArgs;
         if (fAddsLog)
-            args.insert(args.begin(), "-verbose=1");
+            args.insert(args.begin(), "-verbose=0x101"); // 0x100: the files that drivers load
         return args;
     }
 
@@ -215,6 +218,8 @@ private:
 
     void TakeLogLine(const std::string& text)
     {
+        if (TakeLoadedFile(GetLogText(text), fOutcome.fDrivers))
+            return;
         constexpr std::size_t kMaxCauses = 100;
         std::string cause = FindCauseText(GetLogText(text));
         if (!cause.empty() && fOutcome.fCauses.size() < kMaxCauses)

@@ -19,9 +19,9 @@ struct ChildOptions {
     std::string fProgram; // its path
     std::vector<std::string> fArgs;
     double fTimeoutSeconds = 60; // 0: no limit
-    // Requests the child's log with -verbose=1, unless the arguments have a -verbose= option, and
-    // takes the causes of failures from it. The lines of this log aren't part of the report, and
-    // aren't passed to the observer.
+    // Requests the child's log with -verbose=0x101, unless the arguments have a -verbose= option,
+    // and takes the causes of failures and the files of drivers from it. The lines of this log
+    // aren't part of the report, and aren't passed to the observer.
     bool fKeepCauses = false;
     ReportReader::Limits fLimits;
 };

@@ -1,6 +1,6 @@
 // The child of the supervision tests. Executes its arguments one after the other:
 //
-//   -verbose=1             nothing: assay-host adds it
+//   -verbose=N             nothing: assay-host adds it
 //   out TEXT, err TEXT     writes a line
 //   part TEXT              writes to standard error without a line end
 //   raw HEX                writes these bytes, given in hexadecimal, to standard output
@@ -92,7 +92,7 @@ int main(int argc, char** argv)
     for (int index = 1; index < argc; ++index) {
         const std::string word = argv[index];
         const auto next = [&] { return index + 1 < argc ? argv[++index] : ""; };
-        if (word == "-verbose=1")
+        if (word.rfind("-verbose=", 0) == 0)
             continue;
         if (word == "out") {
             std::fprintf(stdout, "%s\n", next());

@@ -52,6 +52,40 @@ TEST(Causes, AreTakenFromTheLogThatIsAskedFor)
     EXPECT_EQ(outcome.fCommand[1], "out"); // what was asked for
 }
 
+TEST(DriverFiles, AreTakenFromTheLogThatIsAskedFor)
+{
+    Lines lines;
+    const RunOutcome outcome =
+        RunWith(true,
+                {"out", kPrefix + "driver files are logged", "out", kPrefix + "last call", "out",
+                 kPrefix + "loaded for OpenGL: /lib/libEGL.so.1", "out",
+                 kPrefix + "loaded for OpenCL: /lib/libOpenCL.so.1"},
+                lines);
+    EXPECT_TRUE(outcome.fDrivers.IsKnown());
+    ASSERT_EQ(outcome.fDrivers.fFiles.size(), 2U);
+    EXPECT_EQ(outcome.fDrivers.fFiles[0].fPath, "/lib/libEGL.so.1");
+    EXPECT_EQ(outcome.fDrivers.fFiles[1].fInterface, DeviceKind::kOpenCL);
+    EXPECT_EQ(lines.fLines, std::vector<std::string>());
+    // The last line of the log is that of the last call, and not of a file.
+    EXPECT_EQ(outcome.fLastLogLine, kPrefix + "last call");
+    EXPECT_TRUE(outcome.fCauses.empty());
+}
+
+TEST(DriverFiles, AreUnknownWithoutTheirLog)
+{
+    Lines lines;
+    EXPECT_EQ(RunWith(true, {"out", "NumGLGPUs=0"}, lines).fDrivers.fReason,
+              "the child did not log them");
+    const std::string line = kPrefix + "loaded for OpenGL: /lib/libEGL.so.1";
+    for (const bool keepsCauses : {false, true}) {
+        lines.fLines.clear();
+        const RunOutcome outcome = RunWith(keepsCauses, {"-verbose=0x101", "out", line}, lines);
+        EXPECT_EQ(outcome.fDrivers.fReason, "the log of the child was not requested");
+        EXPECT_TRUE(outcome.fDrivers.fFiles.empty());
+        EXPECT_EQ(lines.fLines, std::vector<std::string>{line});
+    }
+}
+
 TEST(Causes, AreLeftWhereNobodyAsks)
 {
     Lines lines;
