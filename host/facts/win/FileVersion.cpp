@@ -4,7 +4,8 @@
 
 #include <boost/nowide/convert.hpp>
 #include <fmt/format.h>
-#include <windows.h>
+
+#include "facts/win/FixedInfo.h"
 
 namespace assay_host {
 
@@ -14,7 +15,7 @@ namespace {
 // "VS_VERSION_INFO", at a multiple of four bytes (the documentation of VS_VERSIONINFO).
 constexpr DWORD kFixedInfoOffset = 40;
 
-bool ReadFixedInfo(HMODULE file, VS_FIXEDFILEINFO& info)
+bool FindFixedInfo(HMODULE file, VS_FIXEDFILEINFO& info)
 {
     const HRSRC resource = ::FindResourceW(file, MAKEINTRESOURCEW(VS_VERSION_INFO),
                                            MAKEINTRESOURCEW(16)); // RT_VERSION
@@ -31,19 +32,25 @@ bool ReadFixedInfo(HMODULE file, VS_FIXEDFILEINFO& info)
 } // namespace
 
 // Without version.dll, which could be planted beside the program.
-Fact GetFileVersion(const std::string& path)
+std::optional<VS_FIXEDFILEINFO> ReadFixedInfo(const std::string& path)
 {
     const HMODULE file =
         ::LoadLibraryExW(boost::nowide::widen(path).c_str(), nullptr,
                          LOAD_LIBRARY_AS_DATAFILE | LOAD_LIBRARY_AS_IMAGE_RESOURCE);
     VS_FIXEDFILEINFO info = {};
-    const bool found = file != nullptr && ReadFixedInfo(file, info);
+    const bool found = file != nullptr && FindFixedInfo(file, info);
     if (file != nullptr)
         ::FreeLibrary(file);
-    if (!found)
+    return found ? std::optional(info) : std::nullopt;
+}
+
+Fact GetFileVersion(const std::string& path)
+{
+    const auto info = ReadFixedInfo(path);
+    if (!info)
         return {{}, "its file has none"};
-    return {fmt::format("{}.{}.{}", HIWORD(info.dwFileVersionMS), LOWORD(info.dwFileVersionMS),
-                        HIWORD(info.dwFileVersionLS)),
+    return {fmt::format("{}.{}.{}", HIWORD(info->dwFileVersionMS), LOWORD(info->dwFileVersionMS),
+                        HIWORD(info->dwFileVersionLS)),
             {}};
 }
 
