@@ -8,6 +8,7 @@
 #include "app/FindAssay.h"
 #include "app/Forms.h"
 #include "app/NeedStatus.h"
+#include "facts/DescribeFiles.h"
 #include "facts/Environment.h"
 #include "facts/FileVersion.h"
 #include "output/Delivery.h"
@@ -160,7 +161,9 @@ int Run(const RunChoice& choice)
     std::vector<std::string> command = {options.fProgram};
     command.insert(command.end(), options.fArgs.begin(), options.fArgs.end());
     session.Start(command);
-    const RunOutcome outcome = RunChild(options, session, *stop);
+    RunOutcome outcome = RunChild(options, session, *stop);
+    if (choice.fFormat == Format::kJson || choice.fFormat == Format::kJsonLines)
+        DescribeFiles(outcome.fDrivers.fFiles);
     const Delivery delivery(writer);
     const int status = session.Finish(outcome);
     delivery.Finish();

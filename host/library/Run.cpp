@@ -2,6 +2,7 @@
 #include <new>
 #include <utility>
 
+#include "facts/DescribeFiles.h"
 #include "facts/Environment.h"
 #include "facts/FileVersion.h"
 #include "library/Options.h"
@@ -22,6 +23,7 @@ std::unique_ptr<assay_host_result> Run(const assay_host_options& options, assay_
     facts.fChildVersion = GetFileVersion(child.fProgram);
     facts.fEnvironment = GetEnvironment(options.fIdentify);
     SessionEnd end = RunSession(options, child, stop);
+    DescribeFiles(end.fOutcome.fDrivers.fFiles);
     return std::make_unique<assay_host_result>(std::move(end.fReport), std::move(end.fOutcome),
                                                std::move(facts));
 }

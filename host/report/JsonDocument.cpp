@@ -121,6 +121,7 @@ void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& ou
     json.Write("environment", MakeEnvironment(facts.fEnvironment));
     json.Write("command", MakeTexts(outcome.fCommand));
     json.Write("outcome", MakeOutcome(outcome));
+    json.Write("drivers", MakeDrivers(outcome.fDrivers));
     json.Write("usable", MakeUsable(answers, outcome));
     json.Write("warnings", MakeWarnings(GetWarnings(answers, outcome)));
     WriteReport(json, report, answers, kSchemaVersion);

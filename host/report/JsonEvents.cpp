@@ -64,6 +64,7 @@ std::string MakeEndEvent(const Answers& answers, const RunOutcome& outcome)
         {"event", "end"},
         {"seconds", MakeSeconds(outcome.fSeconds)},
         {"outcome", MakeOutcome(outcome)},
+        {"drivers", MakeDrivers(outcome.fDrivers)},
         {"usable", MakeUsable(answers, outcome)},
         {"warnings", MakeWarnings(GetWarnings(answers, outcome))},
     });

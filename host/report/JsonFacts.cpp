@@ -1,5 +1,7 @@
 #include "report/JsonFacts.h"
 
+#include <utility>
+
 #include "report/JsonBytes.h"
 #include "report/Software.h"
 
@@ -81,6 +83,21 @@ Json MakeCauses(const RunOutcome& outcome)
     for (const Cause& cause : outcome.fCauses)
         array.push_back({{"key", EncodeBytes(cause.fKey)}, {"text", EncodeBytes(cause.fText)}});
     return array;
+}
+
+Json MakeDrivers(const LoadedFiles& drivers)
+{
+    if (!drivers.IsKnown())
+        return {{"known", false}, {"reason", drivers.fReason}};
+    Json files = Json::array();
+    for (const LoadedFile& file : drivers.fFiles)
+        files.push_back({
+            {"interface", GetKindName(file.fInterface)},
+            {"path", EncodeBytes(file.fPath)},
+            {"version", MakeFact(file.fVersion)},
+            {"buildId", MakeFact(file.fBuildId)},
+        });
+    return {{"known", true}, {"files", std::move(files)}};
 }
 
 Json MakeSoftware(const DeviceAnswers& device)

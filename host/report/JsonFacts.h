@@ -25,6 +25,9 @@ nlohmann::ordered_json MakeUsable(const Answers& answers, const RunOutcome& outc
 nlohmann::ordered_json MakeWarnings(const std::vector<Warning>& warnings);
 nlohmann::ordered_json MakeCauses(const RunOutcome& outcome);
 
+// Makes {"known": true, "files": [...]} or {"known": false, "reason": ...}.
+nlohmann::ordered_json MakeDrivers(const LoadedFiles& drivers);
+
 // Makes {"known": true, "flag": ...}: whether the device is a software renderer.
 nlohmann::ordered_json MakeSoftware(const DeviceAnswers& device);
 

@@ -59,9 +59,9 @@ std::vector<std::string> Names(const Json& object)
 
 TEST(JsonSecondDocument, HasTheSameMembersInTheSameOrderForEachRun)
 {
-    const std::vector<std::string> names = {"schema",  "versions",       "environment", "command",
-                                            "outcome", "usable",         "warnings",    "report",
-                                            "devices", "devicesLeftOut", "lines"};
+    const std::vector<std::string> names = {"schema",  "versions", "environment",    "command",
+                                            "outcome", "drivers",  "usable",         "warnings",
+                                            "report",  "devices",  "devicesLeftOut", "lines"};
     EXPECT_EQ(Names(Document(Sample(1, 1).GetText())), names);
     EXPECT_EQ(Names(Document("", RunOutcome())), names);
     EXPECT_EQ(Document("")["schema"], 2);
@@ -115,6 +115,24 @@ TEST(JsonSecondDocument, HasWarningsAndCauses)
     EXPECT_EQ(document["outcome"]["causes"],
               Json::parse(R"([{"key": "OGLContextCreated", "text": "\uF7FE"}])"));
     EXPECT_EQ(document["devices"][0]["software"], Json::parse(R"({"known": true, "flag": true})"));
+}
+
+TEST(JsonSecondDocument, HasTheFilesOfDrivers)
+{
+    EXPECT_EQ(Document("", RunOutcome())["drivers"],
+              Json::parse(R"({"known": false, "reason": "the child was not started"})"));
+    RunOutcome outcome = MakeOutcome(Verdict::kCrashed);
+    outcome.fDrivers.fReason.clear();
+    EXPECT_EQ(Document("", outcome)["drivers"], Json::parse(R"({"known": true, "files": []})"));
+    outcome.fDrivers.fFiles = {
+        {DeviceKind::kOpenGL, "/lib/libEGL.so.1.1.0", {"1.1.0", {}}, {"c16a", {}}},
+        {DeviceKind::kOpenCL, "/lib/\xFE.so", {{}, "no"}, {{}, "none"}}};
+    EXPECT_EQ(Document("", outcome)["drivers"], Json::parse(R"({"known": true, "files": [
+        {"interface": "OpenGL", "path": "/lib/libEGL.so.1.1.0",
+         "version": {"known": true, "value": "1.1.0"}, "buildId": {"known": true, "value": "c16a"}},
+        {"interface": "OpenCL", "path": "/lib/\uF7FE.so",
+         "version": {"known": false, "reason": "no"},
+         "buildId": {"known": false, "reason": "none"}}]})"));
 }
 
 TEST(JsonSecondDocument, HasNumbersAndFlags)
@@ -189,10 +207,11 @@ TEST(JsonSecondEvents, HaveTheNewPartsAtStartAndEnd)
     const Report report = ReadReport(Sample(1, 1).GetText());
     const RunOutcome outcome = MakeOutcome(Verdict::kComplete);
     const Json end = SaveEvent(MakeEndEvent(GetAnswers(report), outcome));
-    EXPECT_EQ(Names(end),
-              (std::vector<std::string>{"event", "seconds", "outcome", "usable", "warnings"}));
+    EXPECT_EQ(Names(end), (std::vector<std::string>{"event", "seconds", "outcome", "drivers",
+                                                    "usable", "warnings"}));
     const Json whole = Document(Sample(1, 1).GetText(), outcome);
     EXPECT_EQ(end["outcome"], whole["outcome"]);
+    EXPECT_EQ(end["drivers"], whole["drivers"]);
     EXPECT_EQ(end["usable"], whole["usable"]);
     EXPECT_EQ(end["warnings"], whole["warnings"]);
 
