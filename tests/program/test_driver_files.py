@@ -1,15 +1,18 @@
-"""The files that drivers load, in the log of the program: on the machine's own drivers compared with what
-the dynamic loader tells, and with scripted ones that end the program."""
+"""The files that drivers load, in the log of the program and in the documents of its host: on the machine's
+own drivers compared with what the dynamic loader tells, and with scripted ones that end the program."""
 
 import ctypes.util
 import os
 import re
+import shutil
+import subprocess
 from pathlib import Path
 
 import pytest
 
 from calls import PREFIX, FullMachine
-from harness import BUILD, PROGRAM, SCRIPTED_EGL, Host
+from harness import BUILD, PROGRAM, PROGRAM_AT_ROOT, SCRIPTED_EGL, Host, record_so_far
+from hosting import decode, host_run, host_run_until, validate_document, validate_events
 
 pytestmark = pytest.mark.skipif(ctypes.util.find_library("OpenCL") is None,
                                 reason="this machine has no OpenCL loader library")
@@ -128,3 +131,88 @@ def test_the_report_is_the_same_with_the_files(tmp_path):
     kept = [text for text in texts_of(asked)
             if not text.startswith(("loaded for ", "driver files are logged"))]
     assert kept == texts_of(plain)
+
+
+def host(folder, gl="", cl="", form="json", options=(), until=None):
+    """Runs the program by its host. `until`: the library and the call that must have been made before the
+    time is up."""
+    records = {"gl": folder / "gl-record", "cl": folder / "cl-record"}
+    machine, found = FullMachine(folder).host("run", f"record {records['gl']}\n" + gl,
+                                              f"record {records['cl']}\n" + cl)
+    arguments = ["run", "--assay", str(PROGRAM_AT_ROOT), "--format", form, *options]
+    environment = machine.environment(**found)
+    if until is None:
+        return host_run(*arguments, environment=environment)
+    library, call = until
+    return host_run_until(
+        lambda: any(made.name == call for made in record_so_far(records[library])), folder,
+        *arguments, environment=environment)
+
+
+def paths_of(document, interface=None):
+    assert document["drivers"]["known"]
+    return [os.fsdecode(decode(file["path"])) for file in document["drivers"]["files"]
+            if interface in (None, file["interface"])]
+
+
+def test_the_document_has_versions_and_build_ids(tmp_path):
+    readelf = shutil.which("readelf")
+    if readelf is None:
+        pytest.skip("this machine has no readelf")
+    machine = Host(tmp_path, {"RUSTICL_ENABLE": "llvmpipe", "RUSTICL_DEVICE_TYPE": "gpu"})
+    hosted = host_run("run", "--assay", str(PROGRAM), "--format", "json",
+                      environment=machine.environment(egl="real", opencl="real"))
+    document = validate_document(hosted.out)
+    paths = paths_of(document)
+    assert paths
+    assert [path for path in paths if os.path.realpath(path) != path] == []
+    assert [path for path in paths if re.search(r"/lib(c|m|pthread|stdc\+\+)\.so", path)] == []
+    for path, file in zip(paths, document["drivers"]["files"]):
+        version = re.search(r"\.so\.([0-9.]+)$", path)
+        if version and "-" not in Path(path).name:
+            assert file["version"]["value"] == version[1]
+        notes = subprocess.run([readelf, "-n", path], stdout=subprocess.PIPE, check=True).stdout
+        build = re.search(rb"Build ID: ([0-9a-f]+)", notes)
+        assert file["buildId"].get("value") == (build[1].decode() if build else None)
+
+
+def test_the_document_has_the_scripted_drivers(tmp_path):
+    document = validate_document(host(tmp_path).out)
+    assert SCRIPTED_GL in paths_of(document, "OpenGL")
+    assert SCRIPTED_CL in paths_of(document, "OpenCL")
+    # They are no part of the report, the warnings and the causes.
+    assert {line["kind"] for line in document["lines"]} == {"value"}
+    assert "loaded for" not in str(document["warnings"]) + str(document["outcome"])
+
+
+@pytest.mark.parametrize("end", ["crash", "abort", "_exit 42"])
+@pytest.mark.parametrize("call", ["eglInitialize", "glLinkProgram"])
+def test_the_document_of_a_driver_that_ends_the_child(tmp_path, call, end):
+    document = validate_document(host(tmp_path, gl=f"at {call} {end}\n").out)
+    assert document["outcome"]["verdict"] == ("failed-tests" if end == "_exit 42" else "crashed")
+    assert SCRIPTED_GL in paths_of(document, "OpenGL")
+    assert paths_of(document, "OpenCL") == []
+    assert "loaded for" not in (document["outcome"]["lastLogLine"] or "")
+
+
+def test_the_document_of_a_driver_that_hangs(tmp_path):
+    hosted = host(tmp_path, gl="at glLinkProgram hang\n", until=("gl", "glLinkProgram"))
+    document = validate_document(hosted.out)
+    assert document["outcome"]["verdict"] == "hung"
+    assert SCRIPTED_GL in paths_of(document, "OpenGL")
+
+
+def test_the_other_forms(tmp_path):
+    events = validate_events(host(tmp_path, form="jsonl").out)
+    assert SCRIPTED_GL in paths_of(events[-1], "OpenGL")
+    first = validate_document(host(tmp_path, options=("--schema", "1")).out)
+    assert "drivers" not in first
+    assert b"loaded for" not in host(tmp_path, form="text").out
+
+
+def test_a_child_without_a_list(tmp_path):
+    asked = validate_document(host(tmp_path, options=("--", "-verbose=0")).out)
+    assert asked["drivers"] == {"known": False, "reason": "the log of the child was not requested"}
+    missing = host_run("run", "--assay", str(tmp_path / "none"), "--format", "json")
+    assert validate_document(missing.out)["drivers"] == \
+        {"known": False, "reason": "the child was not started"}
