@@ -88,7 +88,7 @@ Json MakeCauses(const RunOutcome& outcome)
 Json MakeDrivers(const LoadedFiles& drivers)
 {
     if (!drivers.IsKnown())
-        return {{"known", false}, {"reason", drivers.fReason}};
+        return {{"known", false}, {"reason", EncodeBytes(drivers.fReason)}};
     Json files = Json::array();
     for (const LoadedFile& file : drivers.fFiles)
         files.push_back({

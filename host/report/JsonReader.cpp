@@ -112,7 +112,8 @@ enum class Extent { kReport, kRun };
 // Whether a run has the member of a document or an event besides its lines.
 bool IsRunMember(const std::string& name)
 {
-    return name == "versions" || name == "environment" || name == "command" || name == "outcome";
+    return name == "versions" || name == "environment" || name == "command" || name == "outcome" ||
+           name == "drivers";
 }
 
 // A parser callback that collects the lines of a document, checks its schema version, and discards

@@ -93,6 +93,35 @@ Fact ReadFact(const Json& object, const std::string& where, const char* name)
     return {{}, reason.empty() ? "no reason is given" : std::move(reason)};
 }
 
+DeviceKind ReadInterface(const Json& file, const std::string& where)
+{
+    const std::string name = GetString(file, where, "interface");
+    for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL})
+        if (name == GetKindName(kind))
+            return kind;
+    throw std::runtime_error(
+        fmt::format("{}: \"interface\" is \"{}\", which is none", where, ShowBytes(name)));
+}
+
+LoadedFiles ReadDrivers(const Json& object, const std::string& where)
+{
+    // The first schema has none.
+    if (!object.contains("drivers"))
+        return {{}, "the document does not have them"};
+    const Json& drivers = GetObject(object, where, "drivers");
+    const std::string inside = where + ".drivers";
+    if (!GetMember(drivers, inside, "known", &Json::is_boolean, "a bool").get<bool>()) {
+        std::string reason = ReadText(drivers, inside, "reason");
+        return {{}, reason.empty() ? "no reason is given" : std::move(reason)};
+    }
+    LoadedFiles files;
+    for (const Json& file : GetMember(drivers, inside, "files", &Json::is_array, "an array"))
+        files.fFiles.push_back({ReadInterface(file, inside), ReadText(file, inside, "path"),
+                                ReadFact(file, inside, "version"),
+                                ReadFact(file, inside, "buildId")});
+    return files;
+}
+
 } // namespace
 
 RunOutcome ReadOutcome(const Json& object, const std::string& where)
@@ -118,6 +147,7 @@ RunOutcome ReadOutcome(const Json& object, const std::string& where)
     outcome.fLeftBehind =
         GetMember(json, inside, "leftBehind", &Json::is_boolean, "a bool").get<bool>();
     outcome.fCauses = ReadCauses(json, inside);
+    outcome.fDrivers = ReadDrivers(object, where);
     return outcome;
 }
 

@@ -14,7 +14,8 @@
 
 namespace assay_host {
 
-// Reads the member "outcome" of a document or an event, of either schema, but for the command.
+// Reads the members "outcome" and "drivers" of a document or an event, of either schema, but not
+// the command.
 RunOutcome ReadOutcome(const nlohmann::ordered_json& object, const std::string& where);
 
 // Reads the member "command".

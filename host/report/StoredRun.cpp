@@ -15,6 +15,7 @@ RunOutcome MakeOutcomeOfReport(const Report& report)
                           ? "The report is whole; how the child ended was not stored."
                           : fmt::format("The report stopped{}; how the child ended was not stored.",
                                         next.empty() ? "" : " before " + next);
+    outcome.fDrivers.fReason = "they were not stored";
     for (const ReportLine& line : report.GetLines())
         if (line.fKind == LineKind::kValue)
             outcome.fLastReportLine = line.fText;

@@ -48,6 +48,10 @@ RunOutcome MakeFullOutcome(Verdict verdict)
     outcome.fLostErrorBytes = 34;
     outcome.fCauses = {{"glgpu[0].GLVendor", "a cause \xFF"}};
     outcome.fLeftBehind = true;
+    outcome.fDrivers = {
+        {{DeviceKind::kOpenGL, "/lib/libEGL.so.1.1.0", {"1.1.0", {}}, {"c16a", {}}},
+         {DeviceKind::kOpenCL, "/lib/\xFE.so", {{}, "no version"}, {{}, "no build id"}}},
+        {}};
     return outcome;
 }
 
@@ -86,6 +90,7 @@ TEST(StoredRun, TheFirstSchemaHasNoFacts)
     WriteFirstDocument(out, ReadReport(Sample(1, 1).GetText()), outcome);
     const StoredRun run = ReadRun(out.str());
     EXPECT_TRUE(run.fOutcome.fCauses.empty());
+    EXPECT_EQ(run.fOutcome.fDrivers.fReason, "the document does not have them");
     EXPECT_TRUE(run.fFacts.fEnvironment.fTime.empty());
     EXPECT_EQ(run.fFacts.fEnvironment.fKernel.fReason, "the first schema has none");
     EXPECT_EQ(run.fFacts.fChildVersion.fReason, "the first schema has none");
@@ -119,6 +124,7 @@ TEST(StoredRun, OfAReportAlone)
 {
     const RunOutcome whole = MakeOutcomeOfReport(ReadReport(Sample(1, 0).GetText()));
     EXPECT_EQ(whole.fVerdict, Verdict::kComplete);
+    EXPECT_EQ(whole.fDrivers.fReason, "they were not stored");
     EXPECT_EQ(whole.fLastReportLine, "assayEnd=\"2026-11-21_10:49:36\"");
     const RunOutcome stopped =
         MakeOutcomeOfReport(ReadReport(Sample(1, 0).EndAfter("glgpu[0].GLVersion").GetText()));
@@ -159,6 +165,14 @@ TEST(StoredRun, NamesWhatIsWrong)
         {"/outcome/leftBehind", 0, "the document.outcome: \"leftBehind\" is not a bool"},
         {"/outcome/causes", 0, "the document.outcome: \"causes\" is not an array"},
         {"/outcome/causes/0/key", 0, "the document.outcome.causes: \"key\" is not a string"},
+        {"/drivers", 0, "the document: \"drivers\" is not an object"},
+        {"/drivers/known", 1, "the document.drivers: \"known\" is not a bool"},
+        {"/drivers/known", false, "the document.drivers: \"reason\" is missing"},
+        {"/drivers/files", 0, "the document.drivers: \"files\" is not an array"},
+        {"/drivers/files/0/interface", "Vulkan",
+         "the document.drivers: \"interface\" is \"Vulkan\", which is none"},
+        {"/drivers/files/0/path", 0, "the document.drivers: \"path\" is not a string"},
+        {"/drivers/files/1/buildId", nullptr, "the document.drivers: \"buildId\" is missing"},
         {"/command", nullptr, "the document: \"command\" is missing"},
         {"/versions", nullptr, "the document: \"versions\" is missing"},
         {"/versions/assay", 1, "the document.versions: \"assay\" is not an object"},
