@@ -46,7 +46,9 @@ def test_has_programs_documents_and_licences(package):
     assert {path.name for path in (package / "include").iterdir()} == {
         "assay_host.h", "assay_host.hpp"}
     assert {path.name for path in (package / "lib").iterdir()} == {
-        "libassay-host.dll.a", "assay-host.def"}
+        "libassay-host.dll.a", "assay-host.def", "cmake"}
+    assert {path.name for path in (package / "lib" / "cmake" / "assay-host").iterdir()} == {
+        "assay-hostConfig.cmake", "assay-hostConfigVersion.cmake"}
     assert {path.name for path in (package / "examples").iterdir()} == {
         "decide.c", "decide.cpp", "decide.js", "decide.py"}
 
@@ -75,6 +77,39 @@ def test_examples_are_built_from_it_and_decide(package, tmp_path, compiler, sour
                             package / "lib" / "libassay-host.dll.a", option)
     check_decision(program, first="complete: ")
     check_decision(program, package / "check" / "test_child.exe", "abort", first="crashed: ")
+
+
+def configure_consumer(package, build):
+    """Configures a project of its own that uses the zip. Returns its exit status and messages."""
+    done = subprocess.run([
+        "cmake", "-G", "Ninja", "-S", TREE / "tests" / "consumer" / "windows", "-B", build,
+        f"-DCMAKE_TOOLCHAIN_FILE={TREE / 'cmake' / 'mingw-w64-toolchain.cmake'}",
+        f"-Dassay-host_DIR={package / 'lib' / 'cmake' / 'assay-host'}",
+        f"-DEXAMPLES={package / 'examples'}"],
+        stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True, check=False)
+    return done.returncode, done.stdout
+
+
+def test_a_cmake_project_finds_it(package, tmp_path):
+    """Also if the folder was moved."""
+    moved = shutil.copytree(package, tmp_path / "moved folder")
+    status, messages = configure_consumer(moved, tmp_path / "build")
+    assert status == 0, messages
+    subprocess.run(["cmake", "--build", tmp_path / "build"], check=True)
+    for language in ("c", "cpp"):
+        program = tmp_path / "build" / f"decide-{language}.exe"
+        check_decision(program, first="complete: ")
+        check_decision(program, moved / "check" / "test_child.exe", "abort", first="crashed: ")
+
+
+def test_a_cmake_project_refuses_another_version(package, tmp_path):
+    moved = shutil.copytree(package, tmp_path / "moved", ignore=shutil.ignore_patterns("check"))
+    version = moved / "lib" / "cmake" / "assay-host" / "assay-hostConfigVersion.cmake"
+    text = version.read_text(encoding="utf-8")
+    version.write_text(text.replace('"1.', '"2.'), encoding="utf-8")
+    status, messages = configure_consumer(moved, tmp_path / "build")
+    assert status != 0
+    assert "assay-host" in messages
 
 
 def test_list_of_exports_makes_an_import_library(package, tmp_path):
@@ -129,7 +164,8 @@ def test_check_script(package):
     script = (package / "check.cmd").read_bytes()
     assert b"\n" not in script.replace(b"\r\n", b""), "Windows' own line ends"
     units = {path.name for path in (TREE / "tests" / "unit").iterdir()} - {"support"}
-    assert {f"{unit}_tests.exe" for unit in units} | {"test_child.exe", "decide_c.exe"} == {
+    assert {f"{unit}_tests.exe" for unit in units} | {"test_child.exe", "test_module.dll",
+                                                          "decide_c.exe"} == {
         path.name for path in (package / "check").iterdir()}
 
 
