@@ -178,10 +178,19 @@ public:
     std::string GetVariable(const std::string& name) override
     {
         constexpr DWORD kMaxValue = 1U << 15;
-        std::vector<wchar_t> value(kMaxValue);
-        const DWORD size =
-            ::GetEnvironmentVariableW(boost::nowide::widen(name).c_str(), value.data(), kMaxValue);
-        return size == 0 || size >= kMaxValue
+        const std::wstring wide = boost::nowide::widen(name);
+        // Most variables aren't set or are short.
+        std::vector<wchar_t> value(256);
+        const auto read = [&] {
+            return ::GetEnvironmentVariableW(wide.c_str(), value.data(),
+                                             static_cast<DWORD>(value.size()));
+        };
+        DWORD size = read();
+        if (size >= value.size()) {
+            value.resize(kMaxValue);
+            size = read();
+        }
+        return size == 0 || size >= value.size()
                    ? std::string()
                    : boost::nowide::narrow(std::wstring(value.data(), size));
     }
