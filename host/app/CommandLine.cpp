@@ -77,6 +77,8 @@ public:
         fApp.formatter(fFormatter);
         fApp.set_help_flag("-h,--help", "show this text");
         fApp.set_version_flag("--version", kVersion, "show the version");
+        // On Windows too a word that begins with a slash is a path.
+        fApp.allow_windows_style_options(false);
         fApp.require_subcommand(1);
         fApp.footer("\"assay-host COMMAND --help\" describes a command.");
         std::string names;

@@ -101,6 +101,10 @@ TEST(CommandLineOfDiff, HasFilesAndATolerance)
     EXPECT_EQ(plain.fBefore, "a");
     EXPECT_THAT(plain.fAfter, ElementsAre("b"));
     EXPECT_EQ(plain.fTolerance, 0.1);
+    // On every system.
+    const auto absolute = Parse<DiffChoice>({"diff", "/a/b.json", "/c"});
+    EXPECT_EQ(absolute.fBefore, "/a/b.json");
+    EXPECT_THAT(absolute.fAfter, ElementsAre("/c"));
     EXPECT_EQ(Parse<DiffChoice>({"diff", "--tolerance", "0", "a", "b"}).fTolerance, 0);
     EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--tolerance=2.5"}).fTolerance, 2.5);
 }
