@@ -7,6 +7,7 @@ from conftest import TREE
 # The program tests of Linux with their counterparts here, and those without one by reason.
 COUNTERPARTS = {
     "test_check": "test_windows_host",
+    "test_explain": "test_windows_host",
     "test_command_line": "test_windows_command_line",
     "test_host_end": "test_windows_host",
     "test_host_help": "test_windows_host",
@@ -16,6 +17,7 @@ COUNTERPARTS = {
     "test_host_torture": "test_windows_torture",
     "test_library": "test_windows_library",
     "test_opencl": "test_windows_opencl",
+    "test_show": "test_windows_host",
     "test_steps": "test_windows",
     "test_verbose": "test_windows",
     "test_streams": "test_windows",
@@ -23,14 +25,16 @@ COUNTERPARTS = {
 }
 LEFT_OUT = {
     "the scripted OpenGL driver is an EGL library, and the peer uses EGL": {
-        "program/test_advise", "program/test_bad_drivers", "program/test_failing_gpu",
-        "program/test_fault_sweep", "program/test_html", "program/test_last_line",
-        "program/test_opengl_peers", "program/test_show", "program/test_usable"},
+        "program/test_advise", "program/test_advise_changes", "program/test_advise_faults",
+        "program/test_advise_state", "program/test_bad_drivers", "program/test_desktop",
+        "program/test_driver_files", "program/test_failing_gpu", "program/test_fault_sweep",
+        "program/test_html", "program/test_last_line", "program/test_library_advice",
+        "program/test_opengl_peers", "program/test_usable"},
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
         "unit/identity", "unit/launch", "unit/library", "unit/pmutil", "unit/supervise"},
-    "the folder of what is remembered is tested on Linux only": {"unit/memory"},
+    "the owners and links of files, which Windows has in another way": {"unit/memory"},
     "Linux's own files, shells and terminals": {
         "program/test_completions", "program/test_hardening", "unit/facts", "unit/output"},
     "there is no Python and no Node for Windows here": {"examples/decide.py", "examples/decide.js"},

@@ -258,6 +258,27 @@ def test_check_of_a_stored_report(tmp_path):
     assert (run.status, text_of(run.out)) == (7, "not met: GLMemoryMB>=2048: glgpu[0] 1024\n")
 
 
+def test_forms_of_a_stored_report(tmp_path):
+    run = host_run("run", "--format", "json")
+    report = tmp_path / "report.json"
+    report.write_bytes(run.out)
+    assert host_run("show", str(report), "--format", "json").out == run.out
+    assert "OpenGL device glgpu[0]: " in text_of(host_run("show", str(report)).out)
+    page = tmp_path / "page.html"
+    assert host_run("show", str(report), "--format", "html", "--output", str(page)).status == 0
+    assert page.read_bytes().startswith(b"<!DOCTYPE html>")
+    assert b"OpenGL device glgpu[0]" in page.read_bytes()
+    shown = text_of(host_run("show", str(report), "--format", "prometheus").out)
+    assert 'assay_run_verdict{verdict="complete"} 1\n' in shown
+
+
+def test_explain():
+    run = host_run("explain", "GLMemoryMB")
+    assert run.status == 0
+    assert text_of(run.out).startswith("GLMemoryMB: Memory\n")
+    assert host_run("explain", "GLMemory").status == 10
+
+
 def test_check_of_a_run():
     run = host_run("check", "--assay", str(CHILD), "--require", "opengl.devices>=1", "--", *REPORT)
     assert run.status == 7
