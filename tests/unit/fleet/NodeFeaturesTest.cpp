@@ -72,8 +72,10 @@ TEST(NodeFeatures, LabelsTheNode)
 TEST(NodeFeatures, KeepMeasurementsAndSingleDevicesFromTheLabels)
 {
     const Features features = Read(GetText(Sample(2, 1).GetText()));
-    EXPECT_THAT(features.fLabels,
-                testing::Each(Not(testing::ContainsRegex("score|second|l\\.[01]"))));
+    EXPECT_THAT(features.fLabels, testing::Each(testing::AllOf(Not(testing::HasSubstr("score")),
+                                                               Not(testing::HasSubstr("second")),
+                                                               Not(testing::HasSubstr("l.0")),
+                                                               Not(testing::HasSubstr("l.1")))));
     EXPECT_THAT(features.fOthers,
                 AllOf(testing::Contains("opengl.1.name=Accelerator 4000"),
                       testing::Contains("opencl.0.copy_bytes_per_second=834512000000"),
@@ -97,7 +99,8 @@ TEST(NodeFeatures, LeaveOutWhatIsNotKnown)
     const std::string text = GetText(
         Sample(1, 1).Set("glgpu[0].GLMemoryMB", "0").Set("glgpu[0].GLName", "\"((\"").GetText());
     EXPECT_THAT(Read(text).fLabels,
-                testing::Each(Not(testing::ContainsRegex("gl.memory|gl.name="))));
+                testing::Each(testing::AllOf(Not(testing::HasSubstr("gl.memory")),
+                                             Not(testing::HasSubstr("gl.name=")))));
     EXPECT_THAT(Read(text).fOthers, testing::Contains("opengl.0.name=(("));
     EXPECT_THAT(Read(GetText("", Verdict::kNeverStarted)).fLabels,
                 testing::ElementsAre("verdict=never-started", "opengl.usable=unknown",
@@ -142,7 +145,7 @@ TEST(NodeFeatures, FitIntoTheLargestFile)
     const std::string large = GetText(Sample(256, 256).GetText());
     EXPECT_LE(large.size(), kMaxFeatureFileBytes);
     EXPECT_GT(large.size(), kMaxFeatureFileBytes - 200);
-    EXPECT_THAT(large, testing::ContainsRegex("\n# left out beyond 65536 bytes: [0-9]+\n"));
+    EXPECT_TRUE(std::regex_search(large, std::regex("\n# left out beyond 65536 bytes: [0-9]+\n")));
     EXPECT_THAT(Read(large).fLabels, testing::Contains("opencl.devices=256"));
 }
 

@@ -7,7 +7,6 @@
 #include <boost/make_shared.hpp>
 
 #include "LongTimes.h"
-#include "TestChild.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Containment.h"
 #include "support/Waits.h"
@@ -48,7 +47,8 @@ TEST(FailedLaunch, EndsWhatItStarted)
     for (const bool ends : {true, false}) {
         FakeContainment containment(ends);
         ChildOptions options;
-        options.fProgram = TEST_CHILD;
+        // Any file that exists: the launcher never starts it.
+        options.fProgram = testing::internal::GetArgvs().front();
         RunObserver observer;
         pmutil::StopRequest stop;
         const RunOutcome outcome = RunChild(options, observer, stop, containment, GetLongTimes());
