@@ -4,51 +4,22 @@
 
 #include <tlhelp32.h>
 
-#include <cstddef>
-#include <vector>
+#include <cstdint>
 
 const long kKeptPerLaunch = 2; // of the process and of its thread
 
-namespace {
-
-// Queries the system's list of all handles: Wine's GetProcessHandleCount isn't implemented.
-constexpr ULONG kExtendedHandleInformation = 64;
-constexpr LONG kTooSmall = static_cast<LONG>(0xC0000004);
-
-struct HandleEntry {
-    void* object;
-    ULONG_PTR process;
-    ULONG_PTR handle;
-    ULONG access;
-    USHORT creator;
-    USHORT type;
-    ULONG attributes;
-    ULONG reserved;
-};
-
-struct HandleTable {
-    ULONG_PTR count;
-    ULONG_PTR reserved;
-    HandleEntry entries[1];
-};
-
-using QueryFunction = LONG(NTAPI*)(ULONG, void*, ULONG, ULONG*);
-
-} // namespace
-
+// Asks for each value that a handle may have. Wine's GetProcessHandleCount isn't implemented, and
+// its server can crash when it lists the handles of a process that ends. Handles are multiples of
+// 4, and the lowest free value is used first.
 long CountOpenThings()
 {
-    const auto query = reinterpret_cast<QueryFunction>(reinterpret_cast<void*>(
-        ::GetProcAddress(::GetModuleHandleW(L"ntdll.dll"), "NtQuerySystemInformation")));
-    std::vector<std::max_align_t> buffer(1 << 12);
-    while (query(kExtendedHandleInformation, buffer.data(),
-                 static_cast<ULONG>(buffer.size() * sizeof(std::max_align_t)),
-                 nullptr) == kTooSmall)
-        buffer.resize(2 * buffer.size());
-    const auto* const table = reinterpret_cast<const HandleTable*>(buffer.data());
+    constexpr std::uintptr_t kStep = 4;
+    constexpr std::uintptr_t kEnd = 0x10000;
     long count = 0;
-    for (ULONG_PTR index = 0; index < table->count; ++index)
-        count += table->entries[index].process == ::GetCurrentProcessId();
+    for (std::uintptr_t value = kStep; value < kEnd; value += kStep) {
+        DWORD flags = 0;
+        count += ::GetHandleInformation(reinterpret_cast<HANDLE>(value), &flags) != 0;
+    }
     return count;
 }
 
