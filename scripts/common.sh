@@ -42,6 +42,16 @@ timed() {
     say "$what: done in $((SECONDS - start)) s"
 }
 
+# list_sources: the names of the tree's files, each with a zero byte after it. In an unpacked source archive
+# these are all files outside of build/.
+list_sources() {
+    if [ -e .git ]; then
+        git ls-files -z --cached --others --exclude-standard
+    else
+        find . -path ./build -prune -o \( -type f -o -type l \) -printf '%P\0'
+    fi
+}
+
 project_version() { sed -n 's/^project(assay VERSION \([0-9.]*\).*/\1/p' CMakeLists.txt; }
 
 jobs=$(nproc)
