@@ -11,7 +11,7 @@ namespace {
 constexpr char kAdapterLists[] =
     "the system's adapter lists: WMI and DXGI on Windows, sysfs and DRM on Linux";
 constexpr char kExtensions[] = "glGetString(GL_VERSION) and the list of extensions";
-constexpr char kImageUnits[] = "image units";
+constexpr char kTextures[] = "textures";
 constexpr char kComponents[] = "components of four bytes";
 
 constexpr Explanation kExplanations[] = {
@@ -122,16 +122,17 @@ constexpr Explanation kExplanations[] = {
      "shader.",
      "instructions", "glGetProgramivARB"},
     {"glGetIntegerv[GL_MAX_TEXTURE_UNITS]",
-     "Texture units of drawing without shaders. 4 or 8 is usual; shaders have the image units.",
-     "units", "glGetIntegerv"},
+     "How many textures can be used at once without shaders. 4 or 8 is usual; shaders can use "
+     "more.",
+     kTextures, "glGetIntegerv"},
     {"glGetIntegerv[GL_MAX_COMBINED_TEXTURE_IMAGE_UNITS]",
-     "How many textures all stages of a program can use together.", kImageUnits, "glGetIntegerv"},
+     "How many textures all stages of a program can use together.", kTextures, "glGetIntegerv"},
     {"glGetIntegerv[GL_MAX_VERTEX_TEXTURE_IMAGE_UNITS]",
-     "How many textures a vertex shader can use. 0 means that it can use none.", kImageUnits,
+     "How many textures a vertex shader can use. 0 means that it can use none.", kTextures,
      "glGetIntegerv"},
     {"glGetIntegerv[GL_MAX_TEXTURE_IMAGE_UNITS]",
-     "How many textures a fragment shader can use. OpenGL 3 and later have at least 16.",
-     kImageUnits, "glGetIntegerv"},
+     "How many textures a fragment shader can use. OpenGL 3 and later have at least 16.", kTextures,
+     "glGetIntegerv"},
     {"glGetIntegerv[GL_MAX_DRAW_BUFFERS]",
      "How many images a fragment shader can write at once. OpenGL 3 and later have at least 8.",
      "buffers", "glGetIntegerv"},

@@ -16,20 +16,29 @@ namespace assay_host {
 
 namespace {
 
-// Whether the value is shown as "not known". An empty text, an adapter's missing name and a wrong
-// measurement have texts of their own.
-bool IsNotKnown(const Answer& answer)
+// Returns what is shown instead of a value that is not known; nothing if the value itself is shown.
+std::optional<std::string> GetUnknownValueText(const Answer& answer)
 {
-    const ValueForm form = answer.fKnown ? answer.fKnown->fForm : ValueForm::kText;
     switch (answer.fUnknown) {
-    case Unknown::kNotListed:
-    case Unknown::kNoFigure:
-        return true;
+    case Unknown::kNot:
+    case Unknown::kCut:
+        break;
     case Unknown::kNoAdapter:
-        return form != ValueForm::kAdapter;
-    default:
-        return false;
+        return answer.fKnown->fForm == ValueForm::kAdapter
+                   ? "none (no adapter of the system matches)"
+                   : "not known (no adapter of the system matches)";
+    case Unknown::kNotListed:
+        return "not known (not in the adapter lists)";
+    case Unknown::kEmpty:
+        return "not known (the text is empty)";
+    case Unknown::kNoFigure:
+        return "not known (no source has it)";
+    case Unknown::kNoTime:
+    case Unknown::kImplausible:
+        return fmt::format("not known ({}: {})", GetUnknownText(answer.fUnknown),
+                           ShowBytes(answer.fLine->fValue));
     }
+    return std::nullopt;
 }
 
 std::string_view TrimEnd(std::string_view text)
@@ -118,8 +127,6 @@ std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
     case ValueForm::kText:
         break;
     case ValueForm::kAdapter:
-        if (value.empty())
-            return "none";
         break;
     case ValueForm::kDate:
         return GetDateText(value);
@@ -128,8 +135,10 @@ std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
     case ValueForm::kCount:
         return GetCountText(value);
     case ValueForm::kTexels:
+        if (value == "0")
+            return "none";
         if (ReadUnsigned(value))
-            return std::string(value) + " texels";
+            return fmt::format("{} x {} texels", value, value);
         break;
     case ValueForm::kMebibytes:
         return GetMebibytesText(value);
@@ -143,14 +152,25 @@ std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
     return std::nullopt;
 }
 
+// Returns what follows a value that is known.
+const char* GetNote(const Answer& answer)
+{
+    if (!answer.fKnown)
+        return "";
+    // The newest version that the child distinguishes stands for all newer ones, too.
+    if (answer.fKnown->fKey == "GLVersion" && answer.fLine->fValue == "4.1")
+        return " or later";
+    return answer.fKnown->fForm == ValueForm::kScore ? " (no unit; more is better)" : "";
+}
+
 } // namespace
 
 std::string GetValueText(const Answer& answer)
 {
     if (!answer.fLine)
         return fmt::format("- ({})", GetMissingText(answer.fMissing));
-    if (IsNotKnown(answer))
-        return "not known";
+    if (const auto unknown = GetUnknownValueText(answer))
+        return *unknown;
     const std::string& value = answer.fLine->fValue;
     std::optional<std::string> text;
     if (answer.fKnown)
@@ -159,6 +179,8 @@ std::string GetValueText(const Answer& answer)
         text = ShowBytes(TrimEnd(value));
     if (!IsWholeValue(*answer.fLine))
         *text += "... (cut)";
+    else
+        *text += GetNote(answer);
     return text->empty() ? "(empty)" : *text;
 }
 

@@ -21,24 +21,46 @@ std::string Show(const std::string& line)
 
 TEST(ValueText, HasUnits)
 {
-    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=0"), "not known");
+    EXPECT_EQ(Show("glgpu[0].GLMemoryMB=0"), "not known (no source has it)");
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=512"), "512 MiB");
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=1023"), "1023 MiB");
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB=1024"), "1 GiB");
     EXPECT_EQ(Show("clgpu[0].CLMemoryMB=1536"), "1.5 GiB");
     EXPECT_EQ(Show("clgpu[0].CLMemoryMB=24564"), "23.99 GiB");
     EXPECT_EQ(Show("clgpu[0].CLMemoryMB=81920"), "80 GiB");
-    EXPECT_EQ(Show("clgpu[0].CLBandwidth=0"), "0 B/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=999"), "999 B/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=1500"), "1.5 kB/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=2.5e+06"), "2.5 MB/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=8.34512e+11"), "834.5 GB/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=3.2e+12"), "3.2 TB/s");
-    EXPECT_EQ(Show("clgpu[0].CLBandwidth=3.35544e+16"), "33554 TB/s");
-    EXPECT_EQ(Show("clgpu[0].CLCompute=1234.56"), "1234.56");
-    EXPECT_EQ(Show("glgpu[0].GLRectTextureSize=16384"), "16384 texels");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=1e+13"), "10 TB/s");
+    EXPECT_EQ(Show("clgpu[0].CLCompute=1234.56"), "1234.56 (no unit; more is better)");
+    EXPECT_EQ(Show("glgpu[0].GLRectTextureSize=16384"), "16384 x 16384 texels");
+    EXPECT_EQ(Show("glgpu[0].GLRectTextureSize=0"), "none");
     EXPECT_EQ(Show("glgpu[0].glGetIntegerv[GL_MAX_TEXTURE_UNITS]=[8]"), "8");
     EXPECT_EQ(Show("glgpu[0].glGetIntegerv[GL_MAX_TEXTURE_UNITS]=[8, 4]"), "[8, 4]");
+}
+
+TEST(ValueText, ShowsNoSpeedByAWrongClock)
+{
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=0"),
+              "not known (the device's clock reported no elapsed time: 0)");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=3.35544e+16"),
+              "not known (the device's clock is unreliable: 3.35544e+16)");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=inf"),
+              "not known (the device's clock is unreliable: inf)");
+    EXPECT_EQ(Show("clgpu[0].CLCompute=0"),
+              "not known (the device's clock reported no elapsed time: 0)");
+    EXPECT_EQ(Show("clgpu[0].CLCompute=-1"), "not known (the device's clock is unreliable: -1)");
+    EXPECT_EQ(Show("clgpu[0].CLCompute=8e+09"),
+              "not known (the device's clock is unreliable: 8e+09)");
+}
+
+TEST(ValueText, SaysThatTheNewestVersionStandsForLaterOnes)
+{
+    EXPECT_EQ(Show("glgpu[0].GLVersion=\"4.1\""), "4.1 or later");
+    EXPECT_EQ(Show("glgpu[0].GLVersion=\"4.0\""), "4.0");
+    EXPECT_EQ(Show("clgpu[0].CLDeviceVersion=\"4.1\""), "4.1");
 }
 
 TEST(ValueText, ShowsIdsInHexadecimal)
@@ -46,19 +68,19 @@ TEST(ValueText, ShowsIdsInHexadecimal)
     EXPECT_EQ(Show("glgpu[0].GLVendorID=4318"), "0x10DE (4318)");
     EXPECT_EQ(Show("glgpu[0].GLRendererID=1"), "0x0001 (1)");
     EXPECT_EQ(Show("clgpu[0].CLVendorID=65541"), "0x10005 (65541)");
-    EXPECT_EQ(Show("glgpu[0].GLVendorID=0"), "not known");
+    EXPECT_EQ(Show("glgpu[0].GLVendorID=0"), "not known (no adapter of the system matches)");
 }
 
 TEST(ValueText, HasWordsForFlagsAndUnknownValues)
 {
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=1"), "yes");
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=0"), "no");
-    EXPECT_EQ(Show("glgpu[0].GLDriver=\"?\""), "not known");
-    EXPECT_EQ(Show("glgpu[0].GLDriver=\"\""), "(empty)");
+    EXPECT_EQ(Show("glgpu[0].GLDriver=\"?\""), "not known (not in the adapter lists)");
+    EXPECT_EQ(Show("glgpu[0].GLDriver=\"\""), "not known (the text is empty)");
     EXPECT_EQ(Show("glgpu[0].GLDriver=\"  \""), "(empty)");
     EXPECT_EQ(Show("glgpu[0].GLMemoryMB="), "(empty)");
-    EXPECT_EQ(Show("glgpu[0].GLName=\"\""), "none");
-    EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"?\""), "not known");
+    EXPECT_EQ(Show("glgpu[0].GLName=\"\""), "none (no adapter of the system matches)");
+    EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"?\""), "not known (not in the adapter lists)");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"20210315000000.000000-000\""), "2021-03-15");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"March 2021\""), "March 2021");
 }
@@ -70,7 +92,6 @@ TEST(ValueText, ShowsOtherFormsUnchanged)
     EXPECT_EQ(Show("glgpu[0].GLVendorID=0x10DE"), "0x10DE");
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK=2"), "2");
     EXPECT_EQ(Show("glgpu[0].GLFrameBufferOK="), "(empty)");
-    EXPECT_EQ(Show("clgpu[0].CLBandwidth=inf"), "inf");
     EXPECT_EQ(Show("glgpu[0].GLRectTextureSize=big"), "big");
     EXPECT_EQ(Show("glgpu[0].Extra=\"a\tb\x80\""), "a\\tb\\x80");
     EXPECT_EQ(Show("glgpu[0].GLRenderer=\"3.0  \""), "3.0");
@@ -85,6 +106,13 @@ TEST(ValueText, MarksCutAndMissingValues)
     const Answers answers = GetAnswers(report);
     EXPECT_EQ(GetValueText(answers.fDevices.at(0).fAnswers.at(8)), "0123456... (cut)");
     EXPECT_EQ(GetValueText(answers.fDevices.at(0).fAnswers.at(9)), "- (run ended before)");
+}
+
+TEST(ValueText, ACutValueHasNoNote)
+{
+    const Report report = ReadReport("clgpu[0].CLCompute=12");
+    const Answers answers = GetAnswers(report);
+    EXPECT_EQ(GetValueText(answers.fDevices.at(0).fAnswers.at(11)), "12... (cut)");
 }
 
 TEST(ValueText, NamesADevice)
