@@ -15,6 +15,7 @@
 #include "output/Output.h"
 #include "output/Terminal.h"
 #include "output/WriterThread.h"
+#include "report/Activity.h"
 #include "report/JsonDocument.h"
 #include "report/JsonEvents.h"
 #include "report/LineForm.h"
@@ -111,7 +112,7 @@ public:
     {
         const std::string next = fSequence.GetNextKey();
         fWriter.ShowProgress(fmt::format("{:.1f} s, {} steps, {}", seconds, fSequence.GetSteps(),
-                                         next.empty() ? "at the end" : "at " + next));
+                                         next.empty() ? "at the end" : GetActivityText(next)));
     }
 
     // Queues the rest of the output, and returns the exit status.

@@ -95,7 +95,7 @@ private:
                                      kCopyScriptHash)}});
         fPage.AddVoid("meta",
                       {{"name", "viewport"}, {"content", "width=device-width, initial-scale=1"}});
-        fPage.Add("title", fmt::format("assay: {}", GetVerdictName(fOutcome.fVerdict)));
+        fPage.Add("title", "assay: " + GetHeadline());
         const Element style(fPage, "style");
         fPage.AddRaw(kPageStyle);
     }
@@ -214,17 +214,18 @@ private:
     {
         fPage.Add("h2", "The run");
         const Element list(fPage, "dl");
-        AddRow("Verdict", GetVerdictName(fOutcome.fVerdict));
+        AddRow("Result", GetRunText(fReport, fOutcome));
         AddRow("What happened", ShowBytes(fOutcome.fReason));
-        AddRow("Ended by", ShowBytes(fOutcome.fTermination));
-        AddRow("Exit status", fOutcome.fExitStatus ? std::to_string(*fOutcome.fExitStatus) : "");
+        AddRow("Ended by", GetEndText(fOutcome));
+        AddRow("Exit status of assay",
+               fOutcome.fExitStatus ? std::to_string(*fOutcome.fExitStatus) : "");
         AddRow("Command", GetCommandText(fOutcome));
-        AddRow("Time taken", GetTimeText(fOutcome));
+        AddRow("Time", GetTimeText(fOutcome));
         AddRow("Devices", GetCountText(fAnswers));
         if (!fReport.IsWhole()) {
             AddRow("Last report line", ShowBytes(fOutcome.fLastReportLine));
             AddRow("Last log line", ShowBytes(fOutcome.fLastLogLine));
-            AddRow("Next to report", ShowBytes(fAnswers.fNext));
+            AddRow("Next line", ShowBytes(fAnswers.fNext));
         }
         const Environment& environment = fFacts.fEnvironment;
         AddRow("System", environment.fSystem);

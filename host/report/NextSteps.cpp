@@ -40,7 +40,7 @@ void AddForVerdict(StepList& steps, Verdict verdict)
                   "--assay.");
         break;
     case Verdict::kUsageError:
-        steps.Add("Correct the child's options, those after \"--\"; assay -help lists them.");
+        steps.Add("Correct assay's options, those after \"--\"; assay -help lists them.");
         break;
     case Verdict::kInterrupted:
         steps.Add("Run again, and let the run end by itself.");

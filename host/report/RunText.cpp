@@ -8,6 +8,38 @@
 
 namespace assay_host {
 
+std::string GetRunText(const Report& report, const RunOutcome& outcome)
+{
+    switch (outcome.fVerdict) {
+    case Verdict::kComplete:
+        return "all tests ran";
+    case Verdict::kFailedTests:
+        return report.IsWhole() ? "ended with a failure" : "ended early";
+    case Verdict::kUsageError:
+        return "options rejected";
+    case Verdict::kCrashed:
+        return "crashed";
+    case Verdict::kHung:
+        return "did not end";
+    case Verdict::kNeverStarted:
+        return "did not start";
+    case Verdict::kInterrupted:
+        return "interrupted";
+    }
+    return {};
+}
+
+std::string GetEndText(const RunOutcome& outcome)
+{
+    if (outcome.fTermination.empty())
+        return {};
+    if (outcome.fVerdict == Verdict::kHung)
+        return "assay-host, at the time limit";
+    if (outcome.fVerdict == Verdict::kInterrupted)
+        return "the interruption of the run";
+    return ShowBytes(outcome.fTermination);
+}
+
 std::string GetCommandText(const RunOutcome& outcome)
 {
     std::string text;
@@ -26,7 +58,7 @@ std::string GetTimeText(const RunOutcome& outcome)
 {
     std::string text = fmt::format("{:.2f} s", outcome.fSeconds);
     if (outcome.fTimeoutSeconds > 0)
-        text += fmt::format(" of {:g} s", outcome.fTimeoutSeconds);
+        text += fmt::format(" (limit {:g} s)", outcome.fTimeoutSeconds);
     return text;
 }
 
@@ -46,6 +78,11 @@ std::string GetCountText(const Answers& answers)
             text += fmt::format("no {}", name);
         else if (answer->fMissing == Missing::kRunEnded && count == 0)
             text += fmt::format("{} not reached", name);
+        else if (answer->fMissing == Missing::kUnreadable && count == 0)
+            text += fmt::format("{} not known", name);
+        else if (count == 0)
+            text += fmt::format(
+                kind == DeviceKind::kOpenCL ? "no {} graphics device" : "no {} device", name);
         else
             text += fmt::format("{} {}", count, name);
     }

@@ -2,6 +2,7 @@
 
 #include <fmt/format.h>
 
+#include "report/Activity.h"
 #include "report/Answers.h"
 
 namespace assay_host {
@@ -12,9 +13,9 @@ RunOutcome MakeOutcomeOfReport(const Report& report)
     outcome.fVerdict = report.IsWhole() ? Verdict::kComplete : Verdict::kFailedTests;
     const std::string next = GetAnswers(report).fNext;
     outcome.fReason = report.IsWhole()
-                          ? "The report is whole; how the child ended was not stored."
-                          : fmt::format("The report stopped{}; how the child ended was not stored.",
-                                        next.empty() ? "" : " before " + next);
+                          ? "The report is whole; how assay ended was not stored."
+                          : fmt::format("The report stopped{}; how assay ended was not stored.",
+                                        next.empty() ? "" : " while " + GetActivityText(next));
     outcome.fDrivers.fReason = "they were not stored";
     for (const ReportLine& line : report.GetLines())
         if (line.fKind == LineKind::kValue)

@@ -175,10 +175,10 @@ bool HasValues(const Report& report)
                        [](const ReportLine& line) { return line.fKind == LineKind::kValue; });
 }
 
-void PrintVerdict(std::ostream& out, const Report& report, const Answers& answers,
-                  const RunOutcome& outcome, std::size_t width)
+void PrintRun(std::ostream& out, const Report& report, const Answers& answers,
+              const RunOutcome& outcome, std::size_t width)
 {
-    const std::string title = fmt::format("Verdict: {}", GetVerdictName(outcome.fVerdict));
+    const std::string title = fmt::format("Run: {}", GetRunText(report, outcome));
     out << title << "\n" << std::string(title.size(), '-') << "\n";
     TextTable table;
     const auto add = [&table](const char* label, const std::string& value) {
@@ -189,8 +189,8 @@ void PrintVerdict(std::ostream& out, const Report& report, const Answers& answer
     for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL})
         add(GetKindName(kind), GetUsableText(JudgeUsable(kind, answers, outcome)));
     AddRows(table, "What to do", GetNextSteps(answers, outcome));
-    add("Ended by", ShowBytes(outcome.fTermination));
-    add("Exit status", outcome.fExitStatus ? std::to_string(*outcome.fExitStatus) : "");
+    add("Ended by", GetEndText(outcome));
+    add("Exit status of assay", outcome.fExitStatus ? std::to_string(*outcome.fExitStatus) : "");
     add("Command", GetCommandText(outcome));
     add("Time", GetTimeText(outcome));
     if (HasValues(report))
@@ -198,7 +198,7 @@ void PrintVerdict(std::ostream& out, const Report& report, const Answers& answer
     if (HasValues(report) && !report.IsWhole()) {
         add("Last report line", ShowBytes(outcome.fLastReportLine));
         add("Last log line", ShowBytes(outcome.fLastLogLine));
-        add("Next to report", answers.fNext);
+        add("Next line", ShowBytes(answers.fNext));
     }
     AddLines(table, "Standard error", outcome.fErrorLines);
     AddLines(table, "Other lines", GetRawLines(report));
@@ -214,7 +214,7 @@ void PrintText(std::ostream& out, const Report& report, const RunOutcome& outcom
     PrintWarnings(out, GetWarnings(answers, outcome), columns);
     for (const DeviceAnswers& device : answers.fDevices)
         DeviceTable(device).Print(out, columns);
-    PrintVerdict(out, report, answers, outcome, columns);
+    PrintRun(out, report, answers, outcome, columns);
 }
 
 } // namespace assay_host

@@ -9,6 +9,7 @@
 
 #include <fmt/format.h>
 
+#include "report/Activity.h"
 #include "report/Bytes.h"
 #include "report/LineForm.h"
 #include "report/Software.h"
@@ -48,9 +49,9 @@ public:
         if (IsDone())
             return JudgeDevices();
         if (fOutcome.fVerdict == Verdict::kNeverStarted)
-            return Unknown("never-started", "The child could not be started.");
+            return Unknown("never-started", "assay could not be started.");
         if (fOutcome.fVerdict == Verdict::kUsageError)
-            return Unknown("usage-error", "The child rejected its command line.");
+            return Unknown("usage-error", "assay rejected its command line.");
         if (fOutcome.fVerdict == Verdict::kInterrupted)
             return Unknown(
                 "interrupted",
@@ -131,19 +132,18 @@ private:
     {
         const auto tag = GetDeviceTag(fAnswers.fNext);
         const std::string device(tag ? *tag : "");
-        const std::string where = ShowBytes(fAnswers.fNext);
+        const std::string where = GetActivityText(fAnswers.fNext);
         switch (fOutcome.fVerdict) {
         case Verdict::kCrashed:
             return {Usability::kBroken, "crashed",
-                    fmt::format("The child crashed in {}, at {}.", GetKindName(fKind), where),
+                    fmt::format("assay crashed in {}, while {}.", GetKindName(fKind), where),
                     device};
         case Verdict::kHung:
             return {Usability::kBroken, "hung",
-                    fmt::format("The child hung in {}, at {}.", GetKindName(fKind), where), device};
+                    fmt::format("assay hung in {}, while {}.", GetKindName(fKind), where), device};
         default:
             return {Usability::kBroken, "ended",
-                    fmt::format("The child ended in {}, at {}.", GetKindName(fKind), where),
-                    device};
+                    fmt::format("assay ended in {}, while {}.", GetKindName(fKind), where), device};
         }
     }
 
@@ -197,7 +197,10 @@ private:
         if (fKind == DeviceKind::kOpenCL) {
             if (Get(GetCountKey(fKind)).fMissing == Missing::kNoOpenCL)
                 return {Usability::kAbsent, "no-library", "There is no OpenCL library.", {}};
-            return {Usability::kAbsent, "no-device", "OpenCL has no graphics device.", {}};
+            return {Usability::kAbsent,
+                    "no-device",
+                    "There is an OpenCL library, but it has no graphics device.",
+                    {}};
         }
         if (std::count(fOutcome.fErrorLines.begin(), fOutcome.fErrorLines.end(), kContextFailure))
             return {Usability::kBroken,

@@ -122,15 +122,15 @@ std::vector<Warning> GetWarnings(const Answers& answers, const RunOutcome& outco
     Warnings warnings;
     if (outcome.fLeftBehind)
         warnings.push_back(
-            {"left-behind", "", "A process of the child could not be killed and may still run."});
+            {"left-behind", "", "A process of assay could not be killed and may still run."});
     if (outcome.fLostOutputBytes > 0)
         warnings.push_back({"output-lost", "",
-                            fmt::format("The child wrote too much output: {} bytes were dropped.",
+                            fmt::format("assay wrote too much output: {} bytes were dropped.",
                                         outcome.fLostOutputBytes)});
     if (outcome.fLostErrorBytes > 0)
         warnings.push_back(
             {"error-output-lost", "",
-             fmt::format("The child wrote too much to standard error: {} bytes were dropped.",
+             fmt::format("assay wrote too much to standard error: {} bytes were dropped.",
                          outcome.fLostErrorBytes)});
     for (const Check& check : kReportChecks) {
         const auto answer =

@@ -5,6 +5,7 @@
 #include <fmt/format.h>
 
 #include "pmutil/Options.h"
+#include "report/Activity.h"
 #include "report/LineForm.h"
 #include "supervise/ExitStatus.h"
 
@@ -45,7 +46,7 @@ std::string Where(const ReportProgress& report)
     if (!report.HasValues())
         return " before its first line";
     const std::string next = report.GetSequence().GetNextKey();
-    return fmt::format(" after {}{}", report.GetLastKey(), next.empty() ? "" : ", at " + next);
+    return next.empty() ? " after its last line" : " while " + GetActivityText(next);
 }
 
 void JudgeNormalEnd(const Evidence& evidence, RunOutcome& outcome)
@@ -55,15 +56,15 @@ void JudgeNormalEnd(const Evidence& evidence, RunOutcome& outcome)
     if (status == kUsageStatus && !evidence.fReport.HasValues() &&
         !FindErrorLine(outcome, IsUsageLine).empty()) {
         outcome.fVerdict = Verdict::kUsageError;
-        outcome.fReason = "The child rejected its command line.";
+        outcome.fReason = "assay rejected its command line.";
     } else if (!evidence.fReport.IsWhole()) {
         outcome.fVerdict = Verdict::kFailedTests;
-        outcome.fReason = fmt::format("The report stopped{}; the child ended with status {}{}.",
+        outcome.fReason = fmt::format("The report stopped{}; assay ended with status {}{}.",
                                       Where(evidence.fReport), status,
                                       failure.empty() ? "" : " (" + failure + ")");
     } else {
         outcome.fVerdict = Verdict::kFailedTests;
-        outcome.fReason = fmt::format("The report is whole, but the child ended with status {}{}.",
+        outcome.fReason = fmt::format("The report is whole, but assay ended with status {}{}.",
                                       status, failure.empty() ? "" : " (" + failure + ")");
     }
 }
@@ -105,8 +106,7 @@ void Judge(const Evidence& evidence, RunOutcome& outcome)
     outcome.fLastLogLine = evidence.fReport.GetLastLogLine();
     if (!evidence.fStartFailure.empty()) {
         outcome.fVerdict = Verdict::kNeverStarted;
-        outcome.fReason =
-            fmt::format("The child could not be started: {}.", evidence.fStartFailure);
+        outcome.fReason = fmt::format("assay could not be started: {}.", evidence.fStartFailure);
         return;
     }
     const bool endedByItself = evidence.fEnd && evidence.fEnd->fResult == pmutil::kEndedNormally;
@@ -118,7 +118,7 @@ void Judge(const Evidence& evidence, RunOutcome& outcome)
     if (evidence.fEnd && evidence.fEnd->fResult != pmutil::kEndedByKill &&
         IsComplete(evidence, outcome)) {
         outcome.fVerdict = Verdict::kComplete;
-        outcome.fReason = "The report is whole, and no test failed.";
+        outcome.fReason = "All tests ran, and the report is whole.";
     } else if (evidence.fKillReason == KillReason::kInterrupt) {
         outcome.fVerdict = Verdict::kInterrupted;
         outcome.fReason = fmt::format("The run was interrupted{}.", Where(evidence.fReport));
@@ -127,12 +127,12 @@ void Judge(const Evidence& evidence, RunOutcome& outcome)
     } else if (evidence.fKillReason == KillReason::kTimeout) {
         outcome.fVerdict = Verdict::kHung;
         outcome.fReason = fmt::format(
-            "The child did not end within {:g} s and {}{}.", outcome.fTimeoutSeconds,
+            "assay did not end within {:g} s and {}{}.", outcome.fTimeoutSeconds,
             evidence.fEnd ? "was killed" : "could not be killed", Where(evidence.fReport));
     } else {
         outcome.fVerdict = Verdict::kCrashed;
-        outcome.fReason = fmt::format("The child crashed with {}{}.", outcome.fTermination,
-                                      Where(evidence.fReport));
+        outcome.fReason =
+            fmt::format("assay crashed with {}{}.", outcome.fTermination, Where(evidence.fReport));
     }
 }
 

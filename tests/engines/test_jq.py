@@ -18,10 +18,10 @@ CARDS = {
     "shaders": ([ClGpu(driver_version="391.0")], 'fragment-fails "x"\n'),
 }
 ANSWERS = [
-    ["crashed.json crashed: The child crashed with signal 11 (Segmentation fault) after "
-     "glgpu[0].GLDriverDate, at glgpu[0].CanCompileProgramGLSL."],
-    ["crashed.json The child crashed in OpenGL, at glgpu[0].CanCompileProgramGLSL. The run ended before "
-     "OpenCL was tried.",
+    ["crashed.json crashed: assay crashed with signal 11 (Segmentation fault) while compiling shaders "
+     "(glgpu[0].CanCompileProgramGLSL)."],
+    ["crashed.json assay crashed in OpenGL, while compiling shaders (glgpu[0].CanCompileProgramGLSL). "
+     "The run ended before OpenCL was tried.",
      "shaders.json OpenGL does not work: glgpu[0]: a realistic pair of shaders does not compile and link: "
      "*. OpenCL works on graphics hardware."],
     ["4 390.77", "1 391.0"],

@@ -224,7 +224,7 @@ def test_node_with_a_crashing_driver_is_drained_and_resumed(cluster):
     until(lambda: cluster.state() == "idle", "the node doesn't come up")
     cluster.script.write_text(Gpu().script() + "at glCompileShader crash\n", encoding="ascii")
     until(lambda: cluster.state() == "drained", "the node isn't drained")
-    assert cluster.reason().startswith("assay: crashed: The child crashed")
+    assert cluster.reason().startswith("assay: crashed: assay crashed")
     questions = [line for line in DOCS.read_text(encoding="utf-8").splitlines()
                  if line.startswith("sinfo -N")]
     nodes, counts = [cluster.ask("bash", "-c", question) for question in questions]

@@ -53,7 +53,7 @@ def test_run_that_ends_early_has_its_own_status():
     hosted = host_run("check", *requirements("NumGLGPUs>=1"), "--", "-crashAfter=1")
     lines = hosted.text.splitlines()
     assert hosted.status == 1
-    assert lines[0].startswith("failed-tests: The report stopped after Tester, at assayStart; ")
+    assert lines[0].startswith("failed-tests: The report stopped while starting (assayStart); ")
     assert lines[1:] == ["not met: NumGLGPUs>=1: not known (run ended before)"]
 
 

@@ -160,7 +160,7 @@ def test_fifo_that_is_read_late(scene):
     os.mkfifo(fifo)
     with scene.watch("--output", fifo, stdout=subprocess.DEVNULL) as watched:
         scene.end_the_child(watched)
-        assert b"Verdict: hung" in fifo.read_bytes()
+        assert b"Run: did not end" in fifo.read_bytes()
         assert watched.finish().status == 4
 
 
@@ -325,7 +325,7 @@ def test_closed_streams(tmp_path, closed):
     run = whole("--output", file, preexec_fn=lambda: [os.close(stream) for stream in closed],
                 stdin=None, stdout=None, stderr=None)
     assert run.status == 0
-    assert "Verdict: complete" in file.read_text()
+    assert "Run: all tests ran" in file.read_text()
 
 
 def test_orphans_of_an_earlier_program(tmp_path):
@@ -399,7 +399,7 @@ def test_background_of_a_terminal(tmp_path):
                      'assayEnd="y"', program=sys.executable, stdin=terminal, stdout=terminal,
                      stderr=terminal) as watched:
             watched.finish()
-            assert "Verdict: complete" in file.read_text()
+            assert "Run: all tests ran" in file.read_text()
     finally:
         os.close(terminal)
         os.close(control)

@@ -100,7 +100,7 @@ def test_crash(host, name):
     assert outcome["lastReportLine"].startswith(f"glgpu[0].{KEYS[KEYS.index(key) - 1]}=")
     assert outcome["lastLogLine"] is None
     assert document["report"]["next"] == f"glgpu[0].{key}"
-    assert f"at glgpu[0].{key}" in outcome["reason"]
+    assert f"(glgpu[0].{key})." in outcome["reason"]
     whole = predict([Gpu()]).lines
     kept = stamped(report_bytes(document)).splitlines()
     assert kept == whole[:len(kept)]
@@ -186,7 +186,7 @@ def test_interrupt_keeps_the_report(host, form, number):
     elif form == "jsonl":
         assert run.events()[-1]["outcome"]["verdict"] == "interrupted"
     else:
-        assert "Verdict: interrupted" in run.text
+        assert "Run: interrupted" in run.text
 
 
 def test_two_devices_of_each_kind(host):
@@ -242,7 +242,7 @@ def test_raw_lines_come_first(host):
     raw, table = run.text.split("\n\n", 1)
     assert stamped(raw.encode() + b"\n").splitlines() == ["in front", *predict([Gpu()]).lines]
     assert table.startswith("Warnings\n")
-    assert "Verdict: complete" in table
+    assert "Run: all tests ran" in table
     assert run.err == b"aside\n"
 
 
@@ -270,7 +270,7 @@ def test_assay_on_the_path_is_the_next(host, tmp_path):
 
 def test_progress_only_on_a_terminal(host):
     environment = host.environment(opencl="absent", **scripted("at glLinkProgram hang"))
-    progress = re.compile(rb"\r\d+\.\d s, \d+ steps, at glgpu\[0\]\.CanCompileProgramGLSL")
+    progress = re.compile(rb"\r\d+\.\d s, \d+ steps, compiling shaders \(glgpu\[0\]\.CanCompileProgramGLSL\)")
     control, terminal = pty.openpty()
     with Watched("run", "--assay", PROGRAM, environment=environment,
                  stderr=terminal) as watched:

@@ -62,7 +62,7 @@ def wrapped(folder, condition, action):
 
 RULE_BREAKERS = {
     "a wrong status": (f"{PROGRAM} \"$@\"; exit 0", "exit status: predicted 2, found 0"),
-    "a real crash": ("kill -SEGV $$", "predicted 2, found none: The child crashed with signal 11"),
+    "a real crash": ("kill -SEGV $$", "predicted 2, found none: assay crashed with signal 11"),
     "a missing line": (f"{PROGRAM} \"$@\" | sed '$d'; exit 2", "    + (the end)"),
     "an extra line": (f"{PROGRAM} \"$@\"; echo NumGLGPUs=1; exit 2", "    + NumGLGPUs=1"),
     "another order": (f"{PROGRAM} \"$@\" | sed '$!{{h;d}};G'; exit 2", "report (- predicted"),

@@ -79,10 +79,10 @@ PAGES = {"healthy": healthy, "crashed": crashed, "two-cards": two_cards, "trial-
          "never-started": never_started, "hostile": hostile}
 HEADLINES = {
     "healthy": "OpenGL works on graphics hardware.",
-    "crashed": "The child crashed with signal 11 (Segmentation fault)",
+    "crashed": "assay crashed with signal 11 (Segmentation fault)",
     "two-cards": "OpenGL works on graphics hardware.",
     "trial-failed": "OpenGL does not work: glgpu[0]: no complete framebuffer object could be created",
-    "never-started": "The child could not be started",
+    "never-started": "assay could not be started",
     "hostile": "OpenGL works on graphics hardware.",
 }
 

@@ -14,6 +14,18 @@ from validate import validate_document
 
 pytestmark = test_usable.pytestmark
 
+# What text and pages say of a run, by its verdict and by whether the report is whole.
+RUNS = {
+    ("complete", True): "all tests ran",
+    ("failed-tests", True): "ended with a failure",
+    ("failed-tests", False): "ended early",
+    ("crashed", True): "crashed",
+    ("crashed", False): "crashed",
+    ("hung", False): "did not end",
+    ("usage-error", False): "options rejected",
+    ("never-started", False): "did not start",
+}
+
 
 def show(file, *options):
     return host_run("show", str(file), *options)
@@ -62,7 +74,7 @@ def sections(text):
     """The part of a text form that is about each device, and the rest under ""."""
     parts = re.split(r"^Open[GC]L device (\w+\[\d+\]).*\n-+\n", text, flags=re.M)
     found = dict(zip(parts[1::2], (part.split("\n\n")[0] for part in parts[2::2])))
-    found[""] = text.rpartition("\nVerdict: ")[2]
+    found[""] = text.rpartition("\nRun: ")[2]
     return {tag: joined(part) for tag, part in found.items()}
 
 
@@ -89,10 +101,11 @@ def test_the_forms_agree(tmp_path, name):
 
     text = sections("\n" + show(stored, "--output", str(tmp_path / "text")).text
                     + (tmp_path / "text").read_text(encoding="utf-8"))
-    assert text[""].startswith(f"{verdict} ---")
+    words = RUNS[verdict, document["report"]["whole"]]
+    assert text[""].startswith(f"{words} ---")
     page = Page(show(stored, "--format", "html").text)
     run = {term: fact for device, term, fact in page.facts if not device}
-    assert run["Verdict"] == verdict
+    assert run["Result"] == words
     assert page.spans[:2] == [answers["opengl"][0], answers["opencl"][0]]
     samples = metrics(show(stored, "--format", "prometheus").text)
     assert samples["assay_run_verdict", f'verdict="{verdict}"'] == 1
@@ -140,7 +153,7 @@ def test_events_and_a_plain_report(tmp_path):
     plain.write_bytes(b"".join((decode(line["text"]) + b"\n") for line in document["lines"]))
     shown = show(plain)
     assert shown.status == 0
-    assert "how the child ended was not stored" in joined(shown.text)
+    assert "how assay ended was not stored" in joined(shown.text)
     first = validate_document(show(plain, "--format", "json", "--schema", "1").out)
     assert [line["text"] for line in first["lines"]] == [line["text"] for line in document["lines"]]
     assert show(plain, "--format", "html").status == 0

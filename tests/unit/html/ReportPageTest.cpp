@@ -61,7 +61,7 @@ TEST(ReportPage, OfAGoodMachine)
 {
     const std::string page = WritePage(Sample(1, 1).GetText(), MakeOutcome(Verdict::kComplete));
     EXPECT_EQ(page.substr(0, 16), "<!DOCTYPE html>\n");
-    EXPECT_TRUE(Has(page, "<title>assay: complete</title>"));
+    EXPECT_TRUE(Has(page, "<title>assay: OpenGL works on graphics hardware.</title>"));
     EXPECT_TRUE(Has(page, "<h1>OpenGL works on graphics hardware.</h1>"));
     EXPECT_TRUE(Has(page, "<span class=\"hardware\">hardware</span> (glgpu[0]): OpenGL works"));
     EXPECT_TRUE(Has(page, "<span class=\"hardware\">hardware</span> (clgpu[0]): OpenCL works"));
@@ -92,12 +92,12 @@ TEST(ReportPage, OfACrash)
     const std::string page =
         WritePage(Sample(1, 1).EndAfter("glgpu[0].GLVersion").GetText(), outcome);
     EXPECT_TRUE(Has(page, "<h1>The reason &lt;b&gt;.</h1>"));
-    EXPECT_TRUE(Has(page, "<span class=\"broken\">broken</span> (glgpu[0]): The child crashed"));
+    EXPECT_TRUE(Has(page, "<span class=\"broken\">broken</span> (glgpu[0]): assay crashed"));
     EXPECT_TRUE(Has(page, "<h2>What to do</h2>\n<ul><li>Update the graphics driver"));
     EXPECT_TRUE(Has(page, "<dt>Ended by</dt>\n<dd>signal 11 (Segmentation fault)</dd>"));
     EXPECT_TRUE(
         Has(page, "<dt>Last report line</dt>\n<dd>glgpu[0].GLVersion=&quot;4.1&quot;</dd>"));
-    EXPECT_TRUE(Has(page, "<dt>Next to report</dt>\n<dd>glgpu[0].IsIntegratedGLGPU</dd>"));
+    EXPECT_TRUE(Has(page, "<dt>Next line</dt>\n<dd>glgpu[0].IsIntegratedGLGPU</dd>"));
     EXPECT_TRUE(Has(page, "<h3>No answer</h3>\n<dl><dt>run ended before</dt>"));
     EXPECT_TRUE(Has(page, "<summary>Standard error (2)</summary>\n<pre>a &lt; b\n\n</pre>"));
     EXPECT_FALSE(Has(page, "Measurements"));

@@ -107,7 +107,8 @@ TEST(LibraryAccount, OfWhatCanBeUsed)
                                          "broken.",
                                          "glgpu[0]"));
     EXPECT_EQ(of(ASSAY_HOST_OPENCL),
-              All(ASSAY_HOST_BROKEN, "crashed", "The child crashed in OpenCL, at clgpu[0].CLName.",
+              All(ASSAY_HOST_BROKEN, "crashed",
+                  "assay crashed in OpenCL, while reading facts of a device (clgpu[0].CLName).",
                   "clgpu[0]"));
 }
 

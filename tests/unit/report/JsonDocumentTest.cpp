@@ -23,7 +23,7 @@ RunOutcome GoodOutcome()
     outcome.fVerdict = Verdict::kComplete;
     outcome.fCommand = {"assay", "-verbose=0"};
     outcome.fExitStatus = 0;
-    outcome.fReason = "The report is whole and no test failed.";
+    outcome.fReason = "All tests ran, and the report is whole.";
     outcome.fSeconds = 0.25;
     outcome.fTimeoutSeconds = 60;
     outcome.fLastReportLine = "assayEnd=\"2026-11-21_10:49:36\"";

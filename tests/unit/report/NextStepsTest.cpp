@@ -53,7 +53,7 @@ TEST(NextSteps, OfEachVerdict)
               (Steps{"Check that assay is installed beside assay-host or on the PATH, or name it "
                      "with --assay."}));
     EXPECT_EQ(Get("", Verdict::kUsageError),
-              (Steps{"Correct the child's options, those after \"--\"; assay -help lists them."}));
+              (Steps{"Correct assay's options, those after \"--\"; assay -help lists them."}));
     EXPECT_EQ(Get("", Verdict::kInterrupted), (Steps{"Run again, and let the run end by itself."}));
 }
 

@@ -115,7 +115,7 @@ TEST(StoredRun, EventsAreReadBackWhole)
     std::istringstream cut(unfinished);
     const StoredRun run = ReadEventsRun(cut);
     EXPECT_EQ(run.fOutcome.fVerdict, Verdict::kComplete);
-    EXPECT_EQ(run.fOutcome.fReason, "The report is whole; how the child ended was not stored.");
+    EXPECT_EQ(run.fOutcome.fReason, "The report is whole; how assay ended was not stored.");
     EXPECT_EQ(run.fOutcome.fCommand, outcome.fCommand);
     EXPECT_EQ(run.fFacts.fHostVersion, "1.2.3");
 }
@@ -129,8 +129,8 @@ TEST(StoredRun, OfAReportAlone)
     const RunOutcome stopped =
         MakeOutcomeOfReport(ReadReport(Sample(1, 0).EndAfter("glgpu[0].GLVersion").GetText()));
     EXPECT_EQ(stopped.fVerdict, Verdict::kFailedTests);
-    EXPECT_EQ(stopped.fReason, "The report stopped before glgpu[0].IsIntegratedGLGPU; how the "
-                               "child ended was not stored.");
+    EXPECT_EQ(stopped.fReason, "The report stopped while reading facts of a device "
+                               "(glgpu[0].IsIntegratedGLGPU); how assay ended was not stored.");
     EXPECT_EQ(stopped.fLastReportLine, "glgpu[0].GLVersion=\"4.1\"");
     EXPECT_FALSE(stopped.fExitStatus);
 }

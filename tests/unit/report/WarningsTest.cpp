@@ -198,9 +198,9 @@ TEST(Warnings, NameLostBytesAndProcessesLeftBehind)
     for (int index = 0; index < 258; ++index)
         text += "glgpu[" + std::to_string(index) + "].X=1\n";
     EXPECT_THAT(Warn(text, outcome),
-                ElementsAre("A process of the child could not be killed and may still run.",
-                            "The child wrote too much output: 5 bytes were dropped.",
-                            "The child wrote too much to standard error: 6 bytes were dropped.",
+                ElementsAre("A process of assay could not be killed and may still run.",
+                            "assay wrote too much output: 5 bytes were dropped.",
+                            "assay wrote too much to standard error: 6 bytes were dropped.",
                             "2 more devices are left out."));
 }
 

@@ -70,16 +70,13 @@ RunOutcome JudgeCrash(const ReportProgress& progress)
     return outcome;
 }
 
-// Returns "glgpu[0].GLName" for "... after glgpu[0].GLMemoryMB, at glgpu[0].GLName."; empty if the
-// reason names no key.
+// Returns "glgpu[0].GLName" for "... while reading facts of a device (glgpu[0].GLName)."; empty if
+// the reason names no key.
 std::string GetKeyOfReason(const std::string& reason)
 {
-    constexpr char kText[] = ", at ";
-    const std::size_t at = reason.rfind(kText);
-    if (at == std::string::npos)
-        return {};
-    const std::size_t first = at + sizeof kText - 1;
-    return reason.substr(first, reason.size() - first - 1);
+    std::smatch found;
+    std::regex_search(reason, found, std::regex(" while .*\\((\\S+)\\)\\.$"));
+    return found.str(1);
 }
 
 void ExpectOneKeyInAllOutputs(const Report& report, const RunOutcome& outcome,
@@ -94,7 +91,7 @@ void ExpectOneKeyInAllOutputs(const Report& report, const RunOutcome& outcome,
     PrintText(text, report, outcome, 400);
     std::smatch found;
     const std::string shown = text.str();
-    std::regex_search(shown, found, std::regex("Next to report +(\\S+)"));
+    std::regex_search(shown, found, std::regex("Next line +(\\S+)"));
     EXPECT_EQ(found.str(1), key);
 }
 
