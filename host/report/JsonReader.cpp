@@ -283,6 +283,11 @@ RunFacts ReadFactsOf(const Json& object, const std::string& where)
                                                    : ReadFacts(object, where);
 }
 
+OutcomeExtent GetExtent(const Json& object)
+{
+    return object["schema"] == kFirstSchemaVersion ? OutcomeExtent::kNoCauses : OutcomeExtent::kAll;
+}
+
 } // namespace
 
 Report ReadDocument(std::istream& text)
@@ -310,6 +315,7 @@ StoredRun ReadDocumentRun(std::istream& text)
     run.fOutcome = ReadOutcome(document, kDocument);
     run.fOutcome.fCommand = ReadCommand(document, kDocument);
     run.fFacts = ReadFactsOf(document, kDocument);
+    run.fExtent = GetExtent(document);
     return run;
 }
 
@@ -326,6 +332,7 @@ StoredRun ReadEventsRun(std::istream& text)
                      if (name == "start") {
                          command = ReadCommand(event, where);
                          run.fFacts = ReadFactsOf(event, where);
+                         run.fExtent = GetExtent(event);
                      }
                      if (name == "end") {
                          run.fOutcome = ReadOutcome(event, where);
@@ -333,8 +340,10 @@ StoredRun ReadEventsRun(std::istream& text)
                      }
                  });
     run.fReport = lines.TakeReport();
-    if (!hasEnd)
+    if (!hasEnd) {
         run.fOutcome = MakeOutcomeOfReport(run.fReport);
+        run.fExtent = OutcomeExtent::kNone;
+    }
     run.fOutcome.fCommand = std::move(command);
     return run;
 }

@@ -60,6 +60,7 @@ StoredRun ReadTextRun(ReportInput& input)
     StoredRun run;
     run.fReport = ReadText(input);
     run.fOutcome = MakeOutcomeOfReport(run.fReport);
+    run.fExtent = OutcomeExtent::kNone;
     run.fFacts = MakeUnknownFacts("the file has only the report");
     return run;
 }

@@ -7,10 +7,18 @@
 
 namespace assay_host {
 
+// What a file has of how the run ended.
+enum class OutcomeExtent {
+    kNone,     // nothing: the outcome is that of MakeOutcomeOfReport()
+    kNoCauses, // all but RunOutcome::fCauses, as the first schema
+    kAll
+};
+
 struct StoredRun {
     Report fReport;
     RunOutcome fOutcome;
     RunFacts fFacts;
+    OutcomeExtent fExtent = OutcomeExtent::kAll;
 };
 
 // Makes the outcome of a run of which only the report is stored: complete if it is whole, and
