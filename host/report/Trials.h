@@ -1,6 +1,10 @@
 // The trials of a device whose answer is 0 if it can't be used.
 #pragma once
 
+#include <algorithm>
+#include <iterator>
+#include <string_view>
+
 namespace assay_host {
 
 struct Trial {
@@ -15,5 +19,11 @@ constexpr Trial kTrials[] = {
     {"GLFrameBufferOK", "framebuffer-trial-failed",
      "no complete framebuffer object could be created and drawn to"},
 };
+
+inline bool IsTrial(std::string_view key)
+{
+    return std::any_of(std::begin(kTrials), std::end(kTrials),
+                       [key](const Trial& trial) { return key == trial.fKey; });
+}
 
 } // namespace assay_host
