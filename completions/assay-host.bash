@@ -58,7 +58,7 @@ _assay_host() {
     case $command in
     run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
-    diff) options+=" --tolerance --identity" ;;
+    diff) options+=" --tolerance --identity --all" ;;
     explain) ;;
     show) options+=" --format --schema --output" ;;
     check) options+=" --require --requirements --from --baseline --tolerance --assay --timeout --" ;;

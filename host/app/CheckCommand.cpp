@@ -17,7 +17,8 @@
 #include "output/WriterThread.h"
 #include "report/Answers.h"
 #include "report/Bytes.h"
-#include "report/Diff.h"
+#include "report/CompareReports.h"
+#include "report/DiffText.h"
 #include "report/Report.h"
 #include "report/ReportFile.h"
 #include "report/RunOutcome.h"
@@ -80,14 +81,14 @@ private:
     {
         if (!fBaseline)
             return true;
-        DiffOptions options;
-        options.fTolerance = fTolerance;
-        options.fFasterIsSame = true;
+        ComparisonOptions options;
+        options.fMeasurements = {fTolerance, true};
+        const Comparison comparison = CompareReports(*fBaseline, report, options);
         std::stringstream lines;
-        const bool differs = PrintDiff(lines, *fBaseline, report, options);
+        PrintDiff(lines, comparison);
         for (std::string line; std::getline(lines, line);)
             fText += fmt::format("{}not as the baseline: {}\n", prefix, line);
-        return !differs;
+        return comparison.IsSame();
     }
 
     std::string GetWhatIsMet() const

@@ -72,14 +72,15 @@ struct CheckChoice {
     std::vector<std::string> fRequirementFiles;
     std::vector<std::string> fReports; // files; empty: run the child
     std::string fBaseline;             // a file; empty: none
-    double fTolerance = 0.1;           // of the baseline, as DiffOptions::fTolerance
+    double fTolerance = 0.1;           // of the baseline, as MeasurementRule::fTolerance
 };
 
 struct DiffChoice {
     std::string fBefore;
     std::vector<std::string> fAfter; // at least one
-    double fTolerance = 0.1;         // as DiffOptions::fTolerance
+    double fTolerance = 0.1;         // as MeasurementRule::fTolerance
     bool fIdentity = false;          // compare the machines' names and the times too
+    bool fAll = false;               // as ComparisonOptions::fAll
 };
 
 struct ShowChoice {

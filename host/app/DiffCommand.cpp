@@ -8,13 +8,12 @@
 #include <string_view>
 #include <utility>
 
-#include <fmt/format.h>
-
 #include "app/Commands.h"
 #include "output/Output.h"
 #include "output/SinkBuffer.h"
 #include "report/Bytes.h"
-#include "report/Diff.h"
+#include "report/CompareRuns.h"
+#include "report/DiffText.h"
 #include "report/ReportFile.h"
 
 namespace assay_host {
@@ -48,22 +47,6 @@ private:
     bool fIsAtStart = true;
 };
 
-// Prints the differences between the machines' names and the times.
-bool PrintIdentity(std::ostream& out, const Environment& before, const Environment& after)
-{
-    bool differs = false;
-    const auto compare = [&](const char* what, const std::string& left, const std::string& right) {
-        if (left == right)
-            return;
-        out << fmt::format("{}: {} -> {}\n", what, left.empty() ? "not known" : ShowBytes(left),
-                           right.empty() ? "not known" : ShowBytes(right));
-        differs = true;
-    };
-    compare("host", before.fHost.fValue, after.fHost.fValue);
-    compare("time", before.fTime, after.fTime);
-    return differs;
-}
-
 // Loads one of several files. Says on standard error why it can't be read, so that the others are
 // compared all the same.
 std::optional<StoredRun> TryLoad(const std::string& path)
@@ -81,9 +64,10 @@ std::optional<StoredRun> TryLoad(const std::string& path)
 int Diff(const DiffChoice& choice)
 {
     const StoredRun before = LoadRun(choice.fBefore);
-    DiffOptions options;
-    options.fTolerance = choice.fTolerance;
-    options.fStamps = choice.fIdentity;
+    ComparisonOptions options;
+    options.fMeasurements.fTolerance = choice.fTolerance;
+    options.fIdentity = choice.fIdentity;
+    options.fAll = choice.fAll;
     const std::unique_ptr<Output> output = OpenStandardOutput();
     PrefixedOutput lines(*output);
     SinkBuffer buffer([&lines](std::string_view block) { lines.Write(block); });
@@ -99,10 +83,9 @@ int Diff(const DiffChoice& choice)
             continue;
         }
         lines.SetPrefix(isOne ? "" : ShowBytes(path) + ": ");
-        if (choice.fIdentity)
-            differs = PrintIdentity(text, before.fFacts.fEnvironment, after->fFacts.fEnvironment) ||
-                      differs;
-        differs = PrintDiff(text, before.fReport, after->fReport, options) || differs;
+        const Comparison comparison = CompareRuns(before, *after, options);
+        PrintDiff(text, comparison);
+        differs = differs || !comparison.IsSame();
         text.flush();
     }
     if (!isRead)

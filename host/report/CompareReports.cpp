@@ -306,7 +306,8 @@ void SortByGroup(std::vector<Difference>& differences)
                      [](const Difference& a, const Difference& b) { return a.fGroup < b.fGroup; });
 }
 
-Comparison CompareReports(const Report& before, const Report& after, const ComparisonOptions& options)
+Comparison CompareReports(const Report& before, const Report& after,
+                          const ComparisonOptions& options)
 {
     return Comparer(before, after, options).Compare();
 }

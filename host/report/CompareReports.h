@@ -20,7 +20,8 @@ struct ComparisonOptions {
 // one run didn't reach are one difference, "report" of the group kRun; those after the failed test
 // of a device are one too, "tests" of the group kTrials. The reason for a missing line isn't
 // compared: it describes the run, not the machine. Any thread may call.
-Comparison CompareReports(const Report& before, const Report& after, const ComparisonOptions& options);
+Comparison CompareReports(const Report& before, const Report& after,
+                          const ComparisonOptions& options);
 
 // Sorts by group, and leaves the order in a group.
 void SortByGroup(std::vector<Difference>& differences);

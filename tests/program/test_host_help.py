@@ -70,6 +70,7 @@ Options:
   -h,--help               show this text
   --tolerance FRACTION    of measurements, relative to the larger one [0.1]
   --identity              compare the machines' names and the times too
+  --all                   each key that a run did not reach, and gputag lines
 
 exit status: 0 same, 1 different, 2 error
 """,

@@ -25,6 +25,8 @@ public:
                   "of measurements, relative to the larger one [0.1]", "FRACTION");
         command.add_flag("--identity", fChoice.fIdentity,
                          "compare the machines' names and the times too");
+        command.add_flag("--all", fChoice.fAll,
+                         "each key that a run did not reach, and gputag lines");
     }
 
     CommandChoice Choose(const CLI::App& /*command*/,

@@ -101,6 +101,8 @@ TEST(CommandLineOfDiff, HasFilesAndATolerance)
     EXPECT_EQ(plain.fBefore, "a");
     EXPECT_THAT(plain.fAfter, ElementsAre("b"));
     EXPECT_EQ(plain.fTolerance, 0.1);
+    EXPECT_FALSE(plain.fAll);
+    EXPECT_TRUE(Parse<DiffChoice>({"diff", "--all", "a", "b"}).fAll);
     // On every system.
     const auto absolute = Parse<DiffChoice>({"diff", "/a/b.json", "/c"});
     EXPECT_EQ(absolute.fBefore, "/a/b.json");

@@ -5,19 +5,29 @@
 
 #include "Lines.h"
 #include "Samples.h"
-#include "report/Diff.h"
+#include "report/CompareReports.h"
+#include "report/DiffText.h"
 
 namespace assay_host {
 namespace {
 
+std::string DiffWith(const std::string& before, const std::string& after,
+                     const ComparisonOptions& options)
+{
+    const Report first = ReadReport(before);
+    const Report second = ReadReport(after);
+    const Comparison comparison = CompareReports(first, second, options);
+    std::ostringstream out;
+    PrintDiff(out, comparison);
+    EXPECT_EQ(comparison.IsSame(), out.str().empty());
+    return out.str();
+}
+
 std::string Diff(const std::string& before, const std::string& after, double tolerance = 0.1)
 {
-    std::ostringstream out;
-    DiffOptions options;
-    options.fTolerance = tolerance;
-    const bool differs = PrintDiff(out, ReadReport(before), ReadReport(after), options);
-    EXPECT_EQ(differs, !out.str().empty());
-    return out.str();
+    ComparisonOptions options;
+    options.fMeasurements.fTolerance = tolerance;
+    return DiffWith(before, after, options);
 }
 
 std::string Diff(Sample before, Sample after, double tolerance = 0.1)
@@ -42,23 +52,21 @@ TEST(Diff, IgnoresStampsAndLogLines)
 
 TEST(Diff, ComparesStampsIfAsked)
 {
-    DiffOptions options;
-    options.fStamps = true;
-    std::ostringstream out;
-    EXPECT_TRUE(PrintDiff(out, ReadReport(Sample(1, 1).GetText()),
-                          ReadReport(Sample(1, 1).Set("assayEnd", "\"2028\"").GetText()), options));
-    EXPECT_EQ(out.str(), "assayEnd: \"2026-11-21_10:49:36\" -> \"2028\"\n");
+    ComparisonOptions options;
+    options.fIdentity = true;
+    EXPECT_EQ(DiffWith(Sample(1, 1).GetText(), Sample(1, 1).Set("assayEnd", "\"2028\"").GetText(),
+                       options),
+              "assayEnd: \"2026-11-21_10:49:36\" -> \"2028\"\n");
 }
 
 TEST(Diff, LetsAMeasurementBeLargerIfAsked)
 {
     const auto differs = [](const char* value) {
-        DiffOptions options;
-        options.fFasterIsSame = true;
-        std::ostringstream out;
-        return PrintDiff(out, ReadReport(Sample(1, 1).Set("clgpu[0].CLCompute", "100").GetText()),
-                         ReadReport(Sample(1, 1).Set("clgpu[0].CLCompute", value).GetText()),
-                         options);
+        ComparisonOptions options;
+        options.fMeasurements.fFasterIsSame = true;
+        return !DiffWith(Sample(1, 1).Set("clgpu[0].CLCompute", "100").GetText(),
+                         Sample(1, 1).Set("clgpu[0].CLCompute", value).GetText(), options)
+                    .empty();
     };
     EXPECT_FALSE(differs("300"));
     EXPECT_FALSE(differs("91"));
@@ -97,9 +105,9 @@ TEST(Diff, AppliesTheToleranceToMeasurements)
     };
     EXPECT_EQ(diff("1e+11", "9.1e+10", 0.1), "");
     EXPECT_EQ(diff("9.1e+10", "1e+11", 0.1), "");
-    EXPECT_EQ(diff("1e+11", "8.9e+10", 0.1), "clgpu[0].CLBandwidth: 1e+11 -> 8.9e+10\n");
-    EXPECT_EQ(diff("8.9e+10", "1e+11", 0.1), "clgpu[0].CLBandwidth: 8.9e+10 -> 1e+11\n");
-    EXPECT_EQ(diff("1e+11", "1.01e+11", 0), "clgpu[0].CLBandwidth: 1e+11 -> 1.01e+11\n");
+    EXPECT_EQ(diff("1e+11", "8.9e+10", 0.1), "clgpu[0].CLBandwidth: 1e+11 -> 8.9e+10 (-11 %)\n");
+    EXPECT_EQ(diff("8.9e+10", "1e+11", 0.1), "clgpu[0].CLBandwidth: 8.9e+10 -> 1e+11 (+12.4 %)\n");
+    EXPECT_EQ(diff("1e+11", "1.01e+11", 0), "clgpu[0].CLBandwidth: 1e+11 -> 1.01e+11 (+1 %)\n");
     EXPECT_EQ(diff("1e+11", "1e+11", 0), "");
     EXPECT_EQ(diff("0", "1", 0.5), "clgpu[0].CLBandwidth: 0 -> 1\n");
     EXPECT_EQ(diff("0", "1", 1), "");
@@ -107,7 +115,7 @@ TEST(Diff, AppliesTheToleranceToMeasurements)
     EXPECT_EQ(diff("inf", "inf", 0), "");
     EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CLCompute", "1200")), "");
     EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CLCompute", "1000")),
-              "clgpu[0].CLCompute: 1234.56 -> 1000\n");
+              "clgpu[0].CLCompute: 1234.56 -> 1000 (-19 %)\n");
     EXPECT_EQ(Diff(Sample(1, 0), Sample(1, 0).Set("glgpu[0].GLMemoryMB", "24563"), 0.5),
               "glgpu[0].GLMemoryMB: 24564 -> 24563\n");
 }
@@ -117,10 +125,11 @@ TEST(Diff, ReportsMissingKeysAndTheirReasons)
     EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CUDAVersion", "")),
               "clgpu[0].CUDAVersion: \"12.0.89\" -> missing (not printed by this device)\n");
     EXPECT_EQ(Diff(Sample(0, 1).Fail("clgpu[0]", "CLCompute"), Sample(0, 1)),
-              "clgpu[0].CLCompute: missing (device failed before) -> 1234.56\n");
+              "clgpu[0].tests: failed at CLCompute -> passed "
+              "(1 answer only in the second report)\n");
     EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).EndAfter("clgpu[0].CLBandwidth")),
-              "report: whole -> broken off\n"
-              "clgpu[0].CLCompute: 1234.56 -> missing (run ended before)\n");
+              "report: whole -> broken off before clgpu[0].CLCompute "
+              "(1 answer only in the first report)\n");
     EXPECT_EQ(Diff(Sample(0, 0), Sample(0, -1)), "NumCLGPUs: 0 -> missing (no OpenCL)\n");
     EXPECT_EQ(Diff("a=1\nglgpu[0].x=1\n", "b=2\nglgpu[0].y=2\n"), "a: 1 -> missing\n"
                                                                   "b: missing -> 2\n"
@@ -175,6 +184,105 @@ TEST(Diff, ReportsRawLines)
               "other line, only in the first report: x\n"
               "other line, only in the first report: y\n"
               "other line, only in the second report: z\\x1B\n");
+}
+
+TEST(Diff, LeadsWithWhatMatters)
+{
+    EXPECT_EQ(Diff(Sample(2, 1).GetText(), Sample(2, 1)
+                                                   .Set("Tester", "\"Another\"")
+                                                   .Set("NumGLGPUs", "3")
+                                                   .Set("OGLContextCreated", "0")
+                                                   .Set("glgpu[0].GLMemoryMB", "1")
+                                                   .Set("glgpu[1].GLFrameBufferOK", "0")
+                                                   .Set("clgpu[0].CLBandwidth", "1e+11")
+                                                   .Set("clgpu[0].CLName", "\"B\"")
+                                                   .EndAfter("clgpu[0].CLBandwidth")
+                                                   .GetText() +
+                                               "x\n"),
+              "report: whole -> broken off before clgpu[0].CLCompute "
+              "(1 answer only in the first report)\n"
+              "OGLContextCreated: 1 -> 0\n"
+              "glgpu[1].GLFrameBufferOK: 1 -> 0\n"
+              "NumGLGPUs: 2 -> 3\n"
+              "glgpu[2]: only in the second report\n"
+              "Tester: \"Pixmere\" -> \"Another\"\n"
+              "glgpu[0].GLMemoryMB: 24564 -> 1\n"
+              "clgpu[0].CLName: \"Accelerator 4000\" -> \"B\"\n"
+              "clgpu[0].CLBandwidth: 8.34512e+11 -> 1e+11 (-88 %)\n"
+              "other line, only in the second report: x\n");
+}
+
+// A crash leaves out many keys, whose lines would hide what matters.
+TEST(Diff, HasOneLineForARunThatEndedBefore)
+{
+    const std::string whole = Sample(1, 2).GetText();
+    const auto endAfter = [](const char* key) { return Sample(1, 2).EndAfter(key).GetText(); };
+    EXPECT_EQ(Diff(whole, endAfter("glgpu[0].GLVersion")),
+              "report: whole -> broken off before glgpu[0].IsIntegratedGLGPU "
+              "(60 answers only in the first report)\n");
+    EXPECT_EQ(Diff(endAfter("glgpu[0].GLVersion"), whole),
+              "report: broken off before glgpu[0].IsIntegratedGLGPU -> whole "
+              "(60 answers only in the second report)\n");
+    EXPECT_EQ(Diff(endAfter("glgpu[0].GLVersion"), endAfter("glgpu[0].GLName")),
+              "report: broken off before glgpu[0].IsIntegratedGLGPU -> "
+              "broken off before glgpu[0].GLVendor (3 answers only in the second report)\n");
+    EXPECT_EQ(Diff(whole, ""), "report: whole -> empty (66 answers only in the first report)\n");
+    ComparisonOptions all;
+    all.fAll = true;
+    EXPECT_EQ(DiffWith(Sample(0, 1).GetText(), Sample(0, 1).EndAfter("NumGLGPUs").GetText(), all),
+              "report: whole -> broken off before NumCLGPUs (13 answers only in the first report)\n"
+              "NumCLGPUs: 1 -> missing (run ended before)\n"
+              "clgpu[0] \"Accelerator 4000\": only in the first report\n");
+}
+
+TEST(Diff, HasOneLineForADeviceThatFailed)
+{
+    const std::string good = Sample(1, 0).GetText();
+    const auto failAt = [](const char* key) {
+        return Sample(1, 0).Fail("glgpu[0]", key).GetText();
+    };
+    EXPECT_EQ(Diff(good, failAt("GLName")), "glgpu[0].tests: passed -> failed at GLName "
+                                            "(33 answers only in the first report)\n");
+    EXPECT_EQ(Diff(failAt("GLDriver"), failAt("GLName")),
+              "glgpu[0].tests: failed at GLDriver -> failed at GLName "
+              "(8 answers only in the first report)\n");
+    EXPECT_EQ(Diff(failAt("GLName"), failAt("GLName")), "");
+    ComparisonOptions all;
+    all.fAll = true;
+    EXPECT_EQ(DiffWith(Sample(0, 1).GetText(),
+                       Sample(0, 1).Fail("clgpu[0]", "CLBandwidth").GetText(), all),
+              "clgpu[0].tests: passed -> failed at CLBandwidth "
+              "(2 answers only in the first report)\n"
+              "clgpu[0].CLBandwidth: 8.34512e+11 -> missing (device failed before)\n"
+              "clgpu[0].CLCompute: 1234.56 -> missing (device failed before)\n");
+}
+
+TEST(Diff, ShowsConstantsOnlyIfAsked)
+{
+    ComparisonOptions all;
+    all.fAll = true;
+    const std::string before = "gputag.GL_A=1\na=1\n";
+    const std::string after = "gputag.GL_A=2\na=1\n";
+    EXPECT_EQ(Diff(before, after), "");
+    EXPECT_EQ(DiffWith(before, after, all), "gputag.GL_A: 1 -> 2\n");
+}
+
+TEST(Diff, KeepsWhatIsTheSameIfAsked)
+{
+    ComparisonOptions options;
+    const Report report = ReadReport(Sample(1, 1).GetText());
+    EXPECT_TRUE(CompareReports(report, report, options).fSame.empty());
+    options.fKeepSame = true;
+    const Report other = ReadReport(
+        Sample(1, 1).Set("glgpu[0].GLMemoryMB", "1").Set("clgpu[0].CLCompute", "1234.5").GetText());
+    const Comparison comparison = CompareReports(report, other, options);
+    // All lines but the two time stamps and the memory.
+    EXPECT_EQ(comparison.fSame.size(), report.GetLines().size() - 3);
+    EXPECT_EQ(comparison.fSame.front().fBefore->fKey, "Tester");
+    EXPECT_EQ(comparison.fSame.front().fDevice, nullptr);
+    EXPECT_EQ(comparison.fSame.back().fBefore->fLine->fValue, "1234.56");
+    EXPECT_EQ(comparison.fSame.back().fAfter->fLine->fValue, "1234.5");
+    EXPECT_EQ(comparison.fSame.back().fDevice->fTag, "clgpu[0]");
 }
 
 } // namespace
