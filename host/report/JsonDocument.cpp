@@ -10,6 +10,7 @@
 #include "report/JsonParts.h"
 #include "report/JsonWriter.h"
 #include "report/LineForm.h"
+#include "report/NextSteps.h"
 #include "report/Numbers.h"
 
 namespace assay_host {
@@ -124,6 +125,7 @@ void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& ou
     json.Write("drivers", MakeDrivers(outcome.fDrivers));
     json.Write("usable", MakeUsable(answers, outcome));
     json.Write("warnings", MakeWarnings(GetWarnings(answers, outcome)));
+    json.Write("nextSteps", MakeTexts(GetNextSteps(answers, outcome)));
     WriteReport(json, report, answers, kSchemaVersion);
     json.Close('}');
     out << '\n';

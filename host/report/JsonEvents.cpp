@@ -5,6 +5,7 @@
 #include "report/JsonDocument.h"
 #include "report/JsonFacts.h"
 #include "report/JsonParts.h"
+#include "report/NextSteps.h"
 
 namespace assay_host {
 
@@ -67,6 +68,7 @@ std::string MakeEndEvent(const Answers& answers, const RunOutcome& outcome)
         {"drivers", MakeDrivers(outcome.fDrivers)},
         {"usable", MakeUsable(answers, outcome)},
         {"warnings", MakeWarnings(GetWarnings(answers, outcome))},
+        {"nextSteps", MakeTexts(GetNextSteps(answers, outcome))},
     });
 }
 

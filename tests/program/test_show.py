@@ -1,6 +1,7 @@
 """assay-host show: a stored run in every form. And the forms of one run agree, on every machine whose
 drivers are scripted."""
 
+import html
 import json
 import re
 from html.parser import HTMLParser
@@ -103,9 +104,14 @@ def test_the_forms_agree(tmp_path, name):
                     + (tmp_path / "text").read_text(encoding="utf-8"))
     words = RUNS[verdict, document["report"]["whole"]]
     assert text[""].startswith(f"{words} ---")
-    page = Page(show(stored, "--format", "html").text)
+    shown = show(stored, "--format", "html").text
+    page = Page(shown)
     run = {term: fact for device, term, fact in page.facts if not device}
     assert run["Result"] == words
+    for step in document["nextSteps"]:
+        assert step in text[""]
+        assert f"<li>{step}</li>" in html.unescape(shown)
+    assert ("What to do" in text[""]) == ("What to do" in shown) == bool(document["nextSteps"])
     assert page.spans[:2] == [answers["opengl"][0], answers["opencl"][0]]
     samples = metrics(show(stored, "--format", "prometheus").text)
     assert samples["assay_run_verdict", f'verdict="{verdict}"'] == 1
@@ -117,9 +123,9 @@ def test_the_forms_agree(tmp_path, name):
     assert f"/assay.verdict={verdict}\n" in features
     for api, (answer, device) in answers.items():
         label = {"opengl": "OpenGL", "opencl": "OpenCL"}[api]
-        shown = f"{answer} ({device})" if device else answer
-        assert f"{label} {shown}: " in text[""]
-        assert joined(run[label]).startswith(f"{shown}: ")
+        judged = f"{answer} ({device})" if device else answer
+        assert f"{label} {judged}: " in text[""]
+        assert joined(run[label]).startswith(f"{judged}: ")
         assert samples["assay_usable", f'api="{api}",answer="{answer}"'] == 1
         assert fact[api]["usable"] == answer
         assert f"/assay.{api}.usable={answer}\n" in features

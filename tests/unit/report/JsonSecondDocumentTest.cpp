@@ -10,6 +10,7 @@
 #include "report/JsonDocument.h"
 #include "report/JsonEvents.h"
 #include "report/JsonReader.h"
+#include "report/NextSteps.h"
 
 namespace assay_host {
 namespace {
@@ -59,9 +60,9 @@ std::vector<std::string> Names(const Json& object)
 
 TEST(JsonSecondDocument, HasTheSameMembersInTheSameOrderForEachRun)
 {
-    const std::vector<std::string> names = {"schema",  "versions", "environment",    "command",
-                                            "outcome", "drivers",  "usable",         "warnings",
-                                            "report",  "devices",  "devicesLeftOut", "lines"};
+    const std::vector<std::string> names = {
+        "schema",   "versions",  "environment", "command", "outcome",        "drivers", "usable",
+        "warnings", "nextSteps", "report",      "devices", "devicesLeftOut", "lines"};
     EXPECT_EQ(Names(Document(Sample(1, 1).GetText())), names);
     EXPECT_EQ(Names(Document("", RunOutcome())), names);
     EXPECT_EQ(Document("")["schema"], 2);
@@ -115,6 +116,17 @@ TEST(JsonSecondDocument, HasWarningsAndCauses)
     EXPECT_EQ(document["outcome"]["causes"],
               Json::parse(R"([{"key": "OGLContextCreated", "text": "\uF7FE"}])"));
     EXPECT_EQ(document["devices"][0]["software"], Json::parse(R"({"known": true, "flag": true})"));
+}
+
+TEST(JsonSecondDocument, HasTheNextSteps)
+{
+    EXPECT_EQ(Document(Sample(1, 1).GetText())["nextSteps"], Json::array());
+    const std::string broken = Sample(1, 0).Set("glgpu[0].GLFrameBufferOK", "0").GetText();
+    const RunOutcome outcome = MakeOutcome(Verdict::kComplete);
+    const Report report = ReadReport(broken);
+    const std::vector<std::string> steps = GetNextSteps(GetAnswers(report), outcome);
+    ASSERT_GT(steps.size(), 1U);
+    EXPECT_EQ(Document(broken, outcome)["nextSteps"], Json(steps));
 }
 
 TEST(JsonSecondDocument, HasTheFilesOfDrivers)
@@ -208,12 +220,13 @@ TEST(JsonSecondEvents, HaveTheNewPartsAtStartAndEnd)
     const RunOutcome outcome = MakeOutcome(Verdict::kComplete);
     const Json end = SaveEvent(MakeEndEvent(GetAnswers(report), outcome));
     EXPECT_EQ(Names(end), (std::vector<std::string>{"event", "seconds", "outcome", "drivers",
-                                                    "usable", "warnings"}));
+                                                    "usable", "warnings", "nextSteps"}));
     const Json whole = Document(Sample(1, 1).GetText(), outcome);
     EXPECT_EQ(end["outcome"], whole["outcome"]);
     EXPECT_EQ(end["drivers"], whole["drivers"]);
     EXPECT_EQ(end["usable"], whole["usable"]);
     EXPECT_EQ(end["warnings"], whole["warnings"]);
+    EXPECT_EQ(end["nextSteps"], whole["nextSteps"]);
 
     std::string events = MakeStartEvent({"assay"}, MakeFacts());
     for (const ReportLine& line : report.GetLines())
