@@ -93,13 +93,18 @@ std::string FindUnmetDevices(const Requirement& requirement, const KnownKey& key
     return text;
 }
 
+bool MeetsUsability(const Requirement& requirement, Usability found)
+{
+    const bool isWanted = found == std::get<Usability>(requirement.fWanted);
+    return isWanted == (requirement.fRelation == Relation::kEqual);
+}
+
 std::string FindUnmetFact(const Requirement& requirement, const FactOf& fact,
                           const Answers& answers, const RunOutcome& outcome)
 {
     if (fact.fFact == InterfaceFact::kUsable) {
         const Usable usable = JudgeUsable(fact.fKind, answers, outcome);
-        const auto wanted = std::get<Usability>(requirement.fWanted);
-        if ((usable.fUsability == wanted) == (requirement.fRelation == Relation::kEqual))
+        if (MeetsUsability(requirement, usable.fUsability))
             return {};
         return fmt::format("{} ({})", GetUsabilityName(usable.fUsability), ShowBytes(usable.fText));
     }
@@ -123,6 +128,20 @@ std::string FindUnmet(const Requirement& requirement, const Answers& answers,
     const KnownKey& key = *std::get<const KnownKey*>(requirement.fSubject);
     return key.fKind ? FindUnmetDevices(requirement, key, answers)
                      : FindUnmetValue(requirement, Get(answers.fReport, key));
+}
+
+std::string FindUnmetInMemory(const Requirement& requirement, const RememberedInterface& opengl,
+                              const RememberedInterface& opencl)
+{
+    const auto* const fact = std::get_if<FactOf>(&requirement.fSubject);
+    if (fact == nullptr || fact->fFact != InterfaceFact::kUsable)
+        return "not kept in the state; check without --state";
+    const RememberedInterface& found = fact->fKind == DeviceKind::kOpenGL ? opengl : opencl;
+    if (found.fUsability == Usability::kUnknown)
+        return fmt::format("not known ({})", found.fText);
+    if (MeetsUsability(requirement, found.fUsability))
+        return {};
+    return fmt::format("{} ({})", GetUsabilityName(found.fUsability), found.fText);
 }
 
 } // namespace assay_host

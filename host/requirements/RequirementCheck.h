@@ -1,4 +1,5 @@
-// Holds the answers of a report to requirements. Any thread may call.
+// Holds the answers of a report, or what is remembered of a machine, to requirements. Any thread
+// may call.
 #pragma once
 
 #include <string>
@@ -15,5 +16,15 @@ namespace assay_host {
 // relation.
 std::string FindUnmet(const Requirement& requirement, const Answers& answers,
                       const RunOutcome& outcome);
+
+// What is remembered of an interface.
+struct RememberedInterface {
+    Usability fUsability = Usability::kUnknown;
+    std::string fText; // a sentence on it, safe to write to a terminal
+};
+
+// The same of what is remembered. It has no keys and no devices, so no requirement on them is met.
+std::string FindUnmetInMemory(const Requirement& requirement, const RememberedInterface& opengl,
+                              const RememberedInterface& opencl);
 
 } // namespace assay_host

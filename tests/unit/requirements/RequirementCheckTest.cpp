@@ -127,4 +127,30 @@ TEST(RequirementCheck, NamesTheFirstDevices)
               "glgpu[7] 8 and 2 more");
 }
 
+TEST(RequirementCheck, MemoryHasOnlyWhatCanBeUsed)
+{
+    const RememberedInterface opengl = {Usability::kHardware, "It works."};
+    const RememberedInterface opencl = {Usability::kUnknown, "It was not tried."};
+    const struct {
+        const char* fRequirement;
+        const char* fUnmet;
+    } rows[] = {
+        {"opengl.usable==hardware", ""},
+        {"opengl.usable!=broken", ""},
+        {"opengl.usable!=hardware", "hardware (It works.)"},
+        {"opengl.usable==software", "hardware (It works.)"},
+        {"opengl.usable==unknown", "hardware (It works.)"},
+        {"opencl.usable==hardware", "not known (It was not tried.)"},
+        {"opencl.usable!=hardware", "not known (It was not tried.)"},
+        {"opencl.usable==unknown", "not known (It was not tried.)"},
+        {"opengl.devices>=0", "not kept in the state; check without --state"},
+        {"opencl.devices==0", "not kept in the state; check without --state"},
+        {"NumGLGPUs>=0", "not kept in the state; check without --state"},
+        {"GLVersion>=1", "not kept in the state; check without --state"},
+    };
+    for (const auto& row : rows)
+        EXPECT_EQ(FindUnmetInMemory(ParseRequirement(row.fRequirement), opengl, opencl), row.fUnmet)
+            << row.fRequirement;
+}
+
 } // namespace
