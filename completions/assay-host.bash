@@ -61,7 +61,9 @@ _assay_host() {
     diff) options+=" --tolerance --identity --all" ;;
     explain) ;;
     show) options+=" --format --schema --output" ;;
-    check) options+=" --require --requirements --from --baseline --tolerance --assay --timeout --" ;;
+    check)
+        options+=" --require --requirements --from --state --max-age --baseline --tolerance --assay --timeout --"
+        ;;
     advise)
         options+=" --state --assay --timeout --format --need --wait --max-age --fresh --pause"
         options+=" --pause-growth --retries --forgive --forgive-freeze --keep-absent --keep-unknown"

@@ -1,4 +1,3 @@
-#include <algorithm>
 #include <cstdio>
 #include <memory>
 
@@ -7,6 +6,7 @@
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
+#include "app/PolicyTime.h"
 #include "app/ValueCollector.h"
 #include "identity/Identity.h"
 #include "memory/AdviceForms.h"
@@ -21,13 +21,6 @@
 namespace assay_host {
 
 namespace {
-
-constexpr double kMaxSeconds = 100.0 * 365 * Policy::kDay;
-
-std::int64_t ToSeconds(double count, std::int64_t unit)
-{
-    return static_cast<std::int64_t>(std::min(count * static_cast<double>(unit), kMaxSeconds));
-}
 
 AdviceRequest MakeRequest(const AdviseChoice& choice)
 {

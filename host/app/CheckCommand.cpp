@@ -73,6 +73,8 @@ int CheckRun(const CheckChoice& choice)
 
 int Check(const CheckChoice& choice)
 {
+    if (!choice.fState.empty())
+        return CheckState(choice);
     return choice.fReports.empty() ? CheckRun(choice) : CheckReports(choice);
 }
 

@@ -71,6 +71,8 @@ struct CheckChoice {
     std::vector<std::string> fRequirements;
     std::vector<std::string> fRequirementFiles;
     std::vector<std::string> fReports; // files; empty: run the child
+    std::string fState;                // the folder of advise to check instead; empty: none
+    double fMaxAgeDays = 30;           // of what is in it
     std::string fBaseline;             // a file; empty: none
     double fTolerance = 0.1;           // of the baseline, as MeasurementRule::fTolerance
 };

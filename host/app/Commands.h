@@ -12,6 +12,7 @@ int Diff(const DiffChoice& choice);
 int Show(const ShowChoice& choice);
 int Explain(const ExplainChoice& choice);
 int Check(const CheckChoice& choice);
+int CheckState(const CheckChoice& choice); // what Check() does for a folder of the state
 int Advise(const AdviseChoice& choice);
 int State(const StateChoice& choice);
 

@@ -59,6 +59,9 @@ public:
     Folder(const Folder&) = delete;
     Folder& operator=(const Folder&) = delete;
 
+    // Returns why the folder can't be used; empty if it can.
+    virtual std::string GetProblem() const { return {}; }
+
     virtual FileRead Read(const std::string& name, std::size_t maxBytes) = 0;
 
     // Creates or replaces a file: after a crash or a power loss there is the old one or the new

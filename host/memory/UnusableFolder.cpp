@@ -8,6 +8,7 @@ class UnusableFolder : public Folder {
 public:
     explicit UnusableFolder(const std::string& reason) : fReason(reason) {}
 
+    std::string GetProblem() const override { return fReason; }
     FileRead Read(const std::string& /*name*/, std::size_t /*maxBytes*/) override { return {}; }
     std::string Write(const std::string& /*name*/, const std::string& /*text*/) override
     {

@@ -114,6 +114,8 @@ Options:
   --require TEXT          a requirement; may be repeated
   --requirements FILE     a file of them; may be repeated
   --from FILE             check a stored report instead of a run; may be repeated
+  --state FOLDER          check what advise remembers, without a run
+  --max-age DAYS          what is older there isn't known any more [30]
   --baseline FILE         the report of a good machine, to be as
   --tolerance FRACTION    by which a measurement may be below it [0.1]
   --assay PATH            program to run [beside assay-host, or on the PATH]

@@ -43,6 +43,13 @@ ROWS = [
     ("check --require NumGLGPUs>=1 --from x --assay y", 10, "--assay: ", "only without --from"),
     ("check --require NumGLGPUs>=1 --from x -- -verbose=1", 10, "-verbose=1: ",
      "only without --from"),
+    ("check --require NumGLGPUs>=1 --from x --state y", 10, "--state: ", "only without --from"),
+    ("check --require NumGLGPUs>=1 x --state y", 10, "--state: ", "only without --from"),
+    ("check --require NumGLGPUs>=1 --state y --timeout 3", 10, "--timeout: ", "only without --state"),
+    ("check --baseline x --state y", 10, "--baseline: ", "only without --state"),
+    ("check --require NumGLGPUs>=1 --state y -- -verbose=1", 10, "-verbose=1: ", "only without --state"),
+    ("check --require NumGLGPUs>=1 --max-age 3", 10, "--max-age: ", "only with --state"),
+    ("check --require NumGLGPUs>=1 --state=", 10, "--state: ", "FOLDER missing"),
     ("diff --tolerance -1 a b", 2, "--tolerance: ", NO_NUMBER.format("-1")),
 ]
 

@@ -1,3 +1,5 @@
+#include <initializer_list>
+
 #include "app/options/CommandOptions.h"
 
 namespace assay_host {
@@ -26,6 +28,10 @@ public:
                  "a file of them; may be repeated", "FILE");
         AddTexts(command, "--from", fChoice.fReports,
                  "check a stored report instead of a run; may be repeated", "FILE");
+        AddText(command, "--state", fChoice.fState, "check what advise remembers, without a run",
+                "FOLDER");
+        AddNumber(command, "--max-age", fChoice.fMaxAgeDays,
+                  "what is older there isn't known any more [30]", "DAYS");
         AddText(command, "--baseline", fChoice.fBaseline, "the report of a good machine, to be as",
                 "FILE");
         AddNumber(command, "--tolerance", fChoice.fTolerance,
@@ -44,18 +50,27 @@ public:
         if (command.count("--tolerance") > 0 && fChoice.fBaseline.empty())
             throw CLI::ValidationError("--tolerance", "only with --baseline");
         fChoice.fReports.insert(fChoice.fReports.end(), fReports.begin(), fReports.end());
-        if (!fChoice.fReports.empty()) {
-            for (const char* option : {"--assay", "--timeout"})
-                if (command.count(option) > 0)
-                    throw CLI::ValidationError(option, "only without --from");
-            if (!childWords.empty())
-                throw CLI::ValidationError(childWords.front(), "only without --from");
-        }
+        if (!fChoice.fReports.empty())
+            Refuse(command, {"--state", "--assay", "--timeout"}, childWords, "only without --from");
+        if (!fChoice.fState.empty())
+            Refuse(command, {"--baseline", "--timeout"}, childWords, "only without --state");
+        if (command.count("--max-age") > 0 && fChoice.fState.empty())
+            throw CLI::ValidationError("--max-age", "only with --state");
         fChoice.fChild.fArgs = childWords;
         return fChoice;
     }
 
 private:
+    static void Refuse(const CLI::App& command, std::initializer_list<const char*> options,
+                       const std::vector<std::string>& childWords, const char* reason)
+    {
+        for (const char* option : options)
+            if (command.count(option) > 0)
+                throw CLI::ValidationError(option, reason);
+        if (!childWords.empty())
+            throw CLI::ValidationError(childWords.front(), reason);
+    }
+
     CheckChoice fChoice;
     std::vector<std::string> fReports;
 };

@@ -1,0 +1,60 @@
+// The check of what is remembered, from its options to its status and its output.
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <stdexcept>
+#include <string>
+
+#include "app/Commands.h"
+
+namespace assay_host {
+namespace {
+
+using testing::HasSubstr;
+using testing::ThrowsMessage;
+
+class CheckStateTest : public testing::Test {
+protected:
+    CheckStateTest() { Remove(); }
+    ~CheckStateTest() override { Remove(); }
+
+    int CheckAll(const std::string& requirement)
+    {
+        CheckChoice choice;
+        choice.fRequirements = {requirement};
+        choice.fState = fFolder;
+        testing::internal::CaptureStdout();
+        try {
+            const int status = Check(choice);
+            fText = testing::internal::GetCapturedStdout();
+            return status;
+        } catch (...) {
+            testing::internal::GetCapturedStdout();
+            throw;
+        }
+    }
+
+    void Remove() const { std::filesystem::remove_all(fFolder); }
+
+    const std::string fFolder = testing::TempDir() + "assay-check-state";
+    std::string fText;
+};
+
+TEST_F(CheckStateTest, FailsForAFolderThatIsNotThere)
+{
+    EXPECT_THAT([this] { CheckAll("opengl.usable==hardware"); },
+                ThrowsMessage<std::runtime_error>(HasSubstr(fFolder + ": ")));
+    EXPECT_FALSE(std::filesystem::exists(fFolder));
+}
+
+TEST_F(CheckStateTest, NothingIsMetByAnEmptyFolder)
+{
+    std::filesystem::create_directory(fFolder);
+    EXPECT_EQ(CheckAll("opencl.usable!=broken"), kUnmetStatus);
+    EXPECT_EQ(fText, "not met: opencl.usable!=broken: not known (OpenCL has not been tried.)\n");
+    EXPECT_TRUE(std::filesystem::is_empty(fFolder));
+}
+
+} // namespace
+} // namespace assay_host
