@@ -294,9 +294,10 @@ TEST(LibraryAdvice, LeavesNothing)
         assay_host_options_add_argument(options, word.c_str());
     call();
     const Counts before = CountThings();
-    for (int count = 0; count < 5; ++count)
+    constexpr int kCalls = 5;
+    for (int count = 0; count < kCalls; ++count)
         call();
-    EXPECT_EQ(CountAfter(before), before);
+    EXPECT_EQ(CountAfter(kCalls, before), before);
 }
 
 TEST(LibraryAdvice, ArgumentsOutOfRange)

@@ -197,7 +197,7 @@ void ExpectNoGrowth(int runsOfEach)
     const Counts before = CountThings();
     const long memory = GetMemoryKiB();
     EXPECT_EQ(RunByEightThreads(runsOfEach), 8 * runsOfEach);
-    EXPECT_EQ(CountAfter(before), before);
+    EXPECT_EQ(CountAfter(8 * runsOfEach, before), before);
 #if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__) // they keep freed memory
     EXPECT_LE(GetMemoryKiB() - memory, kMaxGrowth) << "of memory in KiB";
 #else
@@ -210,7 +210,7 @@ TEST(LibraryRun, EightAtOnceLeaveNothing)
     EXPECT_EQ(RunByEightThreads(1), 8);
     const Counts before = CountThings();
     EXPECT_EQ(RunByEightThreads(4), 32);
-    EXPECT_EQ(CountAfter(before), before);
+    EXPECT_EQ(CountAfter(32, before), before);
 }
 
 TEST(LibraryRun, AThousandByEightThreadsLeaveNothing)
@@ -233,9 +233,10 @@ TEST(LibraryRun, ManyInARowLeaveNothing)
         runOnce();
     const Counts before = CountThings();
     const long memory = GetMemoryKiB();
-    for (int run = 0; run < (isLong ? 1000 : 50); ++run)
+    const int runs = isLong ? 1000 : 50;
+    for (int run = 0; run < runs; ++run)
         runOnce();
-    EXPECT_EQ(CountAfter(before), before);
+    EXPECT_EQ(CountAfter(runs, before), before);
 #if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__) // they keep freed memory
     EXPECT_LE(GetMemoryKiB() - memory, 1024) << "of memory in KiB";
 #else

@@ -23,6 +23,11 @@ long CountOpenThings()
     return count;
 }
 
+long GetMaxGrowth(long runs)
+{
+    return runs > 0 ? runs - 1 : 0;
+}
+
 long CountThreads()
 {
     const HANDLE threads = ::CreateToolhelp32Snapshot(TH32CS_SNAPTHREAD, 0);
