@@ -1,7 +1,7 @@
 // The folder of the state: small files that are replaced as a whole.
 //
-// Only files of the user that this process runs as are touched. A link and a file that other users
-// can change are refused.
+// Only files of the user that this process runs as are touched. A link is refused, and on Linux a
+// file that other users can change.
 #pragma once
 
 #include <cstddef>

@@ -8,6 +8,8 @@
 #include <boost/filesystem/path.hpp>
 #include <boost/nowide/convert.hpp>
 
+#include "memory/win/Owner.h"
+
 namespace assay_host {
 
 namespace {
@@ -69,7 +71,7 @@ std::string CheckFile(HANDLE file)
         return "it is a link";
     if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0)
         return "it is not a file";
-    return {};
+    return CheckOwner(file);
 }
 
 class SystemFolder : public Folder {
@@ -199,6 +201,12 @@ std::unique_ptr<Folder> OpenFolder(const std::string& path, FolderUse use)
         return MakeUnusableFolder(GetReason(::GetLastError()));
     if ((attributes & FILE_ATTRIBUTE_DIRECTORY) == 0)
         return MakeUnusableFolder(GetReason(ERROR_DIRECTORY));
+    const Handle opened(::CreateFileW(folder.c_str(), READ_CONTROL, kShareAll, nullptr,
+                                      OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS, nullptr));
+    if (!opened.IsOpen())
+        return MakeUnusableFolder(GetReason(::GetLastError()));
+    if (const std::string reason = CheckOwner(opened.Get()); !reason.empty())
+        return MakeUnusableFolder(reason);
     return std::make_unique<SystemFolder>(folder);
 }
 

@@ -34,7 +34,7 @@ LEFT_OUT = {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
         "unit/identity", "unit/launch", "unit/library", "unit/pmutil", "unit/supervise"},
-    "the owners and links of files, which Windows has in another way": {"unit/memory"},
+    "the modes and links of files, which Windows has in another way": {"unit/memory"},
     "Linux's own files, shells and terminals": {
         "program/test_completions", "program/test_hardening", "unit/facts", "unit/output"},
     "there is no Python and no Node for Windows here": {"examples/decide.py", "examples/decide.js"},
