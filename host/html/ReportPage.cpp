@@ -1,17 +1,15 @@
 #include "html/ReportPage.h"
 
 #include <algorithm>
-#include <iterator>
-#include <streambuf>
 #include <string>
 #include <vector>
 
 #include <fmt/format.h>
 
-#include "html/Assets.h"
 #include "html/BarChart.h"
 #include "html/DeviceCard.h"
 #include "html/Markup.h"
+#include "html/Page.h"
 #include "report/Answers.h"
 #include "report/Bytes.h"
 #include "report/Explanations.h"
@@ -27,79 +25,31 @@ namespace assay_host {
 
 namespace {
 
-// Passes JSON on in a form that can't end the element around it: "<" only occurs in its strings.
-class ScriptBuffer : public std::streambuf {
-public:
-    explicit ScriptBuffer(std::ostream& out) : fOut(out) {}
-
-protected:
-    int_type overflow(int_type character) override
-    {
-        if (traits_type::eq_int_type(character, traits_type::eof()))
-            return traits_type::not_eof(character);
-        const char byte = traits_type::to_char_type(character);
-        return xsputn(&byte, 1) == 1 ? character : traits_type::eof();
-    }
-
-    std::streamsize xsputn(const char* bytes, std::streamsize count) override
-    {
-        std::string_view rest(bytes, static_cast<std::size_t>(count));
-        while (!rest.empty()) {
-            const std::size_t at = std::min(rest.find('<'), rest.size());
-            fOut << rest.substr(0, at);
-            if (at < rest.size())
-                fOut << "\\u003C";
-            rest.remove_prefix(std::min(at + 1, rest.size()));
-        }
-        return count;
-    }
-
-private:
-    std::ostream& fOut;
-};
-
 class ReportPage {
 public:
-    ReportPage(std::ostream& out, const Report& report, const RunOutcome& outcome,
-               const RunFacts& facts)
-        : fPage(out),
+    ReportPage(Markup& page, const Report& report, const RunOutcome& outcome, const RunFacts& facts)
+        : fPage(page),
           fReport(report),
           fOutcome(outcome),
           fFacts(facts),
           fAnswers(GetAnswers(report))
     {}
 
-    void Write()
+    void Add()
     {
-        fPage.AddRaw("<!DOCTYPE html>\n");
-        const Element html(fPage, "html", {{"lang", "en"}});
-        AddHead();
-        const Element body(fPage, "body");
         AddHeader();
         AddMain();
-        AddFooter();
-        // After all else, so that a reader waits for nothing.
-        AddJson();
+    }
+
+    // What the run shows. A whole report says nothing about what a host can do with the machine.
+    std::string GetHeadline() const
+    {
+        return fOutcome.fVerdict == Verdict::kComplete
+                   ? JudgeUsable(DeviceKind::kOpenGL, fAnswers, fOutcome).fText
+                   : ShowBytes(fOutcome.fReason);
     }
 
 private:
-    void AddHead()
-    {
-        const Element head(fPage, "head");
-        fPage.AddVoid("meta", {{"charset", "utf-8"}});
-        fPage.AddVoid(
-            "meta",
-            {{"http-equiv", "Content-Security-Policy"},
-             {"content", fmt::format("default-src 'none'; style-src 'unsafe-inline'; script-src "
-                                     "'{}'; base-uri 'none'; form-action 'none'",
-                                     kCopyScriptHash)}});
-        fPage.AddVoid("meta",
-                      {{"name", "viewport"}, {"content", "width=device-width, initial-scale=1"}});
-        fPage.Add("title", "assay: " + GetHeadline());
-        const Element style(fPage, "style");
-        fPage.AddRaw(kPageStyle);
-    }
-
     void AddHeader()
     {
         const Element header(fPage, "header");
@@ -116,29 +66,11 @@ private:
                     "{}: {}", usable.fTag.empty() ? "" : " (" + usable.fTag + ")", usable.fText));
             }
         }
-        AddList("What to do", GetNextSteps(fAnswers, fOutcome));
+        AddList(fPage, "h2", "What to do", GetNextSteps(fAnswers, fOutcome));
         std::vector<std::string> warnings;
         for (const Warning& warning : GetWarnings(fAnswers, fOutcome))
             warnings.push_back(GetWarningText(warning));
-        AddList("Warnings", warnings);
-    }
-
-    // What the run shows. A whole report says nothing about what a host can do with the machine.
-    std::string GetHeadline() const
-    {
-        return fOutcome.fVerdict == Verdict::kComplete
-                   ? JudgeUsable(DeviceKind::kOpenGL, fAnswers, fOutcome).fText
-                   : ShowBytes(fOutcome.fReason);
-    }
-
-    void AddList(const char* title, const std::vector<std::string>& items)
-    {
-        if (items.empty())
-            return;
-        fPage.Add("h2", title);
-        const Element list(fPage, "ul");
-        for (const std::string& item : items)
-            fPage.Add("li", item);
+        AddList(fPage, "h2", "Warnings", warnings);
     }
 
     void AddMain()
@@ -273,28 +205,7 @@ private:
         }
     }
 
-    void AddFooter()
-    {
-        const Element footer(fPage, "footer");
-        const Element line(fPage, "p", {{"class", "soft"}});
-        fPage.AddText("Made by assay-host. ");
-        fPage.Add("button", "Copy as JSON", {{"id", "copy"}, {"hidden", ""}});
-        fPage.Add("span", "", {{"id", "copied"}, {"role", "status"}});
-    }
-
-    void AddJson()
-    {
-        {
-            const Element json(fPage, "script", {{"type", "application/json"}, {"id", "json"}});
-            ScriptBuffer buffer(fPage.GetStream());
-            std::ostream document(&buffer);
-            WriteDocument(document, fReport, fOutcome, fFacts);
-        }
-        const Element script(fPage, "script");
-        fPage.AddRaw(kCopyScript);
-    }
-
-    Markup fPage;
+    Markup& fPage;
     const Report& fReport;
     const RunOutcome& fOutcome;
     const RunFacts& fFacts;
@@ -306,7 +217,11 @@ private:
 void WriteReportPage(std::ostream& out, const Report& report, const RunOutcome& outcome,
                      const RunFacts& facts)
 {
-    ReportPage(out, report, outcome, facts).Write();
+    Markup page(out);
+    ReportPage content(page, report, outcome, facts);
+    WritePage(
+        page, "assay: " + content.GetHeadline(), [&] { content.Add(); },
+        [&](std::ostream& json) { WriteDocument(json, report, outcome, facts); });
 }
 
 } // namespace assay_host
