@@ -6,7 +6,7 @@
 
 #include "app/Commands.h"
 #include "app/FindAssay.h"
-#include "app/PolicyTime.h"
+#include "app/MakeAdviceRequest.h"
 #include "app/ValueCollector.h"
 #include "identity/Identity.h"
 #include "memory/AdviceForms.h"
@@ -21,26 +21,6 @@
 namespace assay_host {
 
 namespace {
-
-AdviceRequest MakeRequest(const AdviseChoice& choice)
-{
-    AdviceRequest request;
-    request.fNeedsOpenGL = choice.fNeed != Need::kOpenCL;
-    request.fNeedsOpenCL = choice.fNeed != Need::kOpenGL;
-    request.fFresh = choice.fFresh;
-    request.fWaitSeconds = choice.fWaitSeconds;
-    request.fPolicy.fMaxAge = ToSeconds(choice.fMaxAgeDays, Policy::kDay);
-    request.fPolicy.fFirstPause = ToSeconds(choice.fPauseSeconds, 1);
-    request.fPolicy.fRetries = choice.fRetries;
-    request.fPolicy.fForgiven = ToSeconds(choice.fForgiveDays, Policy::kDay);
-    request.fPolicy.fAbsentKept = ToSeconds(choice.fKeepAbsentSeconds, 1);
-    request.fPolicy.fUnknownKept = ToSeconds(choice.fKeepUnknownSeconds, 1);
-    request.fPolicy.fPauseGrowth = choice.fPauseGrowth;
-    request.fPolicy.fFreezeForgiven = ToSeconds(choice.fForgiveFreezeDays, Policy::kDay);
-    request.fPolicy.fMaxUnclear = choice.fUnclear;
-    request.fPolicy.fUnclearPause = ToSeconds(choice.fUnclearPauseSeconds, 1);
-    return request;
-}
 
 // Waits and tries with the guardian and the interrupts of a run.
 Advice TryWatched(Adviser& adviser, Machine& machine, const AdviseChoice& choice)
@@ -87,7 +67,7 @@ int Advise(const AdviseChoice& choice)
     const std::unique_ptr<Folder> folder =
         OpenFolder(choice.fState, choice.fDryRun ? FolderUse::kRead : FolderUse::kWrite);
     const std::unique_ptr<Machine> machine = MakeSystemMachine();
-    const AdviceRequest request = MakeRequest(choice);
+    const AdviceRequest request = MakeAdviceRequest(choice);
     Adviser adviser(*folder, *machine, identity, request);
     Advice advice = adviser.Recall();
     if (!choice.fDryRun && (advice.fPlan != Plan::kAnswer || advice.fIsOpen))
