@@ -7,16 +7,21 @@
 
 namespace assay_host {
 
-std::string FindDefaultProgram()
+std::string FindProgramIn(const std::vector<boost::filesystem::path>& folders)
 {
-    const boost::filesystem::path folder = GetOwnFile().parent_path();
-    for (const char* place : {".", ASSAY_PROGRAMS_FROM_LIBRARY}) {
-        const boost::filesystem::path program = folder / place / ASSAY_PROGRAM_NAME;
+    for (const boost::filesystem::path& folder : folders) {
+        const boost::filesystem::path program = folder / ASSAY_PROGRAM_NAME;
         boost::system::error_code error;
         if (boost::filesystem::is_regular_file(program, error))
             return ToText(program.lexically_normal());
     }
-    return ToText(folder / ASSAY_PROGRAM_NAME);
+    return ToText(folders.front() / ASSAY_PROGRAM_NAME);
+}
+
+std::string FindDefaultProgram()
+{
+    const boost::filesystem::path folder = GetOwnFile().parent_path();
+    return FindProgramIn({folder, folder / ASSAY_PROGRAMS_FROM_LIBRARY});
 }
 
 } // namespace assay_host

@@ -2,11 +2,17 @@
 #pragma once
 
 #include <string>
+#include <vector>
+
+#include <boost/filesystem/path.hpp>
 
 namespace assay_host {
 
-// Returns the path of the assay beside GetOwnFile(), or in the folder of programs of the same
-// installation, in UTF-8. If there is neither, the path beside it, for the error message.
+// Returns the path, in UTF-8, of the assay in the first of these folders that has one. If none has
+// one, the path in the first of them, for the error message.
+std::string FindProgramIn(const std::vector<boost::filesystem::path>& folders);
+
+// The same for the folder of GetOwnFile() and the folder of programs of the same installation.
 std::string FindDefaultProgram();
 
 } // namespace assay_host

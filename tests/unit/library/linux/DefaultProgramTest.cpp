@@ -4,9 +4,13 @@
 #include <nlohmann/json.hpp>
 
 #include <filesystem>
+#include <fstream>
 #include <string>
 
+#include <stdlib.h>
+
 #include "Runs.h"
+#include "library/DefaultProgram.h"
 
 namespace {
 
@@ -29,6 +33,26 @@ TEST(LibraryProgram, IsTheOneOfTheLibrarysInstallation)
     EXPECT_EQ(json["versions"]["assay"]["value"], ASSAY_VERSION);
     assay_host_result_free(result);
     assay_host_options_free(options);
+}
+
+TEST(LibraryProgram, IsInTheFirstFolderThatHasOne)
+{
+    std::string root = (fs::temp_directory_path() / "program-XXXXXX").string();
+    ASSERT_NE(::mkdtemp(root.data()), nullptr);
+    const std::string first = root + "/lib";
+    const std::string second = root + "/bin";
+    const auto find = [&] { return assay_host::FindProgramIn({first, first + "/../bin"}); };
+    fs::create_directory(first);
+    fs::create_directory(second);
+    EXPECT_EQ(find(), first + "/assay") << "there is none";
+    std::ofstream(second + "/assay").flush();
+    EXPECT_EQ(find(), second + "/assay");
+    fs::create_directory(first + "/assay");
+    EXPECT_EQ(find(), second + "/assay") << "a folder is no program";
+    fs::remove(first + "/assay");
+    std::ofstream(first + "/assay").flush();
+    EXPECT_EQ(find(), first + "/assay");
+    fs::remove_all(root);
 }
 
 } // namespace
