@@ -107,18 +107,23 @@ private:
 };
 
 // Calls on a thread of its own, and interrupts it many times, each time once it has handled the
-// last signal, before `release` lets the call return.
+// last signal. Then `release` lets the call return.
 template <typename Call, typename Release>
 void Interrupt(Call call, Release release)
 {
     const CountedSignal counted;
-    std::thread thread(call);
-    for (int shot = 0; shot < 200; ++shot) {
+    std::atomic<bool> isOver{false};
+    std::thread thread([&] {
+        call();
+        isOver = true;
+    });
+    for (int shot = 0; shot < 200 && !isOver; ++shot) {
         const int before = gSignals;
         ::pthread_kill(thread.native_handle(), SIGUSR1);
-        while (gSignals == before)
+        while (gSignals == before && !isOver)
             ::sched_yield();
     }
+    EXPECT_FALSE(isOver) << "a signal ended the call";
     release();
     thread.join();
 }
