@@ -176,7 +176,14 @@ protected:
         return outcome;
     }
 
-    void OnStart() override { fShortWait.emplace(0); }
+    void OnStart() override
+    {
+        fShortWait.emplace(0);
+        if (fOnStart)
+            fOnStart();
+    }
+
+    void OnTick(double /*seconds*/) override { fHasTicked = true; }
 
     void PassTheTimeout() { fNow += std::chrono::seconds(30); }
 
@@ -195,7 +202,9 @@ protected:
     pmutil::StopRequest fStop;
     RunTimes fTimes;
     RunTimes::Clock::time_point fNow{std::chrono::seconds(1)};
+    std::function<void()> fOnStart;
     std::function<void()> fOnLine;
+    bool fHasTicked = false;
     std::optional<pmutil::ShortWait> fShortWait;
     std::vector<std::string> fLines;
 };
@@ -211,6 +220,28 @@ TEST_F(ChildRunQueue, WhatItHoldsAtTheEndIsTaken)
     EXPECT_EQ(Run().fVerdict, Verdict::kHung);
     EXPECT_EQ(fLines, (std::vector<std::string>{"first=1", "second=2"}));
     EXPECT_EQ(fLauncher->CountKills(), 1);
+}
+
+// Ticks that are rarer than all that happens: only the child's end lets the first one come.
+TEST_F(ChildRunQueue, WhatComesAfterTheChildsEndIsTaken)
+{
+    constexpr std::chrono::hours kTick{1};
+    fOptions.fTimeoutSeconds = 0;
+    fTimes.fTick = kTick;
+    fTimes.fStreamGrace = 1000 * kTick;
+    bool hasFed = false;
+    fTimes.fNow = [&] {
+        if (fHasTicked && !hasFed) {
+            hasFed = true;
+            fLauncher->fOut->Feed("late=1\n");
+            fLauncher->fOut->End();
+            fLauncher->fErr->End();
+        }
+        return fNow += 2 * kTick;
+    };
+    fOnStart = [this] { fLauncher->End(); };
+    EXPECT_FALSE(Run().fLeftBehind);
+    EXPECT_EQ(fLines, std::vector<std::string>{"late=1"});
 }
 
 TEST_F(ChildRunQueue, ARunThatIsOverKeepsNobodyWaiting)
