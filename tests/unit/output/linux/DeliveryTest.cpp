@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <condition_variable>
+#include <cstdio>
 #include <cstdlib>
 #include <mutex>
 #include <string>
@@ -29,7 +30,7 @@ public:
         fCond.wait(lock, [] { return false; });
     }
     void Finish() override {}
-    void Abandon() override {}
+    void Abandon() override { std::fputs("abandoned\n", stderr); }
 
 private:
     std::mutex fMutex;
@@ -85,14 +86,14 @@ TEST_F(DeliveryTest, AfterAnInterruptWaitsForAReaderThatReads)
 TEST_F(DeliveryTest, AfterAnInterruptGivesUpAReaderThatDoesNotRead)
 {
     EXPECT_EXIT(Deliver(std::make_unique<StuckOutput>(), 1, milliseconds(1)),
-                testing::ExitedWithCode(kInterruptedStatus), "");
+                testing::ExitedWithCode(kInterruptedStatus), "^abandoned\n$");
 }
 
 TEST_F(DeliveryTest, AfterMoreInterruptsDoesNotWait)
 {
     for (const int interrupts : {2, 3})
         EXPECT_EXIT(Deliver(std::make_unique<StuckOutput>(), interrupts, kLongPatience),
-                    testing::ExitedWithCode(kInterruptedStatus), "");
+                    testing::ExitedWithCode(kInterruptedStatus), "^abandoned\n$");
 }
 
 TEST_F(DeliveryTest, EndsAtAnInterruptThatComesLater)
@@ -104,7 +105,7 @@ TEST_F(DeliveryTest, EndsAtAnInterruptThatComesLater)
             const Delivery delivery(writer);
             NoteInterrupt();
         },
-        testing::ExitedWithCode(kInterruptedStatus), "");
+        testing::ExitedWithCode(kInterruptedStatus), "^abandoned\n$");
 }
 
 } // namespace
