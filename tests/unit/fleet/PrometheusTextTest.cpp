@@ -130,6 +130,33 @@ TEST(PrometheusText, HasHelpAndTypeOfEachMetric)
     EXPECT_EQ(seen.size(), 16U);
 }
 
+TEST(PrometheusText, SaysWhatEachMetricIs)
+{
+    std::vector<std::string> help;
+    for (const std::string& line : Split(GetText(Sample(1, 1).GetText())))
+        if (line.rfind("# HELP assay_", 0) == 0)
+            help.push_back(line.substr(13));
+    EXPECT_THAT(
+        help,
+        testing::ElementsAre(
+            "build_info Versions of the programs; always 1.",
+            "last_run_timestamp_seconds Start of the last run, since 1970 in UTC.",
+            "last_run_duration_seconds Time from the child's launch to its end.",
+            "run_verdict How the last run ended: 1 for its verdict, 0 for the others.",
+            "usable Whether the interface can be used: 1 for the answer, 0 for the others.",
+            "warnings Number of warnings of the last run.",
+            "devices Number of devices of the interface.",
+            "device_info Texts that describe a device; always 1.",
+            "device_failed Whether a test of the device failed.",
+            "device_software Whether the device is a software renderer.",
+            "device_integrated Whether the device is part of the processor.",
+            "device_shaders_compile Whether a realistic pair of shaders compiles and links.",
+            "device_framebuffers_work Whether a framebuffer object can be created and drawn to.",
+            "memory_bytes Memory of the device.",
+            "copy_bytes_per_second Measured speed of copies within the device.",
+            "compute_score Measured speed of computation; more is faster."));
+}
+
 TEST(PrometheusText, LeavesOutWhatIsNotKnown)
 {
     const std::string text = GetText(Sample(1, 1)

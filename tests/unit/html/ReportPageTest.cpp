@@ -18,6 +18,8 @@ RunFacts MakeFacts()
     facts.fHostVersion = "1.0.0";
     facts.fChildVersion = {"1.0.0", ""};
     facts.fEnvironment.fSystem = {"Example <OS>", ""};
+    facts.fEnvironment.fBuild = {"12.8", ""};
+    facts.fEnvironment.fArchitecture = {"x86_64", ""};
     facts.fEnvironment.fKernel = {"", "the kernel does not say it"};
     facts.fEnvironment.fHost = {"", "only with --identify"};
     facts.fEnvironment.fTime = "2026-11-22T01:26:02Z";
@@ -81,6 +83,49 @@ TEST(ReportPage, OfAGoodMachine)
     EXPECT_TRUE(Has(page, "<dt>Version of assay</dt>\n<dd>1.0.0</dd>"));
     EXPECT_TRUE(Has(page, "NumGLGPUs=1\n"));
     EXPECT_EQ(page.substr(page.size() - 8), "</html>\n");
+}
+
+TEST(ReportPage, LoadsNothingAndFitsSmallScreens)
+{
+    const std::string page = WritePage(Sample(1, 1).GetText(), MakeOutcome(Verdict::kComplete));
+    EXPECT_TRUE(Has(page, std::string("<!DOCTYPE html>\n<html lang=\"en\"><head>"
+                                      "<meta charset=\"utf-8\">\n"
+                                      "<meta http-equiv=\"Content-Security-Policy\" "
+                                      "content=\"default-src &#39;none&#39;; style-src "
+                                      "&#39;unsafe-inline&#39;; "
+                                      "script-src &#39;") +
+                              std::string(kCopyScriptHash) +
+                              "&#39;; base-uri &#39;none&#39;; form-action &#39;none&#39;\">\n"
+                              "<meta name=\"viewport\" "
+                              "content=\"width=device-width, initial-scale=1\">\n"))
+        << page.substr(0, 1000);
+}
+
+TEST(ReportPage, EndsWithAButtonThatCopies)
+{
+    const std::string page = WritePage(Sample(1, 1).GetText(), MakeOutcome(Verdict::kComplete));
+    EXPECT_TRUE(Has(page, "<footer><p class=\"soft\">Made by assay-host. "
+                          "<button id=\"copy\" hidden=\"\">Copy as JSON</button>\n"
+                          "<span id=\"copied\" role=\"status\"></span></p>\n</footer>\n"
+                          "<script type=\"application/json\" id=\"json\">"))
+        << page.substr(page.find("<footer>"), 400);
+}
+
+TEST(ReportPage, HasAllPartsOfARun)
+{
+    const std::string page = WritePage(Sample(1, 1).GetText(), MakeOutcome(Verdict::kComplete));
+    for (const char* part :
+         {"<h2>The run</h2>", "<dt>Verdict</dt>\n<dd>complete</dd>", "<dt>What happened</dt>",
+          "<dt>Exit status</dt>\n<dd>0</dd>", "<dt>Command</dt>", "<dt>Time taken</dt>",
+          "<dt>Devices</dt>", "<dt>Build</dt>\n<dd>12.8</dd>",
+          "<dt>Architecture</dt>\n<dd>x86_64</dd>",
+          "<dt>When</dt>\n<dd>2026-11-22T01:26:02Z (local time +01:00)</dd>",
+          "<dt>Version of assay-host</dt>\n<dd>1.0.0</dd>", "<h2>Measurements</h2>",
+          "<summary>What the terms mean</summary>", "<dt>OpenGL: Shaders compile</dt>",
+          "<summary>Report lines (", "<div class=\"devices\"><article"})
+        EXPECT_TRUE(Has(page, part)) << part;
+    for (const char* part : {"Last report line", "Last log line", "Next to report"})
+        EXPECT_FALSE(Has(page, part)) << part;
 }
 
 TEST(ReportPage, OfACrash)

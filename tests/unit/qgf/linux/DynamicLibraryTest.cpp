@@ -1,5 +1,9 @@
 #include <gtest/gtest.h>
 
+#include <string>
+
+#include <dlfcn.h>
+
 #include "qgf/Core.h"
 
 namespace {
@@ -13,6 +17,45 @@ TEST(OpenLibrary, OpensTheFirstThatExists)
     ASSERT_NE(function, nullptr);
     EXPECT_EQ(function(1.5), 1.0);
     EXPECT_EQ(library->getProc("no_such_function"), nullptr);
+}
+
+std::string FailToOpen(const char* const* names)
+{
+    try {
+        QGF::Core::OpenLibrary(names);
+    } catch (const QGF::LogicalException& failure) {
+        return failure.what();
+    }
+    return {};
+}
+
+TEST(OpenLibrary, NamesEachThatCannotBeOpened)
+{
+    const char* const none[] = {nullptr};
+    EXPECT_EQ(FailToOpen(none), "No library was named");
+    const char* const names[] = {"no-such-1.so", "no-such-2.so", nullptr};
+    const std::string reason = ": cannot open shared object file: No such file or directory)";
+    EXPECT_EQ(FailToOpen(names), "no-such-1.so can't be opened (no-such-1.so" + reason +
+                                     "; no-such-2.so can't be opened (no-such-2.so" + reason);
+}
+
+// Only the first open counts: the library stays while there is an object of it.
+TEST(OpenLibrary, ClosesItAtTheEnd)
+{
+    const char* const names[] = {"libanl.so.1", nullptr};
+    const auto isLoaded = [&] {
+        void* const handle = dlopen(names[0], RTLD_LAZY | RTLD_NOLOAD);
+        if (handle != nullptr)
+            dlclose(handle);
+        return handle != nullptr;
+    };
+    if (isLoaded())
+        GTEST_SKIP() << "the test program has it already";
+    {
+        const auto library = QGF::Core::OpenLibrary(names);
+        EXPECT_TRUE(isLoaded());
+    }
+    EXPECT_FALSE(isLoaded());
 }
 
 } // namespace
