@@ -7,6 +7,7 @@
 #include <tuple>
 #include <vector>
 
+#include "MachineTree.h"
 #include "identity/linux/Adapters.h"
 #include "identity/linux/Machine.h"
 #include "support/AdapterTree.h"
@@ -98,6 +99,20 @@ TEST(IdentityAdapters, AreAlsoThoseThatAreNotOnPci)
                                                "platform/ff9a0000.gpu 0:0 panfrost \n");
     EXPECT_EQ(PrintAdapters("usb-display"), "0000:00:02.0 8086:46a6 i915 \n"
                                             "pci0000:00/0000:00:14.0/usb1/1-2/1-2:1.0 0:0 udl \n");
+}
+
+// The driver of one module may have another name, and one that is built in has no module.
+TEST(IdentityAdapters, HaveTheModuleOfTheirDriver)
+{
+    const MachineTree tree;
+    const std::string card = "/sys/bus/pci/devices/0000:01:00.0/";
+    const auto print = [&] { return Print(GetMachineIdentity(tree.GetFiles(), {}).fAdapters); };
+    tree.Write(card + "class", "0x030200\n");
+    tree.Link(card + "driver", "../../drivers/card-driver");
+    EXPECT_EQ(print(), "0000:01:00.0 0:0 card-driver \n");
+    tree.Link("/sys/bus/pci/drivers/card-driver/module", "../../../../module/card_module");
+    tree.Write("/sys/module/card_module/version", "1.2\n");
+    EXPECT_EQ(print(), "0000:01:00.0 0:0 card_module 1.2\n");
 }
 
 TEST(IdentityAdapters, AreNoFramebuffersOfTheFirmware)

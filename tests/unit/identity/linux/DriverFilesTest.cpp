@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <chrono>
 #include <filesystem>
+#include <map>
 #include <string>
 #include <vector>
 
@@ -197,6 +198,27 @@ TEST_F(DriverFilesTest, AreThoseThatTheEnvironmentNamesForEGL)
     fProcess.fVariables = {{"LD_LIBRARY_PATH", "/home"}};
     EXPECT_TRUE(Has("/home/libEGL.so.1"));
     EXPECT_FALSE(Has("/usr/lib/libEGL.so.1.1.0"));
+}
+
+TEST_F(DriverFilesTest, AreThoseOfEachFolderOfLists)
+{
+    fTree.Write("/opt/libx.so", MakeLibrary());
+    for (const std::string folder :
+         {"/etc/glvnd/egl_vendor.d", "/usr/share/glvnd/egl_vendor.d",
+          "/etc/egl/egl_external_platform.d", "/usr/share/egl/egl_external_platform.d"}) {
+        EXPECT_FALSE(Has("/opt/libx.so"));
+        fTree.Write(folder + "/20_x.json", MakeVendor("/opt/libx.so"));
+        EXPECT_TRUE(Has("/opt/libx.so")) << folder;
+        fTree.Remove(folder + "/20_x.json");
+    }
+    fTree.Write("/home/x.json", MakeVendor("/opt/libx.so"));
+    for (const auto& [name, value] : std::map<std::string, std::string>{
+             {"__EGL_EXTERNAL_PLATFORM_CONFIG_FILENAMES", "/home/x.json"},
+             {"__EGL_EXTERNAL_PLATFORM_CONFIG_DIRS", "/home"}}) {
+        fProcess.fVariables = {{name, value}};
+        EXPECT_TRUE(Has("/opt/libx.so")) << name;
+        EXPECT_TRUE(Has("/usr/lib/libEGL_mesa.so.0")) << "that list is another one";
+    }
 }
 
 TEST_F(DriverFilesTest, AreThoseThatTheEnvironmentNamesForOpenCL)

@@ -57,6 +57,36 @@ TEST(ElfFile, IsEmptyForAnotherFile)
     EXPECT_EQ(Read(other).fBuildId, "");
 }
 
+TEST(ElfFile, HasAtMost256Names)
+{
+    FakeElf fake;
+    fake.fNeeded = Names(256, "libx.so");
+    EXPECT_EQ(Read(fake.Make()).fNeeded, fake.fNeeded);
+    fake.fNeeded.emplace_back("libmore.so");
+    EXPECT_EQ(Read(fake.Make()).fNeeded, Names(256, "libx.so"));
+}
+
+// The table of the names is the last entry.
+TEST(ElfFile, HasAtMost1024Entries)
+{
+    FakeElf fake;
+    fake.fNeeded = Names(1023, "libx.so");
+    EXPECT_EQ(Read(fake.Make()).fNeeded.size(), 256U);
+    fake.fNeeded.emplace_back("libx.so");
+    EXPECT_EQ(Read(fake.Make()).fNeeded, Names());
+}
+
+TEST(ElfFile, HasNamesOfLessThan4096Bytes)
+{
+    FakeElf fake;
+    for (const std::size_t size : {127U, 128U, 4095U}) {
+        fake.fNeeded = {std::string(size, 'x')};
+        EXPECT_EQ(Read(fake.Make()).fNeeded, fake.fNeeded) << size;
+    }
+    fake.fNeeded = {std::string(4096, 'x'), "libx.so"};
+    EXPECT_EQ(Read(fake.Make()).fNeeded, (Names{"", "libx.so"}));
+}
+
 // What is left of the file is read; nothing beyond its end.
 TEST(ElfFile, MayBeCutAnywhere)
 {

@@ -111,6 +111,25 @@ TEST_F(LibrarySearchTest, TakesANameWithASlashForAPath)
     EXPECT_EQ(Find("libx.so"), Names{"/home/me/libx.so"});
 }
 
+TEST_F(LibrarySearchTest, LooksLastInTheFoldersOfTheSystem)
+{
+#if defined(__x86_64__)
+    const std::string machine = "x86_64-linux-gnu";
+#elif defined(__aarch64__)
+    const std::string machine = "aarch64-linux-gnu";
+#else
+    const std::string machine = "unknown";
+#endif
+    for (const std::string& folder :
+         {"/lib/" + machine, std::string("/lib64"), std::string("/lib"), "/usr/lib/" + machine,
+          std::string("/usr/lib64"), std::string("/usr/lib")}) {
+        fTree.Write(folder + "/libx.so", "");
+        EXPECT_EQ(Find("libx.so"), Names{folder + "/libx.so"});
+        fTree.Remove(folder + "/libx.so");
+    }
+    EXPECT_EQ(Find("libx.so"), Names());
+}
+
 TEST_F(LibrarySearchTest, FindsVariantsForNewerProcessors)
 {
     fTree.Write("/usr/lib/glibc-hwcaps/x86-64-v3/libx.so", "");
