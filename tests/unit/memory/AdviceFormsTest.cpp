@@ -147,6 +147,25 @@ TEST(AdviceFormsTest, TellsWhatWouldChangeTheAnswer)
     EXPECT_EQ(change(), "Check the installation of assay. The next call makes an attempt.");
 }
 
+TEST(AdviceFormsTest, SaysWhyAnAttemptIsDue)
+{
+    Advice advice;
+    advice.fPlan = Plan::kTry;
+    const std::pair<Due, const char*> rows[] = {
+        {Due::kFirst, "one attempt: nothing is known of this state of the machine"},
+        {Due::kOld, "one attempt: what is known is too old"},
+        {Due::kRequested, "one attempt: a fresh one is requested"},
+        {Due::kAfterFailure, "one attempt: the pause after the last failure is over"},
+        {Due::kForgiven, "one attempt: the last failures are too old to count"},
+        {Due::kAfterFreeze, "one attempt: the system ended during the last one"},
+        {Due::kUnclear, "one attempt: the last one showed nothing"},
+        {Due::kNot, "one attempt"}};
+    for (const auto& [due, text] : rows) {
+        advice.fDue = due;
+        EXPECT_THAT(MakeAdviceText(advice), testing::EndsWith(std::string("Plan: ") + text + "\n"));
+    }
+}
+
 TEST(AdviceFormsTest, NamesAttemptsThatSaidNothing)
 {
     Advice advice;

@@ -289,6 +289,8 @@ TEST_F(AdviserTest, AnswersUnknownIfAnotherProcessTakesTooLong)
     const Advice advice = Advise();
     EXPECT_EQ(Show(advice), "wait: unknown unknown");
     EXPECT_EQ(advice.fOpenGL.fOutlook.fFinding.fReason, "other-instance");
+    EXPECT_EQ(advice.fOpenGL.fOutlook.fFinding.fText,
+              "Another process is trying the drivers at this moment.");
     double waited = 0;
     fRequest.fWaitSeconds = 3;
     fFolder.fReads = 0;

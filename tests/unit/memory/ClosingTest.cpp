@@ -105,6 +105,8 @@ TEST(ClosingTest, BlamesNobodyForTheRest)
         EXPECT_EQ(Show(Close(Verdict::kCrashed, "NumCLGPUs", order)),
                   "killed hardware:trials-passed unknown:killed");
     }
+    EXPECT_EQ(Close(Verdict::kCrashed, "NumCLGPUs", "signal 9 (Killed)").fOpenCL.fText,
+              "Another process killed the child while OpenCL was tried.");
     EXPECT_EQ(Show(Close(Verdict::kCrashed, "NumGLGPUs", "signal 10 (Bus error)")),
               "crashed broken:crashed unknown:ended-before");
 }

@@ -360,6 +360,22 @@ TEST(PolicyTest, PausesEndWithTheTimeThatForgives)
               fmt::format("broken a-reason, in {}, 100 failed", 7 * kDay));
 }
 
+TEST(PolicyTest, FindingsSayWhatHappened)
+{
+    const auto tell = [](const std::vector<Attempt>& attempts) {
+        return Judge(DeviceKind::kOpenGL, attempts, kNow, Policy()).fFinding.fText;
+    };
+    const Attempt freeze = Made(100, kSystemEnded, "--");
+    EXPECT_EQ(tell({}), "OpenGL has not been tried.");
+    EXPECT_EQ(tell({freeze}), "The system ended while OpenGL was tried.");
+    EXPECT_EQ(tell({freeze, freeze}), "The system ended 2 times while OpenGL was tried.");
+    EXPECT_EQ(tell({Made(100, kKilled, "--")}),
+              "Another process killed the child while OpenGL was tried.");
+    EXPECT_EQ(tell({Made(100, kHostEnded, "--")}), "The host ended while OpenGL was tried.");
+    EXPECT_EQ(tell({Made(kYear, kEnded, "HH")}), "What is known of OpenGL is too old.");
+    EXPECT_EQ(tell({Made(100, kCrashed, "B-")}), "A sentence.") << "what the attempt found";
+}
+
 TEST(PolicyTest, WarningsSayWhatHappened)
 {
     const auto warn = [](const std::vector<Attempt>& attempts) {

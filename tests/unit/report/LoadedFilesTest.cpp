@@ -47,6 +47,17 @@ TEST(LoadedFiles, AreListedOnce)
               Texts{"OpenGL /lib/libLLVM.so"});
 }
 
+TEST(LoadedFiles, AreNoneOfEachPartOfTheRuntime)
+{
+    for (const std::string name :
+         {"ld-linux.so.2", "libc.so.6", "libdl.so.2", "libgcc_s.so.1", "libm.so.6",
+          "libpthread.so.0", "librt.so.1", "libstdc++.so.6", "api-ms-win-core-x.dll",
+          "msvcp140.dll", "msvcrt.dll", "ucrtbase.dll", "vcruntime140.dll"})
+        for (const char* folder : {"/lib/", "C:\\", ""})
+            EXPECT_EQ(Read({"loaded for OpenGL: " + (folder + name)}), Texts()) << name;
+    EXPECT_EQ(Read({"loaded for OpenGL: /libc.so.6/libx.so"}), Texts{"OpenGL /libc.so.6/libx.so"});
+}
+
 TEST(LoadedFiles, AreNotTheRuntime)
 {
     EXPECT_EQ(Read({"loaded for OpenGL: /lib/libc.so.6", "loaded for OpenGL: /lib/libpthread.so.0",

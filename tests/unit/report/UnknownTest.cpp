@@ -36,6 +36,19 @@ TEST(Unknown, IsNoValueOfAGoodMachine)
     }
 }
 
+TEST(Unknown, IsNamedByItsReason)
+{
+    EXPECT_STREQ(GetUnknownText(Unknown::kNot), "");
+    EXPECT_STREQ(GetUnknownText(Unknown::kCut), "only the beginning of the line came");
+    EXPECT_STREQ(GetUnknownText(Unknown::kEmpty), "the driver returned an empty text");
+    EXPECT_STREQ(GetUnknownText(Unknown::kNoAdapter),
+                 "no adapter of the system matches the device");
+    EXPECT_STREQ(GetUnknownText(Unknown::kNotListed), "the system's adapter lists do not have it");
+    EXPECT_STREQ(GetUnknownText(Unknown::kNoFigure), "no source has the value");
+    EXPECT_STREQ(GetUnknownText(Unknown::kNoTime), "the device's clock reported no elapsed time");
+    EXPECT_STREQ(GetUnknownText(Unknown::kImplausible), "the device's clock is unreliable");
+}
+
 TEST(Unknown, HasAFormForEachKindOfKey)
 {
     EXPECT_EQ(Judge("GLDriver", "\"?\""), Unknown::kNotListed);
