@@ -31,6 +31,8 @@ TEST(NvidiaVersionTest, AnOldModulesZoneIsAnOffsetInMinutes)
               "20180821123305.000000-420");
     EXPECT_EQ(ParseNvidiaVersion("NVRM version: x  304.137  Thu Jan 14 18:50:41 PST 2018\n").date,
               "20180114185041.000000-480");
+    EXPECT_EQ(ParseNvidiaVersion("NVRM version: x  304.137  Thu Jan 14 18:50:41 GMT 2018\n").date,
+              "20180114185041.000000+000");
 }
 
 TEST(NvidiaVersionTest, EveryMonthHasItsNumber)

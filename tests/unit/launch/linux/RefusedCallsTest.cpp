@@ -16,12 +16,14 @@
 #include <sys/prctl.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
+#include <unistd.h>
 #include <vector>
 
 #include <boost/filesystem/directory.hpp>
 
 #include "FreshProcess.h"
 #include "TestChild.h"
+#include "pmutil/LauncherPosix.h"
 #include "pmutil/Reader.h"
 #include "support/Waits.h"
 
@@ -181,5 +183,83 @@ TEST_F(KeptLauncherRefusal, OfARangeToCloseLeavesTheKeeperItsOwnDescriptorsOnly)
         REQUIRE_SO(launcher.Wait(&exitCode) == kEndedByKill);
     });
 }
+
+// A shell that ends with its input.
+constexpr char kReading[] = "read line";
+
+// Returns what the call throws; empty if it throws nothing.
+template <typename Call>
+std::string Fail(const Call& call)
+{
+    try {
+        call();
+    } catch (const std::runtime_error& failure) {
+        return failure.what();
+    }
+    return {};
+}
+
+class LauncherPosixRefusal : public KeptLauncherRefusal {};
+
+TEST_F(LauncherPosixRefusal, OfADescriptorOfTheChildEndsIt)
+{
+    ExpectInFreshProcess([] {
+        Refuse(SYS_pidfd_open, -1, 0, ENOSYS);
+        LauncherPosix launcher;
+        REQUIRE_SO(Fail([&] {
+                       launcher.Launch(L"/bin/sh", {"-c", "sleep 1000"});
+                   }) == "pidfd_open failed: /bin/sh: Function not implemented");
+        REQUIRE_SO(!HasAnyChild());
+    });
+}
+
+TEST_F(LauncherPosixRefusal, OfANumberAboveTheStreamsIsNamed)
+{
+    ExpectInFreshProcess([] {
+        ::close(STDIN_FILENO);
+        Refuse(SYS_fcntl, 1, F_DUPFD_CLOEXEC, EMFILE);
+        LauncherPosix launcher;
+        REQUIRE_SO(Fail([&] {
+                       launcher.Launch(L"/bin/sh", {"-c", kReading});
+                   }) == "fcntl failed: /bin/sh: Too many open files");
+    });
+}
+
+TEST_F(LauncherPosixRefusal, OfAKillIsNamed)
+{
+    ExpectInFreshProcess([] {
+        LauncherPosix launcher;
+        const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", kReading});
+        Refuse(SYS_pidfd_send_signal, -1, 0, EPERM);
+        REQUIRE_SO(Fail([&] { launcher.Kill(); }) ==
+                   "pidfd_send_signal failed: Operation not permitted");
+    });
+}
+
+TEST_F(LauncherPosixRefusal, OfAnEndIsNamed)
+{
+    ExpectInFreshProcess([] {
+        LauncherPosix launcher;
+        launcher.Launch(L"/bin/sh", {"-c", kReading});
+        Refuse(SYS_waitid, 0, P_PIDFD, EPERM);
+        int exitCode = 0;
+        REQUIRE_SO(Fail([&] { launcher.Wait(&exitCode); }) ==
+                   "waitid failed: Operation not permitted");
+    });
+}
+
+#ifdef SYS_poll // newer processors have ppoll only
+TEST_F(LauncherPosixRefusal, OfAWaitIsNamed)
+{
+    ExpectInFreshProcess([] {
+        LauncherPosix launcher;
+        const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", kReading});
+        Refuse(SYS_poll, -1, 0, EPERM);
+        int exitCode = 0;
+        REQUIRE_SO(Fail([&] { launcher.Wait(&exitCode); }) ==
+                   "poll failed: Operation not permitted");
+    });
+}
+#endif
 
 } // namespace

@@ -1,6 +1,7 @@
 #include "pmutil/System.h"
 
 #include <fcntl.h>
+#include <pwd.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -10,6 +11,7 @@
 #include <csignal>
 #include <cstdlib>
 #include <ctime>
+#include <fstream>
 #include <stdexcept>
 
 #include <boost/thread/thread.hpp>
@@ -319,6 +321,18 @@ TEST_F(CurrentDirectoryTest, ThatIsGoneThrows)
     } catch (const std::runtime_error& error) {
         EXPECT_STREQ(error.what(), "GetCurrentDirectoryW failed");
     }
+}
+
+TEST(SystemTest, DesktopFolderIsTheOneOfThePasswordDatabase)
+{
+    const passwd* const user = getpwuid(getuid()); // NOLINT(concurrency-mt-unsafe)
+    if (user == nullptr || user->pw_dir == nullptr || *user->pw_dir == '\0')
+        GTEST_SKIP() << "the user has no home folder";
+    const std::string home = user->pw_dir;
+    std::ifstream file(home + "/.config/user-dirs.dirs");
+    if (file)
+        GTEST_SKIP() << "the user has named another folder";
+    EXPECT_EQ(GetDesktopFolder(), boost::filesystem::path(home + "/Desktop").wstring());
 }
 
 TEST(SystemTest, DesktopFolderAsksNoEnvironment)
