@@ -10,7 +10,9 @@ If the run continues after a fault: the output up to the call is that of an undi
 there are only keys that are due, in order, with values of the right form; a text is a prefix of the
 given one; the report is whole, or standard error has the reason; the status agrees with standard error.
 The documented table has all further calls too. Under assay-host the report and the exit status are the
-same.
+same, and what can be used is what the report shows.
+
+The table of what can be used after each fault is written to usable-faults.md in the build folder.
 
 No process of a run is left in any case."""
 
@@ -19,6 +21,7 @@ import json
 import os
 import re
 import traceback
+from collections import Counter
 from concurrent.futures import ThreadPoolExecutor
 
 import pytest
@@ -26,7 +29,7 @@ import pytest
 from calls import LastLines, PREFIX, calls_of, without_calls
 from clmodel import cl_values_of
 from faults import FAULTS, RESULTS, library_of
-from harness import STAMP, Run, ended_by, split_lines, text_of
+from harness import BUILD, STAMP, Run, ended_by, split_lines, text_of
 from hosting import STATUSES, report_bytes
 from model import check, predict
 from sweep import WORKERS, Sweep, normal
@@ -59,6 +62,21 @@ def sweep(tmp_path_factory):
 @pytest.fixture(scope="module")
 def table():
     return LastLines()
+
+
+# For each run under assay-host: the fault, the entry point, and the answers with their reasons.
+ROWS = []
+
+
+@pytest.fixture(scope="module", autouse=True)
+def usable_table():
+    yield
+    if os.access(BUILD, os.W_OK):
+        rows = [f"| {fault} | {name} | {' '.join(gl)} | {' '.join(cl)} | {count} |\n"
+                for (fault, name, gl, cl), count in sorted(Counter(ROWS).items())]
+        (BUILD / "usable-faults.md").write_text(
+            "| fault | in a call of | OpenGL | OpenCL | runs |\n|---|---|---|---|---|\n" + "".join(rows),
+            encoding="utf-8")
 
 
 def values(lines):
@@ -142,22 +160,44 @@ def check_hosted(table, pair, bare, hosted):
     if ends is not None or pair.fault.ends == "_exit":
         last = outcome["lastLogLine"] or outcome["lastReportLine"]
         table.check(pair.call.name, PREFIX.sub("", last))
-        if pair.fault.ends is not None:
-            check_usable(pair, document)
+    check_usable(pair, document, dict(values(wanted)), bare.errors)
     assert document["report"]["whole"] == whole
     assert hosted.err == b""
     assert hosted.status == STATUSES[outcome["verdict"]]
 
 
-def check_usable(pair, document):
-    """What can be used after a fault that ended the run, by the library of the call alone."""
-    answers = [document["usable"][name]["answer"] for name in ("opengl", "opencl")]
-    if document["report"]["whole"]:
-        assert answers == ["hardware", "hardware"]
-    elif library_of(pair.call.name) == "cl":
-        assert answers == ["hardware", "broken"]
-    else:
-        assert answers == ["broken", "unknown"]
+NO_CONTEXT = "ContextOffscreen exception caught and ignored."
+# The calls that list display devices.
+LISTING = {"eglQueryDevicesEXT", "eglGetPlatformDisplayEXT", "eglInitialize"}
+
+
+def usable_opengl(pair, keys, errors):
+    """What can be used of OpenGL by a whole report: its device passed its trials or not, or there is none."""
+    if keys.get("NumGLGPUs", "0") == "0":
+        return "absent" if pair.call.name in LISTING and NO_CONTEXT not in errors else "broken"
+    trials = [keys.get(f"glgpu[0].{key}") for key in ("CanCompileProgramGLSL", "GLFrameBufferOK")]
+    return "hardware" if trials == ["1", "1"] else "broken"
+
+
+def usable_opencl(keys):
+    if keys.get("NumCLGPUs", "0") == "0":
+        return "absent"
+    return "hardware" if "clgpu[0].CLCompute" in keys else "broken"
+
+
+def usable_of(pair, whole, keys, errors):
+    """What can be used after a run with the fault: OpenGL and OpenCL."""
+    if whole:
+        return usable_opengl(pair, keys, errors), usable_opencl(keys)
+    return ("hardware", "broken") if library_of(pair.call.name) == "cl" else ("broken", "unknown")
+
+
+def check_usable(pair, document, keys, errors):
+    answers = [document["usable"][name] for name in ("opengl", "opencl")]
+    ROWS.append((pair.fault.name, pair.call.name,
+                 *((answer["answer"], answer["reason"]) for answer in answers)))
+    assert tuple(answer["answer"] for answer in answers) == usable_of(
+        pair, document["report"]["whole"], keys, errors)
 
 
 def run_pair(sweep, table, pair):
