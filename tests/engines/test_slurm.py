@@ -4,6 +4,7 @@ import os
 import re
 import shlex
 import shutil
+import signal
 import socket
 import subprocess
 import tempfile
@@ -13,7 +14,7 @@ import pytest
 
 from engines import INTEGRATIONS, Server, needed, outcome_of
 from harness import TREE, until
-from hosting import HOST
+from hosting import HOST, processes_with
 from model import Gpu
 
 DOCS = TREE / "docs" / "fleet.md"
@@ -61,8 +62,12 @@ class Stage:
 
     def run(self, status, output, node, job=False):
         """Returns the exit status, and the changes of the node."""
+        return self.run_host(f"echo {shlex.quote(output)}\nexit {status}\n", node, job)
+
+    def run_host(self, host, node, job=False):
+        """The same with a check that is any script."""
         self.calls.write_text("")
-        write_program(self.folder / "assay-host", f"echo {shlex.quote(output)}\nexit {status}\n")
+        write_program(self.folder / "assay-host", host)
         write_program(self.folder / "scontrol", f"""\
 if [ "$2" = show ]; then
     {'exit 1' if node is None else 'printf "%s" ' + shlex.quote(node)}
@@ -115,6 +120,27 @@ def test_decisions(tmp_path, status, output, node, change):
     assert stage.run(status, output, node, job=True) == (int(is_bad), change)
 
 
+def test_check_that_does_not_end_is_killed(tmp_path):
+    """It ignores SIGTERM too. Its limits are shorter than those of the script."""
+    stage = Stage(tmp_path)
+    write_program(tmp_path / "timeout", """\
+case $4 in *assay-host) set -- -k 0.1 0.1 "$4" ;; esac
+exec /usr/bin/timeout "$@"
+""")
+    assert stage.run_host("trap '' TERM\nwhile :; do sleep 0.1; done\n", IDLE) == (
+        0, DRAIN("the check did not end within 38 s"))
+
+
+def test_process_that_is_left_behind_is_not_waited_for(tmp_path):
+    stage = Stage(tmp_path)
+    left = tmp_path / "left"
+    try:
+        assert stage.run_host(f"sleep infinity & echo $! >{left}\necho crashed: x\nexit 3\n", IDLE) == (
+            0, DRAIN("crashed: x"))
+    finally:
+        os.kill(int(left.read_text()), signal.SIGKILL)
+
+
 def test_limits_add_up_to_less_than_a_minute():
     limits = re.findall(r"timeout -k (\d+) (\d+)", SCRIPT.read_text(encoding="utf-8"))
     check, show, *changes = [int(kill) + int(end) for kill, end in limits]
@@ -146,10 +172,8 @@ class Cluster:
         key.chmod(0o600)
         self.write_configuration()
         (folder / "cgroup.conf").write_text("CgroupPlugin=autodetect\n")
-        requirements = folder / "requirements.json"
-        requirements.write_text(REQUIREMENT)
-        (folder / "settings").write_text(
-            f"ASSAY_HOST={HOST}\nASSAY_REQUIREMENTS={requirements}\n")
+        (folder / "requirements.json").write_text(REQUIREMENT)
+        self.set()
         variables = {**environment, "SLURM_CONF": str(self.configuration),
                      "ASSAY_SETTINGS": str(folder / "settings"), "ASSAY_SCRIPTED_EGL": str(script)}
         variables.pop("PATH", None)
@@ -164,6 +188,13 @@ class Cluster:
                    f"--seed-file={folder}/seed"),
             Server(folder / "slurmctld.log", slurmctld, "-D", "-c", **options),
             Server(folder / "slurmd.log", slurmd, "-D", "-N", "machine", **options)]
+
+    def set(self, **variables):
+        """Changes the settings of the health check. None sees a part of them."""
+        variables = {"ASSAY_HOST": HOST, "ASSAY_REQUIREMENTS": self.folder / "requirements.json", **variables}
+        new = self.folder / "new-settings"
+        new.write_text("".join(f"{name}={value}\n" for name, value in variables.items()))
+        new.rename(self.folder / "settings")
 
     def write_configuration(self):
         sockets = [socket.socket() for _ in range(2)]
@@ -252,3 +283,17 @@ def test_node_that_an_administrator_drained_stays_so(cluster):
     cluster.script.write_text(Gpu().script() + "at glCompileShader crash\n", encoding="ascii")
     subprocess.run([cluster.folder / "health"], env={"SLURMD_NODENAME": "machine"}, check=True)
     assert (cluster.state(), cluster.reason()) == ("drained", "new disk")
+
+
+def test_node_with_a_hanging_driver_is_drained_and_resumed(cluster):
+    until(lambda: cluster.state() == "idle", "the node doesn't come up")
+    hanging = cluster.folder / "hanging"
+    hanging.write_text(Gpu().script() + "at glCompileShader hang\n", encoding="ascii")
+    cluster.set(ASSAY_SCRIPTED_EGL=hanging, ASSAY_TIMEOUT=1)
+    until(lambda: cluster.state() == "drained", "the node isn't drained")
+    assert re.match("assay: hung: .* 1 s ", cluster.reason())
+    cluster.set()
+    until(lambda: cluster.state() == "idle", "the node isn't idle again")
+    assert cluster.reason() == ""
+    # What hung is gone.
+    assert processes_with(bytes(hanging)) == []
