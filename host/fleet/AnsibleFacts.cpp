@@ -48,9 +48,12 @@ void WriteAnsibleFacts(std::ostream& out, const Report& report, const RunOutcome
 {
     const Answers answers = GetAnswers(report);
     Json json = {{"verdict", GetVerdictName(outcome.fVerdict)},
-                 {"reason", ShowBytes(outcome.fReason)},
-                 {"time", facts.fEnvironment.fTime},
-                 {"version", facts.fHostVersion}};
+                 {"reason", ShowBytes(outcome.fReason)}};
+    // A report that assay printed has neither.
+    if (!facts.fEnvironment.fTime.empty())
+        json["time"] = facts.fEnvironment.fTime;
+    if (!facts.fHostVersion.empty())
+        json["version"] = facts.fHostVersion;
     for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL})
         json[GetApiName(kind)] = MakeInterface(kind, answers, outcome);
     json["warnings"] = Json::array();

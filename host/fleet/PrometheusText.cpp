@@ -87,16 +87,22 @@ void WriteRun(Exposition& text, const Answers& answers, const RunOutcome& outcom
               const RunFacts& facts)
 {
     text.Start("build_info", "Versions of the programs; always 1.");
-    Labels versions = {{"version", facts.fHostVersion}};
+    Labels versions;
+    if (!facts.fHostVersion.empty())
+        versions.emplace_back("version", facts.fHostVersion);
     if (facts.fChildVersion.IsKnown())
         versions.emplace_back("assay_version", ShowBytes(facts.fChildVersion.fValue));
-    text.Add(versions, 1);
+    if (!versions.empty())
+        text.Add(versions, 1);
     if (const auto time = ReadUtcText(facts.fEnvironment.fTime)) {
         text.Start("last_run_timestamp_seconds", "Start of the last run, since 1970 in UTC.");
         text.Add({}, static_cast<double>(*time));
     }
-    text.Start("last_run_duration_seconds", "Time from the child's launch to its end.");
-    text.Add({}, outcome.fSeconds);
+    // A run that never started, and a file without its end, have none.
+    if (outcome.fSeconds > 0) {
+        text.Start("last_run_duration_seconds", "Time from the child's launch to its end.");
+        text.Add({}, outcome.fSeconds);
+    }
     text.Start("run_verdict", "How the last run ended: 1 for its verdict, 0 for the others.");
     for (int verdict = 0; verdict <= static_cast<int>(kLastVerdict); ++verdict)
         text.Add({{"verdict", GetVerdictName(static_cast<Verdict>(verdict))}},

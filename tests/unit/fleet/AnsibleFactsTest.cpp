@@ -65,5 +65,16 @@ TEST(AnsibleFacts, LeaveOutWhatIsNotKnown)
     EXPECT_EQ(facts["verdict"], "crashed");
 }
 
+// A report as assay prints it has neither a time nor a version.
+TEST(AnsibleFacts, LeaveOutWhatAFileDoesNotHave)
+{
+    std::ostringstream out;
+    WriteAnsibleFacts(out, ReadReport(Sample(1, 1).GetText()), RunOutcome(), RunFacts());
+    const Json facts = Json::parse(out.str());
+    EXPECT_FALSE(facts.contains("time"));
+    EXPECT_FALSE(facts.contains("version"));
+    EXPECT_TRUE(facts.contains("verdict"));
+}
+
 } // namespace
 } // namespace assay_host

@@ -190,6 +190,20 @@ TEST(PrometheusText, LeavesOutWhatTheRunDidNotReach)
     EXPECT_THAT(nothing, Not(HasSubstr("assay_version")));
 }
 
+// A report as assay prints it has neither times nor versions.
+TEST(PrometheusText, LeavesOutWhatAFileDoesNotHave)
+{
+    RunFacts facts;
+    facts.fChildVersion = {"", "it was not stored"};
+    std::ostringstream out;
+    WritePrometheusText(out, ReadReport(Sample(1, 1).GetText()), RunOutcome(), facts);
+    EXPECT_THAT(out.str(), AllOf(Not(HasSubstr("build_info")), Not(HasSubstr("timestamp")),
+                                 Not(HasSubstr("duration"))));
+    facts.fChildVersion = {"1.2.4", ""};
+    EXPECT_THAT(GetText("", Verdict::kComplete, facts),
+                HasSubstr("\nassay_build_info{assay_version=\"1.2.4\"} 1\n"));
+}
+
 TEST(PrometheusText, CountsNoDeviceWithoutOpenCL)
 {
     EXPECT_THAT(GetSeries(GetText(Sample(1, -1).GetText())),
