@@ -89,11 +89,24 @@ TEST(RequirementCheck, WhatIsNotKnownMeetsNothing)
                   "glgpu[0] not known (")
             << relation;
     }
+    EXPECT_EQ(FindUnmetIn(text, "GLMemoryMB>=1"), "glgpu[0] not known (no source has the value)");
     EXPECT_EQ(FindUnmetIn(text, "GLFrameBufferOK!=1"), "glgpu[0] not known (run ended before)");
     EXPECT_EQ(FindUnmetIn(text, "opencl.devices==0"), "not known (run ended before)");
     EXPECT_EQ(
         FindUnmetIn("Tester=\"x\"\nNumGLGPUs=1\nglgpu[0].GLVersion=\"none\"\n", "GLVersion!=1"),
         "glgpu[0] none");
+}
+
+TEST(RequirementCheck, AListThatIsNotWholeIsNoNumber)
+{
+    for (const std::string list : {"8]", "[8", "[8]]", "[]", "[", "]", "x8x"}) {
+        const std::string text = "Tester=\"x\"\nNumGLGPUs=1\n"
+                                 "glgpu[0].glGetIntegerv[GL_MAX_DRAW_BUFFERS]=" +
+                                 list + "\n";
+        EXPECT_EQ(FindUnmetIn(text, "glGetIntegerv[GL_MAX_DRAW_BUFFERS]>=0").substr(0, 9),
+                  "glgpu[0] ")
+            << list;
+    }
 }
 
 TEST(RequirementCheck, WithoutALibraryThereAreNoDevices)

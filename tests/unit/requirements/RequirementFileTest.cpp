@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
+#include <fstream>
 #include <sstream>
 #include <stdexcept>
 
@@ -41,6 +43,16 @@ TEST(RequirementFile, SaysWhatIsWrong)
     EXPECT_EQ(FindFailure(R"({"require": [7]})"),
               "\"require\" has an element that is no string but of the type number");
     EXPECT_EQ(FindFailure(R"({"require": ["x"]})"), R"("x": there is no key "x")");
+}
+
+TEST(RequirementFile, IsLoadedByItsPath)
+{
+    const std::string path = testing::TempDir() + "requirements-\xC3\xA9.json";
+    std::ofstream(std::filesystem::u8path(path)) << R"({"require": ["GLVersion>=3.3"]})";
+    const std::vector<Requirement> requirements = LoadRequirements(path);
+    std::filesystem::remove(std::filesystem::u8path(path));
+    ASSERT_EQ(requirements.size(), 1U);
+    EXPECT_EQ(requirements[0].fText, "GLVersion>=3.3");
 }
 
 TEST(RequirementFile, IsNamedInItsFailures)

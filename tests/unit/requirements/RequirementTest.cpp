@@ -73,6 +73,8 @@ TEST(Requirement, TheKeyDecidesTheTypeOfTheValue)
     EXPECT_EQ(std::get<double>(wanted("CLBandwidth>=200e9")), 200e9);
     EXPECT_EQ(std::get<double>(wanted("GLVendorID==0x10DE")), 4318);
     EXPECT_EQ(std::get<double>(wanted("GLVendorID==4318")), 4318);
+    EXPECT_EQ(std::get<double>(wanted("GLVendorID==0xABCDEF01")), 0xABCDEF01);
+    EXPECT_EQ(std::get<double>(wanted("GLVendorID==0xabcdef89")), 0xABCDEF89);
     EXPECT_EQ(std::get<double>(wanted("NumGLGPUs>=1")), 1);
     EXPECT_EQ(std::get<double>(wanted("glGetIntegerv[GL_MAX_DRAW_BUFFERS]>=8")), 8);
     EXPECT_EQ(std::get<double>(wanted("opengl.devices>=8")), 8);
@@ -100,6 +102,10 @@ TEST(Requirement, SaysWhatIsWrong)
         {"", R"("": a key is missing)"},
         {" >= 1", R"(" >= 1": a key is missing)"},
         {"all", R"("all": there is no key "all")"},
+        {"all==1", R"("all==1": there is no key "all")"},
+        {"any >= 1", R"("any >= 1": there is no key "any")"},
+        {"any!=1", R"("any!=1": there is no key "any")"},
+        {"all<1", R"("all<1": there is no key "all")"},
         {"GLName", R"("GLName": one of ==, !=, <, <=, > and >= must follow the key)"},
         {"GLName x == y", R"("GLName x == y": one of ==, !=, <, <=, > and >= must follow the key)"},
         {"GLName!x", R"("GLName!x": one of ==, !=, <, <=, > and >= must follow the key)"},
@@ -162,6 +168,8 @@ TEST(Version, IsTheFirstOneInAText)
                 {"0", Version{}},
                 {"1..2", Version{1}},
                 {"1.", Version{1}},
+                {"1x5", Version{1}},
+                {"1 5", Version{1}},
                 {"22.3-beta", Version{22, 3}},
                 {"18446744073709551615", Version{18446744073709551615U}},
                 {"18446744073709551616", std::nullopt},
