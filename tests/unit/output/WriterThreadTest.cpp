@@ -73,8 +73,10 @@ class TestOutput : public Output {
 public:
     explicit TestOutput(std::shared_ptr<Reader> reader) : fReader(std::move(reader)) {}
 
+    void Open() override { fIsOpen = true; }
     void Write(std::string_view text) override
     {
+        EXPECT_TRUE(fIsOpen);
         if (text.substr(0, 3) == "bad")
             throw std::runtime_error("no room");
         fReader->Take(text);
@@ -84,6 +86,7 @@ public:
     ~TestOutput() override { fReader->fGone.set_value(); }
 
 private:
+    bool fIsOpen = false;
     const std::shared_ptr<Reader> fReader;
 };
 
@@ -138,11 +141,14 @@ TEST_F(WriterThreadTest, JoinsShortTextsThatWait)
     fWriter.WriteLarge([](std::ostream& out) { out << "large"; });
     fWriter.Write("e");
     fWriter.Write("f");
+    fWriter.WriteError("");
+    fWriter.Write(std::string(3000, 'g'));
+    fWriter.Write(std::string(3000, 'h'));
     fReader->Resume();
     EXPECT_TRUE(fWriter.Finish(std::nullopt));
     EXPECT_THAT(fReader->GetTaken(),
                 ElementsAre("taken", std::string(4000, 'a') + std::string(96, 'b'), "c", "made",
-                            "d", "large", "ef"));
+                            "d", "large", "ef", std::string(3000, 'g'), std::string(3000, 'h')));
 }
 
 TEST_F(WriterThreadTest, GivesUpAReaderThatDoesNotRead)
@@ -200,6 +206,7 @@ TEST(WriterThreadEndTest, EndsAndLetsGoOfTheOutputWhenItIsAbandoned)
     writer.reset();
     reader->fGone.get_future().wait();
     EXPECT_TRUE(reader->fAbandoned);
+    EXPECT_FALSE(reader->fFinished);
 }
 
 TEST_F(WriterThreadTest, MakesATextJustBeforeItIsWritten)
@@ -240,6 +247,36 @@ TEST_F(WriterThreadTest, WritesALongTextInPieces)
     EXPECT_TRUE(fWriter.Finish(std::nullopt));
     EXPECT_THAT(fReader->GetTaken(),
                 ElementsAre(text.substr(0, 4096), text.substr(4096, 4096), text.substr(8192)));
+}
+
+TEST_F(WriterThreadTest, ReportsAFailureOfALargeText)
+{
+    fWriter.WriteLarge([](std::ostream& out) { out << "bad"; });
+    EXPECT_THROW(fWriter.Finish(std::nullopt), std::runtime_error);
+}
+
+TEST_F(WriterThreadTest, WritesLongErrorsWhole)
+{
+    const std::string text = std::string(10000, 'x') + "\n";
+    testing::internal::CaptureStderr();
+    fWriter.WriteError(text);
+    EXPECT_TRUE(fWriter.Finish(std::nullopt));
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), text);
+}
+
+class UnfinishedOutput : public Output {
+public:
+    void Write(std::string_view /*text*/) override {}
+    void Finish() override { throw std::runtime_error("no room"); }
+};
+
+// Nobody needs to hear of it but the caller that waits.
+TEST(WriterThreadEndTest, ReportsAFailureOfTheEndToItsCallerOnly)
+{
+    std::atomic<int> failures{0};
+    WriterThread writer(std::make_unique<UnfinishedOutput>(), [&failures] { ++failures; });
+    EXPECT_THROW(writer.Finish(std::nullopt), std::runtime_error);
+    EXPECT_EQ(failures, 0);
 }
 
 TEST_F(WriterThreadTest, ReportsAFailureOnceAndThrowsItAtTheEnd)
