@@ -115,8 +115,8 @@ TEST(ReportPage, HasAllPartsOfARun)
 {
     const std::string page = WritePage(Sample(1, 1).GetText(), MakeOutcome(Verdict::kComplete));
     for (const char* part :
-         {"<h2>The run</h2>", "<dt>Verdict</dt>\n<dd>complete</dd>", "<dt>What happened</dt>",
-          "<dt>Exit status</dt>\n<dd>0</dd>", "<dt>Command</dt>", "<dt>Time taken</dt>",
+         {"<h2>The run</h2>", "<dt>Result</dt>\n<dd>", "<dt>What happened</dt>",
+          "<dt>Exit status of assay</dt>\n<dd>0</dd>", "<dt>Command</dt>", "<dt>Time</dt>",
           "<dt>Devices</dt>", "<dt>Build</dt>\n<dd>12.8</dd>",
           "<dt>Architecture</dt>\n<dd>x86_64</dd>",
           "<dt>When</dt>\n<dd>2026-11-22T01:26:02Z (local time +01:00)</dd>",
@@ -124,7 +124,7 @@ TEST(ReportPage, HasAllPartsOfARun)
           "<summary>What the terms mean</summary>", "<dt>OpenGL: Shaders compile</dt>",
           "<summary>Report lines (", "<div class=\"devices\"><article"})
         EXPECT_TRUE(Has(page, part)) << part;
-    for (const char* part : {"Last report line", "Last log line", "Next to report"})
+    for (const char* part : {"Last report line", "Last log line", "Next line"})
         EXPECT_FALSE(Has(page, part)) << part;
 }
 
