@@ -1,0 +1,42 @@
+#include "bugreport/Archive.h"
+
+#include <gtest/gtest.h>
+
+namespace assay_host {
+namespace {
+
+std::string Bytes(std::initializer_list<int> bytes)
+{
+    std::string text;
+    for (const int byte : bytes)
+        text += static_cast<char>(byte);
+    return text;
+}
+
+// Written down from the format's description; the checksum of "123456789" is the published one.
+TEST(Archive, HasTheBytesOfTheFormat)
+{
+    const std::string fields = Bytes({20,   0, 0, 8, 0, 0, 0x2D, 0x73, 0x76, 0x5D, 0x26, 0x39, 0xF4,
+                                      0xCB, 9, 0, 0, 0, 9, 0,    0,    0,    1,    0,    0,    0});
+    const std::string local = "PK\x03\x04" + fields + "a123456789";
+    const std::string central = "PK\x01\x02" + Bytes({20, 3}) + fields +
+                                Bytes({0, 0, 0, 0, 0, 0, 0, 0, 0xA4, 0x81, 0, 0, 0, 0}) + "a";
+    const std::string end =
+        "PK\x05\x06" + Bytes({0, 0, 0, 0, 1, 0, 1, 0, 47, 0, 0, 0, 40, 0, 0, 0, 0, 0});
+    EXPECT_EQ(MakeArchive({{"a", "123456789"}}, "2026-11-22T14:25:26Z"), local + central + end);
+}
+
+TEST(Archive, OfATimeThatItCantHave)
+{
+    const std::string first = Bytes({0, 0, 0x21, 0});
+    for (const char* const time : {"", "now", "1979-12-31T23:59:59Z"})
+        EXPECT_EQ(MakeArchive({{"a", ""}}, time).substr(10, 4), first) << time;
+}
+
+TEST(Archive, OfNoFile)
+{
+    EXPECT_EQ(MakeArchive({}, ""), "PK\x05\x06" + std::string(18, '\0'));
+}
+
+} // namespace
+} // namespace assay_host
