@@ -218,6 +218,7 @@ private:
 
     void TakeLogLine(const std::string& text)
     {
+        fObserver.OnLogLine(text, GetSeconds());
         if (TakeLoadedFile(GetLogText(text), fOutcome.fDrivers))
             return;
         constexpr std::size_t kMaxCauses = 100;

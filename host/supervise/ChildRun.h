@@ -21,7 +21,7 @@ struct ChildOptions {
     double fTimeoutSeconds = 60; // 0: no limit
     // Requests the child's log with -verbose=0x101, unless the arguments have a -verbose= option,
     // and takes the causes of failures and the files of drivers from it. The lines of this log
-    // aren't part of the report, and aren't passed to the observer.
+    // aren't part of the report.
     bool fKeepCauses = false;
     ReportReader::Limits fLimits;
 };
@@ -34,6 +34,8 @@ public:
     virtual ~RunObserver() = default;
     virtual void OnStart() {}
     virtual void OnLine(const ReportLine& /*line*/, double /*seconds*/) {}
+    // A line of the log that fKeepCauses requests, without its line end.
+    virtual void OnLogLine(const std::string& /*line*/, double /*seconds*/) {}
     virtual void OnErrorLine(const std::string& /*line*/, double /*seconds*/) {}
     virtual void OnTick(double /*seconds*/) {} // about ten times a second
 };
