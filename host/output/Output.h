@@ -41,4 +41,8 @@ std::unique_ptr<Output> OpenStandardOutput();
 // created.
 std::unique_ptr<Output> OpenFile(const std::string& path);
 
+// The same for a file that must not exist. Throws if the path exists, even as a link that leads
+// nowhere; Finish throws and deletes the temporary file if it exists by then.
+std::unique_ptr<Output> OpenNewFile(const std::string& path);
+
 } // namespace assay_host

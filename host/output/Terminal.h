@@ -3,6 +3,9 @@
 
 namespace assay_host {
 
+// Whether standard input is a terminal.
+bool IsInputTerminal();
+
 // Whether standard error is a terminal.
 bool IsErrorTerminal();
 

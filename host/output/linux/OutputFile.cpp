@@ -1,5 +1,6 @@
 #include <atomic>
 #include <cerrno>
+#include <cstdio>
 #include <fcntl.h>
 #include <stdexcept>
 #include <sys/stat.h>
@@ -20,9 +21,12 @@ constexpr ::mode_t kMode = 0666; // before the umask
 
 class OutputFile : public Output {
 public:
-    explicit OutputFile(const std::string& path) : fName(path), fPath(Resolve(path))
+    OutputFile(const std::string& path, bool isNew)
+        : fName(path), fPath(isNew ? path : Resolve(path)), fIsNew(isNew)
     {
         struct stat found = {};
+        if (isNew && ::lstat(fPath.c_str(), &found) == 0)
+            Fail(EEXIST);
         const bool exists = ::stat(fPath.c_str(), &found) == 0;
         if (!exists && errno != ENOENT)
             Fail(errno);
@@ -58,8 +62,7 @@ public:
     {
         if (fTemporary.empty())
             return;
-        if (::fsync(fFile) != 0 || ::close(std::exchange(fFile, -1)) != 0 ||
-            ::rename(fTemporary.c_str(), fPath.c_str()) != 0)
+        if (::fsync(fFile) != 0 || ::close(std::exchange(fFile, -1)) != 0 || !Rename())
             Fail(errno);
         fHasTemporary = false;
     }
@@ -82,6 +85,18 @@ private:
         return error ? path : resolved.native();
     }
 
+    // A file system without RENAME_NOREPLACE has links.
+    bool Rename() const
+    {
+        if (!fIsNew)
+            return ::rename(fTemporary.c_str(), fPath.c_str()) == 0;
+        if (::renameat2(AT_FDCWD, fTemporary.c_str(), AT_FDCWD, fPath.c_str(), RENAME_NOREPLACE) ==
+            0)
+            return true;
+        return errno == EINVAL && ::link(fTemporary.c_str(), fPath.c_str()) == 0 &&
+               ::unlink(fTemporary.c_str()) == 0;
+    }
+
     void OpenPath(const std::string& path, int flags)
     {
         fFile = ::open(path.c_str(), flags | O_CLOEXEC, kMode);
@@ -97,6 +112,7 @@ private:
 
     const std::string fName;
     const std::string fPath;
+    const bool fIsNew;
     std::string fTemporary; // empty if fPath is written directly; set by the constructor
     std::atomic<bool> fHasTemporary{false};
     int fFile = -1;
@@ -106,7 +122,12 @@ private:
 
 std::unique_ptr<Output> OpenFile(const std::string& path)
 {
-    return std::make_unique<OutputFile>(path);
+    return std::make_unique<OutputFile>(path, false);
+}
+
+std::unique_ptr<Output> OpenNewFile(const std::string& path)
+{
+    return std::make_unique<OutputFile>(path, true);
 }
 
 } // namespace assay_host

@@ -19,6 +19,11 @@ int GetWidth(int stream)
 
 } // namespace
 
+bool IsInputTerminal()
+{
+    return ::isatty(STDIN_FILENO) != 0;
+}
+
 bool IsErrorTerminal()
 {
     return ::isatty(STDERR_FILENO) != 0;

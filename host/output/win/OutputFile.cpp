@@ -17,9 +17,13 @@ namespace {
 
 class OutputFile : public Output {
 public:
-    explicit OutputFile(const std::string& path) : fName(path), fPath(FollowLinks(ToPath(path)))
+    OutputFile(const std::string& path, bool isNew)
+        : fName(path), fPath(isNew ? ToPath(path) : FollowLinks(ToPath(path))), fIsNew(isNew)
     {
         boost::system::error_code error;
+        if (isNew && boost::filesystem::symlink_status(fPath, error).type() !=
+                         boost::filesystem::file_not_found)
+            Fail({ERROR_FILE_EXISTS, std::system_category()});
         const boost::filesystem::file_type type = boost::filesystem::status(fPath, error).type();
         if (type != boost::filesystem::file_not_found && type != boost::filesystem::regular_file)
             return;
@@ -54,7 +58,8 @@ public:
             Fail(GetLastCode());
         Close();
         if (::MoveFileExW(fTemporary.c_str(), fPath.c_str(),
-                          MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH) == 0)
+                          MOVEFILE_WRITE_THROUGH |
+                              (fIsNew ? 0U : DWORD{MOVEFILE_REPLACE_EXISTING})) == 0)
             Fail(GetLastCode());
         fHasTemporary = false;
     }
@@ -93,6 +98,7 @@ private:
 
     const std::string fName;
     const boost::filesystem::path fPath;
+    const bool fIsNew;
     boost::filesystem::path fTemporary; // empty if fPath is written directly
     std::atomic<bool> fHasTemporary{false};
     HANDLE fFile = INVALID_HANDLE_VALUE;
@@ -102,7 +108,12 @@ private:
 
 std::unique_ptr<Output> OpenFile(const std::string& path)
 {
-    return std::make_unique<OutputFile>(path);
+    return std::make_unique<OutputFile>(path, false);
+}
+
+std::unique_ptr<Output> OpenNewFile(const std::string& path)
+{
+    return std::make_unique<OutputFile>(path, true);
 }
 
 } // namespace assay_host

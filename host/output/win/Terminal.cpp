@@ -25,6 +25,12 @@ int GetWidth(DWORD stream)
 
 } // namespace
 
+bool IsInputTerminal()
+{
+    DWORD mode = 0;
+    return ::GetConsoleMode(::GetStdHandle(STD_INPUT_HANDLE), &mode) != 0;
+}
+
 bool IsErrorTerminal()
 {
     return GetConsoleWidth(STD_ERROR_HANDLE) > 0;
