@@ -16,7 +16,7 @@ _assay_host() {
             _assay_options
             return
             ;;
-        run | torture | diff | show | explain | check | advise | state) [ -n "$command" ] || command=${words[index]} ;;
+        run | torture | diff | show | explain | check | advise | state | bugreport) [ -n "$command" ] || command=${words[index]} ;;
         esac
     done
 
@@ -70,7 +70,8 @@ _assay_host() {
         options+=" --unclear --unclear-pause --dry-run"
         ;;
     state) options+=" --state" ;;
-    *) options="run torture diff show explain check advise state --help --version" ;;
+    bugreport) options+=" --assay --timeout --output --yes --" ;;
+    *) options="run torture diff show explain check advise state bugreport --help --version" ;;
     esac
     if [[ $command = diff || $command = show ]] && [[ $cur != -* ]]; then
         _filedir

@@ -1,15 +1,16 @@
 # Completion of assay-host for fish.
 
-set -l commands run torture diff show explain check advise state
+set -l commands run torture diff show explain check advise state bugreport
 set -l none "not __fish_seen_subcommand_from $commands"
 set -l run "__fish_seen_subcommand_from run"
 set -l torture "__fish_seen_subcommand_from torture"
 set -l check "__fish_seen_subcommand_from check"
 set -l advise "__fish_seen_subcommand_from advise"
 set -l state "__fish_seen_subcommand_from state"
-set -l child "__fish_seen_subcommand_from run torture check advise"
+set -l child "__fish_seen_subcommand_from run torture check advise bugreport"
 set -l remembers "__fish_seen_subcommand_from advise check state"
 set -l needs "__fish_seen_subcommand_from run advise"
+set -l bugreport "__fish_seen_subcommand_from bugreport"
 set -l diff "__fish_seen_subcommand_from diff"
 set -l show "__fish_seen_subcommand_from show; and not __fish_seen_subcommand_from state"
 
@@ -24,6 +25,7 @@ complete -c assay-host -n $none -a explain -d "Explain the keys of a report"
 complete -c assay-host -n $none -a check -d "Hold this machine, or stored reports, to requirements"
 complete -c assay-host -n $none -a advise -d "Tell from memory, or by one attempt, what can be used"
 complete -c assay-host -n $none -a state -d "Show or change what advise remembers"
+complete -c assay-host -n $none -a bugreport -d "Write an archive for a bug report"
 
 complete -c assay-host -n $child -l assay -r -F -d "Program to run"
 complete -c assay-host -n $child -l timeout -x -d "Kill the child after these seconds, 0: never"
@@ -65,3 +67,5 @@ complete -c assay-host -n $advise -l unclear -x -d "Attempts in a row that may s
 complete -c assay-host -n $advise -l unclear-pause -x -d "Before the next attempt after so many, in seconds"
 complete -c assay-host -n $advise -l dry-run -d "Show what the next call would do"
 complete -c assay-host -n $state -a "list show forget set"
+complete -c assay-host -n $bugreport -l output -r -F -d "A new file"
+complete -c assay-host -n $bugreport -l yes -d "Write without asking"

@@ -82,9 +82,9 @@ public:
         fApp.require_subcommand(1);
         fApp.footer("\"assay-host COMMAND --help\" describes a command.");
         std::string names;
-        for (const auto& make :
-             {MakeRunOptions, MakeTortureOptions, MakeDiffOptions, MakeShowOptions,
-              MakeExplainOptions, MakeCheckOptions, MakeAdviseOptions, MakeStateOptions}) {
+        for (const auto& make : {MakeRunOptions, MakeTortureOptions, MakeDiffOptions,
+                                 MakeShowOptions, MakeExplainOptions, MakeCheckOptions,
+                                 MakeAdviseOptions, MakeStateOptions, MakeBugReportOptions}) {
             std::unique_ptr<CommandOptions> options = make();
             const CommandOptions::Help help = options->GetHelp();
             CLI::App* const command = fApp.add_subcommand(help.fName, help.fPurpose);

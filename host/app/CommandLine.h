@@ -92,17 +92,24 @@ struct ShowChoice {
     std::string fOutput; // empty: standard output
 };
 
+struct BugReportChoice {
+    ChildChoice fChild;
+    std::string fOutput; // empty: a name with the time, in the current folder
+    bool fYes = false;   // write without asking
+};
+
 struct ExplainChoice {
     std::vector<std::string> fKeys; // empty: all are listed
 };
 
 using CommandChoice = std::variant<RunChoice, TortureChoice, DiffChoice, ShowChoice, ExplainChoice,
-                                   CheckChoice, AdviseChoice, StateChoice>;
+                                   CheckChoice, AdviseChoice, StateChoice, BugReportChoice>;
 
 // Exit statuses other than those of the verdicts.
 constexpr int kErrorStatus = 10; // of all but diff
 constexpr int kUnmetStatus = 7;  // of check
 constexpr int kDifferentStatus = 1;
+constexpr int kDeclinedStatus = 1; // of bugreport
 constexpr int kDiffErrorStatus = 2;
 
 struct Parsed {

@@ -10,6 +10,7 @@ int Run(const RunChoice& choice);
 int Torture(const TortureChoice& choice);
 int Diff(const DiffChoice& choice);
 int Show(const ShowChoice& choice);
+int BugReport(const BugReportChoice& choice);
 int Explain(const ExplainChoice& choice);
 int Check(const CheckChoice& choice);
 int CheckState(const CheckChoice& choice); // what Check() does for a folder of the state

@@ -61,6 +61,11 @@ int Act(const StateChoice& choice)
     return State(choice);
 }
 
+int Act(const BugReportChoice& choice)
+{
+    return BugReport(choice);
+}
+
 int RunMain(const std::vector<std::string>& words)
 {
     const Parsed parsed = ParseCommandLine(words);

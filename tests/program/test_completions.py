@@ -11,7 +11,7 @@ import pytest
 from harness import PROGRAM, TREE
 from hosting import HOST
 
-COMMANDS = ["run", "torture", "diff", "show", "explain", "check", "advise", "state"]
+COMMANDS = ["run", "torture", "diff", "show", "explain", "check", "advise", "state", "bugreport"]
 FOLDER = TREE / "completions"
 BASH_COMPLETION = Path("/usr/share/bash-completion/bash_completion")
 

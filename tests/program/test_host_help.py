@@ -7,7 +7,7 @@ from hosting import host_run
 HELP = {
     None: """\
 Runs assay as a child process, survives its failures, and shows its report.
-usage: assay-host run|torture|diff|show|explain|check|advise|state [option...]
+usage: assay-host run|torture|diff|show|explain|check|advise|state|bugreport [option...]
 
 Options:
   -h,--help               show this text
@@ -22,6 +22,7 @@ Subcommands:
   check                   hold this machine, or stored reports, to requirements
   advise                  tell from memory, or by one attempt, what can be used
   state                   show or change what advise remembers
+  bugreport               write an archive for a bug report
 
 "assay-host COMMAND --help" describes a command.
 """,
@@ -44,6 +45,21 @@ exit status: 0 complete, 1 failed tests, 2 usage error of the child,
   3 crashed, 4 hung and killed, 5 never started, 6 interrupted,
   10 error in the command line or the output;
   with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown
+""",
+    "bugreport": """\
+write an archive for a bug report
+usage: assay-host bugreport [option...] [-- child option...]
+
+Options:
+  -h,--help               show this text
+  --assay PATH            program to run [beside assay-host, or on the PATH]
+  --timeout SECONDS       kill the child after this time, 0: never [60]
+  --output FILE           a new file [assay-bugreport-TIME.zip in the current folder]
+  --yes                   write without asking
+
+Lists what the archive has, and asks before it writes it.
+exit status: 0 written, also if assay crashed or hung, 1 declined,
+  6 interrupted, 10 error in the command line or the output
 """,
     "torture": """\
 make assay fail at every step and check each outcome

@@ -45,6 +45,7 @@ std::unique_ptr<CommandOptions> MakeRunOptions();
 std::unique_ptr<CommandOptions> MakeTortureOptions();
 std::unique_ptr<CommandOptions> MakeDiffOptions();
 std::unique_ptr<CommandOptions> MakeShowOptions();
+std::unique_ptr<CommandOptions> MakeBugReportOptions();
 std::unique_ptr<CommandOptions> MakeExplainOptions();
 std::unique_ptr<CommandOptions> MakeCheckOptions();
 std::unique_ptr<CommandOptions> MakeAdviseOptions();

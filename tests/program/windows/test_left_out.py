@@ -6,6 +6,7 @@ from conftest import TREE
 
 # The program tests of Linux with their counterparts here, and those without one by reason.
 COUNTERPARTS = {
+    "test_bugreport": "test_windows_host",
     "test_check": "test_windows_host",
     "test_explain": "test_windows_host",
     "test_command_line": "test_windows_command_line",
@@ -33,7 +34,8 @@ LEFT_OUT = {
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},
     "the system's own calls; those of Windows have tests of their own": {
-        "unit/identity", "unit/launch", "unit/library", "unit/pmutil", "unit/supervise"},
+        "unit/bugreport", "unit/identity", "unit/launch", "unit/library", "unit/pmutil",
+        "unit/supervise"},
     "the modes and links of files, which Windows has in another way": {"unit/memory"},
     "Linux's own files, shells and terminals": {
         "program/test_completions", "program/test_hardening", "unit/facts", "unit/output"},

@@ -7,6 +7,7 @@ import signal
 import subprocess
 import sys
 import time
+import zipfile
 from pathlib import Path
 
 import pytest
@@ -270,6 +271,22 @@ def test_forms_of_a_stored_report(tmp_path):
     assert b"OpenGL device glgpu[0]" in page.read_bytes()
     shown = text_of(host_run("show", str(report), "--format", "prometheus").out)
     assert 'assay_run_verdict{verdict="complete"} 1\n' in shown
+
+
+def test_archive_of_a_bug_report(tmp_path):
+    path = tmp_path / "report.zip"
+    run = host_run("bugreport", "--output", str(path), "--yes")
+    assert run.status == 0
+    with zipfile.ZipFile(path) as archive:
+        assert archive.testzip() is None
+        files = {name.split("/")[1]: archive.read(name).decode() for name in archive.namelist()}
+    assert validate_document(files["report.json"])["outcome"]["verdict"] == "complete"
+    assert "wmiNumDevices=" in files["adapters.txt"]
+    assert "event log" in files["kernel.txt"]
+    assert "event log" in files["README.txt"].split("\nMissing:\n")[1]
+    refused = host_run("bugreport", "--output", str(path), "--yes")
+    assert refused.status == 10
+    assert text_of(refused.err).startswith("assay-host: cannot write ")
 
 
 def test_explain():
