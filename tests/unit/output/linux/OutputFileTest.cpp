@@ -12,9 +12,11 @@
 #include <thread>
 #include <vector>
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include "output/Links.h"
@@ -105,6 +107,62 @@ TEST_F(OutputFileTest, AppearsWhenItIsFinished)
     EXPECT_THAT(List(), ElementsAre("report"));
     EXPECT_EQ(Read(path), "one two");
     EXPECT_EQ(GetMode(path), 0640U);
+}
+
+TEST_F(OutputFileTest, MayBeReadAndChangedByAllWhoTheUserAllows)
+{
+    const ::mode_t mask = ::umask(0);
+    WriteAll(GetPath("report"), "text");
+    ::umask(mask);
+    EXPECT_EQ(GetMode(GetPath("report")), 0666U);
+}
+
+TEST_F(OutputFileTest, NamesAFolderThatComesIntoItsPlace)
+{
+    const std::string path = GetPath("report");
+    const std::unique_ptr<Output> output = OpenFile(path);
+    fs::create_directory(path);
+    try {
+        output->Finish();
+        FAIL() << "nothing thrown";
+    } catch (const std::runtime_error& failure) {
+        EXPECT_EQ(failure.what(), "cannot write " + path + ": Is a directory");
+    }
+    output->Abandon();
+    EXPECT_THAT(List(), ElementsAre("report"));
+}
+
+// The path is a link that only the system can follow.
+TEST_F(OutputFileTest, MayBeAnOpenPipe)
+{
+    int ends[2];
+    ASSERT_EQ(::pipe2(ends, O_CLOEXEC), 0);
+    WriteAll("/proc/self/fd/" + std::to_string(ends[1]), "text");
+    char text[8] = {};
+    EXPECT_EQ(::read(ends[0], text, sizeof text), 4);
+    EXPECT_STREQ(text, "text");
+    ::close(ends[0]);
+    ::close(ends[1]);
+}
+
+TEST_F(OutputFileTest, ClosesItsFileAndNoOther)
+{
+    const auto countOpen = [] {
+        return std::distance(fs::directory_iterator("/proc/self/fd"), fs::directory_iterator());
+    };
+    const auto before = countOpen();
+    const std::string path = GetPath("report");
+    const ::pid_t child = ::fork(); // which may lose its streams
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        OpenFile("/dev/null"); // not opened yet
+        WriteAll(path, "finished");
+        OpenFile(path); // not finished
+        ::_exit(countOpen() == before ? 0 : 1);
+    }
+    int status = -1;
+    ASSERT_EQ(::waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
 }
 
 TEST_F(OutputFileTest, LeavesNothingUnfinished)

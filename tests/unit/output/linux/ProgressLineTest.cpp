@@ -114,6 +114,12 @@ TEST(ProgressLine, FitsTheTerminalInPlainCharacters)
         line.Show("caf\xC3\xA9 and more");
     }
     EXPECT_EQ(terminal.Take(), "\rcaf??\r     \r");
+    ErrorTerminal other(6);
+    {
+        ProgressLine line;
+        line.Show("} ~\x7F\x1F");
+    }
+    EXPECT_EQ(other.Take(), "\r} ~??\r     \r");
 }
 
 TEST(ProgressLine, TakesATerminalWithoutAWidthForOneOf80)
