@@ -132,6 +132,13 @@ TEST_F(WindowsRulesTest, FindNamesInTheSystemFolder)
     EXPECT_EQ(List(DeviceKind::kOpenCL), (Names{kSystem + "OpenCL.dll", kSystem + "igdrcl64.dll"}));
 }
 
+TEST_F(WindowsRulesTest, FindNothingForAnEmptyName)
+{
+    fWindows.fFiles[kSystem + ".dll"] = 8;
+    fWindows.fKeys[kClass + kDisplay + "\\0000"] = {{"OpenGLDriverName", {""}, {}}};
+    EXPECT_FALSE(Has(kSystem + ".dll"));
+}
+
 TEST_F(WindowsRulesTest, ReadTheListsForOpenCL)
 {
     fWindows.fKeys[kVendors] = {{R"(C:\Other\pocl.dll)", {}, 0}, {"igdrcl64.dll", {}, 1}};

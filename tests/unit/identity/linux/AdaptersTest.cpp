@@ -115,6 +115,49 @@ TEST(IdentityAdapters, HaveTheModuleOfTheirDriver)
     EXPECT_EQ(print(), "0000:01:00.0 0:0 card_module 1.2\n");
 }
 
+// A device that isn't on PCI, with one node.
+class PlatformDevice {
+public:
+    std::string Print(const std::string& node, const std::string& driver) const
+    {
+        const MachineTree tree;
+        tree.Link("/sys/class/drm/" + node, "../../devices/platform/x.gpu/drm/" + node);
+        tree.Link("/sys/devices/platform/x.gpu/driver", "../../../bus/platform/drivers/" + driver);
+        return assay_host::Print(GetMachineIdentity(tree.GetFiles(), {}).fAdapters);
+    }
+};
+
+TEST(IdentityAdapters, HaveEitherKindOfNode)
+{
+    const PlatformDevice device;
+    EXPECT_EQ(device.Print("card0", "v3d"), "platform/x.gpu 0:0 v3d \n");
+    EXPECT_EQ(device.Print("renderD128", "v3d"), "platform/x.gpu 0:0 v3d \n");
+    for (const char* node : {"card", "card0-DP-1", "controlD64", "renderD", "version"})
+        EXPECT_EQ(device.Print(node, "v3d"), "") << node;
+}
+
+TEST(IdentityAdapters, AreNoneOfADriverOfFramebuffers)
+{
+    const PlatformDevice device;
+    for (const char* driver : {"simple-framebuffer", "of-display"})
+        EXPECT_EQ(device.Print("card0", driver), "") << driver;
+}
+
+TEST(IdentityAdapters, HaveIdsOf16Bits)
+{
+    const MachineTree tree;
+    const std::string card = "/sys/bus/pci/devices/0000:01:00.0/";
+    tree.Write(card + "class", "0x030000\n");
+    const auto print = [&](const char* vendor, const char* device) {
+        tree.Write(card + "vendor", vendor);
+        tree.Write(card + "device", device);
+        return Print(GetMachineIdentity(tree.GetFiles(), {}).fAdapters);
+    };
+    EXPECT_EQ(print("0xffff\n", "0x0001\n"), "0000:01:00.0 ffff:1  \n");
+    EXPECT_EQ(print("0x10000\n", "10de\n"), "0000:01:00.0 0:0  \n");
+    EXPECT_EQ(print("0x10de x\n", "0x\n"), "0000:01:00.0 0:0  \n");
+}
+
 TEST(IdentityAdapters, AreNoFramebuffersOfTheFirmware)
 {
     EXPECT_EQ(PrintAdapters("firmware-only"), "0000:01:00.0 10de:1f08  \n");

@@ -247,6 +247,21 @@ TEST_F(DriverFilesTest, AreThoseThatTheEnvironmentNamesForOpenCL)
     fProcess.fVariables = {{"OCL_ICD_VENDORS", "one.icd"}};
     EXPECT_TRUE(Has("/usr/lib/libone.so"));
     EXPECT_FALSE(Has("/opt/two/libtwo.so"));
+    EXPECT_FALSE(Has("")) << "there is no such file in the folder of the process";
+}
+
+TEST_F(DriverFilesTest, AreFoundByTheFoldersOfTheirLoader)
+{
+    FakeElf loader;
+    loader.fRunPath = "/opt/drivers";
+    for (const char* name : {"/usr/lib/libEGL.so.1.1.0", "/usr/lib/libOpenCL.so.1"})
+        fTree.Write(name, loader.Make());
+    fTree.Write("/opt/drivers/libEGL_x.so.0", MakeLibrary());
+    fTree.Write("/opt/drivers/libcl_x.so", MakeLibrary());
+    fTree.Write("/usr/share/glvnd/egl_vendor.d/60.json", MakeVendor("libEGL_x.so.0"));
+    fTree.Write("/etc/OpenCL/vendors/x.icd", "libcl_x.so");
+    EXPECT_TRUE(Has("/opt/drivers/libEGL_x.so.0"));
+    EXPECT_TRUE(Has("/opt/drivers/libcl_x.so"));
 }
 
 TEST_F(DriverFilesTest, HaveTheVariablesThatSelectAmongThem)

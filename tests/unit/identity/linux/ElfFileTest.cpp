@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -44,6 +45,25 @@ TEST(ElfFile, HasFoldersToSearch)
     const ElfFile first = Read(fake.Make());
     EXPECT_EQ(first.fRunPath, Names{"/first"});
     EXPECT_TRUE(first.fIsRunPathFirst);
+}
+
+// Changes the type of a segment: 0 holds the names, 1 the notes, 2 the entries.
+std::string ChangeType(std::string file, std::size_t segment, std::uint32_t type)
+{
+    std::memcpy(&file[sizeof(ElfW(Ehdr)) + segment * sizeof(ElfW(Phdr))], &type, sizeof type);
+    return file;
+}
+
+TEST(ElfFile, HasEachPartInItsKindOfSegment)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1"};
+    const std::string file = fake.Make();
+    EXPECT_EQ(Read(file).fNeeded, fake.fNeeded);
+    EXPECT_EQ(Read(file).fBuildId, "1234");
+    EXPECT_EQ(Read(ChangeType(file, 0, PT_GNU_RELRO)).fNeeded, Names());
+    EXPECT_EQ(Read(ChangeType(file, 1, PT_LOAD)).fBuildId, "");
+    EXPECT_EQ(Read(ChangeType(file, 2, PT_NULL)).fNeeded, Names());
 }
 
 TEST(ElfFile, IsEmptyForAnotherFile)

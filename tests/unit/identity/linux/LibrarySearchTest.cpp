@@ -45,6 +45,18 @@ TEST(LibraryCache, ReadsTheTableAfterAnOldOne)
     EXPECT_EQ(LibraryCache(old).Find("a"), Names());
 }
 
+TEST(LibraryCache, HasNoMoreEntriesThanItsFileHolds)
+{
+    std::string file = MakeLibraryCache({{"a", "/a"}, {"b", "/b"}}, kCacheFlags);
+    constexpr std::size_t kCount = 20;
+    ASSERT_EQ(file[kCount], 2);
+    file[kCount] = 3;
+    EXPECT_EQ(LibraryCache(file).Find("a"), Names());
+    file[kCount] = 1;
+    EXPECT_EQ(LibraryCache(file).Find("a"), Names{"/a"});
+    EXPECT_EQ(LibraryCache(file).Find("b"), Names());
+}
+
 TEST(LibraryCache, MayBeDamaged)
 {
     const std::string whole = MakeLibraryCache({{"a", "/a"}, {"b", "/b"}}, kCacheFlags);
