@@ -101,9 +101,9 @@ bool Checker::CheckBaseline(const Report& report, const std::string& prefix)
 
 std::string Checker::GetWhatIsMet() const
 {
-    const std::string all = fRequirements.size() == 1
-                                ? "the requirement"
-                                : fmt::format("all {} requirements", fRequirements.size());
+    std::string all = fRequirements.size() == 1
+                          ? "the requirement"
+                          : fmt::format("all {} requirements", fRequirements.size());
     if (!fBaseline)
         return all;
     return fRequirements.empty() ? "the baseline" : all + " and the baseline";
