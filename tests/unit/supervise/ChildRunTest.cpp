@@ -195,7 +195,7 @@ TEST(ChildRun, TellsACrashAndWhereItCame)
                 testing::AnyOf(StartsWith("signal "), StartsWith("code 0x")));
     EXPECT_EQ(run.fOutcome.fLastReportLine, "QGFOGLInitialized=1");
     EXPECT_EQ(run.fOutcome.fLastLogLine, "# a log line");
-    EXPECT_THAT(run.fOutcome.fReason, HasSubstr("at OGLContextCreated"));
+    EXPECT_THAT(run.fOutcome.fReason, HasSubstr("(OGLContextCreated)"));
 }
 
 TEST(ChildRun, KillsAChildThatHangs)

@@ -207,7 +207,7 @@ TEST_F(LauncherPosixRefusal, OfADescriptorOfTheChildEndsIt)
         Refuse(SYS_pidfd_open, -1, 0, ENOSYS);
         LauncherPosix launcher;
         REQUIRE_SO(Fail([&] {
-                       launcher.Launch(L"/bin/sh", {"-c", "sleep 1000"});
+                       launcher.Launch(L"/bin/sh", {"-c", "exec sleep 1000"});
                    }) == "pidfd_open failed: /bin/sh: Function not implemented");
         REQUIRE_SO(!HasAnyChild());
     });

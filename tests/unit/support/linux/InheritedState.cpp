@@ -42,8 +42,8 @@ void OpenStandardStreams()
             ::open("/dev/null", O_RDWR); // NOLINT: no O_CLOEXEC, as any standard stream
 }
 
-// If this is the first process of a container, continues in a child. The parent reaps all children,
-// and ends with the child's status.
+// If this is the first process of a container, continues in a child. The parent reaps all children
+// until that one has ended, and ends with its status, which ends whatever a test has left.
 void LeaveFirstProcess()
 {
     if (::getpid() != 1)
@@ -52,16 +52,8 @@ void LeaveFirstProcess()
     if (child <= 0)
         return;
     int status = 0;
-    for (;;) {
-        int each = 0;
-        const ::pid_t ended = ::wait(&each);
-        if (ended == child)
-            status = each;
-        else if (ended > 0 || errno == EINTR)
-            continue;
-        else
-            break;
-    }
+    for (::pid_t ended = 0; ended != child && (ended >= 0 || errno == EINTR);)
+        ended = ::wait(&status);
     std::_Exit(WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status));
 }
 
