@@ -10,6 +10,8 @@
 
 #include <link.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include "facts/linux/ElfNotes.h"
 
@@ -88,6 +90,25 @@ TEST_F(DescribeFilesInFolder, FollowsSymbolicLinks)
     EXPECT_EQ(file.fPath, fFolder + "/libEGL_x.so.1.2.3");
     EXPECT_EQ(file.fVersion.fValue, "1.2.3");
     EXPECT_EQ(file.fBuildId.fReason, "the file has none");
+}
+
+TEST_F(DescribeFilesInFolder, MayBeUnreadable)
+{
+    const std::string path = fFolder + "/libx.so.1";
+    std::ofstream(path) << "not an ELF file";
+    ASSERT_EQ(chmod(fFolder.c_str(), 0755), 0);
+    ASSERT_EQ(chmod(path.c_str(), 0), 0);
+    const pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        constexpr uid_t kNobody = 65534;
+        if (geteuid() == 0 && seteuid(kNobody) != 0)
+            _exit(2);
+        _exit(Describe(path).fBuildId.fReason == "the file can't be read" ? 0 : 1);
+    }
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
 }
 
 TEST_F(DescribeFilesInFolder, OpensOnlyFiles)

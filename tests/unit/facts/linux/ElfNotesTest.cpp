@@ -168,6 +168,13 @@ TEST(ElfNotes, AreReadFromThisMachinesKindOfFileOnly)
         EXPECT_EQ(Find(file.substr(0, size), "own", 1), "") << size;
 }
 
+TEST(MakeHexText, HasTwoDigitsOfEachByte)
+{
+    EXPECT_EQ(MakeHexText(""), "");
+    EXPECT_EQ(MakeHexText("\x01\x23\x45\x67\x89\xAB\xCD\xEF"), "0123456789abcdef");
+    EXPECT_EQ(MakeHexText(std::string("\x10\x00\xFF", 3)), "1000ff");
+}
+
 TEST(FileVersion, IsTheTextOfTheNoteUpToItsZero)
 {
     const std::string path = testing::TempDir() + "assay-note-" + std::to_string(::getpid());

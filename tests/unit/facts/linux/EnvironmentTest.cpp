@@ -7,7 +7,11 @@
 #include <iterator>
 #include <string>
 
+#include <sched.h>
+#include <sys/mount.h>
 #include <sys/utsname.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include "facts/Environment.h"
 #include "facts/OsRelease.h"
@@ -58,6 +62,37 @@ TEST(EnvironmentOfLinux, HasTheTimeAndItsOffset)
     else
         ::setenv("TZ", before.c_str(), 1);
     ::tzset();
+}
+
+// Has empty files in the place of those that name the system, for this process alone.
+bool HideOsRelease()
+{
+    return ::unshare(CLONE_NEWNS) == 0 &&
+           ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
+           ::mount("/dev/null", "/etc/os-release", nullptr, MS_BIND, nullptr) == 0 &&
+           ::mount("/dev/null", "/usr/lib/os-release", nullptr, MS_BIND, nullptr) == 0;
+}
+
+TEST(EnvironmentOfLinux, SaysWhyTheSystemHasNoName)
+{
+    constexpr int kNotHidden = 77;
+    const ::pid_t child = ::fork();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        if (!HideOsRelease())
+            ::_exit(kNotHidden);
+        const Environment environment = GetEnvironment(false);
+        ::_exit(environment.fSystem.fReason == "no os-release names it" &&
+                        environment.fBuild.fReason == "no os-release has it"
+                    ? 0
+                    : 1);
+    }
+    int status = -1;
+    ASSERT_EQ(::waitpid(child, &status, 0), child);
+    ASSERT_TRUE(WIFEXITED(status));
+    if (WEXITSTATUS(status) == kNotHidden)
+        GTEST_SKIP() << "only root can hide files";
+    EXPECT_EQ(WEXITSTATUS(status), 0);
 }
 
 } // namespace
