@@ -9,6 +9,7 @@
 
 #include "Lines.h"
 #include "Samples.h"
+#include "report/Warnings.h"
 
 namespace assay_host {
 namespace {
@@ -46,6 +47,20 @@ TEST(AnsibleFacts, AreOneObject)
             "framebuffers_work": true, "memory_bytes": 25757220864}]})"));
     EXPECT_EQ(facts["opencl"]["devices"][0]["copy_bytes_per_second"], 834512000000);
     EXPECT_EQ(facts["opencl"]["devices"][0]["compute_score"], 1234.56);
+}
+
+TEST(AnsibleFacts, HaveTheWarningsOfARun)
+{
+    const std::string report = Sample(2, 0)
+                                   .Set("glgpu[0].GLFrameBufferOK", "0")
+                                   .Set("glgpu[1].GLFrameBufferOK", "0")
+                                   .GetText();
+    Json expected = Json::array();
+    const Report read = ReadReport(report);
+    for (const Warning& warning : GetWarnings(GetAnswers(read), {}))
+        expected.push_back(GetWarningText(warning));
+    EXPECT_EQ(expected.size(), 2U);
+    EXPECT_EQ(Get(report)["warnings"], expected);
 }
 
 TEST(AnsibleFacts, LeaveOutWhatIsNotKnown)

@@ -102,6 +102,9 @@ TEST(NodeFeatures, LeaveOutWhatIsNotKnown)
                 testing::Each(testing::AllOf(Not(testing::HasSubstr("gl.memory")),
                                              Not(testing::HasSubstr("gl.name=")))));
     EXPECT_THAT(Read(text).fOthers, testing::Contains("opengl.0.name=(("));
+    const std::string nameless = GetText(
+        Sample(1, 0).Set("glgpu[0].GLName", "\"\"").Set("glgpu[0].GLRenderer", "\"\"").GetText());
+    EXPECT_THAT(Read(nameless).fOthers, testing::Each(Not(testing::StartsWith("opengl.0.name="))));
     EXPECT_THAT(Read(GetText("", Verdict::kNeverStarted)).fLabels,
                 testing::ElementsAre("verdict=never-started", "opengl.usable=unknown",
                                      "opencl.usable=unknown"));
@@ -110,6 +113,8 @@ TEST(NodeFeatures, LeaveOutWhatIsNotKnown)
 TEST(NodeFeatures, HaveValuesOfLabels)
 {
     EXPECT_EQ(MakeLabelValue("plain"), "plain");
+    EXPECT_EQ(MakeLabelValue("azAZ09"), "azAZ09");
+    EXPECT_EQ(MakeLabelValue("a`b{c@d[e/f:g"), "a-b-c-d-e-f-g");
     EXPECT_EQ(MakeLabelValue("a b  c"), "a-b-c");
     EXPECT_EQ(MakeLabelValue("-._a_b.c-_."), "a_b.c");
     EXPECT_EQ(MakeLabelValue("\xC3\xA9-\xC3\xA9"), "");
@@ -145,7 +150,14 @@ TEST(NodeFeatures, FitIntoTheLargestFile)
     const std::string large = GetText(Sample(256, 256).GetText());
     EXPECT_LE(large.size(), kMaxFeatureFileBytes);
     EXPECT_GT(large.size(), kMaxFeatureFileBytes - 200);
-    EXPECT_TRUE(std::regex_search(large, std::regex("\n# left out beyond 65536 bytes: [0-9]+\n")));
+    const auto count = [](const std::string& file) {
+        static const std::regex gFeature("# \\+no-label\n");
+        return std::distance(std::sregex_iterator(file.begin(), file.end(), gFeature), {});
+    };
+    const auto leftOut = 256 * count(GetText(Sample(1, 1).GetText())) - count(large);
+    EXPECT_GT(leftOut, 0);
+    EXPECT_THAT(large, testing::EndsWith(
+                           "\n# left out beyond 65536 bytes: " + std::to_string(leftOut) + "\n"));
     EXPECT_THAT(Read(large).fLabels, testing::Contains("opencl.devices=256"));
 }
 
