@@ -335,6 +335,20 @@ TEST(SystemTest, DesktopFolderIsTheOneOfThePasswordDatabase)
     EXPECT_EQ(GetDesktopFolder(), boost::filesystem::path(home + "/Desktop").wstring());
 }
 
+TEST(SystemTest, DesktopFolderIsNoneOfAUserWhoIsNotInThePasswordDatabase)
+{
+    constexpr uid_t kUnknown = 4'242'424;
+    if (geteuid() != 0 || getpwuid(kUnknown) != nullptr) // NOLINT(concurrency-mt-unsafe)
+        GTEST_SKIP() << "only root can become a user who isn't there";
+    const pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0)
+        _exit(setuid(kUnknown) == 0 && GetDesktopFolder().empty() ? 0 : 1);
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
+}
+
 TEST(SystemTest, DesktopFolderAsksNoEnvironment)
 {
     const std::wstring before = GetDesktopFolder();

@@ -26,6 +26,8 @@ TEST(UserDirsTest, FindsTheDesktop)
         {"#XDG_DESKTOP_DIR=\"$HOME/a\"\n", ""},
         {"XDG_DESKTOP_DIR=\"relative\"\n", ""},
         {"XDG_DESKTOP_DIR=\"$HOMER/a\"\n", ""},
+        {"XDG_DESKTOP_DIR=\"/a\\", "/a\\"},
+        {"XDG_DESKTOP_DIR=\"/a", "/a"},
         {"XDG_DESKTOP_DIR=$HOME/a\n", ""},
         {"XDG_DESKTOP_DIR\n", ""},
         {"XDG_DESKTOP_DIR=\"\"\n", ""},
