@@ -39,12 +39,13 @@ SlurmdSpoolDir={folder}/spool
 SlurmctldPidFile={folder}/slurmctld.pid
 SlurmdPidFile={folder}/slurmd.pid
 SchedulerParameters=sched_interval=1
-HealthCheckProgram={folder}/health
-HealthCheckInterval=1
-HealthCheckNodeState=IDLE
+{uses}
 NodeName=machine NodeHostname={host} NodeAddr=127.0.0.1 CPUs=1 RealMemory=100 State=UNKNOWN
 PartitionName=all Nodes=ALL Default=YES State=UP MaxTime=INFINITE
 """
+
+HEALTH_CHECK = "HealthCheckProgram={folder}/health\nHealthCheckInterval=1\nHealthCheckNodeState=IDLE"
+PROLOG = "Prolog={folder}/health"
 
 
 def write_program(path, text):
@@ -156,7 +157,7 @@ def test_script_passes_shellcheck():
 class Cluster:
     """slurmctld, slurmd and munged of one machine, on the loopback address."""
 
-    def __init__(self, folder, environment, script):
+    def __init__(self, folder, environment, script, uses):
         if os.geteuid() != 0:
             pytest.skip("slurmd needs root")
         munged, slurmctld, slurmd, self.scontrol = needed("munged", "slurmctld", "slurmd",
@@ -170,7 +171,7 @@ class Cluster:
         key = folder / "key"
         key.write_bytes(os.urandom(128))
         key.chmod(0o600)
-        self.write_configuration()
+        self.write_configuration(uses.format(folder=folder))
         (folder / "cgroup.conf").write_text("CgroupPlugin=autodetect\n")
         (folder / "requirements.json").write_text(REQUIREMENT)
         self.set()
@@ -196,7 +197,7 @@ class Cluster:
         new.write_text("".join(f"{name}={value}\n" for name, value in variables.items()))
         new.rename(self.folder / "settings")
 
-    def write_configuration(self):
+    def write_configuration(self, uses):
         sockets = [socket.socket() for _ in range(2)]
         for each in sockets:
             each.bind(("127.0.0.1", 0))
@@ -204,7 +205,7 @@ class Cluster:
         for each in sockets:
             each.close()
         self.configuration.write_text(CONFIGURATION.format(
-            host=socket.gethostname().split(".")[0], ports=ports, folder=self.folder))
+            host=socket.gethostname().split(".")[0], ports=ports, folder=self.folder, uses=uses))
 
     def __enter__(self):
         self.started = []
@@ -237,15 +238,15 @@ class Cluster:
         return self.ask("sinfo", "--noheader", "--format=%T")
 
 
-@pytest.fixture(name="cluster")
-def fixture_cluster(host):
+@pytest.fixture(name="cluster", params=[HEALTH_CHECK], ids=["health-check"])
+def fixture_cluster(host, request):
     # munged refuses folders that others can't enter, which pytest's are.
     folder = Path(tempfile.mkdtemp(prefix="assay-slurm-"))
     folder.chmod(0o755)
     script = folder / "driver"
     script.write_text(Gpu().script(), encoding="ascii")
     try:
-        with Cluster(folder, host.environment(script=script), script) as cluster:
+        with Cluster(folder, host.environment(script=script), script, request.param) as cluster:
             yield cluster
     finally:
         shutil.rmtree(folder)
@@ -297,3 +298,22 @@ def test_node_with_a_hanging_driver_is_drained_and_resumed(cluster):
     assert cluster.reason() == ""
     # What hung is gone.
     assert processes_with(bytes(hanging)) == []
+
+
+@pytest.mark.parametrize("cluster", [PROLOG], ids=["prolog"], indirect=True)
+def test_prolog_keeps_a_job_from_a_node_with_a_crashing_driver(cluster):
+    until(lambda: cluster.state() == "idle", "the node doesn't come up")
+    jobs = {}
+    for name in "first", "second":
+        jobs[name] = write_program(cluster.folder / name, f"touch {cluster.folder}/ran-{name}\n")
+    cluster.ask("sbatch", "--output=/dev/null", jobs["first"])
+    until((cluster.folder / "ran-first").exists, "no job runs on a node that works")
+    until(lambda: cluster.state() == "idle", "the job doesn't end")
+    assert cluster.reason() == ""
+
+    cluster.script.write_text(Gpu().script() + "at glCompileShader crash\n", encoding="ascii")
+    cluster.ask("sbatch", "--output=/dev/null", jobs["second"])
+    until(lambda: "held" in cluster.ask("squeue", "--noheader", "--format=%r"), "the job isn't held")
+    until(lambda: cluster.state() == "drained", "the node isn't drained")
+    assert cluster.reason().startswith("assay: crashed: ")
+    assert not (cluster.folder / "ran-second").exists()
