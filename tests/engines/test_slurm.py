@@ -109,6 +109,8 @@ RESUME = "update|NodeName=n1|State=RESUME|"
     (7, "not met: GLName==\"a 'b'\": " + "x" * 999, IDLE,
      DRAIN(("not met: GLName==a b: " + "x" * 999)[:200])),
     (124, "", IDLE, DRAIN("the check did not end within 38 s")),
+    (1, "failed-tests: x", IDLE, DRAIN("failed-tests: x")),
+    (2, "usage-error: x", IDLE, ""),
     (5, "never-started: x", IDLE, ""),
     (6, "interrupted: x", OURS, ""),
     (10, "assay-host: /etc/assay/requirements.json: cannot be opened", IDLE, ""),
@@ -117,7 +119,7 @@ RESUME = "update|NodeName=n1|State=RESUME|"
 def test_decisions(tmp_path, status, output, node, change):
     stage = Stage(tmp_path)
     assert stage.run(status, output, node) == (0, change)
-    is_bad = status in (3, 4, 7, 124)
+    is_bad = status in (1, 3, 4, 7, 124)
     assert stage.run(status, output, node, job=True) == (int(is_bad), change)
 
 
