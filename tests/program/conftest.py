@@ -7,6 +7,7 @@ import pytest
 # Must precede the first import, or failed assertions don't show the values.
 pytest.register_assert_rewrite("calls", "clmodel", "harness", "hosting", "model", "starts", "sweep")
 
+import emulation  # noqa: E402
 import harness  # noqa: E402
 
 
@@ -25,10 +26,14 @@ def host(tmp_path):
 
 
 def pytest_collection_modifyitems(items):
-    """Reports a missing program once, instead of failing each test."""
+    """Reports a missing program once, instead of failing each test. Skips what can't be emulated."""
     if not harness.PROGRAM.exists():
         raise pytest.UsageError(
             f"{harness.PROGRAM} doesn't exist: build first, or set ASSAY_BUILD_DIR")
+    for item in items if harness.EMULATED else []:
+        reason = emulation.reason_of(item.path.stem.removeprefix("test_"), item.name)
+        if reason:
+            item.add_marker(pytest.mark.skip(reason=reason))
 
 
 CLOSING_LINES = []

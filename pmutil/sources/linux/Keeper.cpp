@@ -162,14 +162,17 @@ public:
         volatile int error = 0;
         int pidfd = -1;
         // As vfork: the keeper continues when the child has begun the program or ended.
-        const long child =
+        long child =
             RawCall(SYS_clone, CLONE_VM | CLONE_VFORK | CLONE_PIDFD | SIGCHLD, 0, Pass(&pidfd));
+        // An emulator of another processor has no CLONE_PIDFD.
+        if (child == -EINVAL)
+            child = RawCall(SYS_clone, CLONE_VM | CLONE_VFORK | SIGCHLD, 0, 0);
         if (child == 0)
             StartProgram(plan, fSelf, error);
         if (child < 0)
             return static_cast<int>(-child);
         fChild = static_cast<int>(child);
-        fPidfd = pidfd;
+        fPidfd = pidfd >= 0 ? pidfd : static_cast<int>(RawCall(SYS_pidfd_open, child, 0));
         return error;
     }
 
