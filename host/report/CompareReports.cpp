@@ -146,8 +146,17 @@ private:
                  std::optional<std::string> after, std::string note,
                  const DevicePair& pair = {nullptr, nullptr})
     {
-        fComparison.fDifferences.push_back({group, pair.fBefore, pair.fAfter, nullptr, nullptr, key,
-                                            std::move(before), std::move(after), std::move(note)});
+        fComparison.fDifferences.push_back({group,
+                                            pair.fBefore,
+                                            pair.fAfter,
+                                            nullptr,
+                                            nullptr,
+                                            key,
+                                            std::move(before),
+                                            std::move(after),
+                                            {},
+                                            {},
+                                            std::move(note)});
     }
 
     const Report& fReportBefore;
@@ -264,7 +273,7 @@ void Comparer::CompareAnswer(const DevicePair& pair, const Answer* before, const
         return;
     }
     fComparison.fDifferences.push_back(
-        {group, pair.fBefore, pair.fAfter, before, after, {}, {}, {}, std::move(note)});
+        {group, pair.fBefore, pair.fAfter, before, after, {}, {}, {}, {}, {}, std::move(note)});
 }
 
 // Counts an answer that one run doesn't have because it, or the device, failed before. Returns

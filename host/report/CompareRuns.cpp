@@ -7,6 +7,7 @@
 
 #include <fmt/format.h>
 
+#include "report/RunText.h"
 #include "report/Usable.h"
 
 namespace assay_host {
@@ -80,10 +81,15 @@ private:
         const RunOutcome after = Reduce(fAfter, fExtent);
         constexpr std::pair<DeviceKind, const char*> kKeys[] = {
             {DeviceKind::kOpenGL, "opengl.usable"}, {DeviceKind::kOpenCL, "opencl.usable"}};
-        for (const auto& [kind, key] : kKeys)
-            AddText(DiffGroup::kUsable, key,
-                    GetUsabilityText(JudgeUsable(kind, fComparison.fBefore, before)),
-                    GetUsabilityText(JudgeUsable(kind, fComparison.fAfter, after)));
+        for (const auto& [kind, key] : kKeys) {
+            const Usable first = JudgeUsable(kind, fComparison.fBefore, before);
+            const Usable second = JudgeUsable(kind, fComparison.fAfter, after);
+            if (!AddText(DiffGroup::kUsable, key, GetUsabilityText(first),
+                         GetUsabilityText(second)))
+                continue;
+            fComparison.fDifferences.back().fTextBefore = GetUsableText(first);
+            fComparison.fDifferences.back().fTextAfter = GetUsableText(second);
+        }
     }
 
     void CompareIdentity()
@@ -95,11 +101,12 @@ private:
         AddText(DiffGroup::kIdentity, "time", GetIfKnown(before.fTime), GetIfKnown(after.fTime));
     }
 
-    void AddText(DiffGroup group, const char* key, std::optional<std::string> before,
+    // Returns whether there is a difference.
+    bool AddText(DiffGroup group, const char* key, std::optional<std::string> before,
                  std::optional<std::string> after)
     {
         if (before == after)
-            return;
+            return false;
         Difference difference;
         difference.fGroup = group;
         difference.fKey = key;
@@ -107,6 +114,7 @@ private:
         difference.fAfter = std::move(after);
         fComparison.fDifferences.push_back(std::move(difference));
         ++fAdded;
+        return true;
     }
 
     const StoredRun& fBefore;

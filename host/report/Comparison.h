@@ -40,8 +40,12 @@ struct Difference {
     std::optional<std::string> fBefore;
     std::optional<std::string> fAfter;
 
+    // The same for people, safe to write to a terminal. Empty: as they are.
+    std::string fTextBefore{};
+    std::string fTextAfter{};
+
     // What more there is to say, safe to write to a terminal; may be empty.
-    std::string fNote;
+    std::string fNote{};
 
     bool IsOfAnswer() const { return fAnswerBefore != nullptr || fAnswerAfter != nullptr; }
     bool IsOfDevice() const { return !IsOfAnswer() && fKey.empty(); }

@@ -28,30 +28,30 @@ constexpr struct {
 DiffValue GetAnswerValue(const Answer* answer)
 {
     if (!answer)
-        return {false, "missing", "not in the report"};
+        return {false, "", "missing", "not in the report"};
     if (!answer->fLine) {
         const char* const reason = GetMissingText(answer->fMissing);
-        return {false, fmt::format("missing ({})", reason), reason};
+        return {false, "", fmt::format("missing ({})", reason), reason};
     }
     const ReportLine& line = *answer->fLine;
     const std::string value = ShowBytes(line.fValue);
-    return {true, line.fQuoted ? "\"" + value + "\"" : value, GetValueText(*answer)};
+    return {true, line.fValue, line.fQuoted ? "\"" + value + "\"" : value, GetValueText(*answer)};
 }
 
 DiffValue GetDeviceValue(const DeviceAnswers* device)
 {
     if (!device)
-        return {false, "missing", "not in the report"};
+        return {false, "", "missing", "not in the report"};
     const std::string text = GetDeviceText(*device);
-    return {true, text, text};
+    return {true, device->fTag, text, text};
 }
 
-DiffValue GetTextValue(const std::optional<std::string>& text)
+DiffValue GetTextValue(const std::optional<std::string>& text, const std::string& forPeople)
 {
     if (!text)
-        return {false, "not known", "not known"};
+        return {false, "", "not known", "not known"};
     const std::string shown = ShowBytes(*text);
-    return {true, shown, shown};
+    return {true, *text, shown, forPeople.empty() ? shown : forPeople};
 }
 
 } // namespace
@@ -60,14 +60,14 @@ DiffValue GetValueBefore(const Difference& difference)
 {
     return difference.IsOfAnswer()   ? GetAnswerValue(difference.fAnswerBefore)
            : difference.IsOfDevice() ? GetDeviceValue(difference.fDeviceBefore)
-                                     : GetTextValue(difference.fBefore);
+                                     : GetTextValue(difference.fBefore, difference.fTextBefore);
 }
 
 DiffValue GetValueAfter(const Difference& difference)
 {
     return difference.IsOfAnswer()   ? GetAnswerValue(difference.fAnswerAfter)
            : difference.IsOfDevice() ? GetDeviceValue(difference.fDeviceAfter)
-                                     : GetTextValue(difference.fAfter);
+                                     : GetTextValue(difference.fAfter, difference.fTextAfter);
 }
 
 std::string GetDiffTag(const Difference& difference)

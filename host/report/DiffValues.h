@@ -11,7 +11,8 @@ namespace assay_host {
 // One side of a difference.
 struct DiffValue {
     bool fIsThere = false;
-    std::string fValue; // as the report has it, with its quotes; "missing (REASON)"
+    std::string fBytes; // as the report has it, without its quotes; any bytes
+    std::string fValue; // the same, safe and with its quotes; "missing (REASON)"
     std::string fText;  // for people, with its unit; if it isn't there, the reason
 };
 

@@ -37,6 +37,7 @@ EVENTS = {number: _validator(f"assay-events-{number}.schema.json") for number in
 
 
 ADVICE = _validator("assay-advice-1.schema.json")
+DIFF = _validator("assay-diff-1.schema.json")
 
 
 def validate_advice(data):
@@ -44,6 +45,13 @@ def validate_advice(data):
     advice = _load(data.decode("utf-8"))
     ADVICE.validate(advice)
     return advice
+
+
+def validate_diff(data):
+    """The differences in these bytes; raises as validate_advice does."""
+    diff = _load(data.decode("utf-8"))
+    DIFF.validate(diff)
+    return diff
 
 
 def document_validator(document):
