@@ -32,6 +32,7 @@ _assay_host() {
     --format)
         local forms="text json jsonl html prometheus nfd ansible"
         [ "$command" = advise ] && forms="text env json"
+        [ "$command" = diff ] && forms="text json html"
         [ "$command" = show ] && forms="text json html prometheus nfd ansible"
         COMPREPLY=($(compgen -W "$forms" -- "$cur"))
         return
@@ -58,7 +59,7 @@ _assay_host() {
     case $command in
     run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
-    diff) options+=" --tolerance --identity --all" ;;
+    diff) options+=" --format --output --tolerance --identity --all" ;;
     explain) ;;
     show) options+=" --format --schema --output" ;;
     check)

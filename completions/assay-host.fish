@@ -38,6 +38,8 @@ complete -c assay-host -n $run -l output -r -F -d "Write to this file"
 complete -c assay-host -n $torture -l kind -x -a "crash throw both" -d "Kind of failure"
 complete -c assay-host -n $diff -F
 complete -c assay-host -n $diff -l identity -d "Compare the machines' names and the times too"
+complete -c assay-host -n $diff -l format -x -a "text json html" -d "Form of the output"
+complete -c assay-host -n $diff -l output -r -F -d "Write to this file"
 complete -c assay-host -n $diff -l all -d "Each key that a run did not reach, and gputag lines"
 complete -c assay-host -n $check -l baseline -r -F -d "The report of a good machine"
 complete -c assay-host -n $check -l tolerance -x -d "By which a measurement may be below it"

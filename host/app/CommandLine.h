@@ -78,6 +78,8 @@ struct CheckChoice {
 };
 
 struct DiffChoice {
+    Format fFormat = Format::kText; // or kJson, kHtml
+    std::string fOutput;            // empty: standard output
     std::string fBefore;
     std::vector<std::string> fAfter; // at least one
     double fTolerance = 0.1;         // as MeasurementRule::fTolerance

@@ -98,6 +98,8 @@ def test_values_of_options():
     assert in_fish("assay-host torture --kind ") == {"crash", "throw", "both"}
     assert in_bash("assay-host", "advise", "--format", "") == {"text", "env", "json"}
     assert in_fish("assay-host advise --format ") == {"text", "env", "json"}
+    assert in_bash("assay-host", "diff", "--format", "") == {"text", "json", "html"}
+    assert in_fish("assay-host diff --format ") == {"text", "json", "html"}
     forms = {"text", "json", "html", "prometheus", "nfd", "ansible"}
     assert in_bash("assay-host", "show", "--format", "") == forms
     assert in_fish("assay-host show --format ") == forms

@@ -84,6 +84,8 @@ Positionals:
 
 Options:
   -h,--help               show this text
+  --format FORMAT         [text], json, html
+  --output FILE           write to this file [standard output]
   --tolerance FRACTION    of measurements, relative to the larger one [0.1]
   --identity              compare the machines' names and the times too
   --all                   each key that a run did not reach, and gputag lines

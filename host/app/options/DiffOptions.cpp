@@ -21,6 +21,10 @@ public:
         AddFiles(command, "B", fChoice.fAfter,
                  "the other report; of several, each is compared with A")
             ->required();
+        AddWord(command, "--format", fFormat, "[text], json, html", "FORMAT",
+                {"text", "json", "html"});
+        AddText(command, "--output", fChoice.fOutput, "write to this file [standard output]",
+                "FILE");
         AddNumber(command, "--tolerance", fChoice.fTolerance,
                   "of measurements, relative to the larger one [0.1]", "FRACTION");
         command.add_flag("--identity", fChoice.fIdentity,
@@ -32,11 +36,13 @@ public:
     CommandChoice Choose(const CLI::App& /*command*/,
                          const std::vector<std::string>& /*childWords*/) override
     {
+        fChoice.fFormat = ReadFormat(fFormat);
         return fChoice;
     }
 
 private:
     DiffChoice fChoice;
+    std::string fFormat = "text";
 };
 
 } // namespace
