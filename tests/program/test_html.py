@@ -36,12 +36,12 @@ def run(folder, *options, gl="", cl="", child=(), cards=None):
                     environment=host.environment(**found))
 
 
-def healthy(folder):
-    return run(folder, "--format", "html")
+def healthy(folder, form="html"):
+    return run(folder, "--format", form)
 
 
-def crashed(folder):
-    return run(folder, "--format", "html", gl="at glLinkProgram crash\n")
+def crashed(folder, form="html"):
+    return run(folder, "--format", form, gl="at glLinkProgram crash\n")
 
 
 def two_cards(folder):
@@ -60,7 +60,7 @@ def never_started(folder):
     return host_run("run", "--assay", str(folder / "nothing"), "--format", "html")
 
 
-def hostile(folder):
+def hostile(folder, form="html"):
     """Each line of a whole report with a text that could do harm, and one of 64 KiB."""
     (folder / "plain").mkdir()
     lines = run(folder / "plain", "--raw").text.split("\n\n")[0].splitlines()
@@ -72,7 +72,7 @@ def hostile(folder):
     (folder / "text").write_text(text, encoding="utf-8")
     (folder / "errors").write_text(long + "\n" + HOSTILE, encoding="utf-8")
     child = script_child(folder, f'cat "{folder}/text"; cat "{folder}/errors" >&2')
-    return host_run("run", "--assay", str(child), "--format", "html")
+    return host_run("run", "--assay", str(child), "--format", form)
 
 
 PAGES = {"healthy": healthy, "crashed": crashed, "two-cards": two_cards, "trial-failed": trial_failed,
@@ -221,11 +221,9 @@ def test_only_text_takes_raw(tmp_path):
 PICTURES = TREE / "docs" / "pictures"
 
 
-@pytest.mark.parametrize("name", ["healthy", "crashed", "two-cards"])
-def test_the_pictures_in_the_documentation(window, pages, name, tmp_path):
-    """A picture is of the page as it is: the landmarks, headings and terms are those that were there
-    when it was taken. ASSAY_NEW_PICTURES=1 takes them again."""
-    window.open(pages[name], width=1000)
+def check_picture(window, name, folder):
+    """Compares the page in the window with its picture: the landmarks, headings and terms are those that
+    were there when it was taken. ASSAY_NEW_PICTURES=1 takes it again."""
     outline = "\n".join(window.outline()) + "\n"
     # What is this machine's own is left out of a picture.
     window.run("""
@@ -239,10 +237,16 @@ def test_the_pictures_in_the_documentation(window, pages, name, tmp_path):
         window.picture(PICTURES / f"{name}.png")
         (PICTURES / f"{name}.txt").write_text(outline, encoding="utf-8")
     assert outline == (PICTURES / f"{name}.txt").read_text(encoding="utf-8")
-    picture = tmp_path / "picture.png"
+    picture = folder / "picture.png"
     window.picture(picture)
     size = [int.from_bytes((file.read_bytes())[16:24][start:start + 4], "big")
             for file in (picture, PICTURES / f"{name}.png") for start in (0, 4)]
     # The fonts of a machine may make a page a little longer.
     assert size[0] == size[2] == 1000
     assert abs(size[1] - size[3]) < size[3] / 4
+
+
+@pytest.mark.parametrize("name", ["healthy", "crashed", "two-cards"])
+def test_the_pictures_in_the_documentation(window, pages, name, tmp_path):
+    window.open(pages[name], width=1000)
+    check_picture(window, name, tmp_path)

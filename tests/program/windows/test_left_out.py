@@ -8,6 +8,7 @@ from conftest import TREE
 COUNTERPARTS = {
     "test_bugreport": "test_windows_host",
     "test_check": "test_windows_host",
+    "test_diff": "test_windows_host",
     "test_explain": "test_windows_host",
     "test_command_line": "test_windows_command_line",
     "test_host_end": "test_windows_host",
@@ -28,8 +29,8 @@ LEFT_OUT = {
     "the scripted OpenGL driver is an EGL library, and the peer uses EGL": {
         "program/test_advise", "program/test_advise_changes", "program/test_advise_faults",
         "program/test_advise_state", "program/test_bad_drivers",
-        "program/test_check_state", "program/test_desktop", "program/test_driver_files", "program/test_failing_gpu", "program/test_fault_sweep",
-        "program/test_html", "program/test_last_line", "program/test_library_advice",
+        "program/test_check_state", "program/test_desktop", "program/test_diff_html",
+        "program/test_driver_files", "program/test_failing_gpu", "program/test_fault_sweep", "program/test_html", "program/test_last_line", "program/test_library_advice",
         "program/test_opengl_peers", "program/test_usable"},
     "Linux's own adapters and EGL": {
         "program/test_adapters", "program/test_record_adapters", "unit/gpu", "unit/qgf"},

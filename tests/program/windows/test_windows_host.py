@@ -1,5 +1,6 @@
 """assay-host.exe under Wine: verdicts, formats, hostile children, every step."""
 
+import json
 import os
 import random
 import re
@@ -287,6 +288,21 @@ def test_archive_of_a_bug_report(tmp_path):
     refused = host_run("bugreport", "--output", str(path), "--yes")
     assert refused.status == 10
     assert text_of(refused.err).startswith("assay-host: cannot write ")
+
+
+def test_diff(tmp_path):
+    before, after, page = (tmp_path / name for name in ("before.json", "after.json", "page.html"))
+    before.write_bytes(host_run("run", "--format", "json").out)
+    after.write_bytes(host_run("run", "--format", "json", "--", "-crashAfter=5").out)
+    assert host_run("diff", str(before), str(before)).out == b""
+    run = host_run("diff", str(before), str(after), "--format", "html", "--output", str(page))
+    assert run.status == 1
+    document = json.loads(host_run("diff", str(before), str(after), "--format", "json").out)
+    headline = document["comparisons"][0]["headline"]
+    assert f"<h1>{headline}</h1>" in page.read_text(encoding="utf-8")
+    lines = text_of(host_run("diff", str(before), str(after)).out).splitlines()
+    assert len(lines) == len(document["comparisons"][0]["differences"])
+    assert lines[0].startswith("verdict: complete -> ")
 
 
 def test_explain():
