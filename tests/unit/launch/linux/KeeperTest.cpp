@@ -198,6 +198,16 @@ int CountGuards()
     return count;
 }
 
+TEST(KeeperProcess, HasAGuardBelowItsStack)
+{
+    const int before = CountGuards();
+    KeptLauncher launcher;
+    LaunchResult ends;
+    LaunchSleeper(launcher, ends);
+    EXPECT_EQ(CountGuards(), before + 1);
+    launcher.Leave();
+}
+
 TEST(KeeperProcess, EachCallThatFailsForLackOfADescriptorIsNamed)
 {
     const long before = CountOpenThings();

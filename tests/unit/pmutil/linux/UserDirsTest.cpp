@@ -23,6 +23,7 @@ TEST(UserDirsTest, FindsTheDesktop)
         {"XDG_DESKTOP_DIR=\"$HOME\"\n", "/home/u"},
         {"XDG_DESKTOP_DIR=\"$HOME/q\\\"q\\\\\"\n", "/home/u/q\"q\\"},
         {"XDG_DESKTOP_DIR=\"$HOME/a\"\nXDG_DESKTOP_DIR=\"$HOME/b\"\n", "/home/u/b"},
+        {"XDG_DESKTOP_DIR=\"$HOME/a\"\nXDG_DESKTOP_DIR=\"relative\"\n", "/home/u/a"},
         {"#XDG_DESKTOP_DIR=\"$HOME/a\"\n", ""},
         {"XDG_DESKTOP_DIR=\"relative\"\n", ""},
         {"XDG_DESKTOP_DIR=\"$HOMER/a\"\n", ""},
