@@ -58,7 +58,9 @@ def test_a_call_during_an_attempt_answers_unknown(starts):
         assert (second.status, second.opengl) == (UNKNOWN, "unknown")
         assert second.document["plan"] == "wait"
         assert second.document["opengl"]["reason"] == "other-instance"
-        assert starts.act("forget").status == ERROR
+        forgotten = starts.act("forget")
+        assert (forgotten.status, forgotten.err) == (
+            ERROR, b"assay-host: another process makes an attempt; call again\n")
         os.kill(first.process.pid, signal.SIGTERM)
         assert first.finish().status == INTERRUPTED
     assert starts.children == 1
@@ -311,8 +313,9 @@ def test_the_users_choice(starts):
     assert list(starts.state.iterdir()) in ([], [starts.state / "lock"])
     for words in (["opengl=broken"], ["opengl"], ["opengl=software", "vulkan=auto"]):
         run = starts.act("set", *words)
-        assert run.status == ERROR
-        assert b"is not opengl= or opencl= with" in run.err
+        assert (run.status, run.err.decode()) == (
+            ERROR, f'assay-host: "{words[-1]}" is not opengl= or opencl= with hardware, software, '
+                   "absent or auto\n")
     assert starts.advise().status == HARDWARE
 
 
@@ -329,12 +332,21 @@ def test_state_for_support(starts):
     assert f"entry {name}\n" in shown.text
     assert "signal 11" in shown.text
     assert shown.text == starts.act("show").text
-    assert starts.act("show", "none").status == ERROR
-    assert starts.act("forget", "none").status == ERROR
+    for action in ("show", "forget"):
+        run = starts.act(action, "none")
+        assert (run.status, run.err) == (ERROR, b'assay-host: 0 entries begin with "none"\n')
     assert starts.act("forget", name).status == 0
     assert starts.file() is None
     starts.set_driver("")
     assert starts.advise().status == HARDWARE
+
+
+def test_state_that_cannot_be_changed(starts):
+    starts.state = Path("/proc/none")
+    for words in (["set", "opengl=software"], ["forget"]):
+        run = starts.act(*words)
+        assert (run.status, run.err) == (
+            ERROR, b"assay-host: cannot change the state: No such file or directory\n")
 
 
 def test_dry_run_changes_nothing(starts):
