@@ -23,9 +23,9 @@ class Browser:
     def __init__(self, driver):
         self.driver = driver
 
-    def open(self, file, width=1280, scheme="light"):
-        """Loads the file in a window of this width, in a colour scheme."""
-        self.command("Emulation.setEmulatedMedia",
+    def open(self, file, width=1280, scheme="light", media="screen"):
+        """Loads the file in a window of this width, in a colour scheme, for a screen or as "print"."""
+        self.command("Emulation.setEmulatedMedia", media=media,
                      features=[{"name": "prefers-color-scheme", "value": scheme}])
         self.command("Emulation.setDeviceMetricsOverride",
                      width=width, height=900, deviceScaleFactor=1, mobile=False)

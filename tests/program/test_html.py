@@ -60,14 +60,15 @@ def never_started(folder):
     return host_run("run", "--assay", str(folder / "nothing"), "--format", "html")
 
 
-def hostile(folder, form="html"):
-    """Each line of a whole report with a text that could do harm, and one of 64 KiB."""
+def hostile(folder, form="html", length=0):
+    """Each text of a whole report with what could do harm, and so much more of it; the name has 64 KiB."""
     (folder / "plain").mkdir()
     lines = run(folder / "plain", "--raw").text.split("\n\n")[0].splitlines()
     long = HOSTILE + "x" * 65536
-    text = "".join(re.sub(r'="(?!\d{4}-\d\d-\d\d_).*"$', lambda _: f'="{HOSTILE}"', line) + "\n"
+    value = HOSTILE + "y" * length
+    text = "".join(re.sub(r'="(?!\d{4}-\d\d-\d\d_).*"$', lambda _: f'="{value}"', line) + "\n"
                    for line in lines)
-    text = text.replace(f'GLName="{HOSTILE}"', f'GLName="{long}"')
+    text = text.replace(f'GLName="{value}"', f'GLName="{long}"')
     assert text.count(HOSTILE) > 10 and long in text
     (folder / "text").write_text(text, encoding="utf-8")
     (folder / "errors").write_text(long + "\n" + HOSTILE, encoding="utf-8")
@@ -75,8 +76,13 @@ def hostile(folder, form="html"):
     return host_run("run", "--assay", str(child), "--format", form)
 
 
+def long(folder):
+    """Each text with 64 KiB."""
+    return hostile(folder, length=65536)
+
+
 PAGES = {"healthy": healthy, "crashed": crashed, "two-cards": two_cards, "trial-failed": trial_failed,
-         "never-started": never_started, "hostile": hostile}
+         "never-started": never_started, "hostile": hostile, "long": long}
 HEADLINES = {
     "healthy": "OpenGL works on graphics hardware.",
     "crashed": "assay crashed with signal 11 (Segmentation fault)",
@@ -84,6 +90,7 @@ HEADLINES = {
     "trial-failed": "OpenGL does not work: glgpu[0]: no complete framebuffer object could be created",
     "never-started": "assay could not be started",
     "hostile": "OpenGL works on graphics hardware.",
+    "long": "OpenGL works on graphics hardware.",
 }
 
 
@@ -106,7 +113,7 @@ def test_a_page_says_what_happened(window, pages, name):
     assert window.run("return document.querySelectorAll('h1').length") == 1
     assert window.run("return document.documentElement.lang") == "en"
     advice = window.run("return [...document.querySelectorAll('h2')].some(h => h.innerText === 'What to do')")
-    assert advice == (name not in ("healthy", "two-cards", "hostile"))
+    assert advice == (name not in ("healthy", "two-cards", "hostile", "long"))
 
 
 @pytest.mark.parametrize("name", PAGES)
@@ -185,6 +192,22 @@ def test_the_policy_names_the_script(pages):
     assert f"script-src &#39;sha256-{digest}&#39;" in page
 
 
+@pytest.mark.parametrize("scheme", ["light", "dark"])
+def test_a_page_on_paper(window, pages, scheme):
+    """Dark on white whatever the screen's scheme, with all that is folded, and without the button."""
+    window.open(pages["crashed"], scheme=scheme, media="print")
+    colours = window.run("const style = getComputedStyle(document.body);"
+                         "return [style.backgroundColor, style.color]")
+    assert colours == ["rgb(255, 255, 255)", "rgb(0, 0, 0)"]
+    assert window.run("return getComputedStyle(document.getElementById('copy')).display") == "none"
+    visible = ("return [...document.querySelectorAll('details')]"
+               ".map(fold => fold.lastElementChild.checkVisibility())")
+    assert set(window.run(visible)) == {True}
+    assert window.violations() == []
+    window.open(pages["crashed"], scheme=scheme)
+    assert set(window.run(visible)) == {False}
+
+
 def test_hostile_texts_are_shown(window, pages):
     """As they are, but for what a reader couldn't see."""
     window.open(pages["hostile"])
@@ -193,6 +216,9 @@ def test_hostile_texts_are_shown(window, pages):
     assert sum(HOSTILE[:30] in fact for fact in facts) > 10
     assert len([fact for fact in facts if fact.startswith(shown[:60])]) > 10
     assert max(len(fact) for fact in facts) > 65536
+    window.open(pages["long"])
+    assert window.run("return [...document.querySelectorAll('dd')]"
+                      ".filter(fact => fact.textContent.length > 65000).length") > 10
 
 
 def test_a_page_agrees_with_the_document(window, tmp_path):
