@@ -1,9 +1,12 @@
 // A run as a file has it.
 #pragma once
 
+#include <optional>
+
 #include "report/Report.h"
 #include "report/RunFacts.h"
 #include "report/RunOutcome.h"
+#include "series/Series.h"
 
 namespace assay_host {
 
@@ -19,6 +22,7 @@ struct StoredRun {
     RunOutcome fOutcome;
     RunFacts fFacts;
     OutcomeExtent fExtent = OutcomeExtent::kAll;
+    std::optional<Series> fSeries{}; // of which the others are the run that is shown
 };
 
 // Makes the outcome of a run of which only the report is stored: complete if it is whole, and
