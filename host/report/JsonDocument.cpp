@@ -12,6 +12,7 @@
 #include "report/LineForm.h"
 #include "report/NextSteps.h"
 #include "report/Numbers.h"
+#include "series/JsonSeries.h"
 
 namespace assay_host {
 
@@ -112,7 +113,7 @@ void WriteReport(JsonWriter& json, const Report& report, const Answers& answers,
 } // namespace
 
 void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome,
-                   const RunFacts& facts)
+                   const RunFacts& facts, const Series* series)
 {
     const Answers answers = GetAnswers(report);
     JsonWriter json(out);
@@ -127,6 +128,8 @@ void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& ou
     json.Write("warnings", MakeWarnings(GetWarnings(answers, outcome)));
     json.Write("nextSteps", MakeTexts(GetNextSteps(answers, outcome)));
     WriteReport(json, report, answers, kSchemaVersion);
+    if (series != nullptr)
+        WriteSeries(json, *series);
     json.Close('}');
     out << '\n';
 }

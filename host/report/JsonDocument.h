@@ -8,6 +8,7 @@
 #include "report/Report.h"
 #include "report/RunFacts.h"
 #include "report/RunOutcome.h"
+#include "series/Series.h"
 
 namespace assay_host {
 
@@ -16,9 +17,10 @@ namespace assay_host {
 constexpr int kSchemaVersion = 2;
 constexpr int kFirstSchemaVersion = 1;
 
-// Writes the document and a line end, piece by piece. Doesn't check the stream for failures.
+// Writes the document and a line end, piece by piece. `series`: that of which the run is shown;
+// null for a run that wasn't repeated. Doesn't check the stream for failures.
 void WriteDocument(std::ostream& out, const Report& report, const RunOutcome& outcome,
-                   const RunFacts& facts);
+                   const RunFacts& facts, const Series* series = nullptr);
 
 // Writes the document of the first schema.
 void WriteFirstDocument(std::ostream& out, const Report& report, const RunOutcome& outcome);

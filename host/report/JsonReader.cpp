@@ -19,6 +19,7 @@
 #include "report/JsonRun.h"
 #include "report/LineForm.h"
 #include "report/ReportReader.h"
+#include "series/JsonSeries.h"
 
 namespace assay_host {
 
@@ -113,7 +114,7 @@ enum class Extent { kReport, kRun };
 bool IsRunMember(const std::string& name)
 {
     return name == "versions" || name == "environment" || name == "command" || name == "outcome" ||
-           name == "drivers";
+           name == "drivers" || name == "series";
 }
 
 // A parser callback that collects the lines of a document, checks its schema version, and discards
@@ -315,6 +316,8 @@ StoredRun ReadDocumentRun(std::istream& text)
     run.fOutcome = ReadOutcome(document, kDocument);
     run.fOutcome.fCommand = ReadCommand(document, kDocument);
     run.fFacts = ReadFactsOf(document, kDocument);
+    if (document.contains("series"))
+        run.fSeries = ReadSeries(document["series"], "series");
     run.fExtent = GetExtent(document);
     return run;
 }
