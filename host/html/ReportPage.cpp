@@ -10,6 +10,7 @@
 #include "html/DeviceCard.h"
 #include "html/Markup.h"
 #include "html/Page.h"
+#include "html/SeriesSection.h"
 #include "report/Answers.h"
 #include "report/Bytes.h"
 #include "report/Explanations.h"
@@ -20,6 +21,7 @@
 #include "report/Usable.h"
 #include "report/ValueText.h"
 #include "report/Warnings.h"
+#include "series/MedianReport.h"
 
 namespace assay_host {
 
@@ -27,12 +29,15 @@ namespace {
 
 class ReportPage {
 public:
-    ReportPage(Markup& page, const Report& report, const RunOutcome& outcome, const RunFacts& facts)
+    ReportPage(Markup& page, const Report& report, const RunOutcome& outcome, const RunFacts& facts,
+               const Series* series)
         : fPage(page),
           fReport(report),
           fOutcome(outcome),
           fFacts(facts),
-          fAnswers(GetAnswers(report))
+          fSeries(series),
+          fTypical(series != nullptr ? MakeMedianReport(report, *series) : Report()),
+          fAnswers(GetAnswers(series != nullptr ? fTypical : report))
     {}
 
     void Add()
@@ -81,7 +86,10 @@ private:
             for (const DeviceAnswers& device : fAnswers.fDevices)
                 AddDeviceCard(fPage, device);
         }
-        AddMeasurements();
+        if (fSeries != nullptr)
+            AddSeriesSection(fPage, *fSeries);
+        else
+            AddMeasurements();
         AddRun();
         AddTerms();
         AddLines("Standard error", fOutcome.fErrorLines);
@@ -209,19 +217,21 @@ private:
     const Report& fReport;
     const RunOutcome& fOutcome;
     const RunFacts& fFacts;
+    const Series* const fSeries; // null without one
+    const Report fTypical;       // with the medians of a series; only with one
     const Answers fAnswers;
 };
 
 } // namespace
 
 void WriteReportPage(std::ostream& out, const Report& report, const RunOutcome& outcome,
-                     const RunFacts& facts)
+                     const RunFacts& facts, const Series* series)
 {
     Markup page(out);
-    ReportPage content(page, report, outcome, facts);
+    ReportPage content(page, report, outcome, facts, series);
     WritePage(
         page, "assay: " + content.GetHeadline(), [&] { content.Add(); },
-        [&](std::ostream& json) { WriteDocument(json, report, outcome, facts); });
+        [&](std::ostream& json) { WriteDocument(json, report, outcome, facts, series); });
 }
 
 } // namespace assay_host
