@@ -19,6 +19,7 @@
 #include "report/DiffJson.h"
 #include "report/DiffText.h"
 #include "report/ReportFile.h"
+#include "series/MedianReport.h"
 
 namespace assay_host {
 
@@ -51,12 +52,21 @@ private:
     bool fIsAtStart = true;
 };
 
+// Loads a file. A series has its medians.
+StoredRun LoadTypical(const std::string& path)
+{
+    StoredRun run = LoadRun(path);
+    if (run.fSeries)
+        run.fReport = GetTypicalReport(run);
+    return run;
+}
+
 // Loads one of several files. Says on standard error why it can't be read, so that the others are
 // compared all the same.
 std::optional<StoredRun> TryLoad(const std::string& path)
 {
     try {
-        return LoadRun(path);
+        return LoadTypical(path);
     } catch (const std::runtime_error& failure) {
         std::fprintf(stderr, "assay-host: %s\n", ShowBytes(failure.what()).c_str());
         return std::nullopt;
@@ -67,6 +77,7 @@ ComparisonOptions GetOptions(const DiffChoice& choice)
 {
     ComparisonOptions options;
     options.fMeasurements.fTolerance = choice.fTolerance;
+    options.fMeasurements.fSeriesTolerance = choice.fSeriesTolerance;
     options.fIdentity = choice.fIdentity;
     options.fAll = choice.fAll;
     options.fKeepSame = choice.fFormat == Format::kHtml;
@@ -142,7 +153,7 @@ Result WriteWhole(const DiffChoice& choice, StoredRun before, Output& output)
 
 int Diff(const DiffChoice& choice)
 {
-    StoredRun before = LoadRun(choice.fBefore);
+    StoredRun before = LoadTypical(choice.fBefore);
     const std::unique_ptr<Output> output =
         choice.fOutput.empty() ? OpenStandardOutput() : OpenFile(choice.fOutput);
     output->Open();

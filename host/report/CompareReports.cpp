@@ -139,6 +139,8 @@ private:
                         const std::vector<Answer>& after, Unanswered& afterFailure);
     void CompareAnswer(const DevicePair& pair, const Answer* before, const Answer* after,
                        Unanswered& afterFailure);
+    MeasurementChange Measure(const DevicePair& pair, const Answer& before,
+                              const Answer& after) const;
     bool CountUnanswered(const Answer* before, const Answer* after, Unanswered& afterFailure);
     void CompareRawLines();
 
@@ -260,13 +262,13 @@ void Comparer::CompareAnswer(const DevicePair& pair, const Answer* before, const
     if (left && right) {
         bool isSame = left->fQuoted == right->fQuoted && left->fValue == right->fValue;
         if (group == DiffGroup::kMeasurements) {
-            MeasurementChange change = CompareMeasurements(*before, *after, fOptions.fMeasurements);
+            MeasurementChange change = Measure(pair, *before, *after);
             isSame = !change.fIsChange;
             note = std::move(change.fNote);
         }
         if (isSame) {
-            if (fOptions.fKeepSame)
-                fComparison.fSame.push_back({pair.fBefore, before, after});
+            if (fOptions.fKeepSame || !note.empty())
+                fComparison.fSame.push_back({pair.fBefore, before, after, std::move(note)});
             return;
         }
     } else if (CountUnanswered(before, after, afterFailure) && !fOptions.fAll) {
@@ -274,6 +276,16 @@ void Comparer::CompareAnswer(const DevicePair& pair, const Answer* before, const
     }
     fComparison.fDifferences.push_back(
         {group, pair.fBefore, pair.fAfter, before, after, {}, {}, {}, {}, {}, std::move(note)});
+}
+
+MeasurementChange Comparer::Measure(const DevicePair& pair, const Answer& before,
+                                    const Answer& after) const
+{
+    const MeasurementRule& rule = fOptions.fMeasurements;
+    if (rule.fTest && pair.fBefore && pair.fAfter)
+        if (auto tested = rule.fTest(*pair.fBefore, *pair.fAfter, before.fKey))
+            return std::move(*tested);
+    return CompareMeasurements(before, after, rule);
 }
 
 // Counts an answer that one run doesn't have because it, or the device, failed before. Returns

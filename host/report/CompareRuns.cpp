@@ -9,6 +9,7 @@
 
 #include "report/RunText.h"
 #include "report/Usable.h"
+#include "series/SeriesChange.h"
 
 namespace assay_host {
 
@@ -129,7 +130,14 @@ private:
 Comparison CompareRuns(const StoredRun& before, const StoredRun& after,
                        const ComparisonOptions& options)
 {
-    return RunComparer(before, after, options).Compare(options.fIdentity);
+    ComparisonOptions tested = options;
+    if (before.fSeries && after.fSeries)
+        tested.fMeasurements.fTest = [&](const DeviceAnswers& left, const DeviceAnswers& right,
+                                         const std::string& key) {
+            return CompareSeries(*before.fSeries, *after.fSeries, left, right, key,
+                                 options.fMeasurements.fSeriesTolerance);
+        };
+    return RunComparer(before, after, tested).Compare(options.fIdentity);
 }
 
 } // namespace assay_host

@@ -7,8 +7,9 @@
 namespace assay_host {
 
 // Compares the reports, and whether OpenGL and OpenCL can be used, judged by what both files have.
-// How a run ended is only compared if both files have it. The comparison points into the reports.
-// Any thread may call.
+// How a run ended is only compared if both files have it. Measurements of two series are compared
+// by a test of their samples; their reports must have the medians. The comparison points into the
+// reports. Any thread may call.
 Comparison CompareRuns(const StoredRun& before, const StoredRun& after,
                        const ComparisonOptions& options);
 

@@ -56,6 +56,7 @@ struct SameAnswer {
     const DeviceAnswers* fDevice; // null without a device
     const Answer* fBefore;
     const Answer* fAfter;
+    std::string fNote{}; // of a measurement: why it doesn't count as changed; may be empty
 };
 
 // Points into the reports, which must outlive it. Can be moved; one thread at a time.
@@ -71,7 +72,7 @@ struct Comparison {
     Answers fBefore;
     Answers fAfter;
     std::vector<Difference> fDifferences; // by group; in a group in the order of the first report
-    std::vector<SameAnswer> fSame;        // only if asked for
+    std::vector<SameAnswer> fSame;        // those with a note; all if asked for
 };
 
 } // namespace assay_host

@@ -40,12 +40,23 @@ std::string GetLine(const Difference& difference)
                        difference.fNote.empty() ? "" : " (" + difference.fNote + ")");
 }
 
+std::string GetSameLine(const SameAnswer& same)
+{
+    return fmt::format("{}{}{}: no change: {} and {} ({})", same.fDevice ? same.fDevice->fTag : "",
+                       same.fDevice ? "." : "", same.fBefore->fKey,
+                       ShowBytes(same.fBefore->fLine->fValue),
+                       ShowBytes(same.fAfter->fLine->fValue), same.fNote);
+}
+
 } // namespace
 
 void PrintDiff(std::ostream& out, const Comparison& comparison)
 {
     for (const Difference& difference : comparison.fDifferences)
         out << GetLine(difference) << "\n";
+    for (const SameAnswer& same : comparison.fSame)
+        if (!same.fNote.empty())
+            out << GetSameLine(same) << "\n";
 }
 
 } // namespace assay_host
