@@ -66,6 +66,18 @@ TEST(CommandLineOfRun, NamesItsFormsAndNeeds)
     EXPECT_EQ(Parse<RunChoice>({"run", "--need", "both"}).fNeed, Need::kBoth);
 }
 
+TEST(CommandLineOfRun, RepeatsOrRunsForATime)
+{
+    EXPECT_FALSE(Parse<RunChoice>({"run"}).fSeries.IsAsked());
+    const auto repeated = Parse<RunChoice>({"run", "--repeat", "30"});
+    EXPECT_TRUE(repeated.fSeries.IsAsked());
+    EXPECT_EQ(repeated.fSeries.fRuns, 30U);
+    EXPECT_EQ(repeated.fSeries.fSeconds, 0);
+    const auto timed = Parse<RunChoice>({"run", "--for", "1.5", "--repeat=2", "--raw"});
+    EXPECT_EQ(timed.fSeries.fSeconds, 1.5);
+    EXPECT_EQ(timed.fSeries.fRuns, 2U);
+}
+
 TEST(CommandLineOfTorture, NamesItsFailures)
 {
     constexpr StepFailure kCrash = StepFailure::kCrash;
