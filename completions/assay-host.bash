@@ -49,7 +49,7 @@ _assay_host() {
         COMPREPLY=($(compgen -W "crash throw both" -- "$cur"))
         return
         ;;
-    --timeout | --tolerance | --require | --wait | --max-age | --pause | --pause-growth | --retries | \
+    --timeout | --repeat | --for | --tolerance | --require | --wait | --max-age | --pause | --pause-growth | --retries | \
         --forgive | --forgive-freeze | --keep-absent | --keep-unknown | --unclear | --unclear-pause)
         return
         ;;
@@ -57,7 +57,7 @@ _assay_host() {
 
     local options="--help"
     case $command in
-    run) options+=" --assay --timeout --format --schema --need --identify --raw --output --" ;;
+    run) options+=" --assay --timeout --format --schema --need --identify --repeat --for --raw --output --" ;;
     torture) options+=" --assay --timeout --kind --" ;;
     diff) options+=" --format --output --tolerance --identity --all" ;;
     explain) ;;

@@ -33,6 +33,8 @@ complete -c assay-host -n $run -l format -x -a "text json jsonl html prometheus 
 complete -c assay-host -n $run -l schema -x -a "1 2" -d "Version of json and jsonl"
 complete -c assay-host -n $needs -l need -x -a "opengl opencl both" -d "Exit by whether they work"
 complete -c assay-host -n $run -l identify -d "Name this machine in json, jsonl and html"
+complete -c assay-host -n $run -l repeat -x -d "Run the child so often"
+complete -c assay-host -n $run -l for -x -d "Start further runs until these seconds have passed"
 complete -c assay-host -n $run -l raw -d "Print the child's own lines first"
 complete -c assay-host -n $run -l output -r -F -d "Write to this file"
 complete -c assay-host -n $torture -l kind -x -a "crash throw both" -d "Kind of failure"

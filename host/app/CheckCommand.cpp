@@ -15,6 +15,7 @@
 #include "report/Bytes.h"
 #include "report/ReportFile.h"
 #include "report/RunOutcome.h"
+#include "series/MedianReport.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
@@ -32,7 +33,7 @@ int CheckReports(const CheckChoice& choice)
         try {
             const StoredRun run = LoadRun(path);
             const std::string prefix = choice.fReports.size() > 1 ? ShowBytes(path) + ": " : "";
-            isMet = checker.CheckReport(run.fReport, run.fOutcome, prefix) && isMet;
+            isMet = checker.CheckReport(GetTypicalReport(run), run.fOutcome, prefix) && isMet;
         } catch (const std::runtime_error& failure) {
             // The other files are checked all the same.
             std::fprintf(stderr, "assay-host: %s\n", ShowBytes(failure.what()).c_str());

@@ -12,6 +12,7 @@
 #include "report/DiffText.h"
 #include "report/ReportFile.h"
 #include "requirements/RequirementFile.h"
+#include "series/MedianReport.h"
 
 namespace assay_host {
 
@@ -34,7 +35,7 @@ Checker::Checker(const CheckChoice& choice)
     : fRequirements(GetRequirements(choice)), fTolerance(choice.fTolerance)
 {
     if (!choice.fBaseline.empty())
-        fBaseline = LoadReport(choice.fBaseline);
+        fBaseline = GetTypicalReport(LoadRun(choice.fBaseline));
 }
 
 bool Checker::CheckReport(const Report& report, const RunOutcome& outcome,

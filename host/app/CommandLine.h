@@ -6,6 +6,7 @@
 #include <variant>
 #include <vector>
 
+#include "series/Series.h"
 #include "supervise/StepRules.h"
 
 namespace assay_host {
@@ -28,6 +29,7 @@ struct RunChoice {
     Need fNeed = Need::kNothing;
     bool fIdentify = false;
     bool fRaw = false;
+    SeriesPlan fSeries;  // a single run if nothing is asked for
     std::string fOutput; // empty: standard output
 };
 
@@ -83,8 +85,10 @@ struct DiffChoice {
     std::string fBefore;
     std::vector<std::string> fAfter; // at least one
     double fTolerance = 0.1;         // as MeasurementRule::fTolerance
-    bool fIdentity = false;          // compare the machines' names and the times too
-    bool fAll = false;               // as ComparisonOptions::fAll
+    // Of two series; nothing if only the test of their samples decides.
+    std::optional<double> fSeriesTolerance;
+    bool fIdentity = false; // compare the machines' names and the times too
+    bool fAll = false;      // as ComparisonOptions::fAll
 };
 
 struct ShowChoice {

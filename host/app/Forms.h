@@ -4,9 +4,7 @@
 #include <ostream>
 
 #include "app/CommandLine.h"
-#include "report/Report.h"
-#include "report/RunFacts.h"
-#include "report/RunOutcome.h"
+#include "report/StoredRun.h"
 
 namespace assay_host {
 
@@ -19,8 +17,8 @@ struct Form {
     int fWidth = 80;                // of kText, in columns
 };
 
-// Writes the run. Doesn't check the stream for failures. Any thread may call.
-void WriteForm(std::ostream& out, const Form& form, const Report& report, const RunOutcome& outcome,
-               const RunFacts& facts);
+// Writes the run. Of a series, the forms with one value of each measurement have its median.
+// Doesn't check the stream for failures. Any thread may call.
+void WriteForm(std::ostream& out, const Form& form, const StoredRun& run);
 
 } // namespace assay_host

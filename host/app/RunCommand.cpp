@@ -7,10 +7,9 @@
 #include "app/Commands.h"
 #include "app/FindAssay.h"
 #include "app/Forms.h"
-#include "app/NeedStatus.h"
+#include "app/RunParts.h"
+#include "app/RunSeries.h"
 #include "facts/DescribeFiles.h"
-#include "facts/Environment.h"
-#include "facts/FileVersion.h"
 #include "output/Delivery.h"
 #include "output/Output.h"
 #include "output/Terminal.h"
@@ -21,7 +20,6 @@
 #include "report/LineForm.h"
 #include "report/Report.h"
 #include "report/SequenceReader.h"
-#include "report/Usable.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Guardian.h"
 #include "supervise/Interrupt.h"
@@ -49,31 +47,11 @@ ReportLine RestoreLine(const ReportLine& kept)
     return ReadLine(kept.fText, kept.fLineEnd, kept.fCut);
 }
 
-RunFacts MakeFacts(const RunChoice& choice, const std::string& program)
-{
-    RunFacts facts;
-    facts.fHostVersion = ASSAY_VERSION;
-    if (choice.fFormat != Format::kText) {
-        facts.fChildVersion = GetFileVersion(program);
-        facts.fEnvironment = GetEnvironment(choice.fIdentify);
-    }
-    return facts;
-}
-
-int GetStatus(Need need, const Report& report, const RunOutcome& outcome)
-{
-    if (need == Need::kNothing)
-        return GetVerdictStatus(outcome.fVerdict);
-    const Answers answers = GetAnswers(report);
-    return GetNeedStatus(need, JudgeUsable(DeviceKind::kOpenGL, answers, outcome).fUsability,
-                         JudgeUsable(DeviceKind::kOpenCL, answers, outcome).fUsability);
-}
-
 // Collects the report, and passes lines and events to the writer at once.
 class Session : public RunObserver {
 public:
     Session(const RunChoice& choice, const std::string& program, WriterThread& writer)
-        : fChoice(choice), fWriter(writer), fFacts(MakeFacts(choice, program))
+        : fChoice(choice), fWriter(writer), fFacts(MakeRunFacts(choice, program))
     {}
 
     void Start(const std::vector<std::string>& command)
@@ -118,10 +96,10 @@ public:
     // Queues the rest of the output, and returns the exit status.
     int Finish(const RunOutcome& outcome)
     {
-        const auto report = std::make_shared<const Report>(std::move(fReport));
-        const int status = GetStatus(fChoice.fNeed, *report, outcome);
+        const int status = GetRunStatus(fChoice.fNeed, fReport, outcome);
         const bool isFirst = fChoice.fSchema == kFirstSchemaVersion;
         if (fChoice.fFormat == Format::kJsonLines) {
+            const auto report = std::make_shared<const Report>(std::move(fReport));
             fWriter.Write([report, outcome, isFirst] {
                 return isFirst ? MakeFirstEndEvent(outcome)
                                : MakeEndEvent(GetAnswers(*report), outcome);
@@ -130,11 +108,11 @@ public:
         }
         if (fChoice.fRaw)
             fWriter.Write("\n");
-        const Form form = {fChoice.fFormat, fChoice.fSchema,
-                           fChoice.fOutput.empty() ? GetOutputWidth() : kFileWidth};
-        fWriter.WriteLarge([form, report, outcome, facts = fFacts](std::ostream& out) {
-            WriteForm(out, form, *report, outcome, facts);
-        });
+        StoredRun run;
+        run.fReport = std::move(fReport);
+        run.fOutcome = outcome;
+        run.fFacts = fFacts;
+        WriteRun(fWriter, fChoice, std::move(run));
         return status;
     }
 
@@ -158,6 +136,8 @@ int Run(const RunChoice& choice)
         [stop] { stop->Raise(); });
     ChildOptions options = MakeChildOptions(choice.fChild);
     options.fKeepCauses = true;
+    if (choice.fSeries.IsAsked())
+        return RunSeries(choice, options, writer, *stop);
     Session session(choice, options.fProgram, *writer);
     std::vector<std::string> command = {options.fProgram};
     command.insert(command.end(), options.fArgs.begin(), options.fArgs.end());

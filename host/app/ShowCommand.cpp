@@ -29,7 +29,7 @@ int Show(const ShowChoice& choice)
     out.exceptions(std::ios::badbit);
     const Form form = {choice.fFormat, choice.fSchema,
                        choice.fOutput.empty() ? GetOutputWidth() : kFileWidth};
-    WriteForm(out, form, run.fReport, run.fOutcome, run.fFacts);
+    WriteForm(out, form, run);
     out.flush();
     output->Finish();
     return 0;

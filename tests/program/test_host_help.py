@@ -38,13 +38,16 @@ Options:
   --schema NUMBER         of json and jsonl, 1 or 2 [2]
   --need WHAT             opengl, opencl or both: exit by whether they work
   --identify              name this machine in json, jsonl and html
+  --repeat NUMBER         run the child so often
+  --for SECONDS           start further runs until this time has passed
   --raw                   print the child's own lines first; only with text
   --output FILE           write to this file [standard output]
 
 exit status: 0 complete, 1 failed tests, 2 usage error of the child,
   3 crashed, 4 hung and killed, 5 never started, 6 interrupted,
   10 error in the command line or the output;
-  with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown
+  with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown;
+  with --repeat or --for: that of the worst run
 """,
     "bugreport": """\
 write an archive for a bug report

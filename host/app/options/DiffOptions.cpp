@@ -33,10 +33,12 @@ public:
                          "each key that a run did not reach, and gputag lines");
     }
 
-    CommandChoice Choose(const CLI::App& /*command*/,
+    CommandChoice Choose(const CLI::App& command,
                          const std::vector<std::string>& /*childWords*/) override
     {
         fChoice.fFormat = ReadFormat(fFormat);
+        if (command.count("--tolerance") > 0)
+            fChoice.fSeriesTolerance = fChoice.fTolerance;
         return fChoice;
     }
 

@@ -12,7 +12,8 @@ public:
                 "exit status: 0 complete, 1 failed tests, 2 usage error of the child,\n"
                 "  3 crashed, 4 hung and killed, 5 never started, 6 interrupted,\n"
                 "  10 error in the command line or the output;\n"
-                "  with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown"};
+                "  with --need: 0 hardware, 20 software, 21 broken, 22 absent, 23 unknown;\n"
+                "  with --repeat or --for: that of the worst run"};
     }
 
     void Add(CLI::App& command) override
@@ -27,6 +28,11 @@ public:
                 "WHAT", {"opengl", "opencl", "both"});
         command.add_flag("--identify", fChoice.fIdentify,
                          "name this machine in json, jsonl and html");
+        command.add_option("--repeat", fChoice.fSeries.fRuns, "run the child so often")
+            ->option_text("NUMBER")
+            ->check(CLI::Range(std::size_t{1}, kMaxSeriesSamples));
+        AddNumber(command, "--for", fChoice.fSeries.fSeconds,
+                  "start further runs until this time has passed", "SECONDS");
         command.add_flag("--raw", fChoice.fRaw,
                          "print the child's own lines first; only with text");
         AddText(command, "--output", fChoice.fOutput, "write to this file [standard output]",
@@ -45,12 +51,28 @@ public:
             throw CLI::ValidationError("--raw", "only with --format text");
         if (command.count("--schema") > 0 && !isJson)
             throw CLI::ValidationError("--schema", "only with --format json or jsonl");
+        CheckSeries(command);
         fChoice.fNeed = ReadNeed(fNeed);
         fChoice.fChild.fArgs = childWords;
         return fChoice;
     }
 
 private:
+    void CheckSeries(const CLI::App& command) const
+    {
+        const char* const option = command.count("--repeat") > 0 ? "--repeat"
+                                   : command.count("--for") > 0  ? "--for"
+                                                                 : nullptr;
+        if (option == nullptr)
+            return;
+        if (!fChoice.fSeries.IsAsked())
+            throw CLI::ValidationError(option, "must be more than 0");
+        if (fChoice.fFormat == Format::kJsonLines)
+            throw CLI::ValidationError(option, "not with --format jsonl, which has one run");
+        if (fChoice.fSchema == 1)
+            throw CLI::ValidationError(option, "not with --schema 1, which has one run");
+    }
+
     RunChoice fChoice;
     std::string fFormat = "text";
     std::string fNeed;
