@@ -127,7 +127,8 @@ void AddSame(Markup& page, const Comparison& comparison)
         page.Add("dt", same.fDevice ? fmt::format("{} {}", same.fDevice->fTag, name) : name);
         const std::string before = GetValueText(*same.fBefore);
         const std::string after = GetValueText(*same.fAfter);
-        page.Add("dd", before == after ? before : fmt::format("{}, {}", before, after));
+        const std::string values = before == after ? before : fmt::format("{}, {}", before, after);
+        page.Add("dd", same.fNote.empty() ? values : fmt::format("{} ({})", values, same.fNote));
     }
 }
 
