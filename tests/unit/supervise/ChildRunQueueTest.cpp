@@ -15,6 +15,7 @@
 
 #include "pmutil/Reader.h"
 #include "supervise/ChildRun.h"
+#include "supervise/Containment.h"
 #include "support/Waits.h"
 
 namespace assay_host {
@@ -140,6 +141,26 @@ private:
     int fKills = 0;
 };
 
+// There are no descendants. Counts how often they are ended.
+class CountedContainment : public Containment {
+public:
+    explicit CountedContainment(boost::shared_ptr<pmutil::Launcher> launcher)
+        : fLauncher(std::move(launcher))
+    {}
+
+    boost::shared_ptr<pmutil::Launcher> GetLauncher() override { return fLauncher; }
+    bool EndAll(double /*seconds*/) override
+    {
+        ++fEnds;
+        return true;
+    }
+
+    int fEnds = 0;
+
+private:
+    const boost::shared_ptr<pmutil::Launcher> fLauncher;
+};
+
 class ChildRunQueue : public testing::Test, public RunObserver {
 protected:
     ChildRunQueue()
@@ -171,7 +192,7 @@ protected:
     RunOutcome Run()
     {
         fShortWait.emplace(static_cast<int>(pmutil::kLong));
-        const RunOutcome outcome = RunChild(fOptions, *this, fStop, fLauncher, fTimes);
+        const RunOutcome outcome = RunChild(fOptions, *this, fStop, fContainment, fTimes);
         fShortWait.reset();
         return outcome;
     }
@@ -198,6 +219,8 @@ protected:
     }
 
     const boost::shared_ptr<FedLauncher> fLauncher = boost::make_shared<FedLauncher>();
+    CountedContainment fContainment{fLauncher};
+    int fEndsBefore = -1; // of the descendants, when something was fed
     ChildOptions fOptions;
     pmutil::StopRequest fStop;
     RunTimes fTimes;
@@ -233,6 +256,7 @@ TEST_F(ChildRunQueue, WhatComesAfterTheChildsEndIsTaken)
     fTimes.fNow = [&] {
         if (fHasTicked && !hasFed) {
             hasFed = true;
+            fEndsBefore = fContainment.fEnds;
             fLauncher->fOut->Feed("late=1\n");
             fLauncher->fOut->End();
             fLauncher->fErr->End();
@@ -242,6 +266,25 @@ TEST_F(ChildRunQueue, WhatComesAfterTheChildsEndIsTaken)
     fOnStart = [this] { fLauncher->End(); };
     EXPECT_FALSE(Run().fLeftBehind);
     EXPECT_EQ(fLines, std::vector<std::string>{"late=1"});
+    EXPECT_EQ(fEndsBefore, 0) << "the descendants are ended before the streams";
+}
+
+// An interrupt of the terminal reaches the child too, which may end before it is noticed.
+TEST_F(ChildRunQueue, AnInterruptThatReachedTheChildFirstIsOne)
+{
+    fOptions.fTimeoutSeconds = 0;
+    fTimes.fTick = std::chrono::hours(1);
+    fTimes.fStreamGrace = std::chrono::hours(1000);
+    fTimes.fNow = [this] {
+        if (fHasTicked) {
+            fStop.Raise();
+            fLauncher->fOut->End();
+            fLauncher->fErr->End();
+        }
+        return fNow += std::chrono::hours(2);
+    };
+    fOnStart = [this] { fLauncher->End(); };
+    EXPECT_EQ(Run().fVerdict, Verdict::kInterrupted);
 }
 
 TEST_F(ChildRunQueue, ARunThatIsOverKeepsNobodyWaiting)

@@ -98,6 +98,39 @@ TEST(Judge, CallsAReportWithAnIncompleteStampStopped)
     }
 }
 
+TEST(Judge, SaysHowAChildThatEndedByItselfFailed)
+{
+    const auto tell = [](const std::string& report, const std::vector<std::string>& errors,
+                         int status) {
+        return Case{report, errors, {}, Ended(status)}.Judge().fReason;
+    };
+    EXPECT_EQ(tell("", {"usage: x"}, 3), "assay rejected its command line.");
+    EXPECT_EQ(tell(kWhole, {}, 2), "The report is whole, but assay ended with status 2.");
+    EXPECT_EQ(tell(kWhole, {"exception: x"}, 2),
+              "The report is whole, but assay ended with status 2 (exception: x).");
+    EXPECT_EQ(tell("", {}, 1),
+              "The report stopped before its first line; assay ended with status 1.");
+    EXPECT_EQ(tell("", {"a text", "unknown exception"}, 1),
+              "The report stopped before its first line; assay ended with status 1 (unknown "
+              "exception).");
+}
+
+TEST(Judge, SaysHowARunEnded)
+{
+    const pmutil::ChildEnd killed{pmutil::kEndedByKill, 0, {}};
+    const pmutil::ChildEnd crashed{pmutil::kEndedByCrash, 0, {}};
+    EXPECT_EQ((Case{kWhole, {}, {}, Ended(0)}.Judge().fReason),
+              "All tests ran, and the report is whole.");
+    EXPECT_EQ((Case{"", {}, {}, killed, KillReason::kTimeout}.Judge().fReason),
+              "assay did not end within 5 s and was killed before its first line.");
+    EXPECT_EQ((Case{"", {}, {}, {}, KillReason::kTimeout}.Judge().fReason),
+              "assay did not end within 5 s and could not be killed before its first line.");
+    EXPECT_EQ((Case{"", {}, {}, killed, KillReason::kInterrupt}.Judge().fReason),
+              "The run was interrupted before its first line.");
+    EXPECT_EQ((Case{"", {}, {}, crashed, KillReason::kNone, "signal 11"}.Judge().fReason),
+              "assay crashed with signal 11 before its first line.");
+}
+
 TEST(Judge, DetectsAUsageErrorByStatusAndText)
 {
     const std::vector<std::string> usage = {"Usage exception: usage", "usage: "};
