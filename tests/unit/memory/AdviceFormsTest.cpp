@@ -90,6 +90,41 @@ TEST(AdviceFormsTest, WritesADocument)
     EXPECT_EQ(document["messages"], nlohmann::json({"A message."}));
 }
 
+TEST(AdviceFormsTest, WritesAllMembersOfADocument)
+{
+    Advice advice = MakeAdvice();
+    advice.fOpenCL = {};
+    EXPECT_EQ(nlohmann::json::parse(MakeAdviceDocument(advice, "1.2.3", 0)),
+              nlohmann::json::parse(R"({
+        "schema": 1, "version": "1.2.3", "time": "2027-01-15T08:00:00Z", "status": 0,
+        "identity": "5a0a2f38-0000-5000-8000-000000000000", "plan": "try", "due": "first",
+        "tried": true, "attempts": 3,
+        "opengl": {"answer": "hardware", "reason": "trials-passed", "text": "A sentence.",
+            "source": "memory", "learnt": "hardware",
+            "device": {"tag": "glgpu[0]", "name": "A card", "driver": "1.2"},
+            "end": "ended", "endReason": null, "lastLine": null, "time": "2027-01-13T08:00:00Z",
+            "age": 172800, "failures": 0, "nextAttempt": "2027-01-16T08:00:00Z",
+            "warning": "A warning.", "change": "The next attempt is due at 2027-01-16T08:00:00Z, )"
+                                    R"(or if a fresh one is requested."},
+        "opencl": {"answer": "unknown", "reason": "", "text": "", "source": "none",
+            "learnt": "unknown", "device": null, "end": null, "endReason": null, "lastLine": null,
+            "time": null, "age": null, "failures": 0, "nextAttempt": null, "warning": null,
+            "change": "The next call makes an attempt."},
+        "messages": ["A message."]})"));
+}
+
+TEST(AdviceFormsTest, NamesOnlyWhatIsKnownOfADevice)
+{
+    Advice advice = MakeAdvice();
+    Finding& finding = advice.fOpenGL.fOutlook.fFinding;
+    finding.fDevice.clear();
+    EXPECT_THAT(MakeAdviceText(advice), HasSubstr("  device   glgpu[0], driver 1.2\n"));
+    finding.fDriver.clear();
+    EXPECT_THAT(MakeAdviceText(advice), HasSubstr("  device   glgpu[0]\n"));
+    finding.fTag.clear();
+    EXPECT_THAT(MakeAdviceText(advice), Not(HasSubstr("  device   \n")));
+}
+
 TEST(AdviceFormsTest, HasTheStatusOfWhatIsNeeded)
 {
     Advice advice = MakeAdvice(); // OpenGL works, OpenCL is broken

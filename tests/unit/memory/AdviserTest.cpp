@@ -395,6 +395,28 @@ TEST_F(AdviserTest, AFullDiskLeavesNoAnswerThatIsNotTrueAnyMore)
     }
 }
 
+TEST_F(AdviserTest, AFullDiskLeavesNoAnswerThatIsHalfTrue)
+{
+    SetEnd(AttemptEnd::kEnded, kHardware, kHardware);
+    Advise();
+    fFolder.fGoodWrites = 0;
+    fRequest.fFresh = true;
+    SetEnd(AttemptEnd::kCrashed, kHardware, kBroken);
+    EXPECT_EQ(Show(Advise()), "try, tried: hardware broken");
+    fRequest.fFresh = false;
+    EXPECT_NE(Recall().fOpenCL.GetUsability(), kHardware);
+}
+
+// The last line is of interest where something went wrong.
+TEST_F(AdviserTest, HasTheLastLineOfWhatDoesNotWork)
+{
+    SetEnd(AttemptEnd::kCrashed, kHardware, kBroken);
+    const Advice advice = Advise();
+    EXPECT_EQ(advice.fOpenGL.fLastLine, "");
+    EXPECT_EQ(advice.fOpenCL.fLastLine, "The last line.");
+    EXPECT_EQ(advice.fOpenCL.fEndReason, "How it ended.");
+}
+
 TEST_F(AdviserTest, AFullDiskLeavesAnAnswerThatIsStillTrue)
 {
     Advise();

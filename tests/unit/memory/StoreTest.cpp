@@ -176,6 +176,35 @@ TEST_F(StoreTest, ForgetsOneOrAll)
     EXPECT_EQ(store.ForgetAll(), "Read-only file system");
 }
 
+// Only the user's choice can be removed.
+class StubbornFolder : public FakeFolder {
+public:
+    std::string Remove(const std::string& name) override
+    {
+        return name == "choice.json" ? FakeFolder::Remove(name) : "Operation not permitted";
+    }
+};
+
+TEST(StoreOfAStubbornFolder, SaysWhatCannotBeForgotten)
+{
+    StubbornFolder folder;
+    Store store(folder);
+    store.Save(MakeNumbered(1), kNow);
+    EXPECT_EQ(store.ForgetAll(), "Operation not permitted");
+}
+
+TEST_F(StoreTest, ListsNoFilesOfOtherNames)
+{
+    const std::string digest = MakeDigest("x");
+    for (const std::string& name :
+         {std::string("abc"), std::string("abc.json"), digest, digest + ".jso", digest + ".jsox",
+          digest + ".json~", digest.substr(1) + "x.json", digest.substr(1) + "A.json"})
+        fFolder.fFiles[name] = "text";
+    EXPECT_EQ(Store(fFolder).List().size(), 0U);
+    fFolder.fFiles[digest + ".json"] = "text";
+    EXPECT_EQ(Store(fFolder).List().size(), 1U);
+}
+
 TEST_F(StoreTest, KeepsTheChoiceUntilItIsTakenBack)
 {
     Store store(fFolder);

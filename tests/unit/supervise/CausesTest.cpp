@@ -37,6 +37,14 @@ RunOutcome RunWith(bool keepCauses, std::vector<std::string> args, Lines& lines)
     return RunChild(options, lines, stop, MakeChildLauncher(), GetLongTimes());
 }
 
+// The child ends after "# 00", which could be the beginning of a line of the log.
+TEST(Causes, LeaveALastLineThatLacksItsEndInTheReport)
+{
+    Lines lines;
+    RunWith(true, {"out", kFailure, "raw", "23203030"}, lines);
+    EXPECT_EQ(lines.fLines, std::vector<std::string>{"# 00"});
+}
+
 TEST(Causes, AreTakenFromTheLogThatIsAskedFor)
 {
     Lines lines;

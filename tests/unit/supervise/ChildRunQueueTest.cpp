@@ -152,10 +152,11 @@ public:
     bool EndAll(double /*seconds*/) override
     {
         ++fEnds;
-        return true;
+        return fLeavesNone;
     }
 
     int fEnds = 0;
+    bool fLeavesNone = true;
 
 private:
     const boost::shared_ptr<pmutil::Launcher> fLauncher;
@@ -285,6 +286,32 @@ TEST_F(ChildRunQueue, AnInterruptThatReachedTheChildFirstIsOne)
     };
     fOnStart = [this] { fLauncher->End(); };
     EXPECT_EQ(Run().fVerdict, Verdict::kInterrupted);
+}
+
+TEST_F(ChildRunQueue, EndsTheDescendantsOnceAndSaysWhatIsLeft)
+{
+    fContainment.fLeavesNone = false;
+    fOnStart = [this] {
+        fLauncher->fOut->End();
+        fLauncher->fErr->End();
+        fLauncher->End();
+    };
+    fTimes.fStreamGrace = fTimes.fLastStreamGrace = RunTimes::Seconds(pmutil::kLong);
+    EXPECT_TRUE(Run().fLeftBehind);
+    EXPECT_EQ(fContainment.fEnds, 1);
+}
+
+// The stream that ended did so before the child.
+TEST_F(ChildRunQueue, OneStreamThatGoesOnIsLeftBehind)
+{
+    fTimes.fStreamGrace = fTimes.fLastStreamGrace = RunTimes::Seconds(0);
+    fLauncher->fOut->Feed("first=1\n");
+    fOnLine = [this] {
+        fLauncher->fOut->End();
+        EXPECT_TRUE(fLauncher->fOut->AwaitClosed());
+        fLauncher->End();
+    };
+    EXPECT_TRUE(Run().fLeftBehind);
 }
 
 TEST_F(ChildRunQueue, ARunThatIsOverKeepsNobodyWaiting)

@@ -78,6 +78,11 @@ TEST(Judge, CallsAnyOtherEndFailed)
     EXPECT_EQ((Case{kWhole, {}, {"-exit=7"}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
     EXPECT_EQ((Case{kBroken, {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
     EXPECT_EQ((Case{"", {}, {}, Ended(0)}.Judge().fVerdict), Verdict::kFailedTests);
+    for (const char* start : {"", "Tester=\"x\"\n", "assayStart=1\n"})
+        EXPECT_EQ(
+            (Case{start + std::string("assayEnd=\"y\"\n"), {}, {}, Ended(0)}.Judge().fVerdict),
+            Verdict::kFailedTests)
+            << start;
     const RunOutcome failed = Case{kWhole, {"exception: x"}, {"-exit=2"}, Ended(2)}.Judge();
     EXPECT_EQ(failed.fVerdict, Verdict::kFailedTests);
     EXPECT_THAT(failed.fReason, HasSubstr("exception: x"));

@@ -4,8 +4,12 @@
 
 #include <csignal>
 #include <ctime>
+#include <fstream>
+#include <string>
 #include <sys/wait.h>
 #include <unistd.h>
+
+#include "memory/Envelope.h"
 
 namespace assay_host {
 namespace {
@@ -17,6 +21,9 @@ TEST(MachineTest, KnowsItself)
     EXPECT_EQ(self.fProcess, static_cast<std::uint64_t>(::getpid()));
     EXPECT_NE(self.fStart, 0u);
     EXPECT_EQ(self.fBoot.size(), 36u);
+    std::string id;
+    std::getline(std::ifstream("/etc/machine-id"), id);
+    EXPECT_EQ(self.fMachine, id.empty() ? "" : MakeDigest("assay-host " + id));
     EXPECT_TRUE(machine->IsSameBoot(self.fBoot, self.fBoot));
     EXPECT_FALSE(machine->IsSameBoot(self.fBoot, "other"));
     EXPECT_EQ(self, machine->GetSelf());
