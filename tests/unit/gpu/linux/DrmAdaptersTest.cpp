@@ -251,6 +251,23 @@ TEST(DrmAdaptersTest, TheListIsCached)
     EXPECT_NE(CachedDrmAdapters(), known);
 }
 
+TEST(DrmAdaptersTest, AnIdOutOfItsRangeIsNone)
+{
+    const AdapterTree tree("amd-discrete");
+    const std::string card =
+        "/sys/devices/pci0000:00/0000:00:01.0/0000:01:00.0/0000:02:00.0/0000:03:00.0/";
+    tree.write(card + "vendor", "0xffff\n");
+    tree.write(card + "device", "0x10000\n");
+    tree.write(card + "revision", "0xff\n");
+    EXPECT_EQ(OnlyAdapter().vendor, 0xFFFFU);
+    EXPECT_EQ(OnlyAdapter().device, 0U);
+    EXPECT_EQ(OnlyAdapter().revision, 0xFFU);
+    tree.write(card + "vendor", "0x10000\n");
+    tree.write(card + "revision", "0x100\n");
+    EXPECT_EQ(OnlyAdapter().vendor, 0U);
+    EXPECT_EQ(OnlyAdapter().revision, 0U);
+}
+
 TEST(DrmAdaptersTest, BrokenFilesAffectTheirFieldsOnly)
 {
     const AdapterTree tree("unreadable");

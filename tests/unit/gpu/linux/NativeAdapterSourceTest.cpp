@@ -206,6 +206,7 @@ std::string Outputs(std::uint32_t index)
             continue;
         }
         names += NarrowProperty(descriptor.DeviceName.data());
+        EXPECT_LE(descriptor.AttachedToDesktop, 1);
         names += descriptor.AttachedToDesktop != 0 ? "* " : " ";
     }
     return names;

@@ -74,6 +74,9 @@ TEST(NvidiaVersionTest, ADateOutOfRangeIsRejected)
           "Aug 19 01:15 UTC 2023", "Aug 19 01:15:15 UTC", "Aug x 01:15:15 UTC 2023",
           "Agu 19 01:15:15 UTC 2023", "Aug 119 01:15:15 UTC 2023", "Aug 19 01:15:15 UTC 20233"})
         EXPECT_EQ(ParseNvidiaVersion(std::string("NVRM version: 1.2 ") + date).date, "") << date;
+    EXPECT_EQ(ParseNvidiaVersion("NVRM version: 1.2 Jan 1 00:00:00 UTC 1990").date,
+              "19900101000000.000000+000");
+    EXPECT_EQ(ParseNvidiaVersion("NVRM version: 1.2 Dec 31 23:59:59 UTC 1989").date, "");
 }
 
 TEST(NvidiaVersionTest, OtherTextsHaveNeither)
