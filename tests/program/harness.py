@@ -27,6 +27,8 @@ DEADLINE = 600
 SANITIZED_BY = os.environ.get("ASSAY_SANITIZE", "")
 # Whether the programs are for another processor, and run by an emulator.
 EMULATED = os.environ.get("ASSAY_EMULATED", "") == "ON"
+# Whether the memory of a process is the program's: a sanitizer and an emulator have much of their own.
+MEASURES_MEMORY = not SANITIZED_BY and not EMULATED
 # A sanitizer must not handle crashes: a host must see their signals.
 CRASHES = "handle_segv=0:handle_abort=0:handle_sigbus=0:handle_sigill=0:handle_sigfpe=0"
 SANITIZERS = {
