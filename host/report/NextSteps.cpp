@@ -14,8 +14,8 @@ namespace {
 constexpr char kShowCalls[] =
     "Run again with -- -verbose=1 after the other options: the log then names the driver's calls.";
 constexpr char kReportIt[] =
-    "If the newest driver fails too, report it to the driver's developers, with the output of "
-    "--format json.";
+    "If the newest driver fails too, report it to the driver's developers, with the archive of "
+    "assay-host bugreport.";
 
 class StepList {
 public:

@@ -14,7 +14,7 @@ constexpr char kCalls[] =
     "Run again with -- -verbose=1 after the other options: the log then names the driver's calls.";
 constexpr char kUpdate[] = "Update the graphics driver, or reinstall it.";
 constexpr char kReport[] = "If the newest driver fails too, report it to the driver's developers, "
-                           "with the output of --format json.";
+                           "with the archive of assay-host bugreport.";
 
 std::vector<std::string> Get(const std::string& text, Verdict verdict)
 {
