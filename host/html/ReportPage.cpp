@@ -37,7 +37,7 @@ public:
           fFacts(facts),
           fSeries(series),
           fTypical(series != nullptr ? MakeMedianReport(report, *series) : Report()),
-          fAnswers(GetAnswers(series != nullptr ? fTypical : report))
+          fAnswers(series != nullptr ? GetAnswers(fTypical) : GetAnswers(report, outcome))
     {}
 
     void Add()

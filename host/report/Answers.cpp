@@ -187,4 +187,14 @@ Answers GetAnswers(const Report& report)
     return Collector(report).Collect();
 }
 
+Answers GetAnswers(const Report& report, const RunOutcome& outcome)
+{
+    Answers answers = GetAnswers(report);
+    for (DeviceAnswers& device : answers.fDevices)
+        for (Answer& answer : device.fAnswers)
+            if (answer.fKnown)
+                answer.fLowerBound = outcome.FindLowerBound(answer.fKnown->GetKey(device.fTag));
+    return answers;
+}
+
 } // namespace assay_host

@@ -8,6 +8,7 @@
 
 #include "report/KnownKeys.h"
 #include "report/Report.h"
+#include "report/RunOutcome.h"
 #include "report/Unknown.h"
 
 namespace assay_host {
@@ -32,6 +33,7 @@ struct Answer {
     const ReportLine* fLine; // null if missing; owned by the report
     Missing fMissing = Missing::kNot;
     Unknown fUnknown = Unknown::kNot; // why the line's value stands for "not known"
+    double fLowerBound = 0;           // of the value, by another clock; 0 without one
 
     // Whether there is a value that says something.
     bool IsKnown() const { return fLine != nullptr && fUnknown == Unknown::kNot; }
@@ -62,5 +64,8 @@ struct Answers {
 // Collects the answers. They point into the report, which must outlive them. A device that the
 // report counts but never names is included.
 Answers GetAnswers(const Report& report);
+
+// The same with the lower bounds of the outcome.
+Answers GetAnswers(const Report& report, const RunOutcome& outcome);
 
 } // namespace assay_host

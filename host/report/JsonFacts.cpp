@@ -85,6 +85,14 @@ Json MakeCauses(const RunOutcome& outcome)
     return array;
 }
 
+Json MakeLowerBounds(const RunOutcome& outcome)
+{
+    Json array = Json::array();
+    for (const LowerBound& bound : outcome.fLowerBounds)
+        array.push_back({{"key", bound.fKey}, {"value", bound.fValue}});
+    return array;
+}
+
 Json MakeDrivers(const LoadedFiles& drivers)
 {
     if (!drivers.IsKnown())

@@ -23,6 +23,7 @@ nlohmann::ordered_json MakeEnvironment(const Environment& environment);
 nlohmann::ordered_json MakeUsable(const Answers& answers, const RunOutcome& outcome);
 
 nlohmann::ordered_json MakeWarnings(const std::vector<Warning>& warnings);
+nlohmann::ordered_json MakeLowerBounds(const RunOutcome& outcome);
 nlohmann::ordered_json MakeCauses(const RunOutcome& outcome);
 
 // Makes {"known": true, "files": [...]} or {"known": false, "reason": ...}.

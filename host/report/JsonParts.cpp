@@ -81,6 +81,7 @@ Json MakeOutcome(const RunOutcome& outcome)
 {
     Json json = MakeFirstOutcome(outcome);
     json["causes"] = MakeCauses(outcome);
+    json["lowerBounds"] = MakeLowerBounds(outcome);
     return json;
 }
 

@@ -48,7 +48,7 @@ std::vector<std::string> ReadTexts(const Json& object, const std::string& where,
     return texts;
 }
 
-double ReadSeconds(const Json& object, const std::string& where, const char* name)
+double ReadNumber(const Json& object, const std::string& where, const char* name)
 {
     return GetMember(object, where, name, &Json::is_number, "a number").get<double>();
 }
@@ -81,6 +81,18 @@ std::vector<Cause> ReadCauses(const Json& outcome, const std::string& where)
         causes.push_back({ReadText(cause, where + ".causes", "key"),
                           ReadText(cause, where + ".causes", "text")});
     return causes;
+}
+
+std::vector<LowerBound> ReadLowerBounds(const Json& outcome, const std::string& where)
+{
+    std::vector<LowerBound> bounds;
+    // The first schema has none.
+    if (!outcome.contains("lowerBounds"))
+        return bounds;
+    const std::string inside = where + ".lowerBounds";
+    for (const Json& bound : GetMember(outcome, where, "lowerBounds", &Json::is_array, "an array"))
+        bounds.push_back({ReadText(bound, inside, "key"), ReadNumber(bound, inside, "value")});
+    return bounds;
 }
 
 Fact ReadFact(const Json& object, const std::string& where, const char* name)
@@ -136,9 +148,9 @@ RunOutcome ReadOutcome(const Json& object, const std::string& where)
                 .get<int>();
     outcome.fTermination = ReadTextOrNull(json, inside, "termination");
     outcome.fReason = ReadText(json, inside, "reason");
-    outcome.fSeconds = ReadSeconds(json, inside, "seconds");
+    outcome.fSeconds = ReadNumber(json, inside, "seconds");
     if (!IsNull(json, "timeoutSeconds"))
-        outcome.fTimeoutSeconds = ReadSeconds(json, inside, "timeoutSeconds");
+        outcome.fTimeoutSeconds = ReadNumber(json, inside, "timeoutSeconds");
     outcome.fLastReportLine = ReadTextOrNull(json, inside, "lastReportLine");
     outcome.fLastLogLine = ReadTextOrNull(json, inside, "lastLogLine");
     outcome.fErrorLines = ReadTexts(json, inside, "errorLines");
@@ -147,6 +159,7 @@ RunOutcome ReadOutcome(const Json& object, const std::string& where)
     outcome.fLeftBehind =
         GetMember(json, inside, "leftBehind", &Json::is_boolean, "a bool").get<bool>();
     outcome.fCauses = ReadCauses(json, inside);
+    outcome.fLowerBounds = ReadLowerBounds(json, inside);
     outcome.fDrivers = ReadDrivers(object, where);
     return outcome;
 }

@@ -29,4 +29,11 @@ std::string RunOutcome::FindCause(const std::string& key) const
     return cause == fCauses.end() ? std::string() : cause->fText;
 }
 
+double RunOutcome::FindLowerBound(const std::string& key) const
+{
+    const auto bound = std::find_if(fLowerBounds.begin(), fLowerBounds.end(),
+                                    [&key](const LowerBound& each) { return each.fKey == key; });
+    return bound == fLowerBounds.end() ? 0 : bound->fValue;
+}
+
 } // namespace assay_host

@@ -33,6 +33,12 @@ struct Cause {
     std::string fText; // raw bytes, without the log's prefix
 };
 
+// What a measurement must at least be, by another clock than the device's.
+struct LowerBound {
+    std::string fKey; // with its tag: "clgpu[0].CLBandwidth"
+    double fValue;    // in the unit of the key
+};
+
 struct RunOutcome {
     Verdict fVerdict = Verdict::kNeverStarted;
     std::vector<std::string> fCommand; // the child's path and its options
@@ -46,12 +52,16 @@ struct RunOutcome {
     std::vector<std::string> fErrorLines; // raw lines of standard error, without line ends
     std::uint64_t fLostOutputBytes = 0;   // dropped by a limit
     std::uint64_t fLostErrorBytes = 0;
-    std::vector<Cause> fCauses; // in the order of the log; empty if the child kept none
+    std::vector<Cause> fCauses;           // in the order of the log; empty if the child kept none
+    std::vector<LowerBound> fLowerBounds; // as CopyClock returns them; empty without a log
     LoadedFiles fDrivers{{}, "the child was not started"};
     bool fLeftBehind = false; // a process could not be killed and may still be running
 
     // Returns the text of the first cause of this key; empty without one.
     std::string FindCause(const std::string& key) const;
+
+    // Returns the bound of this key; 0 without one.
+    double FindLowerBound(const std::string& key) const;
 };
 
 } // namespace assay_host

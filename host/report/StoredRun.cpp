@@ -4,6 +4,7 @@
 
 #include "report/Activity.h"
 #include "report/Answers.h"
+#include "report/CopyClock.h"
 
 namespace assay_host {
 
@@ -17,9 +18,13 @@ RunOutcome MakeOutcomeOfReport(const Report& report)
                           : fmt::format("The report stopped{}; how assay ended was not stored.",
                                         next.empty() ? "" : " while " + GetActivityText(next));
     outcome.fDrivers.fReason = "they were not stored";
-    for (const ReportLine& line : report.GetLines())
+    CopyClock copies;
+    for (const ReportLine& line : report.GetLines()) {
+        copies.Add(line);
         if (line.fKind == LineKind::kValue)
             outcome.fLastReportLine = line.fText;
+    }
+    outcome.fLowerBounds = copies.GetBounds();
     return outcome;
 }
 

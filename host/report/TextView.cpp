@@ -210,7 +210,7 @@ void PrintRun(std::ostream& out, const Report& report, const Answers& answers,
 void PrintText(std::ostream& out, const Report& report, const RunOutcome& outcome, int width)
 {
     const std::size_t columns = GetWidth(width);
-    const Answers answers = GetAnswers(report);
+    const Answers answers = GetAnswers(report, outcome);
     PrintWarnings(out, GetWarnings(answers, outcome), columns);
     for (const DeviceAnswers& device : answers.fDevices)
         DeviceTable(device).Print(out, columns);

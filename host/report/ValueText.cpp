@@ -16,31 +16,6 @@ namespace assay_host {
 
 namespace {
 
-// Returns what is shown instead of a value that is not known; nothing if the value itself is shown.
-std::optional<std::string> GetUnknownValueText(const Answer& answer)
-{
-    switch (answer.fUnknown) {
-    case Unknown::kNot:
-    case Unknown::kCut:
-        break;
-    case Unknown::kNoAdapter:
-        return answer.fKnown->fForm == ValueForm::kAdapter
-                   ? "none (no adapter of the system matches)"
-                   : "not known (no adapter of the system matches)";
-    case Unknown::kNotListed:
-        return "not known (not in the adapter lists)";
-    case Unknown::kEmpty:
-        return "not known (the text is empty)";
-    case Unknown::kNoFigure:
-        return "not known (no source has it)";
-    case Unknown::kNoTime:
-    case Unknown::kImplausible:
-        return fmt::format("not known ({}: {})", GetUnknownText(answer.fUnknown),
-                           ShowBytes(answer.fLine->fValue));
-    }
-    return std::nullopt;
-}
-
 std::string_view TrimEnd(std::string_view text)
 {
     return text.substr(0, text.find_last_not_of(' ') + 1);
@@ -74,22 +49,33 @@ std::optional<std::string> GetIdText(std::string_view value)
     return fmt::format("0x{:04X} ({})", *id, *id);
 }
 
-std::optional<std::string> GetSpeedText(std::string_view value)
+std::string GetSpeedText(double speed)
 {
     struct Unit {
         double fSize;
         const char* fName;
     };
     constexpr Unit kUnits[] = {{1e12, "TB/s"}, {1e9, "GB/s"}, {1e6, "MB/s"}, {1e3, "kB/s"}};
-    const auto speed = ReadDouble(value);
-    if (!speed)
-        return std::nullopt;
-    for (const Unit& unit : kUnits) {
-        if (*speed >= unit.fSize)
-            return fmt::format(*speed < 1e15 ? "{:.4g} {}" : "{:.0f} {}", *speed / unit.fSize,
+    for (const Unit& unit : kUnits)
+        if (speed >= unit.fSize)
+            return fmt::format(speed < 1e15 ? "{:.4g} {}" : "{:.0f} {}", speed / unit.fSize,
                                unit.fName);
-    }
-    return fmt::format("{:.4g} B/s", *speed);
+    return fmt::format("{:.4g} B/s", speed);
+}
+
+// Returns the lower bound of a speed after this text; empty if there is none, or if the value is
+// within a tenth of it.
+std::string GetBoundText(const Answer& answer, const char* before)
+{
+    constexpr double kTenth = 0.1;
+    if (answer.fLowerBound <= 0 || answer.fKnown->fForm != ValueForm::kBytesPerSecond)
+        return {};
+    const auto value = ReadDouble(answer.fLine->fValue);
+    if (answer.IsKnown() && value &&
+        std::abs(*value - answer.fLowerBound) <= kTenth * std::max(*value, answer.fLowerBound))
+        return {};
+    return fmt::format("{}at least {} by the host's clock", before,
+                       GetSpeedText(answer.fLowerBound));
 }
 
 std::optional<std::string> GetFlagText(std::string_view value)
@@ -145,21 +131,51 @@ std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
     case ValueForm::kId:
         return GetIdText(value);
     case ValueForm::kBytesPerSecond:
-        return GetSpeedText(value);
+        if (const auto speed = ReadDouble(value))
+            return GetSpeedText(*speed);
+        break;
     case ValueForm::kScore:
         break;
     }
     return std::nullopt;
 }
 
+// Returns what is shown instead of a value that is not known; nothing if the value itself is shown.
+std::optional<std::string> GetUnknownValueText(const Answer& answer)
+{
+    switch (answer.fUnknown) {
+    case Unknown::kNot:
+    case Unknown::kCut:
+        break;
+    case Unknown::kNoAdapter:
+        return answer.fKnown->fForm == ValueForm::kAdapter
+                   ? "none (no adapter of the system matches)"
+                   : "not known (no adapter of the system matches)";
+    case Unknown::kNotListed:
+        return "not known (not in the adapter lists)";
+    case Unknown::kEmpty:
+        return "not known (the text is empty)";
+    case Unknown::kNoFigure:
+        return "not known (no source has it)";
+    case Unknown::kNoTime:
+    case Unknown::kImplausible:
+        return fmt::format("not known ({}: {}{})", GetUnknownText(answer.fUnknown),
+                           ShowBytes(answer.fLine->fValue), GetBoundText(answer, "; "));
+    }
+    return std::nullopt;
+}
+
 // Returns what follows a value that is known.
-const char* GetNote(const Answer& answer)
+std::string GetNote(const Answer& answer)
 {
     if (!answer.fKnown)
-        return "";
+        return {};
     // The newest version that the child distinguishes stands for all newer ones, too.
     if (answer.fKnown->fKey == "GLVersion" && answer.fLine->fValue == "4.1")
         return " or later";
+    const std::string bound = GetBoundText(answer, " (");
+    if (!bound.empty())
+        return bound + ")";
     return answer.fKnown->fForm == ValueForm::kScore ? " (no unit; more is better)" : "";
 }
 

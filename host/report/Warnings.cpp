@@ -25,7 +25,8 @@ constexpr Check kReportChecks[] = {
     {"QGFOGLInitialized", "no-opengl", "OpenGL could not be initialized on any display device."},
     {"OGLContextCreated", "no-default-context",
      "No OpenGL context could be created on the first display device."},
-    {"NumGLGPUs", "no-opengl-device", "No OpenGL device was found."},
+    {"NumGLGPUs", "no-opengl-device",
+     "There is no OpenGL device on which a context can be created."},
 };
 
 std::string FindCause(const RunOutcome& outcome, const std::string& key)

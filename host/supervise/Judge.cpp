@@ -46,7 +46,7 @@ std::string Where(const ReportProgress& report)
     if (!report.HasValues())
         return " before its first line";
     const std::string next = report.GetSequence().GetNextKey();
-    return next.empty() ? " after its last line" : " while " + GetActivityText(next);
+    return next.empty() ? " after the report was whole" : " while " + GetActivityText(next);
 }
 
 void JudgeNormalEnd(const Evidence& evidence, RunOutcome& outcome)
@@ -86,6 +86,7 @@ bool IsComplete(const Evidence& evidence, const RunOutcome& outcome)
 void ReportProgress::Add(const ReportLine& line)
 {
     fSequence.Add(line);
+    fCopies.Add(line);
     if (line.fKind == LineKind::kComment) {
         fLastLogLine = line.fText;
         return;
@@ -102,6 +103,7 @@ void ReportProgress::Add(const ReportLine& line)
 
 void Judge(const Evidence& evidence, RunOutcome& outcome)
 {
+    outcome.fLowerBounds = evidence.fReport.GetLowerBounds();
     outcome.fLastReportLine = evidence.fReport.GetLastReportLine();
     outcome.fLastLogLine = evidence.fReport.GetLastLogLine();
     if (!evidence.fStartFailure.empty()) {

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "pmutil/TrackingLauncher.h"
+#include "report/CopyClock.h"
 #include "report/ReportLine.h"
 #include "report/RunOutcome.h"
 #include "report/SequenceReader.h"
@@ -34,6 +35,8 @@ public:
 
     const SequenceReader& GetSequence() const { return fSequence; }
 
+    const std::vector<LowerBound>& GetLowerBounds() const { return fCopies.GetBounds(); }
+
 private:
     bool fHasValues = false;
     bool fHasStart = false;
@@ -42,6 +45,7 @@ private:
     std::string fLastKey;
     std::string fLastLogLine;
     SequenceReader fSequence;
+    CopyClock fCopies;
 };
 
 // Why the host killed the child.
@@ -55,8 +59,8 @@ struct Evidence {
     ReportProgress fReport;
 };
 
-// Sets the verdict, the exit status, the termination, the reason and the last lines of the outcome.
-// Its command and its error lines must be set before.
+// Sets the verdict, the exit status, the termination, the reason, the last lines and the lower
+// bounds of the outcome. Its command and its error lines must be set before.
 void Judge(const Evidence& evidence, RunOutcome& outcome);
 
 // Whether the line of standard error is the child's message of a failure: "exception: TEXT",

@@ -149,6 +149,27 @@ def test_the_forms_agree(tmp_path, name):
                    for tag, term, _ in cards) in range(known, known + 2)
 
 
+def test_a_clock_that_stands_still_has_a_bound_by_another(tmp_path):
+    """Its size depends on this machine."""
+    stored = tmp_path / "report.json"
+    stored.write_bytes(test_usable.run(tmp_path, FAILURES["clock that stands still"],
+                                       "--format", "json").out)
+    document = validate_document(stored.read_bytes())
+    bounds = document["outcome"]["lowerBounds"]
+    assert [bound["key"] for bound in bounds] == ["clgpu[0].CLBandwidth"]
+    keys = next(device["keys"] for device in document["devices"] if device["tag"] == "clgpu[0]")
+    assert not keys["CLBandwidth"]["known"]
+    assert "number" not in keys["CLBandwidth"]
+    words = "not known (the device's clock reported no elapsed time: 0; at least "
+    assert words in joined(show(stored).text)
+    page = show(stored, "--format", "html").text
+    assert words in html.unescape(page)
+    assert "Copy bandwidth (more is better)" not in page
+    prometheus = show(stored, "--format", "prometheus").text
+    assert "bytes_per_second{" not in prometheus
+    assert host_run("check", "--from", str(stored), "--require", "CLBandwidth>=0").status == 7
+
+
 def test_events_and_a_plain_report(tmp_path):
     failure = FAILURES["none"]
     events = tmp_path / "report.jsonl"

@@ -118,6 +118,16 @@ TEST(JsonSecondDocument, HasWarningsAndCauses)
     EXPECT_EQ(document["devices"][0]["software"], Json::parse(R"({"known": true, "flag": true})"));
 }
 
+TEST(JsonSecondDocument, HasLowerBounds)
+{
+    EXPECT_EQ(Document("")["outcome"]["lowerBounds"], Json::array());
+    RunOutcome outcome = MakeOutcome(Verdict::kComplete);
+    outcome.fLowerBounds = {{"clgpu[0].CLBandwidth", 1.5e9}, {"clgpu[1].CLBandwidth", 0.1}};
+    EXPECT_EQ(Document(Sample(0, 2).GetText(), outcome)["outcome"]["lowerBounds"],
+              Json::parse(R"([{"key": "clgpu[0].CLBandwidth", "value": 1.5e9}, )"
+                          R"({"key": "clgpu[1].CLBandwidth", "value": 0.1}])"));
+}
+
 TEST(JsonSecondDocument, HasTheNextSteps)
 {
     EXPECT_EQ(Document(Sample(1, 1).GetText())["nextSteps"], Json::array());

@@ -47,6 +47,7 @@ RunOutcome MakeFullOutcome(Verdict verdict)
     outcome.fLostOutputBytes = 12;
     outcome.fLostErrorBytes = 34;
     outcome.fCauses = {{"glgpu[0].GLVendor", "a cause \xFF"}};
+    outcome.fLowerBounds = {{"clgpu[1].CLBandwidth", 123456789.125}};
     outcome.fLeftBehind = true;
     outcome.fDrivers = {
         {{DeviceKind::kOpenGL, "/lib/libEGL.so.1.1.0", {"1.1.0", {}}, {"c16a", {}}},

@@ -56,6 +56,28 @@ TEST(ValueText, ShowsNoSpeedByAWrongClock)
               "not known (the device's clock is unreliable: 8e+09)");
 }
 
+// Returns the copy bandwidth as it is shown beside a bound by the host's clock.
+std::string ShowSpeed(const std::string& value, double bound)
+{
+    RunOutcome outcome;
+    outcome.fLowerBounds = {{"clgpu[0].CLBandwidth", bound}};
+    const Report report = ReadReport("clgpu[0].CLBandwidth=" + value + "\n");
+    return GetValueText(GetAnswers(report, outcome).fDevices.at(0).fAnswers.at(10));
+}
+
+TEST(ValueText, ShowsABoundThatDiffersByMoreThanATenth)
+{
+    EXPECT_EQ(ShowSpeed("1e+09", 0.91e9), "1 GB/s");
+    EXPECT_EQ(ShowSpeed("1e+09", 1.09e9), "1 GB/s");
+    EXPECT_EQ(ShowSpeed("1e+09", 0.89e9), "1 GB/s (at least 890 MB/s by the host's clock)");
+    EXPECT_EQ(ShowSpeed("1e+09", 2e9), "1 GB/s (at least 2 GB/s by the host's clock)");
+    EXPECT_EQ(ShowSpeed("0", 2e9), "not known (the device's clock reported no elapsed time: 0; at "
+                                   "least 2 GB/s by the host's clock)");
+    EXPECT_EQ(ShowSpeed("1e+30", 2e9), "not known (the device's clock is unreliable: 1e+30; at "
+                                       "least 2 GB/s by the host's clock)");
+    EXPECT_EQ(ShowSpeed("1e+09", 0), "1 GB/s");
+}
+
 TEST(ValueText, SaysThatTheNewestVersionStandsForLaterOnes)
 {
     EXPECT_EQ(Show("glgpu[0].GLVersion=\"4.1\""), "4.1 or later");

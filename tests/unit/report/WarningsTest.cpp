@@ -185,7 +185,7 @@ TEST(Warnings, NameFailedChecksOfTheReport)
                 ElementsAre("The graphics library could not be initialized.",
                             "OpenGL could not be initialized on any display device.",
                             "No OpenGL context could be created on the first display device.",
-                            "No OpenGL device was found."));
+                            "There is no OpenGL device on which a context can be created."));
 }
 
 TEST(Warnings, NameLostBytesAndProcessesLeftBehind)

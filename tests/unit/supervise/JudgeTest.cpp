@@ -173,6 +173,20 @@ TEST(Judge, DistinguishesCrashHangAndInterrupt)
     EXPECT_EQ(died.Judge().fVerdict, Verdict::kHung);
 }
 
+TEST(Judge, TakesTheBoundsOfMeasurementsFromTheLog)
+{
+    const std::string prefix = "# 00001.2026.11.22_10:00:00.";
+    const std::string name = "(+00.000)[tid=1] GPUImplHardware::checkBandwidthCL: ";
+    const RunOutcome outcome = Case{prefix + "000" + name + "0 of 100, totalSeconds=0\n" + prefix +
+                                        "099" + name + "seconds=0.1\nclgpu[0].CLBandwidth=1\n",
+                                    {},
+                                    {},
+                                    Ended(0)}
+                                   .Judge();
+    EXPECT_DOUBLE_EQ(outcome.FindLowerBound("clgpu[0].CLBandwidth"), 3355443200);
+    EXPECT_EQ(outcome.FindLowerBound("clgpu[1].CLBandwidth"), 0);
+}
+
 TEST(Judge, KeepsAnEndJustBeforeTheKill)
 {
     Case ended{kWhole, {}, {}, Ended(0)};
