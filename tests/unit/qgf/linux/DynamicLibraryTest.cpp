@@ -39,7 +39,6 @@ TEST(OpenLibrary, NamesEachThatCannotBeOpened)
                                      "; no-such-2.so can't be opened (no-such-2.so" + reason);
 }
 
-// Only the first open counts: the library stays while there is an object of it.
 TEST(OpenLibrary, ClosesItAtTheEnd)
 {
     const char* const names[] = {"libanl.so.1", nullptr};
@@ -51,6 +50,10 @@ TEST(OpenLibrary, ClosesItAtTheEnd)
     };
     if (isLoaded())
         GTEST_SKIP() << "the test program has it already";
+    void* const first = dlopen(names[0], RTLD_LAZY);
+    if (first == nullptr)
+        GTEST_SKIP() << "this C library comes without it";
+    dlclose(first);
     {
         const auto library = QGF::Core::OpenLibrary(names);
         EXPECT_TRUE(isLoaded());
