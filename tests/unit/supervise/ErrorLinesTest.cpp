@@ -26,6 +26,9 @@ TEST(ErrorLines, AreCutAtTheLimits)
     longLine.Feed(std::string(ErrorLines::kMaxLineBytes + 5, 'x'));
     EXPECT_THAT(longLine.Finish().front(), SizeIs(ErrorLines::kMaxLineBytes));
     EXPECT_EQ(longLine.GetLostByteCount(), 5U);
+    EXPECT_THAT(longLine.Feed(std::string(ErrorLines::kMaxLineBytes + 3, 'y') + "\n").front(),
+                SizeIs(ErrorLines::kMaxLineBytes));
+    EXPECT_EQ(longLine.GetLostByteCount(), 8U);
 
     ErrorLines manyLines;
     EXPECT_THAT(manyLines.Feed(std::string(ErrorLines::kMaxLines + 5, '\n')),
