@@ -9,9 +9,10 @@ import re
 
 import pytest
 
+import test_series
 from browser import browser
 from calls import FullMachine
-from clmodel import ClGpu, ClPlatform
+from clmodel import ClGpu, ClPlatform, cl_script_of
 from harness import PROGRAM_AT_ROOT, TREE, text_of
 from hosting import host_run, script_child
 from validate import validate_document
@@ -60,7 +61,21 @@ def never_started(folder):
     return host_run("run", "--assay", str(folder / "nothing"), "--format", "html")
 
 
-def hostile(folder, form="html", length=0):
+def series(folder):
+    """Of OpenCL alone, with an outlier and a crash."""
+    runs = test_series.noisy(12, 1)
+    runs[5] = test_series.gpu(2_000_000_000)
+    runs[8] = cl_script_of([ClPlatform([test_series.gpu()])]) + "at clEnqueueNDRangeKernel crash\n"
+    machine = test_series.Machine(folder)
+    machine.set_runs(runs)
+    return machine.run("--repeat", "12", "--format", "html")
+
+
+def hostile_series(folder):
+    return hostile(folder, "html", 0, "--repeat", "3")
+
+
+def hostile(folder, form="html", length=0, *options):
     """Each text of a whole report with what could do harm, and so much more of it; the name has 64 KiB."""
     (folder / "plain").mkdir()
     lines = run(folder / "plain", "--raw").text.split("\n\n")[0].splitlines()
@@ -73,7 +88,7 @@ def hostile(folder, form="html", length=0):
     (folder / "text").write_text(text, encoding="utf-8")
     (folder / "errors").write_text(long + "\n" + HOSTILE, encoding="utf-8")
     child = script_child(folder, f'cat "{folder}/text"; cat "{folder}/errors" >&2')
-    return host_run("run", "--assay", str(child), "--format", form)
+    return host_run("run", "--assay", str(child), "--format", form, *options)
 
 
 def long(folder):
@@ -82,7 +97,8 @@ def long(folder):
 
 
 PAGES = {"healthy": healthy, "crashed": crashed, "two-cards": two_cards, "trial-failed": trial_failed,
-         "never-started": never_started, "hostile": hostile, "long": long}
+         "never-started": never_started, "hostile": hostile, "long": long,
+         "series": series, "hostile-series": hostile_series}
 HEADLINES = {
     "healthy": "OpenGL works on graphics hardware.",
     "crashed": "assay crashed with signal 11 (Segmentation fault)",
@@ -91,6 +107,8 @@ HEADLINES = {
     "never-started": "assay could not be started",
     "hostile": "OpenGL works on graphics hardware.",
     "long": "OpenGL works on graphics hardware.",
+    "series": "assay crashed with signal 11 (Segmentation fault)",
+    "hostile-series": "OpenGL works on graphics hardware.",
 }
 
 
@@ -113,7 +131,7 @@ def test_a_page_says_what_happened(window, pages, name):
     assert window.run("return document.querySelectorAll('h1').length") == 1
     assert window.run("return document.documentElement.lang") == "en"
     advice = window.run("return [...document.querySelectorAll('h2')].some(h => h.innerText === 'What to do')")
-    assert advice == (name not in ("healthy", "two-cards", "hostile", "long"))
+    assert advice == (name not in ("healthy", "two-cards", "hostile", "long", "hostile-series"))
 
 
 @pytest.mark.parametrize("name", PAGES)
