@@ -4,7 +4,6 @@
 #include <vector>
 
 #include <boost/nowide/convert.hpp>
-#include <boost/nowide/cstdlib.hpp>
 
 #include "bugreport/Mask.h"
 
@@ -20,10 +19,12 @@ std::string GetComputerName(COMPUTER_NAME_FORMAT format)
                                                           : std::string();
 }
 
-std::string GetVariable(const char* name)
+// Returns the value of a variable; empty if it isn't set.
+std::string GetVariable(const wchar_t* name)
 {
-    const char* const value = boost::nowide::getenv(name);
-    return value ? value : "";
+    std::wstring value(::GetEnvironmentVariableW(name, nullptr, 0), L'\0');
+    value.resize(::GetEnvironmentVariableW(name, value.data(), static_cast<DWORD>(value.size())));
+    return boost::nowide::narrow(value);
 }
 
 std::string GetUserText()
@@ -42,10 +43,10 @@ std::vector<Secret> ListSecrets()
          {ComputerNamePhysicalDnsFullyQualified, ComputerNamePhysicalDnsHostname,
           ComputerNamePhysicalNetBIOS})
         secrets.push_back({GetComputerName(format), "HOST"});
-    secrets.push_back({GetVariable("COMPUTERNAME"), "HOST"});
+    secrets.push_back({GetVariable(L"COMPUTERNAME"), "HOST"});
     secrets.push_back({GetUserText(), "USER"});
-    secrets.push_back({GetVariable("USERNAME"), "USER"});
-    secrets.push_back({GetVariable("USERPROFILE"), "HOME"});
+    secrets.push_back({GetVariable(L"USERNAME"), "USER"});
+    secrets.push_back({GetVariable(L"USERPROFILE"), "HOME"});
     return secrets;
 }
 
