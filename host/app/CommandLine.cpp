@@ -81,7 +81,6 @@ public:
         fApp.allow_windows_style_options(false);
         fApp.require_subcommand(1);
         fApp.footer("\"assay-host COMMAND --help\" describes a command.");
-        std::string names;
         for (const auto& make : {MakeRunOptions, MakeTortureOptions, MakeDiffOptions,
                                  MakeShowOptions, MakeExplainOptions, MakeCheckOptions,
                                  MakeAdviseOptions, MakeStateOptions, MakeBugReportOptions}) {
@@ -93,10 +92,9 @@ public:
             command->set_version_flag("--version", kVersion)->group(""); // not in its help
             if (std::find(fWords.fOwn.begin(), fWords.fOwn.end(), help.fName) != fWords.fOwn.end())
                 options->Add(*command);
-            names += names.empty() ? help.fName : std::string("|") + help.fName;
             fCommands.push_back({command, std::move(options)});
         }
-        fFormatter->AddUsage("assay-host", names + " [option...]");
+        fFormatter->AddUsage("assay-host", "COMMAND [option...]");
     }
 
     Parsed Parse()

@@ -7,7 +7,7 @@ from hosting import host_run
 HELP = {
     None: """\
 Runs assay as a child process, survives its failures, and shows its report.
-usage: assay-host run|torture|diff|show|explain|check|advise|state|bugreport [option...]
+usage: assay-host COMMAND [option...]
 
 Options:
   -h,--help               show this text
@@ -57,7 +57,7 @@ Options:
   -h,--help               show this text
   --assay PATH            program to run [beside assay-host, or on the PATH]
   --timeout SECONDS       kill the child after this time, 0: never [60]
-  --output FILE           a new file [assay-bugreport-TIME.zip in the current folder]
+  --output FILE           a new file [./assay-bugreport-TIME.zip]
   --yes                   write without asking
 
 Lists what the archive has, and asks before it writes it.
@@ -134,7 +134,7 @@ Options:
   -h,--help               show this text
   --require TEXT          a requirement; may be repeated
   --requirements FILE     a file of them; may be repeated
-  --from FILE             check a stored report instead of a run; may be repeated
+  --from FILE             check a stored report, not a run; may be repeated
   --state FOLDER          check what advise remembers, without a run
   --max-age DAYS          what is older there isn't known any more [30]
   --baseline FILE         the report of a good machine, to be as
@@ -206,3 +206,8 @@ def test_help(command, option):
 def test_help_wins_over_what_is_missing():
     run = host_run("diff", "--help", "only-one")
     assert (run.status, run.text, run.err) == (0, HELP["diff"], b"")
+
+
+@pytest.mark.parametrize("text", HELP.values(), ids=[str(command) for command in HELP])
+def test_fits_the_width_of_a_terminal(text):
+    assert max(map(len, text.splitlines())) <= 80

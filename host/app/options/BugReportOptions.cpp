@@ -18,8 +18,8 @@ public:
     void Add(CLI::App& command) override
     {
         AddChildOptions(command, fChoice.fChild);
-        AddText(command, "--output", fChoice.fOutput,
-                "a new file [assay-bugreport-TIME.zip in the current folder]", "FILE");
+        AddText(command, "--output", fChoice.fOutput, "a new file [./assay-bugreport-TIME.zip]",
+                "FILE");
         command.add_flag("--yes", fChoice.fYes, "write without asking");
     }
 

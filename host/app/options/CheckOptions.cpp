@@ -27,7 +27,7 @@ public:
         AddTexts(command, "--requirements", fChoice.fRequirementFiles,
                  "a file of them; may be repeated", "FILE");
         AddTexts(command, "--from", fChoice.fReports,
-                 "check a stored report instead of a run; may be repeated", "FILE");
+                 "check a stored report, not a run; may be repeated", "FILE");
         AddText(command, "--state", fChoice.fState, "check what advise remembers, without a run",
                 "FOLDER");
         AddNumber(command, "--max-age", fChoice.fMaxAgeDays,
