@@ -26,10 +26,16 @@ public:
         return fPlatform->Launch(program, args);
     }
 
-    WaitResult Wait(int* exitCode) override { return fPlatform->Wait(exitCode); }
+    WaitResult Wait(int* exitCode) override
+    {
+        const WaitResult result = fPlatform->Wait(exitCode);
+        const boost::lock_guard<boost::mutex> lock(fHoldsEnd);
+        return result;
+    }
     void Kill() override { fPlatform->Kill(); }
 
     std::atomic<int> fLaunches{0};
+    boost::mutex fHoldsEnd; // while a test has it locked, no wait learns the child's end
 
 private:
     const boost::shared_ptr<Launcher> fPlatform = MakeLauncher();

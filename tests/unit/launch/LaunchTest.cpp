@@ -273,6 +273,8 @@ TEST_P(FaultMatrix, EndsAsPredictedIdleAndReusable)
                 launch.launcher.Kill();
             } catch (const Exception& exc) {
                 failure = exc.what();
+                // The launcher's thread must not join with this short wait.
+                const boost::lock_guard<boost::mutex> noEnd(launch.platform->fHoldsEnd);
                 const NoShortWait noWait; // the state doesn't change
                 launch.launcher.Kill();   // fires once
             }
