@@ -281,7 +281,7 @@ def test_archive_of_a_bug_report(tmp_path):
     with zipfile.ZipFile(path) as archive:
         assert archive.testzip() is None
         files = {name.split("/")[1]: archive.read(name).decode() for name in archive.namelist()}
-    assert validate_document(files["report.json"])["outcome"]["verdict"] == "complete"
+    assert validate_document(files["report.json"].encode())["outcome"]["verdict"] == "complete"
     assert "wmiNumDevices=" in files["adapters.txt"]
     assert "event log" in files["kernel.txt"]
     assert "event log" in files["README.txt"].split("\nMissing:\n")[1]
