@@ -6,8 +6,8 @@
 
 #include <gmock/gmock.h>
 
-#include "Allocations.h"
 #include "pmutil_gpu/GPUImplWin.h"
+#include "support/Allocations.h"
 #include "support/CapturedFailures.h"
 #include "support/CapturedLog.h"
 #include "support/FakeOpenCL.h"

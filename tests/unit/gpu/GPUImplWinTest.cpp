@@ -7,8 +7,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "Allocations.h"
 #include "pmutil_gpu/GPU.h"
+#include "support/Allocations.h"
 #include "support/CapturedLog.h"
 #include "support/FakeOpenGL.h"
 #include "support/ScriptedAdapters.h"

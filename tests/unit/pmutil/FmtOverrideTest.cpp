@@ -10,7 +10,7 @@ namespace {
 template <typename T>
 std::string Text(Fmt& fmt, T value)
 {
-    std::string text;
+    std::string text = "earlier";
     fmt.Format(text, value);
     return text;
 }
@@ -54,29 +54,29 @@ TEST(FmtTable, AnEntryServesItsOwnKindAlone)
     }
 }
 
-// Records which of its operations was called.
+// Appends which of its operations was called: nothing of an earlier text may be left by then.
 class Telling : public Fmt {
 protected:
-    void FormatPointer(std::string& out, const void*, const char*) override { out = "Pointer"; }
-    void FormatCString(std::string& out, const char*, const char*) override { out = "CString"; }
-    void FormatDouble(std::string& out, double, const char*) override { out = "Double"; }
-    void FormatFloat(std::string& out, float, const char*) override { out = "Float"; }
+    void FormatPointer(std::string& out, const void*, const char*) override { out += "Pointer"; }
+    void FormatCString(std::string& out, const char*, const char*) override { out += "CString"; }
+    void FormatDouble(std::string& out, double, const char*) override { out += "Double"; }
+    void FormatFloat(std::string& out, float, const char*) override { out += "Float"; }
     void FormatULongLong(std::string& out, unsigned long long, const char*) override
     {
-        out = "ULongLong";
+        out += "ULongLong";
     }
-    void FormatLongLong(std::string& out, long long, const char*) override { out = "LongLong"; }
-    void FormatULong(std::string& out, unsigned long, const char*) override { out = "ULong"; }
-    void FormatLong(std::string& out, long, const char*) override { out = "Long"; }
-    void FormatUInt(std::string& out, unsigned int, const char*) override { out = "UInt"; }
-    void FormatInt(std::string& out, int, const char*) override { out = "Int"; }
-    void FormatUShort(std::string& out, unsigned short, const char*) override { out = "UShort"; }
-    void FormatShort(std::string& out, short, const char*) override { out = "Short"; }
-    void FormatUChar(std::string& out, unsigned char, const char*) override { out = "UChar"; }
-    void FormatSChar(std::string& out, signed char, const char*) override { out = "SChar"; }
-    void FormatChar(std::string& out, char, CharFormat) override { out = "Char"; }
-    void FormatBool(std::string& out, bool, const char*) override { out = "Bool"; }
-    void FormatFourCC(std::string& out, std::uint32_t) override { out = "FourCC"; }
+    void FormatLongLong(std::string& out, long long, const char*) override { out += "LongLong"; }
+    void FormatULong(std::string& out, unsigned long, const char*) override { out += "ULong"; }
+    void FormatLong(std::string& out, long, const char*) override { out += "Long"; }
+    void FormatUInt(std::string& out, unsigned int, const char*) override { out += "UInt"; }
+    void FormatInt(std::string& out, int, const char*) override { out += "Int"; }
+    void FormatUShort(std::string& out, unsigned short, const char*) override { out += "UShort"; }
+    void FormatShort(std::string& out, short, const char*) override { out += "Short"; }
+    void FormatUChar(std::string& out, unsigned char, const char*) override { out += "UChar"; }
+    void FormatSChar(std::string& out, signed char, const char*) override { out += "SChar"; }
+    void FormatChar(std::string& out, char, CharFormat) override { out += "Char"; }
+    void FormatBool(std::string& out, bool, const char*) override { out += "Bool"; }
+    void FormatFourCC(std::string& out, std::uint32_t) override { out += "FourCC"; }
 };
 
 TEST(FmtOverride, IsCalledForItsOwnKindAlone)
@@ -87,7 +87,7 @@ TEST(FmtOverride, IsCalledForItsOwnKindAlone)
                                         "Long", "ULong", "LongLong", "ULongLong", "Float", "Double",
                                         "CString", "Pointer"}));
     EXPECT_EQ(Text(fmt, 'a'), "Char");
-    std::string code;
+    std::string code = "earlier";
     fmt.FormatCode(code, 0x61626364);
     EXPECT_EQ(code, "FourCC");
 }

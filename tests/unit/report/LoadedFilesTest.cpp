@@ -65,6 +65,7 @@ TEST(LoadedFiles, AreNotTheRuntime)
                     "loaded for OpenGL: /lib/ld-linux-x86-64.so.2",
                     "loaded for OpenGL: C:\\windows\\system32\\MSVCP140.dll",
                     "loaded for OpenGL: C:\\windows\\system32\\ucrtbase.dll",
+                    "loaded for OpenGL: C:\\windows\\system32\\API-MS-WIN-CORE.DLL",
                     "loaded for OpenGL: /lib/libcrypto.so.3"}),
               Texts{"OpenGL /lib/libcrypto.so.3"});
 }

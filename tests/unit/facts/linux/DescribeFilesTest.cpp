@@ -37,8 +37,9 @@ TEST(DescribeFiles, FindsTheVersionInTheName)
     EXPECT_EQ(Describe("/no/-1.so").fVersion.fValue, "1");
     EXPECT_EQ(Describe("/no/libx.so.9").fVersion.fValue, "9");
     EXPECT_EQ(Describe("/no/libglib-2.0.so.0.7400.6").fVersion.fValue, "0.7400.6");
-    for (const char* path : {"/no/iris_dri.so", "/no/x-1.so.2/libm.so", "", "/x.so.", "/libx.so.b",
-                             "/no/libxcb-dri2.so", "/no/libx-a1.so", "/no/lib-1"}) {
+    for (const char* path :
+         {"/no/iris_dri.so", "/no/x-1.so.2/libm.so", "", "/x.so.", "/libx.so.b",
+          "/no/libxcb-dri2.so", "/no/libx-a1.so", "/no/lib-1", "/no/libx.so-1"}) {
         const Fact version = Describe(path).fVersion;
         EXPECT_EQ(version.fValue, "") << path;
         EXPECT_EQ(version.fReason, "the file's name has none");

@@ -3,21 +3,18 @@
 
 #include <cerrno>
 #include <csignal>
-#include <cstddef>
 #include <cstdlib>
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <iterator>
-#include <linux/filter.h>
-#include <linux/seccomp.h>
 #include <sched.h>
 #include <string>
 #include <sys/mman.h>
 #include <sys/prctl.h>
+#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
-#include <vector>
 
 #include <boost/filesystem/directory.hpp>
 
@@ -26,35 +23,20 @@
 #include "pmutil/LauncherPosix.h"
 #include "pmutil/Reader.h"
 #include "support/Waits.h"
+#include "support/linux/RefusedCalls.h"
 
 using namespace pmutil;
 
 namespace {
 
-// From now on a call fails with an errno; if `argument` isn't negative, only one whose argument of
-// this number has the value.
+void Filter(long call, int argument, unsigned value, unsigned result)
+{
+    REQUIRE_SO(FilterCall(call, argument, value, result));
+}
+
 void Refuse(long call, int argument, unsigned value, int error)
 {
-    const auto load = [](std::size_t offset) {
-        return sock_filter BPF_STMT(BPF_LD | BPF_W | BPF_ABS, static_cast<unsigned>(offset));
-    };
-    const auto unlessEqual = [](unsigned expected, std::size_t skipped) {
-        return sock_filter BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, expected, 0,
-                                    static_cast<unsigned char>(skipped));
-    };
-    const auto end = [](unsigned result) { return sock_filter BPF_STMT(BPF_RET | BPF_K, result); };
-    std::vector<sock_filter> checks;
-    if (argument >= 0)
-        checks = {load(offsetof(seccomp_data, args) + 8 * static_cast<unsigned>(argument)),
-                  unlessEqual(value, 1)};
-    std::vector<sock_filter> filter = {load(offsetof(seccomp_data, nr)),
-                                       unlessEqual(static_cast<unsigned>(call), checks.size() + 1)};
-    filter.insert(filter.end(), checks.begin(), checks.end());
-    filter.push_back(end(SECCOMP_RET_ERRNO | static_cast<unsigned>(error)));
-    filter.push_back(end(SECCOMP_RET_ALLOW));
-    const sock_fprog program{static_cast<unsigned short>(filter.size()), filter.data()};
-    REQUIRE_SO(::prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0);
-    REQUIRE_SO(::prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) == 0);
+    REQUIRE_SO(RefuseCall(call, argument, value, error));
 }
 
 void RefuseCloseRange()
@@ -78,11 +60,11 @@ bool HasAnyChild()
     return ::waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT | __WALL) == 0;
 }
 
-std::string FailLaunch()
+std::string FailLaunch(const wchar_t* program = L"/bin/true")
 {
     KeptLauncher launcher;
     try {
-        launcher.Launch(L"/bin/true", {});
+        launcher.Launch(program, {});
     } catch (const std::runtime_error& failure) {
         return failure.what();
     }
@@ -124,6 +106,47 @@ TEST_F(KeptLauncherRefusal, OfAProcessIsNamed)
     });
 }
 
+TEST_F(KeptLauncherRefusal, AKeeperThatDiesBeforeItsReplyFailsTheLaunch)
+{
+    ExpectInFreshProcess([] {
+        // Before Linux 5.16 a core dump ends all processes that share the memory.
+        REQUIRE_SO(::prctl(PR_SET_DUMPABLE, 0) == 0);
+        Filter(SYS_setpgid, -1, 0, SECCOMP_RET_KILL_PROCESS); // the keeper's first call
+        REQUIRE_SO(FailLaunch() == "execve failed: /bin/true: No child processes");
+        REQUIRE_SO(!HasAnyChild());
+    });
+}
+
+TEST_F(KeptLauncherRefusal, OfADescriptorWithTheChildsProcessIsMadeUpFor)
+{
+    ExpectInFreshProcess([] {
+        Refuse(SYS_clone, 0, CLONE_VM | CLONE_VFORK | CLONE_PIDFD | SIGCHLD, EINVAL);
+        KeptLauncher launcher;
+        LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", "read line; exit 3"});
+        ends.fAppInput.reset();
+        int exitCode = -1;
+        REQUIRE_SO(launcher.Wait(&exitCode) == kEndedNormally);
+        REQUIRE_SO(exitCode == 3);
+        KeptLauncher killed;
+        ends = killed.Launch(L"/bin/sh", {"-c", "exec sleep 1000"});
+        killed.Kill();
+        REQUIRE_SO(killed.Wait(&exitCode) == kEndedByKill);
+    });
+}
+
+TEST_F(KeptLauncherRefusal, OfItsKeepersNumberKeepsTheChildFromTheProgram)
+{
+    ExpectInFreshProcess([] {
+        Refuse(SYS_getppid, -1, 0, EPERM); // as if the keeper had ended
+        KeptLauncher launcher;
+        const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", "echo begun"});
+        REQUIRE_SO(ReadLine(*ends.fAppOutput[1]).empty());
+        int exitCode = -1;
+        REQUIRE_SO(launcher.Wait(&exitCode) == kEndedNormally);
+        REQUIRE_SO(exitCode == 1);
+    });
+}
+
 TEST_F(KeptLauncherRefusal, OfTheChildsProcessIsNamed)
 {
     ExpectInFreshProcess([] {
@@ -148,7 +171,27 @@ TEST_F(KeptLauncherRefusal, OfSharedMemoryLeavesAKeeperOfItsOwnMemory)
     });
 }
 
-// More descriptors than one read of their list holds, from `first` on.
+TEST_F(KeptLauncherRefusal, OfSharedMemoryAndADescriptorLeavesNoKeeper)
+{
+    ExpectInFreshProcess([] {
+        Refuse(SYS_clone, 0, CLONE_VM | CLONE_PIDFD, EINVAL);
+        // The undefined behaviour sanitizer opens a descriptor for its first check of a type.
+        REQUIRE_SO(FailLaunch().empty());
+        REQUIRE_SO(!FailLaunch(L"/no/such/program").empty());
+        rlimit descriptors = {};
+        ::getrlimit(RLIMIT_NOFILE, &descriptors);
+        descriptors.rlim_cur = STDERR_FILENO;
+        std::string failure;
+        do {
+            ++descriptors.rlim_cur;
+            REQUIRE_SO(::setrlimit(RLIMIT_NOFILE, &descriptors) == 0);
+            failure = FailLaunch();
+            REQUIRE_SO(!HasAnyChild());
+        } while (!failure.empty());
+    });
+}
+
+// More descriptors than one read of their list holds, with each first digit, from `first` on.
 void OpenMany(int first)
 {
     for (int number = first; number < first + 500; ++number)
@@ -158,8 +201,19 @@ void OpenMany(int first)
 TEST_F(KeptLauncherRefusal, OfARangeToCloseLeavesTheChildItsStreamsOnly)
 {
     ExpectInFreshProcess([] {
-        OpenMany(100);
+        OpenMany(90);
         RefuseCloseRange();
+        KeptLauncher launcher;
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"state"});
+        REQUIRE_SO(ReadLine(*ends.fAppOutput[1]) == "descriptors 0 1 2");
+    });
+}
+
+TEST_F(KeptLauncherRefusal, OfAListOfDescriptorsLeavesTheChildItsStreamsOnly)
+{
+    ExpectInFreshProcess([] {
+        OpenMany(90);
+        Refuse(SYS_openat, 2, O_RDONLY | O_DIRECTORY, EACCES);
         KeptLauncher launcher;
         const LaunchResult ends = launcher.Launch(TEST_CHILD, {"state"});
         REQUIRE_SO(ReadLine(*ends.fAppOutput[1]) == "descriptors 0 1 2");
@@ -169,7 +223,7 @@ TEST_F(KeptLauncherRefusal, OfARangeToCloseLeavesTheChildItsStreamsOnly)
 TEST_F(KeptLauncherRefusal, OfARangeToCloseLeavesTheKeeperItsOwnDescriptorsOnly)
 {
     ExpectInFreshProcess([] {
-        OpenMany(100);
+        OpenMany(90);
         RefuseCloseRange();
         KeptLauncher launcher;
         const LaunchResult ends =
@@ -248,16 +302,59 @@ TEST_F(LauncherPosixRefusal, OfAnEndIsNamed)
     });
 }
 
-#ifdef SYS_poll // newer processors have ppoll only
+#ifdef SYS_poll             // newer processors have ppoll only
+constexpr int kTimeout = 2; // the argument of poll, in milliseconds
+constexpr unsigned kNoLimit = ~0U;
+constexpr unsigned kSecond = 1000;
+
 TEST_F(LauncherPosixRefusal, OfAWaitIsNamed)
 {
     ExpectInFreshProcess([] {
         LauncherPosix launcher;
         const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", kReading});
-        Refuse(SYS_poll, -1, 0, EPERM);
+        Refuse(SYS_poll, kTimeout, kNoLimit, EPERM);
+        Refuse(SYS_poll, kTimeout, kSecond, EIO);
         int exitCode = 0;
         REQUIRE_SO(Fail([&] { launcher.Wait(&exitCode); }) ==
                    "poll failed: Operation not permitted");
+        launcher.Kill(); // doesn't wait, because Wait was called
+    });
+}
+
+TEST_F(LauncherPosixRefusal, OfTheWaitOfAKillIsNamed)
+{
+    ExpectInFreshProcess([] {
+        LauncherPosix launcher;
+        const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", kReading});
+        Refuse(SYS_poll, kTimeout, kSecond, EPERM);
+        REQUIRE_SO(Fail([&] { launcher.Kill(); }) == "poll failed: Operation not permitted");
+    });
+}
+
+TEST_F(LauncherPosixRefusal, AKillWhoseWaitTimesOutLeavesTheEndToWait)
+{
+    ExpectInFreshProcess([] {
+        LauncherPosix launcher;
+        const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", kReading});
+        Refuse(SYS_poll, kTimeout, kSecond, 0);
+        errno = EINTR; // of an earlier call
+        launcher.Kill();
+        REQUIRE_SO(HasAnyChild());
+        int exitCode = 0;
+        REQUIRE_SO(launcher.Wait(&exitCode) == kEndedByKill);
+        REQUIRE_SO(!HasAnyChild());
+    });
+}
+
+TEST_F(KeptLauncherRefusal, AKeeperThatDoesNotEndInASecondIsLeft)
+{
+    ExpectInFreshProcess([] {
+        KeptLauncher launcher;
+        const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", kReading});
+        Refuse(SYS_poll, kTimeout, kSecond, 0);
+        errno = EINTR;
+        launcher.Leave();
+        REQUIRE_SO(HasAnyChild());
     });
 }
 #endif

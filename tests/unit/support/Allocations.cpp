@@ -1,4 +1,4 @@
-#include "Allocations.h"
+#include "support/Allocations.h"
 
 #include <atomic>
 #include <cstdint>
