@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A desktop program that draws with the graphics card as long as that works. The window is SDL's.
 //
 // usage: desktop [--frames NUMBER] FOLDER [PROGRAM]

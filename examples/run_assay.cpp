@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Runs a program with a timeout, prints its lines as they arrive, and then how it ended.
 //
 // usage: run_assay PROGRAM SECONDS [argument...]

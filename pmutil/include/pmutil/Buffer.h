@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A channel over a block of memory: an owned block, which may grow, or the caller's block.
 //
 // Invariants: position <= data size <= capacity; the dirty range is within the data. All sizes and

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // The base class of the byte streams: open and closed state, and the target of forwarding.
 //
 // A channel either implements its operations or forwards them to a target channel. Callers use the

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Makes the command of a child so that it receives exactly the given arguments. Any thread may
 // call.
 #pragma once

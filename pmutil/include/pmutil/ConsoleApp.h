@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Supervises one console child program: launches it on a separate thread, has its output read,
 // waits for it with a timeout, kills it, and stores how it ended. One launch at a time; any number
 // of launches in sequence.

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Access to a ConsoleApp for objects that may outlive it: each function checks first whether the
 // application still exists. Use an object on one thread only; copy it for another.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Launches a console program for a client: holds the application and the parameters of the launch.
 // Use it on the client's thread.
 //

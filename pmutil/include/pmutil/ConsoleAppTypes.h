@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // The types of a supervised launch: its parties, its states, its parameters and its failures.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Named debug values: process-wide integers, looked up by name, that control logging and a few
 // delays. They can't be set from outside the process; a value is 0, or its declared initial value,
 // until the program writes it.

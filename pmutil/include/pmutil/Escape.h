@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Escapes characters as printable text and back, by the same rules for one-byte and two-byte
 // characters. Used for log lines, adapter names and the value formatter.
 #pragma once

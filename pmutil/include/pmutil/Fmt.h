@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Formats typed values. Each C type has a default format, which can be replaced per call or in a
 // formatter's table. Unsigned numbers are formatted in hexadecimal.
 //

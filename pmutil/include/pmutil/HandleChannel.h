@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A channel over an operating-system file or pipe handle. PosixHandle and WinHandle are its two
 // instances; each has a `Platform` with the system calls.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Launches children through a keeper, for libraries: a process between the host and the child.
 //
 // The host needn't know of the child: its handlers and its waits for any child don't see the keeper

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // The start of one launch: lasts until the child and its output tasks run, or until the launch
 // fails. Any thread may use it.
 #pragma once

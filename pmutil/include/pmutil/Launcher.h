@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // The system calls of a launch: starts a program with pipes as its standard streams, waits for it,
 // kills it.
 #pragma once

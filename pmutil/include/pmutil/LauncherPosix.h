@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Launches, waits for and kills children with posix_spawn and process descriptors.
 //
 // The child has default signal dispositions, an empty signal mask, and no descriptors but its three

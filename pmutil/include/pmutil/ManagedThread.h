@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Owns a running thread, which can be joined with a timeout or abandoned.
 //
 // A process-wide registry, which is never destroyed, keeps the objects of abandoned threads alive.

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Parses command-line options of the form -name=value, for the child that performs them and for the
 // host that predicts their effect.
 #pragma once

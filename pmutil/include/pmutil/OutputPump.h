@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // An output task that passes the child's output to a function.
 //
 // Its DoRun reads until the end of the data, and doesn't return before the start of the launch is

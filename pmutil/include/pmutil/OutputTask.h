@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Reads one output channel of a child. Clients override DoRun, which reads from GetReader() until
 // the end of the data.
 //

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Logging. The most recently made live logger is the current one; all log statements of the process
 // write to it. A named debug value enables or disables a statement.
 //

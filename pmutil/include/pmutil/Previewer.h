@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Reads ahead on a Reader and then puts the bytes back.
 //
 //     Previewer preview(reader);

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Writes lines to a C stream on which a write may fail after any byte: a full disk, or a
 // non-blocking pipe.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A channel that can be read, written, positioned and truncated: a file or memory.
 #pragma once
 

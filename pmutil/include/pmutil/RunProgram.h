@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Runs a console program as a child with a timeout, and returns how it ended and what it wrote.
 //
 //     pmutil::RunOptions options;

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A process-wide stack of the live objects of a class, oldest first.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A ConsoleApp for clients that need no notifications. Any thread may wait for the end of the
 // start, for example before it writes to the child's standard input.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A request to end an operation, such as the run of a child. Any thread may use it.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Machine and process services. Each platform has its own source file; the callers have the logic.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Thread names for log lines. The table of names is never destroyed and entries are never removed,
 // so a thread whose id is reused has the old name until it is named.
 #pragma once

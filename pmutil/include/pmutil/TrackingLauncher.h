@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Wraps another launcher and records how its child ended. The record remains if ConsoleApp gives up
 // the launch, for example because another process holds the child's output open.
 #pragma once

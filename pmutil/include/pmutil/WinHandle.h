@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A channel over a Windows handle.
 //
 // A failed call throws std::runtime_error with its name, such as "CreateFileW failed".

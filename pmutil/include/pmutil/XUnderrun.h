@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Thrown for a transfer of fewer bytes than requested.
 #pragma once
 
