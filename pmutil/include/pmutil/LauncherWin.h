@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Launches, waits for and kills children with CreateProcessW.
 //
 // The child inherits its three pipes and no other handle.
@@ -27,8 +30,9 @@ public:
     LauncherWin();
 
     // With a job, each child is a member of it from its first instruction on, and its handles are
-    // closed by the next Launch and the destructor. The job must exist until Launch has returned.
-    // Null: no job.
+    // closed by the next Launch and the destructor. From Windows 10 on it is created in the job, so
+    // that one whose launcher is killed at any time ends with the job. The job must exist until
+    // Launch has returned. Null: no job.
     explicit LauncherWin(void* job);
     ~LauncherWin() override;
 
@@ -47,7 +51,7 @@ public:
 
 private:
     void* GetProcess() const; // its handle; null if no child was started
-    void EnterJob(void* process, void* thread) const;
+    void EnterJob(const ::_PROCESS_INFORMATION& child) const;
     void CloseJobMember();
 
     void* const fJob;

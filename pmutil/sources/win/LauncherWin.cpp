@@ -61,36 +61,51 @@ void KeepFromChild(const WinHandle& end)
         ThrowFailed("SetHandleInformation");
 }
 
-// The list of the handles that a child inherits. Without it, the child would inherit all
-// inheritable handles, among them the pipes of a simultaneous launch.
-class HandleList {
+// Windows has it since version 10; the headers declare it for programs that require that version.
+constexpr DWORD_PTR kJobListAttribute = 0x0002000D; // PROC_THREAD_ATTRIBUTE_JOB_LIST
+
+// What a child is created with: the list of the handles that it inherits, and the job of which it
+// is a member at once. Without the list, the child would inherit all inheritable handles, among
+// them the pipes of a simultaneous launch.
+class ChildAttributes {
 public:
-    explicit HandleList(const STARTUPINFOW& startup)
-        : fHandles{startup.hStdInput, startup.hStdOutput, startup.hStdError}
+    ChildAttributes(const STARTUPINFOW& startup, HANDLE job)
+        : fHandles{startup.hStdInput, startup.hStdOutput, startup.hStdError}, fJob(job)
     {
+        constexpr DWORD kAttributes = 2;
         SIZE_T size = 0;
-        ::InitializeProcThreadAttributeList(nullptr, 1, 0, &size);
+        ::InitializeProcThreadAttributeList(nullptr, kAttributes, 0, &size);
         fMemory.resize(size / sizeof(std::max_align_t) + 1);
-        if (::InitializeProcThreadAttributeList(Get(), 1, 0, &size) == 0)
+        if (::InitializeProcThreadAttributeList(Get(), kAttributes, 0, &size) == 0)
             ThrowFailed("InitializeProcThreadAttributeList");
-        if (::UpdateProcThreadAttribute(Get(), 0, PROC_THREAD_ATTRIBUTE_HANDLE_LIST, fHandles,
-                                        sizeof fHandles, nullptr, nullptr) == 0) {
+        if (!Set(PROC_THREAD_ATTRIBUTE_HANDLE_LIST, fHandles, sizeof fHandles)) {
             ::DeleteProcThreadAttributeList(Get());
             ThrowFailed("UpdateProcThreadAttribute");
         }
+        fHasJob = job != nullptr && Set(kJobListAttribute, &fJob, sizeof fJob);
     }
-    ~HandleList() { ::DeleteProcThreadAttributeList(Get()); }
-    HandleList(const HandleList&) = delete;
-    HandleList& operator=(const HandleList&) = delete;
+    ~ChildAttributes() { ::DeleteProcThreadAttributeList(Get()); }
+    ChildAttributes(const ChildAttributes&) = delete;
+    ChildAttributes& operator=(const ChildAttributes&) = delete;
 
     LPPROC_THREAD_ATTRIBUTE_LIST Get()
     {
         return reinterpret_cast<LPPROC_THREAD_ATTRIBUTE_LIST>(fMemory.data());
     }
 
+    // Returns false if the child must be made a member of the job after its creation.
+    bool HasJob() const { return fHasJob; }
+
 private:
+    bool Set(DWORD_PTR attribute, void* value, SIZE_T size)
+    {
+        return ::UpdateProcThreadAttribute(Get(), 0, attribute, value, size, nullptr, nullptr) != 0;
+    }
+
     HANDLE fHandles[3];
+    HANDLE fJob;
     std::vector<std::max_align_t> fMemory;
+    bool fHasJob = false;
 };
 
 } // namespace
@@ -112,17 +127,15 @@ void LauncherWin::CloseJobMember()
 }
 
 // Makes the suspended child a member of the job, and lets it run.
-void LauncherWin::EnterJob(void* process, void* thread) const
+void LauncherWin::EnterJob(const PROCESS_INFORMATION& child) const
 {
-    const bool entered = ::AssignProcessToJobObject(fJob, process) != 0;
-    if (entered)
-        ::ResumeThread(thread);
-    else
-        ::TerminateProcess(process, kKilledCode);
-    ::CloseHandle(thread);
-    if (entered)
+    if (::AssignProcessToJobObject(fJob, child.hProcess) != 0) {
+        ::ResumeThread(child.hThread);
         return;
-    ::CloseHandle(process);
+    }
+    ::TerminateProcess(child.hProcess, kKilledCode);
+    ::CloseHandle(child.hThread);
+    ::CloseHandle(child.hProcess);
     ThrowFailed("AssignProcessToJobObject");
 }
 
@@ -175,8 +188,9 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
     startup.hStdError = error.writer->GetHandle();
     LogPipe("Stderr", error);
 
-    HandleList inherited(startup);
-    extended.lpAttributeList = inherited.Get();
+    ChildAttributes attributes(startup, fJob);
+    extended.lpAttributeList = attributes.Get();
+    const bool entersLater = fJob != nullptr && !attributes.HasJob();
 
     PROCESS_INFORMATION info = {};
     {
@@ -187,11 +201,13 @@ LaunchResult LauncherWin::Launch(const std::wstring& program, const std::deque<s
         fRawExitCode = 0;
     }
     if (::CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, TRUE,
-                         EXTENDED_STARTUPINFO_PRESENT | (fJob != nullptr ? CREATE_SUSPENDED : 0),
+                         EXTENDED_STARTUPINFO_PRESENT | (entersLater ? CREATE_SUSPENDED : 0),
                          nullptr, nullptr, &startup, &info) == 0)
         ThrowFailed("CreateProcessW");
+    if (entersLater)
+        EnterJob(info);
     if (fJob != nullptr)
-        EnterJob(info.hProcess, std::exchange(info.hThread, nullptr));
+        ::CloseHandle(std::exchange(info.hThread, nullptr));
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
         *fProcessInfo = info;

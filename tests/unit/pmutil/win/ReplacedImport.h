@@ -11,6 +11,8 @@ extern decltype(&::OutputDebugStringA) __imp_OutputDebugStringA;
 extern decltype(&::CreateFileW) __imp_CreateFileW;
 extern decltype(&::CreatePipe) __imp_CreatePipe;
 extern decltype(&::SetHandleInformation) __imp_SetHandleInformation;
+extern decltype(&::UpdateProcThreadAttribute) __imp_UpdateProcThreadAttribute;
+extern decltype(&::AssignProcessToJobObject) __imp_AssignProcessToJobObject;
 }
 
 namespace pmutil {
