@@ -47,11 +47,11 @@ bool PollEnd(int pidfd, int milliseconds)
     return result > 0;
 }
 
-// Returns whether the id is a child of this process that wasn't reaped.
-bool IsOwnChild(idtype_t type, int id)
+// Returns whether this is a child of this process that wasn't reaped.
+bool IsOwnChild(::pid_t pid)
 {
     siginfo_t info = {};
-    return ::waitid(type, static_cast<id_t>(id), &info, WEXITED | WNOHANG | WNOWAIT) == 0;
+    return ::waitid(P_PID, static_cast<id_t>(pid), &info, WEXITED | WNOHANG | WNOWAIT) == 0;
 }
 
 // Children that no thread waits for. They are reaped from time to time, so that they don't stay
@@ -109,10 +109,9 @@ void ChildProcess::Adopt(::pid_t pid)
 {
     const int pidfd = OpenPidfd(pid);
     const int error = errno;
-    const bool isOwn = pidfd < 0 ? IsOwnChild(P_PID, pid) : IsOwnChild(P_PIDFD, pidfd);
     if (pidfd >= 0)
         fPidfd->Reset(pidfd, true);
-    if (!isOwn) {
+    if (!IsOwnChild(pid)) {
         fPidfd->Close();
         fError = ECHILD;
     } else if (pidfd < 0) {

@@ -1,16 +1,16 @@
 #include "linux/Keeper.h"
 
-#include <errno.h>
+#include <cerrno>
+#include <csignal>
+#include <ctime>
 #include <fcntl.h>
 #include <linux/sched.h>
 #include <poll.h>
 #include <sched.h>
-#include <signal.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
-#include <time.h>
 
 #include "linux/RawCall.h"
 
@@ -50,10 +50,15 @@ struct FolderEntry {
     return reinterpret_cast<long>(pointer);
 }
 
+bool IsDigit(char character)
+{
+    return character >= '0' && character <= '9';
+}
+
 int ReadNumber(const char* text)
 {
     int number = 0;
-    for (; *text >= '0' && *text <= '9'; ++text)
+    for (; IsDigit(*text); ++text)
         number = 10 * number + (*text - '0');
     return number;
 }
@@ -63,8 +68,6 @@ template <typename Take>
 void ForNumbersIn(const char* folder, Take take)
 {
     const long list = RawCall(SYS_openat, AT_FDCWD, Pass(folder), O_RDONLY | O_DIRECTORY);
-    if (list < 0)
-        return;
     alignas(FolderEntry) char block[4096];
     for (;;) {
         const long bytes = RawCall(SYS_getdents64, list, Pass(block), sizeof block);
@@ -72,7 +75,7 @@ void ForNumbersIn(const char* folder, Take take)
             break;
         for (long at = 0; at < bytes;) {
             const auto* const entry = reinterpret_cast<const FolderEntry*>(block + at);
-            if (entry->fName[0] >= '0' && entry->fName[0] <= '9')
+            if (IsDigit(entry->fName[0]))
                 take(entry->fName, static_cast<int>(list));
             at += entry->fBytes;
         }
@@ -83,20 +86,15 @@ void ForNumbersIn(const char* folder, Take take)
 // Closes the descriptors from `first` to `last`.
 void CloseRange(unsigned first, unsigned last)
 {
-    if (first > last || RawCall(SYS_close_range, first, last, 0) == 0)
+    if (RawCall(SYS_close_range, first, last, 0) == 0)
         return;
-    // Before Linux 5.9. The list may skip entries while some are closed, so repeat.
-    bool closed = true;
-    while (closed) {
-        closed = false;
-        ForNumbersIn("/proc/self/fd", [&](const char* name, int list) {
-            const int number = ReadNumber(name);
-            if (static_cast<unsigned>(number) < first || static_cast<unsigned>(number) > last ||
-                number == list)
-                return;
-            closed = RawCall(SYS_close, number) == 0 || closed;
-        });
-    }
+    // Before Linux 5.9. The kernel continues the list at the next number, whatever is closed.
+    ForNumbersIn("/proc/self/fd", [&](const char* name, int list) {
+        const int number = ReadNumber(name);
+        if (static_cast<unsigned>(number) >= first && static_cast<unsigned>(number) <= last &&
+            number != list)
+            RawCall(SYS_close, number);
+    });
 }
 
 // Closes all descriptors except these.
@@ -121,11 +119,7 @@ void CloseAllBut(int first, int second, int third, int fourth)
 
 void SetDefaultAction(int number)
 {
-    KernelAction action;
-    action.fHandler = nullptr;
-    action.fFlags = 0;
-    action.fRestorer = nullptr;
-    action.fMask = 0;
+    const KernelAction action = {nullptr, 0, nullptr, 0};
     RawCall(SYS_rt_sigaction, number, Pass(&action), 0, kSignalSetBytes);
 }
 
@@ -166,13 +160,13 @@ public:
             RawCall(SYS_clone, CLONE_VM | CLONE_VFORK | CLONE_PIDFD | SIGCHLD, 0, Pass(&pidfd));
         // An emulator of another processor has no CLONE_PIDFD.
         if (child == -EINVAL)
-            child = RawCall(SYS_clone, CLONE_VM | CLONE_VFORK | SIGCHLD, 0, 0);
+            child = RawCall(SYS_clone, CLONE_VM | CLONE_VFORK | SIGCHLD);
         if (child == 0)
             StartProgram(plan, fSelf, error);
         if (child < 0)
             return static_cast<int>(-child);
         fChild = static_cast<int>(child);
-        fPidfd = pidfd >= 0 ? pidfd : static_cast<int>(RawCall(SYS_pidfd_open, child, 0));
+        fPidfd = pidfd >= 0 ? pidfd : static_cast<int>(RawCall(SYS_pidfd_open, child));
         return error;
     }
 
@@ -209,9 +203,9 @@ public:
         const long deadline = GetMilliseconds() + milliseconds;
         while (ReapAll()) {
             const bool isLate = GetMilliseconds() >= deadline;
-            const bool hasLiving = SignalChildren();
+            SignalChildren();
             if (isLate)
-                return !hasLiving;
+                return false;
             timespec pause = {0, kPauseNanoseconds};
             RawCall(SYS_nanosleep, Pass(&pause), 0);
         }
@@ -223,22 +217,20 @@ private:
     {
         timespec now = {0, 0};
         RawCall(SYS_clock_gettime, CLOCK_MONOTONIC, Pass(&now));
-        return now.tv_sec * 1000 + now.tv_nsec / 1000000;
+        return ToMilliseconds(now.tv_sec, now.tv_nsec);
     }
 
     // Returns false if the keeper may end.
     bool TakeCommand()
     {
-        KeeperCommand command = {KeeperCommand::kLeave, 0};
-        const long bytes = RawCall(SYS_recvfrom, fLink, Pass(&command), sizeof command);
-        if (bytes == -EINTR || bytes == -EAGAIN)
-            return true;
-        if (bytes != sizeof command || command.fKind == KeeperCommand::kLeave)
+        KeeperCommand command = {KeeperCommand::kLeave}; // if the host has closed the link
+        RawCall(SYS_recvfrom, fLink, Pass(&command), sizeof command);
+        if (command.fKind == KeeperCommand::kLeave)
             return false;
         if (command.fKind == KeeperCommand::kEndAll)
             Reply(EndAll(command.fMilliseconds) ? 1 : 0);
-        else if (!fHasEnded)
-            RawCall(SYS_pidfd_send_signal, fPidfd, SIGKILL, 0, 0);
+        else
+            RawCall(SYS_pidfd_send_signal, fPidfd, SIGKILL);
         return true;
     }
 
@@ -251,9 +243,9 @@ private:
             const long result = RawCall(SYS_waitid, P_ALL, 0, Pass(&info), WEXITED | WNOHANG, 0);
             if (result == -ECHILD)
                 return false;
-            if (result != 0 || info.si_pid == 0)
+            if (info.si_pid == 0)
                 return true;
-            if (info.si_pid == fChild && !fHasEnded)
+            if (info.si_pid == fChild)
                 NoteEnd(info);
         }
     }
@@ -267,43 +259,28 @@ private:
     }
 
     // Kills all children of this process; only it reaps them, so that no process id is reused.
-    // Returns whether one is living.
-    bool SignalChildren() const
+    void SignalChildren() const
     {
-        bool hasLiving = false;
         ForNumbersIn("/proc", [&](const char* name, int proc) {
-            if (!IsLivingChild(name, proc))
-                return;
-            hasLiving = true;
-            RawCall(SYS_kill, ReadNumber(name), SIGKILL);
+            if (IsChild(name, proc))
+                RawCall(SYS_kill, ReadNumber(name), SIGKILL);
         });
-        return hasLiving;
     }
 
-    bool IsLivingChild(const char* name, int proc) const
+    bool IsChild(const char* name, int proc) const
     {
-        char path[32];
-        int length = 0;
-        for (; name[length] != '\0' && length < 20; ++length)
-            path[length] = name[length];
-        for (const char* rest = "/stat"; *rest != '\0'; ++rest)
-            path[length++] = *rest;
-        path[length] = '\0';
-        const long file = RawCall(SYS_openat, proc, Pass(path), O_RDONLY);
-        if (file < 0)
-            return false;
+        const long process = RawCall(SYS_openat, proc, Pass(name), O_PATH);
+        const long file = RawCall(SYS_openat, process, Pass("stat"), O_RDONLY);
         char text[256];
-        const long bytes = RawCall(SYS_read, file, Pass(text), sizeof text - 1);
+        const long bytes = RawCall(SYS_read, file, Pass(text), sizeof text);
         RawCall(SYS_close, file);
+        RawCall(SYS_close, process);
         // The name, in parentheses, may hold anything; after it come the state and the parent.
         long name_end = bytes - 1;
         while (name_end >= 0 && text[name_end] != ')')
             --name_end;
-        if (name_end < 0 || name_end + 4 >= bytes)
-            return false;
-        text[bytes] = '\0';
-        const char state = text[name_end + 2];
-        return state != 'Z' && state != 'X' && ReadNumber(text + name_end + 4) == fSelf;
+        // A zombie may have threads that live.
+        return name_end >= 0 && ReadNumber(text + name_end + 4) == fSelf;
     }
 
     const int fLink;

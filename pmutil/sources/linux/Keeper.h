@@ -22,8 +22,14 @@ struct KeeperCommand {
         kLeave   // the keeper kills all descendants and ends; no reply
     };
     Kind fKind;
-    int fMilliseconds;
+    int fMilliseconds = 0;
 };
+
+// The milliseconds of a time of the kernel.
+constexpr long ToMilliseconds(long seconds, long nanoseconds)
+{
+    return seconds * 1000 + nanoseconds / 1000000;
+}
 
 // The reply to the start is 0 or an errno.
 using KeeperReply = int;
@@ -35,7 +41,7 @@ struct KeeperEnd {
 };
 
 // The stack that the keeper needs.
-constexpr unsigned long kKeeperStackBytes = 64 * 1024;
+constexpr unsigned long kKeeperStackBytes = 64UL * 1024;
 
 // The whole of the keeper, for clone: starts the child and follows the commands until the host
 // ends or says so. Never returns. Uses neither the C library nor thread-local memory, and no

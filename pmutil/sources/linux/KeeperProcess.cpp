@@ -12,6 +12,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <exception>
 #include <list>
 
 #include <boost/make_shared.hpp>
@@ -94,10 +95,11 @@ public:
         return late;
     }
 
-    void Add(boost::shared_ptr<PosixHandle> pidfd, KeeperStack stack)
+    // Takes the stack, unless it throws.
+    void Add(const boost::shared_ptr<PosixHandle>& pidfd, KeeperStack& stack)
     {
         const boost::lock_guard<boost::mutex> lock(fMutex);
-        fKeepers.emplace_back(std::move(pidfd), std::move(stack));
+        fKeepers.emplace_back(pidfd, std::move(stack));
     }
 
     void ReapEnded()
@@ -122,6 +124,11 @@ private:
 
 } // namespace
 
+int GetLimitMilliseconds(double seconds)
+{
+    return static_cast<int>(1000 * std::clamp(seconds, 0.0, 10.0));
+}
+
 KeeperStack::~KeeperStack()
 {
     if (fMemory != nullptr)
@@ -137,6 +144,11 @@ void KeeperStack::Make()
     fMemory = memory;
     if (::mprotect(memory, kGuardBytes, PROT_NONE) != 0)
         throw CallFailure{"mprotect", errno};
+}
+
+void KeeperStack::Leak()
+{
+    fMemory = nullptr;
 }
 
 void* KeeperStack::GetTop() const
@@ -171,14 +183,11 @@ void KeeperProcess::Start(KeeperPlan& plan)
     pidfd->Reset(Clone(plan), true);
     fPidfd = pidfd;
     link.Close();
-    pipe.writer->Close();
 
     KeeperReply reply = ECHILD; // if the keeper was killed
     Repeat([&] { return ::recv(fLink.GetHandle(), &reply, sizeof reply, 0); });
-    if (reply == 0)
-        return;
-    Leave();
-    throw CallFailure{"execve", reply};
+    if (reply != 0)
+        throw CallFailure{"execve", reply};
 }
 
 int KeeperProcess::Clone(KeeperPlan& plan)
@@ -191,7 +200,14 @@ int KeeperProcess::Clone(KeeperPlan& plan)
     const int pid = errno == EINVAL ? ::clone(RunKeeper, fStack.GetTop(), SIGCHLD, &plan) : -1;
     if (pid < 0)
         throw CallFailure{"clone", errno};
-    return OpenPidfd(pid);
+    try {
+        return OpenPidfd(pid);
+    } catch (const CallFailure&) {
+        // Nobody could reap it later. Its child ends with it.
+        ::kill(pid, SIGKILL);
+        Repeat([&] { return ::waitpid(pid, nullptr, 0); });
+        throw;
+    }
 }
 
 std::optional<KeeperEnd> KeeperProcess::Await()
@@ -203,7 +219,7 @@ std::optional<KeeperEnd> KeeperProcess::Await()
     return std::nullopt;
 }
 
-// A failure means that the keeper has ended, and the child with it.
+// A failure means that there is no keeper, or that it has ended, and the child with it.
 void KeeperProcess::Send(KeeperCommand command)
 {
     Repeat([&] { return ::send(fLink.GetHandle(), &command, sizeof command, MSG_NOSIGNAL); });
@@ -212,8 +228,7 @@ void KeeperProcess::Send(KeeperCommand command)
 void KeeperProcess::Kill()
 {
     const boost::lock_guard<boost::mutex> lock(fMutex);
-    if (fPidfd != nullptr)
-        Send({KeeperCommand::kKill, 0});
+    Send({KeeperCommand::kKill});
 }
 
 bool KeeperProcess::EndAll(double seconds)
@@ -221,7 +236,7 @@ bool KeeperProcess::EndAll(double seconds)
     const boost::lock_guard<boost::mutex> lock(fMutex);
     if (fPidfd == nullptr)
         return true;
-    Send({KeeperCommand::kEndAll, static_cast<int>(1000 * std::clamp(seconds, 0.0, 10.0))});
+    Send({KeeperCommand::kEndAll, GetLimitMilliseconds(seconds)});
     KeeperReply reply = 0; // if the keeper was killed
     Repeat([&] { return ::recv(fLink.GetHandle(), &reply, sizeof reply, 0); });
     return reply == 1;
@@ -229,16 +244,20 @@ bool KeeperProcess::EndAll(double seconds)
 
 void KeeperProcess::Leave()
 {
-    const boost::lock_guard<boost::mutex> lock(fMutex);
-    if (fPidfd == nullptr)
-        return;
-    Send({KeeperCommand::kLeave, 0});
-    if (HasEnded(fPidfd->GetHandle(), kMaxLeaveMilliseconds))
-        Reap(fPidfd->GetHandle());
-    else
-        LateKeepers::Get().Add(fPidfd, std::move(fStack));
-    fPidfd.reset();
-    fLink.Close();
+    try {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        if (fPidfd == nullptr)
+            return;
+        Send({KeeperCommand::kLeave});
+        if (HasEnded(fPidfd->GetHandle(), kMaxLeaveMilliseconds))
+            Reap(fPidfd->GetHandle());
+        else
+            LateKeepers::Get().Add(fPidfd, fStack);
+        fPidfd.reset();
+        fLink.Close();
+    } catch (const std::exception&) {
+        fStack.Leak(); // no memory for the list of late keepers, and the keeper still uses it
+    }
 }
 
 } // namespace pmutil

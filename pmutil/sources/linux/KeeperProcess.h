@@ -12,6 +12,9 @@
 
 namespace pmutil {
 
+// The milliseconds of a limit for EndAll, which is at most 10 s.
+int GetLimitMilliseconds(double seconds);
+
 // The memory of a keeper's stack, with a part before it that can't be accessed.
 class KeeperStack {
 public:
@@ -25,6 +28,7 @@ public:
     ~KeeperStack();
 
     void Make(); // throws CallFailure
+    void Leak(); // the memory is never freed
     void* GetTop() const;
 
 private:
@@ -40,7 +44,7 @@ public:
     KeeperProcess& operator=(const KeeperProcess&) = delete;
 
     // Starts the keeper and its child. Sets the descriptors of the plan except fStreams. Call once.
-    // Throws CallFailure; then there is no process.
+    // Throws CallFailure; then the destructor ends what was started.
     void Start(KeeperPlan& plan);
 
     // Waits for the child's end. Returns nothing if the keeper was killed.
@@ -48,7 +52,7 @@ public:
 
     void Kill();
     bool EndAll(double seconds);
-    void Leave();
+    void Leave(); // throws nothing, also when memory is short
 
 private:
     void Send(KeeperCommand command);

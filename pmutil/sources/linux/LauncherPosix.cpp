@@ -53,7 +53,8 @@ public:
         Check(::posix_spawn_file_actions_addclosefrom_np(&fActions, kMinOtherDescriptor));
     }
 
-    void ResetSignals()
+    // The child gets the default signals, and a group of its own if it's asked for.
+    void SetAttributes(LauncherPosix::Group group)
     {
         sigset_t all;
         sigset_t none;
@@ -61,11 +62,11 @@ public:
         ::sigemptyset(&none);
         Check(::posix_spawnattr_setsigdefault(&fAttributes, &all));
         Check(::posix_spawnattr_setsigmask(&fAttributes, &none));
-        AddFlags(POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSIGMASK);
+        int flags = POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSIGMASK;
+        if (group == LauncherPosix::Group::kOwn)
+            flags |= POSIX_SPAWN_SETPGROUP; // the default group id is the child's process id
+        Check(::posix_spawnattr_setflags(&fAttributes, static_cast<short>(flags)));
     }
-
-    // The default group id is the child's process id.
-    void MakeGroup() { AddFlags(POSIX_SPAWN_SETPGROUP); }
 
     const posix_spawn_file_actions_t* GetActions() const { return &fActions; }
     const posix_spawnattr_t* GetAttributes() const { return &fAttributes; }
@@ -77,13 +78,6 @@ private:
             throw CallFailure{"posix_spawn", error};
     }
 
-    void AddFlags(int flags)
-    {
-        fFlags = static_cast<short>(fFlags | flags);
-        Check(::posix_spawnattr_setflags(&fAttributes, fFlags));
-    }
-
-    short fFlags = 0;
     posix_spawn_file_actions_t fActions{};
     posix_spawnattr_t fAttributes{};
 };
@@ -93,8 +87,8 @@ private:
 void RequireWaitableChildren(const std::string& path)
 {
     struct sigaction action = {};
-    if (::sigaction(SIGCHLD, nullptr, &action) == 0 &&
-        (action.sa_handler == SIG_IGN || (action.sa_flags & SA_NOCLDWAIT) != 0))
+    ::sigaction(SIGCHLD, nullptr, &action);
+    if (action.sa_handler == SIG_IGN || (action.sa_flags & SA_NOCLDWAIT) != 0)
         throw std::runtime_error("posix_spawn failed: " + path +
                                  ": SIGCHLD is ignored, so that no child can be waited for");
 }
@@ -131,9 +125,7 @@ LaunchResult LauncherPosix::Start(const std::string& path, const std::deque<std:
     options.SetStream(STDOUT_FILENO, *pipes.fOutput.writer);
     options.SetStream(STDERR_FILENO, *pipes.fError.writer);
     options.CloseOthers();
-    options.ResetSignals();
-    if (fGroup == Group::kOwn)
-        options.MakeGroup();
+    options.SetAttributes(fGroup);
 
     // Allocate it first, so that no failure can leave the new process without an owner.
     const auto child = boost::make_shared<ChildProcess>();

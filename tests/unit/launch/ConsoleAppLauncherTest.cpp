@@ -37,6 +37,17 @@ struct Parts {
     }
 };
 
+TEST(ExecutionData, HasTheTaskOfEachOutput)
+{
+    const boost::shared_ptr<OutputTask> out = boost::make_shared<PatientTask>();
+    const boost::shared_ptr<OutputTask> err = boost::make_shared<PatientTask>();
+    const consoleapp::ExecutionData data{boost::weak_ptr<ConsoleApp>(),
+                                         boost::weak_ptr<OutputTask>(out),
+                                         boost::weak_ptr<OutputTask>(err)};
+    EXPECT_EQ(data.GetOutputTask(OutputChannel::kStdout), out);
+    EXPECT_EQ(data.GetOutputTask(OutputChannel::kStderr), err);
+}
+
 TEST(ConsoleAppAccessor, ChecksItsTaskID)
 {
     for (const int bad : {-2, 4, 100})

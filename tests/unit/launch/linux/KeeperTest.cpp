@@ -1,9 +1,11 @@
 // Keepers that are stopped, that can't be started, and calls that signals interrupt.
+#include "linux/KeeperProcess.h"
 #include "pmutil/KeptLauncher.h"
 
 #include <atomic>
 #include <csignal>
 #include <cstdlib>
+#include <fcntl.h>
 #include <fstream>
 #include <gmock/gmock.h>
 #include <iterator>
@@ -18,7 +20,9 @@
 
 #include "TestChild.h"
 #include "Throws.h"
+#include "pmutil/LauncherPosix.h"
 #include "pmutil/Reader.h"
+#include "support/Allocations.h"
 #include "support/OpenThings.h"
 #include "support/Waits.h"
 
@@ -82,9 +86,31 @@ TEST(LateKeeper, IsReapedByALaterLaunchOnceItHasEnded)
     EXPECT_TRUE(Runs()) << "a launch doesn't wait for it either";
     EXPECT_EQ(ReadStatus(keeper).fState, 'T');
     ::kill(keeper, SIGCONT);
-    ASSERT_TRUE(Eventually([&] { return ReadStatus(keeper).fState == 'Z'; }));
+    siginfo_t end = {}; // unlike the state, it isn't there before all threads have ended
+    ASSERT_EQ(::waitid(P_PID, static_cast<::id_t>(keeper), &end, WEXITED | WNOWAIT | __WALL), 0);
     EXPECT_TRUE(Runs());
     EXPECT_EQ(ReadStatus(keeper).fState, '-');
+}
+
+// It still has its stack then.
+TEST(LateKeeper, IsLeftAsItIsWhenMemoryIsShort)
+{
+    ::pid_t keeper = 0;
+    {
+        KeptLauncher launcher;
+        LaunchResult ends;
+        keeper = LaunchSleeper(launcher, ends);
+        ASSERT_GT(keeper, 1);
+        ::kill(keeper, SIGSTOP);
+        ASSERT_TRUE(Eventually([&] { return ReadStatus(keeper).fState == 'T'; }));
+        const assay_test::FailingAllocation failing(0);
+        launcher.Leave();
+        EXPECT_TRUE(failing.HasFailed());
+    }
+    ::kill(keeper, SIGCONT);
+    siginfo_t end = {};
+    ASSERT_EQ(::waitid(P_PID, static_cast<::id_t>(keeper), &end, WEXITED | __WALL), 0);
+    EXPECT_EQ(end.si_code, CLD_EXITED);
 }
 
 std::atomic<int> gSignals{0};
@@ -137,6 +163,130 @@ TEST(KeeperProcess, WaitsOnWhenSignalsInterruptIt)
     Interrupt([&] { result = launcher.Wait(&exitCode); }, [&] { ends.fAppInput.reset(); });
     EXPECT_EQ(result, kEndedNormally);
     EXPECT_EQ(exitCode, 5);
+}
+
+TEST(LauncherPosix, WaitsOnWhenSignalsInterruptIt)
+{
+    LauncherPosix launcher;
+    LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", "read line; exit 5"});
+    int exitCode = -1;
+    std::atomic<int> result{-1};
+    Interrupt([&] { result = launcher.Wait(&exitCode); }, [&] { ends.fAppInput.reset(); });
+    EXPECT_EQ(result, kEndedNormally);
+    EXPECT_EQ(exitCode, 5);
+}
+
+TEST(KeeperProcess, LimitsAreWholeMillisecondsUpToTenSeconds)
+{
+    const struct {
+        double fSeconds;
+        int fMilliseconds;
+    } kRows[] = {{-1, 0}, {0, 0}, {0.0019, 1}, {2.5, 2500}, {10, 10000}, {10.5, 10000}};
+    for (const auto& row : kRows)
+        EXPECT_EQ(GetLimitMilliseconds(row.fSeconds), row.fMilliseconds) << row.fSeconds;
+}
+
+TEST(KeeperProcess, CountsTheKernelsTimeInMilliseconds)
+{
+    EXPECT_EQ(ToMilliseconds(0, 999'999), 0);
+    EXPECT_EQ(ToMilliseconds(0, 1'000'000), 1);
+    EXPECT_EQ(ToMilliseconds(3, 999'999'999), 3999);
+}
+
+TEST(KeeperProcess, HasAllSignalsBlocked)
+{
+    KeptLauncher launcher;
+    LaunchResult ends;
+    const ::pid_t keeper = LaunchSleeper(launcher, ends);
+    std::ifstream file("/proc/" + std::to_string(keeper) + "/status");
+    const std::string text((std::istreambuf_iterator<char>(file)), {});
+    // All but SIGKILL, SIGSTOP and the two that the C library keeps for itself.
+    EXPECT_THAT(text, testing::HasSubstr("SigBlk:\tfffffffe7ffbfeff\n"));
+}
+
+TEST(KeeperProcess, SleepsAfterTheEndOfTheChild)
+{
+    KeptLauncher launcher;
+    LaunchResult ends;
+    const ::pid_t keeper = LaunchSleeper(launcher, ends);
+    launcher.Kill();
+    int exitCode = -1;
+    EXPECT_EQ(launcher.Wait(&exitCode), kEndedByKill);
+    // One that polls without end is seen running, if not at each look.
+    EXPECT_TRUE(Eventually([&] {
+        for (int look = 0; look < 200; ++look)
+            if (ReadStatus(keeper).fState != 'S')
+                return false;
+        return true;
+    }));
+    EXPECT_NE(launcher.Wait(&exitCode), kEndedNormally) << "its end can be taken only once";
+}
+
+TEST(KeeperProcess, HasNotEndedAllBeforeTheyAreReaped)
+{
+    KeptLauncher launcher;
+    LaunchResult ends;
+    LaunchSleeper(launcher, ends);
+    EXPECT_FALSE(launcher.EndAll(0));
+    EXPECT_TRUE(launcher.EndAll(kLong));
+    EXPECT_TRUE(launcher.EndAll(0)) << "none is left";
+    launcher.Leave();
+    EXPECT_TRUE(launcher.EndAll(0)) << "nor is the keeper";
+}
+
+TEST(KeeperProcess, EndsOneWhoseFirstThreadHasEnded)
+{
+    KeptLauncher launcher;
+    const std::wstring path = TEST_CHILD;
+    const LaunchResult ends = launcher.Launch(
+        L"/bin/sh", {"-c", "echo $$; exec \"$0\" thread", std::string(path.begin(), path.end())});
+    const ::pid_t child = std::atoi(ReadLine(*ends.fAppOutput[1]).c_str());
+    ASSERT_TRUE(Eventually([&] { return ReadStatus(child).fState == 'Z'; }));
+    EXPECT_TRUE(launcher.EndAll(kLong));
+    EXPECT_EQ(ReadStatus(child).fState, '-');
+}
+
+TEST(KeeperProcess, LeavesNoDescriptorButThatOfTheEnd)
+{
+    KeptLauncher launcher;
+    const long before = CountOpenThings();
+    {
+        LaunchResult ends;
+        LaunchSleeper(launcher, ends);
+    }
+    launcher.Leave();
+    EXPECT_EQ(CountOpenThings(), before + 1);
+}
+
+TEST(KeptLauncher, TheChildHasThreeStreamsAndTheHostsEnvironment)
+{
+    ::setenv("KEPT_LAUNCHER_TEST", "told", 1);
+    KeptLauncher launcher;
+    LaunchResult ends = launcher.Launch(
+        L"/bin/sh", {"-c", "read line; echo $line $KEPT_LAUNCHER_TEST; echo error >&2"});
+    ::unsetenv("KEPT_LAUNCHER_TEST");
+    ends.fAppInput->WriteAll("in\n", 3);
+    EXPECT_EQ(ReadLine(*ends.fAppOutput[1]), "in told");
+    EXPECT_EQ(ReadLine(*ends.fAppOutput[2]), "error");
+}
+
+TEST(KeptLauncher, AHostWithClosedStandardStreamsCanLaunch)
+{
+    for (const int closed : {1, 2, 3}) {
+        int kept[3];
+        for (int stream = 0; stream < closed; ++stream) {
+            kept[stream] = ::fcntl(stream, F_DUPFD_CLOEXEC, 10);
+            ::close(stream);
+        }
+        const bool runs = Runs();
+        for (int stream = 0; stream < closed; ++stream) {
+            if (kept[stream] < 0)
+                continue;
+            ::dup2(kept[stream], stream);
+            ::close(kept[stream]);
+        }
+        EXPECT_TRUE(runs) << closed;
+    }
 }
 
 TEST(KeeperProcess, LeavesWhenSignalsInterruptIt)

@@ -5,6 +5,7 @@
 #include <boost/filesystem/operations.hpp>
 #include <boost/make_shared.hpp>
 #include <boost/thread/thread.hpp>
+#include <cerrno>
 #include <csignal>
 #include <cstdlib>
 #include <fcntl.h>
@@ -203,9 +204,11 @@ TEST(KeptLauncher, TheChildEndsWithAKilledKeeper)
     Shell shell("echo $$; exec sleep 1000");
     const ::pid_t child = std::atoi(shell.fLine.c_str());
     ::kill(ReadStatus(child).fParent, SIGKILL);
+    errno = EINTR; // of an earlier call
     EXPECT_EQ(shell.Wait(), kEndedByCrash);
     EXPECT_EQ(GetTerminationText(shell.fLauncher), "signal 9 (Killed)");
     EXPECT_EQ(ReadLine(*shell.fEnds.fAppOutput[1]), "") << "its output is closed";
+    errno = EINTR;
     EXPECT_FALSE(shell.fLauncher.EndAll(0)) << "nobody knows the descendants now";
 }
 

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <boost/filesystem/operations.hpp>
 #include <boost/filesystem/path.hpp>
 #include <boost/thread/thread.hpp>
 #include <csignal>
@@ -9,6 +10,7 @@
 #include <fcntl.h>
 #include <fstream>
 #include <gmock/gmock.h>
+#include <malloc.h>
 #include <memory>
 #include <spawn.h>
 #include <sstream>
@@ -244,6 +246,68 @@ TEST(LauncherPosix, TellsWhichSignalEndedTheChild)
     EXPECT_EQ(GetTerminationText(launcher), "");
 }
 
+TEST(LauncherPosix, ASignalWithoutADescriptionIsToldByItsNumber)
+{
+    LauncherPosix launcher;
+    const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", "kill -40 $$"});
+    int exitCode = -1;
+    EXPECT_EQ(launcher.Wait(&exitCode), kEndedByCrash);
+    EXPECT_EQ(GetTerminationText(launcher), "signal 40");
+}
+
+// Allows core dumps while it exists, and puts them into a folder of its own.
+class CoreDumps {
+public:
+    CoreDumps()
+    {
+        ::getrlimit(RLIMIT_CORE, &fBefore);
+        const rlimit allowed{fBefore.rlim_max, fBefore.rlim_max};
+        ::setrlimit(RLIMIT_CORE, &allowed);
+        boost::filesystem::create_directory(fFolder);
+        boost::filesystem::current_path(fFolder);
+    }
+    ~CoreDumps()
+    {
+        ::setrlimit(RLIMIT_CORE, &fBefore);
+        boost::filesystem::current_path(fOldFolder);
+        boost::filesystem::remove_all(fFolder);
+    }
+    CoreDumps(const CoreDumps&) = delete;
+    CoreDumps& operator=(const CoreDumps&) = delete;
+
+private:
+    rlimit fBefore = {};
+    const boost::filesystem::path fOldFolder = boost::filesystem::current_path();
+    const boost::filesystem::path fFolder =
+        boost::filesystem::temp_directory_path() / boost::filesystem::unique_path();
+};
+
+// Where the machine dumps cores, the system reports another kind of end.
+TEST(LauncherPosix, TellsTheSignalOfAChildThatMayDumpItsCore)
+{
+    const CoreDumps dumps;
+    LauncherPosix launcher;
+    const LaunchResult ends = launcher.Launch(L"/bin/sh", {"-c", "kill -SEGV $$"});
+    int exitCode = -1;
+    EXPECT_EQ(launcher.Wait(&exitCode), kEndedByCrash);
+    EXPECT_EQ(launcher.GetTermSignal(), SIGSEGV);
+}
+
+TEST(LauncherPosix, AFailedStartFreesItsMemory)
+{
+    const auto fail = [] {
+        LauncherPosix launcher;
+        EXPECT_THROW(launcher.Launch(L"/nonexistent/program", {}), std::runtime_error);
+    };
+    for (int run = 0; run < 3; ++run)
+        fail();
+    constexpr std::size_t kRuns = 50;
+    const std::size_t before = ::mallinfo2().uordblks;
+    for (std::size_t run = 0; run < kRuns; ++run)
+        fail();
+    EXPECT_LT(::mallinfo2().uordblks, before + 100 * kRuns);
+}
+
 TEST(LauncherPosix, WaitWithoutALaunchFails)
 {
     LauncherPosix launcher;
@@ -376,7 +440,7 @@ TEST(LauncherPosix, DescriptorExhaustionAtEachStepLeavesNothing)
         EXPECT_FALSE(HasChildren());
         EXPECT_EQ(CountLoggedPipes(recorder), std::min(room / 2, 3)) << "with room for " << room;
     }
-    EXPECT_GE(failures, 6) << "three pipes need six places";
+    EXPECT_EQ(failures, 6) << "three pipes need six places, and the child no other";
 }
 
 // Ignores SIGCHLD while it exists.
@@ -435,6 +499,31 @@ TEST(LauncherPosix, OrphanIsSeenOffLater)
     }));
 }
 
+TEST(LauncherPosix, OneThatHasEndedIsReapedWithItsLauncher)
+{
+    {
+        LauncherPosix launcher;
+        const LaunchResult ends = launcher.Launch(TEST_CHILD, {"exit", "0"});
+        siginfo_t info = {};
+        ASSERT_EQ(::waitid(P_ALL, 0, &info, WEXITED | WNOWAIT), 0);
+    }
+    EXPECT_FALSE(HasChildren());
+}
+
+TEST(LauncherPosix, AnOrphanThatTheHostReapsLeavesNoDescriptor)
+{
+    const long before = CountOpenThings();
+    LaunchResult ends;
+    {
+        LauncherPosix launcher;
+        ends = launcher.Launch(TEST_CHILD, {"echo"});
+    }
+    ends = {}; // now it ends
+    EXPECT_GT(::waitpid(-1, nullptr, 0), 0);
+    RunChild({"exit", "0"});
+    EXPECT_EQ(CountOpenThings(), before);
+}
+
 TEST(LauncherPosix, StandardOutputIsAWidePipe)
 {
     LauncherPosix launcher;
@@ -449,6 +538,8 @@ TEST(LauncherPosix, StandardOutputIsAWidePipe)
     constexpr int kWide = 1 << 20;
     int own[2];
     ASSERT_EQ(::pipe2(own, O_CLOEXEC), 0);
+    EXPECT_EQ(size(ends.fAppOutput[2]), ::fcntl(own[0], F_GETPIPE_SZ)) << "as any pipe";
+    EXPECT_EQ(size(ends.fAppInput), ::fcntl(own[0], F_GETPIPE_SZ));
     const bool mayBeWide = ::fcntl(own[0], F_SETPIPE_SZ, kWide) >= kWide;
     ::close(own[0]);
     ::close(own[1]);
