@@ -57,17 +57,15 @@ char* PutMoment(char* at, double seconds)
     return PutDigits(at + 1, time % 1000, 3);
 }
 
-// Writes "%06.3f"; zeros are inserted after the sign. `at` has kMaxSecondsSize characters.
+// Writes "%06.3f". `at` has kMaxSecondsSize characters.
 char* PutAnySeconds(char* at, double seconds)
 {
     constexpr std::ptrdiff_t kWidth = 6;
     char* const end =
         std::to_chars(at, at + kMaxSecondsSize, seconds, std::chars_format::fixed, 3).ptr;
     const std::ptrdiff_t missing = kWidth - (end - at);
-    if (missing <= 0)
+    if (missing <= 0) // so with a sign
         return end;
-    if (*at == '-')
-        ++at;
     std::memmove(at + missing, at, static_cast<std::size_t>(end - at));
     std::memset(at, '0', static_cast<std::size_t>(missing));
     return end + missing;

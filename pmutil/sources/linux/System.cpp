@@ -52,7 +52,7 @@ private:
     // wchar_t has a sign on some processors only.
     static bool IsCharacter(wchar_t character)
     {
-        const auto code = static_cast<std::uint32_t>(character);
+        const auto code = static_cast<char32_t>(character);
         return code < 0xD800 || (code >= 0xE000 && code <= 0x10FFFF);
     }
 };
@@ -60,7 +60,7 @@ private:
 // Empty if the user isn't in the password database.
 std::string GetHomeFolder()
 {
-    std::vector<char> buffer(1024);
+    std::vector<char> buffer(64);
     passwd entry{};
     passwd* found = nullptr;
     int status = 0;
@@ -84,12 +84,10 @@ std::string GetNarrowDesktopFolder()
 void PreventCoreDump()
 {
     rlimit limit{};
-    if (getrlimit(RLIMIT_CORE, &limit) != 0)
-        return;
-    const rlimit none{1, std::max<rlim_t>(limit.rlim_max, 1)};
-    if (setrlimit(RLIMIT_CORE, &none) == 0)
-        return;
-    limit.rlim_cur = 0; // the hard limit is 0, and only a privileged process may raise it
+    getrlimit(RLIMIT_CORE, &limit);
+    limit.rlim_cur = 1;
+    limit.rlim_max = std::max<rlim_t>(limit.rlim_max, 1);
+    // Only a privileged process may raise a hard limit of 0; for others there is no dump then.
     setrlimit(RLIMIT_CORE, &limit);
 }
 
@@ -104,7 +102,8 @@ void PrepareSignals()
     // belongs to a sanitizer.
     for (const int number : {SIGABRT, SIGBUS, SIGCHLD, SIGFPE, SIGILL, SIGSEGV, SIGSYS, SIGTRAP}) {
         struct sigaction action = {};
-        if (sigaction(number, nullptr, &action) == 0 && action.sa_handler == SIG_IGN)
+        sigaction(number, nullptr, &action);
+        if (action.sa_handler == SIG_IGN)
             std::signal(number, SIG_DFL);
     }
     sigset_t none;
@@ -118,7 +117,7 @@ void PrepareSignals()
 void OccupyClosedStreams()
 {
     for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream)
-        if (fcntl(stream, F_GETFD) < 0 && errno == EBADF)
+        if (fcntl(stream, F_GETFD) < 0)
             open("/", O_PATH);
 }
 

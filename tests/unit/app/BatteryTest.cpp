@@ -426,7 +426,9 @@ TEST_F(OneDevice, GetStringPrintsItsCodeFirstAndTakesNoStep)
 TEST_F(OneDevice, ANullStringThrows)
 {
     impl->shadingLanguage = nullptr;
-    EXPECT_THROW(tester.DoRunGLGetString("t", *gl, "GL_NAME", 1), std::logic_error);
+    EXPECT_THAT(
+        [this] { tester.DoRunGLGetString("t", *gl, "GL_NAME", 1); },
+        testing::ThrowsMessage<std::logic_error>("glGetString returns no text for GL_NAME"));
     EXPECT_THAT(app.out, ElementsAre("gputag.GL_NAME=1"));
 }
 

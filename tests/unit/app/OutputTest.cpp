@@ -1,5 +1,6 @@
 #include "Output.h"
 
+#include <functional>
 #include <stdexcept>
 
 #include <gmock/gmock.h>
@@ -158,6 +159,36 @@ TEST(Output, AThrowingStreamLosesTheLine)
         app.Stdout("one");
     }
     EXPECT_THAT(err.Take(), ElementsAre("DoStdout failed"));
+}
+
+// What an override that calls the base sees.
+class OpenApp : public GPUAssayApp {
+public:
+    using GPUAssayApp::DoStderr;
+    using GPUAssayApp::DoStdout;
+};
+
+std::string FailureOf(const std::function<void()>& action)
+{
+    try {
+        action();
+    } catch (const std::runtime_error& error) {
+        return error.what();
+    }
+    return "no failure";
+}
+
+TEST(Output, ALostLineIsAnExceptionWithAText)
+{
+    OpenApp app;
+    UnreliableBuffer out(1);
+    UnreliableBuffer err(1);
+    const RedirectStream redirectOut(std::cout, &out);
+    const RedirectStream redirectErr(std::cerr, &err);
+    EXPECT_EQ(FailureOf([&] { app.DoStdout("lost"); }), "can't write to standard output");
+    EXPECT_EQ(FailureOf([&] { app.DoStderr("lost"); }), "can't write to standard error");
+    EXPECT_EQ(FailureOf([&] { app.DoStdout("kept"); }), "no failure");
+    EXPECT_EQ(FailureOf([&] { app.DoStderr("kept"); }), "no failure");
 }
 
 TEST(Output, StderrWritesTheTextAndALineEnd)

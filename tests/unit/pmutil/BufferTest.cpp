@@ -16,6 +16,7 @@ constexpr char kOwnership[] = "Buffer: ownership is required for this operation"
 
 class OpenBuffer : public Buffer {
 public:
+    using Buffer::BinioWriteSome;
     using Buffer::Buffer;
     using Buffer::DoReadByte;
 };
@@ -82,8 +83,10 @@ TEST(Buffer, OverANullBlock)
 {
     EXPECT_TRUE(
         ThrowsRuntimeError("Buffer: null buf with positive size", [] { Buffer(nullptr, 1); }));
-    const Buffer empty(nullptr, 0);
+    Buffer empty(nullptr, 0);
     EXPECT_FALSE(empty.IsOpen());
+    empty.SetState(0, 0, 0, 0);
+    EXPECT_TRUE(ThrowsRuntimeError("Buffer: bad offset param", [&] { empty.SetOffset(1); }));
 }
 
 TEST(Buffer, SizesNearTheLimitNeverBecomeAnAllocation)
@@ -153,14 +156,32 @@ TEST(Buffer, AssignmentTakesTheOthersState)
     Buffer target(3);
     target.WriteAll("xyz", 3);
     target.Unread("q", 1);
+    source.SetDirtyBounds(1, 4);
     target = source;
+    EXPECT_EQ(target.GetDirtyBegin(), 1U);
+    EXPECT_EQ(target.GetDirtyEnd(), 4U);
     EXPECT_EQ(ReadSomeText(target, 9), "cdef");
     EXPECT_EQ(target.GetCapacity(), 10U);
+    target.Unread("q", 1);
     const Buffer& same = target;
     target = same;
+    EXPECT_EQ(ReadSomeText(target, 9), "q") << "nothing changes";
     target.Seek(0);
     EXPECT_EQ(ReadSomeText(target, 9), "abcdef");
     EXPECT_EQ(ReadSomeText(source, 9), "cdef");
+}
+
+TEST(Buffer, AssignmentOwnsItsBlockAndGrowsAsTheOther)
+{
+    char block[] = "1234";
+    const Buffer wrapped(block, 4);
+    Buffer target(8);
+    target = wrapped;
+    EXPECT_TRUE(target.IsOwned());
+    EXPECT_FALSE(target.IsGrowable());
+    EXPECT_NE(target.GetData(), wrapped.GetData());
+    target = Buffer(8);
+    EXPECT_TRUE(target.IsGrowable());
 }
 
 TEST(Buffer, CloseKeepsThePositions)
@@ -346,6 +367,7 @@ TEST(Buffer, CopyOutAdvances)
     EXPECT_EQ(buffer.Tell(), 3U);
     buffer.CopyOut(bytes, 5);
     EXPECT_STREQ(bytes, "45678");
+    EXPECT_EQ(buffer.Tell(), 8U);
 }
 
 TEST(Buffer, CopyInBeyondAFixedCapacityIsAnUnderrun)
@@ -371,6 +393,36 @@ TEST(Buffer, CopyInGrowsByTheShortfall)
     EXPECT_EQ(buffer.GetDirtyEnd(), 4100U);
     buffer.Seek(4088);
     EXPECT_EQ(ReadSomeText(buffer, 50), "aa0123456789");
+}
+
+TEST(Buffer, CopyInGrowsByNoMoreThanTheShortfall)
+{
+    Buffer buffer(4096);
+    buffer.CopyIn("012345", 6);
+    buffer.CopyIn(std::string(4096, 'a').data(), 4096);
+    EXPECT_EQ(buffer.GetCapacity(), 8192U);
+}
+
+TEST(Buffer, WritesOfNothingLeaveTheDirtyRange)
+{
+    OpenBuffer buffer(8);
+    buffer.WriteAll("abcdefgh", 8);
+    buffer.SetDirtyBounds(5, 6);
+    buffer.Seek(2);
+    buffer.CopyIn("", 0);
+    EXPECT_EQ(buffer.GetDirtyBegin(), 5U);
+    buffer.CopyIn("x", 1);
+    EXPECT_EQ(buffer.GetDirtyBegin(), 2U);
+
+    buffer.SetDirtyBounds(8, 8);
+    buffer.SeekEnd();
+    EXPECT_EQ(buffer.BinioWriteSome("", 0), 0U);
+    EXPECT_EQ(buffer.GetCapacity(), 4096U) << "it grows by nothing, up to a page";
+    buffer.Seek(3);
+    EXPECT_EQ(buffer.BinioWriteSome("", 0), 0U);
+    EXPECT_EQ(buffer.GetDirtyBegin(), 8U);
+    buffer.Seek(0);
+    EXPECT_EQ(ReadSomeText(buffer, 9), "abxdefgh");
 }
 
 TEST(Buffer, SetStateChecksEachInvariant)
@@ -445,6 +497,8 @@ TEST(Buffer, AttachOfANullBlockIsAFailedRequirement)
     EXPECT_THAT(thrown, testing::EndsWith("): Failed requirement: buf != NULL"));
     EXPECT_EQ(told, thrown);
     EXPECT_FALSE(buffer.IsOpen()) << "the old block is gone";
+    EXPECT_TRUE(State(buffer) == State(Buffer(nullptr, 0)));
+    EXPECT_FALSE(buffer.IsOwned());
 
     Buffer kept(100);
     kept.WriteAll("abc", 3);
@@ -541,6 +595,7 @@ TEST(Buffer, SeekRelativePast64BitsNamesTheEnd)
     EXPECT_TRUE(ThrowsRuntimeError("Buffer: seek past EOF", [&] { buffer.SeekRelative(6); }));
     buffer.SeekRelative(5);
     EXPECT_EQ(buffer.Tell(), kLargest);
+    EXPECT_TRUE(ThrowsRuntimeError("Buffer: seek past EOF", [&] { buffer.SeekRelative(1); }));
 }
 
 TEST(Buffer, SeekRelativeGoesThroughTheVirtualSeek)

@@ -1,8 +1,11 @@
 #include "pmutil/Fmt.h"
 
+#include <algorithm>
 #include <climits>
 #include <gtest/gtest.h>
+#include <iterator>
 #include <memory>
+#include <new>
 
 using pmutil::Fmt;
 
@@ -111,6 +114,11 @@ TEST(Fmt, FloatingPoint)
 
 TEST(Fmt, TextsBeyondTheUsualLength)
 {
+    for (const int width : {254, 255, 256, 257}) {
+        const std::string format = "%0" + std::to_string(width) + "d";
+        EXPECT_EQ(Text(7, format.c_str()),
+                  std::string(static_cast<std::size_t>(width) - 1, '0') + "7");
+    }
     EXPECT_EQ(Text(7, "%0400d"), std::string(399, '0') + "7");
     const std::string longText(1000, 'x');
     EXPECT_EQ(Text(longText.c_str()), '"' + longText + '"');
@@ -124,6 +132,7 @@ TEST(Fmt, CString)
     EXPECT_EQ(Text("a\"b"), "\"a\\\"b\"");
     EXPECT_EQ(Text("a'b"), "\"a'b\"");
     EXPECT_EQ(Text("a\tb\x01"), "\"a\\tb\\x01\"");
+    EXPECT_EQ(Text("~\x7F \\"), "\"~\\x7f \\\\\"");
     const char* const null = nullptr;
     EXPECT_EQ(Text(null), "<NULL>");
     EXPECT_EQ(Text(null, "[%s]"), "<NULL>");
@@ -147,6 +156,8 @@ TEST(Fmt, Pointer)
     EXPECT_EQ(Text(reinterpret_cast<const void*>(std::uintptr_t{10}), "%llu"), "10");
     std::snprintf(expected, sizeof expected, "%p", static_cast<void*>(&object));
     EXPECT_EQ(Text(static_cast<const void*>(&object), "%p"), expected);
+    EXPECT_EQ(Text(static_cast<const void*>(&object), "100%%, %p"),
+              std::string("100%, ") + expected);
 }
 
 TEST(Fmt, PlatformsDefaultForPointersServesFormattersMadeLater)
@@ -273,6 +284,45 @@ TEST(Fmt, OverridesOfTheVirtualOperationsAreCalled)
     std::string text;
     fmt.Format(text, 5);
     EXPECT_EQ(text, "5!");
+}
+
+// The memory of a formatter, which is filled with one byte once it is destroyed.
+class FormatterPlace {
+public:
+    void Make() { new (fBytes) Fmt; }
+    void Destroy()
+    {
+        reinterpret_cast<Fmt*>(fBytes)->~Fmt();
+        std::fill(std::begin(fBytes), std::end(fBytes), kFilling);
+    }
+    bool IsUntouched() const
+    {
+        return std::all_of(std::begin(fBytes), std::end(fBytes),
+                           [](unsigned char byte) { return byte == kFilling; });
+    }
+
+private:
+    static constexpr unsigned char kFilling = 0x5A;
+
+    alignas(Fmt) unsigned char fBytes[sizeof(Fmt)];
+};
+
+TEST(Fmt, NobodyTouchesAFormatterThatIsGone)
+{
+    constexpr std::size_t kOrders[][3] = {{0, 1, 2}, {0, 2, 1}, {1, 0, 2},
+                                          {1, 2, 0}, {2, 0, 1}, {2, 1, 0}};
+    for (const auto& order : kOrders) {
+        FormatterPlace places[3];
+        for (FormatterPlace& place : places)
+            place.Make();
+        for (const std::size_t gone : order)
+            places[gone].Destroy();
+        {
+            const Fmt later;
+        }
+        for (const FormatterPlace& place : places)
+            EXPECT_TRUE(place.IsUntouched()) << order[0] << order[1] << order[2];
+    }
 }
 
 TEST(Fmt, HeadOfTheChainStaysWhateverComesAndGoes)

@@ -24,6 +24,7 @@ TEST(FormatTest, TextOfAnyLengthIsWhole)
     for (const std::size_t size : {254U, 255U, 256U, 257U, 1000U, 1000000U}) {
         const std::string text(size, 'y');
         EXPECT_EQ(FormatString("%s", text.c_str()), text);
+        EXPECT_EQ(FormatString("%s%c", text.c_str(), 'z'), text + 'z');
     }
 }
 

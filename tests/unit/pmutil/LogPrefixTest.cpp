@@ -64,7 +64,7 @@ TEST(LogPrefixTest, TellsTheDeltaInSecondsRoundedToMilliseconds)
         {-0.25, "(+-0.250)"},    {-12.5, "(+-12.500)"},
         {0.0625, "(+00.062)"},   {86400.125, "(+86400.125)"},
         {0.1875, "(+00.188)"},   {98.9994, "(+98.999)"},
-        {99.9996, "(+100.000)"},
+        {99.9996, "(+100.000)"}, {-0.0, "(+-0.000)"},
     };
     for (const auto& test : kCases)
         EXPECT_EQ(MakeLogPrefix(0, 0, test.delta, "t").substr(29),
@@ -112,7 +112,9 @@ TEST(LogPrefixTest, LineNumberHasAtLeastFiveDigits)
 {
     EXPECT_EQ(MakeLogPrefix(42, 0, 0, "t").substr(0, 7), "00042.1");
     EXPECT_EQ(MakeLogPrefix(99999, 0, 0, "t").substr(0, 7), "99999.1");
+    EXPECT_EQ(MakeLogPrefix(100000, 0, 0, "t").substr(0, 8), "100000.1");
     EXPECT_EQ(MakeLogPrefix(1234567, 0, 0, "t").substr(0, 9), "1234567.1");
+    EXPECT_EQ(MakeLogPrefix(4294967295, 0, 0, "t").substr(0, 12), "4294967295.1");
 }
 
 TEST(LogPrefixTest, ThreadTextIsTakenAsItStands)

@@ -1,6 +1,8 @@
 #include "pmutil/PMLogging.h"
 
+#include <cmath>
 #include <cstdlib>
+#include <functional>
 #include <iomanip>
 #include <memory>
 #include <sstream>
@@ -179,7 +181,16 @@ TEST_F(PMLoggingTest, SecondLineIsNumberedAndTellsTheTimeSinceTheFirst)
     EXPECT_EQ(logger.lines[1].substr(0, 6), "00001.");
     const auto plus = logger.lines[1].find("(+");
     ASSERT_NE(plus, std::string::npos);
-    EXPECT_GE(std::stod(logger.lines[1].substr(plus + 2)), 0.025);
+    // The times of the lines, "10:49:36.366" of any day, are rounded to milliseconds.
+    const auto getSeconds = [](const std::string& line) {
+        const std::string time = line.substr(line.find('_') + 1);
+        return (std::stod(time) * 60 + std::stod(time.substr(3))) * 60 + std::stod(time.substr(6));
+    };
+    constexpr double kDay = 24.0 * 60 * 60;
+    const double passed =
+        std::fmod(getSeconds(logger.lines[1]) - getSeconds(logger.lines[0]) + kDay, kDay);
+    EXPECT_GT(passed, 0);
+    EXPECT_NEAR(std::stod(logger.lines[1].substr(plus + 2)), passed, 0.002);
 }
 
 TEST_F(PMLoggingTest, LineIsThreePiecesAndOneFlush)
@@ -333,15 +344,78 @@ TEST_F(PMLoggingTest, EachMessageStartsWithDefaultFormatting)
     RecordingLogger logger;
     PM_LOG(gOn, std::hex << std::showbase << std::setprecision(2) << std::setfill('*') << 255 << " "
                          << 1.2345 << std::setw(9));
-    PM_LOG(gOn, 255 << " " << 1.2345 << std::setw(3) << 7);
+    PM_LOG(gOn, 255 << " " << 1.23456789 << std::setw(3) << 7);
     PM_LOG(gOn, "cut" << static_cast<std::streambuf*>(nullptr) << " short");
-    PM_LOG(gOn, "whole"
+    PM_LOG(gOn, ""
+                    << "whole"
                     << " again");
     ASSERT_THAT(logger.lines, SizeIs(4));
     EXPECT_EQ(MessageOf(logger.lines[0]), "0xff 1.2\n");
-    EXPECT_EQ(MessageOf(logger.lines[1]), "255 1.2345  7\n");
+    EXPECT_EQ(MessageOf(logger.lines[1]), "255 1.23457  7\n");
     EXPECT_EQ(MessageOf(logger.lines[2]), "cut\n");
     EXPECT_EQ(MessageOf(logger.lines[3]), "whole again\n");
+}
+
+// What a statement does to its stream.
+struct Change {
+    std::function<void(std::ostream&)> fMake;
+};
+
+std::ostream& operator<<(std::ostream& out, const Change& change)
+{
+    change.fMake(out);
+    return out;
+}
+
+class FlushCounter : public std::stringbuf {
+public:
+    int flushes = 0;
+
+protected:
+    int sync() override
+    {
+        ++flushes;
+        return 0;
+    }
+};
+
+TEST_F(PMLoggingTest, AStatementsStreamLeavesNothingToTheNext)
+{
+    RecordingLogger logger;
+    FlushCounter counter;
+    std::ostream other(&counter);
+    const Change spoil = {[&other](std::ostream& out) {
+        out.exceptions(std::ios::failbit);
+        out.tie(&other);
+    }};
+    const Change fail = {[](std::ostream& out) { out.setstate(std::ios::failbit); }};
+    PM_LOG(gOn, "one" << spoil);
+    EXPECT_EQ(counter.flushes, 0);
+    PM_LOG(gOn, "two" << fail);
+    PM_LOG(gOn, "three");
+    ASSERT_THAT(logger.lines, SizeIs(3));
+    EXPECT_EQ(MessageOf(logger.lines[1]), "two\n");
+    EXPECT_EQ(MessageOf(logger.lines[2]), "three\n");
+    EXPECT_EQ(counter.flushes, 0);
+}
+
+// A character that is put into the stream by itself.
+struct Put {
+    char character;
+};
+
+std::ostream& operator<<(std::ostream& out, const Put& put)
+{
+    return out.put(put.character);
+}
+
+TEST_F(PMLoggingTest, AMessageMayBePutTogetherByCharacters)
+{
+    RecordingLogger logger;
+    PM_LOG(gOn, "a" << Put{'b'} << Put{'\xFF'} << "c");
+    ASSERT_THAT(logger.lines, SizeIs(1));
+    EXPECT_EQ(MessageOf(logger.lines[0]), "ab\xFF"
+                                          "c\n");
 }
 
 int LogAndGive(int value)

@@ -216,6 +216,15 @@ TEST(Previewer, CollectsMoreThanOneBlock)
     EXPECT_EQ(again, all);
 }
 
+TEST(Previewer, ReadsAtMost64KiBAtOnce)
+{
+    FakeChannel source;
+    source.fPieces = {std::string(70'000, 'x')};
+    Previewer preview(source);
+    EXPECT_EQ(ReadSomeText(preview, 1 << 20).size(), 65536U);
+    EXPECT_EQ(ReadSomeText(preview, 1 << 20).size(), 4464U);
+}
+
 TEST(Previewer, FailsAfterItsEnd)
 {
     FakeChannel source;

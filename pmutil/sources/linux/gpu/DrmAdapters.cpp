@@ -283,12 +283,13 @@ bool ParseModeSize(const std::string& mode, std::uint32_t& width, std::uint32_t&
     std::uint32_t parsedWidth = 0;
     std::uint32_t parsedHeight = 0;
     const auto first = std::from_chars(mode.data(), end, parsedWidth);
-    if (first.ec != std::errc() || first.ptr == end || *first.ptr != 'x')
+    if (*first.ptr != 'x')
         return false;
     const auto second = std::from_chars(first.ptr + 1, end, parsedHeight);
     const std::string rest(second.ptr, end);
-    if (second.ec != std::errc() || (!rest.empty() && rest != "i") || parsedWidth == 0 ||
-        parsedHeight == 0 || parsedWidth > kMaxModeSize || parsedHeight > kMaxModeSize)
+    // What can't be parsed stays 0.
+    if ((!rest.empty() && rest != "i") || parsedWidth == 0 || parsedHeight == 0 ||
+        parsedWidth > kMaxModeSize || parsedHeight > kMaxModeSize)
         return false;
     width = parsedWidth;
     height = parsedHeight;

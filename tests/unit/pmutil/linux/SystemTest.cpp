@@ -161,6 +161,20 @@ TEST(PrepareConsoleProcessDeathTest, LeavesAHardCoreLimitOfZeroThatItMayNotRaise
     });
 }
 
+TEST(PrepareConsoleProcessDeathTest, RaisesAHardCoreLimitOfZeroIfItMay)
+{
+    ExpectInFreshProcess([] {
+        const rlimit none{0, 0};
+        REQUIRE_SO(setrlimit(RLIMIT_CORE, &none) == 0);
+        const rlimit one{1, 1};
+        const bool mayRaise = setrlimit(RLIMIT_CORE, &one) == 0;
+        REQUIRE_SO(!mayRaise || setrlimit(RLIMIT_CORE, &none) == 0);
+        PrepareConsoleProcess();
+        REQUIRE_SO(GetLimit(RLIMIT_CORE).rlim_cur == (mayRaise ? 1 : 0));
+        REQUIRE_SO(GetLimit(RLIMIT_CORE).rlim_max == (mayRaise ? 1 : 0));
+    });
+}
+
 TEST(PrepareConsoleProcessDeathTest, LetsAWriteToAClosedPipeFail)
 {
     ExpectInFreshProcess([] {
@@ -225,6 +239,19 @@ TEST(PrepareConsoleProcessDeathTest, OccupiesClosedStreamsWithWhatFails)
             REQUIRE_SO(read(stream, &byte, 1) == -1 && errno == EBADF);
             REQUIRE_SO(write(stream, &byte, 1) == -1 && errno == EBADF);
         }
+    });
+}
+
+TEST(PrepareConsoleProcessDeathTest, OccupiesAClosedStandardErrorAndNothingElse)
+{
+    ExpectInFreshProcess([] {
+        const int next = dup(STDIN_FILENO);
+        close(next);
+        PrepareConsoleProcess();
+        REQUIRE_SO(dup(STDIN_FILENO) == next);
+        close(STDERR_FILENO);
+        PrepareConsoleProcess();
+        REQUIRE_SO(fcntl(STDERR_FILENO, F_GETFL) >= 0);
     });
 }
 
