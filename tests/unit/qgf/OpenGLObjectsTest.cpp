@@ -2,6 +2,7 @@
 #include <functional>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <gmock/gmock.h>
@@ -141,6 +142,45 @@ TEST_F(OpenGLObjects, EmptyOrInvalidLogIsReportedAsNone)
     EXPECT_EQ(compileFailure(), none);
 }
 
+TEST_F(OpenGLObjects, ALogIsOneLine)
+{
+    const std::pair<const char*, const char*> rows[] = {
+        {"x", "x"},          {"one\r\ntwo", "one | two"}, {"one\n\n\rtwo\r", "one | two"},
+        {"\none", " | one"}, {" one \n\t", " one"},       {"one\ttwo", "one\ttwo"}};
+    device().fragmentCompiles = false;
+    for (const auto& [log, text] : rows) {
+        device().log = log;
+        EXPECT_EQ(compileFailure(), std::string("The fragment shader doesn't compile: ") + text);
+    }
+}
+
+// The file is a part of the text for a driver that lacks a function.
+TEST_F(OpenGLObjects, FailuresNameTheirSourceFile)
+{
+    const struct {
+        const char* file;
+        const char* function;
+        std::function<void()> action;
+    } rows[] = {
+        {"Program", "glLinkProgram", [] { Program().link(false); }},
+        {"Texture2D", "glTexImage2D",
+         [] { Texture2D(InternalFormat::RGBA8, 1, 1, false, nullptr, Type::Default); }},
+        {"Framebuffer", "glGenFramebuffers", [] { Framebuffer(); }},
+        {"ExtensionManager", "glGetString", [] { ExtensionManager::Instance(); }},
+    };
+    for (const auto& row : rows) {
+        FakeOpenGL driver;
+        driver.devices[0].missing = {row.function};
+        ContextOffscreen other(Context::PrimaryDisplayDevice());
+        other.makeCurrent();
+        EXPECT_THAT(FailureOf(row.action),
+                    testing::StartsWith(std::string(row.function) +
+                                        " is not offered by this OpenGL driver (called from "
+                                        "qgf/source/qgf/qgf_ogl/" +
+                                        row.file + ":"));
+    }
+}
+
 TEST_F(OpenGLObjects, HugeLogIsTruncated)
 {
     device().fragmentCompiles = false;
@@ -201,6 +241,9 @@ TEST_F(OpenGLObjects, InvalidTextureArgumentsThrow)
         FailureOf([] { Texture2D(InternalFormat::RGBA8, 0, 4, false, nullptr, Type::Default); }),
         "Bad texture size 0 x 4");
     EXPECT_EQ(
+        FailureOf([] { Texture2D(InternalFormat::RGBA8, 4, 0, false, nullptr, Type::Default); }),
+        "Bad texture size 4 x 0");
+    EXPECT_EQ(
         FailureOf([] { Texture2D(InternalFormat::RGBA8, 4, -1, false, nullptr, Type::Default); }),
         "Bad texture size 4 x -1");
     EXPECT_EQ(device().objects, 0);
@@ -249,6 +292,31 @@ TEST_F(OpenGLObjects, IncompleteFramebufferIsNamed)
               "The framebuffer is not complete: 0x0000");
 }
 
+TEST_F(OpenGLObjects, EachStatusOfAFramebufferHasItsName)
+{
+    const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);
+    Framebuffer framebuffer;
+    const std::pair<std::uint32_t, const char*> rows[] = {
+        {0x8218, "0x8218"},
+        {0x8219, "GL_FRAMEBUFFER_UNDEFINED"},
+        {0x8CD6, "GL_FRAMEBUFFER_INCOMPLETE_ATTACHMENT"},
+        {0x8CD7, "GL_FRAMEBUFFER_INCOMPLETE_MISSING_ATTACHMENT"},
+        {0x8CD8, "0x8CD8"},
+        {0x8CD9, "GL_FRAMEBUFFER_INCOMPLETE_DIMENSIONS"},
+        {0x8CDA, "GL_FRAMEBUFFER_INCOMPLETE_FORMATS"},
+        {0x8CDB, "GL_FRAMEBUFFER_INCOMPLETE_DRAW_BUFFER"},
+        {0x8CDC, "GL_FRAMEBUFFER_INCOMPLETE_READ_BUFFER"},
+        {0x8CDD, "GL_FRAMEBUFFER_UNSUPPORTED"},
+        {0x8D56, "GL_FRAMEBUFFER_INCOMPLETE_MULTISAMPLE"},
+        {0xFFFFFFFF, "0xFFFFFFFF"},
+    };
+    for (const auto& [status, name] : rows) {
+        device().framebufferStatus = status;
+        EXPECT_EQ(FailureOf([&] { framebuffer.attach(texture, 0, 0); }),
+                  std::string("The framebuffer is not complete: ") + name);
+    }
+}
+
 TEST_F(OpenGLObjects, ErrorOfATextureIsReportedByTheFramebuffer)
 {
     device().onCall["glTexImage2D"] = [this] {
@@ -270,6 +338,9 @@ TEST_F(OpenGLObjects, InvalidAttachmentsThrow)
 {
     const Texture2D texture(InternalFormat::RGBA8, 32, 32, false, nullptr, Type::Default);
     Framebuffer framebuffer;
+    EXPECT_NO_THROW(framebuffer.attach(texture, 31, 0x7FFFFFFF));
+    EXPECT_THAT(gl.callsOf("glFramebufferTexture2D"),
+                ElementsAre("glFramebufferTexture2D(0x8D40,0x8CFF,0xDE1,1,2147483647)"));
     gl.calls.clear();
     EXPECT_EQ(FailureOf([&] { framebuffer.attach(texture, 32, 0); }),
               "There is no colour attachment 32");

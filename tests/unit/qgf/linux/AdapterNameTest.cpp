@@ -2,6 +2,9 @@
 
 #include <filesystem>
 #include <set>
+#include <string>
+#include <utility>
+#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -68,6 +71,20 @@ TEST(AdapterNameTest, HexadecimalIdsAreTheLastSource)
     EXPECT_EQ(AdapterName("0000:03:00.0"), "1002:744c");
 }
 
+TEST(AdapterNameTest, OnlyWholeIdsOf16BitsCount)
+{
+    const std::pair<const char*, const char*> rows[] = {
+        {"0xffff\n", "ffff:744c"},  {"0x1\n", "0001:744c"},      {"0x10000\n", "0000:744c"},
+        {"0x1002z\n", "0000:744c"}, {"0x1002 1\n", "0000:744c"}, {"\n", "0000:744c"},
+        {"vendor\n", "0000:744c"}};
+    const AdapterTree tree("amd-discrete");
+    tree.remove("/usr");
+    for (const auto& [text, name] : rows) {
+        tree.write(std::string(kRadeon) + "/vendor", text);
+        EXPECT_EQ(AdapterName("0000:03:00.0"), name) << text;
+    }
+}
+
 TEST(AdapterNameTest, ADeviceMissingInTheDatabaseIsNamedByItsIds)
 {
     const AdapterTree tree("unnamed");
@@ -105,6 +122,8 @@ TEST(AdapterNameTest, CharactersThatWouldBeEscapedAreReplaced)
     const AdapterTree tree("amd-discrete");
     tree.write(std::string(kRadeon) + "/product_name", "A\"\\\xC2\xAE\xE2\x84\xA2\xFF\x01 z\n");
     EXPECT_EQ(AdapterName("0000:03:00.0"), "A'/???? z");
+    tree.write(std::string(kRadeon) + "/product_name", "~\x7F\xBF\xC0\x1F\n");
+    EXPECT_EQ(AdapterName("0000:03:00.0"), "~???");
 }
 
 TEST(AdapterNameTest, AnEmptyNameFallsBackToTheNextSource)

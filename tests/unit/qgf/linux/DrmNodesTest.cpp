@@ -107,6 +107,17 @@ TEST(DrmNodesTest, DevicesWithoutADriverAndFramebuffersWithoutACardAreLeftOut)
     EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card0"), "");
 }
 
+TEST(DrmNodesTest, ANameWithoutANumberIsNoNode)
+{
+    const AdapterTree tree("empty");
+    for (const char* name : {"card", "renderD", "cardx", "card1x", "xcard1", "renderD128x"})
+        AddNode(tree, name, std::string("platform/gpu-") + name, "v3d");
+    EXPECT_THAT(DrmNodes(), IsEmpty());
+    EXPECT_EQ(AdapterOfDrmNode("/dev/dri/card"), "");
+    AddNode(tree, "card0", "pci0000:00/0000:00:15.0/virtio", "other");
+    EXPECT_THAT(Places(), ElementsAre("card0 pci0000:00/0000:00:15.0/virtio"));
+}
+
 TEST(DrmNodesTest, LinksToOtherPathsAreIgnored)
 {
     for (const char* target : {"", "card0", "../../devices/drm/card0", "../../devices//drm/card0",

@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <cstdint>
 #include <functional>
+#include <iterator>
 #include <map>
 #include <memory>
 #include <optional>
@@ -41,10 +42,11 @@ struct Script {
     EGLint major = 1;
     EGLint minor = 5;
     std::optional<EGLint> claimedDevices;
-    int configs = 1;                // the number that eglChooseConfig finds
-    bool preferred = true;          // whether one of them has 8 bits per colour
-    std::set<std::string> throwing; // calls that throw through the C interface
-    std::set<std::string> failing;  // calls that fail, by name or by name and first argument
+    std::optional<EGLint> filledDevices; // what the list says that it has, if not that number
+    int configs = 1;                     // the number that eglChooseConfig finds
+    bool preferred = true;               // whether one of them has 8 bits per colour
+    std::set<std::string> throwing;      // calls that throw through the C interface
+    std::set<std::string> failing;       // calls that fail, by name or by name and first argument
     EGLint error = EGL_BAD_ALLOC;
     std::set<std::string> absent;
     std::vector<std::string> calls;
@@ -136,6 +138,8 @@ EGLBoolean ChooseConfig(EGLDisplay, const EGLint* attributes, EGLConfig* config,
         text += " pbuffer";
     if (!HasPair(attributes, EGL_RENDERABLE_TYPE, EGL_OPENGL_BIT))
         text += " without OpenGL";
+    if (size != 1)
+        text += " of several";
     if (!Enter("eglChooseConfig", text))
         return EGL_FALSE;
     *count = preferred && !gScript->preferred ? 0 : std::min(gScript->configs, size);
@@ -148,7 +152,10 @@ EGLContext CreateContext(EGLDisplay display, EGLConfig config, EGLContext, const
 {
     const bool compatibility = HasPair(attributes, EGL_CONTEXT_OPENGL_PROFILE_MASK_KHR,
                                        EGL_CONTEXT_OPENGL_COMPATIBILITY_PROFILE_BIT_KHR);
-    const std::string kind = (compatibility ? "compatibility" : "plain");
+    const bool from32 = HasPair(attributes, EGL_CONTEXT_MAJOR_VERSION_KHR, 3) &&
+                        HasPair(attributes, EGL_CONTEXT_MINOR_VERSION_KHR, 2);
+    const std::string kind =
+        compatibility ? (from32 ? "compatibility" : "compatibility of any version") : "plain";
     const bool works = Enter("eglCreateContext", kind + " config" + Number(config)) &&
                        gScript->failing.count("eglCreateContext on " + Number(display)) == 0;
     return works ? AsHandle<EGLContext>(300) : EGL_NO_CONTEXT;
@@ -159,10 +166,11 @@ EGLBoolean DestroyContext(EGLDisplay, EGLContext)
     return Enter("eglDestroyContext");
 }
 
-EGLSurface CreatePbufferSurface(EGLDisplay, EGLConfig config, const EGLint*)
+EGLSurface CreatePbufferSurface(EGLDisplay, EGLConfig config, const EGLint* attributes)
 {
-    return Enter("eglCreatePbufferSurface", "config" + Number(config)) ? AsHandle<EGLSurface>(400)
-                                                                       : EGL_NO_SURFACE;
+    const bool small = HasPair(attributes, EGL_WIDTH, 32) && HasPair(attributes, EGL_HEIGHT, 32);
+    const std::string text = "config" + Number(config) + (small ? "" : " of another size");
+    return Enter("eglCreatePbufferSurface", text) ? AsHandle<EGLSurface>(400) : EGL_NO_SURFACE;
 }
 
 EGLBoolean DestroySurface(EGLDisplay, EGLSurface)
@@ -177,10 +185,13 @@ EGLBoolean MakeCurrent(EGLDisplay, EGLSurface surface, EGLSurface, EGLContext co
 
 EGLBoolean QueryDevices(EGLint size, EGLDeviceEXT* devices, EGLint* count)
 {
-    if (!Enter("eglQueryDevicesEXT", devices == nullptr ? "count" : "list"))
+    const std::string text = devices == nullptr ? "count" : "list";
+    if (!Enter("eglQueryDevicesEXT", size != 0 && devices == nullptr ? "list without room" : text))
         return EGL_FALSE;
     const auto known = static_cast<EGLint>(gScript->devices.size());
     *count = gScript->claimedDevices.value_or(known);
+    if (devices != nullptr && gScript->filledDevices)
+        *count = *gScript->filledDevices;
     if (devices != nullptr)
         for (EGLint i = 0; i < std::min(size, known); ++i)
             devices[i] = AsHandle<EGLDeviceEXT>(static_cast<std::size_t>(i) + 1);
@@ -253,6 +264,7 @@ std::string AddressOfNode(const std::string& node)
 std::vector<std::string> AddressesOfNvidia(const std::vector<std::string>& names,
                                            const std::vector<std::string>& taken)
 {
+    Enter("lookup of NVIDIA");
     std::vector<std::string> addresses;
     addresses.reserve(names.size());
     for (const std::string& name : names)
@@ -431,6 +443,13 @@ TEST_F(EGLPlatformTest, AnAdaptersDriverComesBeforeTheFirmwaresFramebuffer)
     EXPECT_THAT(script.calls, Not(Contains("eglInitialize 1")));
 }
 
+TEST_F(EGLPlatformTest, TheFirmwaresFramebufferComesBeforeSoftware)
+{
+    script.devices = {{"EGL_MESA_device_software", {}}, WithNode("/dev/dri/card3")};
+    EXPECT_THAT(devices(),
+                ElementsAre("/dev/dri/card3|Second Adapter|0000:02:00.0", "egl:0|egl:0|"));
+}
+
 TEST_F(EGLPlatformTest, TheFirmwaresFramebufferTakesNoAddressFromItsDriver)
 {
     script.devices = {
@@ -466,6 +485,25 @@ TEST_F(EGLPlatformTest, EmptyListOfDevicesIsEmpty)
 {
     script.devices.clear();
     EXPECT_THAT(devices(), IsEmpty());
+    EXPECT_THAT(script.calls, ElementsAre("eglQueryDevicesEXT count"));
+}
+
+TEST_F(EGLPlatformTest, OnlyTheFilledPartOfTheListCounts)
+{
+    script.devices.resize(3);
+    for (int filled = 0; filled <= 2; ++filled) {
+        script.filledDevices = filled;
+        EXPECT_EQ(devices().size(), static_cast<std::size_t>(filled));
+    }
+}
+
+TEST_F(EGLPlatformTest, NvidiaDevicesAreLookedUpOnlyWithoutANode)
+{
+    script.devices = {{"EGL_NV_device_cuda EGL_EXT_device_query_name EGL_EXT_device_drm",
+                       {{EGL_DRM_DEVICE_FILE_EXT, "/dev/dri/card7"}, {EGL_RENDERER_EXT, "Card 2"}}},
+                      {"", {}}};
+    EXPECT_THAT(devices(), ElementsAre("/dev/dri/card7|/dev/dri/card7|", "egl:1|egl:1|"));
+    EXPECT_THAT(script.calls, Not(Contains("lookup of NVIDIA")));
 }
 
 TEST_F(EGLPlatformTest, CountOutOfRangeThrows)
@@ -639,6 +677,35 @@ TEST_F(EGLPlatformTest, OldEGLGetsNoProfileAttributes)
     script.failing = {"eglCreateContext"};
     EXPECT_THROW(create(), QGF::LogicalException);
     EXPECT_THAT(script.calls, Not(Contains(StartsWith("eglCreateContext compatibility"))));
+}
+
+// EGL 1.5 has the attributes; before, an extension has them.
+TEST_F(EGLPlatformTest, TheVersionOfEGLDecidesAboutProfileAttributes)
+{
+    const std::string base = "EGL_KHR_surfaceless_context EGL_KHR_no_config_context";
+    const struct {
+        EGLint major;
+        EGLint minor;
+        const char* extension;
+        bool has;
+    } rows[] = {{1, 4, "", false}, {1, 5, "", true},
+                {1, 6, "", true},  {2, 0, "", true},
+                {0, 9, "", false}, {0, 5, "", false},
+                {2, 4, "", true},  {1, 4, " EGL_KHR_create_context", true}};
+    std::size_t device = 0;
+    script.devices.resize(std::size(rows)); // each is opened once
+    script.failing = {"eglCreateContext plain config0"};
+    for (const auto& row : rows) {
+        script.major = row.major;
+        script.minor = row.minor;
+        script.displayExtensions = base + row.extension;
+        script.calls.clear();
+        create("egl:" + std::to_string(device++));
+        EXPECT_EQ(std::count(script.calls.begin(), script.calls.end(),
+                             "eglCreateContext compatibility config0"),
+                  row.has ? 1 : 0)
+            << row.major << '.' << row.minor << row.extension;
+    }
 }
 
 TEST_F(EGLPlatformTest, ContextWithAConfigIsTriedIfTheOneWithoutFails)

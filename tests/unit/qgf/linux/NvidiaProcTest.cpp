@@ -19,6 +19,7 @@ TEST(NvidiaProcTest, AFieldsValueIsTrimmed)
     EXPECT_EQ(NvidiaField("", "Model"), "");
     EXPECT_EQ(NvidiaField("Model:", "Model"), "");
     EXPECT_EQ(NvidiaField("Model: \n x", "Model"), "");
+    EXPECT_EQ(NvidiaField("\nModel\nModels: x\nModel:y\r\nModel: z", "Model"), "y");
 }
 
 TEST(NvidiaProcTest, TheModelIsTheDriversText)

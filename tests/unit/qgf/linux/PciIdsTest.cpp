@@ -59,6 +59,11 @@ TEST(PciIdsTest, LineEndsAndBlanksAreTrimmed)
     EXPECT_EQ(FindPciName("1002  A\n\t744c  B", 0x1002, 0x744C), "A B");
 }
 
+TEST(PciIdsTest, CommentsAndEmptyLinesEndNoVendor)
+{
+    EXPECT_EQ(FindPciName("1002  A\n\n# text\n#\n\t744b  C\n\t744c  B\n", 0x1002, 0x744C), "A B");
+}
+
 TEST(PciIdsTest, TruncatedTextsHaveNoName)
 {
     const std::string text = "1002  A\n\t744c  B\n";
@@ -75,6 +80,19 @@ TEST(PciIdsTest, TheDatabaseIsReadFromEitherPath)
     EXPECT_NE(PciIds().name(0x1002, 0x744C), "");
     tree.write("/usr/share/hwdata/pci.ids", "1002  A\n\t744c  B\n");
     EXPECT_EQ(PciIds().name(0x1002, 0x744C), "A B");
+}
+
+TEST(PciIdsTest, TheDatabaseIsReadUpTo16MiB)
+{
+    const AdapterTree tree("empty");
+    tree.remove("/usr");
+    const std::string entry = "\n1002  A\n\t744c  B";
+    const std::size_t most = 16 * 1024 * 1024;
+    const std::string comment = "#" + std::string(most - entry.size() - 1, 'x');
+    tree.write("/usr/share/misc/pci.ids", comment + entry);
+    EXPECT_EQ(PciIds().name(0x1002, 0x744C), "A B");
+    tree.write("/usr/share/misc/pci.ids", comment + "x" + entry);
+    EXPECT_EQ(PciIds().name(0x1002, 0x744C), "");
 }
 
 // libpciaccess and FindPciName must return the same names.

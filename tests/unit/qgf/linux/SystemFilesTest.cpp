@@ -1,9 +1,14 @@
 #include "qgf/SystemFiles.h"
 
 #include <filesystem>
+#include <iterator>
+#include <string>
+#include <vector>
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "support/AdapterTree.h"
 
@@ -35,7 +40,7 @@ TEST_F(SystemFilesTest, AnOversizedFileIsReadUpToTheLimit)
 {
     fTree.write("/sys/a", std::string(100000, 'x'));
     EXPECT_TRUE(ReadSystemFile("/sys/a", fText));
-    EXPECT_EQ(fText, std::string(kMaxSystemFileSize, 'x'));
+    EXPECT_EQ(fText, std::string(4096, 'x'));
     EXPECT_TRUE(ReadSystemFile("/sys/a", fText, 10));
     EXPECT_EQ(fText, std::string(10, 'x'));
 }
@@ -105,12 +110,59 @@ TEST_F(SystemFilesTest, TheFirstLineIsTrimmed)
     EXPECT_EQ(ReadSystemLine("/none"), "");
 }
 
+TEST_F(SystemFilesTest, ALongFileOfManyLinesIsReadToItsEnd)
+{
+    const std::string line = std::string(10000, 'x') + '\n';
+    fTree.write("/a", line + line + line);
+    EXPECT_TRUE(ReadSystemFile("/a", fText, 100000));
+    EXPECT_EQ(fText, line + line + line);
+    EXPECT_EQ(ReadSystemLine("/a"), std::string(kMaxSystemFileSize, 'x'));
+}
+
+// A program that was started without a standard input gets its number for the next file.
+TEST_F(SystemFilesTest, AFileMayHaveTheNumberOfTheStandardInput)
+{
+    fTree.write("/a", "text");
+    const int saved = dup(STDIN_FILENO);
+    ASSERT_EQ(close(STDIN_FILENO), 0);
+    EXPECT_TRUE(ReadSystemFile("/a", fText));
+    const int next = open("/dev/null", O_RDONLY | O_CLOEXEC);
+    EXPECT_EQ(next, STDIN_FILENO);
+    if (saved >= 0) {
+        dup2(saved, STDIN_FILENO);
+        close(saved);
+    }
+    EXPECT_EQ(fText, "text");
+}
+
 TEST_F(SystemFilesTest, AFolderListsItsNamesSorted)
 {
     fTree.write("/d/b", "");
     fTree.write("/d/a", "");
     std::filesystem::create_symlink("gone", fTree.root() + "/d/c");
     EXPECT_EQ(ListSystemFolder("/d"), (std::vector<std::string>{"a", "b", "c"}));
+}
+
+TEST_F(SystemFilesTest, AFolderListsAtMost4096Names)
+{
+    std::filesystem::create_directories(fTree.root() + "/d");
+    for (int name = 0; name < 4097; ++name)
+        std::filesystem::create_symlink("gone", fTree.root() + "/d/" + std::to_string(name));
+    EXPECT_EQ(ListSystemFolder("/d").size(), 4096U);
+}
+
+TEST_F(SystemFilesTest, NoFileStaysOpen)
+{
+    fTree.write("/d/a", "text");
+    const auto countOpen = [] {
+        return std::distance(std::filesystem::directory_iterator("/proc/self/fd"),
+                             std::filesystem::directory_iterator());
+    };
+    const auto before = countOpen();
+    EXPECT_TRUE(ReadSystemFile("/d/a", fText));
+    EXPECT_EQ(ReadSystemLine("/d/a"), "text");
+    EXPECT_EQ(ListSystemFolder("/d").size(), 1U);
+    EXPECT_EQ(countOpen(), before);
 }
 
 TEST_F(SystemFilesTest, AFileOrMissingFolderListsNothing)
@@ -125,6 +177,8 @@ TEST_F(SystemFilesTest, ALinkIsReadEvenIfItsTargetIsMissing)
     std::filesystem::create_symlink("../gone/nvidia", fTree.root() + "/driver");
     EXPECT_EQ(ReadSystemLink("/driver"), "../gone/nvidia");
     EXPECT_EQ(LastOfPath(ReadSystemLink("/driver")), "nvidia");
+    std::filesystem::create_symlink("x", fTree.root() + "/short");
+    EXPECT_EQ(ReadSystemLink("/short"), "x");
     EXPECT_EQ(ReadSystemLink("/none"), "");
     EXPECT_EQ(LastOfPath("nvidia"), "nvidia");
     EXPECT_EQ(LastOfPath(""), "");

@@ -1,5 +1,7 @@
 #include "qgf/qgf_core/linux/NvidiaProc.h"
 
+#include <sstream>
+
 #include "qgf/SystemFiles.h"
 #include "qgf/qgf_core/linux/PciAddress.h"
 
@@ -13,18 +15,14 @@ const char kCards[] = "/proc/driver/nvidia/gpus";
 std::string NvidiaField(const std::string& information, const std::string& key)
 {
     const char* const blanks = " \t\r";
-    std::size_t begin = 0;
-    while (begin < information.size()) {
-        const std::size_t end = std::min(information.find('\n', begin), information.size());
-        if (information.compare(begin, key.size(), key) == 0 && begin + key.size() < end &&
-            information[begin + key.size()] == ':') {
-            const std::size_t first = information.find_first_not_of(blanks, begin + key.size() + 1);
-            if (first == std::string::npos || first >= end)
-                return std::string();
-            return information.substr(first,
-                                      information.find_last_not_of(blanks, end - 1) - first + 1);
-        }
-        begin = end + 1;
+    std::istringstream lines(information);
+    for (std::string line; std::getline(lines, line);) {
+        if (line.compare(0, key.size(), key) != 0 || line[key.size()] != ':')
+            continue;
+        const std::size_t first = line.find_first_not_of(blanks, key.size() + 1);
+        if (first == std::string::npos)
+            return std::string();
+        return line.substr(first, line.find_last_not_of(blanks) - first + 1);
     }
     return std::string();
 }

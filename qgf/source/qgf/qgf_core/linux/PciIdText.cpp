@@ -1,31 +1,29 @@
 #include "qgf/qgf_core/linux/PciIds.h"
 
+#include <cstdio>
 #include <string_view>
 
 namespace QGF {
 namespace {
 
-// The name in a line "xxxx  name"; empty if the line's id isn't `id`.
-std::string_view NameOf(std::string_view line, const char (&id)[5])
+// How a line with that id begins.
+std::string BeginningOf(std::uint16_t id)
 {
-    if (line.substr(0, 4) != std::string_view(id, 4) || line.size() < 6 || line[4] != ' ')
-        return std::string_view();
-    line.remove_prefix(line.find_first_not_of(' ', 4) == std::string_view::npos
-                           ? line.size()
-                           : line.find_first_not_of(' ', 4));
-    while (!line.empty() && (line.back() == ' ' || line.back() == '\r'))
-        line.remove_suffix(1);
-    return line;
+    char text[8];
+    std::snprintf(text, sizeof text, "%04x ", unsigned{id});
+    return text;
 }
 
-void WriteId(std::uint16_t id, char (&text)[5])
+// The name in a line "xxxx  name"; empty if the line begins otherwise.
+std::string_view NameOf(std::string_view line, std::string_view beginning)
 {
-    static const char kDigits[] = "0123456789abcdef";
-    for (int i = 3; i >= 0; --i) {
-        text[i] = kDigits[id & 0xF];
-        id = static_cast<std::uint16_t>(id >> 4);
-    }
-    text[4] = '\0';
+    const char* const blanks = " \r";
+    if (line.substr(0, beginning.size()) != beginning)
+        return std::string_view();
+    const std::size_t first = line.find_first_not_of(blanks, beginning.size());
+    if (first == std::string_view::npos)
+        return std::string_view();
+    return line.substr(first, line.find_last_not_of(blanks) - first + 1);
 }
 
 } // namespace
@@ -34,10 +32,8 @@ void WriteId(std::uint16_t id, char (&text)[5])
 // two; the lines of the device classes, at the end, start with "C ".
 std::string FindPciName(const std::string& database, std::uint16_t vendor, std::uint16_t device)
 {
-    char vendorId[5];
-    char deviceId[5];
-    WriteId(vendor, vendorId);
-    WriteId(device, deviceId);
+    const std::string ofVendor = BeginningOf(vendor);
+    const std::string ofDevice = BeginningOf(device);
     std::string_view vendorName;
     std::string_view rest = database;
     while (!rest.empty()) {
@@ -49,12 +45,12 @@ std::string FindPciName(const std::string& database, std::uint16_t vendor, std::
         if (line[0] != '\t') {
             if (!vendorName.empty())
                 break;
-            vendorName = NameOf(line, vendorId);
+            vendorName = NameOf(line, ofVendor);
             continue;
         }
-        if (vendorName.empty() || line.size() < 2 || line[1] == '\t')
+        if (vendorName.empty())
             continue;
-        const std::string_view deviceName = NameOf(line.substr(1), deviceId);
+        const std::string_view deviceName = NameOf(line.substr(1), ofDevice);
         if (!deviceName.empty())
             return std::string(vendorName).append(" ").append(deviceName);
     }

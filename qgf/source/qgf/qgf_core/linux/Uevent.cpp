@@ -8,8 +8,7 @@ std::string UeventValue(const std::string& uevent, const std::string& key)
 {
     std::istringstream lines(uevent);
     for (std::string line; std::getline(lines, line);)
-        if (line.size() > key.size() && line[key.size()] == '=' &&
-            line.compare(0, key.size(), key) == 0)
+        if (line.compare(0, key.size(), key) == 0 && line[key.size()] == '=')
             return line.substr(key.size() + 1);
     return std::string();
 }
