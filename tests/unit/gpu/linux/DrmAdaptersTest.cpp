@@ -25,12 +25,18 @@ TEST(DrmAdaptersTest, AModesSizeIsParsedFromItsName)
     EXPECT_TRUE(ParseModeSize("720x576i", width, height));
     EXPECT_EQ(width, 720U);
     EXPECT_EQ(height, 576U);
+    EXPECT_TRUE(ParseModeSize("65536x1", width, height));
+    EXPECT_EQ(width, 65536U);
+    EXPECT_EQ(height, 1U);
+    EXPECT_TRUE(ParseModeSize("1x65536", width, height));
+    EXPECT_EQ(height, 65536U);
 }
 
 TEST(DrmAdaptersTest, OtherTextsAreNotModes)
 {
     for (const char* mode : {"", "x", "1920", "1920x", "x1080", "0x1080", "1920x0", "-1x1", "1x-1",
-                             "65537x1", "1x65537", "99999999999x1", "1920x1080p", "1920 x 1080"}) {
+                             "65537x1", "1x65537", "99999999999x1", "1x99999999999", "1920x1080p",
+                             "1920 x 1080", "1920x1080ii", "a", "1x", "1xx1"}) {
         std::uint32_t width = 7;
         std::uint32_t height = 7;
         EXPECT_FALSE(ParseModeSize(mode, width, height)) << mode;

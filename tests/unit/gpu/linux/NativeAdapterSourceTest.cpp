@@ -189,6 +189,34 @@ TEST(NativeAdapterSourceTest, EachCallSucceeds)
     EXPECT_EQ(output->GetDesc(outputDescriptor), 0);
 }
 
+// What a source leaves out is 0.
+TEST(NativeAdapterSourceTest, DescriptorsBeginEmpty)
+{
+    const AdapterDescriptor adapter;
+    for (const std::uint32_t id :
+         {adapter.VendorId, adapter.DeviceId, adapter.SubSysId, adapter.Revision})
+        EXPECT_EQ(id, 0U);
+    for (const std::uint64_t bytes :
+         {adapter.DedicatedVideoMemory, adapter.DedicatedSystemMemory, adapter.SharedSystemMemory})
+        EXPECT_EQ(bytes, 0U);
+    const OutputDescriptor output;
+    const auto& place = output.DesktopCoordinates;
+    for (const std::int32_t number : {place.left, place.top, place.right, place.bottom,
+                                      output.AttachedToDesktop, output.Rotation})
+        EXPECT_EQ(number, 0);
+    EXPECT_EQ(PropertyValue().type, PropertyValue::kEmpty);
+    EXPECT_EQ(PropertyValue().integer, 0);
+}
+
+// As Windows numbers them.
+TEST(NativeAdapterSourceTest, TypesHaveTheNumbersOfVariants)
+{
+    EXPECT_EQ(PropertyValue::kEmpty, 0);
+    EXPECT_EQ(PropertyValue::kNull, 1);
+    EXPECT_EQ(PropertyValue::kInt32, 3);
+    EXPECT_EQ(PropertyValue::kString, 8);
+}
+
 // The names of the adapter's outputs; '*' marks those that are attached to the desktop.
 std::string Outputs(std::uint32_t index)
 {
