@@ -181,6 +181,16 @@ std::size_t SequenceReader::CountSteps(const DeviceTag& tag, const Device& devic
 
 std::string SequenceReader::GetNextKey() const
 {
+    return GetNext(true);
+}
+
+std::string SequenceReader::GetNextAnswerKey() const
+{
+    return GetNext(false);
+}
+
+std::string SequenceReader::GetNext(bool withTagLines) const
+{
     const std::vector<KnownKey>& keys = GetKnownKeys();
     if (!fLast)
         return keys.front().fKey;
@@ -198,8 +208,9 @@ std::string SequenceReader::GetNextKey() const
             if (!kind.Has(index))
                 continue;
             if (const auto line = FindNextLine(row, {*key.fKind, index}, device))
-                return *line < key.fTagLines.size() ? std::string(GetLineKey(key.fTagLines[*line]))
-                                                    : key.GetKey(MakeTag(*key.fKind, index));
+                return withTagLines && *line < key.fTagLines.size()
+                           ? std::string(GetLineKey(key.fTagLines[*line]))
+                           : key.GetKey(MakeTag(*key.fKind, index));
         }
     }
     return keys.back().fKey; // its line has come, but isn't whole

@@ -30,6 +30,9 @@ public:
     // without a tag, a device's key with its tag, or "gputag.NAME". Empty after a whole end stamp.
     std::string GetNextKey() const;
 
+    // The same with the device's key, and its tag, instead of "gputag.NAME" before its line.
+    std::string GetNextAnswerKey() const;
+
     // Whether a line has come that is printed after the key's line; for a device's key, after the
     // line of that device.
     bool HasPassed(const KnownKey& key, std::size_t device = 0) const;
@@ -73,6 +76,7 @@ private:
     bool HasFailed(const DeviceTag& tag, const Device& device) const;
     bool HasOpenCL() const;
     std::size_t CountSteps(const DeviceTag& tag, const Device& device) const;
+    std::string GetNext(bool withTagLines) const;
     std::optional<std::size_t> FindNextLine(std::size_t row, const DeviceTag& tag,
                                             const Device& device) const;
 

@@ -5,6 +5,9 @@
 #include "report/Activity.h"
 #include "report/Answers.h"
 #include "report/CopyClock.h"
+#include "report/LogFilter.h"
+#include "report/RunLog.h"
+#include "report/SequenceReader.h"
 
 namespace assay_host {
 
@@ -19,7 +22,12 @@ RunOutcome MakeOutcomeOfReport(const Report& report)
                                         next.empty() ? "" : " while " + GetActivityText(next));
     outcome.fDrivers.fReason = "they were not stored";
     CopyClock copies;
+    RunLog log;
+    SequenceReader sequence;
     for (const ReportLine& line : report.GetLines()) {
+        if (line.fKind == LineKind::kComment && IsLogLine(line.fText))
+            log.Add(GetLogText(line.fText), sequence, outcome);
+        sequence.Add(line);
         copies.Add(line);
         if (line.fKind == LineKind::kValue)
             outcome.fLastReportLine = line.fText;

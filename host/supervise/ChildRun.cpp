@@ -11,10 +11,9 @@
 #include "pmutil/ConsoleAppLauncher.h"
 #include "pmutil/OutputPump.h"
 #include "pmutil/StartAwareApp.h"
-#include "report/Causes.h"
 #include "report/LineForm.h"
-#include "report/LoadedFiles.h"
 #include "report/LogFilter.h"
+#include "report/RunLog.h"
 #include "supervise/ErrorLines.h"
 #include "supervise/EventQueue.h"
 #include "supervise/Judge.h"
@@ -77,17 +76,18 @@ public:
         if (fStop.IsRaised()) {
             fEvidence.fKillReason = KillReason::kInterrupt;
         } else if (Launch()) {
-            fOutcome.fDrivers.fReason =
-                fAddsLog ? "the child did not log them" : "the log of the child was not requested";
+            fOutcome.fDrivers.fReason = fOptions.fKeepCauses
+                                            ? "the child did not log them"
+                                            : "the log of the child was not requested";
             try {
                 fObserver.OnStart();
                 Follow();
+                Finish();
             } catch (...) {
                 KillDirectly();
                 fQueue->Close();
                 throw;
             }
-            Finish();
         }
         fOutcome.fLeftBehind = fLeftBehind;
         Judge(fEvidence, fOutcome);
@@ -109,6 +109,7 @@ private:
             NoteStartFailure(exc.what());
             if (fLauncher->HasLaunched())
                 KillDirectly(); // the launch failed after the child's start
+            fQueue->Close();    // an output may be read already
             fLeftBehind = !fContainment.EndAll(fTimes.fTreeSeconds);
             return false;
         }
@@ -219,19 +220,22 @@ private:
     void TakeLogLine(const std::string& text)
     {
         fObserver.OnLogLine(text, GetSeconds());
-        if (TakeLoadedFile(GetLogText(text), fOutcome.fDrivers))
-            return;
-        constexpr std::size_t kMaxCauses = 100;
-        std::string cause = FindCauseText(GetLogText(text));
-        if (!cause.empty() && fOutcome.fCauses.size() < kMaxCauses)
-            fOutcome.fCauses.push_back(
-                {fEvidence.fReport.GetSequence().GetNextKey(), std::move(cause)});
-        fEvidence.fReport.Add(ReadLine(text, "\n", false));
+        // A list of files doesn't name the call that comes next.
+        if (!ReadLogText(text))
+            fEvidence.fReport.Add(ReadLine(text, "\n", false));
+    }
+
+    bool ReadLogText(const std::string& line)
+    {
+        return fRunLog.Add(GetLogText(line), fEvidence.fReport.GetSequence(), fOutcome);
     }
 
     void TakeLines(const std::vector<ReportLine>& lines)
     {
         for (const ReportLine& line : lines) {
+            // The arguments may request a log, which is then a part of the report.
+            if (fOptions.fKeepCauses && line.fKind == LineKind::kComment && IsLogLine(line.fText))
+                ReadLogText(line.fText);
             fEvidence.fReport.Add(line);
             fObserver.OnLine(line, GetSeconds());
         }
@@ -307,6 +311,7 @@ private:
             TakePieces(fLog.Finish());
         TakeLines(fReader.Finish());
         TakeErrorLines(fErrorLines.Finish());
+        fRunLog.Finish(fOutcome);
         if (!fEnded)
             fOutcome.fSeconds = GetSeconds();
         try {
@@ -342,6 +347,7 @@ private:
 
     const bool fAddsLog = fOptions.fKeepCauses && !HasVerbosity(fOptions.fArgs);
     LogFilter fLog;
+    RunLog fRunLog;
     ReportReader fReader;
     ErrorLines fErrorLines;
     Evidence fEvidence;

@@ -7,6 +7,7 @@
 #include "pmutil/Options.h"
 #include "report/Activity.h"
 #include "report/LineForm.h"
+#include "report/RunLog.h"
 #include "supervise/ExitStatus.h"
 
 namespace assay_host {
@@ -136,12 +137,6 @@ void Judge(const Evidence& evidence, RunOutcome& outcome)
         outcome.fReason =
             fmt::format("assay crashed with {}{}.", outcome.fTermination, Where(evidence.fReport));
     }
-}
-
-bool IsFailureLine(const std::string& line)
-{
-    return StartsWith(line, "exception: ") || StartsWith(line, "QGF::LogicalException: ") ||
-           line == "unknown exception";
 }
 
 std::int32_t GetRequestedStatus(const std::vector<std::string>& options)

@@ -63,10 +63,6 @@ struct Evidence {
 // bounds of the outcome. Its command and its error lines must be set before.
 void Judge(const Evidence& evidence, RunOutcome& outcome);
 
-// Whether the line of standard error is the child's message of a failure: "exception: TEXT",
-// "QGF::LogicalException: TEXT" or "unknown exception".
-bool IsFailureLine(const std::string& line);
-
 // Returns the value of the last -exit= option as the child parses it; 0 without one.
 std::int32_t GetRequestedStatus(const std::vector<std::string>& options);
 

@@ -95,6 +95,7 @@ TEST(StoredRun, TheFirstSchemaHasNoFacts)
     EXPECT_TRUE(run.fFacts.fEnvironment.fTime.empty());
     EXPECT_EQ(run.fFacts.fEnvironment.fKernel.fReason, "the first schema has none");
     EXPECT_EQ(run.fFacts.fChildVersion.fReason, "the first schema has none");
+    EXPECT_EQ(run.fExtent, OutcomeExtent::kNoCauses);
     std::ostringstream again;
     WriteFirstDocument(again, run.fReport, run.fOutcome);
     EXPECT_EQ(again.str(), out.str());
@@ -119,6 +120,28 @@ TEST(StoredRun, EventsAreReadBackWhole)
     EXPECT_EQ(run.fOutcome.fReason, "The report is whole; how assay ended was not stored.");
     EXPECT_EQ(run.fOutcome.fCommand, outcome.fCommand);
     EXPECT_EQ(run.fFacts.fHostVersion, "1.2.3");
+    EXPECT_EQ(run.fExtent, OutcomeExtent::kNone);
+}
+
+TEST(StoredRun, EventsOfTheFirstSchemaHaveNoFacts)
+{
+    std::istringstream in(MakeFirstStartEvent({"assay"}) + MakeFirstEndEvent({}));
+    const StoredRun run = ReadEventsRun(in);
+    EXPECT_EQ(run.fFacts.fChildVersion.fReason, "the first schema has none");
+    EXPECT_EQ(run.fExtent, OutcomeExtent::kNoCauses);
+}
+
+TEST(StoredRun, AnEmptyReasonIsNone)
+{
+    const StoredRun run = {Report(), MakeFullOutcome(Verdict::kCrashed), MakeFacts()};
+    Json document = Json::parse(Write(run));
+    document["versions"]["assay"]["reason"] = "";
+    document["drivers"] = {{"known", false}, {"reason", ""}};
+    const StoredRun read = ReadRun(document.dump());
+    EXPECT_EQ(read.fFacts.fChildVersion.fReason, "no reason is given");
+    EXPECT_EQ(read.fOutcome.fDrivers.fReason, "no reason is given");
+    document["drivers"]["reason"] = "a reason";
+    EXPECT_EQ(ReadRun(document.dump()).fOutcome.fDrivers.fReason, "a reason");
 }
 
 TEST(StoredRun, OfAReportAlone)
@@ -134,6 +157,30 @@ TEST(StoredRun, OfAReportAlone)
                                "(glgpu[0].IsIntegratedGLGPU); how assay ended was not stored.");
     EXPECT_EQ(stopped.fLastReportLine, "glgpu[0].GLVersion=\"4.1\"");
     EXPECT_FALSE(stopped.fExitStatus);
+    EXPECT_TRUE(stopped.fLowerBounds.empty());
+    const std::string log = "# 00009.2026.11.22_10:00:00.000(+00.000)[tid=1] "
+                            "GPUImplHardware::checkBandwidthCL: ";
+    const RunOutcome measured = MakeOutcomeOfReport(
+        ReadReport(log + "0 of 100\n" + log + "seconds=0.1\nclgpu[0].CLBandwidth=1\n" +
+                   "assayEnd=\"2026-11-21_10:49:36\"\n"));
+    ASSERT_EQ(measured.fLowerBounds.size(), 1U);
+    EXPECT_EQ(measured.fLowerBounds[0].fKey, "clgpu[0].CLBandwidth");
+    EXPECT_EQ(measured.fReason, "The report stopped; how assay ended was not stored.");
+}
+
+// A report with the child's log.
+TEST(StoredRun, OfAReportWithItsLogHasWhatTheLogSays)
+{
+    const std::string log = "# 00009.2026.11.22_10:00:00.000(+00.000)[tid=1] ";
+    const RunOutcome outcome = MakeOutcomeOfReport(
+        ReadReport("QGFOGLInitialized=1\n" + log + "Cannot create default ContextOffscreen: x\n" +
+                   log + "driver files are logged\n" + log + "loaded for OpenGL: /lib/a.so\n" +
+                   "OGLContextCreated=0\n# Cannot create default ContextOffscreen: y\n"));
+    EXPECT_EQ(outcome.FindCause("OGLContextCreated"), "x");
+    EXPECT_EQ(outcome.fCauses.size(), 1U);
+    ASSERT_EQ(outcome.fDrivers.fFiles.size(), 1U);
+    EXPECT_EQ(outcome.fDrivers.fFiles[0].fPath, "/lib/a.so");
+    EXPECT_TRUE(outcome.fDrivers.IsKnown());
 }
 
 // What is wrong in a document, and how it is named.
@@ -166,6 +213,12 @@ TEST(StoredRun, NamesWhatIsWrong)
         {"/outcome/leftBehind", 0, "the document.outcome: \"leftBehind\" is not a bool"},
         {"/outcome/causes", 0, "the document.outcome: \"causes\" is not an array"},
         {"/outcome/causes/0/key", 0, "the document.outcome.causes: \"key\" is not a string"},
+        {"/outcome/causes/0/text", nullptr, "the document.outcome.causes: \"text\" is missing"},
+        {"/outcome/lowerBounds", 0, "the document.outcome: \"lowerBounds\" is not an array"},
+        {"/outcome/lowerBounds/0/key", 0,
+         "the document.outcome.lowerBounds: \"key\" is not a string"},
+        {"/outcome/lowerBounds/0/value", "1",
+         "the document.outcome.lowerBounds: \"value\" is not a number"},
         {"/drivers", 0, "the document: \"drivers\" is not an object"},
         {"/drivers/known", 1, "the document.drivers: \"known\" is not a bool"},
         {"/drivers/known", false, "the document.drivers: \"reason\" is missing"},

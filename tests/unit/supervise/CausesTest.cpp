@@ -60,6 +60,15 @@ TEST(Causes, AreTakenFromTheLogThatIsAskedFor)
     EXPECT_EQ(outcome.fCommand[1], "out"); // what was asked for
 }
 
+TEST(Causes, AreAtMostAHundred)
+{
+    std::vector<std::string> args;
+    for (int cause = 0; cause < 101; ++cause)
+        args.insert(args.end(), {"out", kFailure});
+    Lines lines;
+    EXPECT_EQ(RunWith(true, args, lines).fCauses.size(), 100U);
+}
+
 TEST(DriverFiles, AreTakenFromTheLogThatIsAskedFor)
 {
     Lines lines;
@@ -84,14 +93,26 @@ TEST(DriverFiles, AreUnknownWithoutTheirLog)
     Lines lines;
     EXPECT_EQ(RunWith(true, {"out", "NumGLGPUs=0"}, lines).fDrivers.fReason,
               "the child did not log them");
+    EXPECT_EQ(RunWith(true, {"-verbose=0"}, lines).fDrivers.fReason, "the child did not log them");
+    lines.fLines.clear();
     const std::string line = kPrefix + "loaded for OpenGL: /lib/libEGL.so.1";
-    for (const bool keepsCauses : {false, true}) {
-        lines.fLines.clear();
-        const RunOutcome outcome = RunWith(keepsCauses, {"-verbose=0x101", "out", line}, lines);
-        EXPECT_EQ(outcome.fDrivers.fReason, "the log of the child was not requested");
-        EXPECT_TRUE(outcome.fDrivers.fFiles.empty());
-        EXPECT_EQ(lines.fLines, std::vector<std::string>{line});
-    }
+    const RunOutcome outcome = RunWith(false, {"-verbose=0x101", "out", line}, lines);
+    EXPECT_EQ(outcome.fDrivers.fReason, "the log of the child was not requested");
+    EXPECT_TRUE(outcome.fDrivers.fFiles.empty());
+    EXPECT_EQ(lines.fLines, std::vector<std::string>{line});
+}
+
+// A log that the arguments ask for is read too, and stays in the report.
+TEST(DriverFiles, AreTakenFromTheLogOfTheArguments)
+{
+    const std::vector<std::string> log = {kPrefix + "driver files are logged",
+                                          kPrefix + "loaded for OpenGL: /lib/libEGL.so.1"};
+    Lines lines;
+    const RunOutcome outcome =
+        RunWith(true, {"-verbose=0x101", "out", log[0], "out", log[1]}, lines);
+    EXPECT_TRUE(outcome.fDrivers.IsKnown());
+    EXPECT_EQ(outcome.fDrivers.fFiles.size(), 1U);
+    EXPECT_EQ(lines.fLines, log);
 }
 
 TEST(Causes, AreLeftWhereNobodyAsks)
@@ -101,11 +122,26 @@ TEST(Causes, AreLeftWhereNobodyAsks)
     EXPECT_EQ(lines.fLines, std::vector<std::string>{kFailure});
 }
 
-TEST(Causes, AreLeftToArgumentsThatSetTheLog)
+TEST(Causes, AreTakenFromTheLogOfTheArguments)
 {
     Lines lines;
-    EXPECT_TRUE(RunWith(true, {"-verbose=1", "out", kFailure}, lines).fCauses.empty());
-    EXPECT_EQ(lines.fLines, std::vector<std::string>{kFailure});
+    const std::string noLog = "# Cannot create default ContextOffscreen: no prefix";
+    const RunOutcome outcome = RunWith(
+        true, {"-verbose=1", "out", "QGFOGLInitialized=1", "out", noLog, "out", kFailure}, lines);
+    EXPECT_EQ(outcome.FindCause("OGLContextCreated"), "eglGetError is not offered");
+    EXPECT_EQ(outcome.fCauses.size(), 1U);
+    EXPECT_EQ(lines.fLines, (std::vector<std::string>{"QGFOGLInitialized=1", noLog, kFailure}));
+}
+
+TEST(Causes, AreTakenFromStandardErrorForADeviceThatFailed)
+{
+    Lines lines;
+    const RunOutcome outcome =
+        RunWith(true,
+                {"err", "exception: out of memory", "out", "NumGLGPUs=1", "out",
+                 "glgpu[0].GLVersion=\"4\"", "out", kPrefix + "Testing terminated for glgpu[0]"},
+                lines);
+    EXPECT_EQ(outcome.FindCause("glgpu[0].IsIntegratedGLGPU"), "out of memory");
 }
 
 } // namespace

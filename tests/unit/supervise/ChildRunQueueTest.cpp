@@ -1,5 +1,6 @@
 // The end of a run whose child's output goes on: what still waits in the queue is taken, and who
 // brings more is kept no longer.
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <boost/make_shared.hpp>
@@ -11,8 +12,10 @@
 #include <functional>
 #include <optional>
 #include <stdexcept>
+#include <utility>
 #include <vector>
 
+#include "pmutil/PMLogging.h"
 #include "pmutil/Reader.h"
 #include "supervise/ChildRun.h"
 #include "supervise/Containment.h"
@@ -162,6 +165,55 @@ private:
     const boost::shared_ptr<pmutil::Launcher> fLauncher;
 };
 
+// Lets a launch fail after the child's start: the thread of standard error's task begins only once
+// the failure, that it never started, is thrown.
+class LateErrorTask : public pmutil::PMLogger {
+public:
+    LateErrorTask() : PMLogger("late error task") {}
+
+    void Write(const char* data, std::size_t size) override { fLine.append(data, size); }
+
+    void Flush() override
+    {
+        const std::string line = std::exchange(fLine, {});
+        const auto has = [&](const char* text) { return line.find(text) != std::string::npos; };
+        if (has("LaunchOutputThreadTask::operator()() fOutputChannel=stderr"))
+            AwaitFailure();
+        else if (has("OutputThreadTask spawned, use_count[stderr]"))
+            fNoWait.emplace();
+        else if (has("ThrowIfFailurePendingLocked throwing"))
+            NoteFailure();
+    }
+
+private:
+    // Others log meanwhile.
+    void AwaitFailure()
+    {
+        constexpr int kLocks = 2; // of a statement and of its logger
+        for (int lock = 0; lock < kLocks; ++lock)
+            pmutil::GetLogMutex().unlock();
+        {
+            boost::unique_lock<boost::mutex> lock(fMutex);
+            fCond.wait(lock, [this] { return fHasFailed; });
+        }
+        for (int lock = 0; lock < kLocks; ++lock)
+            pmutil::GetLogMutex().lock();
+    }
+
+    void NoteFailure()
+    {
+        const boost::lock_guard<boost::mutex> lock(fMutex);
+        fHasFailed = true;
+        fCond.notify_all();
+    }
+
+    std::string fLine;
+    std::optional<pmutil::NoShortWait> fNoWait;
+    boost::mutex fMutex;
+    boost::condition_variable fCond;
+    bool fHasFailed = false;
+};
+
 class ChildRunQueue : public testing::Test, public RunObserver {
 protected:
     ChildRunQueue()
@@ -288,6 +340,28 @@ TEST_F(ChildRunQueue, AnInterruptThatReachedTheChildFirstIsOne)
     EXPECT_EQ(Run().fVerdict, Verdict::kInterrupted);
 }
 
+TEST_F(ChildRunQueue, TicksOnceATickHasPassed)
+{
+    constexpr std::chrono::hours kTick{1};
+    fOptions.fTimeoutSeconds = 0;
+    fTimes.fTick = kTick;
+    for (const char* const line : {"first=1\n", "second=2\n", "third=3\n"})
+        fLauncher->fOut->Feed(line);
+    fOnLine = [&] {
+        if (fLines.size() == 1) {
+            fNow += kTick - std::chrono::nanoseconds(1);
+        } else if (fLines.size() == 2) {
+            EXPECT_FALSE(fHasTicked);
+            fNow += std::chrono::nanoseconds(1);
+        } else {
+            EXPECT_TRUE(fHasTicked);
+            fStop.Raise();
+        }
+    };
+    EXPECT_EQ(Run().fVerdict, Verdict::kInterrupted);
+    EXPECT_EQ(fLines.size(), 3U);
+}
+
 TEST_F(ChildRunQueue, EndsTheDescendantsOnceAndSaysWhatIsLeft)
 {
     fContainment.fLeavesNone = false;
@@ -333,6 +407,33 @@ TEST_F(ChildRunQueue, AnExceptionOfTheObserverEndsTheChildAndKeepsNobodyWaiting)
         EXPECT_STREQ(exc.what(), "no room");
     }
     EXPECT_EQ(fLauncher->CountKills(), 1);
+    EXPECT_TRUE(GoesOnReading());
+}
+
+TEST_F(ChildRunQueue, AnExceptionAfterTheChildKeepsNobodyWaiting)
+{
+    fLauncher->fOut->Feed("first=1\n");
+    fLauncher->fOut->Feed("second=2\n");
+    fOnLine = [this] {
+        if (fLines.size() == 2)
+            throw std::runtime_error("no room");
+        EXPECT_TRUE(fLauncher->fOut->AwaitAsked(3)) << "the second line is in the queue";
+        PassTheTimeout();
+    };
+    EXPECT_THROW(Run(), std::runtime_error);
+    EXPECT_EQ(fLines.size(), 2U);
+    EXPECT_TRUE(GoesOnReading());
+}
+
+TEST_F(ChildRunQueue, ALaunchThatFailsLateKeepsNobodyWaiting)
+{
+    new LateErrorTask; // never deleted: threads of the launch may still log
+    const pmutil::DebugValueSetter log("ConsoleAppLog", 1);
+    fOptions.fProgram = testing::internal::GetArgvs().front(); // any file that exists
+    const RunOutcome outcome = Run();
+    EXPECT_EQ(outcome.fVerdict, Verdict::kNeverStarted);
+    EXPECT_THAT(outcome.fReason, testing::HasSubstr("output task stderr never started"));
+    EXPECT_GE(fLauncher->CountKills(), 1);
     EXPECT_TRUE(GoesOnReading());
 }
 
