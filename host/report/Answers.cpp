@@ -182,6 +182,14 @@ std::string DeviceAnswers::GetValue(std::string_view key) const
     return line ? line->fValue : std::string();
 }
 
+const Answer* DeviceAnswers::FindFailed() const
+{
+    const auto answer = std::find_if(fAnswers.begin(), fAnswers.end(), [](const Answer& row) {
+        return row.fMissing == Missing::kDeviceFailed;
+    });
+    return answer == fAnswers.end() ? nullptr : &*answer;
+}
+
 Answers GetAnswers(const Report& report)
 {
     return Collector(report).Collect();

@@ -52,6 +52,10 @@ struct DeviceAnswers {
 
     // Returns the key's value; empty if it is missing.
     std::string GetValue(std::string_view key) const;
+
+    // Returns the first answer that is missing because a test of the device failed; null without
+    // one.
+    const Answer* FindFailed() const;
 };
 
 struct Answers {

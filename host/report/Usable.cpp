@@ -26,16 +26,24 @@ bool HasPart(std::string_view text, std::string_view part)
     return text.find(part) != std::string_view::npos;
 }
 
+bool EndsWith(std::string_view text, std::string_view end)
+{
+    return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
+}
+
 bool StartsWith(std::string_view text, std::string_view start)
 {
     return text.substr(0, start.size()) == start;
 }
 
+enum class TrialEnd { kPassed, kFailed, kUnreadable };
+
 // The result of one device's trials of the interface.
 struct DeviceTrial {
     const DeviceAnswers* fDevice;
-    const char* fFailure; // a reason; null if it passed
-    std::string fText;
+    TrialEnd fEnd = TrialEnd::kPassed;
+    const char* fReason = nullptr; // of a failure
+    std::string fText{};
 };
 
 class UsableJudge {
@@ -56,10 +64,8 @@ public:
             return Unknown(
                 "interrupted",
                 fmt::format("The run was interrupted before {} was tried.", GetKindName(fKind)));
-        if (fAnswers.fNext.empty() || HasPassed())
-            return Unknown("unreadable",
-                           fmt::format("Lines of the report about {} are missing or garbled.",
-                                       GetKindName(fKind)));
+        if (HasPassed())
+            return Unreadable();
         if (FindStop() != fKind)
             return Unknown("ended-before",
                            fmt::format("The run ended before {} was tried.", GetKindName(fKind)));
@@ -130,6 +136,8 @@ private:
 
     Usable JudgeStop() const
     {
+        if (fOutcome.fExitStatus && fOutcome.fLostOutputBytes > 0)
+            return Unreadable(); // the report went on
         const auto tag = GetDeviceTag(fAnswers.fNext);
         const std::string device(tag ? *tag : "");
         const std::string where = GetActivityText(fAnswers.fNext);
@@ -157,18 +165,26 @@ private:
             return JudgeNoDevice();
         const DeviceTrial* software = nullptr;
         const DeviceTrial* failed = nullptr;
+        bool isUnreadable = false;
         for (const DeviceTrial& trial : trials) {
+            if (trial.fEnd == TrialEnd::kUnreadable) {
+                isUnreadable = true;
+                continue;
+            }
             const bool isSoftware = !FindSoftwareText(*trial.fDevice).empty();
-            if (!trial.fFailure && !isSoftware)
+            const bool hasPassed = trial.fEnd == TrialEnd::kPassed;
+            if (hasPassed && !isSoftware)
                 return {Usability::kHardware, "trials-passed",
                         fmt::format("{} works on graphics hardware.", GetKindName(fKind)),
                         trial.fDevice->fTag};
-            const DeviceTrial*& first = trial.fFailure ? failed : software;
+            const DeviceTrial*& first = hasPassed ? software : failed;
             if (!first)
                 first = &trial;
         }
+        if (isUnreadable)
+            return Unreadable();
         if (!software)
-            return {Usability::kBroken, failed->fFailure,
+            return {Usability::kBroken, failed->fReason,
                     fmt::format("{} does not work: {}.", GetKindName(fKind), failed->fText),
                     failed->fDevice->fTag};
         return {Usability::kSoftware, failed ? "others-failed" : "only-software",
@@ -184,11 +200,22 @@ private:
                 return MakeFailure(device, trial.fCode, trial.fText, trial.fKey);
         // A test after the last trial only describes the device; its failure doesn't matter.
         const char* const last = fKind == DeviceKind::kOpenGL ? "GLFrameBufferOK" : "CLCompute";
-        if (!device.Find(last))
-            return device.fFailed
-                       ? MakeFailure(device, "device-failed", "a test failed", last)
-                       : MakeFailure(device, "no-trial", "its trials have no answer", last);
-        return {&device, nullptr, {}};
+        if (device.Find(last))
+            return {&device, LacksATrial(device) ? TrialEnd::kUnreadable : TrialEnd::kPassed};
+        if (fOutcome.fVerdict == Verdict::kComplete && fOutcome.fExitStatus)
+            return {&device, TrialEnd::kUnreadable}; // the child says that no test failed
+        const Answer* const failed = device.FindFailed();
+        if (failed)
+            return MakeFailure(device, "device-failed", "a test failed", failed->fKey);
+        return MakeFailure(device, "no-trial", "its trials have no answer", last);
+    }
+
+    static bool LacksATrial(const DeviceAnswers& device)
+    {
+        return std::any_of(
+            device.fAnswers.begin(), device.fAnswers.end(), [](const Answer& answer) {
+                return answer.fMissing == Missing::kUnreadable && IsTrial(answer.fKey);
+            });
     }
 
     Usable JudgeNoDevice() const
@@ -196,13 +223,16 @@ private:
         const char* const name = GetKindName(fKind);
         if (fKind == DeviceKind::kOpenCL) {
             if (Get(GetCountKey(fKind)).fMissing == Missing::kNoOpenCL)
-                return {Usability::kAbsent, "no-library", "There is no OpenCL library.", {}};
+                return {Usability::kAbsent,
+                        "no-library",
+                        "There is no OpenCL library that can be used.",
+                        {}};
             return {Usability::kAbsent,
                     "no-device",
                     "There is an OpenCL library, but it has no graphics device.",
                     {}};
         }
-        if (std::count(fOutcome.fErrorLines.begin(), fOutcome.fErrorLines.end(), kContextFailure))
+        if (HasContextFailure())
             return {Usability::kBroken,
                     "context-failed",
                     "No OpenGL context could be created on any display device" +
@@ -221,6 +251,15 @@ private:
         return {Usability::kAbsent, "no-device", fmt::format("{} has no device.", name), {}};
     }
 
+    // A driver may have written to standard error too: before the line, or so much that it is lost.
+    bool HasContextFailure() const
+    {
+        const auto& lines = fOutcome.fErrorLines;
+        return std::any_of(lines.begin(), lines.end(),
+                           [](std::string_view line) { return EndsWith(line, kContextFailure); }) ||
+               (Is("QGFOGLInitialized", "1") && !fOutcome.FindCause("OGLContextCreated").empty());
+    }
+
     // Returns ": CAUSE", or nothing.
     std::string GetCauseText(const std::string& key) const
     {
@@ -229,10 +268,17 @@ private:
     }
 
     DeviceTrial MakeFailure(const DeviceAnswers& device, const char* reason, const char* text,
-                            const char* key) const
+                            const std::string& key) const
     {
-        return {&device, reason,
+        return {&device, TrialEnd::kFailed, reason,
                 fmt::format("{}: {}{}", device.fTag, text, GetCauseText(device.fTag + "." + key))};
+    }
+
+    Usable Unreadable() const
+    {
+        return Unknown("unreadable",
+                       fmt::format("Lines of the report about {} are missing or garbled.",
+                                   GetKindName(fKind)));
     }
 
     static Usable Unknown(const char* reason, std::string text)

@@ -81,11 +81,8 @@ void WarnOfFailure(Warnings& warnings, const DeviceAnswers& device, const RunOut
 {
     if (!device.fFailed)
         return;
-    const auto failed =
-        std::find_if(device.fAnswers.begin(), device.fAnswers.end(), [](const Answer& answer) {
-            return answer.fMissing == Missing::kDeviceFailed;
-        });
-    if (failed == device.fAnswers.end())
+    const Answer* const failed = device.FindFailed();
+    if (!failed)
         warnings.push_back({"device-failed", device.fTag, "a test failed"});
     else
         warnings.push_back({"device-failed", device.fTag,

@@ -90,6 +90,17 @@ FAILURES = {
                             opencl=BEFORE),
     "driver exits with 0": Failure(gl="at glLinkProgram _exit 0\n", opengl=ended("glgpu[0]"),
                                    opencl=BEFORE),
+    # A driver that writes to the child's streams
+    "words before lines of the report": Failure(gl='at eglMakeCurrent print 1 "x"\n',
+                                                opengl=("unknown", "unreadable", None)),
+    "words before the failure of the contexts": Failure(
+        gl='at eglInitialize print 2 "x"\nat eglCreateContext error EGL_BAD_ALLOC\n',
+        opengl=("broken", "context-failed", None)),
+    "flood before the failure of the contexts": Failure(
+        gl="at 1 eglInitialize flood 2 20000 100\nat eglCreateContext error EGL_BAD_ALLOC\n",
+        opengl=("broken", "context-failed", None)),
+    "flood in the linker": Failure(gl="at 1 glLinkProgram flood 1 100000 1000\n",
+                                   opengl=("unknown", "unreadable", None), opencl=BEFORE),
     # A renderer that is none
     "software renderer": Failure(gl='string GL_RENDERER "llvmpipe (LLVM 15.0.6, 256 bits)"\n',
                                  opengl=("software", "only-software", "glgpu[0]")),
@@ -109,6 +120,8 @@ FAILURES = {
     "abort in the compiler": Failure(cl="at clBuildProgram abort\n", opencl=crashed("clgpu[0]")),
     "hang in the kernel": Failure(cl="at clWaitForEvents hang\n",
                                   opencl=("broken", "hung", "clgpu[0]")),
+    "no OpenCL context": Failure(cl="at clCreateContext error CL_OUT_OF_RESOURCES\n",
+                                 opencl=("broken", "device-failed", "clgpu[0]")),
     "no OpenCL buffer": Failure(cl="at clCreateBuffer error CL_OUT_OF_RESOURCES\n",
                                 opencl=("broken", "device-failed", "clgpu[0]")),
     "kernel does not compile": Failure(cl="at clBuildProgram error CL_BUILD_PROGRAM_FAILURE\n",
@@ -212,6 +225,11 @@ CAUSES = {
     "shader does not compile": ("glgpu[0].CanCompileProgramGLSL", "no"),
     "framebuffer is not complete": ("glgpu[0].GLFrameBufferOK", "The framebuffer is not complete"),
     "query fails before the trials": ("glgpu[0].GLVendor", "glGetError() returns 1282"),
+    "query fails after the trials": ("glgpu[0].glGetIntegerv[GL_MAX_DRAW_BUFFERS]",
+                                     "glGetError() returns 1282"),
+    "exception in a query": ("glgpu[0].GLRenderer", "x"),
+    "no OpenCL context": ("clgpu[0].CLBandwidth", "clCreateContext failed: CL_OUT_OF_RESOURCES (-5)"),
+    "kernel does not compile": ("clgpu[0].CLCompute", "Failed requirement: ciErrNum == CL_SUCCESS"),
 }
 
 
@@ -228,10 +246,12 @@ def test_the_cause_reaches_the_reader(tmp_path, name):
     assert {line["kind"] for line in document["lines"]} == {"value"}
     shown = " ".join(run(tmp_path, FAILURES[name]).text.split())
     assert text in shown
-    # One who asks for the log, or for none, gets that.
+    # One who asks for the log, or for none, gets that. The answers are the same.
     loud = Failure(**{**FAILURES[name].__dict__, "child": ("-verbose=1",)})
-    document = validate_document(run(tmp_path, loud, "--format", "json").out)
-    assert {line["kind"] for line in document["lines"]} == {"value", "comment"}
+    asked = validate_document(run(tmp_path, loud, "--format", "json").out)
+    assert {line["kind"] for line in asked["lines"]} == {"value", "comment"}
+    assert asked["outcome"]["causes"] == document["outcome"]["causes"]
+    assert asked["usable"] == document["usable"]
     silent = Failure(**{**FAILURES[name].__dict__, "child": ("-verbose=0",)})
     document = validate_document(run(tmp_path, silent, "--format", "json").out)
     assert document["outcome"]["causes"] == []

@@ -78,6 +78,26 @@ TEST(Answers, NameNoFailureOfADeviceWithoutCUDA)
     const Report nameless = ReadReport(Sample(0, 1).Set("clgpu[0].CUDAVersion", "").GetText());
     EXPECT_EQ(Show(GetAnswers(nameless), "clgpu[0]", "CUDAVersion"),
               "- not printed by this device");
+    const Report ended = ReadReport(Sample(0, 1)
+                                        .Set("clgpu[0].CUDASupported", "0")
+                                        .EndAfter("clgpu[0].CUDASupported")
+                                        .GetText());
+    EXPECT_EQ(Show(GetAnswers(ended), "clgpu[0]", "CUDAVersion"), "- not printed by this device");
+    EXPECT_EQ(Show(GetAnswers(ended), "clgpu[0]", "CLBandwidth"), "- run ended before");
+    EXPECT_STREQ(GetMissingText(Missing::kNot), "");
+}
+
+TEST(Answers, HaveTheLowerBoundsOfTheOutcome)
+{
+    RunOutcome outcome;
+    outcome.fLowerBounds = {{"clgpu[1].CLBandwidth", 5}};
+    const Report report = ReadReport(Sample(0, 2).GetText() + "clgpu[1].Extra=1\n");
+    const Answers answers = GetAnswers(report, outcome);
+    for (const DeviceAnswers& device : answers.fDevices)
+        for (const Answer& answer : device.fAnswers)
+            EXPECT_EQ(answer.fLowerBound,
+                      device.fTag + "." + answer.fKey == "clgpu[1].CLBandwidth" ? 5 : 0)
+                << answer.fKey;
 }
 
 TEST(Answers, NameTheFailedDevices)

@@ -113,6 +113,65 @@ TEST(Usable, IsBrokenWhereNoContextCouldBeCreated)
     EXPECT_EQ(Judge(Sample(1, 0).GetText(), outcome).fGL, kGood);
 }
 
+// The child's line may come after bytes of the driver, or be lost among them.
+TEST(Usable, IsBrokenWithoutAContextThoughTheDriverWritesToStandardErrorToo)
+{
+    const std::string report = Sample(0, 0).Set("OGLContextCreated", "0").GetText();
+    RunOutcome outcome;
+    outcome.fErrorLines = {"warnContextOffscreen exception caught and ignored."};
+    EXPECT_EQ(Judge(report, outcome).fGL, "broken context-failed");
+    outcome.fErrorLines = {"ContextOffscreen exception caught and ignored. No"};
+    EXPECT_EQ(Judge(report, outcome).fGL, "absent no-device");
+    outcome.fCauses = {{"OGLContextCreated", "out of memory"}};
+    EXPECT_EQ(Judge(report, outcome).fGL, "broken context-failed");
+    const std::string without =
+        Sample(0, 0).Set("QGFOGLInitialized", "0").Set("OGLContextCreated", "0").GetText();
+    EXPECT_EQ(Judge(without, outcome).fGL, "absent no-device");
+}
+
+// A child that ended as it should says that no test failed, so that missing lines are lost ones.
+TEST(Usable, IsUnknownWhereLinesOfTheTrialsAreLost)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = Verdict::kComplete;
+    outcome.fExitStatus = 0;
+    const std::string unreadable = "unknown unreadable";
+    const std::string lost =
+        Sample(1, 1).Fail("glgpu[0]", "GLVendor").Fail("clgpu[0]", "CLBandwidth").GetText();
+    EXPECT_EQ(Judge(lost, outcome), (Both{unreadable, unreadable}));
+    EXPECT_EQ(Judge(Sample(1, 0).Set("glgpu[0].GLFrameBufferOK", "").GetText(), outcome).fGL,
+              unreadable);
+    EXPECT_EQ(Judge(Sample(1, 0).Set("glgpu[0].CanCompileProgramGLSL", "").GetText(), outcome).fGL,
+              unreadable);
+    EXPECT_EQ(Judge(Sample(2, 0).Fail("glgpu[0]", "GLVendor").GetText(), outcome).fGL,
+              "hardware trials-passed glgpu[1]");
+    Sample software =
+        Sample(2, 0).Set("glgpu[1].GLRenderer", "\"softpipe\"").Fail("glgpu[0]", "GLVendor");
+    EXPECT_EQ(Judge(software.GetText(), outcome).fGL, unreadable);
+    outcome.fExitStatus.reset(); // as after the end of a stored report
+    EXPECT_EQ(Judge(lost, outcome),
+              (Both{"broken device-failed glgpu[0]", "broken device-failed clgpu[0]"}));
+    outcome.fVerdict = Verdict::kFailedTests;
+    outcome.fExitStatus = 2;
+    EXPECT_EQ(Judge(lost, outcome),
+              (Both{"broken device-failed glgpu[0]", "broken device-failed clgpu[0]"}));
+}
+
+// The report of a child that ended by itself stops where the limit of its output was reached.
+TEST(Usable, IsUnknownWhereTheReportWasDropped)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = Verdict::kFailedTests;
+    outcome.fExitStatus = 0;
+    const std::string text = Sample(1, 1).EndAfter("glgpu[0].GLVendor").GetText();
+    EXPECT_EQ(Judge(text, outcome).fGL, "broken ended glgpu[0]");
+    outcome.fLostOutputBytes = 1;
+    EXPECT_EQ(Judge(text, outcome), (Both{"unknown unreadable", "unknown ended-before"}));
+    outcome.fVerdict = Verdict::kCrashed;
+    outcome.fExitStatus.reset();
+    EXPECT_EQ(Judge(text, outcome).fGL, "broken crashed glgpu[0]");
+}
+
 TEST(Usable, IsAbsentWithoutALibraryOrADevice)
 {
     EXPECT_EQ(Judge(Sample(0, 0)), (Both{"absent no-device", "absent no-device"}));
@@ -122,6 +181,10 @@ TEST(Usable, IsAbsentWithoutALibraryOrADevice)
         outcome.fCauses = {{"QGFOGLInitialized", cause}};
         return Judge(Sample(0, 0).Set("QGFOGLInitialized", "0").GetText(), outcome).fGL;
     };
+    EXPECT_EQ(Judge(Sample(0, 0).Set("QGFOGLInitialized", "")).fGL, "absent no-device");
+    RunOutcome other;
+    other.fCauses = {{"QGFOGLInitialized", "libEGL.so.1 can't be opened"}};
+    EXPECT_EQ(Judge(Sample(0, 0).GetText(), other).fGL, "absent no-device");
     EXPECT_EQ(judge("libEGL.so.1 can't be opened (x)"), "absent no-library");
     EXPECT_EQ(judge("OpenGL has no display device on this machine"), "absent no-device");
     EXPECT_EQ(judge("eglGetError is not offered by this EGL library"), "broken library-failed");
@@ -168,6 +231,11 @@ TEST(Usable, BlamesTheInterfaceOfADeviceThatIsGivenBack)
         Sample(1, 1).Fail("glgpu[0]", "GLVendor").EndAfter("glgpu[0].GLName").GetText();
     EXPECT_EQ(Judge(text + "# x Testing terminated for glgpu[0]\n", outcome),
               (Both{"broken crashed", "unknown ended-before"}));
+    outcome.fLastLogLine = "# 00013.x[tid=1] Testing terminated for clgpu[0]";
+    EXPECT_EQ(Judge(Sample(1, 1).EndAfter("clgpu[0].CLBandwidth").GetText() +
+                        "# x Testing terminated for clgpu[0]\n",
+                    outcome),
+              (Both{kGood, "broken crashed"}));
 }
 
 TEST(Usable, IsUnknownWhereTheRunSaysNothing)
