@@ -40,16 +40,18 @@ std::int64_t GetMilliseconds(std::string_view line)
 
 void CopyClock::Add(const ReportLine& line)
 {
-    if (line.fKind == LineKind::kComment && IsLogLine(line.fText)) {
+    if (line.fKind == LineKind::kComment && IsLogLine(line.fText))
         AddLogText(GetLogText(line.fText), GetMilliseconds(line.fText));
-        return;
-    }
-    if (line.fKind != LineKind::kValue || !EndsWith(line.fKey, kKey))
-        return;
+    else if (line.fKind == LineKind::kValue && EndsWith(line.fKey, kKey))
+        AddResult(line.fKey);
+}
+
+void CopyClock::AddResult(const std::string& key)
+{
     if (fBatches > 0) {
         const std::int64_t passed = fEnd - *fStart + (fEnd < *fStart ? kDay : 0);
         const double seconds = static_cast<double>(passed + 1) / 1000;
-        fBounds.push_back({line.fKey, fBatches * kBatchBytes / seconds});
+        fBounds.push_back({key, fBatches * kBatchBytes / seconds});
     }
     fStart.reset();
     fBatches = 0;

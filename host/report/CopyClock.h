@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <string>
 #include <string_view>
 #include <vector>
 
@@ -27,6 +28,7 @@ public:
     const std::vector<LowerBound>& GetBounds() const { return fBounds; }
 
 private:
+    void AddResult(const std::string& key);
     void AddLogText(std::string_view text, std::int64_t time);
 
     std::optional<std::int64_t> fStart; // of the first batch, in milliseconds of the day

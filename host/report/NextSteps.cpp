@@ -11,8 +11,6 @@ namespace assay_host {
 
 namespace {
 
-constexpr char kShowCalls[] =
-    "Run again with -- -verbose=1 after the other options: the log then names the driver's calls.";
 constexpr char kReportIt[] =
     "If the newest driver fails too, report it to the driver's developers, with the archive of "
     "assay-host bugreport.";
@@ -67,7 +65,6 @@ void AddForUsable(StepList& steps, DeviceKind kind, const Usable& usable)
         break;
     case Usability::kBroken:
         steps.Add("Update the graphics driver, or reinstall it.");
-        steps.Add(kShowCalls);
         steps.Add(kReportIt);
         break;
     case Usability::kAbsent:
@@ -92,7 +89,7 @@ std::vector<std::string> GetNextSteps(const Answers& answers, const RunOutcome& 
     for (const DeviceKind kind : {DeviceKind::kOpenGL, DeviceKind::kOpenCL})
         AddForUsable(steps, kind, JudgeUsable(kind, answers, outcome));
     if (outcome.fVerdict == Verdict::kCrashed || outcome.fVerdict == Verdict::kFailedTests)
-        steps.Add(kShowCalls);
+        steps.Add(kReportIt);
     return steps.Take();
 }
 

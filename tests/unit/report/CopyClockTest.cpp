@@ -72,6 +72,14 @@ TEST(CopyClock, TimesEachDevice)
     ASSERT_EQ(bounds.size(), 2U);
     EXPECT_DOUBLE_EQ(bounds[0].fValue, kBatch);
     EXPECT_DOUBLE_EQ(bounds[1].fValue, kBatch / 2);
+    EXPECT_EQ(GetBounds(first + "clgpu[0].CLBandwidth=1\n" + Log("10:00:04.000", kEnd) +
+                        "clgpu[1].CLBandwidth=2\n")
+                  .size(),
+              1U);
+    // A line in between is of another test.
+    EXPECT_DOUBLE_EQ(GetBound(Log("10:00:00.000", kStart) + "clgpu[1].CLCompute=1\n" +
+                              Log("10:00:00.999", kEnd) + "clgpu[0].CLBandwidth=1\n"),
+                     kBatch);
     // The first device fails.
     EXPECT_DOUBLE_EQ(GetBound(first + second + "clgpu[1].CLBandwidth=2\n"), kBatch / 2);
 }
@@ -83,6 +91,9 @@ TEST(CopyClock, HasNoBoundWithoutAWholeBatch)
          {std::string(), Log("10:00:00.000", kStart), Log("10:00:00.000", kEnd),
           "# 00009 " + std::string(kStart) + "\n# 00009 " + kEnd + "\n",
           Log("10:00:00.000", kStart) + Log("10:00:00.001", "x seconds=1"),
+          Log("10:00:00.000", kStart) +
+              Log("10:00:00.001", "GPUImplHardware::checkBandwidthXY: seconds=1"),
+          std::string("#\n# short\n"),
           Log("10:00:00.000", kStart) + Log("10:00:00.001", kEnd) + "clgpu[0].CLBandwidth=1\n"})
         EXPECT_EQ(GetBounds(log + value).size(),
                   log.find("CLBandwidth=") == std::string::npos ? 0U : 1U)

@@ -10,8 +10,6 @@
 namespace assay_host {
 namespace {
 
-constexpr char kCalls[] =
-    "Run again with -- -verbose=1 after the other options: the log then names the driver's calls.";
 constexpr char kUpdate[] = "Update the graphics driver, or reinstall it.";
 constexpr char kReport[] = "If the newest driver fails too, report it to the driver's developers, "
                            "with the archive of assay-host bugreport.";
@@ -39,22 +37,39 @@ TEST(NextSteps, AreNotRepeated)
                                  .Set("glgpu[0].GLFrameBufferOK", "0")
                                  .Fail("clgpu[0]", "CLDeviceVersion")
                                  .GetText();
-    EXPECT_EQ(Get(text, Verdict::kFailedTests), (Steps{kUpdate, kCalls, kReport}));
+    EXPECT_EQ(Get(text, Verdict::kFailedTests), (Steps{kUpdate, kReport}));
 }
 
 TEST(NextSteps, OfEachVerdict)
 {
     const std::string broken = Sample(1, 1).EndAfter("glgpu[0].GLVersion").GetText();
-    EXPECT_EQ(Get(broken, Verdict::kCrashed), (Steps{kUpdate, kCalls, kReport}));
+    EXPECT_EQ(Get(broken, Verdict::kCrashed), (Steps{kUpdate, kReport}));
     EXPECT_EQ(Get(broken, Verdict::kHung),
               (Steps{"If the machine is slow or busy, run again with a longer --timeout.", kUpdate,
-                     kCalls, kReport}));
+                     kReport}));
     EXPECT_EQ(Get("", Verdict::kNeverStarted),
               (Steps{"Check that assay is installed beside assay-host or on the PATH, or name it "
                      "with --assay."}));
     EXPECT_EQ(Get("", Verdict::kUsageError),
               (Steps{"Correct assay's options, those after \"--\"; assay -help lists them."}));
     EXPECT_EQ(Get("", Verdict::kInterrupted), (Steps{"Run again, and let the run end by itself."}));
+}
+
+TEST(NextSteps, OfARunThatFailsAfterTheTrials)
+{
+    const std::string usable = Sample(1, 1).GetText();
+    EXPECT_EQ(Get(usable, Verdict::kFailedTests), Steps{kReport});
+    EXPECT_EQ(Get(usable, Verdict::kCrashed), Steps{kReport});
+}
+
+TEST(NextSteps, ForNoLibrary)
+{
+    RunOutcome outcome;
+    outcome.fVerdict = Verdict::kComplete;
+    outcome.fCauses = {{"QGFOGLInitialized", "libEGL.so.1 can't be opened (x)"}};
+    const Report report = ReadReport(Sample(0, -1).Set("QGFOGLInitialized", "0").GetText());
+    EXPECT_EQ(GetNextSteps(GetAnswers(report), outcome),
+              (Steps{"Install an OpenGL library and the graphics card's driver."}));
 }
 
 TEST(NextSteps, ForSoftwareAndForNoDevice)
