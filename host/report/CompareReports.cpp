@@ -64,11 +64,6 @@ DiffGroup GetGroup(const Answer& answer)
     return isCount ? DiffGroup::kDevices : DiffGroup::kFacts;
 }
 
-std::optional<std::string> GetIf(bool isThere, std::string_view text)
-{
-    return isThere ? std::optional<std::string>(text) : std::nullopt;
-}
-
 std::string GetEndText(const Report& report, const Answers& answers)
 {
     if (report.IsWhole())
@@ -222,7 +217,7 @@ void Comparer::CompareTests(const DevicePair& pair, const Unanswered& unanswered
         return;
     std::string before = GetTestsText(*pair.fBefore);
     std::string after = GetTestsText(*pair.fAfter);
-    if (before != after || unanswered.HasAny())
+    if (before != after)
         AddText(DiffGroup::kTrials, "tests", std::move(before), std::move(after),
                 unanswered.GetText(), pair);
 }
@@ -312,11 +307,11 @@ void Comparer::CompareRawLines()
     };
     count(fReportBefore, -1);
     count(fReportAfter, 1);
-    for (const auto& [text, weight] : counts) {
-        if (weight != 0)
-            AddText(DiffGroup::kOthers, "line", GetIf(weight < 0, text), GetIf(weight > 0, text),
-                    {});
-    }
+    for (const auto& [text, weight] : counts)
+        if (weight < 0)
+            AddText(DiffGroup::kOthers, "line", std::string(text), {}, {});
+        else if (weight > 0)
+            AddText(DiffGroup::kOthers, "line", {}, std::string(text), {});
 }
 
 } // namespace

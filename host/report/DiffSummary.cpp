@@ -96,10 +96,10 @@ bool IsWorse(const Difference& difference)
     return rank(*difference.fAfter) < rank(*difference.fBefore);
 }
 
+// A measurement is a known key of a device, for which both devices have an answer.
 bool IsSlower(const Difference& difference)
 {
-    if (difference.fGroup != DiffGroup::kMeasurements || !difference.fAnswerBefore ||
-        !difference.fAnswerAfter || !difference.fAnswerBefore->IsKnown() ||
+    if (difference.fGroup != DiffGroup::kMeasurements || !difference.fAnswerBefore->IsKnown() ||
         !difference.fAnswerAfter->IsKnown())
         return false;
     const auto before = ReadDouble(difference.fAnswerBefore->fLine->fValue);
@@ -147,7 +147,7 @@ std::string GetDiffHeadline(const Comparison& comparison)
     const Differences& differences = comparison.fDifferences;
     if (differences.empty())
         return "The reports do not differ.";
-    const std::string usable = GetGroupSentence(differences, DiffGroup::kUsable);
+    std::string usable = GetGroupSentence(differences, DiffGroup::kUsable);
     if (!usable.empty())
         return usable;
     if (differences.front().fKey == "verdict")

@@ -30,7 +30,6 @@ std::string EncodeBytes(const std::string& bytes)
     if (IsPlain(bytes))
         return bytes;
     std::string text;
-    text.reserve(bytes.size());
     std::string_view rest = bytes;
     while (!rest.empty()) {
         const Character character = ReadCharacter(rest);
@@ -50,12 +49,11 @@ std::string DecodeBytes(const std::string& text)
     if (IsPlain(text))
         return text;
     std::string bytes;
-    bytes.reserve(text.size());
     std::string_view rest = text;
     while (!rest.empty()) {
         const Character character = ReadCharacter(rest);
         const std::size_t size = std::max<std::size_t>(character.fSize, 1);
-        if (character.fSize > 0 && IsByteCharacter(character.fCode))
+        if (IsByteCharacter(character.fCode))
             bytes += static_cast<char>(character.fCode - kByteBase);
         else
             bytes += rest.substr(0, size);

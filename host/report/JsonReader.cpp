@@ -1,5 +1,6 @@
 #include "report/JsonReader.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <functional>
 #include <iterator>
@@ -51,7 +52,8 @@ ReportLine ReadJsonLine(const Json& json, const std::string& where)
 void CheckSchema(const Json& json, const std::string& where)
 {
     const Json& schema = GetMember(json, where, "schema", &Json::is_number_integer, "an integer");
-    if (schema != kSchemaVersion && schema != kFirstSchemaVersion)
+    constexpr int kReadable[] = {kFirstSchemaVersion, kSchemaVersion};
+    if (std::find(std::begin(kReadable), std::end(kReadable), schema) == std::end(kReadable))
         throw std::runtime_error(fmt::format("{}: \"schema\" is {}, and only {} and {} can be read",
                                              where, schema.dump(), kFirstSchemaVersion,
                                              kSchemaVersion));

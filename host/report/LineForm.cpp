@@ -112,7 +112,7 @@ std::optional<DeviceTag> ReadDeviceTag(std::string_view text)
         if (!StartsWith(text, word))
             continue;
         const std::string_view brackets = text.substr(word.size());
-        if (brackets.size() < 3 || brackets.front() != '[' || brackets.back() != ']')
+        if (brackets.empty() || brackets.front() != '[' || brackets.back() != ']')
             return std::nullopt;
         const std::string_view index = brackets.substr(1, brackets.size() - 2);
         if (!IsIndex(index))

@@ -92,7 +92,7 @@ std::optional<Number> ReadNumber(std::string_view text)
 
 std::optional<std::vector<Number>> ReadNumberList(std::string_view text)
 {
-    if (text.size() < 2 || text.front() != '[' || text.back() != ']')
+    if (text.empty() || text.front() != '[' || text.back() != ']')
         return std::nullopt;
     text = text.substr(1, text.size() - 2);
     std::vector<Number> numbers;

@@ -111,7 +111,6 @@ std::optional<std::string> GetFormText(ValueForm form, std::string_view value)
 {
     switch (form) {
     case ValueForm::kText:
-        break;
     case ValueForm::kAdapter:
         break;
     case ValueForm::kDate:

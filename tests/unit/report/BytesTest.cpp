@@ -48,6 +48,27 @@ TEST(Bytes, EscapeWhatControlsATerminal)
     }
 }
 
+TEST(Bytes, EscapeEachRangeToItsLimits)
+{
+    constexpr char32_t kRanges[][2] = {
+        {0x00, 0x1F},     {0x7F, 0x9F},     {0x061C, 0x061C}, {0x200E, 0x200F},
+        {0x2028, 0x202E}, {0x2066, 0x2069}, {0xFEFF, 0xFEFF},
+    };
+    const auto isShown = [](char32_t code) {
+        std::string text;
+        AppendCharacter(text, code);
+        return ShowBytes(text) == text;
+    };
+    for (const auto& [first, last] : kRanges) {
+        if (first > 0)
+            EXPECT_TRUE(isShown(first - 1)) << first;
+        EXPECT_FALSE(isShown(first)) << first;
+        EXPECT_FALSE(isShown(last)) << last;
+        EXPECT_TRUE(isShown(last + 1)) << last;
+    }
+    EXPECT_EQ(ShowBytes("\xC2\x80"), "\\u{0080}");
+}
+
 TEST(Bytes, CountOneColumnForEachCharacter)
 {
     EXPECT_EQ(CountColumns(""), 0U);

@@ -63,6 +63,10 @@ TEST(DiffSummary, SaysHowTheRunEndedOrCounts)
     const StoredRun failed = MakeRun(kGood, Verdict::kFailedTests);
     EXPECT_EQ(GetHeadline(MakeRun(kGood), failed),
               "Verdict: complete in the first report, failed-tests in the second.");
+    StoredRun other = MakeRun(kGood);
+    other.fOutcome.fExitStatus = 9;
+    EXPECT_EQ(GetHeadline(MakeRun(kGood), other),
+              "Verdict: complete in the first report, complete: exit status 9 in the second.");
     EXPECT_EQ(GetHeadline(MakeRun(kGood), MakeRun(Sample(1, 1).Set("clgpu[0].CLCompute", "99"))),
               "1 measurement differs.");
     EXPECT_EQ(GetHeadline(MakeRun(kGood), MakeRun(Sample(1, 1)
@@ -71,6 +75,35 @@ TEST(DiffSummary, SaysHowTheRunEndedOrCounts)
                                                       .Set("glgpu[0].GLMemoryMB", "1")
                                                       .Set("QGFCoreInitialized", "0"))),
               "1 trial, 2 facts and 1 measurement differ.");
+}
+
+// One and two differences of each group.
+TEST(DiffSummary, NamesWhatItCounts)
+{
+    const struct {
+        DiffGroup fGroup;
+        const char* fOne;
+        const char* fTwo;
+    } rows[] = {
+        {DiffGroup::kRun, "1 end of the run differs.", "2 ends of the run differ."},
+        {DiffGroup::kTrials, "1 trial differs.", "2 trials differ."},
+        {DiffGroup::kDevices, "1 entry of the device list differs.",
+         "2 entries of the device list differ."},
+        {DiffGroup::kFacts, "1 fact differs.", "2 facts differ."},
+        {DiffGroup::kMeasurements, "1 measurement differs.", "2 measurements differ."},
+        {DiffGroup::kIdentity, "1 name or time differs.", "2 names or times differ."},
+        {DiffGroup::kOthers, "1 other line differs.", "2 other lines differ."},
+    };
+    for (const auto& row : rows) {
+        Comparison comparison;
+        Difference difference;
+        difference.fGroup = row.fGroup;
+        difference.fKey = "report";
+        comparison.fDifferences.push_back(difference);
+        EXPECT_EQ(GetDiffHeadline(comparison), row.fOne);
+        comparison.fDifferences.push_back(difference);
+        EXPECT_EQ(GetDiffHeadline(comparison), row.fTwo);
+    }
 }
 
 TEST(DiffSummary, SaysWhatToDoIfTheSecondIsWorse)
@@ -93,6 +126,52 @@ TEST(DiffSummary, SaysWhatToDoIfTheSecondIsWorse)
                 Contains(HasSubstr("Update the graphics driver")));
 }
 
+// A second device hides the failure of the first one from what can be used.
+TEST(DiffSummary, SaysWhatToDoIfADeviceIsWorse)
+{
+    const StoredRun good = MakeRun(Sample(2, 2));
+    const char* const update = "Update the graphics driver, or reinstall it.";
+    const StoredRun failed = MakeRun(Sample(2, 2)
+                                         .Fail("clgpu[1]", "CLCompute")
+                                         .Set("glgpu[1].GLDriverVersion", "\"32.0\"")
+                                         .Set("clgpu[1].CLDriverVersion", "\"600\""));
+    EXPECT_THAT(GetSteps(good, failed),
+                ElementsAre("The OpenCL driver is another one (600 instead of 528.02). Install "
+                            "that of the first report again, and compare once more: this shows "
+                            "whether it is the cause."));
+    EXPECT_THAT(GetSteps(failed, good), IsEmpty());
+    const auto withTrial = [](const char* value, const char* driver) {
+        return MakeRun(Sample(2, 0)
+                           .Set("glgpu[1].GLFrameBufferOK", value)
+                           .Set("glgpu[1].GLDriverVersion", driver));
+    };
+    EXPECT_THAT(GetSteps(withTrial("1", "\"1\""), withTrial("0", "\"2\"")),
+                Contains(HasSubstr("another one (2 instead of 1)")));
+    EXPECT_THAT(GetSteps(withTrial("0", "\"1\""), withTrial("1", "\"2\"")), IsEmpty());
+    // The value or a version isn't known.
+    EXPECT_THAT(GetSteps(withTrial("1", "\"1\""), withTrial("", "\"2\"")), IsEmpty());
+    EXPECT_THAT(GetSteps(withTrial("", "\"1\""), withTrial("0", "\"2\"")), IsEmpty());
+    EXPECT_THAT(GetSteps(withTrial("1", "\"1\""), withTrial("0", "\"?\"")), IsEmpty());
+    EXPECT_THAT(GetSteps(withTrial("1", "\"?\""), withTrial("0", "\"2\"")), IsEmpty());
+    // What isn't a trial.
+    EXPECT_THAT(GetSteps(good, MakeRun(Sample(2, 2)
+                                           .Set("glgpu[0].HasGLNPOTSupport", "0")
+                                           .Set("glgpu[1].GLMemoryMB", "1")
+                                           .Set("glgpu[1].GLDriverVersion", "\"32.0\""))),
+                IsEmpty());
+    // What was as bad before.
+    EXPECT_THAT(GetSteps(MakeRun(Sample(1, 0).Set(kLinkKey, "0")),
+                         MakeRun(Sample(1, 0).Set(kLinkKey, "0").Set("glgpu[0].GLMemoryMB", "1"))),
+                IsEmpty());
+    const Sample ended = Sample(1, 0).EndAfter("glgpu[0].GLVersion");
+    EXPECT_EQ(GetHeadline(MakeRun(ended, Verdict::kCrashed), MakeRun(ended, Verdict::kHung)),
+              "OpenGL: broken (crashed) in the first report, broken (hung) in the second.");
+    EXPECT_THAT(GetSteps(MakeRun(ended, Verdict::kCrashed), MakeRun(ended, Verdict::kHung)),
+                IsEmpty());
+    EXPECT_THAT(GetSteps(MakeRun(Sample(1, 0)), MakeRun(Sample(1, 0).Set(kLinkKey, "0"))),
+                Contains(update));
+}
+
 TEST(DiffSummary, SaysWhatToDoWithoutADeviceOrItsSpeed)
 {
     EXPECT_THAT(
@@ -104,10 +183,14 @@ TEST(DiffSummary, SaysWhatToDoWithoutADeviceOrItsSpeed)
         return MakeRun(Sample(0, 1).Set("clgpu[0].CLBandwidth", speed));
     };
     EXPECT_THAT(GetSteps(withSpeed("2e11"), withSpeed("1e11")),
-                ElementsAre(HasSubstr("One run can be slow by chance")));
+                ElementsAre("One run can be slow by chance: end other programs, and run and "
+                            "compare again before you call a device slower."));
     EXPECT_THAT(GetSteps(withSpeed("1e11"), withSpeed("2e11")), IsEmpty());
     // No measurement.
     EXPECT_THAT(GetSteps(withSpeed("1e30"), withSpeed("1e11")), IsEmpty());
+    EXPECT_THAT(GetSteps(withSpeed("1e11"), withSpeed("0")), IsEmpty());
+    EXPECT_THAT(GetSteps(withSpeed("1e11"), withSpeed("")), IsEmpty());
+    EXPECT_THAT(GetSteps(withSpeed(""), withSpeed("1e11")), IsEmpty());
 }
 
 } // namespace

@@ -1,7 +1,9 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <sstream>
 #include <string>
+#include <vector>
 
 #include "Lines.h"
 #include "Samples.h"
@@ -111,6 +113,7 @@ TEST(Diff, AppliesTheToleranceToMeasurements)
     EXPECT_EQ(diff("1e+11", "1e+11", 0), "");
     EXPECT_EQ(diff("0", "1", 0.5), "clgpu[0].CLBandwidth: 0 -> 1\n");
     EXPECT_EQ(diff("0", "1", 1), "");
+    EXPECT_EQ(diff("1e+11", "0", 0.1), "clgpu[0].CLBandwidth: 1e+11 -> 0\n");
     EXPECT_EQ(diff("inf", "1e+11", 1), "clgpu[0].CLBandwidth: inf -> 1e+11\n");
     EXPECT_EQ(diff("inf", "inf", 0), "");
     EXPECT_EQ(Diff(Sample(0, 1), Sample(0, 1).Set("clgpu[0].CLCompute", "1200")), "");
@@ -118,6 +121,27 @@ TEST(Diff, AppliesTheToleranceToMeasurements)
               "clgpu[0].CLCompute: 1234.56 -> 1000 (-19 %)\n");
     EXPECT_EQ(Diff(Sample(1, 0), Sample(1, 0).Set("glgpu[0].GLMemoryMB", "24563"), 0.5),
               "glgpu[0].GLMemoryMB: 24564 -> 24563\n");
+}
+
+TEST(Diff, SaysWhyAMeasurementDidNotChange)
+{
+    const Report report = ReadReport(Sample(0, 1).GetText());
+    const Answers answers = GetAnswers(report);
+    const DeviceAnswers& device = answers.fDevices.at(0);
+    const auto find = [](const std::vector<Answer>& all, const char* key) {
+        return &*std::find_if(all.begin(), all.end(),
+                              [key](const Answer& answer) { return answer.fKey == key; });
+    };
+    const Answer* const speed = find(device.fAnswers, "CLCompute");
+    const Answer* const count = find(answers.fReport, "NumCLGPUs");
+    Comparison comparison;
+    comparison.fSame = {{&device, speed, speed, "a note"},
+                        {nullptr, count, count, "another"},
+                        {&device, speed, speed, ""}};
+    std::ostringstream out;
+    PrintDiff(out, comparison);
+    EXPECT_EQ(out.str(), "clgpu[0].CLCompute: no change: 1234.56 and 1234.56 (a note)\n"
+                         "NumCLGPUs: no change: 1 and 1 (another)\n");
 }
 
 TEST(Diff, ReportsMissingKeysAndTheirReasons)
@@ -166,7 +190,20 @@ TEST(Diff, MatchesEqualNamesByIndex)
 {
     EXPECT_EQ(Diff(Named(2, "A", "A"), Named(2, "A", "A").Set("glgpu[1].GLMemoryMB", "1")),
               "glgpu[1].GLMemoryMB: 24564 -> 1\n");
-    EXPECT_EQ(Diff(Named(2, "A", "A"), Named(2, "B", "A")), "glgpu[0].GLName: \"A\" -> \"B\"\n");
+    EXPECT_EQ(Diff(Named(2, "A", "A"), Named(2, "B", "A").Set("glgpu[1].GLMemoryMB", "1")),
+              "glgpu[0].GLName: \"A\" -> \"B\"\n"
+              "glgpu[1].GLMemoryMB: 24564 -> 1\n");
+    const auto name = [](const std::vector<const char*>& names) {
+        std::string text;
+        for (std::size_t index = 0; index < names.size(); ++index)
+            text += "glgpu[" + std::to_string(index) + "].GLName=\"" + names[index] + "\"\n";
+        return text;
+    };
+    EXPECT_EQ(Diff(name({"A", "A", "B", "B"}), name({"B", "B", "A", "A"})),
+              "glgpu[0] \"A\": now glgpu[2]\n"
+              "glgpu[1] \"A\": now glgpu[3]\n"
+              "glgpu[2] \"B\": now glgpu[0]\n"
+              "glgpu[3] \"B\": now glgpu[1]\n");
 }
 
 TEST(Diff, MatchesTheRestByIndex)
@@ -176,6 +213,9 @@ TEST(Diff, MatchesTheRestByIndex)
               "glgpu[0].GLVendor: \"A\" -> \"B\"\n");
     EXPECT_EQ(Diff("glgpu[0].x=1\n", "clgpu[0].x=1\n"), "glgpu[0]: only in the first report\n"
                                                         "clgpu[0]: only in the second report\n");
+    // Two devices without a name aren't the same for that.
+    EXPECT_EQ(Diff("glgpu[0].x=1\n", "glgpu[1].x=1\n"), "glgpu[0]: only in the first report\n"
+                                                        "glgpu[1]: only in the second report\n");
 }
 
 TEST(Diff, ReportsRawLines)
@@ -184,6 +224,7 @@ TEST(Diff, ReportsRawLines)
               "other line, only in the first report: x\n"
               "other line, only in the first report: y\n"
               "other line, only in the second report: z\\x1B\n");
+    EXPECT_EQ(Diff("a=1\nx\n", "x\na=1\n"), "");
 }
 
 TEST(Diff, LeadsWithWhatMatters)
@@ -227,12 +268,44 @@ TEST(Diff, HasOneLineForARunThatEndedBefore)
               "report: broken off before glgpu[0].IsIntegratedGLGPU -> "
               "broken off before glgpu[0].GLVendor (3 answers only in the second report)\n");
     EXPECT_EQ(Diff(whole, ""), "report: whole -> empty (66 answers only in the first report)\n");
+    EXPECT_EQ(Diff(Sample(1, 0), Sample(1, 0).Set("assayStart", "")),
+              "report: whole -> broken off\n");
     ComparisonOptions all;
     all.fAll = true;
     EXPECT_EQ(DiffWith(Sample(0, 1).GetText(), Sample(0, 1).EndAfter("NumGLGPUs").GetText(), all),
               "report: whole -> broken off before NumCLGPUs (13 answers only in the first report)\n"
               "NumCLGPUs: 1 -> missing (run ended before)\n"
               "clgpu[0] \"Accelerator 4000\": only in the first report\n");
+}
+
+TEST(Diff, OfRunsThatEndedAtTheSamePlace)
+{
+    const char* const end = "glgpu[0].GLVendor";
+    const std::string report = "report: broken off before glgpu[1].GLVendor -> "
+                               "broken off before glgpu[1].GLVendor ";
+    EXPECT_EQ(Diff(Named(2, "A", "B").EndAfter(end), Named(2, "B", "A").EndAfter(end)),
+              report + "(1 answer only in the first report, 1 answer only in the second report)\n"
+                       "glgpu[0] \"A\": now glgpu[1]\n"
+                       "glgpu[1] \"B\": now glgpu[0]\n");
+    EXPECT_EQ(Diff(Named(2, "A", "B").EndAfter(end), Named(2, "B", "C").EndAfter(end)),
+              report + "(1 answer only in the second report)\n"
+                       "glgpu[0] \"A\": only in the first report\n"
+                       "glgpu[1] \"C\": only in the second report\n"
+                       "glgpu[1] \"B\": now glgpu[0]\n");
+    EXPECT_EQ(Diff(Named(2, "B", "C").EndAfter(end), Named(2, "A", "B").EndAfter(end)),
+              report + "(1 answer only in the first report)\n"
+                       "glgpu[1] \"C\": only in the first report\n"
+                       "glgpu[0] \"A\": only in the second report\n"
+                       "glgpu[0] \"B\": now glgpu[1]\n");
+}
+
+TEST(Diff, NamesADeviceThatTheOtherRunDidNotCount)
+{
+    EXPECT_EQ(Diff(Sample(2, 0), Sample(1, 0).EndAfter("glgpu[0].GLVersion")),
+              "report: whole -> broken off before glgpu[0].IsIntegratedGLGPU "
+              "(36 answers only in the first report)\n"
+              "NumGLGPUs: 2 -> 1\n"
+              "glgpu[1] \"Accelerator 4000\": only in the first report\n");
 }
 
 TEST(Diff, HasOneLineForADeviceThatFailed)
@@ -247,6 +320,12 @@ TEST(Diff, HasOneLineForADeviceThatFailed)
               "glgpu[0].tests: failed at GLDriver -> failed at GLName "
               "(8 answers only in the first report)\n");
     EXPECT_EQ(Diff(failAt("GLName"), failAt("GLName")), "");
+    EXPECT_EQ(Diff(failAt("GLName"), Sample(1, 0).EndAfter("glgpu[0].GLVersion").GetText()),
+              "report: whole -> broken off before glgpu[0].IsIntegratedGLGPU "
+              "(3 answers only in the first report)\n"
+              "glgpu[0].tests: failed at GLName -> not finished\n");
+    EXPECT_EQ(Diff(good, good + "# 00009.x Testing terminated for glgpu[0]\n"),
+              "glgpu[0].tests: passed -> failed\n");
     ComparisonOptions all;
     all.fAll = true;
     EXPECT_EQ(DiffWith(Sample(0, 1).GetText(),

@@ -106,6 +106,10 @@ TEST(JsonDocument, ReplacesTimesThatJsonCannotHold)
     const Json json = Document("", outcome)["outcome"];
     EXPECT_EQ(json["seconds"], 0.0);
     EXPECT_EQ(json["timeoutSeconds"], 0.0);
+    outcome.fSeconds = -1;
+    outcome.fTimeoutSeconds = 0.5;
+    EXPECT_EQ(Document("", outcome)["outcome"]["seconds"], 0.0);
+    EXPECT_EQ(Document("", outcome)["outcome"]["timeoutSeconds"], 0.5);
 }
 
 TEST(JsonDocument, HasEachValueAsTextAndNumber)
@@ -302,6 +306,33 @@ TEST(JsonDocument, RejectsOtherDocuments)
     }
 }
 
+TEST(JsonDocument, IsReadWithACutThatIsFalse)
+{
+    const Report report = ReadDocument(Json::parse(
+        R"({"schema": 1, "lines": [{"kind": "raw", "text": "", "end": "", "cut": false}]})"));
+    EXPECT_FALSE(report.GetLines().at(0).fCut);
+}
+
+TEST(JsonDocument, ShortensWhatTheParserSays)
+{
+    std::istringstream in("{\"schema\": \"" + std::string(300, 'a') + "\x01");
+    try {
+        ReadDocument(in);
+        ADD_FAILURE();
+    } catch (const std::runtime_error& failure) {
+        const std::string text = failure.what();
+        EXPECT_EQ(text.substr(0, 28), "not valid JSON: parse error ");
+        EXPECT_EQ(text.size(), std::string("not valid JSON: ").size() + 200);
+    }
+}
+
+TEST(JsonEvents, AreObjectsThatNameTheirEvent)
+{
+    EXPECT_TRUE(IsEvent(R"({"event": 1})"));
+    for (const char* text : {"", "x", "[1]", "{\"a\": 1}", "{\"a\": {\"event\": 1}}", "\"event\""})
+        EXPECT_FALSE(IsEvent(text)) << text;
+}
+
 TEST(JsonEvents, HaveTheirForms)
 {
     EXPECT_EQ(SaveEvent(MakeFirstStartEvent({"assay", "-x"})),
@@ -404,6 +435,7 @@ TEST(JsonBytes, KeepText)
         EXPECT_EQ(EncodeBytes(text), text);
         EXPECT_EQ(DecodeBytes(text), text);
     }
+    EXPECT_EQ(DecodeBytes("\xFF\xEF\x9E\x80"), "\xFF\x80");
 }
 
 TEST(JsonBytes, EncodeOtherBytesInAPrivateRange)

@@ -59,7 +59,8 @@ TEST(Numbers, FormLists)
     ASSERT_TRUE(list);
     EXPECT_EQ(*list, (std::vector<Number>{std::int64_t{8}, std::int64_t{-4}, 0.5}));
     EXPECT_EQ(ReadNumberList("[16]")->size(), 1U);
-    for (const char* text : {"", "[", "]", "[]", "8", "[8", "8]", "[8,4]", "[8, ]", "[a]", "[8, 4"})
+    for (const char* text :
+         {"", "[", "]", "[]", "8", "[8", "8]", "[8,4]", "[8, ]", "[a]", "[8, 4", "(8]", "[8)"})
         EXPECT_FALSE(ReadNumberList(text)) << text;
 }
 

@@ -29,6 +29,10 @@ TEST(ValueText, HasUnits)
     EXPECT_EQ(Show("clgpu[0].CLMemoryMB=24564"), "23.99 GiB");
     EXPECT_EQ(Show("clgpu[0].CLMemoryMB=81920"), "80 GiB");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=999"), "999 B/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=1000"), "1 kB/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=1e+06"), "1 MB/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=1e+09"), "1 GB/s");
+    EXPECT_EQ(Show("clgpu[0].CLBandwidth=1e+12"), "1 TB/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=1500"), "1.5 kB/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=2.5e+06"), "2.5 MB/s");
     EXPECT_EQ(Show("clgpu[0].CLBandwidth=8.34512e+11"), "834.5 GB/s");
@@ -76,6 +80,18 @@ TEST(ValueText, ShowsABoundThatDiffersByMoreThanATenth)
     EXPECT_EQ(ShowSpeed("1e+30", 2e9), "not known (the device's clock is unreliable: 1e+30; at "
                                        "least 2 GB/s by the host's clock)");
     EXPECT_EQ(ShowSpeed("1e+09", 0), "1 GB/s");
+    EXPECT_EQ(ShowSpeed("1e+09", 0.9e9), "1 GB/s");
+    EXPECT_EQ(ShowSpeed("1e+09", 1), "1 GB/s (at least 1 B/s by the host's clock)");
+    EXPECT_EQ(ShowSpeed("1e+09", 1.23456e16), "1 GB/s (at least 12346 TB/s by the host's clock)");
+}
+
+TEST(ValueText, ShowsABoundOfASpeedOnly)
+{
+    RunOutcome outcome;
+    outcome.fLowerBounds = {{"clgpu[0].CLCompute", 5}};
+    const Report report = ReadReport("clgpu[0].CLCompute=1\n");
+    EXPECT_EQ(GetValueText(GetAnswers(report, outcome).fDevices.at(0).fAnswers.at(11)),
+              "1 (no unit; more is better)");
 }
 
 TEST(ValueText, SaysThatTheNewestVersionStandsForLaterOnes)
@@ -104,7 +120,15 @@ TEST(ValueText, HasWordsForFlagsAndUnknownValues)
     EXPECT_EQ(Show("glgpu[0].GLName=\"\""), "none (no adapter of the system matches)");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"?\""), "not known (not in the adapter lists)");
     EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"20210315000000.000000-000\""), "2021-03-15");
-    EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"March 2021\""), "March 2021");
+    EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"20191231235959.999999-000\""), "2019-12-31");
+    for (const std::string text :
+         {"March 2021", "20210315000000,000000-000", "2021031500000x.000000-000",
+          "20210315000000.000000-00", "20210315000000.000000-0000", "2021031500000.0000000-000"})
+        EXPECT_EQ(Show("glgpu[0].GLDriverDate=\"" + text + "\""), text);
+    // A date is shown as one only where there is a date.
+    for (const std::string key : {"GLName", "GLVendor"})
+        EXPECT_EQ(Show("glgpu[0]." + key + "=\"20210315000000.000000-000\""),
+                  "20210315000000.000000-000");
 }
 
 TEST(ValueText, ShowsOtherFormsUnchanged)
