@@ -1,9 +1,11 @@
 #include <gtest/gtest.h>
 
+#include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "SeriesSamples.h"
+#include "series/DeviceList.h"
 #include "series/SeriesStatistics.h"
 
 namespace assay_host {
@@ -209,6 +211,33 @@ TEST(SeriesCollector, IsFullWithAsManySamplesAsADocumentCanHave)
     }
     AddRun(series, Sample(0, 1));
     EXPECT_TRUE(series.IsFull());
+}
+
+TEST(DeviceList, FindsADeviceByNameAndIndexThenByNameThenByIndex)
+{
+    DeviceList list;
+    const auto match = [&list](const std::string& text) {
+        const Report report = ReadReport(text);
+        return list.Match(GetAnswers(report).fDevices);
+    };
+    const auto name = [](int index, const char* text) {
+        return "glgpu[" + std::to_string(index) + "].GLName=\"" + text + "\"\n";
+    };
+    using Places = std::vector<std::size_t>;
+    EXPECT_EQ(match(name(0, "A") + name(1, "A")), (Places{0, 1}));
+    EXPECT_EQ(match(name(1, "A")), Places{1});
+    EXPECT_EQ(match(name(2, "A") + name(3, "A")), (Places{0, 1}));
+    EXPECT_EQ(match(name(2, "A") + name(3, "A") + name(4, "A")), (Places{0, 1, 2}));
+    EXPECT_EQ(match(name(0, "B")), Places{0});
+    EXPECT_EQ(match("clgpu[0].CLName=\"A\"\n"), Places{3});
+    DeviceList nameless;
+    const auto matchTag = [&nameless](const std::string& tag) {
+        const Report report = ReadReport(tag + ".x=1\n");
+        return nameless.Match(GetAnswers(report).fDevices);
+    };
+    EXPECT_EQ(matchTag("glgpu[0]"), Places{0});
+    EXPECT_EQ(matchTag("glgpu[1]"), Places{1});
+    EXPECT_EQ(matchTag("clgpu[0]"), Places{2});
 }
 
 TEST(FactLog, KeepsAFewValuesAndCountsTheOthers)

@@ -88,10 +88,35 @@ TEST(JsonSeries, HasTheStatisticsOfTheSamples)
     EXPECT_EQ(series["findings"][0]["code"], "verdict");
 }
 
+// A reader of the document alone must know what its numbers are.
+TEST(JsonSeries, SaysWhatItsNumbersAre)
+{
+    const Json series =
+        SaveDocument(Json::parse(GetSeriesDocument(CollectBandwidths({"5e+11"}))))["series"];
+    EXPECT_EQ(series["definitions"], Json::parse(R"({
+        "samples": "one for each run that has the device; run 1 is the first",
+        "statistics": "of the known samples of run 2 and later; no sample is left out",
+        "quantiles": "linear interpolation between the samples around the place (count - 1) * fraction: type 7 of Hyndman and Fan",
+        "spread": "upperQuartile - lowerQuartile",
+        "relativeSpread": "spread / median; 0 if the median is 0",
+        "fences": "1.5 * spread below lowerQuartile and above upperQuartile",
+        "outliers": "samples beyond the fences"})"));
+}
+
+TEST(JsonSeries, ASampleWithoutAReasonStaysUnknown)
+{
+    Json document = Json::parse(GetSeriesDocument(MakeRichSeries()));
+    document["series"]["measurements"][0]["samples"][6]["reason"] = "";
+    EXPECT_EQ(ReadRun(document.dump()).fSeries->fMeasurements[0].fSamples[6].fReason,
+              "no reason is given");
+}
+
 TEST(JsonSeries, OfOneRunHasNoStatistics)
 {
     const Json series =
         SaveDocument(Json::parse(GetSeriesDocument(CollectBandwidths({"0"}))))["series"];
+    EXPECT_EQ(series["repeat"], 1);
+    EXPECT_EQ(series["forSeconds"], nullptr);
     EXPECT_EQ(series["measurements"][0]["first"], nullptr);
     EXPECT_EQ(series["measurements"][0]["statistics"], Json::parse(R"({"known": false,
                               "reason": "no run after the first has a known sample"})"));
@@ -99,7 +124,15 @@ TEST(JsonSeries, OfOneRunHasNoStatistics)
 
 TEST(JsonSeries, ComesBack)
 {
-    for (const StoredRun& run : {MakeRichSeries(), CollectBandwidths({"5e+11", "0", "4e+11"})}) {
+    SeriesPlan half;
+    half.fSeconds = 0.5;
+    SeriesCollector timed(half);
+    AddRun(timed, Sample(0, 1));
+    const StoredRun shortest = timed.Finish(SeriesEnd::kDone, 0.75);
+    EXPECT_EQ(Json::parse(GetSeriesDocument(shortest))["series"]["repeat"], nullptr);
+    EXPECT_EQ(Json::parse(GetSeriesDocument(shortest))["series"]["forSeconds"], 0.5);
+    for (const StoredRun& run :
+         {MakeRichSeries(), CollectBandwidths({"5e+11", "0", "4e+11"}), shortest}) {
         const std::string text = GetSeriesDocument(run);
         const StoredRun read = ReadRun(text);
         ASSERT_TRUE(read.fSeries);
@@ -133,12 +166,23 @@ TEST(JsonSeries, NamesTheFirstError)
            "series: \"end\" is \"x\\n\", which is none");
     expect([](Json& series) { series["measurements"][1]["key"] = "CLName"; },
            "series.measurements[1]: \"key\" is no measurement");
+    expect([](Json& series) { series["measurements"][1]["key"] = "x"; },
+           "series.measurements[1]: \"key\" is no measurement");
     expect([](Json& series) { series["measurements"][0]["samples"][2]["number"] = "1"; },
            "series.measurements[0].samples[2]: \"number\" is not a number");
     expect([](Json& series) { series["findings"][0]["runs"][0] = -1; },
            "series.findings[0]: \"runs\" has an element that is no count");
     expect([](Json& series) { series["findings"] = Json::array({1}); },
            "series.findings[0] is not an object");
+    expect([](Json& series) { series["findings"] = 1; }, "series: \"findings\" is not an array");
+    expect([](Json& series) { series["findings"][0]["runs"] = 1; },
+           "series.findings[0]: \"runs\" is not an array");
+    expect([](Json& series) { series["shown"] = "1"; }, "series: \"shown\" is not a count");
+    expect([](Json& series) { series["usable"] = 1; }, "series: \"usable\" is not an object");
+    expect([](Json& series) { series["usable"]["opencl"] = "x"; },
+           "series.usable: \"opencl\" is \"x\", which is none");
+    expect([](Json& series) { series["measurements"][0]["samples"][2]["known"] = 1; },
+           "series.measurements[0].samples[2]: \"known\" is not a bool");
 }
 
 TEST(MedianReport, HasTheMediansAndElseTheLinesOfTheRunThatIsShown)
@@ -150,6 +194,17 @@ TEST(MedianReport, HasTheMediansAndElseTheLinesOfTheRunThatIsShown)
     EXPECT_EQ(report.GetLines().size(), run.fReport.GetLines().size());
     EXPECT_EQ(run.fReport.Find("clgpu[0].CLBandwidth")->fValue, "9e+11");
     EXPECT_TRUE(report.IsWhole());
+}
+
+TEST(MedianReport, TwoDevicesOfOneNameHaveTheirOwnMedians)
+{
+    SeriesCollector series({2, 0});
+    for (int run = 0; run < 2; ++run)
+        AddRun(series, Sample(0, 2).Set("clgpu[0].CLBandwidth", "5e+11"));
+    const StoredRun run = series.Finish(SeriesEnd::kDone, 1);
+    const Report report = MakeMedianReport(run.fReport, *run.fSeries);
+    EXPECT_EQ(report.Find("clgpu[0].CLBandwidth")->fValue, "500000000000");
+    EXPECT_EQ(report.Find("clgpu[1].CLBandwidth")->fValue, "834512000000");
 }
 
 TEST(MedianReport, LeavesWhatIsNotKnown)
