@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <utility>
 
 #include "report/Activity.h"
 #include "report/KnownKeys.h"
@@ -10,13 +11,22 @@ namespace {
 
 TEST(Activity, OfTheLineThatComesNext)
 {
-    EXPECT_EQ(GetActivityText("Tester"), "starting (Tester)");
-    EXPECT_EQ(GetActivityText("NumGLGPUs"),
-              "creating an OpenGL context on each display device (NumGLGPUs)");
-    EXPECT_EQ(GetActivityText("glgpu[12].CanCompileProgramGLSL"),
-              "compiling shaders (glgpu[12].CanCompileProgramGLSL)");
-    EXPECT_EQ(GetActivityText("clgpu[0].CLBandwidth"),
-              "measuring the copy bandwidth (clgpu[0].CLBandwidth)");
+    const std::pair<const char*, const char*> rows[] = {
+        {"Tester", "starting"},
+        {"assayStart", "starting"},
+        {"QGFCoreInitialized", "initializing the graphics library"},
+        {"QGFOGLInitialized", "loading OpenGL"},
+        {"OGLContextCreated", "creating a first OpenGL context"},
+        {"NumGLGPUs", "creating an OpenGL context on each display device"},
+        {"glgpu[12].CanCompileProgramGLSL", "compiling shaders"},
+        {"glgpu[0].GLFrameBufferOK", "drawing to a framebuffer"},
+        {"NumCLGPUs", "loading OpenCL and listing its devices"},
+        {"clgpu[0].CLBandwidth", "measuring the copy bandwidth"},
+        {"clgpu[0].CLCompute", "measuring the compute speed"},
+        {"assayEnd", "ending the tests"},
+    };
+    for (const auto& [key, text] : rows)
+        EXPECT_EQ(GetActivityText(key), std::string(text) + " (" + key + ")");
     EXPECT_EQ(GetActivityText("glgpu[0].GLName"), "reading facts of a device (glgpu[0].GLName)");
     EXPECT_EQ(GetActivityText("gputag.GL_MAX_TEXTURE_UNITS"),
               "reading facts of a device (gputag.GL_MAX_TEXTURE_UNITS)");

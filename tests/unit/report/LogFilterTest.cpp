@@ -69,6 +69,16 @@ TEST(LogFilter, CutsALongLine)
     EXPECT_TRUE(pieces[0].fIsLog);
     EXPECT_EQ(pieces[0].fText.size(), LogFilter::kMaxLineBytes);
     EXPECT_EQ(pieces[1].fText, "a=1\n");
+    EXPECT_TRUE(filter.Finish().empty());
+}
+
+TEST(LogFilter, JoinsTheLinesBetweenTwoLogLines)
+{
+    LogFilter filter;
+    const std::vector<LogFilter::Piece> pieces = filter.Feed("a\n\nb\n" + kPrefix + "x\nc\n");
+    ASSERT_EQ(pieces.size(), 3U);
+    EXPECT_EQ(pieces[0].fText, "a\n\nb\n");
+    EXPECT_EQ(pieces[2].fText, "c\n");
 }
 
 TEST(Causes, AreTheTextsOfFailures)

@@ -74,6 +74,7 @@ TEST(ReportReader, SplitsAtTheFirstEqualsSign)
 
 TEST(ReportReader, KeepsOtherLinesRaw)
 {
+    EXPECT_EQ(ReadLines("!~=1\n"), Lines{Plain("!~=1", "\n", "!~", "1")});
     for (const char* text : {"", "text", "=1", " a=1", "a b=1", "\"a\"=1", "a\x80=1", "a\x7F=1",
                              " # text", "DoStdout failed"})
         EXPECT_EQ(ReadLines(std::string(text) + "\n"), Lines{Raw(text)}) << text;
@@ -130,6 +131,11 @@ TEST(ReportReader, ReleasesAnOpenQuoteBeforeALineOfTheReport)
     for (const char* other : {"glgpu[].X=1", "glgpu[0]X=1", "gputagX=1", "Tester", "NumGLGPUsX=1",
                               "Tester x=1", "", " # log"})
         EXPECT_EQ(ReadLines(std::string("a=\"one\n") + other + "\nend\"\n").size(), 1U) << other;
+}
+
+TEST(ReportReader, OpensNoQuoteInAComment)
+{
+    EXPECT_EQ(ReadLines("#a=\"x\ny\"\n"), (Lines{Comment("#a=\"x"), Raw("y\"")}));
 }
 
 TEST(ReportReader, OpensANewQuoteAfterAReleasedOne)
@@ -220,6 +226,9 @@ TEST(ReportReader, CanBeUsedAgainAfterFinish)
     EXPECT_TRUE(reader.Finish().empty());
     EXPECT_EQ(reader.Feed("c\"\n"), Lines{Raw("c\"")});
     EXPECT_EQ(reader.GetByteCount(), 9U);
+    reader.Feed("a\r");
+    EXPECT_EQ(reader.Finish(), Lines{Raw("a\r", "")});
+    EXPECT_EQ(reader.Feed("b\n"), Lines{Raw("b")});
 }
 
 // Reads the text in pieces of every size, and checks that the lines and the counts are the same.
@@ -274,6 +283,12 @@ TEST(ReportReader, ReleasesAQuoteThatIsTooLong)
               Lines{Text("a=\"34\n7890\"", "\n", "a", "34\n7890")});
     EXPECT_EQ(ReadWithLimits("a=\"34\n789012\"\n", limits, 0),
               (Lines{Raw("a=\"34"), Raw("789012\"")}));
+    EXPECT_EQ(ReadWithLimits("a=\"34\n7890\"\nb=\"34\n78901\"\n", limits, 0),
+              (Lines{Text("a=\"34\n7890\"", "\n", "a", "34\n7890"),
+                     Text("b=\"34\n78901\"", "\n", "b", "34\n78901")}));
+    EXPECT_EQ(
+        ReadWithLimits("a=\"34\n# x\nb=\"34\n78901\"\n", limits, 0),
+        (Lines{Raw("a=\"34"), Comment("# x"), Text("b=\"34\n78901\"", "\n", "b", "34\n78901")}));
     EXPECT_EQ(ReadWithLimits("a=\"34\nb=\"7890\n1\"\n", limits, 0),
               (Lines{Raw("a=\"34"), Text("b=\"7890\n1\"", "\n", "b", "7890\n1")}));
     EXPECT_EQ(ReadWithLimits("a=\"34\n0123456789012345\"\n", limits, 5),

@@ -61,6 +61,22 @@ TEST(RunText, CountsDevices)
               "1 OpenGL, OpenCL not reached");
     EXPECT_EQ(CountDevices(Sample(0, 0).Set("NumGLGPUs", "").GetText()),
               "OpenGL not known, no OpenCL graphics device");
+    EXPECT_EQ(CountDevices(Sample(1, 1).Set("NumGLGPUs", "").Set("NumCLGPUs", "").GetText()),
+              "1 OpenGL, 1 OpenCL");
+}
+
+TEST(RunText, HasTheTimeAndItsLimit)
+{
+    RunOutcome outcome;
+    outcome.fSeconds = 1.234;
+    EXPECT_EQ(GetTimeText(outcome), "1.23 s");
+    outcome.fTimeoutSeconds = 0.5;
+    EXPECT_EQ(GetTimeText(outcome), "1.23 s (limit 0.5 s)");
+}
+
+TEST(RunText, HasTheOtherLinesThatAreNotEmpty)
+{
+    EXPECT_EQ(GetRawLines(ReadReport("x\n\n# c\na=1\ny\n")), (std::vector<std::string>{"x", "y"}));
 }
 
 } // namespace

@@ -23,6 +23,15 @@ TEST(SimilarName, IsNotJustAnyName)
     EXPECT_EQ(FindSimilarName("abcdefghi", {"abcdefghixyz"}), "abcdefghixyz");
     EXPECT_EQ(FindSimilarName("abcdefghi", {"abcdefghiwxyz"}), "");
     EXPECT_EQ(FindSimilarName("abc", {}), "");
+    // Letters that are inserted, left out and exchanged count the same.
+    EXPECT_EQ(FindSimilarName("xbcdefyz", {"abcdefg"}), "");
+    EXPECT_EQ(FindSimilarName("xbcdefg", {"abcdef"}), "abcdef");
+    EXPECT_EQ(FindSimilarName("bcde", {"abcdef"}), "abcdef");
+    EXPECT_EQ(FindSimilarName("bcd", {"abcdef"}), "");
+    EXPECT_EQ(FindSimilarName("xyabc", {"abc"}), "abc");
+    // The limits of the letters.
+    EXPECT_EQ(FindSimilarName("AAAZZZ", {"aaazzz"}), "aaazzz");
+    EXPECT_EQ(FindSimilarName("@@@[[[", {"```{{{"}), "");
 }
 
 } // namespace

@@ -19,7 +19,7 @@ TEST(Software, IsKnownByItsName)
           "ANGLE (Google, Vulkan 1.3.0 (SwiftShader Device (Subzero) (0x0000C0DE)), SwiftShader "
           "driver)",
           "GDI Generic", "Microsoft Basic Render Driver", "D3D12 (Microsoft Basic Render Driver)",
-          "Oclgrind Simulator"})
+          "Oclgrind Simulator", "SOFTWARE RASTERIZER"})
         EXPECT_TRUE(IsSoftwareName(name)) << name;
 }
 

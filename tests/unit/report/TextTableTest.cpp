@@ -27,6 +27,7 @@ TEST(TextTable, CountsAndKeepsWholeCharacters)
     const std::string e = "\xC3\xA9";
     EXPECT_EQ(WrapText(e + e + e + e, 4), Texts{e + e + e + e});
     EXPECT_EQ(WrapText(e + e + e + e + e, 4), (Texts{e + e + e + e, e}));
+    EXPECT_EQ(WrapText("\xFF\xFF\xFF", 2), (Texts{"\xFF\xFF", "\xFF"}));
 }
 
 TEST(TextTable, AlignsItsValues)
@@ -43,6 +44,17 @@ TEST(TextTable, AlignsItsValues)
                          "  Longer  second value that is\n"
                          "          wrapped\n"
                          "          third\n");
+}
+
+TEST(TextTable, LeavesRoomForValuesBesideLongLabels)
+{
+    for (const std::size_t width : {0U, 5U, 10U, 11U, 29U}) {
+        TextTable table;
+        table.Add("A label", std::string(21, 'v'));
+        std::ostringstream out;
+        table.Print(out, width);
+        EXPECT_EQ(out.str(), "  A label  " + std::string(20, 'v') + "\n           v\n") << width;
+    }
 }
 
 } // namespace

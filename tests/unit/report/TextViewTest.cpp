@@ -26,6 +26,8 @@ TEST(TextView, OfAGoodMachine)
     outcome.fReason = "All tests ran, and the report is whole.";
     outcome.fSeconds = 0.256;
     outcome.fTimeoutSeconds = 60;
+    outcome.fLastReportLine =
+        "assayEnd=\"2026-11-21_10:49:36\""; // only of a report that isn't whole
     EXPECT_EQ(Print(Sample(1, 1).GetText(), outcome),
               "OpenGL device glgpu[0]: Accelerator 4000\n"
               "----------------------------------------\n"
@@ -162,8 +164,6 @@ TEST(TextView, OfACrashAndABadDevice)
               "                    (glgpu[1].CanCompileProgramGLSL).\n"
               "  OpenCL            unknown: The run ended before OpenCL was tried.\n"
               "  What to do        Update the graphics driver, or reinstall it.\n"
-              "                    Run again with -- -verbose=1 after the other\n"
-              "                    options: the log then names the driver's calls.\n"
               "                    If the newest driver fails too, report it to the\n"
               "                    driver's developers, with the archive of\n"
               "                    assay-host bugreport.\n"
@@ -192,6 +192,7 @@ TEST(TextView, OfAChildThatNeverStarted)
     RunOutcome outcome;
     outcome.fCommand = {"nothing"};
     outcome.fReason = "There is no such file.";
+    outcome.fLastLogLine = "# of another run";
     EXPECT_EQ(Print("", outcome),
               "Run: did not start\n"
               "------------------\n"
@@ -202,6 +203,11 @@ TEST(TextView, OfAChildThatNeverStarted)
               "                 or name it with --assay.\n"
               "  Command        nothing\n"
               "  Time           0.00 s\n");
+    // The smallest width.
+    outcome.fReason = std::string(30, 'x');
+    const std::string narrow = Print("", outcome, 0);
+    EXPECT_NE(narrow.find("  What happened  " + std::string(23, 'x') + "\n"), std::string::npos)
+        << narrow;
 }
 
 TEST(TextView, OfAChildWithoutAReport)

@@ -67,6 +67,8 @@ TEST(Unknown, HasAFormForEachKindOfKey)
     EXPECT_EQ(Judge("CLCompute", "nan"), Unknown::kImplausible);
     EXPECT_EQ(Judge("CLCompute", "1e+08"), Unknown::kNot);
     EXPECT_EQ(Judge("CLCompute", "1.00001e+08"), Unknown::kImplausible);
+    EXPECT_EQ(Judge("CLCompute", "100000001"), Unknown::kImplausible);
+    EXPECT_EQ(Judge("CLBandwidth", "10000000000001"), Unknown::kImplausible);
     EXPECT_EQ(Judge("CLCompute", "0"), Unknown::kNoTime);
     EXPECT_EQ(Judge("CLCompute", "-1"), Unknown::kImplausible);
     EXPECT_EQ(Judge("CLBandwidth", "1e+13"), Unknown::kNot);
