@@ -126,6 +126,13 @@ def test_options_of_the_child():
     assert set(re.findall(r"'(-\w+=?)", options)) == child_options()
 
 
+def test_options_without_effect():
+    zsh, fish = ((FOLDER / name).read_text() for name in ("_assay-host", "assay.fish"))
+    for option in ("timeout", "hang"):
+        assert f"'-{option}=-[accepted and ignored]:" in zsh
+        assert f'-a -{option}= -d "Accepted and ignored"\n' in fish
+
+
 def test_zsh_accepts_the_file():
     if not shutil.which("zsh"):
         pytest.skip("zsh is not installed")

@@ -51,6 +51,7 @@ public:
             throw CLI::ValidationError("--raw", "only with --format text");
         if (command.count("--schema") > 0 && !isJson)
             throw CLI::ValidationError("--schema", "only with --format json or jsonl");
+        CheckIdentify();
         CheckSeries(command);
         fChoice.fNeed = ReadNeed(fNeed);
         fChoice.fChild.fArgs = childWords;
@@ -58,6 +59,17 @@ public:
     }
 
 private:
+    void CheckIdentify() const
+    {
+        if (!fChoice.fIdentify)
+            return;
+        if (fChoice.fFormat != Format::kJson && fChoice.fFormat != Format::kJsonLines &&
+            fChoice.fFormat != Format::kHtml)
+            throw CLI::ValidationError("--identify", "only with --format json, jsonl or html");
+        if (fChoice.fSchema == 1)
+            throw CLI::ValidationError("--identify", "not with --schema 1, which names no machine");
+    }
+
     void CheckSeries(const CLI::App& command) const
     {
         const char* const option = command.count("--repeat") > 0 ? "--repeat"

@@ -42,8 +42,8 @@ TEST(CommandLineOfRun, HasAnOptionForEachField)
     EXPECT_EQ(child.fChild.fProgram, "a b");
     EXPECT_EQ(child.fChild.fTimeoutSeconds, 1.5);
     EXPECT_THAT(child.fChild.fArgs, ElementsAre("-x=1", "--", "y"));
-    const auto run = Parse<RunChoice>({"run", "--identify", "--raw", "--output", "file"});
-    EXPECT_TRUE(run.fIdentify);
+    const auto run = Parse<RunChoice>({"run", "--raw", "--output", "file"});
+    EXPECT_FALSE(run.fIdentify);
     EXPECT_TRUE(run.fRaw);
     EXPECT_EQ(run.fOutput, "file");
     EXPECT_EQ(Parse<RunChoice>({"run", "--timeout=0"}).fChild.fTimeoutSeconds, 0);
@@ -58,6 +58,8 @@ TEST(CommandLineOfRun, NamesItsFormsAndNeeds)
         EXPECT_EQ(Parse<RunChoice>({"run", "--format", form, "--schema", "1"}).fSchema, 1);
         EXPECT_EQ(Parse<RunChoice>({"run", "--format", form, "--schema", "2"}).fSchema, 2);
     }
+    for (const char* form : {"json", "jsonl", "html"})
+        EXPECT_TRUE(Parse<RunChoice>({"run", "--format", form, "--identify"}).fIdentify);
     EXPECT_EQ(Parse<RunChoice>({"run", "--format", "prometheus"}).fFormat, Format::kPrometheus);
     EXPECT_EQ(Parse<RunChoice>({"run", "--format", "nfd"}).fFormat, Format::kNodeFeatures);
     EXPECT_EQ(Parse<RunChoice>({"run", "--format", "ansible"}).fFormat, Format::kAnsible);
@@ -76,6 +78,9 @@ TEST(CommandLineOfRun, RepeatsOrRunsForATime)
     const auto timed = Parse<RunChoice>({"run", "--for", "1.5", "--repeat=2", "--raw"});
     EXPECT_EQ(timed.fSeries.fSeconds, 1.5);
     EXPECT_EQ(timed.fSeries.fRuns, 2U);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--repeat=1"}).fSeries.fRuns, 1U);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--repeat=100000"}).fSeries.fRuns, 100000U);
+    EXPECT_EQ(Parse<RunChoice>({"run", "--for=0", "--repeat=1"}).fSeries.fSeconds, 0);
 }
 
 TEST(CommandLineOfTorture, NamesItsFailures)
@@ -113,6 +118,14 @@ TEST(CommandLineOfDiff, HasFilesAndATolerance)
     EXPECT_EQ(plain.fBefore, "a");
     EXPECT_THAT(plain.fAfter, ElementsAre("b"));
     EXPECT_EQ(plain.fTolerance, 0.1);
+    EXPECT_FALSE(plain.fSeriesTolerance);
+    EXPECT_FALSE(plain.fIdentity);
+    EXPECT_EQ(plain.fFormat, Format::kText);
+    EXPECT_EQ(plain.fOutput, "");
+    EXPECT_TRUE(Parse<DiffChoice>({"diff", "a", "b", "--identity"}).fIdentity);
+    EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--format=json"}).fFormat, Format::kJson);
+    EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--format=html"}).fFormat, Format::kHtml);
+    EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--output", "c"}).fOutput, "c");
     EXPECT_FALSE(plain.fAll);
     EXPECT_TRUE(Parse<DiffChoice>({"diff", "--all", "a", "b"}).fAll);
     // On every system.
@@ -121,6 +134,8 @@ TEST(CommandLineOfDiff, HasFilesAndATolerance)
     EXPECT_THAT(absolute.fAfter, ElementsAre("/c"));
     EXPECT_EQ(Parse<DiffChoice>({"diff", "--tolerance", "0", "a", "b"}).fTolerance, 0);
     EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--tolerance=2.5"}).fTolerance, 2.5);
+    // One that is asked for holds for series too, also if it is the usual one.
+    EXPECT_EQ(Parse<DiffChoice>({"diff", "a", "b", "--tolerance=0.1"}).fSeriesTolerance, 0.1);
 }
 
 TEST(CommandLineOfShow, HasAFileAndAForm)
@@ -136,6 +151,41 @@ TEST(CommandLineOfShow, HasAFileAndAForm)
     EXPECT_EQ(full.fSchema, 1);
     EXPECT_EQ(full.fOutput, "b");
     EXPECT_EQ(Parse<ShowChoice>({"show", "a", "--format=html"}).fFormat, Format::kHtml);
+}
+
+TEST(CommandLineOfCheck, HasAStateOrABaseline)
+{
+    const auto plain = Parse<CheckChoice>({"check", "--require=a"});
+    EXPECT_EQ(plain.fState, "");
+    EXPECT_EQ(plain.fMaxAgeDays, 30);
+    EXPECT_EQ(plain.fBaseline, "");
+    EXPECT_EQ(plain.fTolerance, 0.1);
+    const auto state =
+        Parse<CheckChoice>({"check", "--require=a", "--state", "s", "--max-age", "2.5"});
+    EXPECT_EQ(state.fState, "s");
+    EXPECT_EQ(state.fMaxAgeDays, 2.5);
+    EXPECT_EQ(Parse<CheckChoice>({"check", "--baseline=b", "--tolerance=0"}).fTolerance, 0);
+}
+
+TEST(CommandLineOfBugReport, HasAnOptionForEachField)
+{
+    const auto plain = Parse<BugReportChoice>({"bugreport"});
+    EXPECT_EQ(plain.fOutput, "");
+    EXPECT_FALSE(plain.fYes);
+    EXPECT_EQ(plain.fChild.fTimeoutSeconds, 60);
+    const auto full = Parse<BugReportChoice>(
+        {"bugreport", "--assay", "a", "--timeout=2", "--output", "o", "--yes", "--", "-x"});
+    EXPECT_EQ(full.fChild.fProgram, "a");
+    EXPECT_EQ(full.fChild.fTimeoutSeconds, 2);
+    EXPECT_THAT(full.fChild.fArgs, ElementsAre("-x"));
+    EXPECT_EQ(full.fOutput, "o");
+    EXPECT_TRUE(full.fYes);
+}
+
+TEST(CommandLineOfExplain, HasKeys)
+{
+    EXPECT_THAT(Parse<ExplainChoice>({"explain"}).fKeys, IsEmpty());
+    EXPECT_THAT(Parse<ExplainChoice>({"explain", "a", "b"}).fKeys, ElementsAre("a", "b"));
 }
 
 struct Row {
@@ -160,6 +210,13 @@ TEST(CommandLine, RejectsWhatNoCommandTakes)
         {{"run", "--schema", "2"}, kErrorStatus},
         {{"run", "--schema", "0", "--format", "json"}, kErrorStatus},
         {{"run", "--need", "nothing"}, kErrorStatus},
+        {{"run", "--repeat", "0"}, kErrorStatus},
+        {{"run", "--repeat", "100001"}, kErrorStatus},
+        {{"run", "--for", "0"}, kErrorStatus},
+        {{"check", "--require=a", "--tolerance", "0.2"}, kErrorStatus},
+        {{"check", "--require=a", "--max-age", "2"}, kErrorStatus},
+        {{"bugreport", "x"}, kErrorStatus},
+        {{"bugreport", "--output", ""}, kErrorStatus},
         {{"torture", "--format", "text"}, kErrorStatus},
         {{"torture", "--kind", ""}, kErrorStatus},
         {{"torture", "--", "-crashAfter=1"}, kErrorStatus},
