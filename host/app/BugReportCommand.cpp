@@ -44,9 +44,7 @@ public:
 
 void Print(const std::string& text)
 {
-    const std::unique_ptr<Output> output = OpenStandardOutput();
-    output->Write(text);
-    output->Finish();
+    OpenStandardOutput()->Write(text);
 }
 
 // "assay-bugreport-20261122T142526Z"
@@ -133,6 +131,8 @@ int BugReport(const BugReportChoice& choice)
     output->Open();
     output->Write(MakeArchive(packed, time));
     output->Finish();
+    // The reader of the output may not read.
+    SetInterruptEnd([] { EndProcess(GetVerdictStatus(Verdict::kInterrupted)); });
     Print(fmt::format("{} was written:\n{}", ShowBytes(path), list));
     return 0;
 }

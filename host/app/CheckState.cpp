@@ -54,9 +54,7 @@ int CheckState(const CheckChoice& choice)
 {
     Checker checker(choice);
     const Identity identity = GetIdentity(MakeChildOptions(choice.fChild).fProgram);
-    const std::unique_ptr<Folder> folder = OpenFolder(choice.fState, FolderUse::kRead);
-    if (const std::string problem = folder->GetProblem(); !problem.empty())
-        throw std::runtime_error(fmt::format("{}: {}", choice.fState, problem));
+    const std::unique_ptr<Folder> folder = OpenUsableFolder(choice.fState);
     AdviceRequest request;
     request.fNeedsOpenGL = checker.RequiresUsable(DeviceKind::kOpenGL);
     request.fNeedsOpenCL = checker.RequiresUsable(DeviceKind::kOpenCL);

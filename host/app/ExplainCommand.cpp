@@ -1,5 +1,4 @@
 #include <cstddef>
-#include <memory>
 #include <sstream>
 #include <stdexcept>
 #include <string>
@@ -23,12 +22,12 @@ namespace assay_host {
 
 namespace {
 
-// Returns the last name in brackets without its namespace: "GL_MAX_DRAW_BUFFERS" of
+// Returns the name in brackets at the key's end without its namespace: "GL_MAX_DRAW_BUFFERS" of
 // "glGetIntegerv[GL_MAX_DRAW_BUFFERS]"; empty without brackets.
 std::string_view GetInnerName(std::string_view key)
 {
     const std::size_t open = key.rfind('[');
-    if (open == std::string_view::npos || key.back() != ']')
+    if (open == std::string_view::npos)
         return {};
     std::string_view name = key.substr(open + 1, key.size() - open - 2);
     const std::size_t colons = name.rfind("::");
@@ -110,9 +109,7 @@ int Explain(const ExplainChoice& choice)
             separator = "\n";
         }
     }
-    const std::unique_ptr<Output> output = OpenStandardOutput();
-    output->Write(out.str());
-    output->Finish();
+    OpenStandardOutput()->Write(out.str());
     return 0;
 }
 

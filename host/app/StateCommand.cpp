@@ -76,7 +76,7 @@ int State(const StateChoice& choice)
     const bool isChange =
         choice.fAction == StateAction::kForget || choice.fAction == StateAction::kSet;
     const std::unique_ptr<Folder> folder =
-        OpenFolder(choice.fState, isChange ? FolderUse::kWrite : FolderUse::kRead);
+        isChange ? OpenFolder(choice.fState, FolderUse::kWrite) : OpenUsableFolder(choice.fState);
     Store store(*folder);
     const std::int64_t now = MakeSystemMachine()->GetTime();
     std::string text;

@@ -85,6 +85,9 @@ enum class FolderUse { kRead, kWrite };
 // reason.
 std::unique_ptr<Folder> OpenFolder(const std::string& path, FolderUse use);
 
+// Opens a folder to read. Throws std::runtime_error, "PATH: REASON", if it can't be used.
+std::unique_ptr<Folder> OpenUsableFolder(const std::string& path);
+
 // Returns a folder that can't be used.
 std::unique_ptr<Folder> MakeUnusableFolder(const std::string& reason);
 

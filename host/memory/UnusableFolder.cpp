@@ -1,5 +1,7 @@
 #include "memory/Folder.h"
 
+#include <stdexcept>
+
 namespace assay_host {
 
 namespace {
@@ -23,6 +25,14 @@ private:
 };
 
 } // namespace
+
+std::unique_ptr<Folder> OpenUsableFolder(const std::string& path)
+{
+    std::unique_ptr<Folder> folder = OpenFolder(path, FolderUse::kRead);
+    if (const std::string problem = folder->GetProblem(); !problem.empty())
+        throw std::runtime_error(path + ": " + problem);
+    return folder;
+}
 
 std::unique_ptr<Folder> MakeUnusableFolder(const std::string& reason)
 {

@@ -4,6 +4,7 @@ import os
 import pty
 import re
 import select
+import signal
 import socket
 import stat
 import zipfile
@@ -12,15 +13,26 @@ import pytest
 
 import test_usable
 from calls import FullMachine
-from harness import DEADLINE, PROGRAM_AT_ROOT
-from hosting import ERROR_STATUS, Watched, host_run, host_run_until, script_child, text_of
+from harness import DEADLINE, PROGRAM_AT_ROOT, until
+from hosting import (ERROR_STATUS, HOST_ON_CUE, STATUSES, Watched, host_run, host_run_until,
+                     script_child, text_of)
+from namespaces import Namespace, why_no_namespace
 from test_usable import FAILURES, hangs
 from validate import validate_document
 
 pytestmark = test_usable.pytestmark
 
-FILES = ["README.txt", "summary.txt", "report.txt", "report.json", "system.txt", "adapters.txt",
-         "drivers.txt", "kernel.txt"]
+FILES = {
+    "README.txt": "what the archive has, and what is missing",
+    "summary.txt": "the run as text: what works, and what to do",
+    "report.txt": "each line of assay with its log, and standard error",
+    "report.json": "the run for programs; assay-host show makes any form of it",
+    "system.txt": "versions of the programs, the system and the kernel",
+    "adapters.txt": "the system's lists of graphics adapters",
+    "drivers.txt": "the files of the drivers, with their versions",
+    "kernel.txt": "messages of the kernel about graphics",
+}
+NO_NAMESPACE = why_no_namespace()
 CHILD = "echo 'Tester=\"Pixmere\"'"
 
 
@@ -50,6 +62,12 @@ class Archive:
         return {} if part == "nothing" else dict(line.split(None, 1) for line in part.splitlines())
 
 
+def announcement(path):
+    """What is printed before anything is done."""
+    return (f"{path} will have:\n" + "".join(f"  {name:<12}  {what}\n" for name, what in FILES.items())
+            + "The names of this machine and of its user and the paths of home folders are masked.\n")
+
+
 def bugreport(folder, *options, child=CHILD, **more):
     path = folder / "report.zip"
     run = host_run("bugreport", "--assay", str(script_child(folder, child)), "--output", str(path),
@@ -70,7 +88,7 @@ def run_machine(folder, failure, **variables):
 
 def test_what_an_archive_has(tmp_path):
     run, archive = run_machine(tmp_path, FAILURES["none"])
-    assert archive.names == FILES
+    assert archive.names == list(FILES)
     assert re.fullmatch(r"assay-bugreport-\d{8}T\d{6}Z", archive.folder)
     assert archive.modes == {"-rw-r--r--"}
     document = archive.document()
@@ -86,14 +104,18 @@ def test_what_an_archive_has(tmp_path):
     for file in document["drivers"]["files"]:
         assert f"{file['interface']} {file['path']}\n" in archive.text("drivers.txt")
     assert document["versions"]["assay-host"]["value"] in archive.text("system.txt")
+    assert not document["environment"]["host"]["known"]
+    assert any(file["buildId"]["known"] for file in document["drivers"]["files"])
     for name in FILES:
         assert archive.bytes[name]
         if name != "README.txt":
             assert f"\n{name} " in archive.text("README.txt")
-        # It is listed before the run, and with its size afterwards.
-        first, last = run.text.split(" was written:\n")
-        assert f"\n  {name} " in first
-        assert re.search(rf"^  {re.escape(name)} +{len(archive.bytes[name])} bytes", last, re.M)
+    # The files are listed before the run, and with their sizes afterwards.
+    missing = archive.missing()
+    path = tmp_path / "report.zip"
+    assert run.text == announcement(path) + f"{path} was written:\n" + "".join(
+        f"  {name:<12}  {len(archive.bytes[name])} bytes"
+        + (f"; not known: {missing[name]}\n" if name in missing else "\n") for name in FILES)
 
 
 def test_the_kernel_log_is_there_or_has_its_reason(tmp_path):
@@ -105,6 +127,21 @@ def test_the_kernel_log_is_there_or_has_its_reason(tmp_path):
         assert archive.text("kernel.txt") == f"not known ({reason})\n"
     else:
         assert "not known" not in archive.text("kernel.txt")
+
+
+@pytest.mark.skipif(NO_NAMESPACE is not None, reason=str(NO_NAMESPACE))
+def test_the_kernel_messages_of_the_run(tmp_path):
+    """The child causes them: they are read after its end."""
+    with Namespace() as space:
+        log = tmp_path / "log"
+        log.touch()
+        space.cover("/dev/kmsg", log)
+        child = script_child(tmp_path, f"echo '6,1,2000000,-;amdgpu: ring gfx timeout' > {log}")
+        path = tmp_path / "report.zip"
+        run = host_run(*space.around[1:], HOST_ON_CUE, "bugreport", "--assay", child, "--output", path,
+                       "--yes", program=space.around[0])
+    assert run.status == 0
+    assert "amdgpu: ring gfx timeout" in Archive(path).text("kernel.txt")
 
 
 @pytest.mark.parametrize("name", ["crash in the compiler", "crash in the copy",
@@ -136,7 +173,9 @@ def test_a_child_that_is_not_there(tmp_path):
     path = tmp_path / "report.zip"
     run = host_run("bugreport", "--assay", "/no/such/program", "--output", str(path), "--yes")
     assert run.status == 0
-    missing = Archive(path).missing()
+    archive = Archive(path)
+    assert archive.document()["versions"]["assay"] == {"known": False, "reason": "its file can't be read"}
+    missing = archive.missing()
     assert missing["report.txt"] == "assay printed nothing"
     assert missing["drivers.txt"] == "the child was not started"
 
@@ -197,12 +236,12 @@ def test_nobody_is_asked_without_a_terminal(tmp_path):
     assert run.status == ERROR_STATUS
     assert text_of(run.err) == ("assay-host: standard input is no terminal to ask on; --yes writes the "
                                 "archive without asking\n")
-    assert "README.txt" in run.text
+    assert run.text == announcement(path)
     assert not path.exists()
 
 
-@pytest.mark.parametrize("answer, status", [(b"y\n", 0), (b"yes\n", 0), (b"n\n", 1), (b"\n", 1),
-                                            (b"\x04", 1)])
+@pytest.mark.parametrize("answer, status", [(b"y\n", 0), (b"Y\n", 0), (b"yes\n", 0), (b"n\n", 1),
+                                            (b"\n", 1), (b"\x04", 1)])
 def test_a_terminal_is_asked(tmp_path, answer, status):
     path = tmp_path / "report.zip"
     control, terminal = pty.openpty()
@@ -213,10 +252,22 @@ def test_a_terminal_is_asked(tmp_path, answer, status):
         while b"[y/N]" not in asked:
             assert select.select([watched.process.stderr], [], [], DEADLINE)[0]
             asked += os.read(watched.process.stderr.fileno(), 4096)
+        assert asked == b"Write it? [y/N] "
         os.write(control, answer)
         run = watched.finish()
     os.close(control)
     assert run.status == status
     assert path.exists() == (status == 0)
     if status:
-        assert run.text.endswith("Nothing was written.\n")
+        assert run.text == announcement(path) + "Nothing was written.\n"
+
+
+def test_an_interrupt_writes_nothing(tmp_path):
+    path = tmp_path / "report.zip"
+    child = script_child(tmp_path, f"touch {tmp_path}/there; exec sleep 1000000")
+    with Watched("bugreport", "--assay", child, "--output", path, "--yes", "--timeout", "0") as watched:
+        until((tmp_path / "there").exists, "the child doesn't start")
+        watched.process.send_signal(signal.SIGTERM)
+        run = watched.finish()
+    assert (run.status, run.text, run.err) == (STATUSES["interrupted"], announcement(path), b"")
+    assert sorted(file.name for file in tmp_path.iterdir()) == ["child", "there"]

@@ -3,6 +3,7 @@
 import os
 import re
 import signal
+import uuid
 
 import pytest
 
@@ -66,6 +67,17 @@ def test_a_crash_is_remembered(checks):
         assert text.startswith(f"not met: opencl.usable{relation}hardware: not known (")
 
 
+def test_the_cause_of_a_failure_is_shown(checks):
+    """From memory, and by a run."""
+    checks.set_driver("at eglCreateContext error EGL_BAD_ALLOC\n")
+    text = (f"not met: {GL}: broken (No OpenGL context could be created on any display device: "
+            "eglCreateContext failed for display device egl:0: EGL_BAD_ALLOC (0x3003).)\n")
+    checks.advise()
+    assert checks.check(GL) == (7, text, "")
+    run = host_run("check", "--require", GL, "--assay", checks.child, environment=checks.environment)
+    assert (run.status, run.text, run.err) == (7, text, b"")
+
+
 def test_folder_that_cannot_be_used_is_an_error(checks, tmp_path):
     missing = tmp_path / "nothing"
     assert checks.check(GL, state=missing) == (
@@ -116,10 +128,12 @@ def test_what_is_too_old_does_not_count(checks):
 
 def test_damaged_file_is_nothing_known_with_a_message(checks):
     checks.advise()
-    checks.file().write_bytes(b"x")
+    file = checks.file()
+    file.write_bytes(b"x")
+    file.with_stem(str(uuid.UUID(int=0))).write_bytes(b"x") # of another state of the machine
     status, text, err = checks.check(GL)
     assert (status, text) == (7, NOT_TRIED)
-    assert err.startswith("assay-host: ")
+    assert err == f"assay-host: The state file {file.name} is ignored: it is damaged.\n"
 
 
 def test_the_choice_of_the_user_says_nothing_about_the_machine(checks):
@@ -142,3 +156,41 @@ def test_attempt_in_progress_is_not_waited_for(checks):
     checks.set_driver("")
     assert checks.advise().status == HARDWARE
     assert checks.check(GL)[0] == 0
+
+
+def test_attempt_in_progress_counts_only_for_what_is_due(checks):
+    """OpenGL is known for a month, and the absence of OpenCL for ten minutes."""
+    other = "Another process is trying the drivers at this moment."
+    checks.advise()
+
+    def age(content):
+        content["attempts"][-1]["ended"] -= 1000
+
+    checks.rewrite(age)
+    checks.set_driver("at eglInitialize hang\n")
+    with checks.start("--timeout", "0", "--need", "opencl") as call:
+        until(lambda: checks.has_open_attempt() and checks.children == 2, "no attempt")
+        assert checks.check(GL)[0] == 0
+        assert other in checks.check(CL)[1]
+        assert checks.check(GL, CL)[1].count(other) == 2
+        assert other in checks.check(GL, options=["--max-age", "0.001"])[1]
+        os.kill(call.process.pid, signal.SIGTERM)
+        assert call.finish().status == INTERRUPTED
+
+
+def test_attempt_in_progress_does_not_hide_what_is_known(checks):
+    """The absence of OpenCL is known; what is known of OpenGL is too old here."""
+    checks.advise()
+
+    def age(content):
+        content["attempts"][-1]["ended"] -= 100
+
+    checks.rewrite(age)
+    checks.set_driver("at eglInitialize hang\n")
+    with checks.start("--timeout", "0", "--fresh") as call:
+        until(lambda: checks.has_open_attempt() and checks.children == 2, "no attempt")
+        status, text, _ = checks.check(CL, options=["--max-age", "0.001"])
+        assert status == 7
+        assert text.startswith(f"not met: {CL}: absent (")
+        os.kill(call.process.pid, signal.SIGTERM)
+        assert call.finish().status == INTERRUPTED

@@ -1,9 +1,15 @@
 """assay-host explain."""
 
+import fcntl
+import os
+import pty
+import struct
+import termios
+
 import pytest
 
 from harness import TREE
-from hosting import ERROR_STATUS, host_run, run_assay, text_of
+from hosting import ERROR_STATUS, host_run, read_to_the_end, run_assay, text_of
 
 
 def explain(*keys):
@@ -19,6 +25,8 @@ def test_all_keys_are_listed_and_explained():
     assert (listed.status, listed.err) == (0, b"")
     keys = [line.split(" (")[0] for line in listed.text.splitlines()]
     assert len(keys) == len(set(keys)) > 50
+    assert {"GLMemoryMB (Memory)", "glGetIntegerv[GL_MAX_DRAW_BUFFERS] (Draw buffers)",
+            "assayEnd"} < set(listed.text.splitlines())
     explained = explain(*keys)
     assert explained.status == 0
     titles = [part.splitlines()[0].split(": ")[0] for part in explained.text.split("\n\n")]
@@ -60,6 +68,25 @@ GLVersion: OpenGL version
            or later.
   Source   glGetString(GL_VERSION)
 """
+    assert explain("GLMemoryMB").text == """\
+GLMemoryMB: Memory
+  Meaning  The device's memory, the largest figure of all sources. For an
+           integrated device a part of the machine's memory is counted. 0 means
+           that no source has it, as with a software renderer.
+  Unit     MiB
+  Source   the system's adapter lists, and a query of AMD's and NVIDIA's drivers
+"""
+
+
+def test_a_paragraph_fits_the_terminal():
+    control, terminal = pty.openpty()
+    fcntl.ioctl(terminal, termios.TIOCSWINSZ, struct.pack("HHHH", 24, 50, 0, 0))
+    assert host_run("explain", "GLVersion", stdout=terminal).status == 0
+    os.close(terminal)
+    shown = read_to_the_end(control).decode()
+    os.close(control)
+    assert joined(shown) == joined(explain("GLVersion").text)
+    assert max(map(len, shown.splitlines())) in range(45, 51)
 
 
 @pytest.mark.parametrize("name, message", [
@@ -68,6 +95,10 @@ GLVersion: OpenGL version
     ("price of the card", '"price of the card" is no key of a report; "assay-host explain" lists them'),
     ("\x1b[31m", '"\\x1B[31m" is no key of a report; "assay-host explain" lists them'),
     ("", '"" is no key of a report; "assay-host explain" lists them'),
+    ("x:", '"x:" is no key of a report; "assay-host explain" lists them'),
+    ("GLMemoryM", '"GLMemoryM" is no key of a report; did you mean "GLMemoryMB"?'),
+    ("GL_MAX_DRAW_BUFFER", '"GL_MAX_DRAW_BUFFER" is no key of a report; did you mean "GL_MAX_DRAW_BUFFERS"?'),
+    ("Compute scores", '"Compute scores" is no key of a report; did you mean "Compute score"?'),
 ])
 def test_what_is_no_key(name, message):
     run = explain("GLName", name)

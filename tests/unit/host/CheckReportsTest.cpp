@@ -7,6 +7,7 @@
 #include <string>
 
 #include "app/Commands.h"
+#include "support/TempPath.h"
 
 namespace assay_host {
 namespace {
@@ -32,21 +33,25 @@ protected:
         CheckChoice choice;
         choice.fRequirements = {requirement};
         choice.fReports = reports;
+        return CheckAll(choice);
+    }
+
+    int CheckAll(const CheckChoice& choice)
+    {
         testing::internal::CaptureStdout();
         const int status = Check(choice);
         fText = testing::internal::GetCapturedStdout();
         return status;
     }
 
-    const std::string fOne = testing::TempDir() + "assay-check-one";
-    const std::string fTwo = testing::TempDir() + "assay-check-two";
-    std::string fText;
-
-private:
     static void Write(const std::string& path, const std::string& text)
     {
         std::ofstream(path, std::ios::binary) << text;
     }
+
+    const std::string fOne = MakeTempPath("assay-check-one");
+    const std::string fTwo = MakeTempPath("assay-check-two");
+    std::string fText;
 };
 
 TEST_F(CheckReportsTest, HasTheStatusOfWhetherAllMeetAll)
@@ -66,6 +71,36 @@ TEST_F(CheckReportsTest, NamesTheReportsIfThereAreMore)
     EXPECT_THAT(fText, HasSubstr("NumGLGPUs>=2"));
     CheckAll("NumGLGPUs>=2", {fOne, fTwo});
     EXPECT_THAT(fText, HasSubstr(fOne + ": "));
+}
+
+// A measurement may be larger, and smaller by the tolerance.
+TEST_F(CheckReportsTest, HoldsMeasurementsToABaseline)
+{
+    const auto write = [](const std::string& path, const std::string& score) {
+        Write(path, "assayStart=\"x\"\nNumGLGPUs=0\nNumCLGPUs=1\nclgpu[0].CLCompute=" + score +
+                        "\nassayEnd=\"y\"\n");
+    };
+    write(fOne, "100");
+    CheckChoice choice;
+    choice.fBaseline = fOne;
+    choice.fReports = {fTwo};
+    write(fTwo, "200");
+    EXPECT_EQ(CheckAll(choice), 0);
+    EXPECT_EQ(fText, "met: the baseline\n");
+    write(fTwo, "91");
+    EXPECT_EQ(CheckAll(choice), 0);
+    write(fTwo, "89");
+    EXPECT_EQ(CheckAll(choice), kUnmetStatus);
+    EXPECT_THAT(fText, HasSubstr("not as the baseline: clgpu[0].CLCompute: 100 -> 89"));
+    EXPECT_THAT(fText, Not(HasSubstr("met: ")));
+    choice.fTolerance = 0.2;
+    EXPECT_EQ(CheckAll(choice), 0);
+    choice.fRequirements = {"NumCLGPUs>=1", "NumGLGPUs==0"};
+    EXPECT_EQ(CheckAll(choice), 0);
+    EXPECT_EQ(fText, "met: all 2 requirements and the baseline\n");
+    choice.fRequirements = {"NumCLGPUs>=2"};
+    EXPECT_EQ(CheckAll(choice), kUnmetStatus);
+    EXPECT_EQ(fText, "not met: NumCLGPUs>=2: 1\n");
 }
 
 TEST_F(CheckReportsTest, FailsForAFileThatIsNotThere)

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "app/Commands.h"
+#include "support/TempPath.h"
 
 namespace assay_host {
 namespace {
@@ -37,7 +38,7 @@ protected:
 
     void Remove() const { std::filesystem::remove_all(fFolder); }
 
-    const std::string fFolder = testing::TempDir() + "assay-check-state";
+    const std::string fFolder = MakeTempPath("assay-check-state");
     std::string fText;
 };
 
