@@ -57,7 +57,7 @@ Stamp MakeStamp(const std::string& time)
     unsigned minute = 0;
     unsigned second = 0;
     constexpr unsigned kFirstYear = 1980;
-    if (std::sscanf(time.c_str(), "%4u-%2u-%2uT%2u:%2u:%2uZ", &year, &month, &day, &hour, &minute,
+    if (std::sscanf(time.c_str(), "%4u-%2u-%2uT%2u:%2u:%2u", &year, &month, &day, &hour, &minute,
                     &second) != 6 ||
         year < kFirstYear)
         return {};

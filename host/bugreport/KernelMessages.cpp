@@ -2,7 +2,9 @@
 #include <charconv>
 #include <cstdint>
 #include <iterator>
+#include <locale>
 
+#include <boost/algorithm/string/case_conv.hpp>
 #include <fmt/format.h>
 
 #include "bugreport/KernelLog.h"
@@ -11,24 +13,15 @@ namespace assay_host {
 
 namespace {
 
-// Parts of messages, in lower case: drivers and subsystems of the kernel.
+// Parts of messages, in lower case: drivers and subsystems of the kernel. "gpu" is part of the
+// names of some drivers.
 constexpr std::string_view kParts[] = {
-    "drm",       "amdgpu",  "radeon",       "i915",     "intel_fb", "nouveau",     "nvidia",
-    "nvrm",      "vgaarb",  "vga ",         "gpu",      "kfd",      "virtio_gpu",  "vmwgfx",
-    "vboxvideo", "qxl",     "mgag200",      "simplefb", "efifb",    "framebuffer", "panfrost",
-    "lima",      "etnaviv", "msm_dpu",      "v3d",      "vc4",      "tegra",       "asahi",
-    "xe 0000:",  " assay[", "assay-worker",
+    "drm",       "radeon", "i915",     "intel_fb", "nouveau",      "nvidia",
+    "nvrm",      "vgaarb", "vga ",     "gpu",      "kfd",          "vmwgfx",
+    "vboxvideo", "qxl",    "mgag200",  "simplefb", "efifb",        "framebuffer",
+    "panfrost",  "lima",   "etnaviv",  "msm_dpu",  "v3d",          "vc4",
+    "tegra",     "asahi",  "xe 0000:", " assay[",  "assay-worker",
 };
-
-std::string ToLower(std::string_view text)
-{
-    std::string lower(text);
-    std::transform(lower.begin(), lower.end(), lower.begin(), [](char character) {
-        return character >= 'A' && character <= 'Z' ? static_cast<char>(character - 'A' + 'a')
-                                                    : character;
-    });
-    return lower;
-}
 
 } // namespace
 
@@ -39,9 +32,7 @@ std::string ReadKernelRecord(std::string_view record)
         return {};
     // Priority, number, microseconds, flags.
     const std::string_view prefix = record.substr(0, end);
-    const std::size_t first = prefix.find(',');
-    const std::size_t second =
-        first == std::string_view::npos ? first : prefix.find(',', first + 1);
+    const std::size_t second = prefix.find(',', prefix.find(',') + 1);
     if (second == std::string_view::npos)
         return {};
     const std::string_view rest = prefix.substr(second + 1);
@@ -57,7 +48,8 @@ std::string ReadKernelRecord(std::string_view record)
 
 bool IsGraphicsMessage(std::string_view line)
 {
-    const std::string lower = ToLower(line);
+    const std::string lower =
+        boost::algorithm::to_lower_copy(std::string(line), std::locale::classic());
     return std::any_of(std::begin(kParts), std::end(kParts), [&lower](std::string_view part) {
         return lower.find(part) != std::string::npos;
     });

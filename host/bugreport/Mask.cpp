@@ -30,13 +30,13 @@ std::string FoldAll(std::string text)
 
 bool NamesNobody(const std::string& folded)
 {
-    return folded.empty() || folded == "root" || folded == "localhost" || folded == "/";
+    return folded.empty() || folded == "root" || folded == "localhost";
 }
 
-// "/home/alice/" is found in "/home/alice".
+// "/home/alice/" is found in "/home/alice". Nothing is left of the root folder.
 std::string TrimSlashes(std::string text)
 {
-    while (text.size() > 1 && (text.back() == '/' || text.back() == '\\'))
+    while (!text.empty() && (text.back() == '/' || text.back() == '\\'))
         text.pop_back();
     return text;
 }
@@ -78,7 +78,6 @@ const Secret* Mask::FindAt(std::string_view text, std::size_t at) const
 std::string Mask::Apply(std::string_view text) const
 {
     std::string masked;
-    masked.reserve(text.size());
     for (std::size_t at = 0; at < text.size();) {
         const Secret* const found = FindAt(text, at);
         masked += found ? found->fWord : std::string(1, text[at]);

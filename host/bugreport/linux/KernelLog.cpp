@@ -22,7 +22,8 @@ namespace {
 
 using Lines = std::vector<std::string>;
 
-// Returns nothing if the device can't be read, and then the reason.
+// Returns nothing if the device can't be read, and then the reason. A record that has another form
+// is an empty line.
 std::optional<Lines> ReadDevice(const std::string& path, std::string& reason)
 {
     const int file = ::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
@@ -39,10 +40,8 @@ std::optional<Lines> ReadDevice(const std::string& path, std::string& reason)
         if (size == 0)
             break;
         error = size < 0 ? errno : 0;
-        std::string line = ReadKernelRecord(
-            {record.data(), static_cast<std::size_t>(std::max<::ssize_t>(size, 0))});
-        if (!line.empty())
-            lines.push_back(std::move(line));
+        lines.push_back(ReadKernelRecord(
+            {record.data(), static_cast<std::size_t>(std::max<::ssize_t>(size, 0))}));
     }
     ::close(file);
     // EAGAIN: there are no more messages.

@@ -38,7 +38,7 @@ std::vector<Secret> ListSecrets()
     std::vector<Secret> secrets;
     AddHost(secrets);
     const auto getVariable = [](const char* name) {
-        const char* const value = std::getenv(name);
+        const char* const value = std::getenv(name); // NOLINT(concurrency-mt-unsafe)
         return std::string(value ? value : "");
     };
     secrets.push_back({getVariable("HOME"), "HOME"});
@@ -46,9 +46,9 @@ std::vector<Secret> ListSecrets()
         const std::string name = getVariable(variable);
         secrets.push_back({name, "USER"});
         if (!name.empty())
-            AddEntry(secrets, ::getpwnam(name.c_str()));
+            AddEntry(secrets, ::getpwnam(name.c_str())); // NOLINT(concurrency-mt-unsafe)
     }
-    AddEntry(secrets, ::getpwuid(::getuid()));
+    AddEntry(secrets, ::getpwuid(::getuid())); // NOLINT(concurrency-mt-unsafe)
     return secrets;
 }
 
