@@ -62,7 +62,7 @@ Adviser::Adviser(Folder& folder, Machine& machine, const Identity& identity, Adv
     : fFolder(folder),
       fMachine(machine),
       fIdentity(identity),
-      fRequest(std::move(request)),
+      fRequest(request),
       fStore(folder),
       fChoice(fStore.LoadChoice())
 {}

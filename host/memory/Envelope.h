@@ -18,7 +18,7 @@ namespace assay_host {
 constexpr int kStateFormat = 1;
 
 // Larger files are neither read nor written.
-constexpr std::size_t kMaxStateBytes = 256 * 1024;
+constexpr std::size_t kMaxStateBytes = std::size_t{256} * 1024;
 
 enum class Soundness {
     kSound,

@@ -50,7 +50,7 @@ std::string MakeText(const Knowledge& knowledge)
 
 bool IsNewer(const FileRead& read)
 {
-    return read.fState == FileState::kRead && Unseal(read.fText).fSoundness == Soundness::kNewer;
+    return Unseal(read.fText).fSoundness == Soundness::kNewer;
 }
 
 } // namespace

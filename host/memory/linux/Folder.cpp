@@ -8,6 +8,7 @@
 #include <sys/stat.h>
 #include <system_error>
 #include <unistd.h>
+#include <utility>
 
 #include <boost/filesystem/operations.hpp>
 
@@ -28,13 +29,17 @@ std::string GetReason(int error)
 class Descriptor {
 public:
     explicit Descriptor(int number) : fNumber(number) {}
+    Descriptor(Descriptor&& other) noexcept : fNumber(std::exchange(other.fNumber, -1)) {}
+    Descriptor& operator=(Descriptor&& other) noexcept
+    {
+        std::swap(fNumber, other.fNumber);
+        return *this;
+    }
     ~Descriptor()
     {
         if (fNumber >= 0)
             ::close(fNumber);
     }
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
 
     int Get() const { return fNumber; }
 
@@ -51,10 +56,10 @@ private:
 
 class HeldLock : public FolderLock {
 public:
-    explicit HeldLock(std::unique_ptr<Descriptor> file) : fFile(std::move(file)) {}
+    explicit HeldLock(Descriptor&& file) : fFile(std::move(file)) {}
 
 private:
-    const std::unique_ptr<Descriptor> fFile;
+    const Descriptor fFile;
 };
 
 // Returns why the open file must not be used; empty if it may.
@@ -71,7 +76,7 @@ std::string CheckFile(const struct stat& file)
 
 class SystemFolder : public Folder {
 public:
-    explicit SystemFolder(int folder) : fFolder(folder) {}
+    explicit SystemFolder(Descriptor&& folder) : fFolder(std::move(folder)) {}
 
     FileRead Read(const std::string& name, std::size_t maxBytes) override
     {
@@ -133,33 +138,34 @@ public:
     {
         std::vector<FolderEntry> entries;
         const int copy = ::openat(fFolder.Get(), ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-        DIR* const folder = copy >= 0 ? ::fdopendir(copy) : nullptr;
+        const std::unique_ptr<DIR, int (*)(DIR*)> folder(copy >= 0 ? ::fdopendir(copy) : nullptr,
+                                                         ::closedir);
         if (folder == nullptr) {
             if (copy >= 0)
                 ::close(copy);
             return entries;
         }
-        while (const dirent* const entry = ::readdir(folder)) { // NOLINT(concurrency-mt-unsafe)
+        // NOLINTNEXTLINE(concurrency-mt-unsafe): the stream is local to this call
+        while (const dirent* const entry = ::readdir(folder.get())) {
             struct stat found = {};
             if (::fstatat(copy, entry->d_name, &found, AT_SYMLINK_NOFOLLOW) == 0 &&
                 CheckFile(found).empty())
                 entries.push_back({entry->d_name, found.st_mtime});
         }
-        ::closedir(folder);
         return entries;
     }
 
     LockTry TryLock() override
     {
-        auto file = std::make_unique<Descriptor>(
-            ::openat(fFolder.Get(), kLockName,
-                     O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC, kFileMode));
+        Descriptor file(::openat(fFolder.Get(), kLockName,
+                                 O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC,
+                                 kFileMode));
         struct stat found = {};
-        if (file->Get() < 0 || ::fstat(file->Get(), &found) != 0)
+        if (file.Get() < 0 || ::fstat(file.Get(), &found) != 0)
             return {LockState::kFailed, nullptr, GetReason(errno)};
         if (std::string reason = CheckFile(found); !reason.empty())
             return {LockState::kFailed, nullptr, "the lock can't be used: " + reason};
-        if (::flock(file->Get(), LOCK_EX | LOCK_NB) != 0)
+        if (::flock(file.Get(), LOCK_EX | LOCK_NB) != 0)
             return {errno == EWOULDBLOCK ? LockState::kBusy : LockState::kFailed, nullptr,
                     GetReason(errno)};
         return {LockState::kHeld, std::make_unique<HeldLock>(std::move(file)), {}};
@@ -213,22 +219,20 @@ std::unique_ptr<Folder> OpenFolder(const std::string& path, FolderUse use)
         errno != EROFS)
         return MakeUnusableFolder(GetReason(errno));
     constexpr int kFlags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
-    int folder = ::open(place.c_str(), kFlags | O_NOFOLLOW);
+    Descriptor folder(::open(place.c_str(), kFlags | O_NOFOLLOW));
     int error = errno;
     struct stat link = {};
-    if (folder < 0 && ::lstat(place.c_str(), &link) == 0 && S_ISLNK(link.st_mode)) {
+    if (folder.Get() < 0 && ::lstat(place.c_str(), &link) == 0 && S_ISLNK(link.st_mode)) {
         if (link.st_uid != ::geteuid() && link.st_uid != 0)
             return MakeUnusableFolder("it is a link of another user");
-        folder = ::open(place.c_str(), kFlags);
+        folder = Descriptor(::open(place.c_str(), kFlags));
         error = errno;
     }
-    if (folder < 0)
+    if (folder.Get() < 0)
         return MakeUnusableFolder(GetReason(error));
-    if (const std::string reason = CheckFolder(folder); !reason.empty()) {
-        ::close(folder);
+    if (const std::string reason = CheckFolder(folder.Get()); !reason.empty())
         return MakeUnusableFolder(reason);
-    }
-    return std::make_unique<SystemFolder>(folder);
+    return std::make_unique<SystemFolder>(std::move(folder));
 }
 
 } // namespace assay_host

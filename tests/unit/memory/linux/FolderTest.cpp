@@ -5,12 +5,16 @@
 
 #include <csignal>
 #include <fstream>
+#include <functional>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <boost/filesystem/operations.hpp>
+
+#include "support/Allocations.h"
+#include "support/OpenThings.h"
 
 namespace assay_host {
 namespace {
@@ -244,6 +248,39 @@ TEST_F(FolderTest, TheLockEndsWithItsProcess)
     EXPECT_EQ(fFolder->TryLock().fState, LockState::kHeld);
     ::close(held[0]);
     ::close(held[1]);
+}
+
+// Each allocation of each call fails once.
+TEST_F(FolderTest, LeavesNothingOpenWhenMemoryIsShort)
+{
+    const std::string name = "a name that is too long for the memory of a string";
+    const std::string link = (fParent / "link to the folder of the state").native();
+    ASSERT_EQ(fFolder->Write(name, "text"), "");
+    boost::filesystem::create_directory_symlink(fPath, link);
+    const std::function<void()> calls[] = {
+        [&] { OpenFolder(fPath.native(), FolderUse::kRead); },
+        [&] { OpenFolder(link, FolderUse::kWrite); },
+        [&] {
+            OpenFolder(fParent.native() + "/no such folder, but a long name", FolderUse::kRead);
+        },
+        [&] { fFolder->TryLock(); },
+        [&] { fFolder->Read(name, kLimit); },
+        [&] { fFolder->Write(name, "another text"); },
+        [&] { fFolder->List(); },
+    };
+    const long before = CountOpenThings();
+    for (const auto& call : calls) {
+        bool hasFailed = true;
+        for (std::size_t number = 0; hasFailed; ++number) {
+            const assay_test::FailingAllocation failing(number);
+            try {
+                call();
+            } catch (const std::bad_alloc&) {
+            }
+            hasFailed = failing.HasFailed();
+        }
+        EXPECT_EQ(CountOpenThings(), before) << &call - calls;
+    }
 }
 
 TEST_F(FolderTest, ListsManyEntries)
