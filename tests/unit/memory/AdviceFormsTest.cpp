@@ -123,6 +123,26 @@ TEST(AdviceFormsTest, NamesOnlyWhatIsKnownOfADevice)
     EXPECT_THAT(MakeAdviceText(advice), HasSubstr("  device   glgpu[0]\n"));
     finding.fTag.clear();
     EXPECT_THAT(MakeAdviceText(advice), Not(HasSubstr("  device   \n")));
+    finding.fDevice = "A card";
+    EXPECT_THAT(MakeAdviceText(advice), HasSubstr("  device   A card\n"));
+}
+
+TEST(AdviceFormsTest, TellsAnAgeInItsLargestUnit)
+{
+    const std::pair<std::int64_t, const char*> kRows[] = {{0, "now"},
+                                                          {1, "1 second ago"},
+                                                          {59, "59 seconds ago"},
+                                                          {60, "1 minute ago"},
+                                                          {3599, "59 minutes ago"},
+                                                          {3600, "1 hour ago"},
+                                                          {86399, "23 hours ago"},
+                                                          {86400, "1 day ago"},
+                                                          {3 * 86400 - 1, "2 days ago"}};
+    Advice advice = MakeAdvice();
+    for (const auto& [age, text] : kRows) {
+        advice.fOpenGL.fOutlook.fTime = kNow - age;
+        EXPECT_THAT(MakeAdviceText(advice), HasSubstr("Z (" + std::string(text) + ")\n"));
+    }
 }
 
 TEST(AdviceFormsTest, HasTheStatusOfWhatIsNeeded)

@@ -295,15 +295,57 @@ TEST_F(AdviserTest, AnswersUnknownIfAnotherProcessTakesTooLong)
     fRequest.fWaitSeconds = 3;
     fFolder.fReads = 0;
     fPause = [&waited](double seconds) {
+        EXPECT_EQ(seconds, 0.02);
         waited += seconds;
         return true;
     };
     EXPECT_EQ(Show(Advise()), "wait: unknown unknown");
-    EXPECT_NEAR(waited, 3, 0.1);
+    EXPECT_NEAR(waited, 3, 0.021);
     EXPECT_LT(fFolder.fReads, 5); // a lock that is held needs no look at the files
     fPause = [](double) { return false; };
     EXPECT_TRUE(Advise().fStopped);
     EXPECT_EQ(fAttempts, 0);
+}
+
+// What was found before is left out, whether it worked or not.
+TEST_F(AdviserTest, SaysNothingElseWhileAnotherProcessTries)
+{
+    const auto expectNothing = [this] {
+        fFolder.fIsLocked = true;
+        const Advice advice = Advise();
+        fFolder.fIsLocked = false;
+        EXPECT_EQ(Show(advice), "wait: unknown unknown");
+        for (const InterfaceAdvice* part : {&advice.fOpenGL, &advice.fOpenCL}) {
+            EXPECT_EQ(part->fOutlook.fFinding.fReason, "other-instance");
+            EXPECT_EQ(part->fOutlook.fTime, std::nullopt);
+            EXPECT_EQ(part->fOutlook.fNextTime, std::nullopt);
+            EXPECT_EQ(part->fOutlook.fWarning, "");
+            EXPECT_FALSE(part->fIsLast);
+            EXPECT_EQ(part->fEnd, AttemptEnd::kOpen);
+            EXPECT_EQ(part->fEndReason, "");
+            EXPECT_EQ(part->fLastLine, "");
+        }
+    };
+    fRequest.fWaitSeconds = 0;
+    SetEnd(AttemptEnd::kCrashed, kBroken, kBroken);
+    Advise();
+    fMachine.fTime += Policy::kMinute;
+    for (const InterfaceAdvice& part : {Recall().fOpenGL, Recall().fOpenCL}) {
+        EXPECT_NE(part.fOutlook.fTime, std::nullopt);
+        EXPECT_TRUE(part.fIsLast);
+        EXPECT_EQ(part.fEnd, AttemptEnd::kCrashed);
+        EXPECT_NE(part.fEndReason, "");
+        EXPECT_NE(part.fLastLine, "");
+    }
+    expectNothing();
+    SetEnd(AttemptEnd::kEnded, kHardware, kHardware);
+    Advise();
+    fRequest.fFresh = true;
+    for (const InterfaceAdvice& part : {Recall().fOpenGL, Recall().fOpenCL}) {
+        EXPECT_NE(part.fOutlook.fNextTime, std::nullopt);
+        EXPECT_NE(part.fOutlook.fWarning, "");
+    }
+    expectNothing();
 }
 
 TEST_F(AdviserTest, ThoseThatWaitForAFreshAttemptShareIt)

@@ -37,6 +37,8 @@ TEST(ChoiceTest, ReadsWhatItWrote)
     auto json = MakeChoiceJson(choice);
     json["choice"]["opencl"]["answer"] = "broken";
     EXPECT_ANY_THROW(ReadChoiceJson(json));
+    json["choice"].erase("opencl");
+    EXPECT_TRUE(ReadChoiceJson(json).IsEmpty());
 }
 
 } // namespace

@@ -56,18 +56,45 @@ TEST(ClosingTest, KeepsHowTheChildEnded)
     EXPECT_EQ(attempt.fOpenGL.fDevice, "A card");
     EXPECT_EQ(attempt.fOpenGL.fDriver, "1.2");
     EXPECT_EQ(attempt.fOpenCL.fTag, "clgpu[0]");
-    EXPECT_FALSE(attempt.fOpenCL.fDevice.empty());
+    EXPECT_EQ(attempt.fOpenCL.fDevice, "A device");
+    EXPECT_EQ(attempt.fOpenCL.fDriver, "390");
+    EXPECT_EQ(attempt.fOpenGL.fText, "OpenGL works on graphics hardware.");
     RunOutcome outcome;
     outcome.fVerdict = Verdict::kFailedTests;
     outcome.fExitStatus = 2;
     outcome.fLastReportLine = "a report line";
     outcome.fLastLogLine = "# a log line";
     outcome.fReason = std::string(5000, 'x');
+    outcome.fTermination = "signal 6 (Aborted)";
     Attempt failed;
     CloseAttempt(failed, MakeReport(), outcome, kNow);
     EXPECT_EQ(failed.fExitStatus, 2);
+    EXPECT_EQ(failed.fTermination, "signal 6 (Aborted)");
     EXPECT_EQ(failed.fLastLine, "# a log line");
     EXPECT_EQ(failed.fReason.size(), 1000u);
+}
+
+TEST(ClosingTest, KeepsWhatIsKnownOfTheDevice)
+{
+    const auto close = [](const std::string& name) {
+        Attempt attempt;
+        RunOutcome outcome;
+        outcome.fVerdict = Verdict::kComplete;
+        std::vector<std::string> lines;
+        for (std::string line : Join(MakeWholeRun(1, -1))) {
+            if (line == GL(0, "GLName=\"A card\""))
+                line = GL(0, "GLName=\"" + name + "\"");
+            if (line == GL(0, "GLDriverVersion=\"1.2\""))
+                line = GL(0, "GLDriverVersion=\"?\"");
+            lines.push_back(line);
+        }
+        CloseAttempt(attempt, ReadReport(lines), outcome, kNow);
+        return attempt.fOpenGL;
+    };
+    EXPECT_EQ(close("").fDevice, "A renderer") << "the list of adapters has no name";
+    EXPECT_EQ(close("B").fDevice, "B");
+    EXPECT_EQ(close("B").fDriver, "") << "the list of adapters has no version";
+    EXPECT_EQ(close(std::string(1001, 'x')).fDevice, std::string(1000, 'x'));
 }
 
 TEST(ClosingTest, BlamesTheDriverThatEndedTheChild)
@@ -124,7 +151,10 @@ protected:
             attempt};
         const OpenState state = SettleOpen(attempts, fMachine);
         EXPECT_EQ(attempts[0].fEnd, AttemptEnd::kCrashed);
-        EXPECT_EQ(attempts[1].fReason.empty(), state == OpenState::kAlive);
+        EXPECT_EQ(attempts[1].fReason, state == OpenState::kAlive ? ""
+                                       : attempts[1].fEnd == AttemptEnd::kSystemEnded
+                                           ? "The system ended during the attempt."
+                                           : "The host ended during the attempt.");
         return std::string(state == OpenState::kAlive ? "alive " : "settled ") +
                GetAttemptEndName(attempts[1].fEnd);
     }

@@ -66,9 +66,18 @@ TEST(EnvelopeTest, RefusesWhatIsDeeperThanAnyContent)
             content = Json::array({content});
         return Unseal(Seal(content)).fSoundness;
     };
-    EXPECT_EQ(nest(14), Soundness::kSound);
-    EXPECT_EQ(nest(17), Soundness::kDamaged);
+    EXPECT_EQ(nest(15), Soundness::kSound);
+    EXPECT_EQ(nest(16), Soundness::kDamaged);
     EXPECT_EQ(nest(100), Soundness::kDamaged);
+}
+
+// Other versions read these files, and find them by these names.
+TEST(EnvelopeTest, HasALastingForm)
+{
+    EXPECT_EQ(MakeDigest("text"), "3430e2aa-a41e-526f-8045-f90e630b80c6");
+    const std::string body = "  \"content\": {\n    \"text\": 1\n  }\n}\n";
+    EXPECT_EQ(Seal({{"text", 1}}), "{\n  \"format\": 1,\n  \"checksum\": \"" +
+                                       MakeDigest("1\n" + body) + "\",\n" + body);
 }
 
 TEST(EnvelopeTest, DigestsAreNamesOfFiles)

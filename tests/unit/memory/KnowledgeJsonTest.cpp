@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <functional>
 #include <set>
+#include <stdexcept>
 
 #include "Samples.h"
 
@@ -50,6 +51,37 @@ TEST(KnowledgeJsonTest, EachMemberIsNeeded)
         Json changed = json;
         changed[place] = {{"an", "object"}};
         EXPECT_ANY_THROW(ReadKnowledgeJson(changed)) << member.key();
+    }
+}
+
+TEST(KnowledgeJsonTest, NamesWhatItRefuses)
+{
+    const struct {
+        const char* fMember;
+        Json fValue;
+        const char* fText;
+    } kRows[] = {
+        {"/attempts/0/host/process", "7x", "not a number"},
+        {"/attempts/0/host/process", "", "not a number"},
+        {"/count", "-1", "not a number"},
+        {"/attempts/0/exitStatus", 1.5, "not an integer"},
+        {"/identity/adapters/0/vendor", 1.5, "not an integer"},
+        {"/attempts/0/ended", -1, "not a time"},
+        {"/identity/files/0", "OpenGL 5 7 -", "too few words"},
+        {"/identity/files/0", "Vulkan 5 7 - /x", "an unknown interface"},
+        {"/identity/files/0", "OpenGL 5x 7 - /x", "not a number"},
+        {"/attempts/0/end", "later", "an unknown end"},
+        {"/attempts/0/opengl/answer", "maybe", "an unknown answer"},
+    };
+    for (const auto& row : kRows) {
+        Json json = MakeKnowledgeJson(MakeKnowledge());
+        json[Json::json_pointer(row.fMember)] = row.fValue;
+        try {
+            ReadKnowledgeJson(json);
+            ADD_FAILURE() << row.fMember;
+        } catch (const std::runtime_error& error) {
+            EXPECT_STREQ(error.what(), row.fText) << row.fMember;
+        }
     }
 }
 
@@ -101,6 +133,13 @@ TEST(KnowledgeJsonTest, EachFactOfAnIdentityChangesItsName)
     }
     EXPECT_EQ(names.size(), changes.size());
     EXPECT_EQ(names.count(GetIdentityName(MakeIdentityJson(MakeIdentity()))), 1u);
+}
+
+// Later versions must find what is stored.
+TEST(KnowledgeJsonTest, TheNameOfAnIdentityLasts)
+{
+    EXPECT_EQ(GetIdentityName(MakeIdentityJson(MakeIdentity())),
+              "f03eb0aa-310f-52bf-8cac-c07652ffc6c5");
 }
 
 } // namespace

@@ -271,6 +271,19 @@ const std::vector<Row> kRows = {
      {Made(200, kSystemEnded, "--"), Made(100, kEnded, "HH")},
      kGood + ", warning",
      kGood + ", warning"},
+    {"a success after another", {Made(200, kEnded, "HH"), Made(100, kEnded, "HH")}, kGood, kGood},
+    {"a freeze, at the end of its time, then a success",
+     {Made(30 * kDay, kSystemEnded, "--"), Made(100, kEnded, "HH")},
+     kGood + ", warning",
+     kGood + ", warning"},
+    {"a freeze, forgiven, then a success",
+     {Made(30 * kDay + 1, kSystemEnded, "--"), Made(100, kEnded, "HH")},
+     kGood,
+     kGood},
+    {"two freezes, at the end of their time",
+     {Made(30 * kDay, kSystemEnded, "--"), Made(30 * kDay, kSystemEnded, "--")},
+     "broken system-ended, in 1, 2 failed",
+     "broken system-ended, in 1, 2 failed"},
     {"two freezes, forgiven",
      {Made(31 * kDay, kSystemEnded, "--"), Made(30 * kDay + 1, kSystemEnded, "--")},
      "unknown not-tried, forgiven",
@@ -346,9 +359,25 @@ TEST(PolicyTest, EachNumberCanBeSet)
     EXPECT_EQ(show({crash}), "broken a-reason, in 1000, 1 failed");
     policy.fFreezeForgiven = 50;
     EXPECT_EQ(show({Made(51, kSystemEnded, "--")}), "unknown not-tried, forgiven");
+    policy.fFreezeForgiven = 0;
+    EXPECT_EQ(show({Made(-kYear, kSystemEnded, "--")}),
+              fmt::format("unknown system-ended, in {}, 1 failed", kYear + 1001));
+    policy.fMaxAge = 0;
+    EXPECT_EQ(show({Made(0, kEnded, "HH")}), "hardware a-reason, in 1");
     policy.fMaxUnclear = 1;
     policy.fUnclearPause = 7;
     EXPECT_EQ(show({Made(1, kHostEnded, "--")}), "unknown host-ended, in 6");
+}
+
+// Of attempts without an answer the newest counts, whatever its reason is.
+TEST(PolicyTest, TheLastAttemptWithoutAnAnswerIsShown)
+{
+    const Attempt unknown = Made(1, kEnded, "--");
+    const Attempt nothing = Made(1, kNotStarted, "--");
+    for (const std::vector<Attempt>& attempts :
+         {std::vector<Attempt>{unknown, nothing}, std::vector<Attempt>{nothing, unknown},
+          std::vector<Attempt>{unknown}, std::vector<Attempt>{nothing}})
+        EXPECT_EQ(Judge(DeviceKind::kOpenGL, attempts, kNow, Policy()).fBasis, &attempts.back());
 }
 
 TEST(PolicyTest, PausesEndWithTheTimeThatForgives)

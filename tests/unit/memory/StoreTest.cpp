@@ -110,6 +110,30 @@ TEST_F(StoreTest, LeavesOutOldAttemptsThatHaveNoRoom)
     EXPECT_THAT(store.GetMessages(), ElementsAre("The state can't be kept: it is too large."));
 }
 
+TEST_F(StoreTest, FillsAFileUpToItsLargestSize)
+{
+    Knowledge knowledge = MakeKnowledge();
+    std::string& line = knowledge.fAttempts[0].fLastLine;
+    line.clear();
+    Store store(fFolder);
+    ASSERT_TRUE(store.Save(knowledge, kNow));
+    line.append(kMaxStateBytes - fFolder.GetState().size(), 'x');
+    EXPECT_TRUE(store.Save(knowledge, kNow));
+    EXPECT_EQ(fFolder.GetState().size(), kMaxStateBytes);
+    EXPECT_EQ(store.Load(MakeIdentity()).fAttempts.size(), 2u);
+    line += 'x';
+    EXPECT_TRUE(store.Save(knowledge, kNow));
+    EXPECT_EQ(store.Load(MakeIdentity()).fAttempts.size(), 1u);
+
+    knowledge.fAttempts.erase(knowledge.fAttempts.begin());
+    std::string& only = knowledge.fAttempts[0].fLastLine;
+    only.append(kMaxStateBytes - fFolder.GetState().size(), 'x');
+    EXPECT_TRUE(store.Save(knowledge, kNow));
+    EXPECT_EQ(fFolder.GetState().size(), kMaxStateBytes);
+    only += 'x';
+    EXPECT_FALSE(store.Save(knowledge, kNow));
+}
+
 TEST_F(StoreTest, DropsTheFileOfOneIdentity)
 {
     Store store(fFolder);
