@@ -45,13 +45,13 @@ bool IsSame(std::string_view left, std::string_view right)
 unsigned FindId(const std::string& device, std::string_view mark)
 {
     constexpr std::size_t kDigits = 4;
-    for (std::size_t at = 0; at + mark.size() + kDigits <= device.size(); ++at) {
-        if (!StartsWith(std::string_view(device).substr(at), mark))
+    for (std::string_view rest = device; !rest.empty(); rest.remove_prefix(1)) {
+        if (!StartsWith(rest, mark))
             continue;
+        const std::string_view digits = rest.substr(mark.size(), kDigits);
         unsigned id = 0;
-        const char* const begin = device.data() + at + mark.size();
-        const auto result = std::from_chars(begin, begin + kDigits, id, 16);
-        return result.ptr == begin + kDigits ? id : 0;
+        const auto result = std::from_chars(digits.data(), digits.data() + digits.size(), id, 16);
+        return result.ptr == digits.data() + kDigits ? id : 0;
     }
     return 0;
 }
@@ -112,7 +112,8 @@ private:
             return devices;
         for (const std::string& model : fSource.ListKeys(std::string(kEnum) + "PCI")) {
             for (const std::string& instance : fSource.ListKeys(kEnum + ("PCI\\" + model))) {
-                const std::string device = "PCI\\" + model + "\\" + instance;
+                const std::string device =
+                    std::string("PCI\\").append(model).append("\\").append(instance);
                 if (IsSame(Values(fSource, kEnum + device).GetText("ClassGUID"), classId))
                     devices.push_back(device);
             }

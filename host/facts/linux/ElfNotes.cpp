@@ -81,7 +81,6 @@ std::string FindElfNote(std::istream& file, const std::string& owner, std::uint3
         if (segment.p_type != PT_NOTE)
             continue;
         std::string notes(std::min<std::uint64_t>(segment.p_filesz, kMaxNoteBytes), '\0');
-        file.clear();
         file.seekg(static_cast<std::streamoff>(segment.p_offset));
         file.read(notes.data(), static_cast<std::streamsize>(notes.size()));
         notes.resize(static_cast<std::size_t>(file.gcount()));

@@ -75,7 +75,7 @@ std::string GetGraphicsDriver(const Files& files, const std::string& device)
     for (const std::string& name : files.List(device)) {
         if (!IsNumbered(name, "virtio"))
             continue;
-        std::string below = GetDriver(files, device + "/" + name);
+        std::string below = GetDriver(files, JoinPath(device, name));
         if (!below.empty())
             return below;
     }

@@ -126,7 +126,7 @@ std::vector<std::string> Lister::ListFolder(const std::string& folder, std::stri
     const std::string place = fFiles.Resolve(fProcess.MakeAbsolute(folder));
     for (const std::string& name : fFiles.List(place))
         if (EndsWith(name, end))
-            paths.push_back(place + "/" + name);
+            paths.push_back(JoinPath(place, name));
     return paths;
 }
 

@@ -19,6 +19,9 @@ constexpr std::size_t kMaxNames = 4096;
 // The kernel's limits: MAXSYMLINKS and PATH_MAX.
 constexpr int kMaxLinks = 40;
 constexpr std::size_t kMaxPath = 4096;
+// Folders and links within each other, for a host's threads with small stacks. No driver needs
+// more.
+constexpr int kMaxDepth = 128;
 
 bool IsRegular(const struct stat& status)
 {
@@ -101,22 +104,23 @@ std::string Files::Resolve(const std::string& path) const
 {
     int links = 0;
     struct stat status {};
-    return Resolve(path, links, status);
+    return Resolve(path, links, status, 0);
 }
 
-std::string Files::ResolveFolder(const std::string& path, int& links) const
+std::string Files::ResolveFolder(const std::string& path, int& links, int depth) const
 {
     const auto known = fFolders.find(path);
     if (known != fFolders.end())
         return known->second;
     struct stat status {};
-    return fFolders[path] = Resolve(path, links, status);
+    return fFolders[path] = Resolve(path, links, status, depth);
 }
 
-// Returns an empty path after too many links.
-std::string Files::Resolve(const std::string& path, int& links, struct stat& status) const
+// Returns an empty path after too many links or folders.
+std::string Files::Resolve(const std::string& path, int& links, struct stat& status,
+                           int depth) const
 {
-    if (path.size() > kMaxPath)
+    if (path.size() > kMaxPath || depth == kMaxDepth)
         return {};
     const std::size_t end = path.find_last_not_of('/');
     if (end == std::string::npos)
@@ -125,7 +129,7 @@ std::string Files::Resolve(const std::string& path, int& links, struct stat& sta
     if (slash == std::string::npos)
         return {};
     const std::string name = path.substr(slash + 1, end - slash);
-    const std::string folder = slash == 0 ? "/" : ResolveFolder(path.substr(0, slash), links);
+    std::string folder = slash == 0 ? "/" : ResolveFolder(path.substr(0, slash), links, depth + 1);
     if (folder.empty() || name == ".")
         return folder;
     if (name == "..")
@@ -138,24 +142,22 @@ std::string Files::Resolve(const std::string& path, int& links, struct stat& sta
     const std::string target = ReadSystemLink(GetRealPath(resolved));
     if (target.empty() || ++links > kMaxLinks)
         return {};
-    return Resolve(target.front() == '/' ? target : folder + "/" + target, links, status);
+    return Resolve(target.front() == '/' ? target : folder + "/" + target, links, status,
+                   depth + 1);
 }
 
 std::optional<FileStatus> Files::Find(const std::string& path) const
 {
-    if (path.empty() || path.front() != '/')
-        return std::nullopt;
-    FileStatus found;
     int links = 0;
     struct stat status {};
-    found.fPath = Resolve(path, links, status);
-    if (found.fPath.empty() || !IsRegular(status))
+    std::string resolved = Resolve(path, links, status, 0);
+    if (resolved.empty() || !IsRegular(status))
         return std::nullopt;
     constexpr std::int64_t kNanoseconds = 1000000000;
-    found.fSize = static_cast<std::uint64_t>(status.st_size);
-    found.fTime = std::int64_t{status.st_mtim.tv_sec} * kNanoseconds + status.st_mtim.tv_nsec;
-    found.fNode = {status.st_dev, status.st_ino};
-    return found;
+    return FileStatus{std::move(resolved),
+                      static_cast<std::uint64_t>(status.st_size),
+                      std::int64_t{status.st_mtim.tv_sec} * kNanoseconds + status.st_mtim.tv_nsec,
+                      {status.st_dev, status.st_ino}};
 }
 
 } // namespace assay_host

@@ -15,12 +15,18 @@ namespace assay_host {
 
 // What the file system has of a regular file.
 struct FileStatus {
-    std::string fPath;       // without symbolic links, as seen from the root
-    std::uint64_t fSize = 0; // bytes
-    std::int64_t fTime = 0;  // of the last change: nanoseconds since 1970 in UTC
+    std::string fPath;   // without symbolic links, as seen from the root
+    std::uint64_t fSize; // bytes
+    std::int64_t fTime;  // of the last change: nanoseconds since 1970 in UTC
     // What all names of one file have in common.
     std::pair<std::uint64_t, std::uint64_t> fNode;
 };
+
+// Returns "FOLDER/NAME".
+inline std::string JoinPath(const std::string& folder, const std::string& name)
+{
+    return std::string(folder).append("/").append(name);
+}
 
 // Every path is absolute and as seen from the root. Below another root, absolute links are followed
 // only by Resolve() and Find(); pass their paths to the other functions. Nothing is opened but
@@ -56,9 +62,9 @@ public:
 private:
     static constexpr std::size_t kMaxSize = std::size_t{1} << 20;
 
-    // Sets `status` if the path is a file's.
-    std::string Resolve(const std::string& path, int& links, struct stat& status) const;
-    std::string ResolveFolder(const std::string& path, int& links) const;
+    // Sets `status` if the path is a file's. `depth` is the number of nested calls.
+    std::string Resolve(const std::string& path, int& links, struct stat& status, int depth) const;
+    std::string ResolveFolder(const std::string& path, int& links, int depth) const;
 
     std::string fRoot;
     mutable std::map<std::string, std::string> fFolders; // their paths without links

@@ -43,7 +43,7 @@ const std::vector<std::string>& LibrarySearch::ListVariants(const std::string& f
     if (isNew) {
         const std::string variants = folder + "/glibc-hwcaps";
         for (const std::string& variant : fFiles.List(variants))
-            known->second.push_back(variants + "/" + variant);
+            known->second.push_back(JoinPath(variants, variant));
     }
     return known->second;
 }
@@ -52,9 +52,9 @@ void LibrarySearch::AddFolder(const std::string& folder, const std::string& name
                               std::vector<FileStatus>& found) const
 {
     for (const std::string& place : ListVariants(folder))
-        if (const auto status = fFiles.Find(place + "/" + name))
+        if (const auto status = fFiles.Find(JoinPath(place, name)))
             found.push_back(*status);
-    if (const auto status = fFiles.Find(folder + "/" + name))
+    if (const auto status = fFiles.Find(JoinPath(folder, name)))
         found.push_back(*status);
 }
 

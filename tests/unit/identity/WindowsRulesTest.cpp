@@ -200,6 +200,31 @@ TEST_F(WindowsRulesTest, MayHaveADeviceWithoutAnything)
     }
 }
 
+TEST_F(WindowsRulesTest, HaveTheIdsOfTheFirstMarks)
+{
+    const struct {
+        const char* fDevice;
+        unsigned fVendor;
+        unsigned fModel;
+    } kRows[] = {
+        {R"(PCI\VEN_8086&DEV_A7A0)", 0x8086, 0xA7A0},
+        {R"(pci\ven_8086&dev_a7a0\1)", 0x8086, 0xA7A0},
+        {R"(PCI\VEN_10DE2&DEV_24)", 0x10DE, 0},
+        {R"(PCI\VEN_&DEV_2484)", 0, 0x2484},
+        {R"(PCI\VEN_10D)", 0, 0},
+        {R"(PCI\VEN_1&VEN_10DE)", 0, 0},
+        {R"(PCI\VEN_)", 0, 0},
+        {"", 0, 0},
+    };
+    for (const auto& row : kRows) {
+        fWindows.fDevices[kDisplay] = {row.fDevice};
+        const Identity identity = GetWindowsIdentity(fWindows);
+        ASSERT_EQ(identity.fAdapters.size(), 1U);
+        EXPECT_EQ(identity.fAdapters[0].fVendor, row.fVendor) << row.fDevice;
+        EXPECT_EQ(identity.fAdapters[0].fDevice, row.fModel) << row.fDevice;
+    }
+}
+
 TEST_F(WindowsRulesTest, ChangeTheIdentity)
 {
     const Identity before = GetWindowsIdentity(fWindows);

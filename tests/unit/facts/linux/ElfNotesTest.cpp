@@ -122,6 +122,17 @@ TEST(ElfNotes, AreReadFromSegmentsOfNotesOnly)
     EXPECT_EQ(Find(MakeFile({{PT_NOTE, ""}, {PT_NOTE, note}}), "own", 1), "text");
 }
 
+TEST(ElfNotes, AreFoundAfterASegmentThatTheFileLacks)
+{
+    std::string file = MakeFile({{PT_NOTE, "x"}, {PT_NOTE, MakeNote("own", 1, "text")}});
+    ElfW(Phdr) first{};
+    std::copy_n(file.data() + sizeof(ElfW(Ehdr)), sizeof first, reinterpret_cast<char*>(&first));
+    first.p_offset = file.size();
+    std::copy_n(reinterpret_cast<const char*>(&first), sizeof first,
+                file.data() + sizeof(ElfW(Ehdr)));
+    EXPECT_EQ(Find(file, "own", 1), "text");
+}
+
 TEST(ElfNotes, AreReadFromAsManySegmentsAsTheFileCounts)
 {
     std::string file = MakeFile({{PT_LOAD, "x"}, {PT_NOTE, MakeNote("own", 1, "text")}});

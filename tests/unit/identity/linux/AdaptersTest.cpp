@@ -143,6 +143,46 @@ TEST(IdentityAdapters, AreNoneOfADriverOfFramebuffers)
         EXPECT_EQ(device.Print("card0", driver), "") << driver;
 }
 
+TEST(IdentityAdapters, HaveTheDeviceThatTheLinkOfANodeNames)
+{
+    const struct {
+        const char* fLink;
+        const char* fDevice;
+    } kRows[] = {
+        {"../../devices/x/drm/card0", "x"}, {"../../devices/drm/card0", ""},
+        {"../../devices/x/drm/card1", ""},  {"../../devices/x/card0", ""},
+        {"../../device/x/drm/card0", ""},   {"card0", ""},
+    };
+    for (const auto& row : kRows) {
+        const MachineTree tree;
+        tree.Link("/sys/class/drm/card0", row.fLink);
+        for (const char* const device : {"x", "drm", "drm/card0"})
+            tree.Link(std::string("/sys/devices/") + device + "/driver", "../drivers/v3d");
+        const std::string found = Print(GetMachineIdentity(tree.GetFiles(), {}).fAdapters);
+        EXPECT_EQ(found, *row.fDevice == '\0' ? "" : std::string(row.fDevice) + " 0:0 v3d \n")
+            << row.fLink;
+    }
+}
+
+// The graphics driver of a virtio card is bound below the PCI function, whose driver may be built
+// into the kernel.
+TEST(IdentityAdapters, HaveTheDriverBelowATransport)
+{
+    for (const std::string transport : {"virtio-pci", "virtio_pci", "virtio", "xvirtio-pci"}) {
+        const MachineTree tree;
+        const std::string card = "/sys/bus/pci/devices/0000:01:00.0/";
+        tree.Write(card + "class", "0x030000\n");
+        tree.Link(card + "driver", "../../drivers/" + transport);
+        tree.Link(card + "virtio/driver", "../drivers/no-number");
+        tree.Write(card + "virtio0/status", "");
+        tree.Link(card + "virtio1/driver", "../drivers/virtio_gpu");
+        tree.Link(card + "virtio2/driver", "../drivers/virtio_input");
+        const bool isVirtio = transport == "virtio-pci" || transport == "virtio_pci";
+        EXPECT_EQ(Print(GetMachineIdentity(tree.GetFiles(), {}).fAdapters),
+                  "0000:01:00.0 0:0 " + (isVirtio ? "virtio_gpu" : transport) + " \n");
+    }
+}
+
 TEST(IdentityAdapters, HaveIdsOf16Bits)
 {
     const MachineTree tree;
@@ -198,6 +238,9 @@ TEST(IdentitySystem, ChangesTheIdentity)
     tree.write("/proc/sys/kernel/osrelease", "6.12.117+deb12-amd64\n");
     tree.write("/etc/os-release", "PRETTY_NAME=\"One\"\nVERSION_ID=1\nBUILD_ID=20260102\n");
     EXPECT_NE(Read(tree), before);
+    tree.remove("/etc/os-release");
+    tree.write("/usr/lib/os-release", "PRETTY_NAME=\"One\"\nVERSION_ID=1\nBUILD_ID=20260101\n");
+    EXPECT_EQ(Read(tree), before);
 }
 
 } // namespace

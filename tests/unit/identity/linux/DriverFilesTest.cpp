@@ -297,6 +297,22 @@ TEST_F(DriverFilesTest, AreListedOnceUnderOneName)
     EXPECT_FALSE(Has("/usr/lib/dri/i915_dri.so"));
 }
 
+TEST_F(DriverFilesTest, AreNotThoseThatEachProgramHas)
+{
+    const Names runtime = {"libc.so.6",  "libm.so.6",     "libdl.so.2",     "libpthread.so.0",
+                           "librt.so.1", "libgcc_s.so.1", "libstdc++.so.6", "ld-linux-x86-64.so.2"};
+    const Names others = {"libcx.so", "libc.sox", "libdrm.so.2", "libdlx.so", "ld-x.so"};
+    Names needed = runtime;
+    needed.insert(needed.end(), others.begin(), others.end());
+    for (const std::string& name : needed)
+        fTree.Write("/usr/lib/" + name, MakeLibrary());
+    fTree.Write("/usr/lib/libLLVM.so", MakeLibrary(needed));
+    for (const std::string& name : runtime)
+        EXPECT_FALSE(Has("/usr/lib/" + name)) << name;
+    for (const std::string& name : others)
+        EXPECT_TRUE(Has("/usr/lib/" + name)) << name;
+}
+
 TEST_F(DriverFilesTest, MayNeedEachOther)
 {
     fTree.Write("/usr/lib/libLLVM.so", MakeLibrary({"libgallium.so", "libLLVM.so"}));

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <cstddef>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -75,6 +76,71 @@ TEST(ElfFile, IsEmptyForAnotherFile)
     std::string other = FakeElf().Make();
     other[EI_CLASS] = 0;
     EXPECT_EQ(Read(other).fBuildId, "");
+}
+
+TEST(ElfFile, IsOfThisMachinesForm)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1"};
+    const std::string file = fake.Make();
+    for (const std::size_t place :
+         {std::size_t{EI_MAG0}, std::size_t{EI_MAG3}, std::size_t{EI_CLASS}, std::size_t{EI_DATA},
+          offsetof(ElfW(Ehdr), e_phentsize)}) {
+        std::string other = file;
+        ++other[place];
+        EXPECT_EQ(Read(other).fBuildId, "") << place;
+        EXPECT_EQ(Read(other).fNeeded, Names()) << place;
+    }
+}
+
+TEST(ElfFile, HasAtMost256Segments)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1"};
+    fake.fEmptySegments = 253;
+    EXPECT_EQ(Read(fake.Make()).fNeeded, fake.fNeeded);
+    fake.fEmptySegments = 254;
+    EXPECT_EQ(Read(fake.Make()).fNeeded, Names());
+    EXPECT_EQ(Read(fake.Make()).fBuildId, "1234");
+}
+
+// The note of another owner, of so many bytes, whose header and name have 16.
+std::string MakeNote(std::uint32_t size)
+{
+    ElfW(Nhdr) header{};
+    header.n_namesz = 4;
+    header.n_descsz = size - 16;
+    header.n_type = NT_GNU_BUILD_ID;
+    std::string note(reinterpret_cast<const char*>(&header), sizeof header);
+    note.append("ABC", 4);
+    note.resize(size);
+    return note;
+}
+
+// That of a build id of two bytes has 20 bytes.
+TEST(ElfFile, HasNotesUpTo4096Bytes)
+{
+    FakeElf fake;
+    fake.fFirstNotes = MakeNote(4076);
+    EXPECT_EQ(Read(fake.Make()).fBuildId, "1234");
+    fake.fFirstNotes = MakeNote(4080);
+    EXPECT_EQ(Read(fake.Make()).fBuildId, "");
+}
+
+TEST(ElfFile, HasNoNamesWithoutATable)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1"};
+    fake.fHasTable = false;
+    EXPECT_EQ(Read(fake.Make()).fNeeded, Names());
+}
+
+TEST(ElfFile, HasItsNamesInTheSegmentOfTheirAddress)
+{
+    FakeElf fake;
+    fake.fNeeded = {"libone.so.1", "libtwo.so"};
+    fake.fAreNamesApart = true;
+    EXPECT_EQ(Read(fake.Make()).fNeeded, fake.fNeeded);
 }
 
 TEST(ElfFile, HasAtMost256Names)

@@ -16,7 +16,11 @@ struct FakeElf {
     std::vector<std::string> fNeeded;
     std::string fBuildId = "\x12\x34";
     std::string fRunPath;
-    std::string fFirstPath; // DT_RPATH
+    std::string fFirstPath;         // DT_RPATH
+    std::string fFirstNotes;        // whole notes before that of the build id
+    std::size_t fEmptySegments = 0; // before the others
+    bool fHasTable = true;          // whether an entry tells where the names are
+    bool fAreNamesApart = false;    // in a segment of their own, a gap in the file after the other
 
     // The addresses differ from the places in the file.
     static constexpr std::uint64_t kAddress = 0x10000;
@@ -37,12 +41,12 @@ struct FakeElf {
         if (!fFirstPath.empty())
             entries.emplace_back(DT_RPATH, addName(fFirstPath));
 
-        constexpr std::size_t kSegments = 3;
-        const std::size_t notesAt = sizeof(ElfW(Ehdr)) + kSegments * sizeof(ElfW(Phdr));
-        const std::string notes = MakeNotes();
+        const std::size_t segments = fEmptySegments + (fAreNamesApart ? 4 : 3);
+        const std::size_t notesAt = sizeof(ElfW(Ehdr)) + segments * sizeof(ElfW(Phdr));
+        const std::string notes = fFirstNotes + MakeNotes();
         const std::size_t dynamicAt = (notesAt + notes.size() + 7) / 8 * 8;
         const std::size_t namesAt = dynamicAt + (entries.size() + 2) * sizeof(ElfW(Dyn));
-        entries.emplace_back(DT_STRTAB, kAddress + namesAt);
+        entries.emplace_back(fHasTable ? DT_STRTAB : DT_DEBUG, kAddress + namesAt);
         entries.emplace_back(DT_NULL, 0);
 
         ElfW(Ehdr) header{};
@@ -52,12 +56,17 @@ struct FakeElf {
         header.e_type = ET_DYN;
         header.e_phoff = sizeof(header);
         header.e_phentsize = sizeof(ElfW(Phdr));
-        header.e_phnum = kSegments;
+        header.e_phnum = static_cast<decltype(header.e_phnum)>(segments);
         std::string file;
         Append(file, header);
-        AddSegment(file, PT_LOAD, 0, namesAt + names.size());
+        for (std::size_t segment = 0; segment < fEmptySegments; ++segment)
+            AddSegment(file, PT_NULL, 0, 0);
+        AddSegment(file, PT_LOAD, 0, namesAt + (fAreNamesApart ? 0 : names.size()));
         AddSegment(file, PT_NOTE, notesAt, notes.size());
         AddSegment(file, PT_DYNAMIC, dynamicAt, namesAt - dynamicAt);
+        constexpr std::size_t kGap = 8;
+        if (fAreNamesApart)
+            AddSegment(file, PT_LOAD, namesAt, names.size(), kGap);
         file += notes;
         file.resize(dynamicAt);
         for (const auto& [tag, value] : entries) {
@@ -66,7 +75,7 @@ struct FakeElf {
             entry.d_un.d_val = value;
             Append(file, entry);
         }
-        return file + names;
+        return file + std::string(fAreNamesApart ? kGap : 0, 'x') + names;
     }
 
 private:
@@ -77,11 +86,11 @@ private:
     }
 
     static void AddSegment(std::string& file, std::uint32_t type, std::uint64_t offset,
-                           std::uint64_t size)
+                           std::uint64_t size, std::uint64_t gap = 0)
     {
         ElfW(Phdr) segment{};
         segment.p_type = type;
-        segment.p_offset = offset;
+        segment.p_offset = offset + gap;
         segment.p_vaddr = kAddress + offset;
         segment.p_filesz = size;
         segment.p_memsz = size;

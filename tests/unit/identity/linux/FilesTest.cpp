@@ -6,6 +6,7 @@
 
 #include <string>
 
+#include <pthread.h>
 #include <sys/stat.h>
 
 #include "MachineTree.h"
@@ -58,6 +59,41 @@ TEST(FilesTest, ReadsAFirstLineWithoutTheBlanksAroundIt)
     EXPECT_EQ(read(""), "");
     EXPECT_EQ(read(std::string(4097, 'x')), std::string(4096, 'x'));
     EXPECT_EQ(tree.GetFiles().ReadLine("/none"), "");
+}
+
+std::string RepeatFolder(int times)
+{
+    std::string path;
+    while (--times >= 0)
+        path += "/a";
+    return path;
+}
+
+TEST(FilesTest, FollowsFoldersUpToADepth)
+{
+    const MachineTree tree;
+    tree.Write(RepeatFolder(128) + "/file", "");
+    tree.Link("/link", RepeatFolder(127));
+    EXPECT_EQ(tree.GetFiles().Resolve(RepeatFolder(128)), RepeatFolder(128));
+    EXPECT_EQ(tree.GetFiles().Resolve(RepeatFolder(128) + "/file"), "");
+    EXPECT_EQ(tree.GetFiles().Resolve("/link"), RepeatFolder(127));
+    EXPECT_EQ(tree.GetFiles().Resolve("/link/a"), "");
+}
+
+// A library of any author may name such a path.
+TEST(FilesTest, ADeepPathNeedsNoLargeStack)
+{
+    pthread_attr_t attributes;
+    ASSERT_EQ(::pthread_attr_init(&attributes), 0);
+    ASSERT_EQ(::pthread_attr_setstacksize(&attributes, std::size_t{1} << 20), 0);
+    const auto resolve = [](void* /*unused*/) -> void* {
+        EXPECT_EQ(Files().Resolve(RepeatFolder(2000)), "");
+        return nullptr;
+    };
+    pthread_t thread{};
+    ASSERT_EQ(::pthread_create(&thread, &attributes, resolve, nullptr), 0);
+    ::pthread_join(thread, nullptr);
+    ::pthread_attr_destroy(&attributes);
 }
 
 TEST(FilesTest, ListsAFolderWithoutHiddenNames)
@@ -121,6 +157,20 @@ TEST(FilesTest, ResolvesPaths)
     EXPECT_EQ(files.Resolve("/none"), "");
     EXPECT_EQ(files.Resolve("/none/.."), "");
     EXPECT_EQ(files.Resolve("/c/file/x"), "");
+}
+
+TEST(FilesTest, ReadsTheLinksOfAFolderOnce)
+{
+    const MachineTree tree;
+    for (const char* path : {"/old/a", "/old/b", "/new/a", "/new/b"})
+        tree.Write(path, "");
+    tree.Link("/folder", "old");
+    const Files files = tree.GetFiles();
+    EXPECT_EQ(files.Resolve("/folder/a"), "/old/a");
+    tree.Remove("/folder");
+    tree.Link("/folder", "new");
+    EXPECT_EQ(files.Resolve("/folder/b"), "/old/b");
+    EXPECT_EQ(tree.GetFiles().Resolve("/folder/b"), "/new/b");
 }
 
 TEST(FilesTest, FollowsAsManyLinksAsTheKernel)

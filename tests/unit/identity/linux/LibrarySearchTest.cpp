@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <cstdint>
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -43,6 +45,11 @@ TEST(LibraryCache, ReadsTheTableAfterAnOldOne)
     const std::string file = old + MakeLibraryCache({{"a", "/a"}}, kCacheFlags);
     EXPECT_EQ(LibraryCache(file).Find("a"), Names{"/a"});
     EXPECT_EQ(LibraryCache(old).Find("a"), Names());
+    for (const char count : {'\2', 'd'}) {
+        std::string wrong = file;
+        wrong[12] = count; // the new table isn't where the old one ends
+        EXPECT_EQ(LibraryCache(wrong).Find("a"), Names()) << int{count};
+    }
 }
 
 TEST(LibraryCache, HasNoMoreEntriesThanItsFileHolds)
@@ -108,6 +115,21 @@ TEST_F(LibrarySearchTest, KeepsTheOrderOfTheLoader)
     EXPECT_EQ(Find("libx.so"), Names{"/usr/lib/libx.so"});
     EXPECT_EQ(Find("liby.so"), Names());
     EXPECT_EQ(Find(""), Names());
+}
+
+TEST_F(LibrarySearchTest, ReadsTheCacheUpTo16MiB)
+{
+    constexpr std::size_t kLimit = 16777216;
+    const std::string path("/b\0", 3);
+    fTree.Write("/b", "");
+    for (const std::size_t size : {kLimit, kLimit + 1}) {
+        std::string cache = MakeLibraryCache({{"libx.so", "/a"}}, kCacheFlags);
+        const auto place = static_cast<std::uint32_t>(size - path.size());
+        std::memcpy(&cache[48 + 8], &place, sizeof place); // of the first entry's path
+        cache.resize(place);
+        fTree.Write("/etc/ld.so.cache", cache + path);
+        EXPECT_EQ(Find("libx.so"), size == kLimit ? Names{"/b"} : Names()) << size;
+    }
 }
 
 TEST_F(LibrarySearchTest, TakesANameWithASlashForAPath)
