@@ -15,7 +15,7 @@ boost::filesystem::path FollowLinks(boost::filesystem::path path)
         const fs::path target = fs::read_symlink(path, error);
         if (error)
             break;
-        path = path.parent_path() / target; // an absolute target replaces the path
+        path = target.is_absolute() ? target : path.parent_path() / target;
     }
     return path;
 }

@@ -241,6 +241,60 @@ TEST_F(OutputFileTest, NamesAFolderThatIsInItsPlace)
     EXPECT_THAT(List(), ElementsAre("folder"));
 }
 
+std::string GetNewFailure(const std::string& path)
+{
+    try {
+        OpenNewFile(path);
+    } catch (const std::runtime_error& failure) {
+        return failure.what();
+    }
+    return "no failure";
+}
+
+TEST_F(OutputFileTest, ANewFileReplacesNothing)
+{
+    const std::string path = GetPath("report");
+    const std::string failure = "cannot write " + path + ": File exists";
+    {
+        const std::unique_ptr<Output> output = OpenNewFile(path);
+        output->Open();
+        output->Write("text");
+        output->Finish();
+    }
+    EXPECT_EQ(Read(path), "text");
+    EXPECT_EQ(GetNewFailure(path), failure);
+    fs::remove(path);
+    fs::create_symlink("nothing", path);
+    EXPECT_EQ(GetNewFailure(path), failure);
+    fs::remove(path);
+    // Another one comes before its end.
+    {
+        const std::unique_ptr<Output> output = OpenNewFile(path);
+        output->Open();
+        output->Write("text");
+        OutputFileTest::WriteAll(path, "other");
+        try {
+            output->Finish();
+            ADD_FAILURE();
+        } catch (const std::runtime_error& caught) {
+            EXPECT_EQ(caught.what(), failure);
+        }
+    }
+    EXPECT_EQ(Read(path), "other");
+    EXPECT_THAT(List(), ElementsAre("report"));
+}
+
+TEST_F(OutputFileTest, ReplacesWhatALinkToAnAbsolutePathLeadsTo)
+{
+    fs::create_symlink(GetPath("report"), GetPath("link"));
+    EXPECT_EQ(FollowLinks(GetPath("link")).string(), GetPath("report"));
+    for (const char* text : {"made", "replaced"}) {
+        WriteAll(GetPath("link"), text);
+        EXPECT_EQ(Read(GetPath("report")), text);
+    }
+    EXPECT_THAT(List(), ElementsAre("link", "report"));
+}
+
 TEST_F(OutputFileTest, FollowsAsManyLinksAsTheSystem)
 {
     // link0 -> link1 -> ... -> link41, which isn't there
