@@ -5,7 +5,6 @@ namespace assay_host {
 std::string EscapeMarkup(std::string_view text)
 {
     std::string escaped;
-    escaped.reserve(text.size());
     for (const char character : text) {
         switch (character) {
         case '&':

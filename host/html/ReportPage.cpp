@@ -37,7 +37,7 @@ public:
           fFacts(facts),
           fSeries(series),
           fTypical(series != nullptr ? MakeMedianReport(report, *series) : Report()),
-          fAnswers(series != nullptr ? GetAnswers(fTypical) : GetAnswers(report, outcome))
+          fAnswers(series != nullptr ? GetAnswers(fTypical, outcome) : GetAnswers(report, outcome))
     {}
 
     void Add()

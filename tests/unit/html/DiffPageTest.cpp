@@ -2,8 +2,10 @@
 
 #include <sstream>
 #include <string>
+#include <utility>
 
 #include "html/DiffPage.h"
+#include "report/DiffJson.h"
 #include "report/Lines.h"
 #include "report/Samples.h"
 
@@ -65,8 +67,13 @@ TEST(DiffPage, LeadsWithWhatDiffers)
     EXPECT_TRUE(Has(page, "<span class=\"soft\">not printed by this device</span>"));
     EXPECT_TRUE(Has(page, " (-51.4 %)</td>"));
     EXPECT_TRUE(Has(page, "<caption>clgpu[0] Compute score (more is better)</caption>"));
+    EXPECT_TRUE(Has(page, "<main><h2>"));
+    EXPECT_TRUE(Has(page, "</main>\n<footer>"));
     // 56 lines without two stamps, and four differences.
     EXPECT_TRUE(Has(page, "<summary>The same in both reports (50)</summary>"));
+    EXPECT_FALSE(Has(page, "<h3>What can be used"));
+    EXPECT_TRUE(Has(page, "<header><h1>"));
+    EXPECT_TRUE(Has(page, "</header>\n<main>"));
     EXPECT_TRUE(Has(page, "<dt>glgpu[0] Vendor</dt>\n<dd>Example Corporation</dd>"));
     EXPECT_TRUE(Has(page, "<dt>Tester</dt>\n<dd>Pixmere</dd>"));
     EXPECT_LT(page.find("<h2>What can be used"), page.find("<h2>Trials"));
@@ -84,6 +91,13 @@ TEST(DiffPage, AMeasurementThatIsNotKnownHasNoBar)
                     "class=\"bar\""));
 }
 
+TEST(DiffPage, ASmallMeasurementHasABar)
+{
+    EXPECT_TRUE(Has(WritePage(Sample(0, 1).Set("clgpu[0].CLCompute", "0.5"),
+                              Sample(0, 1).Set("clgpu[0].CLCompute", "0.25")),
+                    "class=\"bar\""));
+}
+
 TEST(DiffPage, ShowsMeasurementsThatAreAboutTheSame)
 {
     EXPECT_TRUE(Has(WritePage(Sample(0, 1).Set("clgpu[0].CLBandwidth", "1e9"),
@@ -97,12 +111,68 @@ TEST(DiffPage, OfSeveralReports)
     runs.Add("b.json", MakeRun(Sample(1, 0)), {});
     runs.Add("c.json", MakeRun(Sample(1, 0).Set("glgpu[0].GLMemoryMB", "1")), {});
     const std::string page = WritePage(runs);
-    EXPECT_TRUE(Has(page, "<h1>1 of 2 reports differs from the first one.</h1>"));
+    EXPECT_TRUE(Has(page, "<h1>1 of 2 reports differs from the first one.</h1>\n<dl>"));
+    EXPECT_TRUE(Has(page, "<title>assay: 1 of 2 reports differs from the first one.</title>"));
+    EXPECT_TRUE(Has(page, "<p class=\"soft\">c.json: complete, 2026-11-22T01:26:02Z, Example "));
+    EXPECT_FALSE(Has(page, "What to do"));
     EXPECT_TRUE(Has(page, "<h2>b.json</h2>"));
     EXPECT_TRUE(Has(page, "<p>The reports do not differ.</p>"));
     EXPECT_TRUE(Has(page, "<h2>c.json</h2>"));
     EXPECT_TRUE(Has(page, "<p>1 fact differs.</p>\n<h3>Facts</h3>"));
     EXPECT_FALSE(Has(page, "Second report</dt>"));
+}
+
+TEST(DiffPage, CountsTheReportsThatDiffer)
+{
+    ComparedRuns same("a.json", MakeRun(Sample(1, 0)));
+    ComparedRuns other("a.json", MakeRun(Sample(1, 0)));
+    for (int count = 0; count < 2; ++count) {
+        same.Add("b.json", MakeRun(Sample(1, 0)), {});
+        other.Add("b.json", MakeRun(Sample(1, 0).Set("glgpu[0].GLFrameBufferOK", "0")), {});
+    }
+    EXPECT_TRUE(Has(WritePage(same), "<h1>0 of 2 reports differ from the first one.</h1>"));
+    const std::string page = WritePage(other);
+    EXPECT_TRUE(Has(page, "<h1>2 of 2 reports differ from the first one.</h1>"));
+    EXPECT_TRUE(Has(page, "<h3>What to do</h3>\n<ul><li>"));
+}
+
+TEST(DiffPage, SaysOfARunWhatIsKnown)
+{
+    StoredRun bare = MakeRun(Sample(1, 0));
+    bare.fExtent = OutcomeExtent::kNone;
+    bare.fFacts = {};
+    StoredRun full = MakeRun(Sample(1, 0));
+    full.fFacts.fEnvironment.fHost = {"a <host>", ""};
+    ComparedRuns runs("a.txt", std::move(bare));
+    runs.Add("b.json", std::move(full), {});
+    const std::string page = WritePage(runs);
+    EXPECT_TRUE(Has(page, "<dl><dt>First report</dt>\n<dd>a.txt</dd>\n"
+                          "<dt>Second report</dt>\n<dd>b.json: complete, 2026-11-22T01:26:02Z, "
+                          "a &lt;host&gt;, Example &lt;OS&gt;</dd>\n</dl>\n"))
+        << page.substr(page.find("<header>"), 400);
+}
+
+TEST(DiffPage, HoldsTheDocument)
+{
+    ComparedRuns runs("a.json", MakeRun(Sample(1, 0)));
+    runs.Add("b.json", MakeRun(Sample(1, 0).Set("glgpu[0].GLMemoryMB", "1")), {});
+    std::ostringstream document;
+    WriteDiffDocument(document, runs, "1.0.0");
+    std::string json = document.str();
+    for (std::size_t at = json.find('<'); at != std::string::npos; at = json.find('<', at))
+        json.replace(at, 1, "\\u003C");
+    EXPECT_TRUE(Has(WritePage(runs), "id=\"json\">" + json + "</script>"));
+}
+
+TEST(DiffPage, DrawsMeasurementsThatDiffer)
+{
+    const std::string page =
+        WritePage(Sample(0, 1).Set("clgpu[0].CLBandwidth", "1e9"),
+                  Sample(0, 1).Set("clgpu[0].CLBandwidth", "2e9").Set("clgpu[0].CLName", "\"B\""));
+    EXPECT_TRUE(Has(page, "<caption>clgpu[0] Copy bandwidth (more is better)</caption>\n<tbody><tr>"
+                          "<th scope=\"row\">First report</th>"));
+    EXPECT_TRUE(Has(page, "<th scope=\"row\">Second report</th>"));
+    EXPECT_TRUE(Has(page, "<td>1 GB/s</td>"));
 }
 
 } // namespace

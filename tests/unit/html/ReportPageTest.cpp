@@ -4,10 +4,14 @@
 #include <string>
 
 #include "html/Assets.h"
+#include "html/Markup.h"
 #include "html/ReportPage.h"
+#include "report/Explanations.h"
 #include "report/JsonDocument.h"
+#include "report/KnownKeys.h"
 #include "report/Lines.h"
 #include "report/Samples.h"
+#include "report/SeriesSamples.h"
 
 namespace assay_host {
 namespace {
@@ -78,11 +82,30 @@ TEST(ReportPage, OfAGoodMachine)
     EXPECT_TRUE(Has(page, "<caption>Copy bandwidth (more is better)</caption>"));
     EXPECT_TRUE(Has(page, "<caption>Compute score (more is better)</caption>"));
     EXPECT_TRUE(Has(page, "<dt>System</dt>\n<dd>Example &lt;OS&gt;</dd>"));
-    EXPECT_TRUE(Has(page, "<dd>not known (the kernel does not say it)</dd>"));
+    EXPECT_TRUE(Has(page, "<dt>Kernel</dt>\n<dd>not known (the kernel does not say it)</dd>"));
+    EXPECT_FALSE(Has(page, "No answer"));
+    EXPECT_FALSE(Has(page, "<summary>Others"));
+    // The facts in the order of their rows, without the trials.
+    EXPECT_TRUE(Has(page, "<dd class=\"yes\">yes</dd>\n</dl>\n<dl><dt>Adapter</dt>\n"
+                          "<dd>Accelerator 4000</dd>\n<dt>Renderer</dt>\n"));
+    EXPECT_EQ(Count(page, "<dt>Framebuffers work</dt>"), 1U);
+    EXPECT_TRUE(Has(page, "<dt>What happened</dt>\n<dd>The reason &lt;b&gt;.</dd>"));
     EXPECT_FALSE(Has(page, "<dt>Host</dt>"));
     EXPECT_TRUE(Has(page, "<dt>Version of assay</dt>\n<dd>1.0.0</dd>"));
     EXPECT_TRUE(Has(page, "NumGLGPUs=1\n"));
+    EXPECT_TRUE(Has(page, "<main><div class=\"devices\">"));
+    EXPECT_TRUE(Has(page, "</main>\n<footer>"));
     EXPECT_EQ(page.substr(page.size() - 8), "</html>\n");
+}
+
+TEST(ReportPage, OfASeriesHasMediansWithTheLowerBoundOfTheBandwidth)
+{
+    StoredRun run = CollectBandwidths({"9e+11", "5e+11", "5e+11"});
+    run.fOutcome.fLowerBounds = {{"clgpu[0].CLBandwidth", 8e11}};
+    std::ostringstream out;
+    WriteReportPage(out, run.fReport, run.fOutcome, MakeFacts(), &*run.fSeries);
+    EXPECT_TRUE(Has(out.str(), "<dd>500 GB/s (at least 800 GB/s by the host&#39;s clock)</dd>"))
+        << out.str();
 }
 
 TEST(ReportPage, LoadsNothingAndFitsSmallScreens)
@@ -121,10 +144,10 @@ TEST(ReportPage, HasAllPartsOfARun)
           "<dt>Architecture</dt>\n<dd>x86_64</dd>",
           "<dt>When</dt>\n<dd>2026-11-22T01:26:02Z (local time +01:00)</dd>",
           "<dt>Version of assay-host</dt>\n<dd>1.0.0</dd>", "<h2>Measurements</h2>",
-          "<summary>What the terms mean</summary>", "<dt>OpenGL: Shaders compile</dt>",
+          "<summary>What the terms mean</summary>\n<dl><dt>", "<dt>OpenGL: Shaders compile</dt>",
           "<summary>Report lines (", "<div class=\"devices\"><article"})
         EXPECT_TRUE(Has(page, part)) << part;
-    for (const char* part : {"Last report line", "Last log line", "Next line"})
+    for (const char* part : {"Last report line", "Last log line", "Next line", "Standard error"})
         EXPECT_FALSE(Has(page, part)) << part;
 }
 
@@ -147,6 +170,105 @@ TEST(ReportPage, OfACrash)
     EXPECT_TRUE(Has(page, "<summary>Standard error (2)</summary>\n<pre>a &lt; b\n\n</pre>"));
     EXPECT_FALSE(Has(page, "Measurements"));
     EXPECT_FALSE(Has(page, "Trials"));
+    EXPECT_FALSE(Has(page, "<summary>Limits"));
+    EXPECT_FALSE(Has(page, "<summary>Extensions"));
+    EXPECT_FALSE(Has(page, "<dt>Adapter</dt>"));
+}
+
+TEST(ReportPage, ACardWithoutFactsHasNoEmptyList)
+{
+    const std::string page =
+        WritePage(Sample(1, 0).EndAfter("NumGLGPUs").GetText(), MakeOutcome(Verdict::kCrashed));
+    EXPECT_TRUE(Has(page, "id=\"glgpu[0]\""));
+    EXPECT_FALSE(Has(page, "<dl></dl>"));
+}
+
+TEST(ReportPage, NamesTheDevicesOfItsBars)
+{
+    const std::string page = WritePage(Sample(0, 1).GetText(), MakeOutcome(Verdict::kComplete));
+    EXPECT_TRUE(Has(page, "<th scope=\"row\">clgpu[0] Accelerator 4000</th>"));
+    EXPECT_EQ(Count(page, "<h2>Measurements</h2>"), 1U);
+    EXPECT_LT(page.find("<h2>Measurements</h2>"), page.find("(more is better)"));
+}
+
+TEST(ReportPage, HasABarForASmallMeasurement)
+{
+    const std::string page = WritePage(
+        Sample(0, 1).Set("clgpu[0].CLBandwidth", "0").Set("clgpu[0].CLCompute", "0.5").GetText(),
+        MakeOutcome(Verdict::kComplete));
+    EXPECT_EQ(Count(page, "class=\"bar\""), 1U);
+}
+
+TEST(ReportPage, OfASeriesHasItsMedians)
+{
+    const StoredRun run = CollectBandwidths({"9e+11", "5e+11", "5.1e+11"});
+    std::ostringstream out;
+    WriteReportPage(out, run.fReport, run.fOutcome, MakeFacts(), &*run.fSeries);
+    const std::string page = out.str();
+    EXPECT_TRUE(Has(page, "<h2>Series: 3 runs</h2>"));
+    EXPECT_FALSE(Has(page, "<h2>Measurements</h2>"));
+    EXPECT_TRUE(Has(page, "<dt>Copy bandwidth</dt>\n<dd>505 GB/s</dd>"));
+    EXPECT_TRUE(Has(page, "\"series\""));
+}
+
+TEST(ReportPage, SaysWhereItWasMade)
+{
+    RunFacts facts = MakeFacts();
+    facts.fEnvironment.fHost = {"a <host>", ""};
+    facts.fEnvironment.fTime = "";
+    std::ostringstream out;
+    WriteReportPage(out, ReadReport(Sample(0, -1).GetText()), MakeOutcome(Verdict::kComplete),
+                    facts);
+    const std::string page = out.str();
+    EXPECT_TRUE(Has(page, "<dt>Host</dt>\n<dd>a &lt;host&gt;</dd>"));
+    EXPECT_FALSE(Has(page, "<dt>When</dt>"));
+    EXPECT_TRUE(Has(page, "<dt>OpenCL</dt>\n<dd><span class=\"absent\">absent</span>: There is "
+                          "no OpenCL library that can be used.</dd>"));
+    EXPECT_FALSE(Has(page, "class=\"devices\""));
+    EXPECT_FALSE(Has(page, "What the terms mean"));
+}
+
+TEST(ReportPage, ExplainsTheTermsOfItsDevices)
+{
+    const std::string page = WritePage(Sample(1, -1).GetText(), MakeOutcome(Verdict::kComplete));
+    std::size_t terms = 0;
+    for (const KnownKey& key : GetKnownKeys()) {
+        if (key.fKind != DeviceKind::kOpenGL || key.fGroup == KeyGroup::kExtension)
+            continue;
+        ++terms;
+        EXPECT_TRUE(Has(page, "<dt>OpenGL: " + EscapeMarkup(key.fLabel) + "</dt>\n<dd>" +
+                                  EscapeMarkup(GetExplanation(key).fMeaning) + "</dd>"))
+            << key.fKey;
+    }
+    EXPECT_EQ(Count(page, "<dt>OpenGL: "), terms);
+    EXPECT_EQ(Count(page, "<dt>OpenCL: "), 0U);
+    EXPECT_FALSE(
+        Has(WritePage(Sample(0, 1).GetText(), MakeOutcome(Verdict::kComplete)), "<dt>OpenGL: "));
+}
+
+TEST(ReportPage, HasTheLastLinesOfARunThatIsNotWhole)
+{
+    RunOutcome outcome = MakeOutcome(Verdict::kHung);
+    outcome.fLastLogLine = "# last <log>";
+    const std::string page = WritePage(Sample(1, 0).EndAfter("glgpu[0].GLName").GetText(), outcome);
+    EXPECT_TRUE(Has(page, "<dt>Last log line</dt>\n<dd># last &lt;log&gt;</dd>"));
+    EXPECT_FALSE(Has(page, "<dt>Last report line</dt>")) << "the outcome has none";
+}
+
+TEST(ReportPage, HasCardsOfDevicesWithOddAnswers)
+{
+    const std::string page = WritePage(
+        Sample(2, 0).Set("glgpu[0].GLFrameBufferOK", "2").Fail("glgpu[1]", "GLName").GetText() +
+            "glgpu[0].New=\"x\"\n",
+        MakeOutcome(Verdict::kComplete));
+    EXPECT_TRUE(Has(page, "<h3>Trials</h3>\n<dl><dt>Shaders compile</dt>\n<dd class=\"yes\">yes"));
+    EXPECT_TRUE(Has(page, "<dt>Framebuffers work</dt>\n<dd class=\"unknown\">2</dd>"));
+    EXPECT_TRUE(Has(page, "<summary>Others (1)</summary>\n<dl><dt>New</dt>\n<dd>x</dd>"));
+    EXPECT_TRUE(Has(page, "<h2>OpenGL device glgpu[1]</h2>"));
+    EXPECT_EQ(Count(page, "<summary>Limits"), 1U);
+    EXPECT_EQ(Count(page, "<h3>Trials</h3>"), 1U);
+    // A trial isn't among the facts.
+    EXPECT_EQ(Count(page, "<dt>Shaders compile</dt>"), 1U);
 }
 
 TEST(ReportPage, FailedTrialsStandOut)
