@@ -18,8 +18,8 @@
 #include "report/Warnings.h"
 
 struct assay_host_device {
-    const assay_host::DeviceAnswers* fDevice = nullptr;
-    int fSoftware = -1;
+    const assay_host::DeviceAnswers* fDevice;
+    int fSoftware; // as assay_host_device_software returns it
 };
 
 struct assay_host_answer {

@@ -24,14 +24,15 @@ using namespace assay_host;
 
 namespace {
 
-bool IsInterface(assay_host_interface which)
+// Returns nothing for a number that is none of the enumeration's. No function may keep one in a
+// variable that another function refers to: C++ doesn't define how it is read.
+std::optional<DeviceKind> FindKind(assay_host_interface which)
 {
-    return which == ASSAY_HOST_OPENGL || which == ASSAY_HOST_OPENCL;
-}
-
-DeviceKind GetKind(assay_host_interface which)
-{
-    return which == ASSAY_HOST_OPENGL ? DeviceKind::kOpenGL : DeviceKind::kOpenCL;
+    if (which == ASSAY_HOST_OPENGL)
+        return DeviceKind::kOpenGL;
+    if (which == ASSAY_HOST_OPENCL)
+        return DeviceKind::kOpenCL;
+    return std::nullopt;
 }
 
 assay_host_choice GetNumber(const std::optional<InterfaceChoice>& choice)
@@ -48,9 +49,12 @@ assay_host_choice GetNumber(const std::optional<InterfaceChoice>& choice)
     }
 }
 
-Usability GetUsability(assay_host_choice choice)
+// Returns nothing for the automatic choice.
+std::optional<Usability> GetUsability(assay_host_choice choice)
 {
     switch (choice) {
+    case ASSAY_HOST_CHOICE_AUTO:
+        return std::nullopt;
     case ASSAY_HOST_CHOICE_HARDWARE:
         return Usability::kHardware;
     case ASSAY_HOST_CHOICE_SOFTWARE:
@@ -105,7 +109,8 @@ assay_host_error assay_host_state_get_choice(assay_host_state* state, assay_host
     if (state == nullptr)
         return ASSAY_HOST_NULL_POINTER;
     state->fMessage.clear();
-    if (!IsInterface(which))
+    const std::optional<DeviceKind> kind = FindKind(which);
+    if (!kind)
         return ASSAY_HOST_BAD_VALUE;
     return Try([&] {
         const std::unique_ptr<Folder> folder = OpenFolder(state->fFolder, FolderUse::kRead);
@@ -113,7 +118,7 @@ assay_host_error assay_host_state_get_choice(assay_host_state* state, assay_host
         const Choice read = store.LoadChoice();
         if (!store.GetMessages().empty())
             state->fMessage = store.GetMessages().front();
-        *choice = GetNumber(read.Get(GetKind(which)));
+        *choice = GetNumber(read.Get(*kind));
         return ASSAY_HOST_OK;
     });
 }
@@ -124,15 +129,17 @@ assay_host_error assay_host_state_set_choice(assay_host_state* state, assay_host
     if (state == nullptr)
         return ASSAY_HOST_NULL_POINTER;
     state->fMessage.clear();
-    if (!IsInterface(which) || choice < ASSAY_HOST_CHOICE_AUTO || choice > ASSAY_HOST_CHOICE_ABSENT)
+    const std::optional<DeviceKind> kind = FindKind(which);
+    if (!kind || choice < ASSAY_HOST_CHOICE_AUTO || choice > ASSAY_HOST_CHOICE_ABSENT)
         return ASSAY_HOST_BAD_VALUE;
+    const std::optional<Usability> usability = GetUsability(choice);
     return Try([&] {
         const std::unique_ptr<Folder> folder = OpenFolder(state->fFolder, FolderUse::kWrite);
         Store store(*folder);
         Choice made = store.LoadChoice();
-        made.Get(GetKind(which)).reset();
-        if (choice != ASSAY_HOST_CHOICE_AUTO)
-            made.Get(GetKind(which)) = {GetUsability(choice), MakeSystemMachine()->GetTime()};
+        made.Get(*kind).reset();
+        if (usability)
+            made.Get(*kind) = {*usability, MakeSystemMachine()->GetTime()};
         return Finish(*state, store.SaveChoice(made));
     });
 }

@@ -1,3 +1,6 @@
+/* SPDX-FileCopyrightText: 2026 the assay authors
+ * SPDX-License-Identifier: MIT */
+
 /* libassay-host: runs assay as a supervised child and tells whether OpenGL and OpenCL can be used.
  *
  * A driver that crashes or hangs ends only the child. assay_host_run runs the child once;
@@ -19,10 +22,14 @@
  * ends, even if it is killed, the child and its descendants are killed. The shared library can't be
  * unloaded; the DLL can be until its first run.
  *
- * Freeing null does nothing. Reading from null returns 0, an empty text, never-started or unknown.
+ * Freeing null does nothing. Reading from null returns 0, an empty text, never-started or unknown,
+ * and -1 where a function has it; assay_host_result_document and the functions that return an
+ * object return null.
  */
 #ifndef ASSAY_HOST_H
 #define ASSAY_HOST_H
+
+/* This is C. NOLINTBEGIN(modernize-deprecated-headers,modernize-use-using) */
 
 #include <stddef.h>
 #include <stdint.h>
@@ -86,10 +93,9 @@ ASSAY_HOST_API assay_host_error assay_host_options_add_argument(assay_host_optio
                                                                 const char* argument);
 
 /* Sets the time after which the child is killed; 0 for no limit; the default is 60. The child is
- * killed at this time, and assay_host_run returns within the next second, usually within some
- * milliseconds. It takes up to two seconds more only if the system can't end a process at once, as
- * on a driver that blocks in the kernel. Errors: null pointer; bad value for a negative number or
- * one that isn't finite. */
+ * killed at this time, and assay_host_run returns some milliseconds later. It takes longer, at most
+ * two seconds in all, only if the system can't end a process at once, as on a driver that blocks in
+ * the kernel. Errors: null pointer; bad value for a negative number or one that isn't finite. */
 ASSAY_HOST_API assay_host_error assay_host_options_set_timeout(assay_host_options* options,
                                                                double seconds);
 
@@ -114,12 +120,14 @@ ASSAY_HOST_API assay_host_error assay_host_options_set_identify(assay_host_optio
  * another number to end the run, with the verdict interrupted. It must not throw or jump out. Null:
  * no callback, which is the default. */
 
-/* A line of the report, or of the child's standard error, without its line end. */
+/* A line of the report, or of the child's standard error, without its line end. `line` lives until
+ * the callback returns. */
 typedef int (*assay_host_line_callback)(void* context, const char* line, size_t size,
                                         double seconds);
 
 /* About ten times a second. `steps`: the steps that the report shows to be done. `next_key`: the
- * key of the report's next line, which is what the child is doing; empty at the end. */
+ * key of the report's next line, which is what the child is doing; empty at the end. It lives until
+ * the callback returns. */
 typedef int (*assay_host_tick_callback)(void* context, double seconds, uint64_t steps,
                                         const char* next_key);
 
@@ -275,7 +283,7 @@ ASSAY_HOST_API assay_host_usability assay_host_result_usable(const assay_host_re
 ASSAY_HOST_API const char* assay_host_usability_name(assay_host_usability usability);
 
 /* Return a stable identifier of the reason, one sentence for the user, and the tag of the device
- * that decided, which is empty for none. docs/embedding.md has the reasons. */
+ * that decided, which is empty for none. docs/assay-host.md has the reasons. */
 ASSAY_HOST_API const char* assay_host_result_usable_reason(const assay_host_result* result,
                                                            assay_host_interface which);
 ASSAY_HOST_API const char* assay_host_result_usable_text(const assay_host_result* result,
@@ -536,5 +544,7 @@ ASSAY_HOST_API assay_host_error assay_host_state_forget(assay_host_state* state)
 #ifdef __cplusplus
 }
 #endif
+
+/* NOLINTEND(modernize-deprecated-headers,modernize-use-using) */
 
 #endif

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // A C++17 wrapper of libassay-host with value types. Header-only: the binary interface is that of
 // assay_host.h.
 //
@@ -52,6 +55,12 @@ enum class Choice {
     software = ASSAY_HOST_CHOICE_SOFTWARE,
     absent = ASSAY_HOST_CHOICE_ABSENT
 };
+
+// The version of the library, "1.0.0".
+inline std::string version()
+{
+    return assay_host_version();
+}
 
 inline std::string to_string(Verdict verdict)
 {
@@ -305,7 +314,20 @@ public:
     std::string reason() const { return assay_host_result_reason(fResult.get()); }
     std::string termination() const { return assay_host_result_termination(fResult.get()); }
     double seconds() const { return assay_host_result_seconds(fResult.get()); }
+    // Whether a process of the child could not be killed and may still run.
     bool left_behind() const { return assay_host_result_left_behind(fResult.get()) != 0; }
+
+    // The last line of the report, and the last line of the child's log after it, which shows what
+    // the child was doing. Empty if there is none.
+    std::string last_line() const { return read(assay_host_result_last_line); }
+    std::string last_log_line() const { return read(assay_host_result_last_log_line); }
+
+    // The bytes that the limits dropped of the report and of standard error.
+    std::uint64_t lost_bytes() const { return assay_host_result_lost_bytes(fResult.get()); }
+    std::uint64_t lost_error_bytes() const
+    {
+        return assay_host_result_lost_error_bytes(fResult.get());
+    }
 
     std::optional<int> exit_status() const
     {
@@ -395,6 +417,13 @@ public:
     assay_host_result* get() const { return fResult.get(); }
 
 private:
+    std::string read(const char* (*text_of)(const assay_host_result*, std::size_t*)) const
+    {
+        std::size_t size = 0;
+        const char* const text = text_of(fResult.get(), &size);
+        return {text, size};
+    }
+
     static Answer make(const assay_host_answer* answer)
     {
         Answer made;

@@ -215,6 +215,19 @@ TEST(LibraryAdvice, AStopBlamesNobody)
     assay_host_stop_free(stop);
 }
 
+TEST(LibraryAdvice, NullOptionsAreTheDefaults)
+{
+    const StateFolder folder;
+    assay_host_stop* const stop = assay_host_stop_new();
+    assay_host_stop_raise(stop);
+    assay_host_advice* advice = nullptr;
+    ASSERT_EQ(assay_host_advise(nullptr, folder.Get(), stop, &advice), ASSAY_HOST_OK);
+    ASSERT_NE(advice, nullptr);
+    EXPECT_STRNE(assay_host_advice_identity(advice), "");
+    assay_host_advice_free(advice);
+    assay_host_stop_free(stop);
+}
+
 TEST(LibraryAdvice, ACallbackEndsTheAttempt)
 {
     const StateFolder folder;
@@ -304,9 +317,13 @@ TEST(LibraryAdvice, ArgumentsOutOfRange)
 {
     const StateFolder folder;
     const Options options;
-    assay_host_advice* advice = nullptr;
     EXPECT_EQ(assay_host_advise(options, folder.Get(), nullptr, nullptr), ASSAY_HOST_NULL_POINTER);
+    // What was there before a failure could be freed twice.
+    const ChildAdvice before(folder);
+    assay_host_advice* advice = before.fAdvice;
     EXPECT_EQ(assay_host_advise(options, nullptr, nullptr, &advice), ASSAY_HOST_NULL_POINTER);
+    EXPECT_EQ(advice, nullptr);
+    advice = before.fAdvice;
     EXPECT_EQ(assay_host_advise(options, "", nullptr, &advice), ASSAY_HOST_BAD_TEXT);
     EXPECT_EQ(advice, nullptr);
     assay_host_advice_free(nullptr);

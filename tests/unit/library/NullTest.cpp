@@ -62,36 +62,37 @@ TEST(LibraryNull, TextsOfAResultAreEmptyAndHaveASize)
     EXPECT_EQ(size, 0U);
 }
 
+void ExpectNoAdvice(const assay_host_advice* advice, assay_host_interface which)
+{
+    EXPECT_EQ(assay_host_advice_usable(advice, which), ASSAY_HOST_UNKNOWN);
+    EXPECT_EQ(assay_host_advice_learnt(advice, which), ASSAY_HOST_UNKNOWN);
+    for (const auto read :
+         {assay_host_advice_reason, assay_host_advice_text, assay_host_advice_source,
+          assay_host_advice_device, assay_host_advice_end, assay_host_advice_end_text,
+          assay_host_advice_change, assay_host_advice_warning})
+        EXPECT_STREQ(read(advice, which), "");
+    for (const auto read : {assay_host_advice_device_name, assay_host_advice_device_driver,
+                            assay_host_advice_last_line}) {
+        std::size_t size = kUnset;
+        EXPECT_STREQ(read(advice, which, &size), "");
+        EXPECT_EQ(size, 0U);
+        EXPECT_STREQ(read(advice, which, nullptr), "");
+    }
+    for (const auto read : {assay_host_advice_age, assay_host_advice_next_attempt}) {
+        double seconds = 5;
+        EXPECT_EQ(read(advice, which, &seconds), 0);
+        EXPECT_EQ(seconds, 5);
+    }
+    EXPECT_EQ(assay_host_advice_failures(advice, which), 0U);
+}
+
 TEST(LibraryNull, AnAdviceHasOnlyDefaults)
 {
     constexpr const assay_host_advice* kNone = nullptr;
     const StateFolder folder;
     const ChildAdvice made(folder);
-    // Of no advice, and of one about an interface that doesn't exist.
-    const std::pair<const assay_host_advice*, assay_host_interface> cases[] = {
-        {kNone, ASSAY_HOST_OPENGL}, {made.fAdvice, MakeNumber<assay_host_interface>(2)}};
-    for (const auto& [advice, which] : cases) {
-        EXPECT_EQ(assay_host_advice_usable(advice, which), ASSAY_HOST_UNKNOWN);
-        EXPECT_EQ(assay_host_advice_learnt(advice, which), ASSAY_HOST_UNKNOWN);
-        for (const auto read :
-             {assay_host_advice_reason, assay_host_advice_text, assay_host_advice_source,
-              assay_host_advice_device, assay_host_advice_end, assay_host_advice_end_text,
-              assay_host_advice_change, assay_host_advice_warning})
-            EXPECT_STREQ(read(advice, which), "");
-        for (const auto read : {assay_host_advice_device_name, assay_host_advice_device_driver,
-                                assay_host_advice_last_line}) {
-            std::size_t size = kUnset;
-            EXPECT_STREQ(read(advice, which, &size), "");
-            EXPECT_EQ(size, 0U);
-            EXPECT_STREQ(read(advice, which, nullptr), "");
-        }
-        for (const auto read : {assay_host_advice_age, assay_host_advice_next_attempt}) {
-            double seconds = 5;
-            EXPECT_EQ(read(advice, which, &seconds), 0);
-            EXPECT_EQ(seconds, 5);
-        }
-        EXPECT_EQ(assay_host_advice_failures(advice, which), 0U);
-    }
+    ExpectNoAdvice(kNone, ASSAY_HOST_OPENGL);
+    ExpectNoAdvice(made.fAdvice, MakeNumber<assay_host_interface>(2)); // there is no such interface
     EXPECT_EQ(assay_host_advice_plan(kNone), ASSAY_HOST_ANSWER);
     EXPECT_STREQ(assay_host_advice_due(kNone), "");
     EXPECT_EQ(assay_host_advice_tried(kNone), 0);

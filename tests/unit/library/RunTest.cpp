@@ -39,6 +39,20 @@ TEST(LibraryRun, AWholeReport)
     EXPECT_EQ(size, 0U);
 }
 
+// The stop ends the default program, if there is one, at its start.
+TEST(LibraryRun, NullOptionsAreTheDefaults)
+{
+    assay_host_stop* const stop = assay_host_stop_new();
+    assay_host_stop_raise(stop);
+    assay_host_result* result = nullptr;
+    ASSERT_EQ(assay_host_run(nullptr, stop, &result), ASSAY_HOST_OK);
+    ASSERT_NE(result, nullptr);
+    EXPECT_THAT(assay_host_result_verdict(result),
+                testing::AnyOf(ASSAY_HOST_INTERRUPTED, ASSAY_HOST_NEVER_STARTED));
+    assay_host_result_free(result);
+    assay_host_stop_free(stop);
+}
+
 TEST(LibraryRun, EachVerdict)
 {
     EXPECT_EQ(ChildRun({"exit", "7"}).GetVerdict(), ASSAY_HOST_FAILED_TESTS);

@@ -58,6 +58,16 @@ TEST(LibraryValues, OfAnswersPlansAndChoices)
                    {ASSAY_HOST_NUMBER, 2},
                    {ASSAY_HOST_LIST, 3}});
     ExpectNumbers({{ASSAY_HOST_ANSWER, 0}, {ASSAY_HOST_TRY, 1}, {ASSAY_HOST_WAIT, 2}});
+    ExpectNumbers({{ASSAY_HOST_MAX_AGE, 0},
+                   {ASSAY_HOST_KEEP_ABSENT, 1},
+                   {ASSAY_HOST_KEEP_UNKNOWN, 2},
+                   {ASSAY_HOST_PAUSE, 3},
+                   {ASSAY_HOST_PAUSE_GROWTH, 4},
+                   {ASSAY_HOST_RETRIES, 5},
+                   {ASSAY_HOST_FORGIVE, 6},
+                   {ASSAY_HOST_FORGIVE_FREEZE, 7},
+                   {ASSAY_HOST_UNCLEAR, 8},
+                   {ASSAY_HOST_UNCLEAR_PAUSE, 9}});
     ExpectNumbers({{ASSAY_HOST_CHOICE_AUTO, 0},
                    {ASSAY_HOST_CHOICE_HARDWARE, 1},
                    {ASSAY_HOST_CHOICE_SOFTWARE, 2},

@@ -49,6 +49,30 @@ TEST(Wrapper, BringsTheResultAsValues)
     EXPECT_EQ(result.document().front(), '{');
 }
 
+TEST(Wrapper, HasTheLastLinesAndWhatTheLimitsDropped)
+{
+    using namespace std::string_literals;
+    // Lines "x=<zero byte>" and "# <zero byte>y".
+    const assay::Result result =
+        run(MakeOptions({"raw", "783d000a232000790a", "flood-errors", "70000"}));
+    EXPECT_EQ(result.last_line(), "x=\0"s);
+    EXPECT_EQ(result.last_log_line(), "# \0y"s);
+    EXPECT_EQ(result.lost_bytes(), 0U);
+    EXPECT_EQ(result.lost_error_bytes(), 70000U - 65536U);
+    assay::Options short_lines = MakeOptions({"out", "x=12345"});
+    short_lines.max_line_bytes = 4;
+    const assay::Result cut = run(short_lines);
+    EXPECT_EQ(cut.last_line(), "x=12");
+    EXPECT_EQ(cut.last_log_line(), "");
+    EXPECT_EQ(cut.lost_bytes(), 3U);
+    EXPECT_EQ(cut.lost_error_bytes(), 0U);
+}
+
+TEST(Wrapper, HasTheVersion)
+{
+    EXPECT_EQ(assay::version(), assay_host_version());
+}
+
 TEST(Wrapper, AnExceptionOfACallbackEndsTheRunAndArrives)
 {
     assay::Options options = MakeOptions({"out", "x", "sleep", "600000"});

@@ -113,6 +113,22 @@ TEST(LibraryHost, AnExceptionOfACallbackClosesTheAttempt)
     EXPECT_STREQ(assay_host_advice_warning(later.fAdvice, ASSAY_HOST_OPENGL), "");
 }
 
+// Whatever the caller's variable had before.
+TEST(LibraryHost, AFailureLeavesNoResultAndNoAdvice)
+{
+    Options options;
+    options.OnLine([](const std::string&) -> int { throw std::runtime_error("a failure"); });
+    for (const std::string& word : kWhole)
+        assay_host_options_add_argument(options, word.c_str());
+    auto* result = reinterpret_cast<assay_host_result*>(&options);
+    EXPECT_EQ(assay_host_run(options, nullptr, &result), ASSAY_HOST_INTERNAL);
+    EXPECT_EQ(result, nullptr);
+    const StateFolder folder;
+    auto* advice = reinterpret_cast<assay_host_advice*>(&options);
+    EXPECT_EQ(assay_host_advise(options, folder.Get(), nullptr, &advice), ASSAY_HOST_INTERNAL);
+    EXPECT_EQ(advice, nullptr);
+}
+
 // Threads that the library starts never run a handler of the host.
 TEST(LibraryHost, SignalsGoToItsOwnThreads)
 {
