@@ -1,3 +1,6 @@
+/* SPDX-FileCopyrightText: 2026 the assay authors
+ * SPDX-License-Identifier: MIT */
+
 /* Decides whether an application uses OpenGL, by libassay-host.
  *
  * usage: decide [PROGRAM [argument...]]    PROGRAM replaces the assay beside the library */

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 the assay authors
+// SPDX-License-Identifier: MIT
+
 // Decides whether an application uses OpenGL and OpenCL, by the C++ wrapper of libassay-host, and
 // shows what the child is doing.
 //
@@ -30,8 +33,9 @@ try {
     }
     for (const assay::Warning& warning : result.warnings())
         std::cout << "warning " << warning.code << ": " << warning.text << '\n';
-    if (const assay::Answer memory = result.find("glgpu[0].GLMemoryMB"); memory)
-        std::cout << std::get<double>(memory.value) << " MiB\n";
+    const assay::Answer memory = result.find("glgpu[0].GLMemoryMB");
+    if (const auto* const number = std::get_if<double>(&memory.value))
+        std::cout << *number << " MiB\n";
 } catch (const std::exception& failure) {
     std::cerr << "decide: " << failure.what() << '\n';
     return 1;

@@ -1,4 +1,7 @@
 #!/usr/bin/env python3
+# SPDX-FileCopyrightText: 2026 the assay authors
+# SPDX-License-Identifier: MIT
+
 """Decides whether an application uses OpenGL, by libassay-host and ctypes.
 
 usage: decide.py [PROGRAM [argument...]]    PROGRAM replaces the assay beside the library
@@ -54,9 +57,9 @@ def main():
         # The whole result as JSON, for hosts that don't need every function.
         report = json.loads(document(result, None))
         print(report["outcome"]["verdict"])
-        memory = next((device["keys"]["GLMemoryMB"] for device in report["devices"]), {"known": False})
-        if memory["known"]:
-            print(memory["number"], "MiB")
+        devices = [device for device in report["devices"] if device["kind"] == "OpenGL"]
+        if devices and "number" in devices[0]["keys"]["GLMemoryMB"]:
+            print(devices[0]["keys"]["GLMemoryMB"]["number"], "MiB")
     finally:
         result_free(result)
         options_free(options)
