@@ -10,6 +10,7 @@
 
 #include "report/Bytes.h"
 #include "report/Numbers.h"
+#include "report/RunLog.h"
 #include "supervise/Judge.h"
 
 namespace assay_host {

@@ -4,6 +4,7 @@
 #include <dirent.h>
 
 #include <fstream>
+#include <memory>
 #include <sstream>
 #include <string>
 
@@ -37,11 +38,11 @@ Status ReadStatus(const std::string& process)
 std::map<::pid_t, char> ListChildren(::pid_t parent)
 {
     std::map<::pid_t, char> result;
-    DIR* const folder = ::opendir("/proc");
+    const std::unique_ptr<DIR, int (*)(DIR*)> folder(::opendir("/proc"), ::closedir);
     if (folder == nullptr)
         return result;
     // NOLINTNEXTLINE(concurrency-mt-unsafe): each stream is read by one thread
-    while (const dirent* entry = ::readdir(folder)) {
+    while (const dirent* entry = ::readdir(folder.get())) {
         const std::string name = entry->d_name;
         if (name.find_first_not_of("0123456789") != std::string::npos)
             continue;
@@ -50,7 +51,6 @@ std::map<::pid_t, char> ListChildren(::pid_t parent)
             result.emplace(static_cast<::pid_t>(std::strtol(name.c_str(), nullptr, 10)),
                            status.fState);
     }
-    ::closedir(folder);
     return result;
 }
 

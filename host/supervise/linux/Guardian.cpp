@@ -54,8 +54,10 @@ public:
                 end = TakeChange();
             else if (number == SIGTSTP)
                 ::kill(fWorker, SIGSTOP); // Suspend follows once it has stopped
-            else if (number > 0)
-                ::kill(fWorker, number); // not waited for yet, so no other process's number
+            else
+                // Not waited for yet, so no other process has the number. The call refuses -1,
+                // which an interrupted wait returned.
+                ::kill(fWorker, number);
         }
         fTree.EndAll(end.si_code == CLD_EXITED ? kRestSeconds : kLastSeconds);
         if (end.si_code != CLD_EXITED)
@@ -118,7 +120,8 @@ sigset_t GetGuardianSignals()
     ::sigfillset(&result);
     for (int number = 1; number <= SIGRTMAX; ++number) {
         struct sigaction action = {};
-        if (::sigaction(number, nullptr, &action) == 0 && action.sa_handler == SIG_IGN)
+        ::sigaction(number, nullptr, &action);
+        if (action.sa_handler == SIG_IGN)
             ::sigdelset(&result, number);
     }
     for (const int number : {SIGCONT, SIGURG, SIGWINCH})
@@ -129,9 +132,9 @@ sigset_t GetGuardianSignals()
 void BecomeWorker()
 {
     ::setpgid(0, 0);
-    ::prctl(PR_SET_NAME, kWorkerName, 0, 0, 0);
+    ::prctl(PR_SET_NAME, kWorkerName);
     std::signal(GetDeathSignal(), SIG_DFL); // the parent may have ignored it
-    ::prctl(PR_SET_PDEATHSIG, GetDeathSignal(), 0, 0, 0);
+    ::prctl(PR_SET_PDEATHSIG, GetDeathSignal());
     if (!IsGuarded())
         EndProcess(kSignalStatus +
                    SIGKILL); // the guardian has ended already; nothing is started yet

@@ -1,6 +1,5 @@
 #include "supervise/ProcessTree.h"
 
-#include <cerrno>
 #include <csignal>
 #include <sys/prctl.h>
 #include <sys/wait.h>
@@ -22,7 +21,7 @@ constexpr std::chrono::milliseconds kPause{2};
 bool HasChildren()
 {
     siginfo_t info = {};
-    return ::waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT) == 0 || errno != ECHILD;
+    return ::waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT) == 0;
 }
 
 bool HasEnded(char state)
@@ -43,7 +42,7 @@ public:
     Platform() : fBefore(ListOwnChildren())
     {
         // Orphaned descendants become children of this process.
-        ::prctl(PR_SET_CHILD_SUBREAPER, 1, 0, 0, 0);
+        ::prctl(PR_SET_CHILD_SUBREAPER, 1);
     }
 
     // Kills only children of this process: only it reaps them, so that no process id is reused. The
@@ -59,13 +58,11 @@ public:
             if (std::chrono::steady_clock::now() >= deadline)
                 return std::all_of(children.begin(), children.end(),
                                    [](const auto& child) { return HasEnded(child.second); });
-            bool left = false;
             for (const auto& [child, state] : children) {
                 ::kill(child, SIGKILL);
-                left = ::waitpid(child, nullptr, WNOHANG) == 0 || left;
+                ::waitpid(child, nullptr, WNOHANG);
             }
-            if (left)
-                std::this_thread::sleep_for(kPause);
+            std::this_thread::sleep_for(kPause);
         }
     }
 

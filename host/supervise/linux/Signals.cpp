@@ -16,7 +16,8 @@ sigset_t GetEndSignals()
         ::sigdelset(&result, number);
     for (int number = 1; number <= SIGRTMAX; ++number) {
         struct sigaction action = {};
-        if (::sigaction(number, nullptr, &action) == 0 && action.sa_handler == SIG_IGN)
+        ::sigaction(number, nullptr, &action);
+        if (action.sa_handler == SIG_IGN)
             ::sigdelset(&result, number);
     }
     return result;

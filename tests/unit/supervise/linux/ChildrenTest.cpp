@@ -7,6 +7,8 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "support/Allocations.h"
+
 namespace assay_host {
 namespace {
 
@@ -49,6 +51,11 @@ TEST(ListChildren, LeavesNoDescriptor)
     const int before = open();
     ListChildren(::getpid());
     EXPECT_EQ(open(), before) << "the lowest free descriptor is another one";
+    {
+        const assay_test::FailingAllocation failing(0);
+        EXPECT_THROW(ListChildren(::getppid()), std::bad_alloc);
+    }
+    EXPECT_EQ(open(), before) << "when memory is short";
 }
 
 } // namespace

@@ -5,17 +5,14 @@
 
 #include <cerrno>
 #include <csignal>
-#include <cstddef>
 #include <fcntl.h>
-#include <linux/filter.h>
-#include <linux/seccomp.h>
 #include <sched.h>
-#include <sys/prctl.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include "supervise/linux/Guarded.h"
+#include "support/linux/RefusedCalls.h"
 
 namespace assay_host {
 namespace {
@@ -75,16 +72,7 @@ TEST(Guardian, ItsWorkerEndsWhatItStartedWhenTheGuardianIsKilled)
 // From now on this process can't start another one.
 bool ForbidProcesses()
 {
-    sock_filter filter[] = {
-        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_clone, 1, 0),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_clone3, 0, 1),
-        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EAGAIN),
-        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
-    };
-    const sock_fprog program = {sizeof filter / sizeof filter[0], filter};
-    return ::prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
-           ::prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) == 0;
+    return RefuseCall(SYS_clone, -1, 0, EAGAIN) && RefuseCall(SYS_clone3, -1, 0, EAGAIN);
 }
 
 constexpr int kNoFilter = 77;
@@ -104,6 +92,29 @@ int GuardWithoutProcesses()
         return 1;
     EndUnguarded();
     return IsGuarded() ? 0 : 2;
+}
+
+int GuardWithoutParent()
+{
+    if (!RefuseCall(SYS_getppid, -1, 0, EPERM))
+        return kNoFilter;
+    GuardProcess();
+    return 0;
+}
+
+// The worker sees another parent, and ends as if it had been killed; so does its guardian then.
+TEST(Guardian, AWorkerWhoseGuardianHasEndedDoesNotBegin)
+{
+    const ::pid_t child = ::fork();
+    ASSERT_GE(child, 0);
+    if (child == 0)
+        ::_exit(GuardWithoutParent());
+    int status = 0;
+    ASSERT_EQ(::waitpid(child, &status, 0), child);
+    ASSERT_TRUE(WIFEXITED(status));
+    if (WEXITSTATUS(status) == kNoFilter)
+        GTEST_SKIP() << "this system has no filters of system calls";
+    EXPECT_EQ(WEXITSTATUS(status), 128 + SIGKILL);
 }
 
 TEST(Guardian, AProcessThatCannotForkRunsOnByItself)
