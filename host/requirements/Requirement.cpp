@@ -184,8 +184,7 @@ private:
     std::string ParseValue()
     {
         SkipBlanks();
-        const std::size_t end = fRest.find_last_not_of(kBlanks);
-        fRest = fRest.substr(0, end == std::string_view::npos ? 0 : end + 1);
+        fRest = fRest.substr(0, fRest.find_last_not_of(kBlanks) + 1);
         if (fRest.empty())
             Fail("a value is missing");
         if (fRest[0] != '"')

@@ -9,7 +9,6 @@ namespace assay_host {
 std::vector<std::size_t> DeviceList::Match(const std::vector<DeviceAnswers>& devices)
 {
     std::vector<std::string> names;
-    names.reserve(devices.size());
     for (const DeviceAnswers& device : devices)
         names.push_back(GetDeviceName(device));
     std::vector<std::optional<std::size_t>> places(devices.size());

@@ -28,7 +28,7 @@ Report MakeMedianReport(const Report& shown, const Series& series)
     Report report;
     for (const ReportLine& line : shown.GetLines()) {
         const auto value = values.find(line.fKey);
-        if (line.fKind != LineKind::kValue || value == values.end())
+        if (value == values.end())
             report.Add(line);
         else
             report.Add(ReadLine(line.fKey + "=" + value->second, "\n", false));

@@ -80,13 +80,12 @@ double GetNormalP(std::size_t first, std::size_t second, const Ranked& ranked)
     const boost::math::normal_distribution<double, Policy> normal;
     const auto pairs = static_cast<double>(first) * static_cast<double>(second);
     const auto size = static_cast<double>(first + second);
-    const double variance =
-        pairs / 12 * (size + 1 - (size > 1 ? ranked.fTies / (size * (size - 1)) : 0.0));
+    const double variance = pairs / 12 * (size + 1 - ranked.fTies / (size * (size - 1)));
     // A step of U is one, or a half with ties; the continuity correction is half of one.
     const double distance = std::abs(ranked.fU - pairs / 2) - 0.5;
-    if (distance <= 0 || variance <= 0)
-        return 1;
-    return 2 * boost::math::cdf(boost::math::complement(normal, distance / std::sqrt(variance)));
+    // Without a variance, as of equal values only, the distance is negative.
+    const double deviations = distance / std::sqrt(std::max(variance, 0.0));
+    return std::min(1.0, 2 * boost::math::cdf(boost::math::complement(normal, deviations)));
 }
 
 } // namespace
@@ -107,7 +106,7 @@ double GetSmallestP(std::size_t first, std::size_t second)
     const std::size_t small = std::min(first, second);
     const std::size_t large = std::max(first, second);
     double p = 2; // both ends, each of one in all the ways to choose the ranks of a sample
-    for (std::size_t rank = 1; rank <= small && p > 0; ++rank)
+    for (std::size_t rank = 1; rank <= small; ++rank)
         p *= static_cast<double>(rank) / static_cast<double>(large + rank);
     return std::min(1.0, p);
 }

@@ -141,6 +141,35 @@ TEST(NodeFeatures, AreValidLabels)
     }
 }
 
+// A report of OpenGL devices whose features are larger by so many bytes than those of short names.
+std::string GetPaddedText(int devices, std::size_t more)
+{
+    Sample sample(devices, 0);
+    // The labels are those of the first device.
+    for (int device = 1; device < devices; ++device) {
+        const std::size_t part = std::min<std::size_t>(more, 199);
+        sample.Set("glgpu[" + std::to_string(device) + "].GLName",
+                   "\"" + std::string(part + 1, 'N') + "\"");
+        more -= part;
+    }
+    return GetText(sample.GetText());
+}
+
+TEST(NodeFeatures, AreLeftOutFromTheFirstByteBeyondTheLimit)
+{
+    // 80 bytes are kept free for the line that counts them.
+    constexpr std::size_t kLimit = 65536 - 80;
+    int devices = 2;
+    while (GetPaddedText(devices + 1, 0).find("left out") == std::string::npos)
+        ++devices;
+    const std::size_t more = kLimit - GetPaddedText(devices, 0).size();
+    const std::string full = GetPaddedText(devices, more);
+    EXPECT_EQ(full.size(), kLimit);
+    EXPECT_EQ(full.find("left out"), std::string::npos);
+    EXPECT_THAT(GetPaddedText(devices, more + 1),
+                testing::EndsWith("\n# left out beyond 65536 bytes: 1\n"));
+}
+
 TEST(NodeFeatures, FitIntoTheLargestFile)
 {
     const std::string text = GetText(

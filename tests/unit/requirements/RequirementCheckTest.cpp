@@ -115,8 +115,10 @@ TEST(RequirementCheck, WithoutALibraryThereAreNoDevices)
     EXPECT_EQ(FindUnmetIn(text, "opencl.devices==0"), "");
     EXPECT_EQ(FindUnmetIn(text, "opencl.devices>=1"), "0 (no OpenCL)");
     EXPECT_EQ(FindUnmetIn(text, "opencl.usable==absent"), "");
-    EXPECT_EQ(FindUnmetIn(text, "opencl.usable!=absent"), "absent (There is no OpenCL library.)");
-    EXPECT_EQ(FindUnmetIn(text, "opencl.usable==hardware"), "absent (There is no OpenCL library.)");
+    EXPECT_EQ(FindUnmetIn(text, "opencl.usable!=absent"),
+              "absent (There is no OpenCL library that can be used.)");
+    EXPECT_EQ(FindUnmetIn(text, "opencl.usable==hardware"),
+              "absent (There is no OpenCL library that can be used.)");
     EXPECT_EQ(FindUnmetIn(text, "opencl.usable!=hardware"), "");
 }
 

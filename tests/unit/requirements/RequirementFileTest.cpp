@@ -7,6 +7,8 @@
 #include <sstream>
 #include <stdexcept>
 
+#include "support/TempPath.h"
+
 using namespace assay_host;
 
 namespace {
@@ -47,7 +49,7 @@ TEST(RequirementFile, SaysWhatIsWrong)
 
 TEST(RequirementFile, IsLoadedByItsPath)
 {
-    const std::string path = testing::TempDir() + "requirements-\xC3\xA9.json";
+    const std::string path = MakeTempPath("requirements-\xC3\xA9");
     std::ofstream(std::filesystem::u8path(path)) << R"({"require": ["GLVersion>=3.3"]})";
     const std::vector<Requirement> requirements = LoadRequirements(path);
     std::filesystem::remove(std::filesystem::u8path(path));

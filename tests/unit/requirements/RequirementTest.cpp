@@ -75,6 +75,7 @@ TEST(Requirement, TheKeyDecidesTheTypeOfTheValue)
     EXPECT_EQ(std::get<double>(wanted("GLVendorID==4318")), 4318);
     EXPECT_EQ(std::get<double>(wanted("GLVendorID==0xABCDEF01")), 0xABCDEF01);
     EXPECT_EQ(std::get<double>(wanted("GLVendorID==0xabcdef89")), 0xABCDEF89);
+    EXPECT_EQ(std::get<double>(wanted("GLVendorID==0x234567")), 0x234567);
     EXPECT_EQ(std::get<double>(wanted("NumGLGPUs>=1")), 1);
     EXPECT_EQ(std::get<double>(wanted("glGetIntegerv[GL_MAX_DRAW_BUFFERS]>=8")), 8);
     EXPECT_EQ(std::get<double>(wanted("opengl.devices>=8")), 8);
@@ -133,6 +134,7 @@ TEST(Requirement, SaysWhatIsWrong)
         {"GLFrameBufferOK==2", R"("GLFrameBufferOK==2": "2" is neither 0 nor 1)"},
         {"GLMemoryMB>=2 GB", R"("GLMemoryMB>=2 GB": "2 GB" is no number)"},
         {"GLVendorID==0x", R"("GLVendorID==0x": "0x" is no number)"},
+        {"GLVendorID==0x1g", R"("GLVendorID==0x1g": "0x1g" is no number)"},
         {"GLVendorID==0x123456789", R"("GLVendorID==0x123456789": "0x123456789" is no number)"},
         {"GLVersion>=new", R"("GLVersion>=new": "new" has no version number)"},
         {"opengl.usable==good",

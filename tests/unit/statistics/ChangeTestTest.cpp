@@ -97,6 +97,8 @@ TEST(ChangeTest, TooFewSamplesShowNothing)
 {
     EXPECT_EQ(TestChange({}, {1, 2, 3}).fChange, Change::kTooFew);
     EXPECT_EQ(TestChange({1, 2, 3}, {}).fChange, Change::kTooFew);
+    EXPECT_EQ(TestChange({}, {}).fRanks.fP, 1);
+    EXPECT_EQ(TestChange({1, 2, 3}, {4, 5}).fRanks.fP, 0.2);
     EXPECT_EQ(TestChange({1, 2, 3, 4}, {5, 6, 7, 8}).fChange, Change::kTooFew);
     EXPECT_EQ(TestChange({1, 2, 3, 4, 5}, {6, 7, 8, 9, 10}).fChange, Change::kChange);
 }

@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <vector>
 
 #include "References.h"
@@ -44,6 +45,39 @@ TEST(RankTest, EqualValuesCountAsAHalf)
     EXPECT_FALSE(TestRanks({1, 2}, {2, 3}).fIsExact);
 }
 
+// The U at the mean, and those half a step and a step beside it.
+TEST(RankTest, NearTheMeanThePIsOne)
+{
+    EXPECT_EQ(TestRanks({1, 4}, {2, 3}).fP, 1);
+    EXPECT_EQ(TestRanks({1, 2}, {1, 2}).fP, 1);
+    EXPECT_EQ(TestRanks({1}, {1, 2}).fP, 1);
+    EXPECT_LT(TestRanks({1, 2}, {2, 3}).fP, 1);
+}
+
+TEST(RankTest, EqualValuesOnlyHaveNoVariance)
+{
+    for (const std::size_t size : {1U, 2U, 100U, 3000U}) {
+        const std::vector<double> same(size, 0.1);
+        EXPECT_EQ(TestRanks(same, {0.1}).fP, 1) << size;
+        EXPECT_EQ(TestRanks(same, same).fP, 1) << size;
+    }
+}
+
+// One of four values is apart: U is 3 of 3, the variance 3/12 * (5 - 24/12), the distance 1.
+TEST(RankTest, AVarianceBelowOne)
+{
+    ExpectClose(TestRanks({2}, {1, 1, 1}).fP, std::erfc(1 / std::sqrt(0.75) / std::sqrt(2.0)));
+    ExpectClose(TestRanks({1, 1, 1}, {2}).fP, std::erfc(1 / std::sqrt(0.75) / std::sqrt(2.0)));
+}
+
+TEST(RankTest, BeforeATestNothingIsKnown)
+{
+    const RankTest test;
+    EXPECT_EQ(test.fU, 0);
+    EXPECT_EQ(test.fP, 1);
+    EXPECT_FALSE(test.fIsExact);
+}
+
 TEST(RankTest, IsExactUpToALimit)
 {
     std::vector<double> first;
@@ -63,6 +97,8 @@ TEST(RankTest, TheSmallestPIsThatOfSamplesApart)
     ExpectClose(GetSmallestP(2, 4), 2.0 / 15);
     ExpectClose(GetSmallestP(5, 4), TestRanks({1, 2, 3, 4, 5}, {6, 7, 8, 9}).fP);
     EXPECT_EQ(GetSmallestP(1, 1), 1);
+    ExpectClose(GetSmallestP(1, 2), 2.0 / 3);
+    ExpectClose(GetSmallestP(2, 2), 2.0 / 6);
     EXPECT_EQ(GetSmallestP(0, 9), 1);
     EXPECT_EQ(GetSmallestP(100000, 100000), 0);
 }

@@ -63,8 +63,20 @@ TEST(Summary, OfOneSample)
     EXPECT_FALSE(summary.IsOutlier(7));
 }
 
+TEST(Summary, OfNothingIsZero)
+{
+    const Summary summary;
+    for (const double value :
+         {summary.fMinimum, summary.fLowerQuartile, summary.fMedian, summary.fUpperQuartile,
+          summary.fMaximum, summary.fLowerFence, summary.fUpperFence})
+        EXPECT_EQ(value, 0);
+}
+
 TEST(Summary, ARelativeSpreadNeedsAMedian)
 {
+    EXPECT_EQ(Summarize({-4, 0, 0, 4, 4}).GetSpread(), 4);
+    EXPECT_EQ(Summarize({-4, 0, 0, 4, 4}).GetRelativeSpread(), 0);
+    EXPECT_EQ(Summarize({1, 1, 1, 3, 3}).GetRelativeSpread(), 2);
     EXPECT_EQ(Summarize({0, 0, 0}).GetRelativeSpread(), 0);
 }
 
