@@ -12,6 +12,7 @@ import pytest
 
 from conftest import BUILD, NO_OPENCL_PLATFORM, TREE, run_under_wine
 from harness import text_of
+from links import dead_links
 
 
 def pack(tmp_path, **variables):
@@ -40,7 +41,7 @@ def test_name_has_version_and_machine(package):
 def test_has_programs_documents_and_licences(package):
     assert {path.name for path in package.iterdir()} == {
         "assay.exe", "assay-host.exe", "assay-host.dll", "include", "lib", "examples", "README.md",
-        "docs", "schema", "check.cmd", "check", "LICENSE", "CHANGELOG.md", "THIRD-PARTY-NOTICES.txt", "assay.spdx.json"}
+        "ARCHITECTURE.md", "CONTRIBUTING.md", "docs", "schema", "check.cmd", "check", "LICENSE", "CHANGELOG.md", "THIRD-PARTY-NOTICES.txt", "assay.spdx.json"}
     assert (package / "docs" / "report-format.md").stat().st_size > 0
     assert not list((package / "docs").rglob("*.scd"))
     assert {path.name for path in (package / "include").iterdir()} == {
@@ -50,7 +51,8 @@ def test_has_programs_documents_and_licences(package):
     assert {path.name for path in (package / "lib" / "cmake" / "assay-host").iterdir()} == {
         "assay-hostConfig.cmake", "assay-hostConfigVersion.cmake"}
     assert {path.name for path in (package / "examples").iterdir()} == {
-        "decide.c", "decide.cpp", "decide.js", "decide.py"}
+        "decide.c", "decide.cpp", "decide.js", "decide.py", "desktop.cpp"}
+    assert dead_links(package) == []
 
 
 def build_example(package, folder, compiler, source, library, *options):
@@ -120,18 +122,24 @@ def test_list_of_exports_makes_an_import_library(package, tmp_path):
     check_decision(program, first="complete: ")
 
 
-LINKED = {"Boost", "fmt", "CLI11", "nlohmann-json", "GCC-runtime", "MinGW-w64-runtime"}
+# The unit tests for the user's machine have GoogleTest.
+LINKED = {"boost1.74", "googletest", "g++-mingw-w64-x86-64-posix", "gcc-mingw-w64-x86-64-posix",
+          "mingw-w64-x86-64-dev"}
+CODE_OF_HEADERS = {"libboost1.74-dev", "libcli11-dev", "libfmt-dev", "nlohmann-json3-dev"}
 
 
 def test_names_what_is_linked_in(package):
     notices = (package / "THIRD-PARTY-NOTICES.txt").read_text(encoding="utf-8")
     sbom = json.loads((package / "assay.spdx.json").read_text(encoding="utf-8"))
-    names = {each["SPDXID"]: each["name"] for each in sbom["packages"]}
-    linked = {names[each["relatedSpdxElement"]] for each in sbom["relationships"]
-              if each["relationshipType"] == "STATIC_LINK"}
-    assert linked == LINKED
-    for name in linked:
-        assert re.search(rf"^={{78}}\n{name} \d", notices, re.MULTILINE)
+    packages = {each["SPDXID"]: each for each in sbom["packages"]}
+    related = {packages[each["relatedSpdxElement"]]["name"]: each["relationshipType"]
+               for each in sbom["relationships"]}
+    assert {name for name, kind in related.items() if kind == "STATIC_LINK"} == LINKED
+    assert {name for name, kind in related.items() if kind == "CONTAINS"} == CODE_OF_HEADERS
+    assert "DYNAMIC_LINK" not in related.values()
+    for each in packages.values():
+        if each["name"] in LINKED | CODE_OF_HEADERS:
+            assert f"{each['name']} {each['versionInfo']}: {each['licenseConcluded']}\n" in notices
 
 
 def test_runs_in_an_empty_prefix(package, tmp_path):
