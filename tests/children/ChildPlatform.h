@@ -16,4 +16,5 @@ void SpawnGrandchild(const std::vector<std::string>& command); // of words witho
 void WriteCommandLine();
 std::string GetOwnPath();
 int CountPipes();
+void EndFirstThread();
 void WriteState();

@@ -7,6 +7,7 @@
 //   exit CODE              ends with the code
 //   sleep MILLISECONDS
 //   await FILE             waits until this file exists
+//   touch FILE             makes this file
 //   echo                   copies standard input to standard output until it ends
 //   flood BYTES            writes this many bytes to standard output
 //   flood-errors BYTES     the same to standard error
@@ -20,6 +21,7 @@
 //   line                   writes its command line, each character in hexadecimal (Windows only)
 //   self                   writes the path of its program
 //   pipes                  writes the number of pipe ends that it has open
+//   thread                 ends its first thread, and lives on with another (Linux only)
 //   state                  writes its open descriptors and its signal state (Linux only)
 #include <chrono>
 #include <cstdio>
@@ -107,6 +109,8 @@ int main(int argc, char** argv)
             std::this_thread::sleep_for(std::chrono::milliseconds(std::atoi(next())));
         } else if (word == "await") {
             Await(next());
+        } else if (word == "touch") {
+            std::ofstream made(next());
         } else if (word == "echo") {
             Echo();
         } else if (word == "flood") {
@@ -134,6 +138,8 @@ int main(int argc, char** argv)
         } else if (word == "pipes") {
             std::printf("pipes %d\n", CountPipes());
             std::fflush(stdout);
+        } else if (word == "thread") {
+            EndFirstThread();
         } else if (word == "state") {
             WriteState();
         } else if (word == "args") {

@@ -7,9 +7,10 @@ import select
 import signal
 import subprocess
 import sys
+import tempfile
 import time
 import uuid
-from dataclasses import dataclass
+from dataclasses import dataclass, replace
 from pathlib import Path
 
 import pytest
@@ -187,11 +188,15 @@ def host_run(*arguments, **options):
 def host_run_until(condition, folder, *arguments, environment, child=()):
     """Runs assay-host; its timeout passes when the condition is true. The folder is for the cue."""
     cue = Cue(folder)
-    with Watched(*arguments, "--timeout", str(TIMEOUT), *child,
-                 environment={**environment, **cue.variables}) as watched:
+    # Nothing reads from a pipe until the condition is true.
+    with tempfile.TemporaryFile() as out, \
+            Watched(*arguments, "--timeout", str(TIMEOUT), *child, stdout=out,
+                    environment={**environment, **cue.variables}) as watched:
         until(lambda: watched.process.poll() is not None or condition(), "the timeout doesn't pass")
         cue.give()
-        return watched.finish()
+        hosted = watched.finish()
+        out.seek(0)
+        return replace(hosted, out=out.read())
 
 
 def run_assay(host, *options, child=(), assay=None, machine=None, **more):

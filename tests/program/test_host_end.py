@@ -15,15 +15,18 @@ from pathlib import Path
 
 import pytest
 
-from harness import SANITIZED_BY, until
+from harness import EMULATED, SANITIZED_BY, until
 from hosting import (CHILD, ERROR_STATUS, HOST_ON_CUE, TIMEOUT, Cue, Watched, host_run,
                      processes_with, script_child, texts)
 
 INTERRUPTED = 6
 LONG = bool(os.environ.get("ASSAY_LONG_TESTS"))
 
-# Prints many lines, then hangs, with a grandchild in a session of its own.
-CHATTERBOX = """
+# A grandchild in a session of its own. Under emulation nobody could end it: emulation.py has the reason.
+GRANDCHILD = "" if EMULATED else """setsid sh -c "trap '' INT TERM HUP; while :; do sleep 1; done" &"""
+
+# Prints many lines, then hangs.
+CHATTERBOX = f"""
 i=0
 while [ $i -lt 2000 ]; do
     echo "key$i=$i aaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaa"
@@ -31,7 +34,7 @@ while [ $i -lt 2000 ]; do
     i=$((i + 1))
 done
 trap '' INT TERM HUP
-setsid sh -c "trap '' INT TERM HUP; while :; do sleep 1; done" &
+{GRANDCHILD}
 touch "$READY"
 while :; do sleep 1; done
 """
@@ -65,6 +68,14 @@ class Scene:
         self.await_ready()
         self.cue.give()
         await_none(watched)
+
+    def fill(self):
+        """Fills the pipe, so that the next write to it blocks."""
+        os.set_blocking(self.write, False)
+        with contextlib.suppress(BlockingIOError):
+            while True:
+                os.write(self.write, bytes(65536))
+        os.set_blocking(self.write, True)
 
     def close(self):
         for end in ("read", "write"):
@@ -143,6 +154,37 @@ def test_signal_before_the_timeout(scene, name):
         scene.await_ready()
         watched.process.send_signal(signal.SIGTERM)
         assert watched.finish().status == INTERRUPTED # without waiting for the reader
+
+
+# The command, its stream that isn't read, what the child does at its end, and the file that the host
+# has written before its last output.
+LAST_OUTPUTS = {
+    "advise": ("advise --state state", "stdout", "", "state/*.json"),
+    "bugreport": ("bugreport --yes --output archive", "stdout", "", "archive"),
+    "error": ("bugreport --yes --output archive", "stderr", "touch archive", "archive"),
+}
+
+
+@pytest.mark.parametrize("name", LAST_OUTPUTS)
+def test_last_output_that_is_not_read(scene, name):
+    """The run is over; a signal ends the host at once."""
+    command, stream, last, written = LAST_OUTPUTS[name]
+    child = script_child(scene.folder, f"touch there; until [ -e go ]; do sleep 0.01; done; {last}")
+    with Watched(*command.split(), "--assay", child, "--timeout", "0", cwd=scene.folder,
+                 **{"stdout": subprocess.DEVNULL, stream: scene.write}) as watched:
+        until((scene.folder / "there").exists, "the child doesn't start")
+        scene.fill()
+        (scene.folder / "go").touch()
+        until(lambda: [file for file in scene.folder.glob(written) if b'"open"' not in file.read_bytes()],
+              "the run doesn't end")
+        await_none(watched)
+
+        def is_ended():
+            watched.process.send_signal(signal.SIGTERM)
+            return watched.process.poll() is not None
+
+        until(is_ended, "the host doesn't end")
+        assert watched.process.returncode == INTERRUPTED
 
 
 def test_late_reader_gets_everything(scene):
@@ -250,9 +292,18 @@ def test_ignored_hangup_stays_ignored(tmp_path):
         assert watched.finish().status == 0
 
 
-def test_torture_is_interrupted(scene):
-    with Watched("torture", "--assay", scene.child, stdout=scene.write,
-                 environment={**os.environ, "READY": str(scene.ready)}) as watched:
+# The other commands that run a child.
+OTHERS = ["torture", "check --require NumGLGPUs>=1", "advise --state state", "bugreport --yes"]
+
+
+def watch_other(scene, command, **more):
+    return Watched(*command.split(), "--assay", scene.child, "--timeout", "0", cwd=scene.folder,
+                   environment={**os.environ, "READY": str(scene.ready)}, **more)
+
+
+@pytest.mark.parametrize("command", OTHERS)
+def test_other_commands_are_interrupted(scene, command):
+    with watch_other(scene, command) as watched:
         scene.await_ready()
         watched.process.send_signal(signal.SIGINT)
         watched.process.send_signal(signal.SIGTERM)
@@ -407,7 +458,7 @@ def test_background_of_a_terminal(tmp_path):
 
 def test_processor_time_that_is_used_up(tmp_path):
     """At the soft limit of processor time, the host gets SIGXCPU."""
-    child = script_child(tmp_path, "setsid sleep 1000 & while :; do echo 'a=\"'; done")
+    child = script_child(tmp_path, f"{GRANDCHILD}\nwhile :; do echo 'a=\"'; done")
     with Watched("run", "--assay", child, stdout=subprocess.DEVNULL,
                  preexec_fn=lambda: resource.setrlimit(resource.RLIMIT_CPU, (1, 600))) as watched:
         assert watched.finish().status in (3, INTERRUPTED) # the child may reach the limit first
@@ -455,6 +506,15 @@ def test_sudden_end(scene, end):
         until(lambda: processes_with(watched.mark) == [], "something is left")
         expected = signal.SIGSEGV if end is quit_worker else signal.SIGKILL
         assert watched.process.returncode == -expected
+
+
+@pytest.mark.parametrize("command", OTHERS)
+def test_sudden_end_of_other_commands(scene, command):
+    with watch_other(scene, command, stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL) as watched:
+        scene.await_ready()
+        watched.process.kill()
+        watched.wait()
+        until(lambda: processes_with(watched.mark) == [], "something is left")
 
 
 @pytest.mark.skipif(os.getsid(0) == os.getsid(1), reason="the kernel continues a suspended worker "

@@ -13,7 +13,7 @@ import pytest
 from clmodel import ClGpu, ClPlatform
 from harness import DEADLINE, EMULATED, PROGRAM, PROGRAM_AT_ROOT, STAMP, record_so_far, text_of, until
 from hosting import (ERROR_STATUS, HOST, HOST_ON_CUE, TIMEOUT, Watched, decode, host_run,
-                     host_run_until, read_to_the_end, report_bytes, run_assay, texts)
+                     host_run_until, read_to_the_end, report_bytes, run_assay, script_child, texts)
 from model import KEYS, Gpu, predict
 from test_command_line import STATUSES as EXITS
 from test_opencl import Machine
@@ -223,6 +223,28 @@ def test_any_bytes_of_a_driver(host, text):
     assert b"\x1b" not in shown.out
 
 
+@pytest.mark.parametrize("schema", ["1", "2"])
+def test_events_have_the_lines_of_the_document(tmp_path, schema):
+    """Of every kind, one too long to be kept whole, and one without its end."""
+    child = script_child(tmp_path, """
+        printf 'GLName=1\\r\\n# a comment\\nno value\\nkey="two\\nlines"\\n'
+        head -c 70000 /dev/zero | tr '\\0' x
+        printf '\\nlast=1'
+        echo aside >&2""")
+    arguments = ["run", "--assay", child, "--schema", schema, "--format"]
+    lines = host_run(*arguments, "json").document()["lines"]
+    assert [line["kind"] for line in lines] == ["value", "comment", "raw", "value", "raw", "value"]
+    run = host_run(*arguments, "jsonl")
+    events = run.events()
+    assert events[0]["schema"] == int(schema)
+    assert [{name: event[name] for name in ("kind", "text", "end", "cut") if name in event}
+            for event in events if event["event"] == "line"] == lines
+    assert [(event["key"], event["value"]) for event in events if event.get("kind") == "value"] == [
+        ("GLName", "1"), ("key", "two\nlines"), ("last", "1")]
+    assert [event["text"] for event in events if event["event"] == "error"] == ["aside"]
+    assert run.err == b""
+
+
 def test_events_come_as_they_happen(host):
     """The lines of a child that hangs are already written."""
     environment = host.environment(opencl="absent", **scripted("at glLinkProgram hang"))
@@ -268,11 +290,22 @@ def test_assay_on_the_path_is_the_next(host, tmp_path):
     assert str(alone / "assay") in run.document()["outcome"]["reason"]
 
 
-def test_progress_only_on_a_terminal(host):
-    environment = host.environment(opencl="absent", **scripted("at glLinkProgram hang"))
-    progress = re.compile(rb"\r\d+\.\d s, \d+ steps, compiling shaders \(glgpu\[0\]\.CanCompileProgramGLSL\)")
+# Where the run hangs, and the progress that is shown then.
+PROGRESS = {
+    "trial": ("at glLinkProgram hang",
+              rb"\r\d+\.\d s, \d+ steps, compiling shaders \(glgpu\[0\]\.CanCompileProgramGLSL\)"),
+    "end": ("", rb"\r\d+\.\d s, \d+ steps, at the end"),
+}
+
+
+@pytest.mark.parametrize("name", PROGRESS)
+def test_progress_only_on_a_terminal(host, tmp_path, name):
+    rules, text = PROGRESS[name]
+    environment = host.environment(opencl="absent", **scripted(rules))
+    progress = re.compile(text)
+    child = script_child(tmp_path, f'{PROGRAM} "$@"; exec sleep 1000000')
     control, terminal = pty.openpty()
-    with Watched("run", "--assay", PROGRAM, environment=environment,
+    with Watched("run", "--assay", child, environment=environment,
                  stderr=terminal) as watched:
         os.close(terminal)
         shown = b""

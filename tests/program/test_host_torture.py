@@ -1,13 +1,15 @@
 """`assay-host torture`: every step on real and scripted machines, and children that break the rules."""
 
 import os
+import pty
 import re
+import select
 import shutil
 import signal
 
 import pytest
 
-from harness import PROGRAM, PROGRAM_AT_ROOT, until
+from harness import DEADLINE, PROGRAM, PROGRAM_AT_ROOT, until
 from hosting import HOST, TIMEOUT, Cue, Watched, host_run, read_to_the_end, script_child
 from model import Gpu
 from test_opencl import Machine
@@ -109,6 +111,21 @@ def test_interrupt(host, tmp_path):
     assert run.text.endswith("\nInterrupted at -crashAfter=5.\n")
 
 
+def test_interrupt_of_the_undisturbed_run(tmp_path):
+    child = script_child(tmp_path, "exec sleep 1000000")
+    control, terminal = pty.openpty()
+    with Watched("torture", "--assay", child, stderr=terminal) as watched:
+        os.close(terminal)
+        shown = b""
+        while b"\ran undisturbed run" not in shown:
+            assert select.select([control], [], [], DEADLINE)[0]
+            shown += os.read(control, 65536)
+        watched.process.send_signal(signal.SIGINT)
+        run = watched.finish()
+    os.close(control)
+    assert (run.status, run.text) == (6, "The run was interrupted before its first line.\n")
+
+
 def test_llvmpipe(host):
     run = torture(host.environment(egl="real", opencl="empty"))
     if run.text.startswith("0 OpenGL"):
@@ -131,7 +148,6 @@ def test_llvmpipe_with_opencl(host, kind):
 
 
 def test_progress_on_a_terminal(host):
-    import pty
     control, terminal = pty.openpty()
     with Watched("torture", "--assay", PROGRAM, "--kind", "crash", stderr=terminal,
                  environment=host.environment(script="# nothing\n", opencl="absent"),

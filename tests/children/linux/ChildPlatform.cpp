@@ -4,9 +4,11 @@
 #include <cstdio>
 #include <cstdlib>
 #include <fcntl.h>
+#include <pthread.h>
 #include <spawn.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <thread>
 #include <unistd.h>
 
 namespace {
@@ -75,6 +77,15 @@ int CountPipes()
     for (int descriptor = 0; descriptor < kMaxDescriptors; ++descriptor)
         count += ::fstat(descriptor, &status) == 0 && S_ISFIFO(status.st_mode);
     return count;
+}
+
+void EndFirstThread()
+{
+    std::thread([] {
+        for (;;)
+            ::pause();
+    }).detach();
+    ::pthread_exit(nullptr);
 }
 
 void WriteState()

@@ -121,4 +121,6 @@ int CountPipes()
     return count;
 }
 
+void EndFirstThread() {}
+
 void WriteState() {}

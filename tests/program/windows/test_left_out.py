@@ -21,6 +21,7 @@ COUNTERPARTS = {
     "test_opencl": "test_windows_opencl",
     "test_show": "test_windows_host",
     "test_steps": "test_windows",
+    "test_third_party": "test_package",
     "test_verbose": "test_windows",
     "test_streams": "test_windows",
     "test_machines": "test_windows",
@@ -41,7 +42,7 @@ LEFT_OUT = {
     "Linux's own files, shells and terminals": {
         "program/test_completions", "program/test_hardening", "program/test_series", "unit/facts",
         "unit/output"},
-    "texts that are the same on every system": {"unit/report"},
+    "texts that are the same on every system": {"program/test_links", "unit/report"},
     "what the emulation of another processor leaves out": {"program/test_emulation"},
     "there is no Python and no Node for Windows here": {"examples/decide.py", "examples/decide.js"},
     "the peak memory of a host is measured by getrusage": {"program/test_host_memory"},

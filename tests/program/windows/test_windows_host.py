@@ -7,7 +7,7 @@ import re
 import signal
 import subprocess
 import sys
-import time
+import tempfile
 import zipfile
 from pathlib import Path
 
@@ -16,7 +16,7 @@ import pytest
 from clmodel import ClGpu, ClPlatform
 from conftest import (
     BUILD, NO_OPENCL_PLATFORM, SECONDS, TREE, run_under_wine, scripted_opencl, wine_desktop)
-from harness import text_of
+from harness import text_of, until
 from test_host_help import HELP
 
 sys.path.insert(0, str(TREE / "tests" / "schema"))
@@ -159,14 +159,17 @@ def test_output_file(tmp_path):
 
 class Running:
     """A running host, assay-host.exe or the program of `command`, with a child that has a unique
-    argument."""
+    argument, and makes a file first."""
 
     def __init__(self, *words, options=(), command=(), **streams):
         self.word = str(random.randrange(10**8, 2 * 10**9)) # how long the child sleeps
         command = command or [HOST, "run", *options, "--assay", CHILD, "--"]
         self.name = Path(command[0]).name.encode()
+        self.folder = tempfile.TemporaryDirectory()
+        self.begun = Path(self.folder.name, "begun")
         self.process = subprocess.Popen(
-            [TREE / "scripts" / "run-under-wine", *command, *words, "sleep", self.word],
+            [TREE / "scripts" / "run-under-wine", *command, "touch", f"Z:{self.begun}",
+             *words, "sleep", self.word],
             stdin=subprocess.DEVNULL, stderr=subprocess.DEVNULL,
             env={**os.environ, **NO_OPENCL_PLATFORM}, **streams)
 
@@ -183,11 +186,12 @@ class Running:
                 pass
         return found
 
-    def until_child(self, there):
-        deadline = time.monotonic() + SECONDS
-        while bool(self.numbers(of_host=False)) != there:
-            assert time.monotonic() < deadline, f"no child: {not there}"
-            time.sleep(0.05)
+    def until_child_has_begun(self):
+        """Before that, its process may not be known to Wine's server, which then can't end it."""
+        until(self.begun.exists, "the child has begun")
+
+    def until_child_has_ended(self):
+        until(lambda: not self.numbers(of_host=False), "the child has ended")
 
     def __enter__(self):
         return self
@@ -197,6 +201,7 @@ class Running:
             os.kill(number, signal.SIGKILL)
         self.process.kill()
         self.process.wait()
+        self.folder.cleanup()
 
 
 def test_reader_that_does_not_read():
@@ -205,8 +210,8 @@ def test_reader_that_does_not_read():
     options = ["--format", "jsonl", "--timeout", str(HANG_TIMEOUT)]
     with Running("flood", "300000", options=options, stdout=write) as running:
         os.close(write)
-        running.until_child(there=True)
-        running.until_child(there=False)
+        until(lambda: running.numbers(of_host=False), "the child is there")
+        running.until_child_has_ended()
         assert running.process.poll() is None # it still waits for the reader
         with os.fdopen(read, "rb") as reader:
             data = reader.read()
@@ -217,10 +222,10 @@ def test_reader_that_does_not_read():
 def test_killed_host():
     """The job kills the child too."""
     with Running(options=["--timeout", "600"], stdout=subprocess.DEVNULL) as running:
-        running.until_child(there=True)
+        running.until_child_has_begun()
         for number in running.numbers(of_host=True):
             os.kill(number, signal.SIGKILL)
-        running.until_child(there=False)
+        running.until_child_has_ended()
 
 
 def test_version():

@@ -99,10 +99,10 @@ def test_scripted_opencl_drivers(tmp_path, rule, verdict, usable):
 def test_killed_host():
     """The job kills the child too."""
     with Running(command=[HOST, "600", CHILD], stdout=subprocess.DEVNULL) as running:
-        running.until_child(there=True)
+        running.until_child_has_begun()
         for number in running.numbers(of_host=True):
             os.kill(number, signal.SIGKILL)
-        running.until_child(there=False)
+        running.until_child_has_ended()
 
 
 def test_is_moved_as_a_folder(tmp_path):
