@@ -66,6 +66,28 @@ def test_a_call_during_an_attempt_answers_unknown(starts):
     assert starts.children == 1
 
 
+def sleeps_of(pid):
+    """How often the main thread of a process has waited."""
+    status = Path(f"/proc/{pid}/status").read_text()
+    return int(status.split("\nvoluntary_ctxt_switches:")[1].split()[0])
+
+
+def test_an_interrupt_ends_the_wait_for_another_call(starts):
+    starts.set_driver("at eglInitialize hang\n")
+    with starts.start("--timeout", "0") as first:
+        until(lambda: starts.has_open_attempt() and starts.children == 1, "no attempt")
+        with starts.start("--wait", "1e9") as second:
+            worker = until(second.worker, "it doesn't wait")
+            before = sleeps_of(worker)
+            until(lambda: sleeps_of(worker) > before + 2, "it doesn't sleep between its looks")
+            second.process.send_signal(signal.SIGTERM)
+            answer = starts.answer(second.finish())
+        assert (answer.status, answer.document["opengl"]["reason"]) == (INTERRUPTED, "other-instance")
+        first.process.send_signal(signal.SIGTERM)
+        assert first.finish().status == INTERRUPTED
+    assert starts.children == 1
+
+
 def test_a_crash_is_remembered_and_tried_again_after_a_pause(starts):
     starts.set_driver("at 1 eglCreateContext crash\n")
     first = starts.advise()
@@ -307,6 +329,10 @@ def test_the_users_choice(starts):
     assert b"choice: opengl=software since " in starts.act("list").out
     assert starts.act("set", "opengl=auto").status == 0
     assert starts.advise().status == HARDWARE
+    assert b"choice:" not in starts.act("list").out
+    (starts.state / "choice.json").write_text("x")
+    listed = starts.act("list")
+    assert (listed.status, listed.err) == (0, b"assay-host: The user's choice is ignored: it is damaged.\n")
     assert starts.act("set", "opengl=absent", "opencl=hardware").status == 0
     assert starts.advise("--need", "opencl").status == HARDWARE
     assert starts.act("forget").status == 0
@@ -320,6 +346,7 @@ def test_the_users_choice(starts):
 
 
 def test_state_for_support(starts):
+    starts.state.mkdir(mode=0o700)
     assert starts.act("list").text.splitlines()[1:] == []
     starts.set_driver("at eglInitialize crash\n")
     starts.advise()
@@ -333,8 +360,18 @@ def test_state_for_support(starts):
     assert "signal 11" in shown.text
     assert shown.text == starts.act("show").text
     for action in ("show", "forget"):
-        run = starts.act(action, "none")
-        assert (run.status, run.err) == (ERROR, b'assay-host: 0 entries begin with "none"\n')
+        for word, count in (("none", 0), ("", 1)):
+            run = starts.act(action, word)
+            assert (run.status, run.out, run.err.decode()) == (
+                ERROR, b"", f'assay-host: {count} entries begin with "{word}"\n')
+    other = name[:-1] + ("0" if name[-1] != "0" else "1")
+    starts.file().with_stem(other).write_text("x")
+    for action in ("show", "forget"):
+        run = starts.act(action, name[:-1])
+        assert (run.status, run.err.decode()) == (
+            ERROR, f'assay-host: 2 entries begin with "{name[:-1]}"\n')
+    assert starts.act("forget", other).status == 0
+    assert starts.act("show", name).text == shown.text
     assert starts.act("forget", name).status == 0
     assert starts.file() is None
     starts.set_driver("")
@@ -347,6 +384,15 @@ def test_state_that_cannot_be_changed(starts):
         run = starts.act(*words)
         assert (run.status, run.err) == (
             ERROR, b"assay-host: cannot change the state: No such file or directory\n")
+
+
+@pytest.mark.parametrize("action", ["list", "show"])
+def test_state_that_cannot_be_read(starts, action):
+    starts.state = starts.state / "none"
+    run = starts.act(action)
+    assert (run.status, run.out, run.err.decode()) == (
+        ERROR, b"", f"assay-host: {starts.state}: No such file or directory\n")
+    assert not starts.state.exists()
 
 
 def test_dry_run_changes_nothing(starts):

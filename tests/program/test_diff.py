@@ -108,8 +108,15 @@ def test_the_forms_agree(good, tmp_path, name):
             assert line.startswith(f"{device} ")
             continue
         values = [difference[side]["value"] for side in ("before", "after")]
-        shown = [re.escape(decode(value).decode()) if value is not None else r"missing \(.*\)"
-                 for value in values]
+        if group == "others":
+            which = "second" if values[0] is None else "first"
+            whole = decode(next(filter(None, values))).decode()
+            assert line == f"other line, only in the {which} report: {whole}"
+            continue
+        # A key that no report should have lacks nothing where it is missing.
+        shown = [re.escape(decode(value).decode()) if value is not None
+                 else "missing" if difference[side]["text"] == "not in the report" else r"missing \(.*\)"
+                 for side, value in zip(("before", "after"), values)]
         key = f"{device}.{difference['key']}" if device else difference["key"]
         assert re.fullmatch(rf'{re.escape(key)}: "?{shown[0]}"? -> "?{shown[1]}"?{re.escape(note)}', line)
 
@@ -138,6 +145,7 @@ def test_it_writes_a_file(good, tmp_path):
     written = host_run("diff", "--format", "html", "--output", str(page), good, good)
     assert (written.status, written.out) == (0, b"")
     assert page.read_bytes() == host_run("diff", "--format", "html", good, good).out
+    assert host_run("diff", "--format", "html", "--output", "/dev/stdout", good, good).out == page.read_bytes()
     lines = host_run("diff", "--output", str(tmp_path / "lines"), good, good)
     assert (lines.status, lines.out, (tmp_path / "lines").read_bytes()) == (0, b"", b"")
 
@@ -158,3 +166,16 @@ def test_some_files_cannot_be_read(good, tmp_path):
     assert run.status == 2
     diff = validate_diff(run.out)
     assert (diff["before"], [each["after"] for each in diff["comparisons"]]) == (str(good), [str(good)])
+
+
+def test_each_line_names_its_file_once(tmp_path):
+    """Also where the text is longer than the blocks that are written."""
+    files = []
+    for name in ("first", "second", "third"):
+        files.append(tmp_path / name)
+        lines = "".join(f"a line of {name} {number}\n" for number in range(2000))
+        files[-1].write_text(f'assayStart="x"\n{lines}assayEnd="y"\n', encoding="ascii")
+    single = [host_run("diff", files[0], other).text for other in files[1:]]
+    assert all(len(text) > 2 * 65536 for text in single)
+    assert host_run("diff", *files).text.splitlines() == [
+        f"{other}: {line}" for other, text in zip(files[1:], single) for line in text.splitlines()]

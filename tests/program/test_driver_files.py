@@ -212,7 +212,11 @@ def test_the_other_forms(tmp_path):
 
 def test_a_child_without_a_list(tmp_path):
     asked = validate_document(host(tmp_path, options=("--", "-verbose=0")).out)
-    assert asked["drivers"] == {"known": False, "reason": "the log of the child was not requested"}
+    assert asked["drivers"] == {"known": False, "reason": "the child did not log them"}
+    own = validate_document(host(tmp_path, options=("--", "-verbose=0x101")).out)
+    assert SCRIPTED_GL in paths_of(own, "OpenGL")
+    first = validate_document(host(tmp_path, options=("--", "-verbose=1")).out)
+    assert first["drivers"] == {"known": False, "reason": "the child did not log them"}
     missing = host_run("run", "--assay", str(tmp_path / "none"), "--format", "json")
     assert validate_document(missing.out)["drivers"] == \
         {"known": False, "reason": "the child was not started"}

@@ -189,7 +189,9 @@ def usable_of(pair, whole, keys, errors):
     """What can be used after a run with the fault: OpenGL and OpenCL."""
     if whole:
         return usable_opengl(pair, keys, errors), usable_opencl(keys)
-    return ("hardware", "broken") if library_of(pair.call.name) == "cl" else ("broken", "unknown")
+    # After a flood the child goes on, and the rest of its report is dropped.
+    stopped = "unknown" if pair.fault.name == "flood" else "broken"
+    return ("hardware", stopped) if library_of(pair.call.name) == "cl" else (stopped, "unknown")
 
 
 def check_usable(pair, document, keys, errors):

@@ -4,8 +4,10 @@ between runs."""
 import ctypes.util
 import json
 import os
+import pty
 import random
 import re
+import select
 import signal
 import statistics
 from dataclasses import dataclass, replace
@@ -14,7 +16,7 @@ from pathlib import Path
 import pytest
 
 from clmodel import ClGpu, ClPlatform, cl_script_of
-from harness import BUILD, Host, until
+from harness import BUILD, DEADLINE, Host, until
 from hosting import (ERROR_STATUS, PROGRAM, Cue, Watched, host_run, script_child, text_of)
 from validate import validate_document
 
@@ -58,10 +60,10 @@ class Machine:
         """Commands of the child before the program in a run."""
         (self.folder / f"before-{run}").write_text(text + "\n")
 
-    def start(self, *options, more=None):
+    def start(self, *options, more=None, **streams):
         child = script_child(self.folder, CHILD)
         return Watched("run", "--assay", str(child), *options,
-                       environment={**self.environment(), **(more or {})})
+                       environment={**self.environment(), **(more or {})}, **streams)
 
     def run(self, *options, more=None):
         with self.start(*options, more=more) as watched:
@@ -382,9 +384,46 @@ def test_what_can_not_run_is_not_repeated(machine):
 
 def test_raw_lines_of_all_runs_come_first(machine):
     machine.set_runs([gpu()])
-    text = machine.run("--repeat", "3", "--raw").text
-    assert [line.split("=")[0] for line in text.splitlines()
+    machine.before(2, "echo aside >&2")
+    hosted = machine.run("--repeat", "3", "--raw")
+    raw, table = hosted.text.split("\n\n", 1)
+    assert [line.split("=")[0] for line in raw.splitlines()
             if line.startswith("assay")] == ["assayStart", "assayEnd"] * 3
+    assert "\nRun: all tests ran" in table
+    assert hosted.err == b"aside\n"
+    machine.set_runs([gpu()])
+    assert machine.run("--repeat", "3").err == b""
+
+
+def test_the_files_of_the_drivers_are_described(machine):
+    machine.set_runs([gpu()])
+    files = machine.document("--repeat", "2")["drivers"]["files"]
+    assert files == machine.document()["drivers"]["files"]
+    assert any(file["buildId"]["known"] for file in files)
+
+
+# What the child has printed when it hangs, and the progress that is shown then.
+PROGRESS = {
+    "nothing": ("", r"run 2 of 3, about \d+ \w+ left; starting \(Tester\)"),
+    "all": ("echo 'assayEnd=\"x\"'", r"run 2 of 3, about \d+ \w+ left; at the end"),
+}
+
+
+@pytest.mark.parametrize("name", PROGRESS)
+def test_progress_on_a_terminal(machine, name):
+    printed, progress = PROGRESS[name]
+    machine.set_runs([gpu()])
+    machine.before(2, f"{printed}\nexec sleep 1000000")
+    control, terminal = pty.openpty()
+    with machine.start("--repeat", "3", stderr=terminal) as watched:
+        os.close(terminal)
+        shown = ""
+        while not re.search(rf"\r{progress}", shown):
+            assert select.select([control], [], [], DEADLINE)[0]
+            shown += os.read(control, 65536).decode()
+        watched.process.send_signal(signal.SIGTERM)
+        watched.finish()
+    os.close(control)
 
 
 def test_the_output_can_not_be_written(machine):

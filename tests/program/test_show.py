@@ -213,6 +213,15 @@ def test_it_writes_a_file(tmp_path):
     written = show(stored, "--format", "html", "--output", str(page))
     assert (written.status, written.out) == (0, b"")
     assert page.read_bytes() == show(stored, "--format", "html").out
+    # A file has lines of its own width.
+    shown = tmp_path / "shown"
+    assert show(stored, "--output", str(shown)).status == 0
+    assert max(map(len, shown.read_text(encoding="utf-8").splitlines())) in range(90, 101)
+    assert max(map(len, show(stored).text.splitlines())) in range(70, 81)
+    written = tmp_path / "written"
+    test_usable.run(tmp_path, FAILURES["none"], "--output", str(written))
+    assert max(map(len, written.read_text(encoding="utf-8").splitlines())) in range(90, 101)
+    assert show(stored, "--format", "html", "--output", "/dev/stdout").out == page.read_bytes()
     failed = show(stored, "--output", str(tmp_path / "no" / "page"))
     assert failed.status == ERROR_STATUS
     assert text_of(failed.err).startswith("assay-host: cannot write ")
