@@ -6,6 +6,8 @@
 #include <stdexcept>
 #include <string>
 
+#include <boost/filesystem/operations.hpp>
+
 #include "app/Commands.h"
 #include "support/TempPath.h"
 
@@ -36,7 +38,8 @@ protected:
         }
     }
 
-    void Remove() const { std::filesystem::remove_all(fFolder); }
+    // That of MinGW's std::filesystem doesn't return if a file disappears at the same time.
+    void Remove() const { boost::filesystem::remove_all(fFolder); }
 
     const std::string fFolder = MakeTempPath("assay-check-state");
     std::string fText;

@@ -5,6 +5,8 @@
 #include <random>
 #include <string>
 
+#include <boost/filesystem/operations.hpp>
+
 #include <assay_host.h>
 
 #include "Runs.h"
@@ -41,8 +43,9 @@ public:
     }
     ~StateFolder()
     {
-        std::error_code failure;
-        std::filesystem::remove_all(fParent, failure);
+        // That of MinGW's std::filesystem doesn't return if a file disappears at the same time.
+        boost::system::error_code failure;
+        boost::filesystem::remove_all(fParent.native(), failure);
     }
     StateFolder(const StateFolder&) = delete;
     StateFolder& operator=(const StateFolder&) = delete;
