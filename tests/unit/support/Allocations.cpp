@@ -48,6 +48,31 @@ void operator delete(void* block, std::size_t /*size*/) noexcept
     operator delete(block);
 }
 
+// By default these call those above, but not with the address sanitizer, which has its own.
+void* operator new(std::size_t size, const std::nothrow_t& /*noThrow*/) noexcept
+{
+    try {
+        return operator new(size);
+    } catch (const std::bad_alloc&) {
+        return nullptr;
+    }
+}
+
+void* operator new[](std::size_t size)
+{
+    return operator new(size);
+}
+
+void operator delete[](void* block) noexcept
+{
+    operator delete(block);
+}
+
+void operator delete[](void* block, std::size_t /*size*/) noexcept
+{
+    operator delete(block);
+}
+
 namespace assay_test {
 
 FailingAllocation::FailingAllocation(std::size_t number)
